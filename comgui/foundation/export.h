@@ -1,0 +1,4 @@
+// Marks what the shared library lets its users see; everything else stays hidden inside.
+#pragma once
+
+#define COMGUI_EXPORT __attribute__((visibility("default")))

@@ -1,0 +1,21 @@
+// Fillers for the write, lock and notification slots of a container that supports none of them: every call
+// reports success (1), looks at no argument and does nothing.
+#pragma once
+
+#include "comgui/foundation/export.h"
+#include "comgui/ticket/MTICKET_ACCESS.h"
+
+extern "C"
+{
+    COMGUI_EXPORT int DUMMY_MSETPARAMETER(void* Instance, int ticketType, int ticketId, char const* key,
+                                          PARAM_TYPE type, void const* value, int pos);
+    COMGUI_EXPORT int DUMMY_MSETMULTIPAR(void* Instance, int ticketType, int ticketId, SETMULTIPAR* table);
+    COMGUI_EXPORT int DUMMY_MOPERATION(void* Instance, int ticketType, int ticketId, TICKET_OP op, void* arg);
+    COMGUI_EXPORT int DUMMY_MENDISNOTIF(void* Instance, int ticketType, int ticketId, int notificationId,
+                                        bool enable, char const* const* keys);
+
+    // Their slots are the module's own affair, and so are the arguments that come with them.
+    COMGUI_EXPORT int DUMMY_MLOCK(...);
+    COMGUI_EXPORT int DUMMY_MSETNOTIFICATION(...);
+    COMGUI_EXPORT int DUMMY_MSETNOTIFICATION2(...);
+}

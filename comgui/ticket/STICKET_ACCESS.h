@@ -1,0 +1,66 @@
+// The function table of one ticket. The module owns the table and whatever its Instance means; a host only
+// reads it. Every slot takes the table's Instance first, and unless told otherwise returns an int that is
+// not zero for success. A missing key, a position past the end and a value of another type all are plain
+// failures. Whether slots may be called from several threads is the module's to say.
+#pragma once
+
+#include "comgui/ticket/PARAM_TYPE.h"
+#include "comgui/ticket/SETMULTIPAR.h"
+#include <cstddef>
+#include <type_traits>
+
+// Reads one value; value is what PARAM_TYPE.h says for a read. A failure leaves *value untouched.
+typedef int (*SGETPARAMETER)(void* Instance, char const* key, PARAM_TYPE type, void* value, int pos);
+
+// Reads a table. The result of the call means nothing: each record's ok tells.
+typedef int (*SGETMULTIPAR)(void* Instance, GETMULTIPAR* table);
+
+// Called for each parameter of a walk, with the value word as on a write; false ends the walk. Records of
+// PARAM_NONE and PARAM_COUNT may come and have to be put up with. key and value live until it returns.
+typedef bool (*SWALKPARAMETERS_ACTION)(void* context, char const* key, PARAM_TYPE type, void const* value,
+                                       int pos);
+
+// Calls action for each parameter. This library always passes the prefix "" and the limit 8000.
+typedef int (*SWALKPARAMETERS)(void* Instance, SWALKPARAMETERS_ACTION action, void* context,
+                               char const* prefix, int limit);
+
+// Writes one value; the slot keeps no pointer to it. PARAM_NONE with a null value deletes.
+typedef int (*SSETPARAMETER)(void* Instance, char const* key, PARAM_TYPE type, void const* value, int pos);
+
+// Writes a table and sets each record's ok.
+typedef int (*SSETMULTIPAR)(void* Instance, SETMULTIPAR* table);
+
+// Answers an option by its code (STICKET_OP_FOLDER_VARIABLES, STICKET_OP_WHOAMI). 1 success, 0 failure.
+typedef int (*SOPTION)(void* Instance, int code, void* out);
+
+// Two words that the module fills for STICKET_OP_WHOAMI; nothing here looks into them.
+struct STICKET_OPTION_WHOAMI
+{
+    unsigned long long word0;
+    unsigned long long word8;
+};
+static_assert(std::is_standard_layout_v<STICKET_OPTION_WHOAMI> && sizeof(STICKET_OPTION_WHOAMI) == 16);
+
+struct STICKET_ACCESS
+{
+    void* reserved0[2];
+    void* Instance;  // the module's handle of this ticket
+    ::SGETPARAMETER SGETPARAMETER;
+    ::SGETMULTIPAR SGETMULTIPAR;
+    ::SWALKPARAMETERS SWALKPARAMETERS;
+    void* reserved48[20];
+    ::SSETPARAMETER SSETPARAMETER;
+    ::SSETMULTIPAR SSETMULTIPAR;
+    void* reserved224;
+    ::SOPTION SOPTION;
+};
+static_assert(std::is_standard_layout_v<STICKET_ACCESS> && sizeof(STICKET_ACCESS) == 240);
+static_assert(offsetof(STICKET_ACCESS, Instance) == 16);
+static_assert(offsetof(STICKET_ACCESS, SGETPARAMETER) == 24);
+static_assert(offsetof(STICKET_ACCESS, SGETMULTIPAR) == 32);
+static_assert(offsetof(STICKET_ACCESS, SWALKPARAMETERS) == 40);
+static_assert(offsetof(STICKET_ACCESS, reserved48) == 48);
+static_assert(offsetof(STICKET_ACCESS, SSETPARAMETER) == 208);
+static_assert(offsetof(STICKET_ACCESS, SSETMULTIPAR) == 216);
+static_assert(offsetof(STICKET_ACCESS, reserved224) == 224);
+static_assert(offsetof(STICKET_ACCESS, SOPTION) == 232);

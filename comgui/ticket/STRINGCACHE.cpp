@@ -1,0 +1,10 @@
+#include "comgui/ticket/STRINGCACHE.h"
+
+char const* STRINGCACHE::operator()(char const*& text) { return text = (*this)[text]; }
+
+char const* STRINGCACHE::operator[](char const* text)
+{
+    return text ? m_texts.emplace(text).first->c_str() : nullptr;
+}
+
+void STRINGCACHE::clear() { m_texts.clear(); }

@@ -1,0 +1,80 @@
+// The calls of CoreFoundation that open a plug-in, for systems that have no CoreFoundation: same names,
+// types and meaning, and no more than the library uses. What a Create function returns belongs to the
+// caller, who gives it back with CFRelease. Every failure is a null result.
+#pragma once
+
+#include <stdint.h>
+
+#ifdef __cplusplus
+extern "C"
+{
+#endif
+
+#define CF_EXPORT extern __attribute__((visibility("default")))
+
+typedef unsigned char Boolean;
+typedef uint8_t UInt8;
+typedef uint32_t UInt32;
+typedef long CFIndex;
+
+typedef void const* CFTypeRef;
+typedef struct __CFAllocator const* CFAllocatorRef;
+typedef struct __CFString const* CFStringRef;
+typedef struct __CFURL const* CFURLRef;
+typedef struct __CFUUID const* CFUUIDRef;
+typedef struct __CFArray const* CFArrayRef;
+typedef struct __CFBundle* CFPlugInRef;
+
+CF_EXPORT CFAllocatorRef const kCFAllocatorDefault;
+
+CF_EXPORT CFTypeRef CFRetain(CFTypeRef object);
+CF_EXPORT void CFRelease(CFTypeRef object);
+
+typedef UInt32 CFStringEncoding;
+enum
+{
+    kCFStringEncodingUTF8 = 0x08000100
+};
+
+// Null for a null text, for bytes that are no UTF-8, and for any other encoding.
+CF_EXPORT CFStringRef CFStringCreateWithCString(CFAllocatorRef allocator, char const* text,
+                                                CFStringEncoding encoding);
+
+typedef CFIndex CFURLPathStyle;
+enum
+{
+    kCFURLPOSIXPathStyle = 0
+};
+
+// Null for an empty path and for any other path style. A relative path is taken from the current folder.
+CF_EXPORT CFURLRef CFURLCreateWithFileSystemPath(CFAllocatorRef allocator, CFStringRef path,
+                                                 CFURLPathStyle style, Boolean isDirectory);
+
+typedef struct
+{
+    UInt8 byte0, byte1, byte2, byte3, byte4, byte5, byte6, byte7;
+    UInt8 byte8, byte9, byte10, byte11, byte12, byte13, byte14, byte15;
+} CFUUIDBytes;
+
+// Null for a text that is not of the form 01234567-89AB-CDEF-0123-456789ABCDEF (either letter case).
+CF_EXPORT CFUUIDRef CFUUIDCreateFromString(CFAllocatorRef allocator, CFStringRef text);
+CF_EXPORT CFUUIDBytes CFUUIDGetUUIDBytes(CFUUIDRef uuid);
+
+CF_EXPORT CFIndex CFArrayGetCount(CFArrayRef array);
+CF_EXPORT void const* CFArrayGetValueAtIndex(CFArrayRef array, CFIndex index);
+
+// Opens the bundle at that URL: a folder with Contents/Info.plist. Null if it is none. Its executable is
+// loaded when a factory is first asked for, and then stays loaded to the end of the process.
+CF_EXPORT CFPlugInRef CFPlugInCreate(CFAllocatorRef allocator, CFURLRef bundleURL);
+
+// The plug-in's factories for that type, as CFUUIDRef in the order of its Info.plist; null if it has none.
+// The caller releases the array.
+CF_EXPORT CFArrayRef CFPlugInFindFactoriesForPlugInTypeInPlugIn(CFUUIDRef typeUUID, CFPlugInRef plugIn);
+
+// Calls the factory, void* Factory(CFAllocatorRef, CFUUIDRef typeUUID), of the bundle opened last that has
+// it, and gives what it made; null without such a factory, its executable or its symbol.
+CF_EXPORT void* CFPlugInInstanceCreate(CFAllocatorRef allocator, CFUUIDRef factoryUUID, CFUUIDRef typeUUID);
+
+#ifdef __cplusplus
+}
+#endif

@@ -1,0 +1,31 @@
+// Names a ticket inside the server: its type and its id.
+#pragma once
+
+#include <cstddef>
+#include <functional>
+
+namespace standin
+{
+struct TicketAddress
+{
+    int type;
+    int id;
+
+    friend bool operator==(TicketAddress const&, TicketAddress const&) = default;
+    friend auto operator<=>(TicketAddress const&, TicketAddress const&) = default;
+};
+
+inline constexpr TicketAddress SystemTicket{0, 0};
+}  // namespace standin
+
+template <>
+struct std::hash<standin::TicketAddress>
+{
+    std::size_t operator()(standin::TicketAddress const& address) const noexcept
+    {
+        // Types fill seven bits and ids twenty-four, so this is the address itself, spread by a multiplier.
+        auto const word = static_cast<std::size_t>(static_cast<unsigned>(address.type)) << 24 ^
+                          static_cast<std::size_t>(static_cast<unsigned>(address.id));
+        return word * 0x9E3779B97F4A7C15u;
+    }
+};
