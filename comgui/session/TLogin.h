@@ -13,22 +13,22 @@
 
 struct TLogin
 {
-    unsigned int nSize;           // always 2632
+    unsigned int nSize;  // always 2632
     char szUser[128];
-    char szPassword[128];         // carried to the plug-in unread
-    char szLocalAddress[128];     // dotted IPv4, as the last test of the server found it
-    unsigned int iLocalPort;      // the local port that this session was given
-    char szLocalEndPoint[128];    // names this client's end point; filled in by the plug-in at login
-    char szServerHost[128];       // name or address
+    char szPassword[128];       // carried to the plug-in unread
+    char szLocalAddress[128];   // dotted IPv4, as the last test of the server found it
+    unsigned int iLocalPort;    // the local port that this session was given
+    char szLocalEndPoint[128];  // names this client's end point; filled in by the plug-in at login
+    char szServerHost[128];     // name or address
     int iServerPort;
-    char reserved652[132];        // the plug-in's
-    void* hSession;               // the plug-in's handle of the session; null before login
-    int iClientStamp;             // going in: the client's stamp; after login: the user's ticket id
-    int iUserRole;                // 16 and nothing else is an administrator
-    int iReserved800;             // 0
-    char reserved804[20];         // the plug-in's
-    int iGUINotificationID;       // id of this session's notifications; -1 or 0 when there is none
-    char reserved828[1804];       // the plug-in's
+    char reserved652[132];   // the plug-in's
+    void* hSession;          // the plug-in's handle of the session; null before login
+    int iClientStamp;        // going in: the client's stamp; after login: the user's ticket id
+    int iUserRole;           // 16 and nothing else is an administrator
+    int iReserved800;        // 0
+    char reserved804[20];    // the plug-in's
+    int iGUINotificationID;  // id of this session's notifications; -1 or 0 when there is none
+    char reserved828[1804];  // the plug-in's
 };
 static_assert(std::is_standard_layout_v<TLogin> && std::is_trivial_v<TLogin> && sizeof(TLogin) == 2632);
 static_assert(offsetof(TLogin, nSize) == 0);

@@ -10,13 +10,13 @@
 
 struct SETMULTIPAR
 {
-    char const* key;         // UTF-8; null only in the terminator
+    char const* key;  // UTF-8; null only in the terminator
     PARAM_TYPE type;
-    int reserved12;          // zero
-    void const* value;       // the text or pointer itself, else the value's address: see PARAM_TYPE.h
-    int pos;                 // -1 the key as a whole, 0 and up one value, -2 append
-    bool ok;                 // result, set by whoever carried the record out
-    char reserved29[3];      // zero
+    int reserved12;      // zero
+    void const* value;   // the text or pointer itself, else the value's address: see PARAM_TYPE.h
+    int pos;             // -1 the key as a whole, 0 and up one value, -2 append
+    bool ok;             // result, set by whoever carried the record out
+    char reserved29[3];  // zero
 };
 static_assert(std::is_standard_layout_v<SETMULTIPAR> && std::is_trivial_v<SETMULTIPAR>);
 static_assert(sizeof(SETMULTIPAR) == 32);

@@ -22,10 +22,10 @@ enum : int
 
 extern "C"
 {
-    COMGUI_EXPORT bool TICKET_TYPE_Valid(int type);           // 0 to 99
-    COMGUI_EXPORT bool TICKET_ID_Valid(int id);               // 24 bits: 0 to 16777215
-    COMGUI_EXPORT bool TICKET_Valid(int type, int id);        // both of the above
-    COMGUI_EXPORT bool TICKETLOCK_ID_Valid(int id);           // 0 to 19
-    COMGUI_EXPORT bool TICKETLOCK_OWNER_Valid(int owner);     // 0 and above
-    COMGUI_EXPORT bool TICKET_NOTIFICATION_Valid(int id);     // 0 and above
+    COMGUI_EXPORT bool TICKET_TYPE_Valid(int type);        // 0 to 99
+    COMGUI_EXPORT bool TICKET_ID_Valid(int id);            // 24 bits: 0 to 16777215
+    COMGUI_EXPORT bool TICKET_Valid(int type, int id);     // both of the above
+    COMGUI_EXPORT bool TICKETLOCK_ID_Valid(int id);        // 0 to 19
+    COMGUI_EXPORT bool TICKETLOCK_OWNER_Valid(int owner);  // 0 and above
+    COMGUI_EXPORT bool TICKET_NOTIFICATION_Valid(int id);  // 0 and above
 }

@@ -1,0 +1,60 @@
+// Questions that are answered from local state alone.
+#include "comgui/session/ComGUIManager.h"
+
+#include <cstring>
+#include <wx/filefn.h>
+#include <wx/utils.h>
+
+namespace
+{
+constexpr int Administrator = 16;  // a role, not a bit: 17 and 48 are no administrators
+
+wxString Text(char const* utf8) { return wxString::FromUTF8(utf8); }
+
+// Whether the host text names this machine, the local address apart.
+bool NamesThisMachine(char const* host)
+{
+    return wxGetHostName().IsSameAs(Text(host), false) || Text(host).IsSameAs("localhost", false) ||
+           std::strcmp(host, "127.0.0.1") == 0;
+}
+}  // namespace
+
+wxString ComGUIManager::GetServerName() const { return m_serverName; }
+
+int ComGUIManager::GetServerName(TLogin*) const { return -9999; }
+
+wxString ComGUIManager::GetLocalEndPoint() const { return Text(m_pLogin->szLocalEndPoint); }
+
+wxString ComGUIManager::GetCurrentlyLoggedUser() const { return Text(m_pLogin->szUser); }
+
+wxString ComGUIManager::GetCurrentlyLoggedUser(TLogin* login) const { return Text(login->szUser); }
+
+int ComGUIManager::GetCurrentlyLoggedUserTicketID() const { return m_pLogin->iClientStamp; }
+
+bool ComGUIManager::IsCurrentUserAdmin() const { return IsCurrentUserAdmin(m_pLogin); }
+
+bool ComGUIManager::IsCurrentUserAdmin(TLogin* login) const { return login->iUserRole == Administrator; }
+
+wxString ComGUIManager::GetUserLockInfo() const { return GetUserLockInfo(m_pLogin); }
+
+wxString ComGUIManager::GetUserLockInfo(TLogin* login) const
+{
+    return wxString("http://") << Text(login->szLocalAddress) << ":" << login->iLocalPort;
+}
+
+bool ComGUIManager::IsServerLocal() const
+{
+    return std::strcmp(m_pLogin->szServerHost, m_pLogin->szLocalAddress) == 0 ||
+           NamesThisMachine(m_pLogin->szServerHost);
+}
+
+bool ComGUIManager::IsServerLocal(TLogin* login) const
+{
+    // Unlike the form above, and on purpose, the letter case of the address does not count here.
+    return Text(login->szLocalAddress).IsSameAs(Text(login->szServerHost), false) ||
+           NamesThisMachine(login->szServerHost);
+}
+
+bool ComGUIManager::IsTernServerLocal() const { return wxFileExists("ComGUISrv.Dll"); }
+
+int ComGUIManager::GetEndian() const { return 0x49494949; }

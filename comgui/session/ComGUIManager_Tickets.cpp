@@ -1,0 +1,148 @@
+// Operations that go from the session straight to the slots of a ticket container. Which of them test for
+// a login, and which for a null container, differs from one to the next; hosts rely on each as it is.
+#include "comgui/session/ComGUIManager.h"
+
+#include "comgui/ticket/TICKET_ID.h"
+
+namespace
+{
+constexpr int NotLoggedIn = -1;  // also: no container
+
+// Reads the values under a key one by one. get(ptype, value, pos) is a GetParameter with everything else
+// filled in. Its answers are not looked at: what a failed read leaves in place counts.
+template <typename Array, typename Element, typename Get, typename Convert>
+Array ReadArray(PARAM_TYPE ptype, Element element, Get get, Convert convert)
+{
+    Array result;
+    long long word = -1;  // 64 bits, since the module writes as many
+    get(PARAM_COUNT, &word, -1);
+    int const count = static_cast<int>(word);
+    for (int pos = 0; pos < count; ++pos)
+    {
+        get(ptype, &element, pos);
+        result.Add(convert(element));
+    }
+    return result;
+}
+
+template <typename Get>
+wxArrayInt ReadIntArray(Get get)
+{
+    return ReadArray<wxArrayInt>(PARAM_INT, 0, get, [](int value) { return value; });
+}
+
+template <typename Get>
+wxArrayString ReadStringArray(Get get)
+{
+    return ReadArray<wxArrayString>(PARAM_STRING, static_cast<char const*>(nullptr), get,
+                                    [](char const* text)
+                                    { return text ? wxString::FromUTF8(text) : wxString(); });
+}
+
+auto ReaderOf(ComGUIManager& manager, MTICKET_ACCESS const* container, int type, int id, char const* key)
+{
+    return [&manager, container, type, id, key](PARAM_TYPE ptype, void* value, int pos)
+    { return manager.GetParameter(container, type, id, key, ptype, value, pos); };
+}
+}  // namespace
+
+int ComGUIManager::GetParameter(int type, int id, char const* key, PARAM_TYPE ptype, void* value, int pos)
+{
+    if (!m_bLoggedIn)
+        return NotLoggedIn;
+    return m_pClientContainer->MGETPARAMETER(m_pClientContainer->Instance, type, id, key, ptype, value, pos);
+}
+
+int ComGUIManager::GetParameter(MTICKET_ACCESS const* container, int type, int id, char const* key,
+                                PARAM_TYPE ptype, void* value, int pos)
+{
+    if (!m_bLoggedIn || !container)
+        return NotLoggedIn;
+    return container->MGETPARAMETER(container->Instance, type, id, key, ptype, value, pos);
+}
+
+int ComGUIManager::SetParameter(int type, int id, char const* key, PARAM_TYPE ptype, void const* value,
+                                int pos)
+{
+    return SetParameter(m_pClientContainer, type, id, key, ptype, value, pos);
+}
+
+int ComGUIManager::SetParameter(MTICKET_ACCESS const* container, int type, int id, char const* key,
+                                PARAM_TYPE ptype, void const* value, int pos)
+{
+    if (!m_bLoggedIn)
+        return NotLoggedIn;
+    return container->MSETPARAMETER(container->Instance, type, id, key, ptype, value, pos);
+}
+
+int ComGUIManager::GetSystemTicketParamForKey(char const* key, PARAM_TYPE ptype, void* value, int pos)
+{
+    return GetSystemTicketParamForKey(m_pClientContainer, key, ptype, value, pos);
+}
+
+int ComGUIManager::GetSystemTicketParamForKey(MTICKET_ACCESS const* container, char const* key,
+                                              PARAM_TYPE ptype, void* value, int pos)
+{
+    return container->MGETPARAMETER(container->Instance, SYSTEM_TICKET_TYPE, SYSTEM_TICKET_ID, key, ptype,
+                                    value, pos);
+}
+
+int ComGUIManager::GetValueCount(MTICKET_ACCESS const* container, int type, int id, wxString key)
+{
+    long long count = 0;  // 64 bits, since the module writes as many
+    int const found =
+        container->MGETPARAMETER(container->Instance, type, id, key.utf8_str(), PARAM_COUNT, &count, -1);
+    return found ? static_cast<int>(count) : 0;
+}
+
+wxArrayInt ComGUIManager::GetIntArray(int type, int id, char* key)
+{
+    return ReadIntArray([&](PARAM_TYPE ptype, void* value, int pos)
+                        { return GetParameter(type, id, key, ptype, value, pos); });
+}
+
+wxArrayInt ComGUIManager::GetIntArray(MTICKET_ACCESS const* container, int type, int id, char* key)
+{
+    return ReadIntArray(ReaderOf(*this, container, type, id, key));
+}
+
+wxArrayInt ComGUIManager::GetIntArray(MTICKET_ACCESS const* container, int type, int id, wxString key)
+{
+    return ReadIntArray(ReaderOf(*this, container, type, id, key.utf8_str()));
+}
+
+wxArrayString ComGUIManager::GetStringArray(int type, int id, char* key)
+{
+    return ReadStringArray([&](PARAM_TYPE ptype, void* value, int pos)
+                           { return GetParameter(type, id, key, ptype, value, pos); });
+}
+
+wxArrayString ComGUIManager::GetStringArray(MTICKET_ACCESS const* container, int type, int id, char* key)
+{
+    return ReadStringArray(ReaderOf(*this, container, type, id, key));
+}
+
+wxArrayString ComGUIManager::GetStringArray(MTICKET_ACCESS const* container, int type, int id, wxString key)
+{
+    return ReadStringArray(ReaderOf(*this, container, type, id, key.utf8_str()));
+}
+
+int ComGUIManager::DeleteTicketOfType(int type, int id)
+{
+    return DeleteTicketOfType(GetClientContainer(), type, id);
+}
+
+int ComGUIManager::DeleteTicketOfType(MTICKET_ACCESS const* container, int type, int id)
+{
+    return container->MOPERATION(container->Instance, type, id, MTICKET_OP_DELETE, nullptr);
+}
+
+int ComGUIManager::GetTicketData(int a, int b, int c, int* size, void* data)
+{
+    return GetTicketData(m_pLogin, a, b, c, size, data);
+}
+
+int ComGUIManager::GetTicketData(TLogin* login, int a, int b, int c, int* size, void* data)
+{
+    return m_interface.GetTicketDataEntry(m_hModuleInstance, login->hSession, a, b, c, size, data);
+}
