@@ -1,0 +1,90 @@
+# What is installed and where: libraries and the plug-in bundle side by side, headers as in the tree, a
+# CMake package and pkg-config files. Nothing of it names the prefix, so the installed tree may be moved.
+if(NOT TARGET comgui_module OR NOT TARGET comgui_host OR NOT TARGET comgui_corefoundation)
+    return()
+endif()
+include(CMakePackageConfigHelpers)
+include(CheckTypeSize)
+include(CheckCXXSourceCompiles)
+
+set(COMGUI_PACKAGE_DIR ${CMAKE_INSTALL_LIBDIR}/cmake/comgui)
+set(COMGUI_BUNDLE_DIR ${CMAKE_INSTALL_LIBDIR}/ComGUI.Bundle)
+
+if(APPLE)
+    set(comgui_beside @loader_path)
+else()
+    set(comgui_beside $ORIGIN)
+endif()
+
+set_target_properties(comgui comgui_host PROPERTIES INSTALL_RPATH ${comgui_beside})
+set_target_properties(comgui_host PROPERTIES EXPORT_NAME host)
+set_target_properties(comgui_corefoundation PROPERTIES INSTALL_RPATH ${comgui_beside} EXPORT_NAME corefoundation)
+set_target_properties(comgui_module PROPERTIES INSTALL_RPATH ${comgui_beside}/../../..)
+
+install(TARGETS comgui comgui_host EXPORT comgui-targets
+    LIBRARY DESTINATION ${CMAKE_INSTALL_LIBDIR} FILE_SET HEADERS)
+# In a folder of its own: a system that has a CoreFoundation must not find this one by accident.
+install(TARGETS comgui_corefoundation EXPORT comgui-targets
+    LIBRARY DESTINATION ${CMAKE_INSTALL_LIBDIR}
+    FILE_SET HEADERS DESTINATION ${CMAKE_INSTALL_INCLUDEDIR}/comgui-corefoundation)
+
+get_target_property(comgui_built_module comgui_module LIBRARY_OUTPUT_DIRECTORY)
+cmake_path(GET comgui_built_module FILENAME comgui_system)    # Linux or MacOS
+install(TARGETS comgui_module LIBRARY DESTINATION ${COMGUI_BUNDLE_DIR}/Contents/${comgui_system})
+install(DIRECTORY ${PROJECT_BINARY_DIR}/lib/ComGUI.Bundle/ DESTINATION ${COMGUI_BUNDLE_DIR}
+    PATTERN Contents/${comgui_system} EXCLUDE)
+
+# What a consumer's wxWidgets and standard library must have in common with those of this build.
+function(comgui_describe_build)
+    set(CMAKE_REQUIRED_LIBRARIES comgui_wxwidgets)
+    set(CMAKE_EXTRA_INCLUDE_FILES wx/string.h)
+    check_type_size(wxString COMGUI_SIZEOF_WXSTRING LANGUAGE CXX)
+    check_cxx_source_compiles("#include <string>\n#ifndef _LIBCPP_VERSION\n#error\n#endif\nint main() {}"
+        COMGUI_USES_LIBCPP)
+    if(COMGUI_USES_LIBCPP)
+        set(COMGUI_STANDARD_LIBRARY libc++ PARENT_SCOPE)
+    else()
+        set(COMGUI_STANDARD_LIBRARY libstdc++ PARENT_SCOPE)
+    endif()
+    get_target_property(folders comgui_wxwidgets INTERFACE_INCLUDE_DIRECTORIES)
+    find_file(COMGUI_WX_VERSION_H wx/version.h PATHS ${folders} NO_DEFAULT_PATH REQUIRED)
+    foreach(part MAJOR MINOR)
+        file(STRINGS ${COMGUI_WX_VERSION_H} line REGEX "define +wx${part}_(VERSION|NUMBER)")
+        string(REGEX MATCH "[0-9]+$" number "${line}")
+        set(COMGUI_WX_${part} ${number} PARENT_SCOPE)
+    endforeach()
+endfunction()
+comgui_describe_build()
+
+configure_file(${PROJECT_SOURCE_DIR}/cmake/comgui-config.cmake.in ${PROJECT_BINARY_DIR}/comgui-config.cmake @ONLY)
+configure_file(${PROJECT_SOURCE_DIR}/cmake/comgui-check.cpp.in ${PROJECT_BINARY_DIR}/comgui-check.cpp @ONLY)
+write_basic_package_version_file(${PROJECT_BINARY_DIR}/comgui-config-version.cmake
+    COMPATIBILITY SameMinorVersion)    # before 1.0.0 every minor version may break
+install(FILES ${PROJECT_BINARY_DIR}/comgui-config.cmake ${PROJECT_BINARY_DIR}/comgui-config-version.cmake
+    ${PROJECT_BINARY_DIR}/comgui-check.cpp ${PROJECT_SOURCE_DIR}/cmake/ComGUIWxWidgets.cmake
+    DESTINATION ${COMGUI_PACKAGE_DIR})
+install(EXPORT comgui-targets NAMESPACE comgui:: DESTINATION ${COMGUI_PACKAGE_DIR})
+
+# wxWidgets has no pkg-config file that these could require, so they carry its flags.
+function(comgui_pkg_config name)
+    get_target_property(folders comgui_wxwidgets INTERFACE_INCLUDE_DIRECTORIES)
+    get_target_property(definitions comgui_wxwidgets INTERFACE_COMPILE_DEFINITIONS)
+    get_target_property(options comgui_wxwidgets INTERFACE_COMPILE_OPTIONS)
+    get_target_property(libraries comgui_wxwidgets INTERFACE_LINK_LIBRARIES)
+    list(FILTER definitions EXCLUDE REGEX "wxUSE_GUI")
+    list(TRANSFORM folders PREPEND "-isystem ")
+    list(TRANSFORM definitions PREPEND "-D")
+    list(REMOVE_ITEM libraries "")
+    list(JOIN folders " " folders)
+    list(JOIN definitions " " definitions)
+    list(JOIN libraries " " COMGUI_PC_LIBS)
+    set(COMGUI_PC_CFLAGS "${folders} ${definitions} -DwxUSE_GUI=0 ${options}")
+    file(RELATIVE_PATH COMGUI_PC_PREFIX ${CMAKE_INSTALL_FULL_LIBDIR}/pkgconfig ${CMAKE_INSTALL_PREFIX})
+    string(REGEX REPLACE "/$" "" COMGUI_PC_PREFIX ${COMGUI_PC_PREFIX})
+    file(RELATIVE_PATH COMGUI_PC_LIBDIR ${CMAKE_INSTALL_PREFIX} ${CMAKE_INSTALL_FULL_LIBDIR})
+    file(RELATIVE_PATH COMGUI_PC_INCLUDEDIR ${CMAKE_INSTALL_PREFIX} ${CMAKE_INSTALL_FULL_INCLUDEDIR})
+    configure_file(${PROJECT_SOURCE_DIR}/cmake/${name}.pc.in ${PROJECT_BINARY_DIR}/${name}.pc @ONLY)
+    install(FILES ${PROJECT_BINARY_DIR}/${name}.pc DESTINATION ${CMAKE_INSTALL_LIBDIR}/pkgconfig)
+endfunction()
+comgui_pkg_config(comgui)
+comgui_pkg_config(comgui_host)

@@ -1,0 +1,10 @@
+# Read by the checks beside it. A check prints each thing that is wrong and fails; it fails too when there
+# is nothing to look at, since a check that has lost its subject would pass for ever.
+set -euo pipefail
+export LC_ALL=C
+
+fail()
+{
+    printf '%s\n' "$*" >&2
+    exit 1
+}
