@@ -25,11 +25,12 @@ struct Change
 {
     enum Kind
     {
-        CreateTicket,  // address only
-        DeleteTicket,  // address only: the ticket with all its values
+        CreateTicket,  // address only; nothing if the ticket is there
+        DeleteTicket,  // address only: the ticket with all its values; nothing if it is not there
         DeleteKey,     // every value under the key
         DeleteValue,   // the value at pos
-        PutValue,      // value at pos (0 and up), in place of what was there
+        PutValue,      // value at pos (0 and up), in place of what was there; fails without the ticket.
+                       // PARAM_NONE and PARAM_POINTER are not stored, but what was there goes
     };
     Kind kind;
     TicketAddress address;
