@@ -147,8 +147,9 @@ void SqliteStorage::FinalizeStatement::operator()(sqlite3_stmt* statement) const
 SqliteStorage::SqliteStorage(std::filesystem::path file, std::function<StorageContent()> const& first)
     : m_file(std::move(file))
 {
-    std::error_code none;
-    bool const hasJournal = std::filesystem::exists(m_file.string() + "-wal", none);
+    std::error_code missing;
+    auto const journalSize = std::filesystem::file_size(m_file.string() + "-wal", missing);
+    bool const hasJournal = !missing && journalSize > 0;
     OpenFile();
     bool const isNew = IsNew();
     if (!isNew)
