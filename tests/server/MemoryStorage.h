@@ -92,7 +92,8 @@ private:
             tickets.erase(change.address);
             break;
         case standin::Change::DeleteKey:
-            std::erase_if(tickets.at(change.address), [&](auto const& entry) { return entry.first.first == key; });
+            std::erase_if(tickets.at(change.address),
+                          [&](auto const& entry) { return entry.first.first == key; });
             break;
         case standin::Change::DeleteValue:
             tickets.at(change.address).erase({key, change.pos});

@@ -50,7 +50,8 @@ protected:
     std::optional<int> Int(standin::TicketAddress address, char const* key, int pos = -1)
     {
         int value = 0;
-        return Server().Get(As("admin"), address, key, PARAM_INT, &value, pos) ? std::optional(value) : std::nullopt;
+        return Server().Get(As("admin"), address, key, PARAM_INT, &value, pos) ? std::optional(value)
+                                                                               : std::nullopt;
     }
     char const* Text(standin::TicketAddress address, char const* key, int pos = -1)
     {

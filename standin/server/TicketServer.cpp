@@ -1,0 +1,302 @@
+#include "standin/server/TicketServer.h"
+
+#include "standin/server/Password.h"
+#include "standin/server/TicketWrites.h"
+#include <algorithm>
+#include <cstdio>
+#include <shared_mutex>
+
+namespace standin
+{
+namespace
+{
+constexpr int LargestId = 0xFFFFFF;
+
+bool InRange(TicketAddress address)
+{
+    return address.type >= 0 && address.type < 100 && address.id >= 0 && address.id <= LargestId;
+}
+
+void Report(char const* line) { std::fprintf(stderr, "%s\n", line); }
+}  // namespace
+
+TicketServer::TicketServer(Storage& storage, std::function<void()> systemTicketChanged)
+    : m_storage(storage), m_systemTicketChanged(std::move(systemTicketChanged))
+{
+    auto const addresses = m_storage.Tickets();
+    m_tickets.reserve(addresses.size());
+    for (TicketAddress const address : addresses)
+    {
+        if (!InRange(address))
+            continue;  // no slot can name it
+        m_tickets.try_emplace(address);
+        auto& ids = m_ids[static_cast<std::size_t>(address.type)];
+        ids.insert(ids.end(), address.id);
+    }
+}
+
+std::shared_ptr<Session> TicketServer::Login(std::string const& user, std::string const& password)
+{
+    std::optional<User> known;
+    {
+        std::lock_guard const lock(m_change);
+        known = m_storage.FindUser(user);
+    }
+    // Slow by intent, so nothing is locked meanwhile; and as slow for a user who does not exist.
+    if (!known)
+    {
+        Password::VerifyNobody(password);
+        return nullptr;
+    }
+    if (!Password::Verify(password, known->passwordHash))
+        return nullptr;
+    return std::make_shared<Session>(m_sessions.Open(), std::move(*known));
+}
+
+bool TicketServer::Logout(Session& session)
+{
+    if (!session.End())
+        return false;
+    m_sessions.Close(session.Number());
+    return true;
+}
+
+Ticket* TicketServer::Find(TicketAddress address)
+{
+    auto const found = m_tickets.find(address);
+    return found == m_tickets.end() ? nullptr : &found->second;
+}
+
+bool TicketServer::Get(Session const& session, TicketAddress address, char const* key, PARAM_TYPE type,
+                       void* value, int pos)
+{
+    if (session.Ended() || !key || !value || pos < -1)
+        return false;
+    std::string_view const text(key);
+    for (;;)
+    {
+        {
+            std::shared_lock const lock(m_memory);
+            Ticket const* const ticket = Find(address);
+            if (!ticket)
+                return false;
+            if (ticket->loaded)
+            {
+                KeyValues const* const values = ticket->Find(m_keys.Find(text));
+                return values && ReadValue(*values, type, value, pos);
+            }
+        }
+        std::lock_guard const lock(m_change);
+        if (!Loaded(address))
+            return false;
+    }
+}
+
+bool TicketServer::GetTable(Session const& session, TicketAddress address, GETMULTIPAR* table)
+{
+    if (!table)
+        return false;
+    for (GETMULTIPAR* record = table; record->key; ++record)
+        record->ok = Get(session, address, record->key, record->type, record->value, record->pos);
+    return true;
+}
+
+Ticket* TicketServer::Loaded(TicketAddress address)
+{
+    Ticket* const ticket = Find(address);
+    if (!ticket || ticket->loaded)
+        return ticket;
+    std::vector<std::pair<std::string, KeyValues>> keys;
+    TicketTexts none;  // positions are new: nothing is taken out
+    try
+    {
+        m_storage.Load(address,
+                       [&](std::string_view key, int pos, StoredValue const& value)
+                       {
+                           if (keys.empty() || keys.back().first != key)
+                               keys.emplace_back(key, KeyValues());
+                           keys.back().second.Put(pos, TicketValue::FromStored(value), none);
+                       });
+    }
+    catch (StorageError const& error)
+    {
+        Report(error.what());
+        return nullptr;
+    }
+    std::lock_guard const lock(m_memory);
+    ticket->keys.reserve(keys.size());
+    for (auto& [key, values] : keys)
+        ticket->keys.insert_or_assign(m_keys.Intern(key), std::move(values));
+    ticket->loaded = true;
+    return ticket;
+}
+
+bool TicketServer::MayWrite(Session const& session, TicketAddress address)
+{
+    if (session.Ended())
+        return false;
+    if (address.type == SystemTicket.type)
+        return session.IsAdministrator();
+    if (address.type == UserTicketType)
+        return session.IsAdministrator() || address.id == session.Who().ticketId;
+    return true;
+}
+
+bool TicketServer::Set(Session const& session, TicketAddress address, char const* key, PARAM_TYPE type,
+                       void const* value, int pos)
+{
+    SETMULTIPAR table[2] = {};
+    table[0].key = key;
+    table[0].type = type;
+    table[0].value = value;
+    table[0].pos = pos;
+    return SetTable(session, address, table) && table[0].ok;  // a null key ends the table: ok stays false
+}
+
+bool TicketServer::SetTable(Session const& session, TicketAddress address, SETMULTIPAR* table)
+{
+    if (!table)
+        return false;
+    for (SETMULTIPAR* record = table; record->key; ++record)
+        record->ok = false;
+    if (!MayWrite(session, address))
+        return false;
+
+    std::lock_guard const lock(m_change);
+    Ticket* const ticket = Loaded(address);
+    if (!ticket)
+        return false;
+    TicketWrites writes(address, *ticket, m_keys, table);
+    if (!Store(writes.Changes()))
+        return false;
+    CarryOut(*ticket, writes);
+    if (!writes.Steps().empty())
+        Changed(address);
+    return true;
+}
+
+bool TicketServer::Store(std::vector<Change> const& changes)
+{
+    if (changes.empty())
+        return true;
+    try
+    {
+        m_storage.Apply(changes);
+        return true;
+    }
+    catch (StorageError const& error)
+    {
+        Report(error.what());
+        return false;
+    }
+}
+
+void TicketServer::CarryOut(Ticket& ticket, TicketWrites& writes)
+{
+    TicketTexts removed;
+    for (TicketWrites::Step& step : writes.Steps())
+    {
+        bool const puts = step.kind == TicketWrites::Step::StartAnew || step.kind == TicketWrites::Step::Put;
+        std::lock_guard const lock(m_memory);
+        step.record->ok = true;
+        Key const key = puts ? m_keys.Intern(step.record->key) : m_keys.Find(step.record->key);
+        if (!key)
+            continue;  // no ticket ever held what is to be deleted
+        KeyValues& values = ticket.keys[key];
+        if (step.kind == TicketWrites::Step::StartAnew || step.kind == TicketWrites::Step::EraseKey)
+            values.Clear(removed);
+        if (step.kind == TicketWrites::Step::Erase)
+            values.Erase(step.pos, removed);
+        if (puts)
+            values.Put(step.pos, std::move(step.value), removed);
+        if (values.Count() == 0)
+            ticket.keys.erase(key);
+    }
+    m_sessions.Retire(std::move(removed));
+}
+
+void TicketServer::Changed(TicketAddress address)
+{
+    if (address != SystemTicket || !m_systemTicketChanged)
+        return;
+    try
+    {
+        m_systemTicketChanged();
+    }
+    catch (std::exception const& error)
+    {
+        Report(error.what());  // the change itself is safe
+    }
+}
+
+bool TicketServer::Exists(TicketAddress address) const
+{
+    std::shared_lock const lock(m_memory);
+    return m_tickets.contains(address);
+}
+
+int TicketServer::NextTicket(int type, int after) const
+{
+    if (!InRange({type, 0}))
+        return -1;
+    std::shared_lock const lock(m_memory);
+    auto const& ids = m_ids[static_cast<std::size_t>(type)];
+    auto const next = ids.upper_bound(after);
+    return next == ids.end() ? -1 : *next;
+}
+
+bool TicketServer::Create(Session const& session, TicketAddress address)
+{
+    if (!InRange(address) || !MayWrite(session, address))
+        return false;
+    std::lock_guard const lock(m_change);
+    if (Find(address) || !Store({Change{Change::CreateTicket, address}}))
+        return false;
+    std::lock_guard const memory(m_memory);
+    m_ids[static_cast<std::size_t>(address.type)].insert(address.id);
+    m_tickets[address].loaded = true;
+    return true;
+}
+
+bool TicketServer::Delete(Session const& session, TicketAddress address)
+{
+    if (address.type == SystemTicket.type || !MayWrite(session, address))
+        return false;
+    if (address.type == UserTicketType && !session.IsAdministrator())
+        return false;  // a user's ticket goes with the user, and that is not the user's to decide
+    std::lock_guard const lock(m_change);
+    if (!Find(address) || !Store({Change{Change::DeleteTicket, address}}))
+        return false;
+    decltype(m_tickets)::node_type ticket;
+    {
+        std::lock_guard const memory(m_memory);
+        m_ids[static_cast<std::size_t>(address.type)].erase(address.id);
+        ticket = m_tickets.extract(address);
+    }
+    TicketTexts removed;  // nobody finds the ticket any more, so this needs no lock
+    for (auto& [key, values] : ticket.mapped().keys)
+        values.Clear(removed);
+    m_sessions.Retire(std::move(removed));
+    return true;
+}
+
+bool TicketServer::Visit(Session const& session, TicketAddress address, Take const& take)
+{
+    if (session.Ended())
+        return false;
+    std::lock_guard const lock(m_change);  // nobody writes meanwhile, so readers need not be kept waiting
+    Ticket const* const ticket = Loaded(address);
+    if (!ticket)
+        return false;
+    std::vector<Ticket::Keys::const_pointer> byKey;
+    byKey.reserve(ticket->keys.size());
+    for (auto const& entry : ticket->keys)
+        byKey.push_back(&entry);
+    std::sort(byKey.begin(), byKey.end(),
+              [](auto* left, auto* right) { return *left->first < *right->first; });
+    for (auto const* const entry : byKey)
+        for (KeyValues::Entry const& value : entry->second.Entries())
+            take(*entry->first, value.pos, value.value.ToStored());
+    return true;
+}
+}  // namespace standin

@@ -1,0 +1,60 @@
+// A table of writes, looked through before any of it is carried out: what each record does to the ticket,
+// and what the storage has to do for it. Each record sees the ticket as the ones before it will leave it.
+#pragma once
+
+#include "comgui/ticket/SETMULTIPAR.h"
+#include "standin/server/Storage.h"
+#include "standin/server/Ticket.h"
+#include <map>
+
+namespace standin
+{
+class TicketWrites
+{
+public:
+    struct Step
+    {
+        enum Kind
+        {
+            StartAnew,  // value at 0 and nothing else
+            Put,
+            Erase,
+            EraseKey,
+        };
+        SETMULTIPAR* record;
+        Kind kind;
+        int pos;
+        TicketValue value;
+    };
+
+    // Leaves the table's ok bytes alone; a record that cannot be carried out gets no step.
+    TicketWrites(TicketAddress address, Ticket const& ticket, KeyPool const& pool, SETMULTIPAR* table);
+
+    // Keys and texts of the changes lie in the table and in the steps, where they stay if the steps are
+    // moved.
+    std::vector<Change> const& Changes() const { return m_changes; }
+    std::vector<Step>& Steps() { return m_steps; }
+
+private:
+    // What earlier records of the table did to a key.
+    struct Draft
+    {
+        KeyValues const* before;
+        std::map<int, bool> touched{};  // position: is there a value now?
+
+        int Count() const;
+    };
+    Draft& DraftOf(std::string_view key);
+    void AddDelete(SETMULTIPAR& record);
+    void AddPut(SETMULTIPAR& record);
+    void Add(SETMULTIPAR& record, Step::Kind kind, int pos, TicketValue value);
+    void Store(Change::Kind kind, std::string_view key, int pos = 0, StoredValue const& value = {});
+
+    TicketAddress m_address;
+    Ticket const& m_ticket;
+    KeyPool const& m_pool;
+    std::unordered_map<std::string_view, Draft> m_drafts;
+    std::vector<Step> m_steps;
+    std::vector<Change> m_changes;
+};
+}  // namespace standin
