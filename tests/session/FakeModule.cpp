@@ -1,0 +1,198 @@
+#include "tests/session/FakeModule.h"
+
+#include "comgui/host/UtilityObjects.h"
+#include "comgui/session/ComGUIGlobals.h"
+#include <CoreFoundation/CoreFoundation.h>
+#include <cstdio>
+#include <cstdlib>
+#include <cstring>
+
+namespace
+{
+FakeModule* current = nullptr;
+
+std::string HexOf(void const* bytes, std::size_t size)
+{
+    std::string hex;
+    for (std::size_t i = 0; i < size; ++i)
+    {
+        char digits[3];
+        std::snprintf(digits, sizeof digits, "%02X", static_cast<unsigned char const*>(bytes)[i]);
+        hex += digits;
+    }
+    return hex;
+}
+}  // namespace
+
+extern "C" COMGUI_EXPORT void* MakeFakeInstance(char const* factory, CFUUIDRef type)
+{
+    CFUUIDBytes const bytes = CFUUIDGetUUIDBytes(type);
+    current->typeUUID = HexOf(&bytes, sizeof bytes);
+    current->factories.emplace_back(factory);
+    return current->Instance();
+}
+
+struct FAKE_ENTRIES
+{
+    static int QueryInterface(void* instance, COMGUI_UUID id, void** out)
+    {
+        EXPECT_EQ(instance, &current->m_instance);
+        current->interfaceUUID = HexOf(id.bytes, sizeof id.bytes);
+        if (current->givesInterface)
+            *out = &current->m_interface;
+        return 0;
+    }
+
+    static unsigned int Release(void* instance)
+    {
+        EXPECT_EQ(instance, &current->m_instance);
+        ++current->released;
+        return 0;
+    }
+
+    static int Open(void** handle)
+    {
+        if (current->setsHandle)
+            *handle = current->Handle();
+        return current->Called("Open", current->Handle());
+    }
+
+    static int WithRecord(char const* entry, void* handle, TLogin* login)
+    {
+        current->login = login;
+        current->copy = *login;
+        return current->Called(entry, handle);
+    }
+
+    static int WithSession(char const* entry, void* handle, void* session)
+    {
+        current->session = session;
+        return current->Called(entry, handle);
+    }
+
+    static int Initialize(void* handle, TLogin* login, int stamp)
+    {
+        current->stamp = stamp;
+        return WithRecord("InitializeEntry", handle, login);
+    }
+
+    static int IsAlive(void* handle, char const* host, int port)
+    {
+        current->host = host;
+        current->port = port;
+        return current->Called("IsAliveEntry", handle);
+    }
+
+    static unsigned int GetLocalAddress(void* handle, char const* host, int port)
+    {
+        EXPECT_EQ(current->host, host);
+        EXPECT_EQ(current->port, port);
+        current->Called("GetLocalAddressEntry", handle);
+        return current->localAddress;
+    }
+
+    static int Login(void* handle, TLogin* login)
+    {
+        int const result = WithRecord("LoginEntry", handle, login);
+        if (current->onLogin)
+            current->onLogin(*login);
+        return result;
+    }
+
+    static int Logout(void* handle, void* session)
+    {
+        if (current->onLogout)
+            current->onLogout();
+        return WithSession("LogoutEntry", handle, session);
+    }
+
+    static int Uninitialize(void* handle, TLogin* login)
+    {
+        return WithRecord("UninitializeEntry", handle, login);
+    }
+
+    static int UninitializeAsync(void* handle, TLogin* login)
+    {
+        return WithRecord("UninitializeAsyncEntry", handle, login);
+    }
+
+    static MTICKET_ACCESS const* GetClientContainer(void* handle, void* session)
+    {
+        WithSession("GetClientContainerEntry", handle, session);
+        return current->container;
+    }
+
+    static int GetTicketData(void* handle, void* session, int a, int b, int c, int* size, void* data)
+    {
+        current->ints = {a, b, c};
+        current->pointers = {size, data};
+        return WithSession("GetTicketDataEntry", handle, session);
+    }
+};
+
+FakeModule::FakeModule()
+{
+    current = this;
+    table.QueryInterface = FAKE_ENTRIES::QueryInterface;
+    table.Release = FAKE_ENTRIES::Release;
+    table.Open = FAKE_ENTRIES::Open;
+    table.InitializeEntry = FAKE_ENTRIES::Initialize;
+    table.IsAliveEntry = FAKE_ENTRIES::IsAlive;
+    table.GetLocalAddressEntry = FAKE_ENTRIES::GetLocalAddress;
+    table.LoginEntry = FAKE_ENTRIES::Login;
+    table.LogoutEntry = FAKE_ENTRIES::Logout;
+    table.UninitializeEntry = FAKE_ENTRIES::Uninitialize;
+    table.UninitializeAsyncEntry = FAKE_ENTRIES::UninitializeAsync;
+    table.GetClientContainerEntry = FAKE_ENTRIES::GetClientContainer;
+    table.GetTicketDataEntry = FAKE_ENTRIES::GetTicketData;
+    table.STicketFactory = &factory;
+}
+
+FakeModule::~FakeModule()
+{
+    current = nullptr;
+    hSTicketInstance = nullptr;
+}
+
+void* FakeModule::Instance() { return &m_instance; }
+
+int FakeModule::Called(char const* entry, void* handle)
+{
+    EXPECT_EQ(handle, Handle()) << entry;
+    calls.emplace_back(entry);
+    auto const result = results.find(entry);
+    return result == results.end() ? 0 : result->second;
+}
+
+BundleOnDisk EmptyBundle(TemporaryFolder const& folder)
+{
+    BundleOnDisk bundle(folder.Path());
+    bundle.LinkExecutable(SESSION_TEST_PLUGIN);
+    return bundle;
+}
+
+WithModule::WithModule()
+{
+    EmptyBundle(folder).AddFactory(COMGUI_PLUGIN_TYPE_UUID, FirstUUID, "FirstFactory");
+    LookIn(folder);
+}
+
+WithModule::~WithModule() { UtilityObjects::SetPlugInsFolder(wxString()); }
+
+void WithModule::LookIn(TemporaryFolder const& plugIns)
+{
+    UtilityObjects::SetPlugInsFolder(wxString::FromUTF8(plugIns.Path().c_str()));
+}
+
+TLogin* WithModule::NewRecord()
+{
+    auto* const login = static_cast<TLogin*>(std::calloc(1, sizeof(TLogin)));
+    login->nSize = sizeof(TLogin);
+    return login;
+}
+
+void WithManager::LogIn()
+{
+    module.container = fake.Access();
+    ASSERT_EQ(manager.Login(nullptr, nullptr, nullptr, -1), 0);
+}

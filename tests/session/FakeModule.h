@@ -1,0 +1,96 @@
+// A communication module under a test's control, served to the library through a bundle on disk: it writes
+// down every call of an entry and answers as it is told. One at a time; for one thread.
+#pragma once
+
+#include "comgui/session/ComGUIManager.h"
+#include "tests/support/BundleOnDisk.h"
+#include "tests/support/ContainerFake.h"
+#include "tests/support/TemporaryFolder.h"
+#include <functional>
+#include <gtest/gtest.h>
+#include <map>
+#include <string>
+#include <vector>
+
+class FakeModule
+{
+public:
+    FakeModule();
+    ~FakeModule();
+    FakeModule(FakeModule const&) = delete;
+    FakeModule& operator=(FakeModule const&) = delete;
+
+    // --- what it shall do --------------------------------------------------------------------------------
+    bool givesInterface = true;
+    bool setsHandle = true;                  // Open stores a handle
+    std::map<std::string, int> results;      // of the entries, by name; 0 where nothing stands
+    unsigned int localAddress = 0x0A141EC8;  // 10.20.30.200
+    MTICKET_ACCESS const* container = nullptr;
+    std::function<void(TLogin&)> onLogin;  // fills in the record as a plug-in does
+    std::function<void()> onLogout;
+
+    // --- what it saw -------------------------------------------------------------------------------------
+    std::vector<std::string> factories;  // that were asked for an instance
+    std::string typeUUID;                // with which they were, as hex digits
+    std::string interfaceUUID;
+    int released = 0;                // the factory's instance
+    std::vector<std::string> calls;  // of entries, by name
+    TLogin* login = nullptr;         // the record that came last; the manager's own, so a test may look
+    TLogin copy = {};                // what that record held then
+    int stamp = 0;                   // that came with it
+    void* session = nullptr;         // the session handle that came last
+    std::string host;
+    int port = 0;
+    std::vector<int> ints;  // the arguments of GetTicketDataEntry behind the session
+    std::vector<void*> pointers;
+
+    // The live table; the library copies it when a manager is made.
+    ComGUIModuleInterface table = {};
+    STicketFactory factory = {};
+
+    void* Handle() { return &m_handle; }
+    void* Instance();  // what a factory gives out
+    int Called(char const* entry, void* handle);
+
+private:
+    char m_handle = 0;
+    ComGUIModuleInterface* m_instance = &table;   // COM style: an instance's first word is its table
+    ComGUIModuleInterface* m_interface = &table;  // what QueryInterface hands out is another object
+    friend struct FAKE_ENTRIES;
+};
+
+// A bundle with that module and no factory yet.
+BundleOnDisk EmptyBundle(TemporaryFolder const& folder);
+
+inline constexpr char FirstUUID[] = "11111111-1111-1111-1111-111111111111";
+inline constexpr char SecondUUID[] = "22222222-2222-2222-2222-222222222222";
+
+// A module in a bundle where the library looks for plug-ins.
+class WithModule : public testing::Test
+{
+protected:
+    WithModule();
+    ~WithModule() override;
+
+    // From here on the library looks for its plug-in there; in an empty folder it finds none.
+    static void LookIn(TemporaryFolder const& plugIns);
+    void LoseTheBundle() { LookIn(empty); }
+
+    // A record that a manager may free.
+    static TLogin* NewRecord();
+
+    FakeModule module;
+    TemporaryFolder folder;
+    TemporaryFolder empty;
+};
+
+// The same with a manager that has opened it.
+class WithManager : public WithModule
+{
+protected:
+    // A manager that is logged in with the fake container.
+    void LogIn();
+
+    ContainerFake fake;
+    ComGUIManager manager;
+};

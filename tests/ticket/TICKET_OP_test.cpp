@@ -1,0 +1,51 @@
+#include "comgui/ticket/TICKET_OP.h"
+
+#include <gtest/gtest.h>
+
+TEST(IsSTICKET_OP, NegativeCode_CountsAsSingleTicket_ByDesign) { EXPECT_TRUE(IsSTICKET_OP(-1)); }
+
+TEST(IsSTICKET_OP, NinetyNine_IsTheLast)
+{
+    EXPECT_TRUE(IsSTICKET_OP(99));
+    EXPECT_FALSE(IsSTICKET_OP(100));
+}
+
+TEST(IsMTICKET_OP, Hundred_IsTheFirst)
+{
+    EXPECT_FALSE(IsMTICKET_OP(-1));
+    EXPECT_FALSE(IsMTICKET_OP(99));
+    EXPECT_TRUE(IsMTICKET_OP(100));
+}
+
+TEST(TicketOperationCodes, HaveTheValuesTheModuleKnows)
+{
+    EXPECT_EQ(STICKET_OP_SET_PARTIAL, 3);
+    EXPECT_EQ(STICKET_OP_FOLDER_VARIABLES, 10);
+    EXPECT_EQ(STICKET_OP_WHOAMI, 11);
+    EXPECT_EQ(STICKET_OP_SET_MULTIPAR, 98);
+    EXPECT_EQ(STICKET_OP_INVALID, 99);
+    EXPECT_EQ(MTICKET_OP_OPEN, 102);
+    EXPECT_EQ(MTICKET_OP_CREATE_NEXT, 104);
+    EXPECT_EQ(MTICKET_OP_DELETE, 106);
+    EXPECT_EQ(MTICKET_OP_CLOSE, 107);
+    EXPECT_EQ(MTICKET_OP_FOLDER_VARIABLES, 110);
+}
+
+TEST(TICKET_OP, HoldsACodeOfEitherKind)
+{
+    EXPECT_EQ(TICKET_OP(STICKET_OP_SET_PARTIAL).GetInt(), 3);
+    EXPECT_EQ(TICKET_OP(MTICKET_OP_DELETE).GetInt(), 106);
+}
+
+TEST(TICKET_OP, SetInt_ReplacesTheCode)
+{
+    TICKET_OP op(MTICKET_OP_DELETE);
+    op.SetInt(-5);
+    EXPECT_EQ(op.GetInt(), -5);
+}
+
+TEST(TICKET_OP, AsSTICKET_OP_GivesAContainersCodeUnchanged_ByDesign)
+{
+    STICKET_OP const code = TICKET_OP(MTICKET_OP_CLOSE);
+    EXPECT_EQ(static_cast<int>(code), 107);
+}
