@@ -1,6 +1,8 @@
 // The calls of CoreFoundation that open a plug-in, for systems that have no CoreFoundation: same names,
 // types and meaning, and no more than the library uses. What a Create function returns belongs to the
-// caller, who gives it back with CFRelease. Every failure is a null result.
+// caller, who gives it back with CFRelease. Every failure is a null result; a null reference where an object
+// must be (CFRetain, CFRelease, the Get functions) and an index outside an array end the process. All calls
+// may come from any thread. The allocator is only handed through to a factory.
 #pragma once
 
 #include <stdint.h>
@@ -63,8 +65,10 @@ CF_EXPORT CFUUIDBytes CFUUIDGetUUIDBytes(CFUUIDRef uuid);
 CF_EXPORT CFIndex CFArrayGetCount(CFArrayRef array);
 CF_EXPORT void const* CFArrayGetValueAtIndex(CFArrayRef array, CFIndex index);
 
-// Opens the bundle at that URL: a folder with Contents/Info.plist. Null if it is none. Its executable is
-// loaded when a factory is first asked for, and then stays loaded to the end of the process.
+// Opens the bundle at that URL: a folder whose Contents/Info.plist (XML or binary, at most 64 KiB) has
+// CFBundleExecutable, a plain file name, and the dictionaries CFPlugInFactories and CFPlugInTypes. Null if it
+// is none. The executable, Contents/Linux/<CFBundleExecutable>, is loaded when a factory is first called, and
+// then stays loaded to the end of the process. Releasing the plug-in takes its factories away.
 CF_EXPORT CFPlugInRef CFPlugInCreate(CFAllocatorRef allocator, CFURLRef bundleURL);
 
 // The plug-in's factories for that type, as CFUUIDRef in the order of its Info.plist; null if it has none.
@@ -72,7 +76,8 @@ CF_EXPORT CFPlugInRef CFPlugInCreate(CFAllocatorRef allocator, CFURLRef bundleUR
 CF_EXPORT CFArrayRef CFPlugInFindFactoriesForPlugInTypeInPlugIn(CFUUIDRef typeUUID, CFPlugInRef plugIn);
 
 // Calls the factory, void* Factory(CFAllocatorRef, CFUUIDRef typeUUID), of the bundle opened last that has
-// it, and gives what it made; null without such a factory, its executable or its symbol.
+// it, and gives what it made. Null without such a factory, if that bundle does not name it for the type, and,
+// with a line on stderr, without its executable or its function.
 CF_EXPORT void* CFPlugInInstanceCreate(CFAllocatorRef allocator, CFUUIDRef factoryUUID, CFUUIDRef typeUUID);
 
 #ifdef __cplusplus

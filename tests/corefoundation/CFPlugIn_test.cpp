@@ -1,0 +1,327 @@
+#include "tests/corefoundation/Held.h"
+#include "tests/corefoundation/UUIDTexts.h"
+#include "tests/support/BundleOnDisk.h"
+#include "tests/support/TemporaryFolder.h"
+#include "tests/support/TestPlugIn.h"
+
+#include <cstring>
+#include <dlfcn.h>
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+#include <thread>
+#ifdef __SANITIZE_ADDRESS__
+#    include <sanitizer/lsan_interface.h>
+#endif
+
+namespace
+{
+using testing::AllOf;
+using testing::HasSubstr;
+using testing::IsEmpty;
+
+bool IsLoaded(std::filesystem::path const& sharedObject)
+{
+    void* const image = dlopen(sharedObject.c_str(), RTLD_NOW | RTLD_NOLOAD);
+    if (image != nullptr)
+        dlclose(image);
+    return image != nullptr;
+}
+
+// The executable that made the instance, which is a record inside it.
+std::filesystem::path MakerOf(void* instance)
+{
+    Dl_info image{};
+    return dladdr(instance, &image) != 0 ? image.dli_fname : "";
+}
+
+class CFPlugIn : public testing::Test
+{
+protected:
+    // A bundle whose executable has the functions of TestPlugIn.cpp, and nothing else as yet.
+    BundleOnDisk NewBundle(std::string const& name)
+    {
+        BundleOnDisk bundle(folder.Path(), name);
+        bundle.CopyExecutable(COMGUI_TEST_PLUGIN);
+        return bundle;
+    }
+
+    BundleOnDisk NewBundleWithFactory1(std::string const& name)
+    {
+        BundleOnDisk bundle = NewBundle(name);
+        bundle.AddFactory(typeA, factory1, "RecordingFactory");
+        return bundle;
+    }
+
+    // What stderr gets while the factory makes its instance, which it must not do.
+    std::string ComplaintOf(std::string const& factory)
+    {
+        testing::internal::CaptureStderr();
+        EXPECT_EQ(MakeInstance(factory, typeA), nullptr);
+        return testing::internal::GetCapturedStderr();
+    }
+
+    TemporaryFolder const folder;
+};
+
+TEST_F(CFPlugIn, Create_NullURL_IsNull) { EXPECT_EQ(CFPlugInCreate(kCFAllocatorDefault, nullptr), nullptr); }
+
+TEST_F(CFPlugIn, Create_PathThatDoesNotExist_IsNull) { EXPECT_FALSE(OpenPlugIn(folder.Path() / "Missing")); }
+
+TEST_F(CFPlugIn, Create_PathOfAFile_IsNull) { EXPECT_FALSE(OpenPlugIn(folder.Write("ComGUI.Bundle", "x"))); }
+
+TEST_F(CFPlugIn, Create_FolderWithoutInfoPlist_IsNull) { EXPECT_FALSE(OpenPlugIn(folder.Path())); }
+
+TEST_F(CFPlugIn, Create_MissingExecutable_IsAPlugIn)
+{
+    BundleOnDisk const bundle(folder.Path());
+    EXPECT_TRUE(OpenPlugIn(bundle.Path()));
+}
+
+TEST_F(CFPlugIn, FindFactories_TypeThatTheBundleDoesNotName_IsNull)
+{
+    auto const plugIn = OpenPlugIn(NewBundleWithFactory1("One").Path());
+    ASSERT_TRUE(FactoriesOf(plugIn, typeA));
+    EXPECT_FALSE(FactoriesOf(plugIn, typeB));
+}
+
+TEST_F(CFPlugIn, FindFactories_TypeOfAnotherOpenBundle_IsNull)
+{
+    auto const other = OpenPlugIn(NewBundleWithFactory1("Other").Path());
+    auto const plugIn = OpenPlugIn(NewBundle("One").Path());
+    ASSERT_TRUE(FactoriesOf(other, typeA));
+    EXPECT_FALSE(FactoriesOf(plugIn, typeA));
+}
+
+TEST_F(CFPlugIn, FindFactories_UUIDsInOtherLetterCase_AreTheSame)
+{
+    BundleOnDisk bundle = NewBundle("One");
+    bundle.AddFactory("0a0b0c0d-0000-4000-8000-0000000000aA", "f0e0d0c0-1111-4000-8000-000000000001",
+                      "RecordingFactory");
+    auto const plugIn = OpenPlugIn(bundle.Path());
+    EXPECT_TRUE(FactoriesOf(plugIn, typeA));
+    EXPECT_NE(MakeInstance(factory1, typeA), nullptr);
+}
+
+TEST_F(CFPlugIn, FindFactories_NullTypeOrPlugIn_IsNull)
+{
+    auto const plugIn = OpenPlugIn(NewBundleWithFactory1("One").Path());
+    EXPECT_EQ(CFPlugInFindFactoriesForPlugInTypeInPlugIn(nullptr, plugIn.get()), nullptr);
+    EXPECT_EQ(CFPlugInFindFactoriesForPlugInTypeInPlugIn(MakeUUID(typeA).get(), nullptr), nullptr);
+}
+
+TEST_F(CFPlugIn, InstanceCreate_CallsTheFactoryWithAllocatorAndType)
+{
+    auto const plugIn = OpenPlugIn(NewBundleWithFactory1("One").Path());
+    int here = 0;
+    auto const allocator = reinterpret_cast<CFAllocatorRef>(&here);
+    auto const type = MakeUUID(typeA);
+    auto* const record = static_cast<FACTORY_CALL const*>(
+        CFPlugInInstanceCreate(allocator, MakeUUID(factory1).get(), type.get()));
+    ASSERT_NE(record, nullptr);
+    EXPECT_EQ(record->calls, 1);
+    EXPECT_EQ(record->allocator, allocator);
+    CFUUIDBytes const asked = CFUUIDGetUUIDBytes(type.get());
+    EXPECT_EQ(std::memcmp(&record->type, &asked, sizeof asked), 0);
+}
+
+TEST_F(CFPlugIn, InstanceCreate_EachTime_CallsTheFactoryAgain)
+{
+    auto const plugIn = OpenPlugIn(NewBundleWithFactory1("One").Path());
+    void* const first = MakeInstance(factory1, typeA);
+    ASSERT_NE(first, nullptr);
+    EXPECT_EQ(MakeInstance(factory1, typeA), first);
+    EXPECT_EQ(static_cast<FACTORY_CALL const*>(first)->calls, 2);
+}
+
+TEST_F(CFPlugIn, InstanceCreate_FirstTime_LoadsTheExecutable)
+{
+    BundleOnDisk const bundle = NewBundleWithFactory1("One");
+    auto const plugIn = OpenPlugIn(bundle.Path());
+    ASSERT_TRUE(FactoriesOf(plugIn, typeA));
+    EXPECT_FALSE(IsLoaded(bundle.Executable()));
+    EXPECT_NE(MakeInstance(factory1, typeA), nullptr);
+    EXPECT_TRUE(IsLoaded(bundle.Executable()));
+}
+
+TEST_F(CFPlugIn, Release_LoadedExecutable_StaysLoaded)
+{
+    BundleOnDisk const bundle = NewBundleWithFactory1("One");
+    auto plugIn = OpenPlugIn(bundle.Path());
+    auto* const record = static_cast<FACTORY_CALL const*>(MakeInstance(factory1, typeA));
+    ASSERT_NE(record, nullptr);
+    plugIn.reset();
+    EXPECT_TRUE(IsLoaded(bundle.Executable()));
+    EXPECT_EQ(record->calls, 1);
+}
+
+TEST_F(CFPlugIn, InstanceCreate_ExecutableOfAnotherName_IsTheOneOfTheInfoPlist)
+{
+    BundleOnDisk bundle = NewBundleWithFactory1("One");
+    bundle.SetExecutableName("Another name");
+    bundle.LinkExecutable(COMGUI_TEST_PLUGIN);
+    auto const plugIn = OpenPlugIn(bundle.Path());
+    EXPECT_EQ(MakerOf(MakeInstance(factory1, typeA)), bundle.Executable());
+}
+
+TEST_F(CFPlugIn, InstanceCreate_FactoryThatRefuses_IsNullAndSilent)
+{
+    BundleOnDisk bundle = NewBundle("One");
+    bundle.AddFactory(typeA, factory1, "RefusingFactory");
+    auto const plugIn = OpenPlugIn(bundle.Path());
+    EXPECT_THAT(ComplaintOf(factory1), IsEmpty());
+    EXPECT_TRUE(IsLoaded(bundle.Executable()));
+}
+
+TEST_F(CFPlugIn, InstanceCreate_UnknownFactory_IsNullAndSilent)
+{
+    auto const plugIn = OpenPlugIn(NewBundleWithFactory1("One").Path());
+    EXPECT_THAT(ComplaintOf(factory2), IsEmpty());
+}
+
+TEST_F(CFPlugIn, InstanceCreate_TypeThatTheFactoryDoesNotServe_IsNull)
+{
+    BundleOnDisk bundle = NewBundleWithFactory1("One");
+    bundle.AddFactory(typeB, factory2, "RecordingFactory");
+    auto const plugIn = OpenPlugIn(bundle.Path());
+    ASSERT_NE(MakeInstance(factory1, typeA), nullptr);
+    EXPECT_EQ(MakeInstance(factory1, typeB), nullptr);
+}
+
+TEST_F(CFPlugIn, InstanceCreate_FactoryOfTwoTypes_ServesBoth)
+{
+    BundleOnDisk bundle = NewBundleWithFactory1("One");
+    bundle.AddFactory(typeB, factory1, "RecordingFactory");
+    auto const plugIn = OpenPlugIn(bundle.Path());
+    EXPECT_NE(MakeInstance(factory1, typeA), nullptr);
+    EXPECT_NE(MakeInstance(factory1, typeB), nullptr);
+}
+
+TEST_F(CFPlugIn, InstanceCreate_NullFactoryOrType_IsNull)
+{
+    auto const plugIn = OpenPlugIn(NewBundleWithFactory1("One").Path());
+    auto const factory = MakeUUID(factory1);
+    auto const type = MakeUUID(typeA);
+    EXPECT_EQ(CFPlugInInstanceCreate(kCFAllocatorDefault, nullptr, type.get()), nullptr);
+    EXPECT_EQ(CFPlugInInstanceCreate(kCFAllocatorDefault, factory.get(), nullptr), nullptr);
+}
+
+TEST_F(CFPlugIn, InstanceCreate_MissingExecutable_NamesBundleReasonAndRemedy)
+{
+    BundleOnDisk bundle(folder.Path(), "One");
+    bundle.AddFactory(typeA, factory1, "RecordingFactory");
+    auto const plugIn = OpenPlugIn(bundle.Path());
+    EXPECT_THAT(ComplaintOf(factory1),
+                AllOf(HasSubstr(bundle.Path().string() + ": cannot load"), HasSubstr("No such file"),
+                      HasSubstr("; put the shared object that CFBundleExecutable")));
+}
+
+TEST_F(CFPlugIn, InstanceCreate_ExecutablePutInPlaceLater_IsLoadedThen)
+{
+    BundleOnDisk bundle(folder.Path(), "One");
+    bundle.AddFactory(typeA, factory1, "RecordingFactory");
+    auto const plugIn = OpenPlugIn(bundle.Path());
+    EXPECT_THAT(ComplaintOf(factory1), HasSubstr("cannot load"));
+    bundle.CopyExecutable(COMGUI_TEST_PLUGIN);
+    EXPECT_NE(MakeInstance(factory1, typeA), nullptr);
+}
+
+TEST_F(CFPlugIn, InstanceCreate_ExecutableThatIsNoSharedObject_NamesBundleAndReason)
+{
+    BundleOnDisk bundle(folder.Path(), "One");
+    bundle.AddFactory(typeA, factory1, "RecordingFactory");
+    folder.Write(bundle.Executable().lexically_relative(folder.Path()), "no shared object at all");
+    auto const plugIn = OpenPlugIn(bundle.Path());
+    EXPECT_THAT(ComplaintOf(factory1),
+                AllOf(HasSubstr(bundle.Path().string() + ": cannot load"), HasSubstr(": file too short")));
+}
+
+TEST_F(CFPlugIn, InstanceCreate_MissingFunction_NamesBundleFunctionAndRemedy)
+{
+    BundleOnDisk bundle = NewBundle("One");
+    bundle.AddFactory(typeA, factory1, "NoSuchFactory");
+    auto const plugIn = OpenPlugIn(bundle.Path());
+    EXPECT_THAT(ComplaintOf(factory1),
+                AllOf(HasSubstr(bundle.Path().string() + ": has no factory function"),
+                      HasSubstr("undefined symbol: NoSuchFactory"), HasSubstr("; export it with C linkage")));
+}
+
+TEST_F(CFPlugIn, Complaint_IsOneLine)
+{
+    BundleOnDisk bundle(folder.Path(), "One");
+    bundle.AddFactory(typeA, factory1, "RecordingFactory");
+    auto const plugIn = OpenPlugIn(bundle.Path());
+    std::string const text = ComplaintOf(factory1);
+    ASSERT_FALSE(text.empty());
+    EXPECT_EQ(text.find('\n'), text.size() - 1);
+}
+
+TEST_F(CFPlugIn, TwoBundlesWithOneFactory_TheLastOpenedServes)
+{
+    BundleOnDisk const one = NewBundleWithFactory1("One");
+    BundleOnDisk const two = NewBundleWithFactory1("Two");
+    auto const later = OpenPlugIn(two.Path());
+    auto const last = OpenPlugIn(one.Path());
+    EXPECT_EQ(MakerOf(MakeInstance(factory1, typeA)), one.Executable());
+}
+
+TEST_F(CFPlugIn, TwoBundlesWithOneFactory_LastClosed_TheEarlierServesAgain)
+{
+    BundleOnDisk const one = NewBundleWithFactory1("One");
+    BundleOnDisk const two = NewBundleWithFactory1("Two");
+    auto const first = OpenPlugIn(one.Path());
+    auto last = OpenPlugIn(two.Path());
+    ASSERT_EQ(MakerOf(MakeInstance(factory1, typeA)), two.Executable());
+    last.reset();
+    EXPECT_EQ(MakerOf(MakeInstance(factory1, typeA)), one.Executable());
+}
+
+TEST_F(CFPlugIn, TwoBundlesWithOneFactory_LastWithoutExecutable_TheEarlierDoesNotStepIn)
+{
+    BundleOnDisk const one = NewBundleWithFactory1("One");
+    BundleOnDisk two(folder.Path(), "Two");
+    two.AddFactory(typeA, factory1, "RecordingFactory");
+    auto const first = OpenPlugIn(one.Path());
+    auto const last = OpenPlugIn(two.Path());
+    EXPECT_THAT(ComplaintOf(factory1), HasSubstr(two.Path().string()));
+}
+
+TEST_F(CFPlugIn, ClosedBundle_ServesNoMore)
+{
+    auto plugIn = OpenPlugIn(NewBundleWithFactory1("One").Path());
+    ASSERT_NE(MakeInstance(factory1, typeA), nullptr);
+    plugIn.reset();
+    EXPECT_EQ(MakeInstance(factory1, typeA), nullptr);
+}
+
+TEST_F(CFPlugIn, RetainedBundle_ServesUntilTheLastRelease)
+{
+    auto plugIn = OpenPlugIn(NewBundleWithFactory1("One").Path());
+    Held<CFTypeRef> second(CFRetain(plugIn.get()));
+    plugIn.reset();
+    EXPECT_NE(MakeInstance(factory1, typeA), nullptr);
+    second.reset();
+    EXPECT_EQ(MakeInstance(factory1, typeA), nullptr);
+}
+
+TEST_F(CFPlugIn, BundleOpenedTwice_ServesUntilBothAreClosed)
+{
+    BundleOnDisk const bundle = NewBundleWithFactory1("One");
+    auto first = OpenPlugIn(bundle.Path());
+    auto second = OpenPlugIn(bundle.Path());
+    first.reset();
+    EXPECT_NE(MakeInstance(factory1, typeA), nullptr);
+    second.reset();
+    EXPECT_EQ(MakeInstance(factory1, typeA), nullptr);
+}
+
+#ifdef __SANITIZE_ADDRESS__
+TEST_F(CFPlugIn, NeverClosed_IsNoLeak)
+{
+    BundleOnDisk const bundle = NewBundleWithFactory1("One");
+    // On a stack of its own, where no forgotten copy of the reference can hide a leak.
+    std::thread([&] { OpenPlugIn(bundle.Path()).release(); }).join();
+    ASSERT_NE(MakeInstance(factory1, typeA), nullptr);
+    EXPECT_EQ(__lsan_do_recoverable_leak_check(), 0);
+}
+#endif
+}  // namespace

@@ -1,0 +1,35 @@
+#include "tests/corefoundation/Held.h"
+#include "tests/support/BundleOnDisk.h"
+#include "tests/support/TemporaryFolder.h"
+
+#include <gtest/gtest.h>
+
+namespace
+{
+TEST(CFURLCreateWithFileSystemPath, NullPath_IsNull)
+{
+    EXPECT_EQ(CFURLCreateWithFileSystemPath(kCFAllocatorDefault, nullptr, kCFURLPOSIXPathStyle, true),
+              nullptr);
+}
+
+TEST(CFURLCreateWithFileSystemPath, EmptyPath_IsNull) { EXPECT_FALSE(MakeURL("")); }
+
+TEST(CFURLCreateWithFileSystemPath, OtherPathStyle_IsNull)
+{
+    CFURLPathStyle const windows = 2;
+    auto const path = MakeString("/tmp");
+    EXPECT_EQ(CFURLCreateWithFileSystemPath(kCFAllocatorDefault, path.get(), windows, true), nullptr);
+}
+
+TEST(CFURLCreateWithFileSystemPath, PathThatDoesNotExist_IsAnURL) { EXPECT_TRUE(MakeURL("/no/such/place")); }
+
+TEST(CFURLCreateWithFileSystemPath, RelativePath_IsTakenFromTheFolderCurrentThen)
+{
+    TemporaryFolder const folder;
+    BundleOnDisk const bundle(folder.Path());
+    std::filesystem::current_path(folder.Path());
+    auto const url = MakeURL("ComGUI.Bundle");
+    std::filesystem::current_path("/");
+    EXPECT_TRUE(Held<CFPlugInRef>(CFPlugInCreate(kCFAllocatorDefault, url.get())));
+}
+}  // namespace
