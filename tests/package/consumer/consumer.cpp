@@ -1,31 +1,41 @@
-// Calls the library and has it load the installed plug-in bundle: headers, libraries and bundle of an
-// installation belong together.
+// Calls the library and has it load the installed plug-in: headers, libraries and bundle of an installation
+// belong together. It calls nothing of the host library, which must be linked all the same.
 #include <comgui/comgui.h>
 
-#include <cstdio>
 #include <cstring>
+#include <fstream>
+#include <iostream>
+#include <string>
+
+static_assert(__cplusplus == 201703L, "the public headers are for C++17");
+
+// Where the plug-in's executable was loaded from, as the system knows it.
+static std::string LoadedPlugIn()
+{
+    std::ifstream maps("/proc/self/maps");
+    for (std::string line; std::getline(maps, line);)
+    {
+        if (line.find(COMGUI_BUNDLE_NAME "/") != std::string::npos)
+            return line.substr(line.find('/'));
+    }
+    return {};
+}
 
 int main()
 {
-    static_assert(__cplusplus == 201703L);
-
     char text[8];
     stracpy(text, "a host of its own", sizeof text);
     if (std::strcmp(text, "a host ") != 0)
     {
-        std::puts("stracpy gives the wrong text");
+        std::cerr << "stracpy gives the wrong text\n";
         return 1;
     }
-    wxString bundle;
-    UtilityObjects::GetPlugInsPath(bundle, L"ComGUI.Bundle");
-    std::printf("plug-in: %s\n", static_cast<char const*>(bundle.utf8_str()));
-
     ComGUIManager::GetInstance();
     if (hSTicketInstance == nullptr)
     {
-        std::puts("the plug-in was not loaded");
+        std::cerr << "the plug-in was not loaded\n";
         return 1;
     }
-    std::puts("the plug-in is loaded");
+    std::cout << LoadedPlugIn() << '\n';
     return 0;
 }
