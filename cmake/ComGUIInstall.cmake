@@ -23,10 +23,14 @@ set_target_properties(comgui_module PROPERTIES INSTALL_RPATH ${comgui_beside}/..
 
 install(TARGETS comgui comgui_host EXPORT comgui-targets
     LIBRARY DESTINATION ${CMAKE_INSTALL_LIBDIR} FILE_SET HEADERS)
-# In a folder of its own: a system that has a CoreFoundation must not find this one by accident.
-install(TARGETS comgui_corefoundation EXPORT comgui-targets
-    LIBRARY DESTINATION ${CMAKE_INSTALL_LIBDIR}
-    FILE_SET HEADERS DESTINATION ${CMAKE_INSTALL_INCLUDEDIR}/comgui-corefoundation)
+if(APPLE)
+    install(TARGETS comgui_corefoundation EXPORT comgui-targets)    # no more than the system's own
+else()
+    # In a folder of its own: a system that has a CoreFoundation must not find this one by accident.
+    install(TARGETS comgui_corefoundation EXPORT comgui-targets
+        LIBRARY DESTINATION ${CMAKE_INSTALL_LIBDIR}
+        FILE_SET HEADERS DESTINATION ${CMAKE_INSTALL_INCLUDEDIR}/comgui-corefoundation)
+endif()
 
 get_target_property(comgui_built_module comgui_module LIBRARY_OUTPUT_DIRECTORY)
 cmake_path(GET comgui_built_module FILENAME comgui_system)    # Linux or MacOS
