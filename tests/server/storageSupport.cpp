@@ -39,7 +39,7 @@ void WriteFile(std::filesystem::path const& file, std::string const& content)
     std::ofstream(file, std::ios::binary) << content;
 }
 
-std::string ReadFile(std::filesystem::path const& file)
+std::string ContentOf(std::filesystem::path const& file)
 {
     std::ifstream stream(file, std::ios::binary);
     EXPECT_TRUE(stream) << file;

@@ -35,7 +35,7 @@ private:
 };
 
 void WriteFile(std::filesystem::path const& file, std::string const& content);
-std::string ReadFile(std::filesystem::path const& file);
+std::string ContentOf(std::filesystem::path const& file);
 
 // A forked process that runs work and ends with 0, or with 1 after an exception.
 class ChildProcess

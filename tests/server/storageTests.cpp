@@ -491,7 +491,7 @@ TEST_F(SqliteStorageFile, FileOfAnotherKind_IsDamaged)
 {
     WriteFile(File(), "garbage");
     EXPECT_TRUE(IsReportedAsDamaged());
-    EXPECT_EQ(ReadFile(File()), "garbage");
+    EXPECT_EQ(ContentOf(File()), "garbage");
     WriteFile(File(), std::string(8192, 'x'));
     EXPECT_TRUE(IsReportedAsDamaged());
 }
@@ -514,10 +514,10 @@ TEST_F(SqliteStorageFile, NewerSchema_IsRefusedAndLeftAsItIs)
 {
     MakeWithOneTicket();
     RunSql(File(), "PRAGMA user_version = 2");
-    std::string const before = ReadFile(File());
+    std::string const before = ContentOf(File());
     EXPECT_FALSE([this] { return ReasonOfOpening(); }().empty());
     EXPECT_THAT(ReasonOfOpening(), testing::AllOf(HasSubstr(File().string()), HasSubstr("newer version")));
-    EXPECT_EQ(ReadFile(File()), before);
+    EXPECT_EQ(ContentOf(File()), before);
     bool damaged = true;
     try
     {
@@ -540,7 +540,7 @@ TEST_F(SqliteStorageFile, MissingTable_IsDamaged)
 TEST_F(SqliteStorageFile, CutAnywhere_IsDamaged)
 {
     MakeWithOneTicket();
-    std::string const whole = ReadFile(File());
+    std::string const whole = ContentOf(File());
     for (std::size_t size = 2; size < whole.size(); size += 511)  // one byte counts as an empty file
     {
         WriteFile(File(), whole.substr(0, size));
@@ -551,7 +551,7 @@ TEST_F(SqliteStorageFile, CutAnywhere_IsDamaged)
 TEST_F(SqliteStorageFile, OverwrittenPage_IsDamaged)
 {
     MakeWithOneTicket();
-    std::string const whole = ReadFile(File());
+    std::string const whole = ContentOf(File());
     std::size_t const page = 4096;
     ASSERT_GE(whole.size(), 2 * page);
     for (std::size_t first = 0; first + page <= whole.size(); first += page)
@@ -560,7 +560,7 @@ TEST_F(SqliteStorageFile, OverwrittenPage_IsDamaged)
         broken.replace(first, page, page, 'x');
         WriteFile(File(), broken);
         EXPECT_TRUE(IsReportedAsDamaged()) << first;
-        EXPECT_EQ(ReadFile(File()), broken);
+        EXPECT_EQ(ContentOf(File()), broken);
     }
 }
 
