@@ -1,0 +1,271 @@
+// A whole session with a server, step by step, told on the screen: finding the plug-in, testing the server,
+// logging in, reading the system ticket, writing a job ticket that a second session reads, logging out.
+// The exit status is 0 only if every step gave what it should.
+#include <comgui/comgui.h>
+
+#include <cstdio>
+#include <iostream>
+#include <sstream>
+#include <string>
+
+namespace
+{
+constexpr char Host[] = "localhost";
+constexpr int Port = 50000;
+constexpr int JobType = 3;
+constexpr int JobId = 1;
+constexpr int Stamp = 20260101;  // a host's own mark; the plug-in only carries it
+
+std::string Text(wxString const& text) { return text.utf8_string(); }
+
+template <typename Array, typename Convert>
+std::string Joined(Array const& array, Convert convert)
+{
+    std::ostringstream text;
+    for (auto const& element : array)
+        text << (text.tellp() > 0 ? ", " : "") << convert(element);
+    return text.str();
+}
+
+std::string Joined(wxArrayString const& array) { return Joined(array, Text); }
+
+std::string Joined(wxArrayInt const& array)
+{
+    return Joined(array, [](int value) { return value; });
+}
+
+// Tells each step on the screen and keeps count of those that went wrong.
+class Tour
+{
+public:
+    void Chapter(char const* title) { std::cout << '\n' << title << '\n'; }
+
+    // A step whose outcome is known beforehand.
+    template <typename Value>
+    void Expect(std::string const& step, Value const& got, Value const& expected)
+    {
+        bool const good = got == expected;
+        Line(good, step) << got << '\n';
+        if (!good)
+            std::cout << "           expected: " << expected << '\n';
+    }
+
+    // A step that must give something.
+    void ExpectSome(std::string const& step, std::string const& got)
+    {
+        Line(!got.empty(), step) << got << '\n';
+    }
+
+    int ExitStatus() const { return m_failures == 0 ? 0 : 1; }
+
+    void Farewell() const
+    {
+        if (m_failures == 0)
+            std::cout << "\nAll " << m_steps << " steps gave what they should.\n";
+        else
+            std::cout << '\n' << m_failures << " of " << m_steps << " steps FAILED.\n";
+    }
+
+private:
+    std::ostream& Line(bool good, std::string const& step)
+    {
+        ++m_steps;
+        m_failures += good ? 0 : 1;
+        return std::cout << (good ? "  ok      " : "  FAILED  ") << step << ": ";
+    }
+
+    int m_steps = 0;
+    int m_failures = 0;
+};
+
+// The record of a session that the host keeps for itself.
+TLogin Record(char const* user, char const* password, int port)
+{
+    TLogin login = {};
+    login.nSize = sizeof login;
+    stracpy(login.szUser, user, sizeof login.szUser);
+    stracpy(login.szPassword, password, sizeof login.szPassword);
+    stracpy(login.szServerHost, Host, sizeof login.szServerHost);
+    login.iServerPort = port;
+    return login;
+}
+
+// Null if there is none; then the way out is told.
+ComGUIManager* FindPlugIn()
+{
+    ComGUIManager* const manager = ComGUIManager::GetInstance();
+    if (hSTicketInstance)
+        return manager;
+    wxString path;
+    UtilityObjects::GetPlugInsPath(path, L"" COMGUI_BUNDLE_NAME);
+    std::cerr << "session_tour: cannot open the communication plug-in " << Text(path)
+              << ": build or install " COMGUI_BUNDLE_NAME " there\n";
+    return nullptr;
+}
+
+void TestServer(Tour& tour, ComGUIManager& manager)
+{
+    tour.Chapter("Is there a server?");
+    TLogin here = Record("", "", Port);
+    TLogin elsewhere = Record("", "", Port + 1);
+    tour.Expect("IsAlive at localhost:50000", manager.IsAlive(&here), 0);
+    tour.Expect("  our address, as the server sees it", std::string(here.szLocalAddress),
+                std::string("127.0.0.1"));
+    tour.Expect("IsAlive at localhost:50001, where none listens", manager.IsAlive(&elsewhere), -2005);
+    tour.Expect("IsServerLocal", manager.IsServerLocal(&here), true);
+}
+
+bool LogIn(Tour& tour, ComGUIManager& manager)
+{
+    tour.Chapter("Logging in");
+    int const initialized = manager.Initialize("admin", "wrong", Host, Port);
+    tour.Expect("Initialize takes a local port and prepares the session", initialized, 0);
+    tour.Expect("Login with a wrong password is refused", manager.Login("admin", "wrong", Host, Port) != 0,
+                true);
+    tour.Expect("Login of an unknown user is refused", manager.Login("nobody", "", Host, Port) != 0, true);
+    int const result = manager.Login("admin", "admin", Host, Port);
+    tour.Expect("Login as admin", result, 0);
+    if (result != 0)
+        return false;
+    tour.Expect("  the user", Text(manager.GetCurrentlyLoggedUser()), std::string("admin"));
+    tour.Expect("  is an administrator", manager.IsCurrentUserAdmin(), true);
+    tour.ExpectSome("  our end point", Text(manager.GetLocalEndPoint()));
+    tour.ExpectSome("  lock info", Text(manager.GetUserLockInfo()));
+    return true;
+}
+
+void ReadSystemTicket(Tour& tour, ComGUIManager& manager)
+{
+    tour.Chapter("Reading the system ticket (type 0, id 0)");
+    char const* name = nullptr;
+    tour.Expect("System/Name is a text",
+                manager.GetSystemTicketParamForKey("System/Name", PARAM_STRING, &name, -1) != 0, true);
+    tour.ExpectSome("  its value", name ? name : "");
+    int port = 0;
+    manager.GetSystemTicketParamForKey("System/MasterSOAPPort", PARAM_INT, &port, -1);
+    tour.Expect("System/MasterSOAPPort is an int", port, Port);
+
+    char languages[] = "System/Languages";
+    wxArrayString const texts = manager.GetStringArray(0, 0, languages);
+    tour.ExpectSome("System/Languages is a list of texts", Joined(texts));
+    tour.Expect("  with so many values", manager.GetValueCount(manager.GetClientContainer(), 0, 0, languages),
+                static_cast<int>(texts.size()));
+    char resolutions[] = "System/Resolutions";
+    tour.ExpectSome("System/Resolutions is a list of ints", Joined(manager.GetIntArray(0, 0, resolutions)));
+    int missing = 7;
+    tour.Expect("A missing key is found",
+                manager.GetParameter(0, 0, "System/NoSuchKey", PARAM_INT, &missing, -1), 0);
+    tour.Expect("  and leaves our variable", missing, 7);
+}
+
+// What the second session sees of the job ticket.
+class SecondSession
+{
+public:
+    SecondSession(ComGUIManager& manager) : m_manager(manager), m_login(Record("operator", "operator", Port))
+    {
+    }
+
+    bool LogIn()
+    {
+        return m_manager.InitializeBackward(&m_login, Stamp) == 0 && m_manager.LoginBackward(&m_login) == 0 &&
+               (m_container = m_manager.GetBackwardContainer()) != nullptr;
+    }
+
+    int LogOut() { return m_manager.LogoutBackward(&m_login); }
+
+    int Uninitialize() { return m_manager.UninitializeAsync(&m_login); }
+
+    int Read(char const* key, PARAM_TYPE type, void* value) const
+    {
+        return m_manager.GetParameter(m_container, JobType, JobId, key, type, value, -1);
+    }
+
+    wxArrayInt Ints(char const* key) const
+    {
+        return m_manager.GetIntArray(m_container, JobType, JobId, wxString::FromUTF8(key));
+    }
+
+private:
+    ComGUIManager& m_manager;
+    TLogin m_login;
+    MTICKET_ACCESS const* m_container = nullptr;
+};
+
+void ShareJobTicket(Tour& tour, ComGUIManager& manager, SecondSession& second)
+{
+    tour.Chapter("Writing the ticket of job 1, and reading it through a second session");
+    tour.Expect("A second, independent session logs in as operator", second.LogIn(), true);
+
+    int const copies = 250;
+    double const coverage = 61.5;
+    tour.Expect("First session writes an int",
+                manager.SetParameter(JobType, JobId, "Tour/Copies", PARAM_INT, &copies, -1), 1);
+    tour.Expect("  a double",
+                manager.SetParameter(JobType, JobId, "Tour/Coverage", PARAM_DOUBLE, &coverage, -1), 1);
+    tour.Expect("  a text",
+                manager.SetParameter(JobType, JobId, "Tour/Paper", PARAM_STRING, "matt, 135 g/m\xC2\xB2", -1),
+                1);
+    for (int pos = 0; pos < 3; ++pos)
+    {
+        int const page = 10 * (pos + 1);
+        tour.Expect("  value " + std::to_string(pos) + " of a list",
+                    manager.SetParameter(JobType, JobId, "Tour/Pages", PARAM_INT, &page, pos == 0 ? -1 : pos),
+                    1);
+    }
+
+    int seenCopies = 0;
+    double seenCoverage = 0;
+    char const* seenPaper = "";
+    second.Read("Tour/Copies", PARAM_INT, &seenCopies);
+    second.Read("Tour/Coverage", PARAM_DOUBLE, &seenCoverage);
+    second.Read("Tour/Paper", PARAM_STRING, &seenPaper);
+    tour.Expect("Second session reads the int", seenCopies, copies);
+    tour.Expect("  the double", seenCoverage, coverage);
+    tour.Expect("  the text", std::string(seenPaper), std::string("matt, 135 g/m\xC2\xB2"));
+    tour.Expect("  the list", Joined(second.Ints("Tour/Pages")), std::string("10, 20, 30"));
+
+    for (char const* key : {"Tour/Copies", "Tour/Coverage", "Tour/Paper", "Tour/Pages"})
+        tour.Expect(std::string("First session deletes ") + key,
+                    manager.SetParameter(JobType, JobId, key, PARAM_NONE, nullptr, -1), 1);
+    tour.Expect("Second session finds the int", second.Read("Tour/Copies", PARAM_INT, &seenCopies), 0);
+    tour.Expect("  the list", Joined(second.Ints("Tour/Pages")), std::string());
+}
+
+void LogOut(Tour& tour, ComGUIManager& manager, SecondSession& second)
+{
+    tour.Chapter("Logging out");
+    tour.Expect("Second session logs out", second.LogOut(), 0);
+    tour.Expect("First session logs out", manager.Logout(), 0);
+    int value = 7;
+    tour.Expect("A guarded read is answered by the library itself",
+                manager.GetParameter(0, 0, "System/MasterSOAPPort", PARAM_INT, &value, -1), -1);
+    tour.Expect("  and leaves our variable", value, 7);
+    std::cout << "          (giving a session back takes 4 seconds, always)" << std::endl;
+    tour.Expect("Uninitialize of the first", manager.Uninitialize(), 0);
+    tour.Expect("UninitializeAsync of the second", second.Uninitialize(), 0);
+}
+}  // namespace
+
+int main()
+{
+    Tour tour;
+    tour.Chapter("Opening the communication plug-in");
+    ComGUIManager* const manager = FindPlugIn();
+    if (!manager)
+        return 1;
+    wxString path;
+    UtilityObjects::GetPlugInsPath(path, L"" COMGUI_BUNDLE_NAME);
+    tour.ExpectSome("Opened", Text(path));
+
+    TestServer(tour, *manager);
+    if (LogIn(tour, *manager))
+    {
+        ReadSystemTicket(tour, *manager);
+        SecondSession second(*manager);
+        ShareJobTicket(tour, *manager, second);
+        LogOut(tour, *manager, second);
+    }
+    tour.Farewell();
+    return tour.ExitStatus();
+}
