@@ -70,9 +70,17 @@ Ticket* TicketServer::Find(TicketAddress address)
 bool TicketServer::Get(Session const& session, TicketAddress address, char const* key, PARAM_TYPE type,
                        void* value, int pos)
 {
-    if (session.Ended() || !key || !value || pos < -1)
-        return false;
-    std::string_view const text(key);
+    return !session.Ended() && key && value && pos >= -1 && Read(address, key, type, value, pos);
+}
+
+std::optional<int> TicketServer::Int(TicketAddress address, char const* key)
+{
+    int value = 0;
+    return Read(address, key, PARAM_INT, &value, -1) ? std::optional(value) : std::nullopt;
+}
+
+bool TicketServer::Read(TicketAddress address, std::string_view key, PARAM_TYPE type, void* value, int pos)
+{
     for (;;)
     {
         {
@@ -82,7 +90,7 @@ bool TicketServer::Get(Session const& session, TicketAddress address, char const
                 return false;
             if (ticket->loaded)
             {
-                KeyValues const* const values = ticket->Find(m_keys.Find(text));
+                KeyValues const* const values = ticket->Find(m_keys.Find(key));
                 return values && ReadValue(*values, type, value, pos);
             }
         }
@@ -98,7 +106,7 @@ bool TicketServer::GetTable(Session const& session, TicketAddress address, GETMU
         return false;
     for (GETMULTIPAR* record = table; record->key; ++record)
         record->ok = Get(session, address, record->key, record->type, record->value, record->pos);
-    return true;
+    return !session.Ended();
 }
 
 Ticket* TicketServer::Loaded(TicketAddress address)

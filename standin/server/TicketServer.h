@@ -43,7 +43,8 @@ public:
     bool Logout(Session& session);  // false if it had ended before
 
     // The reads and writes are what PARAM_TYPE.h says of value words. Positions: -1 the key as a whole, 0 and
-    // up one value, -2 appends. A failed read leaves *value untouched.
+    // up one value, -2 appends. A failed read leaves *value untouched. GetTable is false only for a null
+    // table and an ended session; a record's ok tells of the record.
     bool Get(Session const& session, TicketAddress address, char const* key, PARAM_TYPE type, void* value,
              int pos);
     bool GetTable(Session const& session, TicketAddress address, GETMULTIPAR* table);
@@ -53,6 +54,9 @@ public:
     // All records that can be carried out are, in order and in one transaction; ok tells which. False, with
     // every ok false, for a ticket that is missing or not the user's to write, and when the storage fails.
     bool SetTable(Session const& session, TicketAddress address, SETMULTIPAR* table);
+
+    // The server's own look at a ticket, with nobody logged in.
+    std::optional<int> Int(TicketAddress address, char const* key);
 
     bool Exists(TicketAddress address) const;
 
@@ -74,6 +78,7 @@ public:
     std::size_t RetiredTexts() const { return m_sessions.Kept(); }
 
 private:
+    bool Read(TicketAddress address, std::string_view key, PARAM_TYPE type, void* value, int pos);
     static bool MayWrite(Session const& session, TicketAddress address);
     Ticket* Find(TicketAddress address);
     Ticket* Loaded(TicketAddress address);  // m_change is held; null if missing or unreadable
