@@ -1,0 +1,27 @@
+// What a client of the module sees of its session: the handle and the table of the ticket container. It
+// stays allocated to the end of the process, since a client may hold the table longer than the session
+// lives; once the session has ended, every slot answers 0.
+#pragma once
+
+#include "comgui/ticket/MTICKET_ACCESS.h"
+#include "standin/server/TicketServer.h"
+
+namespace standin
+{
+class Container
+{
+public:
+    Container(TicketServer& server, std::shared_ptr<Session> session);
+    Container(Container const&) = delete;
+    Container& operator=(Container const&) = delete;
+
+    MTICKET_ACCESS const* Access() const { return &m_access; }
+    TicketServer& Server() const { return m_server; }
+    standin::Session& Session() const { return *m_session; }
+
+private:
+    TicketServer& m_server;
+    std::shared_ptr<standin::Session> const m_session;
+    MTICKET_ACCESS m_access{};
+};
+}  // namespace standin

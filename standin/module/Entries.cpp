@@ -1,0 +1,218 @@
+#include "standin/module/Entries.h"
+
+#include "standin/module/Guard.h"
+#include "standin/module/Handles.h"
+#include "standin/module/ModuleCodes.h"
+#include "standin/module/SiteServer.h"
+#include "standin/module/TicketData.h"
+#include <cstdio>
+#include <cstring>
+#include <strings.h>
+#include <unistd.h>
+
+namespace standin
+{
+namespace
+{
+constexpr unsigned LoopbackAddress = 0x7F000001;
+
+template <typename Work>
+int Entry(void* hInstance, Work const& work) noexcept
+{
+    return Guarded<int>(MODULE_FAILED,
+                        [&]() -> int
+                        { return Handles::Get().IsInstance(hInstance) ? work() : MODULE_UNKNOWN_INSTANCE; });
+}
+
+// An entry for a session that is logged in; work gets its container.
+template <typename Work>
+int SessionEntry(void* hInstance, void* hSession, Work const& work) noexcept
+{
+    return Entry(hInstance,
+                 [&]() -> int
+                 {
+                     Container const* const container = Handles::Get().SessionOf(hSession);
+                     return container ? work(*container) : MODULE_UNKNOWN_SESSION;
+                 });
+}
+
+int NotSupported(void* hInstance, void* hSession) noexcept
+{
+    return SessionEntry(hInstance, hSession, [](Container const&) { return MODULE_NOT_SUPPORTED; });
+}
+
+bool IsValid(TLogin const* login) { return login && login->nSize == sizeof(TLogin); }
+
+// A text of a record, which may fill its field to the last byte.
+std::string TextOf(char const (&field)[128]) { return {field, strnlen(field, sizeof field)}; }
+
+bool IsThisHost(char const* host)
+{
+    char own[256] = "";
+    gethostname(own, sizeof own - 1);
+    return strcasecmp(host, "localhost") == 0 || std::strcmp(host, "127.0.0.1") == 0 ||
+           (*own && strcasecmp(host, own) == 0);
+}
+
+// The server behind host and port, or a code that says why there is none.
+int FindServer(char const* host, int port, TicketServer*& server)
+{
+    if (!IsThisHost(host))
+        return MODULE_NO_SERVER_THERE;
+    server = ServerOfThisSite();
+    if (!server)
+        return MODULE_SITE_UNAVAILABLE;
+    return server->Int(SystemTicket, "System/MasterSOAPPort") == port ? MODULE_DONE : MODULE_NO_SERVER_THERE;
+}
+
+int Open(void** hInstance)
+{
+    return Guarded<int>(MODULE_FAILED,
+                        [&]() -> int
+                        {
+                            if (!hInstance)
+                                return MODULE_INVALID_ARGUMENT;
+                            *hInstance = Handles::Get().NewInstance();
+                            return MODULE_DONE;
+                        });
+}
+
+int Initialize(void* hInstance, TLogin* login, int)
+{
+    return Entry(hInstance,
+                 [&]() -> int
+                 {
+                     if (!IsValid(login))
+                         return MODULE_INVALID_ARGUMENT;
+                     if (!ServerOfThisSite())
+                         return MODULE_SITE_UNAVAILABLE;
+                     Handles::Get().Initialize(login);
+                     return MODULE_DONE;
+                 });
+}
+
+int Uninitialize(void* hInstance, TLogin* login)
+{
+    return Entry(hInstance,
+                 [&]() -> int
+                 { return Handles::Get().Uninitialize(login) ? MODULE_DONE : MODULE_UNKNOWN_RECORD; });
+}
+
+int IsAlive(void* hInstance, char const* host, int port)
+{
+    return Entry(hInstance,
+                 [&]() -> int
+                 {
+                     TicketServer* server = nullptr;
+                     return host ? FindServer(host, port, server) : MODULE_INVALID_ARGUMENT;
+                 });
+}
+
+unsigned int GetLocalAddress(void*, char const*, int) { return LoopbackAddress; }
+
+void FillIn(TLogin& login, User const& user, void* hSession)
+{
+    login.hSession = hSession;
+    login.iClientStamp = user.ticketId;
+    login.iUserRole = user.role;
+    std::snprintf(login.szLocalEndPoint, sizeof login.szLocalEndPoint, "127.0.0.1:%u", login.iLocalPort);
+}
+
+int LogIn(TLogin& login)
+{
+    TicketServer* server = nullptr;
+    int const found = FindServer(TextOf(login.szServerHost).c_str(), login.iServerPort, server);
+    if (found != MODULE_DONE)
+        return found;
+    try
+    {
+        auto const session = server->Login(TextOf(login.szUser), TextOf(login.szPassword));
+        if (!session)
+            return MODULE_LOGIN_REFUSED;
+        FillIn(login, session->Who(), Handles::Get().NewSession(*server, session));
+        return MODULE_DONE;
+    }
+    catch (StorageError const& error)
+    {
+        std::fprintf(stderr, "%s\n", error.what());
+        return MODULE_SITE_UNAVAILABLE;
+    }
+}
+
+int Login(void* hInstance, TLogin* login)
+{
+    return Entry(hInstance,
+                 [&]() -> int { return IsValid(login) ? LogIn(*login) : MODULE_INVALID_ARGUMENT; });
+}
+
+int Logout(void* hInstance, void* hSession)
+{
+    return Entry(hInstance,
+                 [&]() -> int
+                 { return Handles::Get().EndSession(hSession) ? MODULE_DONE : MODULE_UNKNOWN_SESSION; });
+}
+
+MTICKET_ACCESS const* GetClientContainer(void* hInstance, void* hSession)
+{
+    MTICKET_ACCESS const* access = nullptr;
+    SessionEntry(hInstance, hSession,
+                 [&](Container const& container)
+                 {
+                     access = container.Access();
+                     return MODULE_DONE;
+                 });
+    return access;
+}
+
+int GetTicketData(void* hInstance, void* hSession, int type, int id, int format, int* size, void* buffer)
+{
+    return SessionEntry(hInstance, hSession,
+                        [&](Container const& container) {
+                            return CopyTicketData(container, {type, id}, format, size, buffer);
+                        });
+}
+
+int SendCommand(void* hInstance, void* hSession, char const*, int, void*)
+{
+    return NotSupported(hInstance, hSession);
+}
+
+int TransferFile(void* hInstance, void* hSession, char*, char*) { return NotSupported(hInstance, hSession); }
+
+int SendJob(void* hInstance, void* hSession, TJobIdentification*, char*, char*)
+{
+    return NotSupported(hInstance, hSession);
+}
+
+STICKET_ACCESS const* CreateTicket(char const*) { return nullptr; }
+
+void DestroyTicket(STICKET_ACCESS const** ticket)
+{
+    if (ticket)
+        *ticket = nullptr;
+}
+
+STicketFactory ticketFactory{{}, CreateTicket, DestroyTicket};
+}  // namespace
+
+void FillEntries(ComGUIModuleInterface& table)
+{
+    table.Open = Open;
+    table.InitializeEntry = Initialize;
+    table.IsAliveEntry = IsAlive;
+    table.GetLocalAddressEntry = GetLocalAddress;
+    table.LoginEntry = Login;
+    table.LogoutEntry = Logout;
+    table.UninitializeEntry = Uninitialize;
+    table.GetClientContainerEntry = GetClientContainer;
+    table.GetTicketDataEntry = GetTicketData;
+    table.SendCommandEntry = SendCommand;
+    table.PutFileEntry = TransferFile;
+    table.GetFileEntry = TransferFile;
+    table.SendJobEntry = SendJob;
+    table.PutFileSyncEntry = TransferFile;
+    table.STicketFactory = &ticketFactory;
+    table.GetFileSyncEntry = TransferFile;
+    table.UninitializeAsyncEntry = Uninitialize;
+}
+}  // namespace standin

@@ -1,0 +1,61 @@
+#include "standin/module/Handles.h"
+
+#include <bit>
+
+namespace standin
+{
+namespace
+{
+void* HandleOf(std::size_t number) { return std::bit_cast<void*>(number); }
+}  // namespace
+
+Handles& Handles::Get()
+{
+    static auto& handles = *new Handles;
+    return handles;
+}
+
+void* Handles::NewInstance()
+{
+    std::lock_guard const lock(m_lock);
+    return *m_instances.insert(HandleOf(m_instances.size() + 1)).first;
+}
+
+bool Handles::IsInstance(void* hInstance) const
+{
+    std::lock_guard const lock(m_lock);
+    return m_instances.contains(hInstance);
+}
+
+void Handles::Initialize(TLogin const* record)
+{
+    std::lock_guard const lock(m_lock);
+    m_records.insert(record);
+}
+
+bool Handles::Uninitialize(TLogin const* record)
+{
+    std::lock_guard const lock(m_lock);
+    return m_records.erase(record) != 0;
+}
+
+void* Handles::NewSession(TicketServer& server, std::shared_ptr<Session> session)
+{
+    auto container = std::make_unique<Container>(server, std::move(session));
+    std::lock_guard const lock(m_lock);
+    return m_sessions.emplace(HandleOf(m_sessions.size() + 1), std::move(container)).first->first;
+}
+
+Container const* Handles::SessionOf(void* hSession) const
+{
+    std::lock_guard const lock(m_lock);
+    auto const found = m_sessions.find(hSession);
+    return found == m_sessions.end() || found->second->Session().Ended() ? nullptr : found->second.get();
+}
+
+bool Handles::EndSession(void* hSession)
+{
+    Container const* const container = SessionOf(hSession);
+    return container && container->Server().Logout(container->Session());
+}
+}  // namespace standin

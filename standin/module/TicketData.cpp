@@ -1,0 +1,33 @@
+#include "standin/module/TicketData.h"
+
+#include "standin/module/ModuleCodes.h"
+#include "standin/server/TicketXml.h"
+#include <cstring>
+#include <limits>
+
+namespace standin
+{
+int CopyTicketData(Container const& container, TicketAddress address, int format, int* size, void* buffer)
+{
+    if (!size)
+        return MODULE_INVALID_ARGUMENT;
+    if (format != TicketDataXml)
+        return MODULE_UNKNOWN_FORMAT;
+    TicketXml xml;
+    xml.address = address;
+    bool const exists = container.Server().Visit(
+        container.Session(), address,
+        [&xml](std::string_view key, int pos, StoredValue const& value) { xml.Put(key, pos, value); });
+    if (!exists)
+        return MODULE_UNKNOWN_TICKET;
+    std::string const text = xml.Text();
+    if (text.size() > static_cast<std::size_t>(std::numeric_limits<int>::max()))
+        return MODULE_FAILED;  // the size has no room in an int
+    int const room = buffer ? *size : 0;
+    *size = static_cast<int>(text.size());
+    if (room < *size)
+        return MODULE_BUFFER_TOO_SMALL;
+    std::memcpy(buffer, text.data(), text.size());
+    return MODULE_DONE;
+}
+}  // namespace standin

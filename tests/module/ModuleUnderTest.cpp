@@ -1,0 +1,61 @@
+#include "tests/module/ModuleUnderTest.h"
+
+#include "comgui/foundation/stracpy.h"
+#include <CoreFoundation/CoreFoundation.h>
+#include <cstdlib>
+#include <dlfcn.h>
+#include <stdexcept>
+
+namespace
+{
+using FACTORY = void* (*)(CFAllocatorRef, CFUUIDRef);
+
+FACTORY Factory()
+{
+    void* const executable = dlopen(COMGUI_MODULE_FILE, RTLD_NOW | RTLD_LOCAL);
+    void* const factory = executable ? dlsym(executable, "ComGUIModuleFactory") : nullptr;
+    if (!factory)
+        throw std::runtime_error(dlerror());
+    return reinterpret_cast<FACTORY>(factory);
+}
+}  // namespace
+
+void* MODULE::Make(char const* typeUuid)
+{
+    CFStringRef const text = CFStringCreateWithCString(kCFAllocatorDefault, typeUuid, kCFStringEncodingUTF8);
+    CFUUIDRef const type = CFUUIDCreateFromString(kCFAllocatorDefault, text);
+    void* const made = Factory()(nullptr, type);
+    CFRelease(type);
+    CFRelease(text);
+    return made;
+}
+
+MODULE::MODULE()
+{
+    void* const object = Make(COMGUI_PLUGIN_TYPE_UUID);
+    m_table = *static_cast<ComGUIModuleInterface const**>(object);
+    m_table->Release(object);  // the table itself stays, as the executable does
+    m_table->Open(&m_instance);
+}
+
+RECORD::RECORD(char const* user, char const* password, char const* host, int port) : TLogin{}
+{
+    nSize = sizeof(TLogin);
+    stracpy(szUser, user, sizeof szUser);
+    stracpy(szPassword, password, sizeof szPassword);
+    stracpy(szServerHost, host, sizeof szServerHost);
+    iServerPort = port;
+    iLocalPort = 50106;
+    iClientStamp = 30312656;
+    iGUINotificationID = -1;
+}
+
+MODULE_AT_SITE::MODULE_AT_SITE() { UseSite(folder.Path() / "site"); }
+
+void MODULE_AT_SITE::UseSite(std::string const& site) { setenv("COMGUI_SITE", site.c_str(), 1); }
+
+void* MODULE_AT_SITE::LogIn(char const* user, char const* password) const
+{
+    RECORD record(user, password);
+    return module->LoginEntry(module.Instance(), &record) == 0 ? record.hSession : nullptr;
+}
