@@ -1,0 +1,629 @@
+#include "standin/server/Site.h"
+
+#include "standin/server/AtomicFile.h"
+#include "standin/server/Password.h"
+#include "standin/server/Seed.h"
+#include "standin/server/TicketXml.h"
+#include "storageSupport.h"
+#include <algorithm>
+#include <chrono>
+#include <csignal>
+#include <cstdint>
+#include <cstdlib>
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+#include <map>
+#include <optional>
+#include <random>
+#include <set>
+#include <sqlite3.h>
+#include <sys/resource.h>
+#include <sys/stat.h>
+#include <thread>
+#include <unistd.h>
+
+using namespace standin;
+using testing::AllOf;
+using testing::ContainsRegex;
+using testing::ElementsAre;
+using testing::HasSubstr;
+using testing::IsEmpty;
+using testing::StartsWith;
+
+namespace
+{
+std::filesystem::path const ShippedSeed = COMGUI_TEST_SEED;
+
+std::string TextOf(Storage& storage, TicketAddress address, std::string const& wanted)
+{
+    std::string text = "(missing)";
+    storage.Load(address,
+                 [&](std::string_view key, int, StoredValue const& value)
+                 {
+                     if (key == wanted)
+                         text = value.bytes;
+                 });
+    return text;
+}
+
+void Rename(Storage& storage, std::string_view name)
+{
+    StoredValue value;
+    value.type = PARAM_STRING;
+    value.bytes = name;
+    storage.Apply({{Change::PutValue, SystemTicket, "System/Name", 0, value}});
+}
+
+class SiteFolder : public testing::Test
+{
+protected:
+    std::filesystem::path Folder() const { return folder / "site"; }
+    std::filesystem::path File(std::string const& name) const { return Folder() / name; }
+    void MakeSite() const { Site::Open(Folder(), ShippedSeed); }
+    void MakeSiteNamed(std::string const& name) const
+    {
+        Rename(Site::Open(Folder(), ShippedSeed).storage(), name);
+    }
+    std::string NameOfSite() const
+    {
+        Site site = Site::Open(Folder(), ShippedSeed);
+        return TextOf(site.storage(), SystemTicket, "System/Name");
+    }
+    std::string ReasonOfOpening(std::filesystem::path const& seed = ShippedSeed) const
+    {
+        return ReasonOfOpening(Folder(), seed);
+    }
+    static std::string ReasonOfOpening(std::filesystem::path const& where, std::filesystem::path const& seed)
+    {
+        try
+        {
+            Site::Open(where, seed);
+        }
+        catch (StorageError const& error)
+        {
+            return error.what();
+        }
+        return "opened";
+    }
+    // What opening says on stderr.
+    std::string Said(std::filesystem::path const& seed = ShippedSeed) const
+    {
+        testing::internal::CaptureStderr();
+        try
+        {
+            Site::Open(Folder(), seed);
+        }
+        catch (StorageError const&)
+        {
+            testing::internal::GetCapturedStderr();
+            throw;
+        }
+        return testing::internal::GetCapturedStderr();
+    }
+    std::vector<std::string> SetAside() const
+    {
+        std::vector<std::string> names;
+        for (auto const& entry : std::filesystem::directory_iterator(Folder()))
+            if (entry.path().filename().string().find(".damaged-") != std::string::npos)
+                names.push_back(entry.path().filename().string());
+        std::sort(names.begin(), names.end());
+        return names;
+    }
+
+    TemporaryFolder folder;
+};
+
+class Environment : public testing::Test
+{
+protected:
+    Environment()
+    {
+        for (char const* const name : {"COMGUI_SITE", "XDG_DATA_HOME", "HOME"})
+        {
+            if (char const* const value = std::getenv(name))
+                m_before[name] = value;
+            unsetenv(name);
+        }
+    }
+    ~Environment() override
+    {
+        for (char const* const name : {"COMGUI_SITE", "XDG_DATA_HOME", "HOME"})
+            unsetenv(name);
+        for (auto const& [name, value] : m_before)
+            setenv(name.c_str(), value.c_str(), 1);
+    }
+
+private:
+    std::map<std::string, std::string> m_before;
+};
+using SiteFolderByEnvironment = Environment;
+}  // namespace
+
+TEST_F(SiteFolderByEnvironment, IsWhatComguiSiteSays)
+{
+    setenv("COMGUI_SITE", "/somewhere/else/", 1);
+    setenv("XDG_DATA_HOME", "/data", 1);
+    EXPECT_EQ(Site::Folder(), "/somewhere/else");
+}
+
+TEST_F(SiteFolderByEnvironment, RelativeComguiSite_IsMadeAbsolute)
+{
+    setenv("COMGUI_SITE", "my/../site", 1);
+    EXPECT_EQ(Site::Folder(), std::filesystem::current_path() / "site");
+}
+
+TEST_F(SiteFolderByEnvironment, OtherwiseLiesInTheDataFolder)
+{
+    setenv("COMGUI_SITE", "", 1);
+    setenv("XDG_DATA_HOME", "/data", 1);
+    setenv("HOME", "/home/me", 1);
+    EXPECT_EQ(Site::Folder(), "/data/comgui/site");
+}
+
+TEST_F(SiteFolderByEnvironment, WithoutADataFolder_LiesInTheHome)
+{
+    setenv("HOME", "/home/me", 1);
+    EXPECT_EQ(Site::Folder(), "/home/me/.local/share/comgui/site");
+    setenv("XDG_DATA_HOME", "relative", 1);
+    EXPECT_EQ(Site::Folder(), "/home/me/.local/share/comgui/site");
+}
+
+TEST_F(SiteFolderByEnvironment, WithoutAnything_SaysWhatToSet)
+{
+    try
+    {
+        Site::Folder();
+        FAIL() << "found a folder";
+    }
+    catch (StorageError const& error)
+    {
+        EXPECT_THAT(error.what(), HasSubstr("set COMGUI_SITE"));
+    }
+}
+
+TEST_F(SiteFolder, FirstStart_MakesFoldersForThisUserAlone)
+{
+    MakeSite();
+    for (char const* const name : {"", "tickets", "temp", "job", "upload", "preview", "log", "hot",
+                                   "linearisation/lab", "remote/wcc", "profiles/paper"})
+    {
+        struct stat found = {};
+        ASSERT_EQ(stat(File(name).c_str(), &found), 0) << name;
+        EXPECT_TRUE(S_ISDIR(found.st_mode)) << name;
+    }
+    struct stat found = {};
+    stat(Folder().c_str(), &found);
+    EXPECT_EQ(found.st_mode & 07777, 0700u);
+}
+
+TEST_F(SiteFolder, FirstStart_FillsTheDatabaseFromTheSeedAndSaysNothing)
+{
+    EXPECT_EQ(Said(), "");
+    Site site = Site::Open(Folder(), ShippedSeed);
+    EXPECT_EQ(site.storage().Tickets().size(), Seed::Read(ShippedSeed).tickets.size());
+    EXPECT_EQ(TextOf(site.storage(), {3, 1}, "Job/Identification/Name"), "Spring catalogue");
+    EXPECT_EQ(ContentOf(File("seed.xml")), ContentOf(ShippedSeed));
+}
+
+TEST_F(SiteFolder, FirstStart_UsersHaveHashesRolesAndTickets)
+{
+    Site site = Site::Open(Folder(), ShippedSeed);
+    auto const admin = site.storage().FindUser("admin");
+    auto const printer = site.storage().FindUser("operator");
+    ASSERT_TRUE(admin && printer);
+    EXPECT_EQ(admin->role, 16);
+    EXPECT_EQ(printer->role, 1);
+    EXPECT_EQ(TextOf(site.storage(), {17, admin->ticketId}, "User/Name"), "admin");
+    EXPECT_EQ(TextOf(site.storage(), {17, printer->ticketId}, "User/Name"), "operator");
+    EXPECT_TRUE(Password::Verify("admin", admin->passwordHash));
+    EXPECT_TRUE(Password::Verify("operator", printer->passwordHash));
+    EXPECT_FALSE(Password::Verify("operator", admin->passwordHash));
+}
+
+TEST_F(SiteFolder, SecondStart_KeepsWhatWasChanged)
+{
+    MakeSiteNamed("Changed");
+    EXPECT_EQ(Said(), "");
+    EXPECT_EQ(NameOfSite(), "Changed");
+}
+
+TEST_F(SiteFolder, DeletedDatabase_IsMadeAnewFromTheEditedSeed)
+{
+    MakeSite();
+    std::string seed = ContentOf(File("seed.xml"));
+    seed.replace(seed.find(">Print Server<"), 14, ">Edited<");
+    WriteFile(File("seed.xml"), seed);
+    EXPECT_EQ(NameOfSite(), "Print Server");
+    std::filesystem::remove(File("site.db"));
+    EXPECT_EQ(NameOfSite(), "Edited");
+    EXPECT_EQ(ContentOf(File("seed.xml")), seed);
+}
+
+TEST_F(SiteFolder, InstallFolder_IsTheSitesFolder)
+{
+    Site site = Site::Open(Folder(), ShippedSeed);
+    EXPECT_EQ(site.folder(), Folder());
+    EXPECT_EQ(TextOf(site.storage(), SystemTicket, "System/InstallFolder"), Folder().string());
+}
+
+TEST_F(SiteFolder, InstallFolder_FollowsAMovedSite)
+{
+    MakeSiteNamed("Moved");
+    std::filesystem::rename(Folder(), folder / "elsewhere");
+    Site site = Site::Open(folder / "elsewhere" / "", ShippedSeed);
+    EXPECT_EQ(TextOf(site.storage(), SystemTicket, "System/InstallFolder"), (folder / "elsewhere").string());
+    EXPECT_EQ(TextOf(site.storage(), SystemTicket, "System/Name"), "Moved");
+}
+
+TEST_F(SiteFolder, InstallFolder_ThatIsNoSingleText_IsReplaced)
+{
+    {
+        Site site = Site::Open(Folder(), ShippedSeed);
+        StoredValue number;
+        number.type = PARAM_INT;
+        site.storage().Apply({{Change::PutValue, SystemTicket, "System/InstallFolder", 1, number}});
+    }
+    Site site = Site::Open(Folder(), ShippedSeed);
+    int values = 0;
+    site.storage().Load(SystemTicket, [&values](std::string_view key, int, StoredValue const&)
+                        { values += key == "System/InstallFolder" ? 1 : 0; });
+    EXPECT_EQ(values, 1);
+    EXPECT_EQ(TextOf(site.storage(), SystemTicket, "System/InstallFolder"), Folder().string());
+}
+
+TEST_F(SiteFolder, FolderKeysThatLeaveTheSite_MakeNoFolder)
+{
+    {
+        Site site = Site::Open(Folder(), ShippedSeed);
+        StoredValue value;
+        value.type = PARAM_STRING;
+        value.bytes = "$(INSTALL)/../outside";
+        site.storage().Apply({{Change::PutValue, SystemTicket, "System/Folders/Temp", 0, value}});
+    }
+    EXPECT_EQ(Said(), "");
+    EXPECT_FALSE(std::filesystem::exists(folder / "outside"));
+}
+
+TEST_F(SiteFolder, SystemTicketFile_IsWrittenAtEveryStart)
+{
+    MakeSite();
+    std::filesystem::remove(File("tickets/SYS_0000.xml"));
+    MakeSiteNamed("Changed");
+    EXPECT_THAT(
+        ContentOf(File("tickets/SYS_0000.xml")),
+        AllOf(HasSubstr("key=\"System/MasterSOAPPort\" type=\"int\">50000<"), HasSubstr(">Print Server<")));
+    MakeSite();
+    EXPECT_THAT(ContentOf(File("tickets/SYS_0000.xml")), HasSubstr(">Changed<"));
+}
+
+TEST_F(SiteFolder, MirrorSystemTicket_WritesWhatStandsInTheStorage)
+{
+    Site site = Site::Open(Folder(), ShippedSeed);
+    Rename(site.storage(), "New name");
+    site.MirrorSystemTicket();
+    TicketXml const mirror = TicketXml::Read(File("tickets/SYS_0000.xml"));
+    EXPECT_EQ(mirror.address, SystemTicket);
+    EXPECT_THAT(mirror.Text(), HasSubstr(">New name<"));
+}
+
+TEST_F(SiteFolder, MirrorSystemTicket_ThatFails_IsOneLineOnStderr)
+{
+    Site site = Site::Open(Folder(), ShippedSeed);
+    std::filesystem::remove_all(File("tickets"));
+    testing::internal::CaptureStderr();
+    site.MirrorSystemTicket();
+    EXPECT_EQ(
+        testing::internal::GetCapturedStderr(),
+        File("tickets/SYS_0000.xml").string() +
+            ": cannot be written: No such file or directory; make the file or folder, or correct its path\n");
+}
+
+TEST_F(SiteFolder, SecondProcess_IsToldWhoHasTheSite)
+{
+    ChildProcess child(
+        [this](ChildProcess::Report const& report)
+        {
+            Site site = Site::Open(Folder(), ShippedSeed);
+            report(1);
+            pause();
+        });
+    std::int64_t told = 0;
+    ASSERT_TRUE(child.Next(told));
+    EXPECT_EQ(ReasonOfOpening(),
+              Folder().string() + ": in use by process " + std::to_string(child.Id()) +
+                  " (server_tests); end it first, or choose another site with COMGUI_SITE");
+    child.Kill();
+    EXPECT_EQ(ReasonOfOpening(), "opened") << "the lock has gone with the process";
+}
+
+TEST_F(SiteFolder, SecondSiteOfOneProcess_IsRefusedUntilTheFirstIsClosed)
+{
+    auto first = std::make_unique<SiteLock>(folder.Path());
+    EXPECT_THROW(SiteLock(folder.Path()), StorageError);
+    first.reset();
+    EXPECT_NO_THROW(SiteLock(folder.Path()));
+}
+
+TEST_F(SiteFolder, ProgramStartedByTheOwner_DoesNotHoldTheSite)
+{
+    auto lock = std::make_unique<SiteLock>(folder.Path());
+    // The shell outlives the lock, as a helper program would.
+    std::string const command = "sleep 3 & echo $! > " + (folder / "pid").string();
+    ASSERT_EQ(std::system(command.c_str()), 0);
+    lock.reset();
+    EXPECT_NO_THROW(SiteLock(folder.Path()));
+    kill(std::stoi(ContentOf(folder / "pid")), SIGKILL);
+}
+
+TEST_F(SiteFolder, DamagedDatabase_IsToldSetAsideAndMadeAnew)
+{
+    MakeSiteNamed("Lost");
+    std::string const broken = ContentOf(File("site.db")).substr(0, 5000);
+    WriteFile(File("site.db"), broken);
+    std::string const said = Said();
+    EXPECT_THAT(said, StartsWith(File("site.db").string() + ": damaged: "));
+    ASSERT_FALSE(SetAside().empty());
+    EXPECT_THAT(SetAside()[0], ContainsRegex("^site.db.damaged-[0-9]{8}-[0-9]{6}$"));
+    EXPECT_THAT(said, HasSubstr(File("site.db").string() + ": set aside as " + SetAside()[0] + "\n"));
+    EXPECT_EQ(ContentOf(File(SetAside()[0])), broken);
+    EXPECT_EQ(NameOfSite(), "Print Server");
+}
+
+TEST_F(SiteFolder, DamagedDatabase_TakesItsJournalWithIt)
+{
+    MakeSite();
+    {
+        ChildProcess child(
+            [this](ChildProcess::Report const& report)
+            {
+                Site site = Site::Open(Folder(), ShippedSeed);
+                Rename(site.storage(), "In the journal");
+                report(1);
+                pause();
+            });
+        std::int64_t told = 0;
+        ASSERT_TRUE(child.Next(told));
+    }
+    std::string const journal = ContentOf(File("site.db-wal"));
+    ASSERT_FALSE(journal.empty());
+    WriteFile(File("site.db"), std::string(20000, 'x'));
+    EXPECT_NE(Said(), "");
+    bool hasJournal = false;
+    for (std::string const& name : SetAside())
+        hasJournal = hasJournal || (name.ends_with("-wal") && ContentOf(File(name)) == journal);
+    EXPECT_TRUE(hasJournal);
+    EXPECT_EQ(NameOfSite(), "Print Server");
+}
+
+TEST_F(SiteFolder, DamagedAgainAndAgain_NothingIsOverwritten)
+{
+    for (int round = 0; round < 5; ++round)
+    {
+        MakeSite();
+        WriteFile(File("site.db"), "garbage " + std::to_string(round));
+        EXPECT_NE(Said(), "");
+    }
+    std::set<std::string> contents;
+    for (std::string const& name : SetAside())
+        if (!name.ends_with("-wal") && !name.ends_with("-shm"))
+            contents.insert(ContentOf(File(name)));
+    EXPECT_THAT(contents, ElementsAre("garbage 0", "garbage 1", "garbage 2", "garbage 3", "garbage 4"));
+}
+
+TEST_F(SiteFolder, NewerDatabase_IsRefusedAndNothingIsTouched)
+{
+    MakeSite();
+    sqlite3* database = nullptr;
+    ASSERT_EQ(sqlite3_open(File("site.db").c_str(), &database), SQLITE_OK);
+    sqlite3_exec(database, "PRAGMA user_version = 99", nullptr, nullptr, nullptr);
+    sqlite3_close(database);
+    std::string const before = ContentOf(File("site.db"));
+    EXPECT_THAT(ReasonOfOpening(), AllOf(StartsWith(File("site.db").string()), HasSubstr("newer version")));
+    EXPECT_EQ(ContentOf(File("site.db")), before);
+    EXPECT_THAT(SetAside(), IsEmpty());
+}
+
+TEST_F(SiteFolder, DamagedSeed_IsToldSetAsideAndTheShippedOneCopied)
+{
+    std::filesystem::create_directories(Folder());
+    WriteFile(File("seed.xml"), "<site version=\"1\">\n<oops/></site>");
+    std::string const said = Said();
+    EXPECT_THAT(said, StartsWith(File("seed.xml").string() + ":2: unknown element <oops>\n"));
+    ASSERT_EQ(SetAside().size(), 1u);
+    EXPECT_THAT(SetAside()[0], StartsWith("seed.xml.damaged-"));
+    EXPECT_EQ(ContentOf(File(SetAside()[0])), "<site version=\"1\">\n<oops/></site>");
+    EXPECT_EQ(ContentOf(File("seed.xml")), ContentOf(ShippedSeed));
+    EXPECT_EQ(NameOfSite(), "Print Server");
+}
+
+TEST_F(SiteFolder, DamagedSeedOfAFilledSite_IsNotLookedAt)
+{
+    MakeSiteNamed("Kept");
+    WriteFile(File("seed.xml"), "<oops/>");
+    EXPECT_EQ(Said(), "");
+    EXPECT_EQ(NameOfSite(), "Kept");
+}
+
+TEST_F(SiteFolder, BothSeedsDamaged_SaysSoAndLeavesBoth)
+{
+    std::filesystem::create_directories(Folder());
+    WriteFile(File("seed.xml"), "<oops/>");
+    WriteFile(folder / "shipped.xml", "<site version='1'>\n</site>");
+    testing::internal::CaptureStderr();
+    std::string const reason = ReasonOfOpening(folder / "shipped.xml");
+    EXPECT_THAT(testing::internal::GetCapturedStderr(), HasSubstr("seed.xml:1: "));
+    EXPECT_THAT(reason,
+                AllOf(StartsWith((folder / "shipped.xml").string() + ":1: the system ticket 0/0 is missing"),
+                      HasSubstr("; install the program again")));
+    EXPECT_EQ(ContentOf(File("seed.xml")), "<oops/>");
+    EXPECT_THAT(SetAside(), IsEmpty());
+    std::filesystem::remove(File("seed.xml"));
+    EXPECT_EQ(NameOfSite(), "Print Server") << "the failed start leaves a site that can be filled";
+}
+
+TEST_F(SiteFolder, ShippedSeedMissing_NamesIt)
+{
+    EXPECT_THAT(ReasonOfOpening(folder / "none.xml"),
+                AllOf(StartsWith((folder / "none.xml").string()), HasSubstr("No such file or directory")));
+    EXPECT_EQ(NameOfSite(), "Print Server");
+}
+
+TEST_F(SiteFolder, FileInPlaceOfTheFolder_IsNamedAndKept)
+{
+    WriteFile(Folder(), "mine");
+    EXPECT_EQ(ReasonOfOpening(), Folder().string() +
+                                     ": the folder cannot be made: Not a directory; move away the file "
+                                     "that stands where a folder is needed, or choose another folder");
+    EXPECT_EQ(ContentOf(Folder()), "mine");
+}
+
+TEST_F(SiteFolder, BelowAFile_IsNamed)
+{
+    WriteFile(Folder(), "mine");
+    EXPECT_THAT(ReasonOfOpening(File("below"), ShippedSeed),
+                AllOf(StartsWith(File("below").string()), HasSubstr("Not a directory; move away")));
+}
+
+TEST_F(SiteFolder, UnwritableFolder_IsNamed)
+{
+    // The process file system refuses new files to everybody, root included.
+    EXPECT_THAT(ReasonOfOpening("/proc/self", ShippedSeed),
+                AllOf(StartsWith("/proc/self/site.lock: "), HasSubstr("; ")));
+    EXPECT_THAT(ReasonOfOpening("/proc/self/site", ShippedSeed),
+                AllOf(StartsWith("/proc/self/site: "), HasSubstr("; ")));
+}
+
+TEST_F(SiteFolder, FileInPlaceOfASubFolder_IsNamedAndKept)
+{
+    std::filesystem::create_directories(Folder());
+    WriteFile(File("log"), "mine");
+    EXPECT_THAT(ReasonOfOpening(),
+                StartsWith(File("log").string() + ": the folder cannot be made: Not a directory"));
+    EXPECT_EQ(ContentOf(File("log")), "mine");
+    std::filesystem::remove(File("log"));
+    EXPECT_EQ(NameOfSite(), "Print Server");
+}
+
+TEST_F(SiteFolder, DiskFullAtTheFirstStart_IsToldAndTheNextStartIsWhole)
+{
+    ChildProcess child(
+        [this](ChildProcess::Report const& report)
+        {
+            std::signal(SIGXFSZ, SIG_IGN);
+            rlimit const limit{16 * 1024, 16 * 1024};
+            setrlimit(RLIMIT_FSIZE, &limit);
+            report(ReasonOfOpening().find("free space") != std::string::npos);
+        });
+    EXPECT_EQ(child.Wait(), 0);
+    EXPECT_EQ(child.Last(-1), 1);
+    EXPECT_EQ(Said(), "");
+    EXPECT_EQ(NameOfSite(), "Print Server");
+}
+
+TEST_F(SiteFolder, KilledAtTheFirstStart_TheNextOneFindsNoHalfSite)
+{
+    std::size_t const tickets = Seed::Read(ShippedSeed).tickets.size();
+    auto const start = std::chrono::steady_clock::now();
+    MakeSite();
+    auto const whole =
+        std::chrono::duration_cast<std::chrono::microseconds>(std::chrono::steady_clock::now() - start);
+    std::mt19937 random(1234);
+    int killed = 0;
+    for (int round = 0; killed < (IsSanitized ? 10 : 50); ++round)
+    {
+        ASSERT_LT(round, 1000) << "too many starts were over before they were killed";
+        std::filesystem::remove_all(Folder());
+        ChildProcess child(
+            [this](ChildProcess::Report const& report)
+            {
+                Site site = Site::Open(Folder(), ShippedSeed);
+                report(1);
+            });
+        std::this_thread::sleep_for(whole * (random() % 128) / 100);
+        child.Kill();
+        killed += child.Last(0) == 0 ? 1 : 0;
+
+        testing::internal::CaptureStderr();
+        Site site = Site::Open(Folder(), ShippedSeed);
+        ASSERT_EQ(testing::internal::GetCapturedStderr(), "") << round;
+        ASSERT_THAT(SetAside(), IsEmpty()) << round;
+        ASSERT_EQ(site.storage().Tickets().size(), tickets) << round;
+        ASSERT_TRUE(site.storage().FindUser("admin") && site.storage().FindUser("operator")) << round;
+        ASSERT_EQ(TextOf(site.storage(), SystemTicket, "System/InstallFolder"), Folder().string()) << round;
+    }
+}
+
+namespace
+{
+std::string ReasonOfSeed(std::string const& inside)
+{
+    try
+    {
+        Seed::Parse("<site version='1'><ticket type='0' id='0'/><ticket type='17' id='1'/>\n" + inside +
+                        "</site>",
+                    "seed");
+    }
+    catch (XmlError const& error)
+    {
+        return error.what();
+    }
+    return "accepted";
+}
+}  // namespace
+
+TEST(Seed, ShippedOne_NamesTheFoldersInAnOrderThatResolves)
+{
+    // Every folder leans on the install folder alone, so a reader that goes down any list finds it known.
+    std::map<std::string, std::string> folders;
+    for (TicketXml const& ticket : Seed::Read(ShippedSeed).tickets)
+        if (ticket.address == SystemTicket)
+            ticket.Walk(
+                [&folders](std::string_view key, int pos, StoredValue const& value)
+                {
+                    if (key.starts_with("System/Folders/") || key == "System/InstallFolder" ||
+                        key == "System/Linearisation/LAB")
+                    {
+                        EXPECT_EQ(pos, 0) << key;
+                        EXPECT_EQ(value.type, PARAM_STRING) << key;
+                        folders[std::string(key)] = value.bytes;
+                    }
+                });
+    EXPECT_EQ(folders.size(), 28u);
+    for (auto const& [key, folder] : folders)
+        EXPECT_TRUE(key == "System/InstallFolder" ? folder == "/" : folder.starts_with("$(INSTALL)/")) << key;
+}
+
+TEST(Seed, ShippedOne_HoldsNoPassword)
+{
+    for (User const& user : Seed::Read(ShippedSeed).users)
+        EXPECT_THAT(user.passwordHash, StartsWith("$y$"));
+}
+
+TEST(Seed, Mistakes_AreToldWithTheirLine)
+{
+    std::string const user = "<user name='a' role='1' ticket='1' hash='$y$x'/>";
+    std::map<std::string, std::string> const facts{
+        {"<users>" + user + "</users>", "accepted"},
+        {"<users>" + user + user + "</users>", "seed:2: the user a stands twice"},
+        {"<users><user name='a' role='1' ticket='1'/></users>",
+         "seed:2: the attribute hash is missing in <user>"},
+        {"<users><user name='a' role='x' ticket='1' hash='$y$x'/></users>",
+         "seed:2: role is not a number: x"},
+        {"<users><user name='' role='1' ticket='1' hash='$y$x'/></users>", "seed:2: a user without a name"},
+        {"<users><user name='a' role='1' ticket='1' hash='secret'/></users>",
+         "seed:2: the hash of a is none that crypt(3) makes"},
+        {"<users><user name='a' role='1' ticket='1' hash='$y$x' password='x'/></users>",
+         "seed:2: unknown attribute password"},
+        {"<users><user name='a' role='1' ticket='9' hash='$y$x'/></users>",
+         "seed:1: the user a has no ticket 17/9"},
+        {"<users><admin/></users>", "seed:2: unknown element <admin>"},
+        {"<ticket/>", "seed:2: a ticket of a site needs type and id"},
+        {"<ticket type='17' id='1'/>", "seed:2: the ticket 17/1 stands twice"},
+        {"<ticket type='3' id='1'>\n<parameter key='K' type='int'>x</parameter></ticket>",
+         "seed:3: not a number of type int: x"},
+        {"<jobs/>", "seed:2: unknown element <jobs>"},
+        {"hello", "seed:1: text where none is expected: hello"},
+    };
+    for (auto const& [inside, reason] : facts)
+        EXPECT_EQ(ReasonOfSeed(inside), reason) << inside;
+}
