@@ -18,6 +18,8 @@ constexpr int Stamp = 20260101;  // a host's own mark; the plug-in only carries 
 
 std::string Text(wxString const& text) { return text.utf8_string(); }
 
+char const* YesOrNo(bool value) { return value ? "yes" : "no"; }
+
 template <typename Array, typename Convert>
 std::string Joined(Array const& array, Convert convert)
 {
@@ -44,17 +46,21 @@ public:
     template <typename Value>
     void Expect(std::string const& step, Value const& got, Value const& expected)
     {
-        bool const good = got == expected;
-        Line(good, step) << got << '\n';
-        if (!good)
-            std::cout << "           expected: " << expected << '\n';
+        Show(got == expected, step, got);
+        if (got != expected)
+            std::cout << "          expected: " << expected << '\n';
     }
 
-    // A step that must give something.
-    void ExpectSome(std::string const& step, std::string const& got)
+    // A step that must be good, with what came back.
+    template <typename Value>
+    void Show(bool good, std::string const& step, Value const& got)
     {
-        Line(!got.empty(), step) << got << '\n';
+        ++m_steps;
+        m_failures += good ? 0 : 1;
+        std::cout << (good ? "  ok      " : "  FAILED  ") << step << ": " << got << std::endl;
     }
+
+    void ShowText(std::string const& step, std::string const& got) { Show(!got.empty(), step, got); }
 
     int ExitStatus() const { return m_failures == 0 ? 0 : 1; }
 
@@ -67,13 +73,6 @@ public:
     }
 
 private:
-    std::ostream& Line(bool good, std::string const& step)
-    {
-        ++m_steps;
-        m_failures += good ? 0 : 1;
-        return std::cout << (good ? "  ok      " : "  FAILED  ") << step << ": ";
-    }
-
     int m_steps = 0;
     int m_failures = 0;
 };
@@ -111,8 +110,9 @@ void TestServer(Tour& tour, ComGUIManager& manager)
     tour.Expect("IsAlive at localhost:50000", manager.IsAlive(&here), 0);
     tour.Expect("  our address, as the server sees it", std::string(here.szLocalAddress),
                 std::string("127.0.0.1"));
+    tour.ShowText("  GetUserLockInfo", Text(manager.GetUserLockInfo(&here)));
     tour.Expect("IsAlive at localhost:50001, where none listens", manager.IsAlive(&elsewhere), -2005);
-    tour.Expect("IsServerLocal", manager.IsServerLocal(&here), true);
+    tour.Show(manager.IsServerLocal(&here), "IsServerLocal", YesOrNo(manager.IsServerLocal(&here)));
 }
 
 bool LogIn(Tour& tour, ComGUIManager& manager)
@@ -120,17 +120,17 @@ bool LogIn(Tour& tour, ComGUIManager& manager)
     tour.Chapter("Logging in");
     int const initialized = manager.Initialize("admin", "wrong", Host, Port);
     tour.Expect("Initialize takes a local port and prepares the session", initialized, 0);
-    tour.Expect("Login with a wrong password is refused", manager.Login("admin", "wrong", Host, Port) != 0,
-                true);
-    tour.Expect("Login of an unknown user is refused", manager.Login("nobody", "", Host, Port) != 0, true);
+    int const wrong = manager.Login("admin", "wrong", Host, Port);
+    tour.Show(wrong != 0, "Login with a wrong password is refused, with the plug-in's code", wrong);
+    int const unknown = manager.Login("nobody", "", Host, Port);
+    tour.Show(unknown != 0, "Login of an unknown user is refused", unknown);
     int const result = manager.Login("admin", "admin", Host, Port);
     tour.Expect("Login as admin", result, 0);
     if (result != 0)
         return false;
     tour.Expect("  the user", Text(manager.GetCurrentlyLoggedUser()), std::string("admin"));
-    tour.Expect("  is an administrator", manager.IsCurrentUserAdmin(), true);
-    tour.ExpectSome("  our end point", Text(manager.GetLocalEndPoint()));
-    tour.ExpectSome("  lock info", Text(manager.GetUserLockInfo()));
+    tour.Show(manager.IsCurrentUserAdmin(), "  is an administrator", YesOrNo(manager.IsCurrentUserAdmin()));
+    tour.ShowText("  our end point", Text(manager.GetLocalEndPoint()));
     return true;
 }
 
@@ -138,22 +138,21 @@ void ReadSystemTicket(Tour& tour, ComGUIManager& manager)
 {
     tour.Chapter("Reading the system ticket (type 0, id 0)");
     char const* name = nullptr;
-    tour.Expect("System/Name is a text",
-                manager.GetSystemTicketParamForKey("System/Name", PARAM_STRING, &name, -1) != 0, true);
-    tour.ExpectSome("  its value", name ? name : "");
+    manager.GetSystemTicketParamForKey("System/Name", PARAM_STRING, &name, -1);
+    tour.ShowText("System/Name is a text", name ? name : "");
     int port = 0;
     manager.GetSystemTicketParamForKey("System/MasterSOAPPort", PARAM_INT, &port, -1);
     tour.Expect("System/MasterSOAPPort is an int", port, Port);
 
     char languages[] = "System/Languages";
     wxArrayString const texts = manager.GetStringArray(0, 0, languages);
-    tour.ExpectSome("System/Languages is a list of texts", Joined(texts));
+    tour.ShowText("System/Languages is a list of texts", Joined(texts));
     tour.Expect("  with so many values", manager.GetValueCount(manager.GetClientContainer(), 0, 0, languages),
                 static_cast<int>(texts.size()));
     char resolutions[] = "System/Resolutions";
-    tour.ExpectSome("System/Resolutions is a list of ints", Joined(manager.GetIntArray(0, 0, resolutions)));
+    tour.ShowText("System/Resolutions is a list of ints", Joined(manager.GetIntArray(0, 0, resolutions)));
     int missing = 7;
-    tour.Expect("A missing key is found",
+    tour.Expect("A missing key gives",
                 manager.GetParameter(0, 0, "System/NoSuchKey", PARAM_INT, &missing, -1), 0);
     tour.Expect("  and leaves our variable", missing, 7);
 }
@@ -195,7 +194,10 @@ private:
 void ShareJobTicket(Tour& tour, ComGUIManager& manager, SecondSession& second)
 {
     tour.Chapter("Writing the ticket of job 1, and reading it through a second session");
-    tour.Expect("A second, independent session logs in as operator", second.LogIn(), true);
+    bool const loggedIn = second.LogIn();
+    tour.Show(loggedIn, "A second, independent session logs in as operator", YesOrNo(loggedIn));
+    if (!loggedIn)
+        return;
 
     int const copies = 250;
     double const coverage = 61.5;
@@ -228,8 +230,9 @@ void ShareJobTicket(Tour& tour, ComGUIManager& manager, SecondSession& second)
     for (char const* key : {"Tour/Copies", "Tour/Coverage", "Tour/Paper", "Tour/Pages"})
         tour.Expect(std::string("First session deletes ") + key,
                     manager.SetParameter(JobType, JobId, key, PARAM_NONE, nullptr, -1), 1);
-    tour.Expect("Second session finds the int", second.Read("Tour/Copies", PARAM_INT, &seenCopies), 0);
-    tour.Expect("  the list", Joined(second.Ints("Tour/Pages")), std::string());
+    tour.Expect("Second session's read of the int gives", second.Read("Tour/Copies", PARAM_INT, &seenCopies),
+                0);
+    tour.Expect("  and its list holds so many values", second.Ints("Tour/Pages").size(), std::size_t{0});
 }
 
 void LogOut(Tour& tour, ComGUIManager& manager, SecondSession& second)
@@ -256,7 +259,7 @@ int main()
         return 1;
     wxString path;
     UtilityObjects::GetPlugInsPath(path, L"" COMGUI_BUNDLE_NAME);
-    tour.ExpectSome("Opened", Text(path));
+    tour.ShowText("Opened", Text(path));
 
     TestServer(tour, *manager);
     if (LogIn(tour, *manager))
