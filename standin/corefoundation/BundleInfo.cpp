@@ -118,8 +118,8 @@ std::optional<BundleInfo> ReadBundleInfo(fs::path const& bundle)
     if (!IsDictionary(root.get()))
         return std::nullopt;
     auto const executable = TextOf(plist_dict_get_item(root.get(), "CFBundleExecutable"));
-    plist_t const functions = plist_dict_get_item(root.get(), "CFPlugInFactories");
-    plist_t const types = plist_dict_get_item(root.get(), "CFPlugInTypes");
+    plist_t functions = plist_dict_get_item(root.get(), "CFPlugInFactories");
+    plist_t types = plist_dict_get_item(root.get(), "CFPlugInTypes");
     if (!IsFileName(executable.value_or("")) || !IsDictionary(functions) || !IsDictionary(types))
         return std::nullopt;
 

@@ -46,6 +46,7 @@ void BundleOnDisk::AddFactory(std::string const& type, std::string const& factor
 
 void BundleOnDisk::WriteInfo(std::string_view content) const
 {
+    fs::remove(InfoFile());  // a file written over is flushed to disk by some file systems: slow
     std::ofstream stream;
     stream.exceptions(std::ios::failbit | std::ios::badbit);
     stream.open(InfoFile(), std::ios::binary);

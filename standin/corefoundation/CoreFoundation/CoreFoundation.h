@@ -8,11 +8,10 @@
 #include <stdint.h>
 
 #ifdef __cplusplus
-extern "C"
-{
+#    define CF_EXPORT extern "C" __attribute__((visibility("default")))
+#else
+#    define CF_EXPORT extern __attribute__((visibility("default")))
 #endif
-
-#define CF_EXPORT extern __attribute__((visibility("default")))
 
 typedef unsigned char Boolean;
 typedef uint8_t UInt8;
@@ -79,7 +78,3 @@ CF_EXPORT CFArrayRef CFPlugInFindFactoriesForPlugInTypeInPlugIn(CFUUIDRef typeUU
 // it, and gives what it made. Null without such a factory, if that bundle does not name it for the type, and,
 // with a line on stderr, without its executable or its function.
 CF_EXPORT void* CFPlugInInstanceCreate(CFAllocatorRef allocator, CFUUIDRef factoryUUID, CFUUIDRef typeUUID);
-
-#ifdef __cplusplus
-}
-#endif
