@@ -1,8 +1,5 @@
 # What is installed and where: libraries and the plug-in bundle side by side, headers as in the tree, a
 # CMake package and pkg-config files. Nothing of it names the prefix, so the installed tree may be moved.
-if(NOT TARGET comgui_module OR NOT TARGET comgui_host OR NOT TARGET comgui_corefoundation)
-    return()
-endif()
 include(CMakePackageConfigHelpers)
 include(CheckTypeSize)
 include(CheckCXXSourceCompiles)

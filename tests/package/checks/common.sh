@@ -8,3 +8,9 @@ fail()
     printf '%s\n' "$*" >&2
     exit 1
 }
+
+# is_built SOURCE COMPILE_COMMANDS: whether that file, named from the root, is compiled.
+is_built()
+{
+    grep -qF "\"file\": \"$1\"" "$2"
+}
