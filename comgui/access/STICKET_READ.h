@@ -1,0 +1,78 @@
+// Typed reads of one ticket. A view: a STICKET_ACCESS pointer is one, and nothing is kept between calls, so
+// it may be used from any thread that may call the ticket's slots.
+//
+// key is UTF-8 and not null. pos: -1 the key as a whole, or its single value; 0 and up one value of a list;
+// forms without it pass -1. A missing key, a position past the end and a value of another type all are a
+// failed read, and give the default. Nothing is converted from one type to another here.
+#pragma once
+
+#include "comgui/access/TICKET_SLOTS.h"
+#include "comgui/access/TICKET_VIEW.h"
+#include "comgui/foundation/export.h"
+#include "comgui/ticket/STICKET_ACCESS.h"
+#include <string>
+#include <wx/string.h>
+
+class STICKET_READ : public comgui::detail::TICKET_VIEW<STICKET_READ, STICKET_ACCESS>
+{
+public:
+    int GetIntParameter(char const* key, int def) const { return GetIntParameter(-1, key, def); }
+    int GetIntParameter(int pos, char const* key, int def) const
+    {
+        return comgui::detail::Read(Slots(), PARAM_INT, pos, key, def);
+    }
+
+    double GetDoubleParameter(char const* key, double def) const { return GetDoubleParameter(-1, key, def); }
+    double GetDoubleParameter(int pos, char const* key, double def) const
+    {
+        return comgui::detail::Read(Slots(), PARAM_DOUBLE, pos, key, def);
+    }
+
+    // An int that is not 0.
+    bool GetBoolParameter(int pos, char const* key, bool def) const
+    {
+        return comgui::detail::ReadBool(Slots(), pos, key, def);
+    }
+
+    void* GetVoidParameter(int pos, char const* key, void* def) const
+    {
+        return comgui::detail::Read(Slots(), PARAM_POINTER, pos, key, def);
+    }
+
+    // The stored bytes, UTF-8; a path in variable form stays as it is.
+    std::string GetStringParameter(char const* key, std::string const& def) const
+    {
+        char const* text = nullptr;
+        if (!Slots().Get(key, PARAM_STRING, &text, -1))
+            return def;
+        return text ? text : "";
+    }
+
+    // A text with its folder variable resolved. A failed read empties value and gives false.
+    COMGUI_EXPORT bool GetParameter(char const* key, wxString& value, int pos) const;
+
+    // The same; the default is handed back as it is, never resolved.
+    wxString GetWxStringParameter(int pos, char const* key, wxString const& def) const
+    {
+        wxString value;
+        return GetParameter(key, value, pos) ? value : def;
+    }
+
+    // A PARAM_TYPE: at -1 PARAM_COUNT for a list, else the value's own type. 0 where nothing is stored.
+    int ParameterType(char const* key, int pos) const { return comgui::detail::ReadType(Slots(), key, pos); }
+
+    // Number of values under the key, 0 without the key.
+    unsigned long GetVectorSize(char const* key) const
+    {
+        return comgui::detail::Read(Slots(), PARAM_COUNT, -1, key, 0ul);
+    }
+
+    // Asks the module who this ticket is. On failure the words of who become 0 and all ones.
+    COMGUI_EXPORT bool WhoAmI(STICKET_OPTION_WHOAMI& who) const;
+
+    // A text as GetParameter gives it: UTF-8, folder variable resolved, null the empty text.
+    COMGUI_EXPORT wxString Decode(char const* value) const;
+
+private:
+    comgui::detail::STICKET_SLOTS Slots() const { return {Access()}; }
+};

@@ -1,0 +1,86 @@
+// One ticket as the rules of typed access see it: four slots and a translator, whether the ticket stands
+// alone or is addressed inside a container. Each rule is written once, over either of the two.
+#pragma once
+
+#include "comgui/folders/clFOLDER_VARIABLES.h"
+#include "comgui/ticket/MTICKET_ACCESS.h"
+#include "comgui/ticket/STICKET_ACCESS.h"
+#include "comgui/ticket/TICKET_ID.h"
+
+namespace comgui::detail
+{
+struct STICKET_SLOTS
+{
+    STICKET_ACCESS const* access;
+
+    int Get(char const* key, PARAM_TYPE type, void* value, int pos) const
+    {
+        return access->SGETPARAMETER(access->Instance, key, type, value, pos);
+    }
+    int Set(char const* key, PARAM_TYPE type, void const* value, int pos) const
+    {
+        return access->SSETPARAMETER(access->Instance, key, type, value, pos);
+    }
+    // The ticket's own translator; null if it has none.
+    clFOLDER_VARIABLES* GetFolderVariables() const
+    {
+        clFOLDER_VARIABLES* folders = nullptr;
+        return access->SOPTION(access->Instance, STICKET_OP_FOLDER_VARIABLES, &folders) ? folders : nullptr;
+    }
+};
+
+struct MTICKET_SLOTS
+{
+    MTICKET_ACCESS const* access;
+    int ticketType;
+    int ticketId;
+
+    int Get(char const* key, PARAM_TYPE type, void* value, int pos) const
+    {
+        return access->MGETPARAMETER(access->Instance, ticketType, ticketId, key, type, value, pos);
+    }
+    int Set(char const* key, PARAM_TYPE type, void const* value, int pos) const
+    {
+        return access->MSETPARAMETER(access->Instance, ticketType, ticketId, key, type, value, pos);
+    }
+    // The container's translator, whatever ticket it is asked for.
+    clFOLDER_VARIABLES* GetFolderVariables() const
+    {
+        clFOLDER_VARIABLES* folders = nullptr;
+        return access->MOPERATION(access->Instance, TICKET_ID_NONE, TICKET_ID_NONE,
+                                  MTICKET_OP_FOLDER_VARIABLES, &folders)
+                   ? folders
+                   : nullptr;
+    }
+};
+
+// A read of one value. A slot that fails gives the default, whatever it did to the variable; one that
+// succeeds without writing gives zero.
+template <typename Value, typename Slots>
+Value Read(Slots const& slots, PARAM_TYPE type, int pos, char const* key, Value def)
+{
+    Value value{};
+    return slots.Get(key, type, &value, pos) ? value : def;
+}
+
+// There is no type for bool: it is stored as an int.
+template <typename Slots>
+bool ReadBool(Slots const& slots, int pos, char const* key, bool def)
+{
+    return Read<int>(slots, PARAM_INT, pos, key, def ? 1 : 0) != 0;
+}
+
+// The stored type; PARAM_NONE (0) also where nothing is stored.
+template <typename Slots>
+int ReadType(Slots const& slots, char const* key, int pos)
+{
+    return Read<int>(slots, PARAM_NONE, pos, key, PARAM_NONE);
+}
+
+// A write of one number, by address.
+template <typename Slots, typename Value>
+int Write(Slots const& slots, char const* key, PARAM_TYPE type, Value value, int pos)
+{
+    return slots.Set(key, type, &value, pos);
+}
+}  // namespace comgui::detail
