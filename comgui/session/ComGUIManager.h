@@ -26,6 +26,7 @@
 #include <list>
 #include <wx/arrstr.h>
 #include <wx/dynarray.h>
+#include <wx/list.h>
 #include <wx/string.h>
 #include <wx/thread.h>
 
@@ -99,6 +100,11 @@ public:
     int IsAlive(TLogin* login);
     bool IsServerOnline(TLogin* login);
 
+    // The same for the Backward session, which does not trust the record's port: it reads the port from the
+    // system ticket's file, "tickets\\SYS_0000.xml" in the current folder, and keeps it in the record and as
+    // the next local port of InitializeBackward. -1 where there is no such file.
+    int IsAliveBackward(TLogin* login);
+
     // --- Containers --------------------------------------------------------------------------------------
     // Owned by the plug-in; null if there is none. GetClientContainer keeps the result for the session
     // forms below, unless it is null.
@@ -160,14 +166,56 @@ public:
     int GetTicketData(int a, int b, int c, int* size, void* data);
     int GetTicketData(TLogin* login, int a, int b, int c, int* size, void* data);
 
-    // --- Notifications on their way from the plug-in to the host -----------------------------------------
-    static std::list<NotifData*> m_notificationList;  // first in, first out; guarded by the lock below
+    // --- Ticket files ------------------------------------------------------------------------------------
+    // Each call opens the file of that path, does one thing and closes it again. They need no session and no
+    // server, but a plug-in. Keys, positions and decoding are those of STICKET_READ and STICKET_MODIFY. A
+    // file that cannot be opened gives -1 (int, whatever def is), -1.0, or nothing; a missing key def, -1.0
+    // or nothing. Writes give the slot's result, 0 without a file.
+    int GetIntParameterFromLocal(wxString path, char const* key, int def, int pos);
+    wxString GetStringParameterFromLocal(wxString path, char const* key, int pos);
+    double GetDoubleParameterFromLocal(wxString path, char const* key);
+    wxStringList GetStringListParameterFromLocal(wxString path, char const* key);    // up to the first gap
+    wxArrayString GetStringArrayParameterFromLocal(wxString path, char const* key);  // the same
+    wxArrayInt GetIntArrayParameterFromLocal(wxString path, char const* key);        // up to a gap or a -1
+    wxArrayDouble GetDoubleArrayFromLocal(wxString path, char const* key);           // -1.0 in a gap
+    int SetParameterToLocal(wxString path, char const* key, wxString value);
+    int SetParameterToLocal(wxString path, char const* key, wxString value, int pos);
+    int SetParameterToLocal(wxString path, char const* key, int value);
+    int SetParameterToLocal(wxString path, char const* key, double value);
+    int DeleteParameterFromLocal(wxString path, char const* key, int pos);
+
+    // Appends a text to a list unless it is there, letter case included. 0 if it is.
+    int AddStringToStringListLocal(wxString path, char const* key, wxString value);
+
+    // --- Notifications -----------------------------------------------------------------------------------
+    // Tells the plug-in to call fGUI2NOTIFICATION with pUser, and gets a notification id for it. The
+    // plug-in's code, unless told otherwise. The first form faults without a plug-in; the second first
+    // switches off what the record's old id heard, gives -1 without a plug-in, and keeps the new id in the
+    // record, which the operations below look at. Where the first form keeps its id nobody looks.
+    int SetCallback(void* pUser);
+    int SetCallback(TLogin* login, void* pUser);
+
+    // Switch notifications of a ticket type, or of one ticket, on and off, under the id of the record; null
+    // stands for the implicit session's record. keys: a null-ended table. Always 0, also without a container
+    // or with an id of -1, where nothing is done.
+    int EnableNotifications(TLogin* login, int type, char const* const* keys);
+    int EnableNotifications(TLogin* login, int type, int id, char const* const* keys);
+    int DisableNotifications(TLogin* login, int type);
+
+    // What the plug-in calls on a thread of its own: copies the notification and queues it for a
+    // ReceiverThread. data: for kind 1 a table of changed parameters, which gives one notification for each
+    // run of records that share one key pointer; for other kinds one record, or null.
+    static void fGUI2NOTIFICATION(void* pUser, int kind, int argA, int argB, int code, void* data);
+
+    // The queue, first in, first out, without a bound, and its lock. Records are made with new.
+    static std::list<NotifData*> m_notificationList;
     static wxCriticalSection m_csNotificationList;
 
 private:
     // What two families do alike, on the state of one of them.
     int InitializeRecord(TLogin* login, int stamp, bool& initialized, unsigned int& portCounter);
     int LoginRecord(TLogin* login, bool& loggedIn);
+    int RegisterCallback(void* hSession, STICKET_ACCESS const* ticket, void* pUser, int& notificationId);
     int LogoutRecord(TLogin* login, bool& loggedIn, bool& initialized, unsigned int& portCounter);
 
     static ComGUIManager* m_pInstance;

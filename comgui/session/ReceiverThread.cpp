@@ -1,0 +1,86 @@
+#include "comgui/session/ReceiverThread.h"
+
+#include "comgui/host/CEventManager.h"
+#include "comgui/host/NotifData.h"
+#include "comgui/host/ServerNotificationEvent.h"
+#include "comgui/session/ComGUIManager.h"
+#include "comgui/session/NotificationEvents.h"
+#include <cstdio>
+#include <wx/utils.h>
+
+namespace
+{
+constexpr unsigned long PollInterval = 2;  // milliseconds
+
+void TakeNext(NotifData*& inHand)
+{
+    std::list<NotifData*>& queue = ComGUIManager::m_notificationList;
+    if (queue.empty())
+        return;
+    inHand = queue.front();  // what was still in hand is lost: a notification of kind 0, or one that threw
+    queue.pop_front();
+}
+
+void Publish(NotifData const& notification, std::string const& localEndPoint)
+{
+    if (auto const id = comgui::detail::EventIdOf(notification, localEndPoint))
+    {
+        ServerNotificationEvent event(*id, notification);
+        CEventManager::GetInstance()->PublishEvent(event);
+    }
+}
+
+void HandleNext(NotifData*& inHand, std::string const& localEndPoint)
+{
+    wxCriticalSectionLocker const lock(ComGUIManager::m_csNotificationList);  // held while handlers run
+    TakeNext(inHand);
+    if (!inHand)
+        return;
+    Publish(*inHand, localEndPoint);
+    if (inHand->NotifKind == 0)  // kind 0 is neither published nor freed: it stays in hand
+        return;
+    inHand->NotifKind = 0;
+    delete inHand;
+    inHand = nullptr;
+}
+}  // namespace
+
+ReceiverThread::ReceiverThread() : wxThread(wxTHREAD_DETACHED), m_pManager(ComGUIManager::GetInstance()) {}
+
+ReceiverThread::~ReceiverThread() = default;
+
+void* ReceiverThread::Entry()
+{
+    // Made once in the life of the process, whatever session is logged in later.
+    static std::string const szLocalEndPoint = m_pManager->GetLocalEndPoint().utf8_string();
+
+    NotifData* inHand = nullptr;
+    while (!__atomic_load_n(&m_bStop, __ATOMIC_RELAXED))
+    {
+        wxMilliSleep(PollInterval);
+        try
+        {
+            HandleNext(inHand, szLocalEndPoint);
+        }
+        catch (...)
+        {
+            std::printf("\nUnhandled Exception found in ReceiverThread...");
+        }
+        if (TestDestroy())
+            return nullptr;
+    }
+    std::puts("\nReceiverThread Stopped!");
+    return nullptr;
+}
+
+bool ReceiverThread::ShutDown()
+{
+    __atomic_store_n(&m_bStop, true, __ATOMIC_RELAXED);
+    return true;
+}
+
+void ReceiverThread::OnExit()
+{
+    std::puts("\nOnExit:: ReceiverThread Stopped!");
+    ShutDown();
+}
