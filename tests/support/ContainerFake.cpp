@@ -1,5 +1,7 @@
 #include "tests/support/ContainerFake.h"
 
+#include "comgui/ticket/TICKET_ID.h"
+
 #include <cstring>
 
 namespace
@@ -274,6 +276,20 @@ int ContainerFake::OnOperation(void* instance, int type, int id, TICKET_OP op, v
         return 0;
     if (op.GetInt() == MTICKET_OP_DELETE)
         return type != 0 && fake.m_tickets.erase({type, id}) ? fake.success : 0;
+    if (op.GetInt() == MTICKET_OP_FOLDER_VARIABLES && fake.folders)
+    {
+        *static_cast<clFOLDER_VARIABLES**>(arg) = fake.folders;
+        return fake.success;
+    }
+    if (op.GetInt() == MTICKET_OP_CREATE_NEXT && id == TICKET_ID_NEXT)
+    {
+        int next = 1;
+        while (fake.HasTicket(type, next))
+            ++next;
+        fake.AddTicket(type, next);
+        *static_cast<int*>(arg) = next;
+        return fake.success;
+    }
     if (op.GetInt() != MTICKET_OP_OPEN || !arg || !fake.HasTicket(type, id))
         return 0;
     *static_cast<STICKET_ACCESS const**>(arg) = &fake.m_ticket;

@@ -13,6 +13,8 @@
 #include <utility>
 #include <vector>
 
+class clFOLDER_VARIABLES;
+
 enum class SLOT
 {
     GET,        // MGETPARAMETER
@@ -64,6 +66,9 @@ public:
 
     // Makes every read and write at that position fail.
     void FailPosition(int pos) { m_failPosition = pos; }
+
+    // What MTICKET_OP_FOLDER_VARIABLES gives out; the operation fails while there is none.
+    clFOLDER_VARIABLES* folders = nullptr;
 
     // Reads of texts succeed and give null.
     bool nullTexts = false;

@@ -1,0 +1,41 @@
+#include "tests/support/TicketFake.h"
+
+#include "comgui/ticket/TICKET_OP.h"
+
+TicketFake::TicketFake()
+{
+    container.AddTicket(0, 0);
+    m_access.Instance = this;
+    m_access.SGETPARAMETER = [](void* instance, char const* key, PARAM_TYPE type, void* value, int pos)
+    {
+        MTICKET_ACCESS const* const access = Of(instance).container.Access();
+        return access->MGETPARAMETER(access->Instance, 0, 0, key, type, value, pos);
+    };
+    m_access.SGETMULTIPAR = [](void* instance, GETMULTIPAR* table)
+    {
+        MTICKET_ACCESS const* const access = Of(instance).container.Access();
+        return access->MGETMULTIPAR(access->Instance, 0, 0, table);
+    };
+    m_access.SSETPARAMETER = [](void* instance, char const* key, PARAM_TYPE type, void const* value, int pos)
+    {
+        MTICKET_ACCESS const* const access = Of(instance).container.Access();
+        return access->MSETPARAMETER(access->Instance, 0, 0, key, type, value, pos);
+    };
+    m_access.SSETMULTIPAR = [](void* instance, SETMULTIPAR* table)
+    {
+        MTICKET_ACCESS const* const access = Of(instance).container.Access();
+        return access->MSETMULTIPAR(access->Instance, 0, 0, table);
+    };
+    m_access.SOPTION = OnOption;
+}
+
+int TicketFake::OnOption(void* instance, int code, void* out)
+{
+    TicketFake& fake = Of(instance);
+    fake.options.push_back(code);
+    if (code == STICKET_OP_FOLDER_VARIABLES && fake.optionResult)
+        *static_cast<clFOLDER_VARIABLES**>(out) = fake.container.folders;
+    if (code == STICKET_OP_WHOAMI)
+        *static_cast<STICKET_OPTION_WHOAMI*>(out) = {7, 8};
+    return fake.optionResult;
+}
