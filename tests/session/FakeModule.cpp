@@ -128,11 +128,31 @@ struct FAKE_ENTRIES
         current->pointers = {size, data};
         return WithSession("GetTicketDataEntry", handle, session);
     }
+
+    static int SendCommand(void* handle, void* session, char const* command, int size, void* data)
+    {
+        int const result = WithSession("SendCommandEntry", handle, session);
+        return current->onCommand ? current->onCommand(command, size, data) : result;
+    }
+
+    static STICKET_ACCESS const* CreateTicket(char const* path)
+    {
+        current->paths.emplace_back(path ? path : "(null)");
+        return current->ticket ? current->ticket->Access() : nullptr;
+    }
+
+    static void DestroyTicket(STICKET_ACCESS const** ticket)
+    {
+        EXPECT_EQ(*ticket, current->ticket->Access());
+        *ticket = nullptr;
+        ++current->destroyed;
+    }
 };
 
 FakeModule::FakeModule()
 {
     current = this;
+    table = {};
     table.QueryInterface = FAKE_ENTRIES::QueryInterface;
     table.Release = FAKE_ENTRIES::Release;
     table.Open = FAKE_ENTRIES::Open;
@@ -145,7 +165,10 @@ FakeModule::FakeModule()
     table.UninitializeAsyncEntry = FAKE_ENTRIES::UninitializeAsync;
     table.GetClientContainerEntry = FAKE_ENTRIES::GetClientContainer;
     table.GetTicketDataEntry = FAKE_ENTRIES::GetTicketData;
+    table.SendCommandEntry = FAKE_ENTRIES::SendCommand;
     table.STicketFactory = &factory;
+    factory.CreateTicket = FAKE_ENTRIES::CreateTicket;
+    factory.DestroyTicket = FAKE_ENTRIES::DestroyTicket;
 }
 
 FakeModule::~FakeModule()

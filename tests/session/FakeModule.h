@@ -6,6 +6,7 @@
 #include "tests/support/BundleOnDisk.h"
 #include "tests/support/ContainerFake.h"
 #include "tests/support/TemporaryFolder.h"
+#include "tests/support/TicketFake.h"
 #include <functional>
 #include <gtest/gtest.h>
 #include <map>
@@ -28,6 +29,8 @@ public:
     MTICKET_ACCESS const* container = nullptr;
     std::function<void(TLogin&)> onLogin;  // fills in the record as a plug-in does
     std::function<void()> onLogout;
+    TicketFake* ticket = nullptr;  // what the factory makes; none while null
+    std::function<int(char const* command, int size, void* data)> onCommand;
 
     // --- what it saw -------------------------------------------------------------------------------------
     std::vector<std::string> factories;  // that were asked for an instance
@@ -44,8 +47,12 @@ public:
     std::vector<int> ints;  // the arguments of GetTicketDataEntry behind the session
     std::vector<void*> pointers;
 
+    std::vector<std::string> paths;  // asked of the factory, "(null)" for a ticket in memory
+    int destroyed = 0;               // tickets given back to it
+
     // The live table; the library copies it when a manager is made.
-    ComGUIModuleInterface table = {};
+    // Static, and so are the two below, since a singleton manager keeps pointers from one test to the next.
+    static inline ComGUIModuleInterface table = {};
     STicketFactory factory = {};
 
     void* Handle() { return &m_handle; }
@@ -53,9 +60,9 @@ public:
     int Called(char const* entry, void* handle);
 
 private:
-    char m_handle = 0;
-    ComGUIModuleInterface* m_instance = &table;   // COM style: an instance's first word is its table
-    ComGUIModuleInterface* m_interface = &table;  // what QueryInterface hands out is another object
+    static inline char m_handle = 0;
+    static inline ComGUIModuleInterface* m_instance = &table;   // COM: an instance's first word is its table
+    static inline ComGUIModuleInterface* m_interface = &table;  // QueryInterface hands out another object
     friend struct FAKE_ENTRIES;
 };
 
