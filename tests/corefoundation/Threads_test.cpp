@@ -89,14 +89,19 @@ TEST_F(Threads, BundleThatClosesWhileOthersAskForItsFactory_ServesOrIsGone)
     BundleOnDisk passing(folder.Path(), "Passing.Bundle");
     passing.LinkExecutable(COMGUI_TEST_PLUGIN);
     passing.AddFactory(typeA, factory1, "StatelessFactory");
-    Together(
+    std::atomic<bool> done{false};
+    std::thread asking(
         [&]
         {
-            auto plugIn = OpenPlugIn(passing.Path());
-            plugIn.reset();
-            if (MakeInstance(factory1, typeA) == nullptr)  // one bundle or the other has it at any time
-                ++failures;
+            while (!done)
+            {
+                if (MakeInstance(factory1, typeA) == nullptr)  // one bundle or the other has it at any time
+                    ++failures;
+            }
         });
+    Together([&] { OpenPlugIn(passing.Path()).reset(); });
+    done = true;
+    asking.join();
     EXPECT_EQ(failures, 0);
 }
 }  // namespace
