@@ -20,6 +20,7 @@ void Together(std::function<void()> const& work)
 {
     std::latch start(threadCount);
     std::vector<std::thread> threads;
+    threads.reserve(threadCount);
     for (int thread = 0; thread < threadCount; ++thread)
     {
         threads.emplace_back(
