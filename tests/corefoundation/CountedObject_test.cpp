@@ -23,6 +23,8 @@ protected:
     Mortal* const object = new Mortal(story);
 };
 
+// The analyzer does not count owners: it takes every Release for the last one.
+// NOLINTBEGIN(clang-analyzer-cplusplus.NewDelete)
 TEST_F(CountedObject, LastRelease_DestroysIt)
 {
     object->Retain();
@@ -39,6 +41,7 @@ TEST_F(CountedObject, RetainUnlessGone_OwnedObject_MakesOneMoreOwner)
     EXPECT_EQ(story, "");
     object->Release();
 }
+// NOLINTEND(clang-analyzer-cplusplus.NewDelete)
 
 TEST_F(CountedObject, RetainUnlessGone_ObjectBeingDestroyed_IsRefused)
 {
