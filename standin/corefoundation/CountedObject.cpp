@@ -24,28 +24,8 @@ void CFRelease(CFTypeRef object)
     static_cast<CountedObject const*>(object)->Release();
 }
 
-namespace comgui::detail
-{
-void CountedObject::Release() const
-{
-    if (m_owners.fetch_sub(1, std::memory_order_acq_rel) == 1)
-        delete this;
-}
-
-bool CountedObject::RetainUnlessGone() const
-{
-    long owners = m_owners.load(std::memory_order_relaxed);
-    while (owners > 0)
-    {
-        if (m_owners.compare_exchange_weak(owners, owners + 1, std::memory_order_relaxed))
-            return true;
-    }
-    return false;
-}
-
-void ProgramError(char const* what)
+void comgui::detail::ProgramError(char const* what)
 {
     std::fprintf(stderr, "CoreFoundation: %s: a mistake of the calling program, which ends here\n", what);
     std::abort();
 }
-}  // namespace comgui::detail

@@ -14,11 +14,25 @@ public:
     CountedObject& operator=(CountedObject const&) = delete;
 
     void Retain() const { m_owners.fetch_add(1, std::memory_order_relaxed); }
-    void Release() const;
+
+    void Release() const
+    {
+        if (m_owners.fetch_sub(1, std::memory_order_acq_rel) == 1)
+            delete this;
+    }
 
     // For whoever keeps a pointer without owning it: false if the last owner has gone already and only the
     // destructor has not come that far yet.
-    bool RetainUnlessGone() const;
+    bool RetainUnlessGone() const
+    {
+        long owners = m_owners.load(std::memory_order_relaxed);
+        while (owners > 0)
+        {
+            if (m_owners.compare_exchange_weak(owners, owners + 1, std::memory_order_relaxed))
+                return true;
+        }
+        return false;
+    }
 
 protected:
     CountedObject() = default;

@@ -83,7 +83,7 @@ SqliteStorage OpenStorage(std::filesystem::path const& folder, std::filesystem::
 
 std::filesystem::path Prepared(std::filesystem::path const& folder)
 {
-    std::filesystem::path const absolute = MadeAbsolute(folder);
+    std::filesystem::path absolute = MadeAbsolute(folder);
     MakePrivateFolder(absolute);
     return absolute;
 }

@@ -21,6 +21,7 @@
 
 #include "standin/server/StoredValue.h"
 #include "standin/server/TicketAddress.h"
+#include <cstddef>
 #include <filesystem>
 #include <functional>
 #include <map>
@@ -41,7 +42,7 @@ public:
 class TicketXml
 {
 public:
-    static constexpr std::size_t SizeLimit = 64 * 1024 * 1024;  // bytes of a file
+    static constexpr std::size_t SizeLimit = std::size_t{64} << 20;  // bytes of a file: 64 MiB
 
     // Read throws StorageError for a file that cannot be read, both throw XmlError for what stands in it.
     static TicketXml Read(std::filesystem::path const& file);

@@ -120,7 +120,7 @@ TicketXmlReader::TicketXmlReader(std::string_view text, std::string name)
     : m_text(text), m_name(std::move(name))
 {
     if (m_text.size() > TicketXml::SizeLimit)
-        FailAt(0, "larger than " + std::to_string(TicketXml::SizeLimit / (1024 * 1024)) + " MiB");
+        FailAt(0, "larger than " + std::to_string(TicketXml::SizeLimit >> 20) + " MiB");
     if (m_text.starts_with("\xEF\xBB\xBF"))
         m_text.remove_prefix(3);
     if (std::size_t const offset = FirstForbiddenInXml(m_text); offset != std::string_view::npos)
@@ -243,7 +243,7 @@ void TicketXmlReader::Parameter(TicketXml& ticket, pugi::xml_node node) const
 
 std::string TicketXmlReader::Key(pugi::xml_node node) const
 {
-    std::string const key = Attribute(node, "key");
+    std::string key = Attribute(node, "key");
     if (!node.attribute("key-encoding"))
         return key;
     if (Attribute(node, "key-encoding") != "base64")
@@ -284,12 +284,12 @@ PARAM_TYPE TicketXmlReader::Type(pugi::xml_node node) const
 
 std::string TicketXmlReader::String(pugi::xml_node node, PARAM_TYPE type) const
 {
-    std::string const text = Content(node);
+    std::string text = Content(node);
     if (node.attribute("encoding") && Attribute(node, "encoding") != "base64")
         Fail(node, "unknown encoding " + Attribute(node, "encoding"));
     if (type == PARAM_STRING && !node.attribute("encoding"))
         return text;
-    std::string const bytes = Decoded(node, text);
+    std::string bytes = Decoded(node, text);
     if (type == PARAM_STRING && bytes.find('\0') != std::string::npos)
         Fail(node, "a zero byte in a string; type binary may hold it");
     return bytes;

@@ -79,12 +79,12 @@ TEST_F(CFArray, NullArray_EndsTheProgram)
 
 TEST(CFRelease, NullReference_EndsTheProgram)
 {
-    EXPECT_DEATH(CFRelease(nullptr), "CFRelease of a null reference");
+    EXPECT_DEATH(CFRelease(nullptr), "CFRelease of a null reference");  // NOLINT: the null is meant
 }
 
 TEST(CFRetain, NullReference_EndsTheProgram)
 {
-    EXPECT_DEATH(CFRetain(nullptr), "CFRetain of a null reference");
+    EXPECT_DEATH(CFRetain(nullptr), "CFRetain of a null reference");  // NOLINT: the null is meant
 }
 
 TEST(CFRetain, AnyObject_GivesItBack)

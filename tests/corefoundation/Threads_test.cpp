@@ -20,6 +20,7 @@ void Together(std::function<void()> const& work)
 {
     std::latch start(threadCount);
     std::vector<std::thread> threads;
+    threads.reserve(threadCount);
     for (int thread = 0; thread < threadCount; ++thread)
     {
         threads.emplace_back(
@@ -89,14 +90,19 @@ TEST_F(Threads, BundleThatClosesWhileOthersAskForItsFactory_ServesOrIsGone)
     BundleOnDisk passing(folder.Path(), "Passing.Bundle");
     passing.LinkExecutable(COMGUI_TEST_PLUGIN);
     passing.AddFactory(typeA, factory1, "StatelessFactory");
-    Together(
+    std::atomic<bool> done{false};
+    std::thread asking(
         [&]
         {
-            auto plugIn = OpenPlugIn(passing.Path());
-            plugIn.reset();
-            if (MakeInstance(factory1, typeA) == nullptr)  // one bundle or the other has it at any time
-                ++failures;
+            while (!done)
+            {
+                if (MakeInstance(factory1, typeA) == nullptr)  // one bundle or the other has it at any time
+                    ++failures;
+            }
         });
+    Together([&] { OpenPlugIn(passing.Path()).reset(); });
+    done = true;
+    asking.join();
     EXPECT_EQ(failures, 0);
 }
 }  // namespace

@@ -10,6 +10,7 @@
 #include <csignal>
 #include <cstdint>
 #include <cstdlib>
+#include <fcntl.h>
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 #include <map>
@@ -19,6 +20,7 @@
 #include <sqlite3.h>
 #include <sys/resource.h>
 #include <sys/stat.h>
+#include <sys/wait.h>
 #include <thread>
 #include <unistd.h>
 
@@ -347,12 +349,22 @@ TEST_F(SiteFolder, SecondSiteOfOneProcess_IsRefusedUntilTheFirstIsClosed)
 TEST_F(SiteFolder, ProgramStartedByTheOwner_DoesNotHoldTheSite)
 {
     auto lock = std::make_unique<SiteLock>(folder.Path());
-    // The shell outlives the lock, as a helper program would.
-    std::string const command = "sleep 3 & echo $! > " + (folder / "pid").string();
-    ASSERT_EQ(std::system(command.c_str()), 0);
+    int ends[2];
+    ASSERT_EQ(pipe2(ends, O_CLOEXEC), 0);
+    pid_t const helper = fork();
+    if (helper == 0)
+    {
+        execlp("sleep", "sleep", "60", static_cast<char*>(nullptr));
+        _exit(1);
+    }
+    close(ends[1]);
+    char none = 0;
+    ASSERT_EQ(read(ends[0], &none, 1), 0) << "the pipe closes as the helper starts";
+    close(ends[0]);
     lock.reset();
     EXPECT_NO_THROW(SiteLock(folder.Path()));
-    kill(std::stoi(ContentOf(folder / "pid")), SIGKILL);
+    EXPECT_EQ(kill(helper, SIGKILL), 0);
+    waitpid(helper, nullptr, 0);
 }
 
 TEST_F(SiteFolder, DamagedDatabase_IsToldSetAsideAndMadeAnew)

@@ -24,7 +24,7 @@ TemporaryFolder::~TemporaryFolder()
 
 fs::path TemporaryFolder::Write(fs::path const& name, std::string_view text) const
 {
-    fs::path const file = m_path / name;
+    fs::path file = m_path / name;
     fs::create_directories(file.parent_path());
     std::ofstream stream;
     stream.exceptions(std::ios::failbit | std::ios::badbit);
