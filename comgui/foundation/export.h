@@ -2,3 +2,6 @@
 #pragma once
 
 #define COMGUI_EXPORT __attribute__((visibility("default")))
+
+// For the private helpers of an exported class.
+#define COMGUI_LOCAL __attribute__((visibility("hidden")))

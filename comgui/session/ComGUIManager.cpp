@@ -37,8 +37,8 @@ ComGUIManager::ComGUIManager() : m_pLogin(NewLoginRecord())
             hSTicketInstance = m_interface.STicketFactory;
             return;
         }
-        std::fputs("@TODO: Bundle should be released here\n",
-                   stderr);  // all that happens: it is not released
+        // Nothing is released: these words are all that happens.
+        std::fputs("@TODO: Bundle should be released here\n", stderr);
     }
     std::fputs("Could not get Interface pointer and Intialize the bundle\n", stderr);
 }

@@ -1,20 +1,21 @@
-// The session manager: opens the communication plug-in, carries the sessions with the server, and leads
-// the host's calls to the plug-in's entries and to the slots of its ticket containers.
+// What a host holds of the library: one object that loads the communication plug-in, logs in and out, and
+// hands calls on to the plug-in and to the ticket containers that come from it.
 //
-// Three families of calls share one plug-in:
-//   implicit  (no TLogin*)       works on the manager's own record; the plain way for one session
-//   explicit  (TLogin* first)    works on the caller's record; shares flags and counter with the implicit one
-//   Backward                     a second, independent session with its own record, flags and counter
+// It can hold two sessions at once. Most operations come in families that differ in whose record they use:
+//   without a TLogin*     the manager's own record; all that a client with one session needs
+//   with a TLogin* first  the caller's record, with the flags and the port counter of the family above
+//   ...Backward           another session beside it, with a record, flags and a port counter of its own
+// The usual order is IsAlive, Initialize, Login, the work, Logout, Uninitialize; it is not enforced.
 //
-// Results are 0 for success unless told otherwise, and any other code of the plug-in is passed on as it is.
-// The library's own codes: -1 not logged in, or no container; -2005 server not reachable; -9999 see
-// GetServerName. Reads and writes of parameters count the other way round: not zero is success.
+// Results: 0 is success, and other numbers are the plug-in's, which the library does not look into, except
+// for three of its own: -1 (not logged in, or no container), -2005 (no server there), -9999. Whatever ends in
+// a slot of a container, which is reading, writing and deleting, answers the other way round: not zero is
+// success.
 //
-// Threads: nothing here locks. One thread at a time, and the first GetInstance() before any other thread
-// can call it.
+// Threads: no lock anywhere, so one thread at a time; and GetInstance() once before there is a second one.
 //
-// A manager that could not open its plug-in is usable as far as an operation needs none; it said so on
-// stderr and left hSTicketInstance null. Operations that need the plug-in then fault: they test nothing.
+// If the plug-in could not be opened, stderr says so and hSTicketInstance is null. What needs no plug-in
+// works then, guarded operations answer -1, and everything else faults, since nothing is tested.
 #pragma once
 
 #include "comgui/foundation/export.h"
@@ -37,11 +38,11 @@ class clFOLDER_VARIABLES;
 class COMGUI_EXPORT ComGUIManager
 {
 public:
-    // The one manager of the process, made and never deleted by the library. The first call opens the
-    // plug-in; one that fails is not repeated.
+    // The process's manager. The first call makes it, and with it the only attempt to open the plug-in; it
+    // is there to the end of the process. Never null.
     static ComGUIManager* GetInstance();
 
-    // Opens the plug-in as the first GetInstance() does. Hosts call GetInstance().
+    // Opens the plug-in. Hosts go by GetInstance().
     ComGUIManager();
 
     // Frees the record of the implicit session. Calls nothing of the plug-in, which stays loaded.
@@ -56,47 +57,51 @@ public:
     int RegisterPlugIn(__CFBundle** plugIn);
     int CreateComGUIModuleInterface(__CFBundle* plugIn, ComGUIModuleInterface*** module);
 
-    // Does nothing, on purpose: the plug-in stays loaded to the end of the process.
+    // Nothing happens, on purpose: a plug-in that is open stays open.
     void FreeDll();
 
     // --- Preparing a session -----------------------------------------------------------------------------
-    // Takes a local port and hands the record to the plug-in. Nothing happens, and the result is 0, if the
-    // family is initialised already. Texts are UTF-8 and cut at 127 bytes; null counts as empty.
-    // stamp: the host's client stamp; stored in the record even when nothing else happens.
+    // Gives the record the next local port and lets the plug-in prepare a session for it. Without effect, and
+    // 0, while the family is initialised; only the stamp, the host's own mark, is stored even then. Texts are
+    // UTF-8, null counts as empty, and what is longer than 127 bytes is cut, wherever a character ends.
     int Initialize(char const* user, char const* password, char const* host, int port);
     int Initialize(TLogin* login, int stamp);
     int InitializeBackward(TLogin* login, int stamp);
 
     // --- Logging in --------------------------------------------------------------------------------------
-    // A null text, and a port of -1, keep what the record holds. Fetches the session's container too.
+    // A failed login, too, leaves its mark: the family counts as logged out from then on.
+    //
+    // By texts: null, and -1 for the port, stand for what the record holds. Fetches the container as well.
     int Login(char const* user, char const* password, char const* host, int port);
 
-    // Logs the implicit record in and fetches its container; touches no flag, so that guarded operations go
-    // on answering as before.
+    // The step of the above that talks to the plug-in: login and container, and no flag, so guarded
+    // operations do not notice.
     int MacLogin();
 
-    // The record becomes the manager's, which frees it with free(): see TLogin.h. That holds when the login
-    // fails, too; the record of before is not freed. The container is not fetched: GetClientContainer().
+    // From here on the record is the manager's, whether the login succeeds or not, and goes with free(): see
+    // TLogin.h. The one it replaces is not freed. GetClientContainer() fetches the container.
     int Login(TLogin* login);
 
-    // The record stays the caller's.
+    // The record stays the caller's but is kept, whether the login succeeds or not: it must outlive the
+    // session's use.
     int LoginBackward(TLogin* login);
 
     // --- Ending a session --------------------------------------------------------------------------------
-    // The family's flags go down before the plug-in is asked, whatever it answers. The container that the
-    // manager holds is not cleared.
+    // Before the plug-in is asked, the family counts as neither logged in nor initialised, and its next local
+    // port is one less. The container stays where it is.
     int Logout();
     int Logout(TLogin* login);
     int LogoutBackward(TLogin* login);
 
-    // Both forms block for 4 seconds after the plug-in has answered, the Async ones just as long.
+    // Undo Initialize at the plug-in and then wait for 4 seconds, the Async forms, too. No flag changes here.
     int Uninitialize();
     int Uninitialize(TLogin* login);
     int UninitializeAsync();
     int UninitializeAsync(TLogin* login);
 
     // --- Testing a server --------------------------------------------------------------------------------
-    // Needs no session. 0, with szLocalAddress filled in, or -2005 with the record left alone.
+    // Whether a server answers at the record's host and port; no session is needed. 0 and szLocalAddress, or
+    // -2005 and an untouched record. IsServerOnline is the same as a yes or no.
     int IsAlive(TLogin* login);
     bool IsServerOnline(TLogin* login);
 
@@ -106,33 +111,36 @@ public:
     int IsAliveBackward(TLogin* login);
 
     // --- Containers --------------------------------------------------------------------------------------
-    // Owned by the plug-in; null if there is none. GetClientContainer keeps the result for the session
-    // forms below, unless it is null.
+    // The plug-in's, and null if it has none. What GetClientContainer finds is the one that operations
+    // without a container argument use from then on; null changes nothing there. GetBackwardContainer needs a
+    // LoginBackward before.
     MTICKET_ACCESS const* GetClientContainer();
     MTICKET_ACCESS const* GetBackwardContainer();
     MTICKET_ACCESS const* GetHandleToClientContainer(TLogin* login);
 
-    // --- Questions: answered from local state, the plug-in is not asked ----------------------------------
-    wxString GetServerName() const;          // empty: nothing sets it
-    int GetServerName(TLogin* login) const;  // always -9999, whatever the argument
-    wxString GetLocalEndPoint() const;
-    wxString GetCurrentlyLoggedUser() const;
-    wxString GetCurrentlyLoggedUser(TLogin* login) const;
-    int GetCurrentlyLoggedUserTicketID() const;  // before login: the stamp
-    bool IsCurrentUserAdmin() const;
-    bool IsCurrentUserAdmin(TLogin* login) const;
-    wxString GetUserLockInfo() const;  // "http://<local address>:<local port>"
-    wxString GetUserLockInfo(TLogin* login) const;
-    bool IsServerLocal() const;
-    bool IsServerLocal(TLogin* login) const;  // ignores the letter case of the local address, too
-    bool IsTernServerLocal() const;           // "ComGUISrv.Dll" lies in the current folder
-    int GetEndian() const;                    // always 0x49494949, the bytes "IIII"
+    // --- Questions: the answers lie in the records, the plug-in is not asked -----------------------------
+    wxString GetServerName();          // empty: nothing sets it
+    int GetServerName(TLogin* login);  // always -9999, whatever the argument
+    wxString GetLocalEndPoint();
+    wxString GetCurrentlyLoggedUser();
+    wxString GetCurrentlyLoggedUser(TLogin* login);
+    int GetCurrentlyLoggedUserTicketID();  // before login: the stamp
+    bool IsCurrentUserAdmin();
+    bool IsCurrentUserAdmin(TLogin* login);
+    wxString GetUserLockInfo();  // "http://<local address>:<local port>"
+    wxString GetUserLockInfo(TLogin* login);
+
+    // Whether the server's host is this machine: it is the local address, the host's name or "localhost" in
+    // any letter case, or 127.0.0.1. The first form takes the address by the byte, the second in any case.
+    bool IsServerLocal();
+    bool IsServerLocal(TLogin* login);
+    bool IsTernServerLocal();  // a file "ComGUISrv.Dll" lies in the current folder
+    int GetEndian();           // always 0x49494949, the bytes "IIII"
 
     // --- Parameters of tickets ---------------------------------------------------------------------------
-    // Without a container argument: of the implicit session's container. type and id name the ticket, key
-    // and text values are UTF-8, value is what PARAM_TYPE.h says, pos is -1 for the key as a whole or the
-    // index of a value. -1 when the implicit session is not logged in, also where the container is another
-    // session's; else the slot's result, not zero for success. A text that is read belongs to the module.
+    // Of a container, or without that argument of the one from login. type and id: the ticket; key: UTF-8;
+    // value: see PARAM_TYPE.h, also for how long a text lives; pos: -1 the key as a whole, 0 and up one of
+    // its values. The slot's result, or -1 while the first session is logged out, whoever's the container is.
     int GetParameter(int type, int id, char const* key, PARAM_TYPE ptype, void* value, int pos);
     int GetParameter(MTICKET_ACCESS const* container, int type, int id, char const* key, PARAM_TYPE ptype,
                      void* value, int pos);  // -1 for a null container
@@ -162,9 +170,9 @@ public:
     int DeleteTicketOfType(int type, int id);
     int DeleteTicketOfType(MTICKET_ACCESS const* container, int type, int id);
 
-    // A ticket's data into the caller's buffer. The arguments are between host and plug-in.
-    int GetTicketData(int a, int b, int c, int* size, void* data);
-    int GetTicketData(TLogin* login, int a, int b, int c, int* size, void* data);
+    // A ticket's data into a buffer of the caller. What the five values say is between host and plug-in.
+    int GetTicketData(int a, int b, int c, int* d, void* data);
+    int GetTicketData(TLogin* login, int a, int b, int c, int* d, void* data);
 
     // --- Ticket files ------------------------------------------------------------------------------------
     // Each call opens the file of that path, does one thing and closes it again. They need no session and no
@@ -207,18 +215,21 @@ public:
     // run of records that share one key pointer; for other kinds one record, or null.
     static void fGUI2NOTIFICATION(void* pUser, int kind, int argA, int argB, int code, void* data);
 
-    // The queue, first in, first out, without a bound, and its lock. Records are made with new.
+    // The queue, first in, first out, without a bound, and its lock. Its records come from new and are the
+    // queue's until the receiver takes and deletes them.
     static std::list<NotifData*> m_notificationList;
     static wxCriticalSection m_csNotificationList;
 
 private:
     // What two families do alike, on the state of one of them.
-    int InitializeRecord(TLogin* login, int stamp, bool& initialized, unsigned int& portCounter);
-    int LoginRecord(TLogin* login, bool& loggedIn);
-    int RegisterCallback(void* hSession, STICKET_ACCESS const* ticket, void* pUser, int& notificationId);
-    int LogoutRecord(TLogin* login, bool& loggedIn, bool& initialized, unsigned int& portCounter);
+    COMGUI_LOCAL int InitializeRecord(TLogin* login, int stamp, bool& initialized, unsigned int& portCounter);
+    COMGUI_LOCAL int LoginRecord(TLogin* login, bool& loggedIn);
+    COMGUI_LOCAL int RegisterCallback(void* hSession, STICKET_ACCESS const* ticket, void* pUser,
+                                      int& notificationId);
+    COMGUI_LOCAL int LogoutRecord(TLogin* login, bool& loggedIn, bool& initialized,
+                                  unsigned int& portCounter);
 
-    static ComGUIManager* m_pInstance;
+    COMGUI_LOCAL static ComGUIManager* m_pInstance;
 
     TLogin* m_pLogin = nullptr;          // the implicit session; never null once constructed
     TLogin* m_pBackwardLogin = nullptr;  // set by LoginBackward, nowhere else

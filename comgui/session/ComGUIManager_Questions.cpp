@@ -1,4 +1,4 @@
-// Questions that are answered from local state alone.
+// Questions that the records answer.
 #include "comgui/session/ComGUIManager.h"
 
 #include <cstring>
@@ -19,42 +19,42 @@ bool NamesThisMachine(char const* host)
 }
 }  // namespace
 
-wxString ComGUIManager::GetServerName() const { return m_serverName; }
+wxString ComGUIManager::GetServerName() { return m_serverName; }
 
-int ComGUIManager::GetServerName(TLogin*) const { return -9999; }
+int ComGUIManager::GetServerName(TLogin*) { return -9999; }
 
-wxString ComGUIManager::GetLocalEndPoint() const { return Text(m_pLogin->szLocalEndPoint); }
+wxString ComGUIManager::GetLocalEndPoint() { return Text(m_pLogin->szLocalEndPoint); }
 
-wxString ComGUIManager::GetCurrentlyLoggedUser() const { return Text(m_pLogin->szUser); }
+wxString ComGUIManager::GetCurrentlyLoggedUser() { return Text(m_pLogin->szUser); }
 
-wxString ComGUIManager::GetCurrentlyLoggedUser(TLogin* login) const { return Text(login->szUser); }
+wxString ComGUIManager::GetCurrentlyLoggedUser(TLogin* login) { return Text(login->szUser); }
 
-int ComGUIManager::GetCurrentlyLoggedUserTicketID() const { return m_pLogin->iClientStamp; }
+int ComGUIManager::GetCurrentlyLoggedUserTicketID() { return m_pLogin->iClientStamp; }
 
-bool ComGUIManager::IsCurrentUserAdmin() const { return IsCurrentUserAdmin(m_pLogin); }
+bool ComGUIManager::IsCurrentUserAdmin() { return IsCurrentUserAdmin(m_pLogin); }
 
-bool ComGUIManager::IsCurrentUserAdmin(TLogin* login) const { return login->iUserRole == Administrator; }
+bool ComGUIManager::IsCurrentUserAdmin(TLogin* login) { return login->iUserRole == Administrator; }
 
-wxString ComGUIManager::GetUserLockInfo() const { return GetUserLockInfo(m_pLogin); }
+wxString ComGUIManager::GetUserLockInfo() { return GetUserLockInfo(m_pLogin); }
 
-wxString ComGUIManager::GetUserLockInfo(TLogin* login) const
+wxString ComGUIManager::GetUserLockInfo(TLogin* login)
 {
     return wxString("http://") << Text(login->szLocalAddress) << ":" << login->iLocalPort;
 }
 
-bool ComGUIManager::IsServerLocal() const
+bool ComGUIManager::IsServerLocal()
 {
     return std::strcmp(m_pLogin->szServerHost, m_pLogin->szLocalAddress) == 0 ||
            NamesThisMachine(m_pLogin->szServerHost);
 }
 
-bool ComGUIManager::IsServerLocal(TLogin* login) const
+bool ComGUIManager::IsServerLocal(TLogin* login)
 {
     // Unlike the form above, and on purpose, the letter case of the address does not count here.
     return Text(login->szLocalAddress).IsSameAs(Text(login->szServerHost), false) ||
            NamesThisMachine(login->szServerHost);
 }
 
-bool ComGUIManager::IsTernServerLocal() const { return wxFileExists("ComGUISrv.Dll"); }
+bool ComGUIManager::IsTernServerLocal() { return wxFileExists("ComGUISrv.Dll"); }
 
-int ComGUIManager::GetEndian() const { return 0x49494949; }
+int ComGUIManager::GetEndian() { return 0x49494949; }

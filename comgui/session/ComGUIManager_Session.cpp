@@ -9,7 +9,7 @@ namespace
 {
 constexpr int ClientStamp = 30312656;  // of every session that is prepared from plain texts
 constexpr int ServerNotReachable = -2005;
-constexpr unsigned int PauseAfterUninitialize = 4;  // seconds
+constexpr int PauseAfterUninitialize = 4;  // seconds
 
 template <unsigned long Size>
 void Assign(char (&field)[Size], char const* text)

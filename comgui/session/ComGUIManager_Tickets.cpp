@@ -1,12 +1,14 @@
-// Operations that go from the session straight to the slots of a ticket container. Which of them test for
-// a login, and which for a null container, differs from one to the next; hosts rely on each as it is.
+// From the session to a slot of a container, with nothing between but a test or two. Which tests differs from
+// one operation to the next, and hosts rely on each as it is.
 #include "comgui/session/ComGUIManager.h"
 
 #include "comgui/ticket/TICKET_ID.h"
 
 namespace
 {
-constexpr int NotLoggedIn = -1;  // also: no container
+// A count is read into 64 bits, since so many are written, and its low 32 bits count.
+
+constexpr int Refused = -1;  // not logged in, or no container
 
 // Reads the values under a key one by one. get(ptype, value, pos) is a GetParameter with everything else
 // filled in. Its answers are not looked at: what a failed read leaves in place counts.
@@ -14,7 +16,7 @@ template <typename Array, typename Element, typename Get, typename Convert>
 Array ReadArray(PARAM_TYPE ptype, Element element, Get get, Convert convert)
 {
     Array result;
-    long long word = -1;  // 64 bits, since the module writes as many
+    long long word = -1;
     get(PARAM_COUNT, &word, -1);
     int const count = static_cast<int>(word);
     for (int pos = 0; pos < count; ++pos)
@@ -49,7 +51,7 @@ auto ReaderOf(ComGUIManager& manager, MTICKET_ACCESS const* container, int type,
 int ComGUIManager::GetParameter(int type, int id, char const* key, PARAM_TYPE ptype, void* value, int pos)
 {
     if (!m_bLoggedIn)
-        return NotLoggedIn;
+        return Refused;
     return m_pClientContainer->MGETPARAMETER(m_pClientContainer->Instance, type, id, key, ptype, value, pos);
 }
 
@@ -57,7 +59,7 @@ int ComGUIManager::GetParameter(MTICKET_ACCESS const* container, int type, int i
                                 PARAM_TYPE ptype, void* value, int pos)
 {
     if (!m_bLoggedIn || !container)
-        return NotLoggedIn;
+        return Refused;
     return container->MGETPARAMETER(container->Instance, type, id, key, ptype, value, pos);
 }
 
@@ -71,7 +73,7 @@ int ComGUIManager::SetParameter(MTICKET_ACCESS const* container, int type, int i
                                 PARAM_TYPE ptype, void const* value, int pos)
 {
     if (!m_bLoggedIn)
-        return NotLoggedIn;
+        return Refused;
     return container->MSETPARAMETER(container->Instance, type, id, key, ptype, value, pos);
 }
 
@@ -83,13 +85,13 @@ int ComGUIManager::GetSystemTicketParamForKey(char const* key, PARAM_TYPE ptype,
 int ComGUIManager::GetSystemTicketParamForKey(MTICKET_ACCESS const* container, char const* key,
                                               PARAM_TYPE ptype, void* value, int pos)
 {
-    return container->MGETPARAMETER(container->Instance, SYSTEM_TICKET_TYPE, SYSTEM_TICKET_ID, key, ptype,
-                                    value, pos);
+    return container->MGETPARAMETER(container->Instance, comgui::detail::SystemTicketType,
+                                    comgui::detail::SystemTicketId, key, ptype, value, pos);
 }
 
 int ComGUIManager::GetValueCount(MTICKET_ACCESS const* container, int type, int id, wxString key)
 {
-    long long count = 0;  // 64 bits, since the module writes as many
+    long long count = 0;
     int const found =
         container->MGETPARAMETER(container->Instance, type, id, key.utf8_str(), PARAM_COUNT, &count, -1);
     return found ? static_cast<int>(count) : 0;
@@ -137,12 +139,12 @@ int ComGUIManager::DeleteTicketOfType(MTICKET_ACCESS const* container, int type,
     return container->MOPERATION(container->Instance, type, id, MTICKET_OP_DELETE, nullptr);
 }
 
-int ComGUIManager::GetTicketData(int a, int b, int c, int* size, void* data)
+int ComGUIManager::GetTicketData(int a, int b, int c, int* d, void* data)
 {
-    return GetTicketData(m_pLogin, a, b, c, size, data);
+    return GetTicketData(m_pLogin, a, b, c, d, data);
 }
 
-int ComGUIManager::GetTicketData(TLogin* login, int a, int b, int c, int* size, void* data)
+int ComGUIManager::GetTicketData(TLogin* login, int a, int b, int c, int* d, void* data)
 {
-    return m_interface.GetTicketDataEntry(m_hModuleInstance, login->hSession, a, b, c, size, data);
+    return m_interface.GetTicketDataEntry(m_hModuleInstance, login->hSession, a, b, c, d, data);
 }

@@ -1,7 +1,7 @@
-// The plug-in's table of entries: 44 words, 352 bytes, copied whole by ComGUIManager when it starts. The
-// first four are the header of every CFPlugIn. hInstance is what Open gave out, hSession the handle in
-// TLogin. A result is 0 for success unless told otherwise, and reaches the manager's caller untouched. No
-// entry may throw, and none may keep a pointer it was given beyond its return, except where told.
+// What the plug-in offers: 44 words behind the interface pointer, of which ComGUIManager keeps a copy. They
+// begin with the four that every CFPlugIn has. hInstance comes from Open, hSession from the record that was
+// logged in. An entry without a word on its result gives 0 for success or a code of its own, and the host
+// gets to see that number. The library has nothing that would catch an exception.
 #pragma once
 
 #include "comgui/session/STicketFactory.h"
@@ -36,28 +36,30 @@ struct ComGUIModuleInterface
     int (*Open)(void** hInstance);
     void* reserved40;
 
-    // Prepares a session for this record and fills in what the plug-in needs there. stamp is the value of
-    // iClientStamp.
+    // Makes the record ready for a login, and may fill in what it likes. stamp: as in iClientStamp.
     int (*InitializeEntry)(void* hInstance, TLogin* login, int stamp);
 
     int (*IsAliveEntry)(void* hInstance, char const* host, int port);  // 0: a server answers there
 
-    // Not a code: the IPv4 address of this machine as the server sees it, first octet in the top byte.
+    // Not a code but an IPv4 address, first octet in the top byte.
     unsigned int (*GetLocalAddressEntry)(void* hInstance, char const* host, int port);
 
-    // Fills in hSession, iClientStamp, iUserRole and szLocalEndPoint.
+    // Makes a session of the record's user; hSession, iClientStamp, iUserRole and szLocalEndPoint tell of it.
     int (*LoginEntry)(void* hInstance, TLogin* login);
-    int (*LogoutEntry)(void* hInstance, void* hSession);
+    int (*LogoutEntry)(void* hInstance, void* hSession);       // the handle is worth nothing afterwards
     int (*UninitializeEntry)(void* hInstance, TLogin* login);  // the record itself, not its handle
 
-    // The session's container, owned by the plug-in; null if there is none.
+    // Null for a session without one. The plug-in keeps owning it.
     MTICKET_ACCESS const* (*GetClientContainerEntry)(void* hInstance, void* hSession);
 
-    // Fills the caller's buffer with a ticket's data; what the five values are is the plug-in's to say.
+    // A ticket's data into a buffer of the caller; the plug-in knows what the five values say.
     int (*GetTicketDataEntry)(void* hInstance, void* hSession, int, int, int, int*, void*);
     void* reserved112[2];
 
+    // Carries out the command of that name. data: its record or text, of size bytes.
     int (*SendCommandEntry)(void* hInstance, void* hSession, char const* command, int size, void* data);
+    // Send and fetch a file, and send a job: paths and names are UTF-8. The plug-in knows which of the two
+    // char* of a file is the local side. The Sync forms wait for the end.
     int (*PutFileEntry)(void* hInstance, void* hSession, char*, char*);
     int (*GetFileEntry)(void* hInstance, void* hSession, char*, char*);
     int (*SendJobEntry)(void* hInstance, void* hSession, TJobIdentification*, char* path, char* name);

@@ -1,5 +1,6 @@
-// The record of one session, shared with the plug-in: every offset is fixed. Texts are UTF-8, end at a
-// zero byte and are cut at 127 bytes. Offsets in comments are bytes.
+// What host, library and plug-in know of one session, in a layout that all three share. Texts are UTF-8 and
+// end with a zero byte, so 127 bytes fit; a longer one is cut there, and if that splits a character it reads
+// as empty afterwards.
 //
 // Memory: a record given to ComGUIManager::Login(TLogin*) becomes the manager's, which frees it with free().
 // So make such a record with calloc, never with new and never on the stack, and set nSize:

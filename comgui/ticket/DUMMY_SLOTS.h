@@ -1,9 +1,12 @@
-// Fillers for the write, lock and notification slots of a container that supports none of them: every call
-// reports success (1), looks at no argument and does nothing.
+// What a read-only module puts where its table needs a write, a lock or a notification: 1, for success, and
+// nothing else happens.
 #pragma once
 
 #include "comgui/foundation/export.h"
 #include "comgui/ticket/MTICKET_ACCESS.h"
+#include "comgui/ticket/PARAM_TYPE.h"
+#include "comgui/ticket/SETMULTIPAR.h"
+#include "comgui/ticket/TICKET_OP.h"
 
 extern "C"
 {

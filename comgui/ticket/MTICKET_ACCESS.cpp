@@ -22,5 +22,5 @@ int MSETPARAMETER_TO_MSETMULTIPAR(void* Instance, int ticketType, int ticketId, 
     table[0].type = type;
     table[0].value = value;
     table[0].pos = pos;
-    return set(Instance, ticketType, ticketId, table) != 0 && table[0].ok;
+    return set(Instance, ticketType, ticketId, table) != 0 && comgui::detail::IsOk(table[0]) ? 1 : 0;
 }

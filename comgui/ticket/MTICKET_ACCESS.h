@@ -1,10 +1,11 @@
-// The function table of a ticket container; the module makes one for each session and owns it. Its slots
-// take the table's Instance first and the ticket's address, type and id, next. What holds for the slots of
-// STICKET_ACCESS holds here: not zero is success, a failed read leaves the value alone, no slot keeps a
-// pointer that it was given.
+// How a session reaches all of its tickets: slots as in STICKET_ACCESS, each with the type and id of the
+// ticket it is meant for behind the Instance. The module owns the table. Keys, texts and tables that a slot
+// gets are the caller's and are not kept; what a slot of the same purpose promises there it promises here.
 #pragma once
 
 #include "comgui/foundation/export.h"
+#include "comgui/ticket/PARAM_TYPE.h"
+#include "comgui/ticket/SETMULTIPAR.h"
 #include "comgui/ticket/STICKET_ACCESS.h"
 #include "comgui/ticket/TICKET_OP.h"
 #include <cstddef>
@@ -13,6 +14,7 @@
 typedef int (*MGETPARAMETER)(void* Instance, int ticketType, int ticketId, char const* key, PARAM_TYPE type,
                              void* value, int pos);
 
+// The result means nothing: each record's ok tells.
 typedef int (*MGETMULTIPAR)(void* Instance, int ticketType, int ticketId, GETMULTIPAR* table);
 
 // Called for each ticket of a walk; false ends it. The ticket's table lives until it returns.
@@ -24,6 +26,7 @@ typedef int (*MWALKTICKETS)(void* Instance, MWALKTICKETS_ACTION action, void* co
 typedef int (*MSETPARAMETER)(void* Instance, int ticketType, int ticketId, char const* key, PARAM_TYPE type,
                              void const* value, int pos);
 
+// Sets each record's ok; the result speaks of the table as a whole.
 typedef int (*MSETMULTIPAR)(void* Instance, int ticketType, int ticketId, SETMULTIPAR* table);
 
 // Carries out an operation; what arg is stands with each code in TICKET_OP.h.
@@ -75,7 +78,7 @@ static_assert(offsetof(MTICKET_ACCESS, MENDISNOTIF) == 432);
 static_assert(offsetof(MTICKET_ACCESS, reserved440) == 440);
 static_assert(offsetof(MTICKET_ACCESS, MCREATETICKET) == 456);
 
-// Two adapters for a module that implements only one of MSETPARAMETER and MSETMULTIPAR.
+// A module writes either the single or the table form of a write and gets the other one from here.
 extern "C"
 {
     // A table write by single writes: calls set for every record, also behind a failed one, and leaves each

@@ -15,7 +15,8 @@
 //   PARAM_UNSIGNED64   address of an unsigned long long, both ways
 //
 // So a write of a pointer or a text hands over the word itself, where every other type hands over an
-// address; a read always hands over an address.
+// address; a read always hands over an address. A text or BIN_STRING that was read is the module's, and
+// lives as long as that says: copy it before the next call if in doubt.
 #pragma once
 
 #include "comgui/foundation/export.h"
@@ -23,7 +24,7 @@
 enum PARAM_TYPE : int
 {
     PARAM_NONE = 0,        // a write deletes; a read asks for the stored type
-    PARAM_POINTER = 1,     // opaque, meaningful in the local process only
+    PARAM_POINTER = 1,     // opaque; of use only in the process it comes from
     PARAM_INT = 2,         // 32 bits, signed
     PARAM_DOUBLE = 3,      // IEEE 754, 64 bits
     PARAM_STRING = 4,      // UTF-8, ends at its first zero byte

@@ -1,11 +1,12 @@
-// The records of a table of parameter writes, and of a table of parameter reads. A table is an array that
-// ends at a record with a null key; whoever walks one looks at the key only. The layouts are shared with
-// the plug-in and must not change.
+// The records in which many parameters go to a ticket, or come from one, in a single call. A table has no
+// length: the record whose key is null ends it, whatever its other fields hold. Both layouts cross to the
+// plug-in, byte for byte.
 #pragma once
 
 #include "comgui/foundation/export.h"
 #include "comgui/ticket/PARAM_TYPE.h"
 #include <cstddef>
+#include <cstring>
 #include <type_traits>
 
 struct SETMULTIPAR
@@ -28,8 +29,8 @@ static_assert(offsetof(SETMULTIPAR, pos) == 24);
 static_assert(offsetof(SETMULTIPAR, ok) == 28);
 static_assert(offsetof(SETMULTIPAR, reserved29) == 29);
 
-// Laid out as SETMULTIPAR. value is always the address where the result goes, for texts and pointers too,
-// and the first value of a vector is read at pos 0, where it is written at -1.
+// A read of the same shape. Here value is an address for every type, texts and pointers included, and a
+// vector begins at pos 0, not at the -1 of a write.
 struct GETMULTIPAR
 {
     char const* key;
@@ -52,3 +53,16 @@ static_assert(offsetof(GETMULTIPAR, reserved29) == 29);
 
 // By key, bytewise, and by nothing else: records of one key are equal whatever they hold.
 COMGUI_EXPORT bool operator<(SETMULTIPAR const& left, SETMULTIPAR const& right);
+
+namespace comgui::detail
+{
+// The ok of a record that came back across the boundary: the other side may have left any byte there, and
+// only 0 is a failure.
+template <typename Record>
+bool IsOk(Record const& record)
+{
+    unsigned char byte;
+    std::memcpy(&byte, &record.ok, sizeof byte);
+    return byte != 0;
+}
+}  // namespace comgui::detail

@@ -1,7 +1,7 @@
-// The function table of one ticket. The module owns the table and whatever its Instance means; a host only
-// reads it. Every slot takes the table's Instance first, and unless told otherwise returns an int that is
-// not zero for success. A missing key, a position past the end and a value of another type all are plain
-// failures. Whether slots may be called from several threads is the module's to say.
+// One ticket as the module shows it to a host: a handle and the functions that take it as their first
+// argument. The host looks at the table and changes nothing in it. A function answers not zero when it did
+// what it was asked, unless its own comment says otherwise; why it did not (no such key, no such position,
+// another type) cannot be told. Ask the module which threads may call.
 #pragma once
 
 #include "comgui/ticket/PARAM_TYPE.h"
@@ -9,7 +9,7 @@
 #include <cstddef>
 #include <type_traits>
 
-// Reads one value; value is what PARAM_TYPE.h says for a read. A failure leaves *value untouched.
+// Reads one value to where value points, see PARAM_TYPE.h; after a failure that place is as it was.
 typedef int (*SGETPARAMETER)(void* Instance, char const* key, PARAM_TYPE type, void* value, int pos);
 
 // Reads a table. The result of the call means nothing: each record's ok tells.

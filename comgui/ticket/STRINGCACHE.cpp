@@ -4,7 +4,7 @@ char const* STRINGCACHE::operator()(char const*& text) { return text = (*this)[t
 
 char const* STRINGCACHE::operator[](char const* text)
 {
-    return text ? m_texts.emplace(text).first->c_str() : nullptr;
+    return text ? texts.emplace(text).first->c_str() : nullptr;
 }
 
-void STRINGCACHE::clear() { m_texts.clear(); }
+void STRINGCACHE::clear() { texts.clear(); }

@@ -20,5 +20,5 @@ public:
     void clear();
 
 private:
-    std::set<std::string, std::less<>> m_texts;
+    std::set<std::string, std::less<>> texts;
 };

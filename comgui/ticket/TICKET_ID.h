@@ -1,11 +1,10 @@
-// Identifiers of tickets, locks and notifications: 32-bit signed at the interface, judged as told at each
-// validator. The library itself asks only TICKET_TYPE_Valid; the others serve modules and hosts.
+// Which numbers name a ticket, a lock or a notification. The validators are for modules and hosts: the
+// library passes on whatever it is given, apart from the type of a listing.
 #pragma once
 
 #include "comgui/foundation/export.h"
 
-// Reserved ticket ids. They travel through the tables although TICKET_ID_Valid refuses them; only the
-// module knows what to do with them. Position -1, the key as a whole, is a different thing.
+// Ids that name no ticket but mean something to the module. No validator accepts them.
 enum : int
 {
     TICKET_ID_NONE = -1,  // no ticket: an operation on the whole container, with type -1 too
@@ -13,12 +12,12 @@ enum : int
     TICKET_ID_NEXT = -4,  // the module chooses the next free id
 };
 
-// The system ticket: server-wide parameters and the folder keys.
-enum : int
+namespace comgui::detail
 {
-    SYSTEM_TICKET_TYPE = 0,
-    SYSTEM_TICKET_ID = 0,
-};
+// The system ticket: server-wide parameters and the folder keys.
+inline constexpr int SystemTicketType = 0;
+inline constexpr int SystemTicketId = 0;
+}  // namespace comgui::detail
 
 extern "C"
 {

@@ -35,16 +35,16 @@ extern "C"
 class TICKET_OP
 {
 public:
-    constexpr TICKET_OP(STICKET_OP code) : m_code(code) {}
-    constexpr TICKET_OP(MTICKET_OP code) : m_code(code) {}
+    constexpr TICKET_OP(STICKET_OP op) : code(op) {}
+    constexpr TICKET_OP(MTICKET_OP op) : code(op) {}
 
-    constexpr int GetInt() const { return m_code; }
-    constexpr void SetInt(int code) { m_code = code; }
+    constexpr int GetInt() const { return code; }
+    constexpr void SetInt(int value) { code = value; }
 
     // The code as it is, also where it is a container's: the caller has asked IsSTICKET_OP before.
-    constexpr operator STICKET_OP() const { return static_cast<STICKET_OP>(m_code); }
+    constexpr operator STICKET_OP() const { return static_cast<STICKET_OP>(code); }
 
 private:
-    int m_code;
+    int code;
 };
 static_assert(sizeof(TICKET_OP) == 4 && std::is_trivially_copyable_v<TICKET_OP>);
