@@ -522,7 +522,7 @@ TEST_F(SiteFolder, DiskFullAtTheFirstStart_IsToldAndTheNextStartIsWhole)
         [this](ChildProcess::Report const& report)
         {
             std::signal(SIGXFSZ, SIG_IGN);
-            rlimit const limit{16 * 1024, 16 * 1024};
+            rlimit const limit{16ul * 1024, 16ul * 1024};
             setrlimit(RLIMIT_FSIZE, &limit);
             report(ReasonOfOpening().find("free space") != std::string::npos);
         });
@@ -539,7 +539,7 @@ TEST_F(SiteFolder, KilledAtTheFirstStart_TheNextOneFindsNoHalfSite)
     MakeSite();
     auto const whole =
         std::chrono::duration_cast<std::chrono::microseconds>(std::chrono::steady_clock::now() - start);
-    std::mt19937 random(1234);
+    std::mt19937_64 random = RandomFrom(1234);
     int killed = 0;
     for (int round = 0; killed < (IsSanitized ? 10 : 50); ++round)
     {
@@ -551,7 +551,7 @@ TEST_F(SiteFolder, KilledAtTheFirstStart_TheNextOneFindsNoHalfSite)
                 Site site = Site::Open(Folder(), ShippedSeed);
                 report(1);
             });
-        std::this_thread::sleep_for(whole * (random() % 128) / 100);
+        std::this_thread::sleep_for(whole * static_cast<int>(random() % 128) / 100);
         child.Kill();
         killed += child.Last(0) == 0 ? 1 : 0;
 

@@ -51,6 +51,8 @@ std::string ContentOf(std::filesystem::path const& file)
     return {std::istreambuf_iterator<char>(stream), std::istreambuf_iterator<char>()};
 }
 
+std::mt19937_64 RandomFrom(unsigned seed) { return std::mt19937_64(seed); }
+
 ChildProcess::ChildProcess(std::function<void(Report const& report)> const& work)
 {
     int ends[2];

@@ -6,6 +6,7 @@
 #include <cstdint>
 #include <filesystem>
 #include <functional>
+#include <random>
 #include <string>
 #include <sys/types.h>
 #include <vector>
@@ -36,6 +37,9 @@ private:
 
 void WriteFile(std::filesystem::path const& file, std::string const& content);
 std::string ContentOf(std::filesystem::path const& file);
+
+// The same numbers in every run, so that what fails once fails again.
+std::mt19937_64 RandomFrom(unsigned seed);
 
 // A forked process that runs work and ends with 0, or with 1 after an exception.
 class ChildProcess

@@ -163,12 +163,12 @@ TEST_F(SqliteStorageFile, New_WhenFirstThrows_StaysNew)
     EXPECT_THROW(SqliteStorage(File(), []() -> StorageContent { throw std::runtime_error("no seed"); }),
                  std::runtime_error);
     bool asked = false;
-    SqliteStorage(File(),
-                  [&asked]
-                  {
-                      asked = true;
-                      return StorageContent();
-                  });
+    SqliteStorage const storage(File(),
+                                [&asked]
+                                {
+                                    asked = true;
+                                    return StorageContent();
+                                });
     EXPECT_TRUE(asked);
 }
 
@@ -370,7 +370,7 @@ TEST_F(SqliteStorageFile, Load_WhenTheFunctionThrows_CanBeCalledAgain)
 // Any sequence of changes leaves in the file what it leaves in a plain map.
 TEST_F(SqliteStorageFile, RandomChanges_EqualAPlainMap)
 {
-    std::mt19937 random(20240611);
+    std::mt19937_64 random = RandomFrom(20240611);
     auto const below = [&random](unsigned limit) { return static_cast<int>(random() % limit); };
     std::map<TicketAddress, Values> model;
     auto const check = [&model](Storage& storage)
@@ -420,8 +420,7 @@ TEST_F(SqliteStorageFile, RandomChanges_EqualAPlainMap)
             {
                 for (int size = below(20); size > 0; --size)
                     text.push_back(static_cast<char>(random()));
-                auto const bits =
-                    static_cast<long long>((static_cast<std::uint64_t>(random()) << 32) | random());
+                auto const bits = static_cast<long long>(random());
                 StoredValue const choices[] = {Integer(PARAM_INT, static_cast<int>(bits)),
                                                Integer(PARAM_UNSIGNED64, bits),
                                                Double(std::bit_cast<double>(bits)), Bytes(PARAM_STRING, text),
@@ -590,9 +589,9 @@ TEST_F(SqliteStorageFile, DiskFull_FailsClearlyAndLosesNothing)
             std::signal(SIGXFSZ, SIG_IGN);
             rlimit limit{};
             getrlimit(RLIMIT_FSIZE, &limit);
-            limit.rlim_cur = 256 * 1024;
+            limit.rlim_cur = 256ul * 1024;
             setrlimit(RLIMIT_FSIZE, &limit);
-            std::string const large(1024 * 1024, 'x');
+            std::string const large(1024ul * 1024, 'x');
             std::string const reason = ReasonOf(
                 [&] {
                     storage.Apply(
@@ -622,7 +621,7 @@ TEST_F(SqliteStorageFile, DiskFull_FailsClearlyAndLosesNothing)
 // not behind what was acknowledged.
 TEST_F(SqliteStorageFile, KilledAtAnyInstant_KeepsAcknowledgedChangesWhole)
 {
-    std::mt19937 random(4711);
+    std::mt19937_64 random = RandomFrom(4711);
     std::vector<std::string> const keys{"A", "B", "C", "D", "E"};
     std::int64_t last = 0;
     for (int round = 0; round < (IsSanitized ? 15 : 60); ++round)

@@ -227,7 +227,7 @@ TEST(TicketXml, Pointer_TakesThePlaceAndIsNotWritten)
 
 TEST(TicketXml, RandomTickets_ComeBack)
 {
-    std::mt19937_64 random(815);
+    std::mt19937_64 random = RandomFrom(815);
     auto const below = [&random](unsigned limit) { return static_cast<int>(random() % limit); };
     for (int round = 0; round < (IsSanitized ? 100 : 500); ++round)
     {
@@ -309,7 +309,7 @@ INSTANTIATE_TEST_SUITE_P(
                 "1: the attribute version stands twice"},
         BadText{"BytesThatAreNoUtf8", "<ticket version='1'>\n\xE4</ticket>",
                 "2: not UTF-8, or a control character; such a value is written as base64"},
-        BadText{"ZeroByte", std::string("<ticket version='1'>\n\n\0</ticket>", 33),
+        BadText{"ZeroByte", std::string("<ticket version='1'>\n\n\0</ticket>", 32),
                 "3: not UTF-8, or a control character; such a value is written as base64"}),
     [](auto const& fact) { return std::string(fact.param.name); });
 
@@ -570,11 +570,11 @@ TEST(ReplaceFile, DiskFull_KeepsTheOldContentAndLeavesNothingElse)
         [&folder](ChildProcess::Report const& report)
         {
             std::signal(SIGXFSZ, SIG_IGN);
-            rlimit const limit{64 * 1024, 64 * 1024};
+            rlimit const limit{64ul * 1024, 64ul * 1024};
             setrlimit(RLIMIT_FSIZE, &limit);
             try
             {
-                ReplaceFile(folder / "file", std::string(128 * 1024, 'x'));
+                ReplaceFile(folder / "file", std::string(128ul * 1024, 'x'));
             }
             catch (StorageError const& error)
             {
@@ -590,7 +590,7 @@ TEST(ReplaceFile, DiskFull_KeepsTheOldContentAndLeavesNothingElse)
 TEST(ReplaceFile, KilledAtAnyInstant_HasTheOldContentOrTheNew)
 {
     TemporaryFolder folder;
-    std::mt19937 random(99);
+    std::mt19937_64 random = RandomFrom(99);
     ReplaceFile(folder / "file", std::string(100000, 'a'));
     for (int round = 0; round < (IsSanitized ? 10 : 50); ++round)
     {
