@@ -86,7 +86,7 @@ int Initialize(void* hInstance, TLogin* login, int)
                          return MODULE_INVALID_ARGUMENT;
                      if (!ServerOfThisSite())
                          return MODULE_SITE_UNAVAILABLE;
-                     Handles::Get().Initialize(login);
+                     Handles::Get().Initialize(hInstance, login);
                      return MODULE_DONE;
                  });
 }
@@ -94,8 +94,10 @@ int Initialize(void* hInstance, TLogin* login, int)
 int Uninitialize(void* hInstance, TLogin* login)
 {
     return Entry(hInstance,
-                 [&]() -> int
-                 { return Handles::Get().Uninitialize(login) ? MODULE_DONE : MODULE_UNKNOWN_RECORD; });
+                 [&]() -> int {
+                     return Handles::Get().Uninitialize(hInstance, login) ? MODULE_DONE
+                                                                          : MODULE_UNKNOWN_RECORD;
+                 });
 }
 
 int IsAlive(void* hInstance, char const* host, int port)

@@ -18,7 +18,7 @@ Handles& Handles::Get()
 void* Handles::NewInstance()
 {
     std::lock_guard const lock(m_lock);
-    return *m_instances.insert(HandleOf(m_instances.size() + 1)).first;
+    return m_instances.try_emplace(HandleOf(m_instances.size() + 1)).first->first;
 }
 
 bool Handles::IsInstance(void* hInstance) const
@@ -27,16 +27,16 @@ bool Handles::IsInstance(void* hInstance) const
     return m_instances.contains(hInstance);
 }
 
-void Handles::Initialize(TLogin const* record)
+void Handles::Initialize(void* hInstance, TLogin const* record)
 {
     std::lock_guard const lock(m_lock);
-    m_records.insert(record);
+    m_instances.at(hInstance).insert(record);
 }
 
-bool Handles::Uninitialize(TLogin const* record)
+bool Handles::Uninitialize(void* hInstance, TLogin const* record)
 {
     std::lock_guard const lock(m_lock);
-    return m_records.erase(record) != 0;
+    return m_instances.at(hInstance).erase(record) != 0;
 }
 
 void* Handles::NewSession(TicketServer& server, std::shared_ptr<Session> session)

@@ -20,8 +20,9 @@ public:
     void* NewInstance();
     bool IsInstance(void* hInstance) const;
 
-    void Initialize(TLogin const* record);
-    bool Uninitialize(TLogin const* record);  // false if it was not initialised
+    // An instance keeps account of its records; both need one that IsInstance knows.
+    void Initialize(void* hInstance, TLogin const* record);
+    bool Uninitialize(void* hInstance, TLogin const* record);  // false if it was not initialised
 
     void* NewSession(TicketServer& server, std::shared_ptr<Session> session);
     Container const* SessionOf(void* hSession) const;  // null for a handle that is none, or no longer
@@ -29,8 +30,7 @@ public:
 
 private:
     mutable std::mutex m_lock;
-    std::set<void*> m_instances;
-    std::set<TLogin const*> m_records;
+    std::map<void*, std::set<TLogin const*>> m_instances;    // with the records that are initialised
     std::map<void*, std::unique_ptr<Container>> m_sessions;  // ended ones, too: their tables stay
 };
 }  // namespace standin

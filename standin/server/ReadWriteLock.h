@@ -27,6 +27,7 @@ public:
     void lock() { pthread_rwlock_wrlock(&m_lock); }
     void unlock() { pthread_rwlock_unlock(&m_lock); }
     void lock_shared() { pthread_rwlock_rdlock(&m_lock); }
+    bool try_lock_shared() { return pthread_rwlock_tryrdlock(&m_lock) == 0; }
     void unlock_shared() { pthread_rwlock_unlock(&m_lock); }
 
 private:

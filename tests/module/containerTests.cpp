@@ -1,9 +1,9 @@
-// The ticket contract, kept by the container of a session and by the fake that other tests use in its place;
+// The container contract, kept by the container of a session and by the fake that other tests use in its place;
 // and what is the bundle's own about its containers.
 #include "tests/module/ModuleUnderTest.h"
 
 #include "tests/support/ContainerFake.h"
-#include "tests/support/TicketContract.h"
+#include "tests/support/ContainerContract.h"
 #include <fstream>
 #include <iterator>
 #include <stdexcept>
@@ -46,7 +46,7 @@ std::unique_ptr<CONTAINER_SUBJECT> New()
 }
 }  // namespace
 
-INSTANTIATE_TEST_SUITE_P(Containers, TicketContract,
+INSTANTIATE_TEST_SUITE_P(Containers, ContainerContract,
                          testing::Values(CONTAINER_MAKER{"Fake", New<FAKE_SUBJECT>},
                                          CONTAINER_MAKER{"Bundle", New<BUNDLE_SUBJECT>}),
                          [](auto const& maker) { return std::string(maker.param.name); });

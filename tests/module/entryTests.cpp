@@ -127,6 +127,15 @@ TEST_F(Entries, Uninitialize_UndoesInitializeOnce)
     EXPECT_EQ(module->UninitializeAsyncEntry(module.Instance(), nullptr), MODULE_UNKNOWN_RECORD);
 }
 
+TEST_F(Entries, Uninitialize_OfARecordThatAnotherInstanceInitialised_IsRefused)
+{
+    MODULE const other;
+    RECORD record;
+    EXPECT_EQ(module->InitializeEntry(module.Instance(), &record, 0), MODULE_DONE);
+    EXPECT_EQ(other->UninitializeEntry(other.Instance(), &record), MODULE_UNKNOWN_RECORD);
+    EXPECT_EQ(module->UninitializeEntry(module.Instance(), &record), MODULE_DONE);
+}
+
 TEST_F(Entries, Login_FillsInTheSessionsFieldsAndNoOther)
 {
     RECORD record("operator", "operator");

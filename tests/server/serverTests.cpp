@@ -2,6 +2,7 @@
 #include "tests/server/ServerTest.h"
 
 #include <atomic>
+#include <chrono>
 #include <thread>
 
 using standin::SystemTicket;
@@ -178,19 +179,29 @@ TEST_F(Sessions, TicketsMadeAndDeletedWhileOthersRead_NeverMixUp)
     EXPECT_FALSE(Server().Exists({3, 1000}));
 }
 
-TEST_F(Sessions, AWriter_IsNotKeptOutByReadersThatNeverPause)
+TEST(ReadWriteLock, AWriterThatWaits_GoesBeforeReadersThatComeLater)
 {
-    auto& session = As("operator");
-    std::atomic<bool> done{false};
-    InParallel(5,
-               [&](int i)
-               {
-                   for (int step = 0; i == 0 && step < 200; ++step)
-                       Server().Set(session, Job, "K", PARAM_INT, &step, -1);
-                   if (i == 0)
-                       done = true;
-                   for (int value = 0; i != 0 && !done;)
-                       Server().Get(session, Job, "K", PARAM_INT, &value, -1);
-               });
-    EXPECT_EQ(Int(Job, "K"), 199);  // reached at all: the readers stop only when the writer is done
+    standin::ReadWriteLock lock;
+    lock.lock_shared();
+    std::thread writer(
+        [&]
+        {
+            lock.lock();
+            lock.unlock();
+        });
+    // Once the writer waits, nobody else gets in, though only a reader has the lock.
+    auto const end = std::chrono::steady_clock::now() + std::chrono::seconds(30);
+    bool keptOut = false;
+    while (!keptOut && std::chrono::steady_clock::now() < end)
+    {
+        keptOut = !lock.try_lock_shared();
+        if (!keptOut)
+            lock.unlock_shared();
+        std::this_thread::yield();
+    }
+    lock.unlock_shared();
+    writer.join();
+    EXPECT_TRUE(keptOut);
+    EXPECT_TRUE(lock.try_lock_shared());
+    lock.unlock_shared();
 }

@@ -2,6 +2,7 @@
 #include "tests/server/ServerTest.h"
 
 #include "tests/support/ContainerFake.h"
+#include <climits>
 #include <deque>
 #include <random>
 
@@ -31,7 +32,7 @@ struct WRITE
         if (among(0, 30) == 0)
             record.pos = standin::LargestPosition + among(-1, 1);
         text.assign(static_cast<std::size_t>(among(0, 40)), static_cast<char>(among('a', 'z')));
-        number = static_cast<long long>(random()) << 32 | random();
+        number = std::uniform_int_distribution<long long>(LLONG_MIN, LLONG_MAX)(random);
         bytes.assign(text);
         if (record.type == PARAM_STRING)
             record.value = text.c_str();
