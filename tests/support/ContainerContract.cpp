@@ -1,48 +1,48 @@
-#include "tests/support/TicketContract.h"
+#include "tests/support/ContainerContract.h"
 
 #include "comgui/ticket/BIN_STRING.h"
 #include <climits>
 #include <cmath>
 
-int TicketContract::Read(char const* key, PARAM_TYPE type, void* value, int pos) const
+int ContainerContract::Read(char const* key, PARAM_TYPE type, void* value, int pos) const
 {
     return access->MGETPARAMETER(access->Instance, subject->type, subject->id, key, type, value, pos);
 }
 
-int TicketContract::Write(char const* key, PARAM_TYPE type, void const* value, int pos) const
+int ContainerContract::Write(char const* key, PARAM_TYPE type, void const* value, int pos) const
 {
     return access->MSETPARAMETER(access->Instance, subject->type, subject->id, key, type, value, pos);
 }
 
-int TicketContract::Int(char const* key, int pos) const
+int ContainerContract::Int(char const* key, int pos) const
 {
     int value = -1;
     Read(key, PARAM_INT, &value, pos);
     return value;
 }
 
-std::string TicketContract::Text(char const* key, int pos) const
+std::string ContainerContract::Text(char const* key, int pos) const
 {
     char const* value = "";
     Read(key, PARAM_STRING, &value, pos);
     return value;
 }
 
-unsigned long TicketContract::Count(char const* key) const
+unsigned long ContainerContract::Count(char const* key) const
 {
     unsigned long count = 0;
     Read(key, PARAM_COUNT, &count);
     return count;
 }
 
-int TicketContract::Type(char const* key, int pos) const
+int ContainerContract::Type(char const* key, int pos) const
 {
     int type = 0;
     Read(key, PARAM_NONE, &type, pos);
     return type;
 }
 
-TEST_P(TicketContract, MGETPARAMETER_MissingKey_FailsAndLeavesTheValue)
+TEST_P(ContainerContract, MGETPARAMETER_MissingKey_FailsAndLeavesTheValue)
 {
     int value = 42;
     char const* text = "kept";
@@ -59,7 +59,7 @@ TEST_P(TicketContract, MGETPARAMETER_MissingKey_FailsAndLeavesTheValue)
     EXPECT_EQ(type, 44);
 }
 
-TEST_P(TicketContract, MGETPARAMETER_MissingTicket_FailsAndLeavesTheValue)
+TEST_P(ContainerContract, MGETPARAMETER_MissingTicket_FailsAndLeavesTheValue)
 {
     int value = 42;
     EXPECT_EQ(access->MGETPARAMETER(access->Instance, subject->type, subject->missingId, "K", PARAM_INT,
@@ -68,7 +68,7 @@ TEST_P(TicketContract, MGETPARAMETER_MissingTicket_FailsAndLeavesTheValue)
     EXPECT_EQ(value, 42);
 }
 
-TEST_P(TicketContract, MGETPARAMETER_AnotherTypeThanStored_FailsAndLeavesTheValue)
+TEST_P(ContainerContract, MGETPARAMETER_AnotherTypeThanStored_FailsAndLeavesTheValue)
 {
     EXPECT_TRUE(WriteInt("K", 7));
     for (int type = PARAM_POINTER; type <= PARAM_UNSIGNED64; ++type)
@@ -82,7 +82,7 @@ TEST_P(TicketContract, MGETPARAMETER_AnotherTypeThanStored_FailsAndLeavesTheValu
     }
 }
 
-TEST_P(TicketContract, MGETPARAMETER_UnknownTypeOrPosition_Fails)
+TEST_P(ContainerContract, MGETPARAMETER_UnknownTypeOrPosition_Fails)
 {
     EXPECT_TRUE(WriteInt("K", 7));
     int value = 42;
@@ -95,7 +95,7 @@ TEST_P(TicketContract, MGETPARAMETER_UnknownTypeOrPosition_Fails)
     EXPECT_EQ(value, 42);
 }
 
-TEST_P(TicketContract, MGETPARAMETER_NullKeyOrValue_Fails)
+TEST_P(ContainerContract, MGETPARAMETER_NullKeyOrValue_Fails)
 {
     EXPECT_TRUE(WriteInt("K", 7));
     int value = 42;
@@ -104,7 +104,7 @@ TEST_P(TicketContract, MGETPARAMETER_NullKeyOrValue_Fails)
     EXPECT_EQ(value, 42);
 }
 
-TEST_P(TicketContract, MSETPARAMETER_OfEveryType_IsReadBack)
+TEST_P(ContainerContract, MSETPARAMETER_OfEveryType_IsReadBack)
 {
     int target = 0;
     int const i = INT_MIN;
@@ -141,7 +141,7 @@ TEST_P(TicketContract, MSETPARAMETER_OfEveryType_IsReadBack)
     EXPECT_TRUE(Read("UL", PARAM_UNSIGNED64, &widest) && widest == ULLONG_MAX);
 }
 
-TEST_P(TicketContract, MSETPARAMETER_ANullPointerAndAnEmptyText_AreValues)
+TEST_P(ContainerContract, MSETPARAMETER_ANullPointerAndAnEmptyText_AreValues)
 {
     void* pointer = &pointer;
     EXPECT_TRUE(Write("P", PARAM_POINTER, nullptr));
@@ -153,7 +153,7 @@ TEST_P(TicketContract, MSETPARAMETER_ANullPointerAndAnEmptyText_AreValues)
     EXPECT_STREQ(text, "");
 }
 
-TEST_P(TicketContract, MSETPARAMETER_WhatIsNoValue_IsRefusedAndChangesNothing)
+TEST_P(ContainerContract, MSETPARAMETER_WhatIsNoValue_IsRefusedAndChangesNothing)
 {
     EXPECT_TRUE(WriteInt("K", 7));
     int const value = 8;
@@ -172,7 +172,7 @@ TEST_P(TicketContract, MSETPARAMETER_WhatIsNoValue_IsRefusedAndChangesNothing)
     EXPECT_EQ(Count("K"), 1u);
 }
 
-TEST_P(TicketContract, MSETPARAMETER_NullOrEmptyKey_IsRefused)
+TEST_P(ContainerContract, MSETPARAMETER_NullOrEmptyKey_IsRefused)
 {
     EXPECT_EQ(WriteInt(nullptr, 7), 0);
     EXPECT_EQ(WriteInt("", 7), 0);
@@ -181,7 +181,7 @@ TEST_P(TicketContract, MSETPARAMETER_NullOrEmptyKey_IsRefused)
     EXPECT_EQ(Read("", PARAM_INT, &value), 0);
 }
 
-TEST_P(TicketContract, MSETPARAMETER_OtherNegativePositionsAndFarOnes_AreRefused)
+TEST_P(ContainerContract, MSETPARAMETER_OtherNegativePositionsAndFarOnes_AreRefused)
 {
     for (int const pos : {-3, -4, INT_MIN, 16777216, INT_MAX})
     {
@@ -191,7 +191,7 @@ TEST_P(TicketContract, MSETPARAMETER_OtherNegativePositionsAndFarOnes_AreRefused
     EXPECT_EQ(Count("K"), 0u);
 }
 
-TEST_P(TicketContract, MSETPARAMETER_MissingTicket_IsRefused)
+TEST_P(ContainerContract, MSETPARAMETER_MissingTicket_IsRefused)
 {
     int const value = 7;
     EXPECT_EQ(access->MSETPARAMETER(access->Instance, subject->type, subject->missingId, "K", PARAM_INT,
@@ -199,7 +199,7 @@ TEST_P(TicketContract, MSETPARAMETER_MissingTicket_IsRefused)
               0);
 }
 
-TEST_P(TicketContract, MSETPARAMETER_AtMinus1_StartsTheKeyAnew)
+TEST_P(ContainerContract, MSETPARAMETER_AtMinus1_StartsTheKeyAnew)
 {
     for (int pos = 0; pos < 3; ++pos)
         EXPECT_TRUE(WriteInt("K", pos, pos));
@@ -209,7 +209,7 @@ TEST_P(TicketContract, MSETPARAMETER_AtMinus1_StartsTheKeyAnew)
     EXPECT_EQ(Text("K", 0), "alone");
 }
 
-TEST_P(TicketContract, MSETPARAMETER_AtAPosition_LeavesTheOthers)
+TEST_P(ContainerContract, MSETPARAMETER_AtAPosition_LeavesTheOthers)
 {
     EXPECT_TRUE(WriteInt("K", 10));
     EXPECT_TRUE(WriteInt("K", 11, 1));
@@ -221,7 +221,7 @@ TEST_P(TicketContract, MSETPARAMETER_AtAPosition_LeavesTheOthers)
     EXPECT_EQ(Text("K", 2), "mixed");
 }
 
-TEST_P(TicketContract, MSETPARAMETER_AtMinus2_AppendsBehindTheLastValue)
+TEST_P(ContainerContract, MSETPARAMETER_AtMinus2_AppendsBehindTheLastValue)
 {
     EXPECT_TRUE(WriteInt("K", 10, -2));
     EXPECT_TRUE(WriteInt("K", 11, -2));
@@ -233,7 +233,7 @@ TEST_P(TicketContract, MSETPARAMETER_AtMinus2_AppendsBehindTheLastValue)
     EXPECT_EQ(Int("K", 6), 16);
 }
 
-TEST_P(TicketContract, MSETPARAMETER_AtTheLargestPosition_LeavesAGapAndNoRoomToAppend)
+TEST_P(ContainerContract, MSETPARAMETER_AtTheLargestPosition_LeavesAGapAndNoRoomToAppend)
 {
     EXPECT_TRUE(WriteInt("K", 7, 16777215));
     EXPECT_EQ(Count("K"), 16777216u);
@@ -242,7 +242,7 @@ TEST_P(TicketContract, MSETPARAMETER_AtTheLargestPosition_LeavesAGapAndNoRoomToA
     EXPECT_EQ(WriteInt("K", 8, -2), 0);
 }
 
-TEST_P(TicketContract, AGap_CountsButCannotBeRead)
+TEST_P(ContainerContract, AGap_CountsButCannotBeRead)
 {
     EXPECT_TRUE(WriteInt("K", 12, 2));
     EXPECT_EQ(Count("K"), 3u);
@@ -253,14 +253,14 @@ TEST_P(TicketContract, AGap_CountsButCannotBeRead)
     EXPECT_EQ(Int("K", 2), 12);
 }
 
-TEST_P(TicketContract, AReadAtMinus1_OfAVector_GivesItsFirstValue)
+TEST_P(ContainerContract, AReadAtMinus1_OfAVector_GivesItsFirstValue)
 {
     EXPECT_TRUE(WriteInt("K", 10, 0));
     EXPECT_TRUE(WriteInt("K", 11, 1));
     EXPECT_EQ(Int("K", -1), 10);
 }
 
-TEST_P(TicketContract, ATypeQuery_AtMinus1_TellsAVectorFromASingleValue)
+TEST_P(ContainerContract, ATypeQuery_AtMinus1_TellsAVectorFromASingleValue)
 {
     EXPECT_TRUE(WriteText("K", "a"));
     EXPECT_EQ(Type("K", -1), PARAM_STRING);
@@ -272,7 +272,7 @@ TEST_P(TicketContract, ATypeQuery_AtMinus1_TellsAVectorFromASingleValue)
     EXPECT_EQ(Type("K", 2), PARAM_NONE);
 }
 
-TEST_P(TicketContract, ACountQuery_IsForMinus1Only)
+TEST_P(ContainerContract, ACountQuery_IsForMinus1Only)
 {
     EXPECT_TRUE(WriteInt("K", 7));
     unsigned long count = ULONG_MAX;
@@ -282,7 +282,7 @@ TEST_P(TicketContract, ACountQuery_IsForMinus1Only)
     EXPECT_EQ(count, 1u);  // all 64 bits
 }
 
-TEST_P(TicketContract, ADeletion_AtMinus1_TakesTheWholeKey)
+TEST_P(ContainerContract, ADeletion_AtMinus1_TakesTheWholeKey)
 {
     EXPECT_TRUE(WriteInt("K", 10, 0));
     EXPECT_TRUE(WriteInt("K", 11, 1));
@@ -291,7 +291,7 @@ TEST_P(TicketContract, ADeletion_AtMinus1_TakesTheWholeKey)
     EXPECT_EQ(Type("K", -1), PARAM_NONE);
 }
 
-TEST_P(TicketContract, ADeletion_InTheMiddle_LeavesAGapAndAtTheEndTheCountShrinks)
+TEST_P(ContainerContract, ADeletion_InTheMiddle_LeavesAGapAndAtTheEndTheCountShrinks)
 {
     for (int pos = 0; pos < 4; ++pos)
         EXPECT_TRUE(WriteInt("K", pos, pos));
@@ -305,7 +305,7 @@ TEST_P(TicketContract, ADeletion_InTheMiddle_LeavesAGapAndAtTheEndTheCountShrink
     EXPECT_EQ(Int("K", 2), 9);
 }
 
-TEST_P(TicketContract, ADeletion_OfTheLastValue_TakesTheKey)
+TEST_P(ContainerContract, ADeletion_OfTheLastValue_TakesTheKey)
 {
     EXPECT_TRUE(WriteInt("K", 7));
     EXPECT_TRUE(Delete("K", 0));
@@ -313,7 +313,7 @@ TEST_P(TicketContract, ADeletion_OfTheLastValue_TakesTheKey)
     EXPECT_EQ(Type("K", -1), PARAM_NONE);
 }
 
-TEST_P(TicketContract, ADeletion_OfWhatIsNotThere_Succeeds_ByDesign)
+TEST_P(ContainerContract, ADeletion_OfWhatIsNotThere_Succeeds_ByDesign)
 {
     EXPECT_TRUE(WriteInt("K", 7));
     EXPECT_TRUE(Delete("Missing"));
@@ -323,14 +323,14 @@ TEST_P(TicketContract, ADeletion_OfWhatIsNotThere_Succeeds_ByDesign)
     EXPECT_EQ(Count("Missing"), 0u);
 }
 
-TEST_P(TicketContract, ADeletion_AtMinus2_IsRefused)
+TEST_P(ContainerContract, ADeletion_AtMinus2_IsRefused)
 {
     EXPECT_TRUE(WriteInt("K", 7));
     EXPECT_EQ(Delete("K", -2), 0);
     EXPECT_EQ(Int("K"), 7);
 }
 
-TEST_P(TicketContract, ATextThatWasRead_StaysAfterItIsReplacedOrDeleted)
+TEST_P(ContainerContract, ATextThatWasRead_StaysAfterItIsReplacedOrDeleted)
 {
     EXPECT_TRUE(WriteText("K", "the first text, longer than any short string"));
     char const* first = nullptr;
@@ -343,7 +343,7 @@ TEST_P(TicketContract, ATextThatWasRead_StaysAfterItIsReplacedOrDeleted)
     EXPECT_STREQ(second, "second");
 }
 
-TEST_P(TicketContract, MSETMULTIPAR_CarriesOutEveryRecordItCanAndMarksEach)
+TEST_P(ContainerContract, MSETMULTIPAR_CarriesOutEveryRecordItCanAndMarksEach)
 {
     int const value = 7;
     SETMULTIPAR table[] = {{"A", PARAM_INT, 0, &value, -1, false, {}},
@@ -361,14 +361,14 @@ TEST_P(TicketContract, MSETMULTIPAR_CarriesOutEveryRecordItCanAndMarksEach)
     EXPECT_EQ(Count("B"), 0u);
 }
 
-TEST_P(TicketContract, MSETMULTIPAR_NullTable_FailsAndAnEmptyOneSucceeds)
+TEST_P(ContainerContract, MSETMULTIPAR_NullTable_FailsAndAnEmptyOneSucceeds)
 {
     SETMULTIPAR empty[1] = {};
     EXPECT_EQ(access->MSETMULTIPAR(access->Instance, subject->type, subject->id, nullptr), 0);
     EXPECT_NE(access->MSETMULTIPAR(access->Instance, subject->type, subject->id, empty), 0);
 }
 
-TEST_P(TicketContract, MSETMULTIPAR_MissingTicket_FailsWithEveryRecordUnmarked)
+TEST_P(ContainerContract, MSETMULTIPAR_MissingTicket_FailsWithEveryRecordUnmarked)
 {
     int const value = 7;
     SETMULTIPAR table[] = {{"A", PARAM_INT, 0, &value, -1, true, {}}, {}};
@@ -376,7 +376,7 @@ TEST_P(TicketContract, MSETMULTIPAR_MissingTicket_FailsWithEveryRecordUnmarked)
     EXPECT_FALSE(table[0].ok);
 }
 
-TEST_P(TicketContract, MGETMULTIPAR_ReadsEachRecordAndMarksIt)
+TEST_P(ContainerContract, MGETMULTIPAR_ReadsEachRecordAndMarksIt)
 {
     EXPECT_TRUE(WriteInt("A", 10, 0));
     EXPECT_TRUE(WriteText("A", "eleven", 1));
@@ -398,12 +398,12 @@ TEST_P(TicketContract, MGETMULTIPAR_ReadsEachRecordAndMarksIt)
     EXPECT_EQ(untouched, 42);
 }
 
-TEST_P(TicketContract, MGETMULTIPAR_NullTable_IsPutUpWith)
+TEST_P(ContainerContract, MGETMULTIPAR_NullTable_IsPutUpWith)
 {
     EXPECT_EQ(access->MGETMULTIPAR(access->Instance, subject->type, subject->id, nullptr), 0);
 }
 
-TEST_P(TicketContract, MOPERATION_Delete_TakesTheTicketOnce)
+TEST_P(ContainerContract, MOPERATION_Delete_TakesTheTicketOnce)
 {
     EXPECT_TRUE(WriteInt("K", 7));
     auto const erase = [&]
@@ -414,12 +414,12 @@ TEST_P(TicketContract, MOPERATION_Delete_TakesTheTicketOnce)
     EXPECT_EQ(erase(), 0);
 }
 
-TEST_P(TicketContract, MOPERATION_DeleteOfTheSystemTicket_IsRefused)
+TEST_P(ContainerContract, MOPERATION_DeleteOfTheSystemTicket_IsRefused)
 {
     EXPECT_EQ(access->MOPERATION(access->Instance, 0, 0, MTICKET_OP_DELETE, nullptr), 0);
 }
 
-TEST_P(TicketContract, AnAddressOutOfRange_IsRefusedEverywhere)
+TEST_P(ContainerContract, AnAddressOutOfRange_IsRefusedEverywhere)
 {
     int value = 42;
     for (auto const& [type, id] :

@@ -1,5 +1,6 @@
-// What every ticket container promises about reads, writes and deletions, as one suite that each container
-// of the tree passes: instantiate TicketContract with a way to make one, and build TicketContract.cpp in.
+// What the container of the bundle and the fake that stands in for it agree on, as one suite that both pass:
+// instantiate ContainerContract with a way to make one, and build ContainerContract.cpp in. It goes further
+// than a plug-in of another maker must, which may answer a refused call or an odd position in its own way.
 #pragma once
 
 #include "comgui/ticket/MTICKET_ACCESS.h"
@@ -26,10 +27,10 @@ struct CONTAINER_MAKER
     std::unique_ptr<CONTAINER_SUBJECT> (*make)();
 };
 
-class TicketContract : public testing::TestWithParam<CONTAINER_MAKER>
+class ContainerContract : public testing::TestWithParam<CONTAINER_MAKER>
 {
 protected:
-    TicketContract() : subject(GetParam().make()), access(subject->Access()) {}
+    ContainerContract() : subject(GetParam().make()), access(subject->Access()) {}
 
     // Through the slots, on the subject's ticket. What Read leaves in value is the slot's doing.
     int Read(char const* key, PARAM_TYPE type, void* value, int pos = -1) const;
