@@ -37,6 +37,7 @@ struct FAKE_ENTRIES
     static int QueryInterface(void* instance, COMGUI_UUID id, void** out)
     {
         EXPECT_EQ(instance, &current->m_instance);
+        current->instanceCalls.emplace_back("QueryInterface");
         current->interfaceUUID = HexOf(id.bytes, sizeof id.bytes);
         if (current->givesInterface)
             *out = &current->m_interface;
@@ -46,7 +47,7 @@ struct FAKE_ENTRIES
     static unsigned int Release(void* instance)
     {
         EXPECT_EQ(instance, &current->m_instance);
-        ++current->released;
+        current->instanceCalls.emplace_back("Release");
         return 0;
     }
 
@@ -54,7 +55,7 @@ struct FAKE_ENTRIES
     {
         if (current->setsHandle)
             *handle = current->Handle();
-        return current->Called("Open", current->Handle());
+        return current->Answer("Open");
     }
 
     static int WithRecord(char const* entry, void* handle, TLogin* login)
@@ -182,29 +183,48 @@ void* FakeModule::Instance() { return &m_instance; }
 int FakeModule::Called(char const* entry, void* handle)
 {
     EXPECT_EQ(handle, Handle()) << entry;
+    return Answer(entry);
+}
+
+int FakeModule::Answer(char const* entry)
+{
     calls.emplace_back(entry);
     auto const result = results.find(entry);
     return result == results.end() ? 0 : result->second;
 }
 
-BundleOnDisk EmptyBundle(TemporaryFolder const& folder)
+void FakeModule::SpoilTheLiveTable()
 {
-    BundleOnDisk bundle(folder.Path());
+    // No entry's own type fits them all; none but a failing test gets as far as a call.
+    int (*const spoiled)() = []
+    {
+        ADD_FAILURE() << "called through the live table";
+        return -1;
+    };
+    unsigned char words[sizeof table];
+    for (std::size_t i = 0; i < sizeof words; i += sizeof spoiled)
+        std::memcpy(words + i, &spoiled, sizeof spoiled);
+    std::memcpy(&table, words, sizeof words);
+}
+
+BundleOnDisk EmptyBundle(std::filesystem::path const& folder)
+{
+    BundleOnDisk bundle(folder);
     bundle.LinkExecutable(SESSION_TEST_PLUGIN);
     return bundle;
 }
 
 WithModule::WithModule()
 {
-    EmptyBundle(folder).AddFactory(COMGUI_PLUGIN_TYPE_UUID, FirstUUID, "FirstFactory");
-    LookIn(folder);
+    EmptyBundle(folder.Path()).AddFactory(COMGUI_PLUGIN_TYPE_UUID, FirstUUID, "FirstFactory");
+    LookIn(folder.Path());
 }
 
 WithModule::~WithModule() { UtilityObjects::SetPlugInsFolder(wxString()); }
 
-void WithModule::LookIn(TemporaryFolder const& plugIns)
+void WithModule::LookIn(std::filesystem::path const& plugIns)
 {
-    UtilityObjects::SetPlugInsFolder(wxString::FromUTF8(plugIns.Path().c_str()));
+    UtilityObjects::SetPlugInsFolder(wxString::FromUTF8(plugIns.c_str()));
 }
 
 TLogin* WithModule::NewRecord()
@@ -212,6 +232,44 @@ TLogin* WithModule::NewRecord()
     auto* const login = static_cast<TLogin*>(std::calloc(1, sizeof(TLogin)));
     login->nSize = sizeof(TLogin);
     return login;
+}
+
+WithManager::WithManager()
+{
+    manager.MacLogin();  // shows the record, and has no effect on a session
+    own = module.login;
+    module.login = nullptr;
+    module.calls.clear();
+}
+
+bool WithManager::IsLoggedIn()
+{
+    int value = 0;
+    return manager.GetParameter(fake.Access(), 0, 0, "Key", PARAM_INT, &value, -1) != -1;
+}
+
+bool WithManager::FakeIsTheContainer()
+{
+    int value = 0;
+    fake.calls.clear();
+    manager.GetSystemTicketParamForKey("Key", PARAM_INT, &value, -1);
+    return fake.calls.size() == 1;
+}
+
+bool WithManager::IsInitialized()
+{
+    TLogin scratch = {};
+    std::size_t const before = module.calls.size();
+    manager.Initialize(&scratch, 0);
+    return module.calls.size() == before;
+}
+
+bool WithManager::IsBackwardInitialized()
+{
+    TLogin scratch = {};
+    std::size_t const before = module.calls.size();
+    manager.InitializeBackward(&scratch, 0);
+    return module.calls.size() == before;
 }
 
 void WithManager::LogIn()

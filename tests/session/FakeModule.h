@@ -7,6 +7,7 @@
 #include "tests/support/ContainerFake.h"
 #include "tests/support/TemporaryFolder.h"
 #include "tests/support/TicketFake.h"
+#include <filesystem>
 #include <functional>
 #include <gtest/gtest.h>
 #include <map>
@@ -23,7 +24,7 @@ public:
 
     // --- what it shall do --------------------------------------------------------------------------------
     bool givesInterface = true;
-    bool setsHandle = true;                  // Open stores a handle
+    bool setsHandle = true;                  // Open stores a handle; else every entry comes with null
     std::map<std::string, int> results;      // of the entries, by name; 0 where nothing stands
     unsigned int localAddress = 0x0A141EC8;  // 10.20.30.200
     MTICKET_ACCESS const* container = nullptr;
@@ -36,12 +37,12 @@ public:
     std::vector<std::string> factories;  // that were asked for an instance
     std::string typeUUID;                // with which they were, as hex digits
     std::string interfaceUUID;
-    int released = 0;                // the factory's instance
-    std::vector<std::string> calls;  // of entries, by name
-    TLogin* login = nullptr;         // the record that came last; the manager's own, so a test may look
-    TLogin copy = {};                // what that record held then
-    int stamp = 0;                   // that came with it
-    void* session = nullptr;         // the session handle that came last
+    std::vector<std::string> instanceCalls;  // of the factory's instance: QueryInterface and Release
+    std::vector<std::string> calls;          // of entries, by name
+    TLogin* login = nullptr;                 // the record that came last
+    TLogin copy = {};                        // what that record held then
+    int stamp = 0;                           // that came with it
+    void* session = nullptr;                 // the session handle that came last
     std::string host;
     int port = 0;
     std::vector<int> ints;  // the arguments of GetTicketDataEntry behind the session
@@ -55,11 +56,16 @@ public:
     static inline ComGUIModuleInterface table = {};
     STicketFactory factory = {};
 
-    void* Handle() { return &m_handle; }
+    void* Handle() { return setsHandle ? &m_handle : nullptr; }
     void* Instance();  // what a factory gives out
-    int Called(char const* entry, void* handle);
+
+    // From here on a call through the live table fails the test; a copy made before stays good.
+    static void SpoilTheLiveTable();
 
 private:
+    int Called(char const* entry, void* handle);
+    int Answer(char const* entry);
+
     static inline char m_handle = 0;
     static inline ComGUIModuleInterface* m_instance = &table;   // COM: an instance's first word is its table
     static inline ComGUIModuleInterface* m_interface = &table;  // QueryInterface hands out another object
@@ -67,7 +73,7 @@ private:
 };
 
 // A bundle with that module and no factory yet.
-BundleOnDisk EmptyBundle(TemporaryFolder const& folder);
+BundleOnDisk EmptyBundle(std::filesystem::path const& folder);
 
 inline constexpr char FirstUUID[] = "11111111-1111-1111-1111-111111111111";
 inline constexpr char SecondUUID[] = "22222222-2222-2222-2222-222222222222";
@@ -80,8 +86,8 @@ protected:
     ~WithModule() override;
 
     // From here on the library looks for its plug-in there; in an empty folder it finds none.
-    static void LookIn(TemporaryFolder const& plugIns);
-    void LoseTheBundle() { LookIn(empty); }
+    static void LookIn(std::filesystem::path const& plugIns);
+    void LoseTheBundle() { LookIn(empty.Path()); }
 
     // A record that a manager may free.
     static TLogin* NewRecord();
@@ -91,13 +97,26 @@ protected:
     TemporaryFolder empty;
 };
 
-// The same with a manager that has opened it.
+// The same with a manager that has opened it. module.calls begins behind that.
 class WithManager : public WithModule
 {
 protected:
+    WithManager();
+
     // A manager that is logged in with the fake container.
     void LogIn();
 
+    // -1 from a guarded call tells.
+    bool IsLoggedIn();
+
+    // Whether the session forms use the fake; only to be asked when there is a container.
+    bool FakeIsTheContainer();
+
+    // Whether Initialize of that family does nothing. If it does something, it takes a port.
+    bool IsInitialized();
+    bool IsBackwardInitialized();
+
     ContainerFake fake;
     ComGUIManager manager;
+    TLogin* own = nullptr;  // the manager's record
 };

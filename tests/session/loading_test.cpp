@@ -2,8 +2,12 @@
 #include "comgui/session/ComGUIManager.h"
 
 #include "comgui/session/ComGUIGlobals.h"
-#include "tests/session/FailingCoreFoundation.h"
 #include "tests/session/FakeModule.h"
+#include "tests/session/Faults.h"
+#include "tests/session/Sleep.h"
+#include "tests/session/WatchedCoreFoundation.h"
+#include <cstdlib>
+#include <filesystem>
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 #include <memory>
@@ -35,6 +39,30 @@ protected:
     }
 };
 
+using LoadingDeathTest = Loading;
+
+class FailingOpen : public WithModule
+{
+protected:
+    FailingOpen() { module.results["Open"] = 7; }
+    ~FailingOpen() override { insteadOfSleeping = nullptr; }
+
+    // Calls entries of a new manager from all over the table.
+    void UseManager()
+    {
+        testing::internal::CaptureStderr();
+        ComGUIManager manager;
+        testing::internal::GetCapturedStderr();
+        FakeModule::SpoilTheLiveTable();
+        insteadOfSleeping = [](int) {};
+        TLogin login = {};
+        manager.Initialize(&login, 0);
+        manager.Logout(&login);
+        manager.GetTicketData(&login, 0, 0, 0, nullptr, nullptr);
+        manager.UninitializeAsync(&login);
+    }
+};
+
 class FailedManager : public WithModule
 {
 protected:
@@ -63,11 +91,24 @@ TEST_F(Loading, GoodBundle_IsAskedWithTheTwoUUIDs)
     EXPECT_EQ(module.interfaceUUID, "33FC3B146CFF11D8AB09003065B1346E");
 }
 
-TEST_F(Loading, GoodBundle_CallsOpenAloneAndReleasesTheFactorysInstance)
+TEST_F(Loading, GoodBundle_CallsOpenAloneAndReleasesTheFactorysInstanceOnceItHasBeenAsked)
 {
     StderrOfAManager();
     EXPECT_THAT(module.calls, ElementsAre("Open"));
-    EXPECT_EQ(module.released, 1);
+    EXPECT_THAT(module.instanceCalls, ElementsAre("QueryInterface", "Release"));
+}
+
+TEST_F(Loading, BundlesPath_GoesOutInUtf8AsAPosixPathOfAFolder)
+{
+    std::filesystem::path const plugIns = empty.Path() / "Pl\xC3\xBCg-Ins";
+    std::filesystem::create_directory(plugIns);
+    EmptyBundle(plugIns).AddFactory(COMGUI_PLUGIN_TYPE_UUID, FirstUUID, "FirstFactory");
+    LookIn(plugIns);
+    EXPECT_EQ(StderrOfAManager(), "");
+    EXPECT_EQ(coreFoundationURL.path, (plugIns / "ComGUI.Bundle").string());
+    EXPECT_EQ(coreFoundationURL.encoding, kCFStringEncodingUTF8);
+    EXPECT_EQ(coreFoundationURL.style, kCFURLPOSIXPathStyle);
+    EXPECT_TRUE(coreFoundationURL.isDirectory);
 }
 
 TEST_F(Loading, MissingBundle_PrintsTwoLines)
@@ -80,10 +121,10 @@ TEST_F(Loading, MissingBundle_PrintsTwoLines)
 TEST_F(Loading, TwoFactories_TheFirstOfTheListServes)
 {
     TemporaryFolder const other;
-    BundleOnDisk bundle = EmptyBundle(other);
+    BundleOnDisk bundle = EmptyBundle(other.Path());
     bundle.AddFactory(COMGUI_PLUGIN_TYPE_UUID, SecondUUID, "SecondFactory");
     bundle.AddFactory(COMGUI_PLUGIN_TYPE_UUID, FirstUUID, "FirstFactory");
-    LookIn(other);
+    LookIn(other.Path());
     EXPECT_EQ(StderrOfAManager(), "");
     EXPECT_THAT(module.factories, ElementsAre("SecondFactory"));
 }
@@ -91,8 +132,8 @@ TEST_F(Loading, TwoFactories_TheFirstOfTheListServes)
 TEST_F(Loading, BundleWithoutAFactoryOfTheType_PrintsOneLine)
 {
     TemporaryFolder const other;
-    EmptyBundle(other);
-    LookIn(other);
+    EmptyBundle(other.Path());
+    LookIn(other.Path());
     EXPECT_EQ(StderrOfAManager(), NoInterface);
 }
 
@@ -100,7 +141,7 @@ TEST_F(Loading, NoInterface_IsAFailedLoadAndTheInstanceIsReleasedAllTheSame)
 {
     module.givesInterface = false;
     EXPECT_EQ(StderrOfAManager(), NoInterface);
-    EXPECT_EQ(module.released, 1);
+    EXPECT_THAT(module.instanceCalls, ElementsAre("QueryInterface", "Release"));
     EXPECT_THAT(module.calls, IsEmpty());
     EXPECT_EQ(hSTicketInstance, nullptr);
 }
@@ -112,15 +153,19 @@ TEST_F(Loading, FailingOpen_PrintsBothLinesAndPublishesNothing)
     EXPECT_EQ(hSTicketInstance, nullptr);
 }
 
-TEST_F(Loading, FailingOpen_LeavesTheTableCopiedAndTheHandleAsOpenLeftIt)
+TEST_F(FailingOpen, LeavesTheWholeTableCopied)
 {
-    module.results["Open"] = 7;
-    testing::internal::CaptureStderr();
-    ComGUIManager manager;
-    testing::internal::GetCapturedStderr();
-    TLogin login = {};
-    EXPECT_EQ(manager.IsAlive(&login), 0);  // the fake fails a call with any other handle than Open's
-    EXPECT_THAT(module.calls, ElementsAre("Open", "IsAliveEntry", "GetLocalAddressEntry"));
+    UseManager();
+    EXPECT_THAT(module.calls, ElementsAre("Open", "InitializeEntry", "LogoutEntry", "GetTicketDataEntry",
+                                          "UninitializeAsyncEntry"));
+}
+
+// The fake fails a call with any other handle than the one that Open left.
+TEST_F(FailingOpen, ThatLeavesNoHandle_LetsEntriesBeCalledWithNull)
+{
+    module.setsHandle = false;
+    UseManager();
+    EXPECT_EQ(module.calls.size(), 5u);
 }
 
 TEST_F(Loading, PathThatMakesNoString_PrintsTwoLines)
@@ -200,10 +245,10 @@ TEST_F(Loading, ManagersEnd_CallsNoEntryAndLeavesTheFactory)
     {
         ComGUIManager const manager;
         module.calls.clear();
-        module.released = 0;
+        module.instanceCalls.clear();
     }
     EXPECT_THAT(module.calls, IsEmpty());
-    EXPECT_EQ(module.released, 0);
+    EXPECT_THAT(module.instanceCalls, IsEmpty());
     EXPECT_EQ(hSTicketInstance, &module.factory);
 }
 
@@ -224,6 +269,20 @@ TEST_F(Loading, GetInstance_GivesOneManagerAndOpensThePlugInOnce)
     EXPECT_EQ(ComGUIManager::GetInstance(), first);
     EXPECT_EQ(testing::internal::GetCapturedStderr(), "");
     EXPECT_THAT(module.calls, IsEmpty());
+}
+
+TEST_F(LoadingDeathTest, GetInstance_AfterAFailedLoad_GivesTheSameManagerAndTriesNoMore)
+{
+    GTEST_FLAG_SET(death_test_style, "threadsafe");  // in a new process, where there is no manager yet
+    LoseTheBundle();
+    EXPECT_EXIT(
+        {
+            ComGUIManager* const first = ComGUIManager::GetInstance();
+            LookIn(folder.Path());  // where there would be a bundle now
+            bool const same = first && ComGUIManager::GetInstance() == first;
+            std::quick_exit(same && module.factories.empty() ? 0 : 1);
+        },
+        testing::ExitedWithCode(0), testing::StrEq(std::string(NoBundle) + NoInterface));
 }
 
 TEST_F(Loading, FreeDll_DoesNothingHoweverOften_ByDesign)
@@ -265,18 +324,19 @@ using FailedManagerDeathTest = FailedManager;
 TEST_F(FailedManagerDeathTest, Entries_AreCalledThroughNull_ByDesign)
 {
     TLogin login = {};
-    EXPECT_DEATH(manager->Initialize(&login, 0), "");
-    EXPECT_DEATH(manager->Initialize("u", "p", "h", 1), "");
-    EXPECT_DEATH(manager->IsAlive(&login), "");
-    EXPECT_DEATH(manager->Login(&login), "");
-    EXPECT_DEATH(manager->Logout(), "");
-    EXPECT_DEATH(manager->Uninitialize(), "");
-    EXPECT_DEATH(manager->GetClientContainer(), "");
-    EXPECT_DEATH(manager->GetTicketData(0, 0, 0, nullptr, nullptr), "");
+    EXPECT_EXIT(manager->Initialize(&login, 0), Faults, "");
+    EXPECT_EXIT(manager->Initialize("u", "p", "h", 1), Faults, "");
+    EXPECT_EXIT(manager->InitializeBackward(&login, 0), Faults, "");
+    EXPECT_EXIT(manager->IsAlive(&login), Faults, "");
+    EXPECT_EXIT(manager->Login(&login), Faults, "");
+    EXPECT_EXIT(manager->Logout(), Faults, "");
+    EXPECT_EXIT(manager->Uninitialize(), Faults, "");
+    EXPECT_EXIT(manager->GetClientContainer(), Faults, "");
+    EXPECT_EXIT(manager->GetTicketData(0, 0, 0, nullptr, nullptr), Faults, "");
 }
 
 TEST_F(FailedManagerDeathTest, LoginByTexts_GoesThroughTheMissingLiveTable_ByDesign)
 {
-    EXPECT_DEATH(manager->Login("u", "p", "h", 1), "");
-    EXPECT_DEATH(manager->MacLogin(), "");
+    EXPECT_EXIT(manager->Login("u", "p", "h", 1), Faults, "");
+    EXPECT_EXIT(manager->MacLogin(), Faults, "");
 }

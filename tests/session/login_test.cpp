@@ -3,6 +3,8 @@
 
 #include "comgui/foundation/stracpy.h"
 #include "tests/session/FakeModule.h"
+#include "tests/session/Faults.h"
+#include "tests/session/Records.h"
 #include <cstdlib>
 #include <cstring>
 #include <gmock/gmock.h>
@@ -15,66 +17,46 @@ namespace
 class Login : public WithManager
 {
 protected:
-    Login() { module.calls.clear(); }  // of Open
-
-    bool IsLoggedIn()
-    {
-        int value = 0;
-        return manager.GetParameter(fake.Access(), 0, 0, "Key", PARAM_INT, &value, -1) != -1;
-    }
-
-    // The container that the session forms use; only to be asked when there is one.
-    bool FakeIsTheContainer()
-    {
-        int value = 0;
-        fake.calls.clear();
-        manager.GetSystemTicketParamForKey("Key", PARAM_INT, &value, -1);
-        return fake.calls.size() == 1;
-    }
-
     TLogin record = {};
 };
 
+using LoginDeathTest = Login;
 using IsAlive = Login;
 using Containers = Login;
+
+// A record of its own for Login(TLogin*), beside the manager's first one, which is put back in the end.
+class LoginByRecord : public Login
+{
+protected:
+    LoginByRecord() { stracpy(mine->szUser, "mine", sizeof mine->szUser); }
+    ~LoginByRecord() override
+    {
+        manager.Login(own);
+        std::free(mine);
+    }
+
+    TLogin* const mine = NewRecord();
+};
 }  // namespace
 
-TEST_F(Login, ByTexts_FillsTheRecordLogsInAndFetchesTheContainer)
+// --- by texts --------------------------------------------------------------------------------------------
+
+TEST_F(Login, ByTexts_LogsInAndFetchesTheContainerOfTheSession)
 {
     module.onLogin = [this](TLogin& login) { login.hSession = this; };
     module.container = fake.Access();
     EXPECT_EQ(manager.Login("user", "secret", "host", 4711), 0);
     EXPECT_THAT(module.calls, ElementsAre("LoginEntry", "GetClientContainerEntry"));
-    EXPECT_STREQ(module.copy.szUser, "user");
-    EXPECT_STREQ(module.copy.szPassword, "secret");
-    EXPECT_STREQ(module.copy.szServerHost, "host");
-    EXPECT_EQ(module.copy.iServerPort, 4711);
     EXPECT_EQ(module.session, this);
     EXPECT_TRUE(IsLoggedIn());
     EXPECT_TRUE(FakeIsTheContainer());
 }
 
-TEST_F(Login, ByNullTextsAndMinus1_UsesWhatTheRecordHolds)
-{
-    manager.Initialize("user", "secret", "host", 4711);
-    EXPECT_EQ(manager.Login(nullptr, nullptr, nullptr, -1), 0);
-    EXPECT_STREQ(module.copy.szUser, "user");
-    EXPECT_STREQ(module.copy.szPassword, "secret");
-    EXPECT_STREQ(module.copy.szServerHost, "host");
-    EXPECT_EQ(module.copy.iServerPort, 4711);
-}
-
-TEST_F(Login, ByTexts_KeepsTextsOf127BytesAndCutsLongerOnes)
-{
-    manager.Login(std::string(127, 'a').c_str(), std::string(128, 'b').c_str(), "h", 1);
-    EXPECT_EQ(module.copy.szUser, std::string(127, 'a'));
-    EXPECT_EQ(module.copy.szPassword, std::string(127, 'b'));
-}
-
-TEST_F(Login, WithoutInitialize_IsPossible)
+TEST_F(Login, WithoutInitialize_IsPossibleAndInitializesNothing)
 {
     EXPECT_EQ(manager.Login("u", "p", "h", 1), 0);
     EXPECT_TRUE(IsLoggedIn());
+    EXPECT_FALSE(IsInitialized());
 }
 
 TEST_F(Login, ByTexts_Failing_PassesTheCodeOnAndFetchesNothing)
@@ -85,12 +67,14 @@ TEST_F(Login, ByTexts_Failing_PassesTheCodeOnAndFetchesNothing)
     EXPECT_FALSE(IsLoggedIn());
 }
 
-TEST_F(Login, ByTexts_FailingWhileLoggedIn_ClearsTheFlagAndKeepsTheContainer)
+TEST_F(Login, ByTexts_FailingWhileLoggedIn_ClearsThatFlagAloneAndKeepsTheContainer)
 {
+    manager.Initialize("u", "p", "h", 1);
     LogIn();
     module.results["LoginEntry"] = 31;
     manager.Login("u", "p", "h", 1);
     EXPECT_FALSE(IsLoggedIn());
+    EXPECT_TRUE(IsInitialized());
     EXPECT_TRUE(FakeIsTheContainer());
 }
 
@@ -99,16 +83,25 @@ TEST_F(Login, MacLogin_TouchesNoFlag_ByDesign)
     module.container = fake.Access();
     EXPECT_EQ(manager.MacLogin(), 0);
     EXPECT_FALSE(IsLoggedIn());
+    EXPECT_FALSE(IsInitialized());
     EXPECT_TRUE(FakeIsTheContainer());
 }
 
-TEST_F(Login, MacLogin_StoresTheContainerAlsoIfItIsNull)
+TEST_F(Login, MacLogin_FailingWhileLoggedIn_TouchesNoFlag_ByDesign)
+{
+    LogIn();
+    module.results["LoginEntry"] = 31;
+    EXPECT_EQ(manager.MacLogin(), 31);
+    EXPECT_TRUE(IsLoggedIn());
+}
+
+TEST_F(LoginDeathTest, MacLogin_StoresTheContainerAlsoIfItIsNull)
 {
     LogIn();
     module.container = nullptr;
     EXPECT_EQ(manager.MacLogin(), 0);
     int value = 0;
-    EXPECT_DEATH(manager.GetSystemTicketParamForKey("Key", PARAM_INT, &value, -1), "");
+    EXPECT_EXIT(manager.GetSystemTicketParamForKey("Key", PARAM_INT, &value, -1), Faults, "");
 }
 
 namespace
@@ -128,6 +121,7 @@ MTICKET_ACCESS const* LiveContainer(void*, void*)
 }
 }  // namespace
 
+// The one operation that does: the others read the copy.
 TEST_F(Login, ByTexts_ReadsTheLiveTable)
 {
     module.table.LoginEntry = LiveLogin;
@@ -144,47 +138,51 @@ TEST_F(Login, ByTexts_ReadsTheLiveTableForTheContainerToo)
     EXPECT_TRUE(liveEntryCalled);
 }
 
-TEST_F(Login, ByRecord_ReadsTheCopyOfTheTable)
-{
-    module.table.LoginEntry = LiveLogin;
-    liveEntryCalled = false;
-    manager.Login(NewRecord());
-    manager.LoginBackward(&record);
-    EXPECT_FALSE(liveEntryCalled);
-}
+// --- by record -------------------------------------------------------------------------------------------
 
-TEST_F(Containers, AreFetchedThroughTheCopyOfTheTable)
+TEST_F(LoginByRecord, SetsTheFlagAndKeepsTheContainerOfBefore)
 {
-    module.table.GetClientContainerEntry = LiveContainer;
-    liveEntryCalled = false;
-    manager.GetClientContainer();
-    EXPECT_FALSE(liveEntryCalled);
-}
-
-TEST_F(Login, ByRecord_MakesItTheImplicitOneAlsoWhenTheLoginFails)
-{
-    manager.MacLogin();
-    TLogin* const first = module.login;
-    TLogin* const login = NewRecord();
-    stracpy(login->szUser, "mine", sizeof login->szUser);
-    module.results["LoginEntry"] = 32;
-    EXPECT_EQ(manager.Login(login), 32);
-    EXPECT_EQ(module.login, login);
-    EXPECT_EQ(manager.GetCurrentlyLoggedUser(), "mine");
-    EXPECT_FALSE(IsLoggedIn());
-    std::free(first);  // the manager's first record stays allocated
-}
-
-TEST_F(Login, ByRecord_SetsTheFlagAndFetchesNoContainer)
-{
-    manager.MacLogin();
-    TLogin* const first = module.login;
+    LogIn();
+    manager.Logout();
+    ContainerFake other;
+    module.container = other.Access();
     module.calls.clear();
-    EXPECT_EQ(manager.Login(NewRecord()), 0);
+    EXPECT_EQ(manager.Login(mine), 0);
     EXPECT_THAT(module.calls, ElementsAre("LoginEntry"));
     EXPECT_TRUE(IsLoggedIn());
-    std::free(first);
+    EXPECT_FALSE(IsInitialized());
+    EXPECT_TRUE(FakeIsTheContainer());
 }
+
+TEST_F(LoginByRecord, MakesItTheManagersBeforeThePlugInIsAsked)
+{
+    wxString user;
+    module.onLogin = [&](TLogin&) { user = manager.GetCurrentlyLoggedUser(); };
+    manager.Login(mine);
+    EXPECT_EQ(user, "mine");
+    module.onLogin = nullptr;
+}
+
+TEST_F(LoginByRecord, Failing_PassesTheCodeOnAndKeepsTheRecord)
+{
+    module.results["LoginEntry"] = 32;
+    EXPECT_EQ(manager.Login(mine), 32);
+    EXPECT_EQ(module.login, mine);
+    EXPECT_EQ(manager.GetCurrentlyLoggedUser(), "mine");
+    EXPECT_FALSE(IsLoggedIn());
+}
+
+TEST_F(LoginByRecord, FailingWhileLoggedIn_ClearsThatFlagAlone)
+{
+    manager.Initialize("u", "p", "h", 1);
+    LogIn();
+    module.results["LoginEntry"] = 32;
+    manager.Login(mine);
+    EXPECT_FALSE(IsLoggedIn());
+    EXPECT_TRUE(IsInitialized());
+}
+
+// --- Backward --------------------------------------------------------------------------------------------
 
 TEST_F(Login, Backward_TouchesNothingOfTheImplicitSession)
 {
@@ -192,22 +190,39 @@ TEST_F(Login, Backward_TouchesNothingOfTheImplicitSession)
     EXPECT_EQ(module.login, &record);
     EXPECT_THAT(module.calls, ElementsAre("LoginEntry"));
     EXPECT_FALSE(IsLoggedIn());
+    EXPECT_FALSE(IsInitialized());
+    manager.MacLogin();
+    EXPECT_EQ(module.login, own);
 }
 
-TEST_F(Login, Backward_Failing_LeavesTheImplicitSessionLoggedIn)
+TEST_F(Login, Backward_StoresTheRecordBeforeThePlugInIsAsked)
 {
+    record.hSession = &record;
+    module.onLogin = [this](TLogin&) { manager.GetBackwardContainer(); };
+    manager.LoginBackward(&record);
+    EXPECT_EQ(module.session, &record);
+}
+
+TEST_F(Login, Backward_Failing_StoresTheRecordAndLeavesTheFirstSessionLoggedIn)
+{
+    manager.InitializeBackward(&record, 0);
     LogIn();
+    record.hSession = &record;
     module.results["LoginEntry"] = 33;
     EXPECT_EQ(manager.LoginBackward(&record), 33);
+    manager.GetBackwardContainer();
+    EXPECT_EQ(module.session, &record);
     EXPECT_TRUE(IsLoggedIn());
+    EXPECT_TRUE(IsBackwardInitialized());
 }
+
+// --- testing a server ------------------------------------------------------------------------------------
 
 TEST_F(IsAlive, LiveServer_WritesTheLocalAddressWithItsTopByteFirst)
 {
     std::strcpy(record.szServerHost, "server");
     record.iServerPort = 4711;
     EXPECT_EQ(manager.IsAlive(&record), 0);
-    EXPECT_THAT(module.calls, ElementsAre("IsAliveEntry", "GetLocalAddressEntry"));
     EXPECT_EQ(module.host, "server");
     EXPECT_EQ(module.port, 4711);
     EXPECT_STREQ(record.szLocalAddress, "10.20.30.200");
@@ -220,12 +235,12 @@ TEST_F(IsAlive, LongestAddress_Fits)
     EXPECT_STREQ(record.szLocalAddress, "255.255.255.255");
 }
 
-TEST_F(IsAlive, DeadServer_GivesMinus2005AndKeepsTheAddress_ButAsksForItAllTheSame)
+TEST_F(IsAlive, DeadServer_GivesMinus2005AndKeepsTheRecord_ButAsksForTheAddressAllTheSame)
 {
-    std::strcpy(record.szLocalAddress, "1.2.3.4");
+    record = RecordFullOf('r');
     module.results["IsAliveEntry"] = 5;
     EXPECT_EQ(manager.IsAlive(&record), -2005);
-    EXPECT_STREQ(record.szLocalAddress, "1.2.3.4");
+    EXPECT_THAT(record, IsRecord(RecordFullOf('r')));
     EXPECT_THAT(module.calls, ElementsAre("IsAliveEntry", "GetLocalAddressEntry"));
 }
 
@@ -236,14 +251,12 @@ TEST_F(IsAlive, IsServerOnline_SaysTheSame)
     EXPECT_FALSE(manager.IsServerOnline(&record));
 }
 
+// --- containers ------------------------------------------------------------------------------------------
+
 TEST_F(Containers, OfTheImplicitSession_IsKept)
 {
-    module.onLogin = [this](TLogin& login) { login.hSession = this; };
-    manager.MacLogin();
-    module.session = nullptr;
     module.container = fake.Access();
     EXPECT_EQ(manager.GetClientContainer(), fake.Access());
-    EXPECT_EQ(module.session, this);
     EXPECT_TRUE(FakeIsTheContainer());
 }
 
@@ -259,11 +272,9 @@ TEST_F(Containers, OfTheBackwardSession_IsNotKept)
 {
     LogIn();
     ContainerFake other;
-    record.hSession = &record;
     manager.LoginBackward(&record);
     module.container = other.Access();
     EXPECT_EQ(manager.GetBackwardContainer(), other.Access());
-    EXPECT_EQ(module.session, &record);
     EXPECT_TRUE(FakeIsTheContainer());
 }
 
@@ -271,9 +282,7 @@ TEST_F(Containers, OfAGivenRecord_IsNotKept)
 {
     LogIn();
     ContainerFake other;
-    record.hSession = &record;
     module.container = other.Access();
     EXPECT_EQ(manager.GetHandleToClientContainer(&record), other.Access());
-    EXPECT_EQ(module.session, &record);
     EXPECT_TRUE(FakeIsTheContainer());
 }

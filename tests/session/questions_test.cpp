@@ -2,6 +2,7 @@
 #include "comgui/session/ComGUIManager.h"
 
 #include "tests/session/FakeModule.h"
+#include <clocale>
 #include <cstring>
 #include <filesystem>
 #include <fstream>
@@ -14,18 +15,10 @@ namespace
 class Questions : public WithManager
 {
 protected:
-    Questions()
-    {
-        manager.MacLogin();  // shows the manager's own record
-        own = module.login;
-        module.calls.clear();
-    }
-
     ~Questions() override { EXPECT_THAT(module.calls, testing::IsEmpty()); }  // none asks the plug-in
 
     static void Put(char (&field)[128], std::string const& text) { std::strcpy(field, text.c_str()); }
 
-    TLogin* own = nullptr;
     TLogin record = {};
 };
 
@@ -50,6 +43,21 @@ struct HOST_FACT
 
 class ServerHost : public Questions, public testing::WithParamInterface<HOST_FACT>
 {
+protected:
+    ServerHost() { EXPECT_TRUE(std::setlocale(LC_CTYPE, "C.UTF-8")); }  // for the letter case of umlauts
+    ~ServerHost() override { std::setlocale(LC_CTYPE, "C"); }
+
+    static void Fill(TLogin& login)
+    {
+        Put(login.szServerHost, GetParam().host);
+        Put(login.szLocalAddress, GetParam().address);
+    }
+
+    static void FillForTheOpposite(TLogin& login, bool local)
+    {
+        Put(login.szServerHost, local ? "elsewhere.invalid" : "localhost");
+        Put(login.szLocalAddress, "10.0.0.1");
+    }
 };
 
 std::string HostName() { return wxGetHostName().utf8_string(); }
@@ -95,20 +103,28 @@ TEST_F(Questions, GetUserLockInfo_JoinsAddressAndPortOfEitherRecord)
     EXPECT_EQ(manager.GetUserLockInfo(&record), "http://10.0.0.2:4294967295");
 }
 
-TEST_F(Questions, IsTernServerLocal_LooksForTheServersLibraryInTheCurrentFolder)
+TEST_F(Questions, IsTernServerLocal_LooksForTheServersFileInTheCurrentFolder)
 {
     std::filesystem::path const before = std::filesystem::current_path();
     std::filesystem::current_path(folder.Path());
     EXPECT_FALSE(manager.IsTernServerLocal());
+    std::filesystem::create_directory("ComGUISrv.Dll");
+    EXPECT_FALSE(manager.IsTernServerLocal());
+    std::filesystem::remove("ComGUISrv.Dll");
     std::ofstream("ComGUISrv.Dll").put('x');
     EXPECT_TRUE(manager.IsTernServerLocal());
     std::filesystem::current_path(before);
 }
 
+// Each form has the other record say the opposite.
 TEST_P(Role, IsAdministrator)
 {
-    own->iUserRole = record.iUserRole = GetParam().role;
+    int const opposite = GetParam().admin ? 0 : 16;
+    own->iUserRole = GetParam().role;
+    record.iUserRole = opposite;
     EXPECT_EQ(manager.IsCurrentUserAdmin(), GetParam().admin);
+    own->iUserRole = opposite;
+    record.iUserRole = GetParam().role;
     EXPECT_EQ(manager.IsCurrentUserAdmin(&record), GetParam().admin);
 }
 
@@ -119,10 +135,11 @@ INSTANTIATE_TEST_SUITE_P(OnlyForExactly16_ByDesign, Role,
 
 TEST_P(ServerHost, IsLocal)
 {
-    Put(own->szServerHost, GetParam().host);
-    Put(own->szLocalAddress, GetParam().address);
-    record = *own;
+    Fill(*own);
+    FillForTheOpposite(record, GetParam().local);
     EXPECT_EQ(manager.IsServerLocal(), GetParam().local);
+    Fill(record);
+    FillForTheOpposite(*own, GetParam().localByRecord);
     EXPECT_EQ(manager.IsServerLocal(&record), GetParam().localByRecord);
 }
 
@@ -131,6 +148,7 @@ INSTANTIATE_TEST_SUITE_P(
     testing::Values(HOST_FACT{"LocalAddress", "10.0.0.1", "10.0.0.1", true, true},
                     HOST_FACT{"AnotherAddress", "10.0.0.2", "10.0.0.1", false, false},
                     HOST_FACT{"LocalAddressInOtherLetterCase_ByDesign", "FE80::A", "fe80::a", false, true},
+                    HOST_FACT{"UmlautInOtherLetterCase_ByDesign", "B\xC3\x9CRO", "b\xC3\xBCro", false, true},
                     HOST_FACT{"BothEmpty", "", "", true, true},
                     HOST_FACT{"NoHost", "", "10.0.0.1", false, false},
                     HOST_FACT{"HostName", HostName(), "10.0.0.1", true, true},

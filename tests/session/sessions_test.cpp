@@ -2,30 +2,20 @@
 #include "comgui/session/ComGUIManager.h"
 
 #include "tests/session/FakeModule.h"
+#include "tests/session/Records.h"
+#include "tests/session/Sleep.h"
 #include <chrono>
 #include <cstdlib>
-#include <cstring>
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
 using testing::ElementsAre;
-using testing::IsEmpty;
 
 namespace
 {
 class Sessions : public WithManager
 {
 protected:
-    Sessions() { module.calls.clear(); }  // of Open
-
-    // A guarded call tells whether the manager counts as logged in: -1 it does not, 1 the fake answers.
-    int GuardedCall()
-    {
-        int value = 0;
-        fake.Put(0, 0, "Key", 5);
-        return manager.GetParameter(fake.Access(), 0, 0, "Key", PARAM_INT, &value, -1);
-    }
-
     TLogin record = {};
 };
 
@@ -53,49 +43,9 @@ protected:
 
 TEST_F(Sessions, ManagersOwnRecord_StartsZeroedWithItsSize)
 {
-    manager.MacLogin();
     TLogin expected = {};
     expected.nSize = 2632;
-    EXPECT_EQ(std::memcmp(&module.copy, &expected, sizeof expected), 0);
-}
-
-TEST_F(Sessions, InitializeByTexts_FillsTheRecordAndHandsItOver)
-{
-    EXPECT_EQ(manager.Initialize("user", "secret", "host", 4711), 0);
-    EXPECT_THAT(module.calls, ElementsAre("InitializeEntry"));
-    EXPECT_STREQ(module.copy.szUser, "user");
-    EXPECT_STREQ(module.copy.szPassword, "secret");
-    EXPECT_STREQ(module.copy.szServerHost, "host");
-    EXPECT_EQ(module.copy.iServerPort, 4711);
-    EXPECT_EQ(module.copy.iClientStamp, 30312656);
-    EXPECT_EQ(module.stamp, 30312656);
-}
-
-TEST_F(Sessions, InitializeByTexts_KeepsTextsOf127BytesAndCutsLongerOnes)
-{
-    std::string const fits(127, 'a');
-    std::string const tooLong(128, 'b');
-    manager.Initialize(fits.c_str(), tooLong.c_str(), tooLong.c_str(), 1);
-    EXPECT_EQ(module.copy.szUser, fits);
-    EXPECT_EQ(module.copy.szPassword, std::string(127, 'b'));
-    EXPECT_EQ(module.copy.szServerHost, std::string(127, 'b'));
-}
-
-TEST_F(Sessions, InitializeByTexts_NullText_CountsAsEmpty)
-{
-    manager.Login("old", "old", "old", 1);
-    manager.Initialize(nullptr, nullptr, nullptr, 1);
-    EXPECT_STREQ(module.copy.szUser, "");
-    EXPECT_STREQ(module.copy.szPassword, "");
-    EXPECT_STREQ(module.copy.szServerHost, "");
-}
-
-TEST_F(Sessions, InitializeByTexts_Twice_Gives0AndDoesNothing)
-{
-    manager.Initialize("user", "p", "h", 1);
-    EXPECT_EQ(manager.Initialize("other", "p", "h", 2), 0);
-    EXPECT_THAT(module.calls, ElementsAre("InitializeEntry"));
-    EXPECT_STREQ(module.login->szUser, "user");
+    EXPECT_THAT(*own, IsRecord(expected));
 }
 
 TEST_F(Sessions, InitializeByTexts_Failing_PassesTheCodeOnAndMayBeTriedAgain)
@@ -108,12 +58,12 @@ TEST_F(Sessions, InitializeByTexts_Failing_PassesTheCodeOnAndMayBeTriedAgain)
     EXPECT_THAT(module.calls, ElementsAre("InitializeEntry", "InitializeEntry"));
 }
 
-TEST_F(Sessions, InitializeByRecord_HandsOverTheCallersRecordAndStamp)
+TEST_F(Sessions, InitializeByRecord_HandsTheStampOverToo)
 {
     EXPECT_EQ(manager.Initialize(&record, 99), 0);
-    EXPECT_EQ(module.login, &record);
-    EXPECT_EQ(record.iClientStamp, 99);
     EXPECT_EQ(module.stamp, 99);
+    EXPECT_EQ(module.copy.iClientStamp, 99);
+    EXPECT_EQ(module.copy.iLocalPort, 50106u);  // already there when the plug-in is asked
 }
 
 TEST_F(Sessions, InitializeByRecord_Twice_WritesTheStampAllTheSame_ByDesign)
@@ -235,124 +185,176 @@ TEST_F(PortsDeathTest, OfTexts_StartAt50006InANewProcess)
         testing::ExitedWithCode(0), "");
 }
 
-TEST_F(Sessions, Logout_HandsOverTheSessionOfTheManagersRecord)
+// --- logging out -----------------------------------------------------------------------------------------
+
+TEST_F(Ports, LogoutBackwardOfANeverInitializedSession_TakesThePortTo50004_ByDesign)
 {
-    module.onLogin = [this](TLogin& login) { login.hSession = this; };
-    LogIn();
+    manager.LogoutBackward(&record);
+    EXPECT_EQ(BackwardPort(), 50004u);
+}
+
+TEST_F(Sessions, Logout_PassesThePlugInsCodeOn)
+{
     module.results["LogoutEntry"] = 12;
     EXPECT_EQ(manager.Logout(), 12);
-    EXPECT_EQ(module.calls.back(), "LogoutEntry");
-    EXPECT_EQ(module.session, this);
+    EXPECT_EQ(manager.Logout(&record), 12);
+    EXPECT_EQ(manager.LogoutBackward(&record), 12);
 }
 
-TEST_F(Sessions, LogoutByRecord_HandsOverItsSession)
+TEST_F(Sessions, Logout_ClearsBothFlagsWhateverThePlugInAnswers)
 {
-    record.hSession = &record;
-    module.results["LogoutEntry"] = 13;
-    EXPECT_EQ(manager.Logout(&record), 13);
-    EXPECT_EQ(module.session, &record);
-}
-
-TEST_F(Sessions, Logout_ClearsTheFlagsWhateverThePlugInAnswers)
-{
-    LogIn();
     manager.Initialize("u", "p", "h", 1);
-    ASSERT_EQ(GuardedCall(), 1);
+    LogIn();
     module.results["LogoutEntry"] = -7;
     manager.Logout();
-    EXPECT_EQ(GuardedCall(), -1);
-    module.calls.clear();
-    manager.Initialize("u", "p", "h", 1);
-    EXPECT_THAT(module.calls, ElementsAre("InitializeEntry"));
+    EXPECT_FALSE(IsLoggedIn());
+    EXPECT_FALSE(IsInitialized());
 }
 
-TEST_F(Sessions, Logout_ClearsTheFlagsBeforeThePlugInIsAsked)
+TEST_F(Sessions, LogoutByRecord_OfAnyOther_ClearsBothFlagsToo_ByDesign)
 {
+    manager.Initialize("u", "p", "h", 1);
     LogIn();
-    int guardDuringLogout = 0;
-    module.onLogout = [&] { guardDuringLogout = GuardedCall(); };
+    manager.Logout(&record);
+    EXPECT_FALSE(IsLoggedIn());
+    EXPECT_FALSE(IsInitialized());
+}
+
+TEST_F(Sessions, Logout_ClearsFlagsAndTakesThePortBackBeforeThePlugInIsAsked)
+{
+    manager.Initialize("u", "p", "h", 1);
+    LogIn();
+    bool stillLoggedIn = true;
+    module.onLogout = [&]
+    {
+        stillLoggedIn = IsLoggedIn();
+        manager.Initialize(&record, 0);
+    };
     manager.Logout();
-    EXPECT_EQ(guardDuringLogout, -1);
+    EXPECT_FALSE(stillLoggedIn);
+    EXPECT_EQ(record.iLocalPort, 50105u);
+}
+
+TEST_F(Sessions, LogoutBackward_ClearsTheFlagAndTakesThePortBackBeforeThePlugInIsAsked)
+{
+    manager.InitializeBackward(&record, 0);
+    TLogin next = {};
+    module.onLogout = [&] { manager.InitializeBackward(&next, 0); };
+    manager.LogoutBackward(&record);
+    EXPECT_EQ(next.iLocalPort, 50005u);
+}
+
+TEST_F(Sessions, LogoutBackward_EndsTheGivenRecordsSession)
+{
+    TLogin loggedIn = {};
+    loggedIn.hSession = &loggedIn;
+    manager.LoginBackward(&loggedIn);
+    record.hSession = &record;
+    manager.LogoutBackward(&record);
+    EXPECT_EQ(module.session, &record);
 }
 
 TEST_F(Sessions, Logout_KeepsTheContainer)
 {
     LogIn();
-    fake.Put(0, 0, "Key", 5);
     manager.Logout();
-    int value = 0;
-    EXPECT_EQ(manager.GetSystemTicketParamForKey("Key", PARAM_INT, &value, -1), 1);
-    EXPECT_EQ(value, 5);
+    EXPECT_TRUE(FakeIsTheContainer());
+}
+
+TEST_F(Sessions, Logout_LeavesTheBackwardSessionAlone)
+{
+    manager.InitializeBackward(&record, 1);
+    manager.Logout();
+    EXPECT_TRUE(IsBackwardInitialized());
 }
 
 TEST_F(Sessions, LogoutBackward_LeavesTheImplicitSessionAlone)
 {
+    manager.Initialize("u", "p", "h", 1);
     LogIn();
-    manager.Initialize("u", "p", "h", 1);
     manager.InitializeBackward(&record, 1);
-    manager.LoginBackward(&record);
-    module.results["LogoutEntry"] = 14;
-    record.hSession = &record;
-    EXPECT_EQ(manager.LogoutBackward(&record), 14);
-    EXPECT_EQ(module.session, &record);
-    EXPECT_EQ(GuardedCall(), 1);
-    module.calls.clear();
-    manager.Initialize("u", "p", "h", 1);
-    EXPECT_THAT(module.calls, IsEmpty());  // still initialised
-    manager.InitializeBackward(&record, 1);
-    EXPECT_THAT(module.calls, ElementsAre("InitializeEntry"));  // no longer
+    manager.LogoutBackward(&record);
+    EXPECT_TRUE(IsLoggedIn());
+    EXPECT_TRUE(IsInitialized());
+    EXPECT_FALSE(IsBackwardInitialized());
 }
 
-// Each of the four takes 4 seconds, so each has a test, and a process, of its own.
+// --- ending ----------------------------------------------------------------------------------------------
+
 namespace
 {
-class Uninitializing : public Sessions
+struct ENDING
+{
+    char const* name;
+    int (*call)(ComGUIManager& manager, TLogin* given);
+    char const* entry;
+};
+
+class Uninitializing : public Sessions, public testing::WithParamInterface<ENDING>
 {
 protected:
-    // Runs one of the four and returns the seconds it took.
-    template <typename Call>
-    double Seconds(int expected, Call call)
+    // Instead of sleeping it is written down among the calls.
+    Uninitializing()
     {
-        auto const start = std::chrono::steady_clock::now();
-        EXPECT_EQ(call(), expected);
-        return std::chrono::duration<double>(std::chrono::steady_clock::now() - start).count();
+        insteadOfSleeping = [this](int seconds)
+        { module.calls.push_back("wxSleep(" + std::to_string(seconds) + ")"); };
     }
+    ~Uninitializing() override { insteadOfSleeping = nullptr; }
+
+    int Call() { return GetParam().call(manager, &record); }
 };
 }  // namespace
 
-TEST_F(Uninitializing, HandsOverTheRecordItselfAndBlocksFor4Seconds)
+TEST_P(Uninitializing, CallsTheEntryAndThenSleepsFor4Seconds)
 {
-    module.results["UninitializeEntry"] = 21;
-    EXPECT_GE(Seconds(21, [this] { return manager.Uninitialize(&record); }), 3.9);
-    EXPECT_THAT(module.calls, ElementsAre("UninitializeEntry"));
-    EXPECT_EQ(module.login, &record);
+    Call();
+    EXPECT_THAT(module.calls, ElementsAre(GetParam().entry, "wxSleep(4)"));
 }
 
-TEST_F(Uninitializing, WithoutArgument_TakesTheManagersRecord)
+TEST_P(Uninitializing, PassesThePlugInsCodeOn)
 {
+    module.results[GetParam().entry] = 21;
+    EXPECT_EQ(Call(), 21);
+}
+
+TEST_P(Uninitializing, ChangesNoFlagAndNoCounter_ByDesign)
+{
+    manager.Initialize(&record, 0);
+    manager.InitializeBackward(&record, 0);
     LogIn();
-    TLogin* const own = module.login;
-    module.login = nullptr;
-    EXPECT_GE(Seconds(0, [this] { return manager.Uninitialize(); }), 3.9);
-    EXPECT_EQ(module.calls.back(), "UninitializeEntry");
-    EXPECT_EQ(module.login, own);
+    Call();
+    EXPECT_TRUE(IsLoggedIn());
+    EXPECT_TRUE(IsInitialized());
+    EXPECT_TRUE(IsBackwardInitialized());
+    manager.Logout();
+    manager.Initialize(&record, 0);
+    EXPECT_EQ(record.iLocalPort, 50106u);
 }
 
-TEST_F(Uninitializing, Async_BlocksJustAsLong_ByDesign)
+TEST_P(Uninitializing, WhenIdle_SetsNoFlag)
 {
-    module.results["UninitializeAsyncEntry"] = 22;
-    EXPECT_GE(Seconds(22, [this] { return manager.UninitializeAsync(&record); }), 3.9);
-    EXPECT_THAT(module.calls, ElementsAre("UninitializeAsyncEntry"));
-    EXPECT_EQ(module.login, &record);
+    Call();
+    EXPECT_FALSE(IsLoggedIn());
+    EXPECT_FALSE(IsInitialized());
+    EXPECT_FALSE(IsBackwardInitialized());
 }
 
-TEST_F(Uninitializing, AsyncWithoutArgument_TakesTheManagersRecordAndChangesNoFlag)
+// The Async forms sleep just as long.
+INSTANTIATE_TEST_SUITE_P(
+    AllForms_ByDesign, Uninitializing,
+    testing::Values(
+        ENDING{"Plain", [](ComGUIManager& m, TLogin*) { return m.Uninitialize(); }, "UninitializeEntry"},
+        ENDING{"ByRecord", [](ComGUIManager& m, TLogin* r) { return m.Uninitialize(r); },
+               "UninitializeEntry"},
+        ENDING{"Async", [](ComGUIManager& m, TLogin*) { return m.UninitializeAsync(); },
+               "UninitializeAsyncEntry"},
+        ENDING{"AsyncByRecord", [](ComGUIManager& m, TLogin* r) { return m.UninitializeAsync(r); },
+               "UninitializeAsyncEntry"}),
+    [](auto const& ending) { return std::string(ending.param.name); });
+
+TEST_F(Sessions, Uninitialize_ReallyBlocks)
 {
-    LogIn();
-    TLogin* const own = module.login;
-    module.login = nullptr;
-    EXPECT_GE(Seconds(0, [this] { return manager.UninitializeAsync(); }), 3.9);
-    EXPECT_EQ(module.calls.back(), "UninitializeAsyncEntry");
-    EXPECT_EQ(module.login, own);
-    EXPECT_EQ(GuardedCall(), 1);
+    auto const start = std::chrono::steady_clock::now();
+    manager.Uninitialize(&record);
+    EXPECT_GE(std::chrono::duration<double>(std::chrono::steady_clock::now() - start).count(), 3.9);
 }

@@ -2,6 +2,8 @@
 #include "comgui/session/ComGUIManager.h"
 
 #include "tests/session/FakeModule.h"
+#include "tests/session/Faults.h"
+#include <cstring>
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
@@ -11,6 +13,7 @@ using testing::IsEmpty;
 namespace
 {
 char key[] = "Key";
+char const Umlaut[] = "K\xC3\xA4y";
 
 // Logged in, with the fake as the session's container and another one beside it.
 class Tickets : public WithManager
@@ -29,6 +32,13 @@ protected:
         other.calls.clear();
     }
 
+    // Logged in, and no container.
+    void LoseTheContainer()
+    {
+        module.container = nullptr;
+        manager.Login(nullptr, nullptr, nullptr, -1);
+    }
+
     ContainerFake other;
 };
 
@@ -44,10 +54,32 @@ protected:
 
 using TicketsDeathTest = Tickets;
 
-// Answers every read with the same results and remembers how a count was asked for.
-struct BARE_CONTAINER
+// A container whose slots answer a count and nothing else: what it writes and what it says about that.
+struct COUNT_ANSWER
 {
-    BARE_CONTAINER() { access.Instance = this; }
+    char const* name;
+    int result;             // of the slot
+    unsigned long written;  // nothing if its size is 0
+    std::size_t size;       // of the word that it writes
+    int values;             // so many does the library see
+    int valueCount;         // and so many does GetValueCount tell, which looks at the result, too
+};
+
+class Counts : public Tickets, public testing::WithParamInterface<COUNT_ANSWER>
+{
+protected:
+    Counts()
+    {
+        access.MGETPARAMETER = [](void*, int, int, char const*, PARAM_TYPE ptype, void* value, int) -> int
+        {
+            if (ptype != PARAM_COUNT)
+                return 0;
+            std::memcpy(value, &GetParam().written, GetParam().size);
+            return GetParam().result;
+        };
+        module.container = &access;
+        manager.GetClientContainer();
+    }
 
     MTICKET_ACCESS access = {};
 };
@@ -68,9 +100,8 @@ std::vector<std::string> Values(wxArrayString const& array)
 TEST_F(Tickets, GetParameter_AsksTheSessionsContainer)
 {
     fake.Put(3, 7, key, 42, 1);
-    fake.success = 0x100;
     int value = 0;
-    EXPECT_EQ(manager.GetParameter(3, 7, key, PARAM_INT, &value, 1), 0x100);  // passed on as it stands
+    EXPECT_EQ(manager.GetParameter(3, 7, key, PARAM_INT, &value, 1), 1);
     EXPECT_EQ(value, 42);
     EXPECT_THAT(fake.calls, ElementsAre(CALL{SLOT::GET, 3, 7, "Key", PARAM_INT, 1}));
 }
@@ -122,10 +153,9 @@ TEST_F(TicketsLoggedOut, GetParameter_OfTheBackwardContainer_IsGuardedByTheImpli
 
 TEST_F(TicketsDeathTest, GetParameter_WithoutAContainerOfTheSession_GoesThroughNull_ByDesign)
 {
-    module.container = nullptr;
-    manager.Login(nullptr, nullptr, nullptr, -1);
+    LoseTheContainer();
     int value = 0;
-    EXPECT_DEATH(manager.GetParameter(3, 7, key, PARAM_INT, &value, -1), "");
+    EXPECT_EXIT(manager.GetParameter(3, 7, key, PARAM_INT, &value, -1), Faults, "");
 }
 
 // --- SetParameter ----------------------------------------------------------------------------------------
@@ -133,9 +163,8 @@ TEST_F(TicketsDeathTest, GetParameter_WithoutAContainerOfTheSession_GoesThroughN
 TEST_F(Tickets, SetParameter_WritesToTheSessionsContainer)
 {
     fake.AddTicket(3, 7);
-    fake.success = 2;
     int const value = 42;
-    EXPECT_EQ(manager.SetParameter(3, 7, key, PARAM_INT, &value, -1), 2);
+    EXPECT_EQ(manager.SetParameter(3, 7, key, PARAM_INT, &value, -1), 1);
     EXPECT_EQ(fake.Int(3, 7, key), 42);
     EXPECT_THAT(fake.calls, ElementsAre(CALL{SLOT::SET, 3, 7, "Key", PARAM_INT, -1}));
 }
@@ -145,6 +174,7 @@ TEST_F(Tickets, SetParameter_OfAContainer_WritesToThatOne)
     other.AddTicket(3, 7);
     EXPECT_EQ(manager.SetParameter(other.Access(), 3, 7, key, PARAM_STRING, "text", 0), 1);
     EXPECT_EQ(other.Text(3, 7, key, 0), "text");
+    EXPECT_THAT(other.calls, ElementsAre(CALL{SLOT::SET, 3, 7, "Key", PARAM_STRING, 0}));
     EXPECT_THAT(fake.calls, IsEmpty());
 }
 
@@ -169,7 +199,7 @@ TEST_F(TicketsLoggedOut, SetParameter_GivesMinus1InBothForms)
 TEST_F(TicketsDeathTest, SetParameter_OfANullContainer_GoesThroughNull_ByDesign)
 {
     int const value = 42;
-    EXPECT_DEATH(manager.SetParameter(nullptr, 3, 7, key, PARAM_INT, &value, -1), "");
+    EXPECT_EXIT(manager.SetParameter(nullptr, 3, 7, key, PARAM_INT, &value, -1), Faults, "");
 }
 
 // --- the system ticket -----------------------------------------------------------------------------------
@@ -189,19 +219,87 @@ TEST_F(TicketsLoggedOut, GetSystemTicketParamForKey_ReadsTicket00WithoutALogin_B
 
 TEST_F(TicketsDeathTest, GetSystemTicketParamForKey_OfANullContainer_GoesThroughNull_ByDesign)
 {
+    LoseTheContainer();
     int value = 0;
-    EXPECT_DEATH(manager.GetSystemTicketParamForKey(nullptr, key, PARAM_INT, &value, -1), "");
+    EXPECT_EXIT(manager.GetSystemTicketParamForKey(key, PARAM_INT, &value, -1), Faults, "");
+    EXPECT_EXIT(manager.GetSystemTicketParamForKey(nullptr, key, PARAM_INT, &value, -1), Faults, "");
 }
+
+// --- what all forms of reading and writing have in common -------------------------------------------------
+
+namespace
+{
+struct FORM
+{
+    char const* name;
+    int (*call)(ComGUIManager& manager, MTICKET_ACCESS const* container, int& value, int pos);
+    bool system = false;  // goes to the system ticket, not to (3, 7)
+};
+
+// Through the session's container, which is the one beside it as well: a form goes to either.
+class Forms : public Tickets, public testing::WithParamInterface<FORM>
+{
+protected:
+    Forms()
+    {
+        fake.Put(0, 0, key, 42);
+        fake.Put(3, 7, key, 42);
+    }
+
+    int Call(int pos) { return GetParam().call(manager, fake.Access(), value, pos); }
+
+    int value = 43;
+};
+}  // namespace
+
+TEST_P(Forms, PassTheSlotsResultOnUnchanged)
+{
+    for (int const result : {0x100, -2, -1, 7})
+    {
+        fake.success = result;
+        EXPECT_EQ(Call(-1), result);
+    }
+}
+
+TEST_P(Forms, PassPositionMinus2On)
+{
+    Call(-2);
+    ASSERT_EQ(fake.calls.size(), 1u);
+    EXPECT_EQ(fake.calls[0].pos, -2);
+    EXPECT_EQ(fake.calls[0].type, GetParam().system ? 0 : 3);
+    EXPECT_EQ(fake.calls[0].id, GetParam().system ? 0 : 7);
+}
+
+INSTANTIATE_TEST_SUITE_P(
+    All, Forms,
+    testing::Values(FORM{"GetParameter", [](ComGUIManager& m, MTICKET_ACCESS const*, int& value, int pos)
+                         { return m.GetParameter(3, 7, key, PARAM_INT, &value, pos); }},
+                    FORM{"GetParameterOfAContainer",
+                         [](ComGUIManager& m, MTICKET_ACCESS const* c, int& value, int pos)
+                         { return m.GetParameter(c, 3, 7, key, PARAM_INT, &value, pos); }},
+                    FORM{"SetParameter", [](ComGUIManager& m, MTICKET_ACCESS const*, int& value, int pos)
+                         { return m.SetParameter(3, 7, key, PARAM_INT, &value, pos); }},
+                    FORM{"SetParameterOfAContainer",
+                         [](ComGUIManager& m, MTICKET_ACCESS const* c, int& value, int pos)
+                         { return m.SetParameter(c, 3, 7, key, PARAM_INT, &value, pos); }},
+                    FORM{"GetSystemTicketParamForKey",
+                         [](ComGUIManager& m, MTICKET_ACCESS const*, int& value, int pos)
+                         { return m.GetSystemTicketParamForKey(key, PARAM_INT, &value, pos); },
+                         true},
+                    FORM{"GetSystemTicketParamForKeyOfAContainer",
+                         [](ComGUIManager& m, MTICKET_ACCESS const* c, int& value, int pos)
+                         { return m.GetSystemTicketParamForKey(c, key, PARAM_INT, &value, pos); },
+                         true}),
+    [](auto const& form) { return std::string(form.param.name); });
 
 // --- counts and arrays -----------------------------------------------------------------------------------
 
 TEST_F(TicketsLoggedOut, GetValueCount_AsksTheContainerWithoutALogin)
 {
-    wxString const umlaut = wxString::FromUTF8("K\xC3\xA4y");
-    other.Put(3, 7, "K\xC3\xA4y", 1, -1);
-    other.Put(3, 7, "K\xC3\xA4y", 2, 1);
-    EXPECT_EQ(manager.GetValueCount(other.Access(), 3, 7, umlaut), 2);
-    EXPECT_THAT(other.calls, ElementsAre(CALL{SLOT::GET, 3, 7, "K\xC3\xA4y", PARAM_COUNT, -1}));
+    other.Put(3, 7, Umlaut, 1, -1);
+    other.Put(3, 7, Umlaut, 2, 1);
+    EXPECT_EQ(manager.GetValueCount(other.Access(), 3, 7, wxString::FromUTF8(Umlaut)), 2);
+    EXPECT_THAT(other.calls, ElementsAre(CALL{SLOT::GET, 3, 7, Umlaut, PARAM_COUNT, -1}));
 }
 
 TEST_F(Tickets, GetValueCount_OfAMissingKey_Is0)
@@ -209,12 +307,31 @@ TEST_F(Tickets, GetValueCount_OfAMissingKey_Is0)
     EXPECT_EQ(manager.GetValueCount(fake.Access(), 3, 7, key), 0);
 }
 
-TEST_F(Tickets, GetValueCount_OfASlotThatSucceedsAndWritesNothing_Is0)
+TEST_P(Counts, AreTheLow32BitsOfWhatTheSlotWrote)
 {
-    BARE_CONTAINER bare;
-    bare.access.MGETPARAMETER = [](void*, int, int, char const*, PARAM_TYPE, void*, int) { return 1; };
-    EXPECT_EQ(manager.GetValueCount(&bare.access, 3, 7, key), 0);
+    EXPECT_EQ(manager.GetValueCount(&access, 3, 7, key), GetParam().valueCount);
+    std::vector<int> const zeros(static_cast<std::size_t>(GetParam().values), 0);
+    EXPECT_EQ(Values(manager.GetIntArray(3, 7, key)), zeros);
+    EXPECT_EQ(Values(manager.GetIntArray(&access, 3, 7, key)), zeros);
+    EXPECT_EQ(Values(manager.GetIntArray(&access, 3, 7, wxString(key))), zeros);
+    std::vector<std::string> const texts(zeros.size());
+    EXPECT_EQ(Values(manager.GetStringArray(3, 7, key)), texts);
+    EXPECT_EQ(Values(manager.GetStringArray(&access, 3, 7, key)), texts);
+    EXPECT_EQ(Values(manager.GetStringArray(&access, 3, 7, wxString(key))), texts);
 }
+
+INSTANTIATE_TEST_SUITE_P(
+    Facts, Counts,
+    testing::Values(COUNT_ANSWER{"Of64Bits", 1, 3, 8, 3, 3}, COUNT_ANSWER{"Of32Bits", 1, 3, 4, 3, 3},
+                    COUNT_ANSWER{"Of0", 1, 0, 8, 0, 0},
+                    COUNT_ANSWER{"WithBitsAbove32", 1, 0x100000002, 8, 2, 2},
+                    COUNT_ANSWER{"NegativeIn32Bits", 1, 0xFFFFFFFF, 4, 0, -1},
+                    COUNT_ANSWER{"SuccessOfAnyBit", 0x100, 2, 8, 2, 2},
+                    COUNT_ANSWER{"NegativeSuccess", -2, 2, 8, 2, 2},
+                    COUNT_ANSWER{"WrittenAndYetAFailure_ArraysDoNotLook_ByDesign", 0, 2, 8, 2, 0},
+                    COUNT_ANSWER{"SuccessAndNothingWritten", 1, 0, 0, 0, 0},
+                    COUNT_ANSWER{"FailureAndNothingWritten", 0, 0, 0, 0, 0}),
+    [](auto const& answer) { return std::string(answer.param.name); });
 
 TEST_F(Tickets, GetIntArray_ReadsEachPositionInAllThreeForms)
 {
@@ -304,31 +421,50 @@ TEST_F(Tickets, GetStringArray_FirstReadFailed_GivesTheEmptyText)
     EXPECT_THAT(Values(manager.GetStringArray(3, 7, key)), ElementsAre("", "b"));
 }
 
-TEST_F(Tickets, GetStringArray_OfAMissingKeyOrACountOf0_IsEmpty)
+TEST_F(Tickets, GetStringArray_OfAMissingKeyOrNullContainer_IsEmpty)
 {
     EXPECT_THAT(Values(manager.GetStringArray(3, 7, key)), IsEmpty());
-    BARE_CONTAINER bare;
-    bare.access.MGETPARAMETER = [](void*, int, int, char const*, PARAM_TYPE, void* value, int)
-    {
-        *static_cast<unsigned long*>(value) = 0;
-        return 1;
-    };
-    EXPECT_THAT(Values(manager.GetStringArray(&bare.access, 3, 7, key)), IsEmpty());
+    EXPECT_THAT(Values(manager.GetStringArray(nullptr, 3, 7, key)), IsEmpty());
+    EXPECT_THAT(Values(manager.GetStringArray(nullptr, 3, 7, wxString("Key"))), IsEmpty());
+}
+
+TEST_F(Tickets, Arrays_WideKeysGoOutInUtf8)
+{
+    other.Put(3, 7, Umlaut, 10);
+    EXPECT_THAT(Values(manager.GetIntArray(other.Access(), 3, 7, wxString::FromUTF8(Umlaut))),
+                ElementsAre(10));
+    other.Put(3, 7, Umlaut, "text");
+    EXPECT_THAT(Values(manager.GetStringArray(other.Access(), 3, 7, wxString::FromUTF8(Umlaut))),
+                ElementsAre("text"));
+}
+
+TEST_F(TicketsDeathTest, Arrays_WithoutAContainerOfTheSession_GoThroughNull_ByDesign)
+{
+    LoseTheContainer();
+    EXPECT_EXIT(manager.GetIntArray(3, 7, key), Faults, "");
+    EXPECT_EXIT(manager.GetStringArray(3, 7, key), Faults, "");
 }
 
 // --- whole tickets ---------------------------------------------------------------------------------------
 
-TEST_F(Tickets, DeleteTicketOfType_FetchesTheContainerAnewAndDeletesThere)
+TEST_F(Tickets, DeleteTicketOfType_FetchesTheContainerAnewKeepsItAndDeletesThere)
 {
     other.AddTicket(3, 7);
+    other.success = 0x100;
     module.container = other.Access();
-    EXPECT_EQ(manager.DeleteTicketOfType(3, 7), 1);
+    EXPECT_EQ(manager.DeleteTicketOfType(3, 7), 0x100);
     EXPECT_THAT(module.calls, ElementsAre("GetClientContainerEntry"));
-    EXPECT_FALSE(other.HasTicket(3, 7));
-    ASSERT_EQ(other.calls.size(), 1u);
-    EXPECT_EQ(other.calls[0].slot, SLOT::OPERATION);
-    EXPECT_EQ(other.calls[0].op, 106);
-    EXPECT_EQ(other.calls[0].arg, nullptr);
+    EXPECT_THAT(other.calls, ElementsAre(CALL{SLOT::OPERATION, 3, 7, {}, PARAM_NONE, 0, 106, nullptr}));
+    EXPECT_FALSE(FakeIsTheContainer());
+}
+
+TEST_F(Tickets, DeleteTicketOfType_OfAContainer_DeletesThereAndPassesTheResultOn)
+{
+    other.AddTicket(3, 7);
+    other.success = -2;
+    EXPECT_EQ(manager.DeleteTicketOfType(other.Access(), 3, 7), -2);
+    EXPECT_THAT(module.calls, IsEmpty());
+    EXPECT_THAT(other.calls, ElementsAre(CALL{SLOT::OPERATION, 3, 7, {}, PARAM_NONE, 0, 106, nullptr}));
 }
 
 TEST_F(TicketsLoggedOut, DeleteTicketOfType_AsksForNoLogin_ByDesign)
@@ -348,9 +484,9 @@ TEST_F(Tickets, DeleteTicketOfType_OfAMissingTicket_GivesTheSlots0)
 
 TEST_F(TicketsDeathTest, DeleteTicketOfType_OfANullContainer_GoesThroughNull_ByDesign)
 {
-    EXPECT_DEATH(manager.DeleteTicketOfType(nullptr, 3, 7), "");
+    EXPECT_EXIT(manager.DeleteTicketOfType(nullptr, 3, 7), Faults, "");
     module.container = nullptr;
-    EXPECT_DEATH(manager.DeleteTicketOfType(3, 7), "");
+    EXPECT_EXIT(manager.DeleteTicketOfType(3, 7), Faults, "");
 }
 
 TEST_F(TicketsLoggedOut, GetTicketData_PassesItsFiveValuesOnWithoutALogin)
@@ -358,13 +494,15 @@ TEST_F(TicketsLoggedOut, GetTicketData_PassesItsFiveValuesOnWithoutALogin)
     int size = 5;
     char data[4];
     TLogin record = {};
+    own->hSession = own;
     record.hSession = &record;
     module.results["GetTicketDataEntry"] = 41;
     EXPECT_EQ(manager.GetTicketData(&record, 1, 2, 3, &size, data), 41);
     EXPECT_EQ(module.session, &record);
     EXPECT_THAT(module.ints, ElementsAre(1, 2, 3));
     EXPECT_THAT(module.pointers, ElementsAre(&size, data));
-    EXPECT_EQ(manager.GetTicketData(4, 5, 6, nullptr, nullptr), 41);
-    EXPECT_EQ(module.session, nullptr);
+    EXPECT_EQ(manager.GetTicketData(4, 5, 6, nullptr, data), 41);
+    EXPECT_EQ(module.session, own);
     EXPECT_THAT(module.ints, ElementsAre(4, 5, 6));
+    EXPECT_THAT(module.pointers, ElementsAre(nullptr, data));
 }

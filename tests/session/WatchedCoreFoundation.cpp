@@ -1,9 +1,21 @@
-#include "tests/session/FailingCoreFoundation.h"
+#include "tests/session/WatchedCoreFoundation.h"
 
-#include <CoreFoundation/CoreFoundation.h>
 #include <dlfcn.h>
 
 CORE_FOUNDATION_FAILURES coreFoundationFailures;
+CORE_FOUNDATION_URL coreFoundationURL;
+
+namespace
+{
+struct TEXT
+{
+    CFStringRef string = nullptr;
+    std::string bytes;
+    CFStringEncoding encoding = 0;
+};
+
+TEXT lastText;
+}  // namespace
 
 static bool FailsNow(int& failures) { return failures > 0 && failures-- > 0; }
 
@@ -18,7 +30,10 @@ CFStringRef CFStringCreateWithCString(CFAllocatorRef allocator, char const* text
 {
     if (FailsNow(coreFoundationFailures.strings))
         return nullptr;
-    return Next<decltype(CFStringCreateWithCString)>("CFStringCreateWithCString")(allocator, text, encoding);
+    CFStringRef const string =
+        Next<decltype(CFStringCreateWithCString)>("CFStringCreateWithCString")(allocator, text, encoding);
+    lastText = {string, text, encoding};
+    return string;
 }
 
 CFURLRef CFURLCreateWithFileSystemPath(CFAllocatorRef allocator, CFStringRef path, CFURLPathStyle style,
@@ -26,6 +41,8 @@ CFURLRef CFURLCreateWithFileSystemPath(CFAllocatorRef allocator, CFStringRef pat
 {
     if (FailsNow(coreFoundationFailures.urls))
         return nullptr;
+    if (path == lastText.string)
+        coreFoundationURL = {lastText.bytes, lastText.encoding, style, isDirectory != 0};
     return Next<decltype(CFURLCreateWithFileSystemPath)>("CFURLCreateWithFileSystemPath")(allocator, path,
                                                                                           style, isDirectory);
 }
