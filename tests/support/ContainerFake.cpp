@@ -3,6 +3,7 @@
 #include "comgui/ticket/TICKET_ID.h"
 
 #include <cstring>
+#include <stdexcept>
 
 namespace
 {
@@ -48,6 +49,14 @@ void PrintTo(CALL const& call, std::ostream* out)
          << call.ptype << ", pos " << call.pos << ", op " << call.op << ", arg " << call.arg
          << ", notification " << call.notification << (call.enable ? " on" : " off") << ", "
          << call.keys.size() << " keys)";
+}
+
+ContainerFake& ContainerFake::Of(void* instance)
+{
+    auto* const fake = static_cast<ContainerFake*>(instance);
+    if (!fake || fake->m_mark != Mark)
+        throw std::logic_error("a slot of ContainerFake was called with an Instance that is not its own");
+    return *fake;
 }
 
 ContainerFake::ContainerFake()

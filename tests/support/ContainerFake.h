@@ -1,6 +1,7 @@
 // A ticket container in memory for tests of whatever calls one: it answers as a real container does, writes
 // down every call, and fails where it is told to. It keeps each text that was ever written until its own
-// end, so no text it gave out dies early. For one thread.
+// end, so no text it gave out dies early. A slot that is called with another Instance throws, and so fails
+// the test. For one thread.
 #pragma once
 
 #include "comgui/ticket/BIN_STRING.h"
@@ -49,6 +50,9 @@ struct CALL
 
 class ContainerFake
 {
+    static constexpr unsigned long long Mark = 0x434F4E5441494E45;
+    unsigned long long const m_mark = Mark;  // the first word: whatever else comes as Instance has another
+
 public:
     ContainerFake();
     ContainerFake(ContainerFake const&) = delete;
@@ -100,8 +104,8 @@ private:
     using VALUES = std::map<int, VALUE>;  // by position
     using TICKET = std::map<std::string, VALUES>;
 
-    static ContainerFake& Of(void* instance) { return *static_cast<ContainerFake*>(instance); }
-    bool Fails(std::optional<int> pos);  // told to fail here?
+    static ContainerFake& Of(void* instance);  // throws std::logic_error for any other
+    bool Fails(std::optional<int> pos);        // told to fail here?
     bool Get(CALL call, char const* key, void* value);
     bool Set(CALL call, char const* key, void const* value);
     bool Write(int type, int id, char const* key, PARAM_TYPE ptype, void const* value, int pos);

@@ -1,6 +1,15 @@
 #include "tests/support/TicketFake.h"
 
 #include "comgui/ticket/TICKET_OP.h"
+#include <stdexcept>
+
+TicketFake& TicketFake::Of(void* instance)
+{
+    auto* const fake = static_cast<TicketFake*>(instance);
+    if (!fake || fake->m_mark != Mark)
+        throw std::logic_error("a slot of TicketFake was called with an Instance that is not its own");
+    return *fake;
+}
 
 TicketFake::TicketFake()
 {

@@ -1,5 +1,6 @@
 // A single ticket in memory for tests of whatever calls one: a ContainerFake's ticket behind the slots of a
-// ticket of its own, so that it writes down calls and fails where it is told just as that one does.
+// ticket of its own, so that it writes down calls, fails where it is told and throws at another Instance just
+// as that one does.
 #pragma once
 
 #include "comgui/ticket/STICKET_ACCESS.h"
@@ -8,6 +9,9 @@
 
 class TicketFake
 {
+    static constexpr unsigned long long Mark = 0x5449434B45544641;
+    unsigned long long const m_mark = Mark;  // the first word: whatever else comes as Instance has another
+
 public:
     TicketFake();
     TicketFake(TicketFake const&) = delete;
@@ -24,7 +28,7 @@ public:
     std::vector<int> options;
 
 private:
-    static TicketFake& Of(void* instance) { return *static_cast<TicketFake*>(instance); }
+    static TicketFake& Of(void* instance);  // throws std::logic_error for any other
     static int OnOption(void* instance, int code, void* out);
 
     STICKET_ACCESS m_access{};
