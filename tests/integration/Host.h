@@ -32,6 +32,14 @@ protected:
         return login;
     }
 
+    // A record that the manager may free.
+    static TLogin* NewRecord(char const* user = "operator", char const* password = "operator")
+    {
+        auto* const login = static_cast<TLogin*>(std::calloc(1, sizeof(TLogin)));
+        *login = Record(user, password);
+        return login;
+    }
+
     static int WriteInt(char const* key, int value)
     {
         return Manager().SetParameter(3, 1, key, PARAM_INT, &value, -1);

@@ -21,6 +21,19 @@ protected:
 class OneSession : public Host
 {
 };
+
+// A record of the host's own, with which each step is called for by itself.
+class ExplicitSession : public Host
+{
+protected:
+    ExplicitSession() { Manager().Logout(); }  // whatever a test before in this process has left
+
+    // The manager lets go of its first record unfreed.
+    ~ExplicitSession() override { std::free(first); }
+
+    // The manager's first field, which no operation shows.
+    TLogin* const first = *reinterpret_cast<TLogin**>(&Manager());
+};
 }  // namespace
 
 TEST_F(TwoSessions, HaveHandlesContainersAndEndPointsOfTheirOwn)
@@ -119,4 +132,35 @@ TEST_F(OneSession, GetTicketData_GivesTheTicketAsXml)
     EXPECT_EQ(Manager().GetTicketData(3, 1, 0, &size, xml.data()), 0);
     EXPECT_NE(xml.find("Test/Number"), std::string::npos);
     EXPECT_NE(xml.find("815"), std::string::npos);
+}
+
+TEST_F(ExplicitSession, IsPreparedLoggedInAndOut)
+{
+    TLogin* const login = NewRecord();
+    ASSERT_EQ(Manager().IsAlive(login), 0);
+    ASSERT_EQ(Manager().Initialize(login, 1), 0);
+    EXPECT_NE(login->iLocalPort, 0u);
+    ASSERT_EQ(Manager().Login(login), 0);  // from here on the manager's
+    EXPECT_NE(login->hSession, nullptr);
+    EXPECT_EQ(Manager().GetCurrentlyLoggedUser(), "operator");
+    EXPECT_EQ(Manager().GetCurrentlyLoggedUserTicketID(), 2);
+
+    MTICKET_ACCESS const* const container = Manager().GetHandleToClientContainer(login);
+    ASSERT_NE(container, nullptr);
+    int value = 815;
+    EXPECT_EQ(Manager().SetParameter(container, 3, 1, "Test/Number", PARAM_INT, &value, -1), 1);
+    value = 0;
+    EXPECT_EQ(Manager().GetParameter(container, 3, 1, "Test/Number", PARAM_INT, &value, -1), 1);
+    EXPECT_EQ(value, 815);
+
+    EXPECT_EQ(Manager().Logout(login), 0);
+    EXPECT_EQ(Manager().GetParameter(container, 3, 1, "Test/Number", PARAM_INT, &value, -1), -1);
+}
+
+TEST_F(ExplicitSession, WithAWrongPassword_IsRefusedAndHasNoContainer)
+{
+    TLogin* const login = NewRecord("operator", "wrong");
+    ASSERT_EQ(Manager().Initialize(login, 1), 0);
+    EXPECT_NE(Manager().Login(login), 0);
+    EXPECT_EQ(Manager().GetHandleToClientContainer(login), nullptr);
 }
