@@ -2,7 +2,6 @@
 
 #include "standin/server/Password.h"
 #include "standin/server/TicketWrites.h"
-#include <algorithm>
 #include <cstdio>
 #include <shared_mutex>
 
@@ -70,7 +69,7 @@ Ticket* TicketServer::Find(TicketAddress address)
 bool TicketServer::Get(Session const& session, TicketAddress address, char const* key, PARAM_TYPE type,
                        void* value, int pos)
 {
-    return !session.Ended() && key && value && pos >= -1 && Read(address, key, type, value, pos);
+    return !session.Ended() && key && Read(address, key, type, value, pos);
 }
 
 std::optional<int> TicketServer::Int(TicketAddress address, char const* key)
@@ -204,21 +203,8 @@ void TicketServer::CarryOut(Ticket& ticket, TicketWrites& writes)
     TicketTexts removed;
     for (TicketWrites::Step& step : writes.Steps())
     {
-        bool const puts = step.kind == TicketWrites::Step::StartAnew || step.kind == TicketWrites::Step::Put;
         std::lock_guard const lock(m_memory);
-        step.record->ok = true;
-        Key const key = puts ? m_keys.Intern(step.record->key) : m_keys.Find(step.record->key);
-        if (!key)
-            continue;  // no ticket ever held what is to be deleted
-        KeyValues& values = ticket.keys[key];
-        if (step.kind == TicketWrites::Step::StartAnew || step.kind == TicketWrites::Step::EraseKey)
-            values.Clear(removed);
-        if (step.kind == TicketWrites::Step::Erase)
-            values.Erase(step.pos, removed);
-        if (puts)
-            values.Put(step.pos, std::move(step.value), removed);
-        if (values.Count() == 0)
-            ticket.keys.erase(key);
+        TicketWrites::CarryOut(step, ticket, m_keys, removed);
     }
     m_sessions.Retire(std::move(removed));
 }
@@ -296,15 +282,9 @@ bool TicketServer::Visit(Session const& session, TicketAddress address, Take con
     Ticket const* const ticket = Loaded(address);
     if (!ticket)
         return false;
-    std::vector<Ticket::Keys::const_pointer> byKey;
-    byKey.reserve(ticket->keys.size());
-    for (auto const& entry : ticket->keys)
-        byKey.push_back(&entry);
-    std::sort(byKey.begin(), byKey.end(),
-              [](auto* left, auto* right) { return *left->first < *right->first; });
-    for (auto const* const entry : byKey)
-        for (KeyValues::Entry const& value : entry->second.Entries())
-            take(*entry->first, value.pos, value.value.ToStored());
+    for (Key const key : ticket->SortedKeys())
+        for (KeyValues::Entry const& value : ticket->Find(key)->Entries())
+            take(*key, value.pos, value.value.ToStored());
     return true;
 }
 }  // namespace standin

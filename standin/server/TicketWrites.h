@@ -35,6 +35,10 @@ public:
     std::vector<Change> const& Changes() const { return m_changes; }
     std::vector<Step>& Steps() { return m_steps; }
 
+    // Carries one step out, sets its record's ok and moves its value away. Texts that it takes out of the
+    // ticket go to removed. False if it was a deletion of what is not there.
+    static bool CarryOut(Step& step, Ticket& ticket, KeyPool& pool, TicketTexts& removed);
+
 private:
     // What earlier records of the table did to a key.
     struct Draft
