@@ -57,7 +57,8 @@ void GetIntParameter(benchmark::State& state)
 }
 }  // namespace
 
-void* operator new(std::size_t size)
+// Not inlined, or the compiler takes malloc and delete, or new and free, for a mismatched pair.
+[[gnu::noinline]] void* operator new(std::size_t size)
 {
     allocations.fetch_add(1, std::memory_order_relaxed);
     if (void* const memory = std::malloc(size ? size : 1))
@@ -65,9 +66,9 @@ void* operator new(std::size_t size)
     throw std::bad_alloc();
 }
 
-void operator delete(void* memory) noexcept { std::free(memory); }
+[[gnu::noinline]] void operator delete(void* memory) noexcept { std::free(memory); }
 
-void operator delete(void* memory, std::size_t) noexcept { std::free(memory); }
+[[gnu::noinline]] void operator delete(void* memory, std::size_t) noexcept { std::free(memory); }
 
 BENCHMARK(SlotDirectly);
 BENCHMARK(GetIntParameter);
