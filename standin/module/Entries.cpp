@@ -2,6 +2,7 @@
 
 #include "standin/module/Guard.h"
 #include "standin/module/Handles.h"
+#include "standin/module/LocalTickets.h"
 #include "standin/module/ModuleCodes.h"
 #include "standin/module/SiteServer.h"
 #include "standin/module/TicketData.h"
@@ -184,12 +185,14 @@ int SendJob(void* hInstance, void* hSession, TJobIdentification*, char*, char*)
     return NotSupported(hInstance, hSession);
 }
 
-STICKET_ACCESS const* CreateTicket(char const*) { return nullptr; }
+STICKET_ACCESS const* CreateTicket(char const* path)
+{
+    return Guarded<STICKET_ACCESS const*>(nullptr, [path] { return LocalTickets::Get().Create(path); });
+}
 
 void DestroyTicket(STICKET_ACCESS const** ticket)
 {
-    if (ticket)
-        *ticket = nullptr;
+    Guarded<bool>(false, [ticket] { return LocalTickets::Get().Destroy(ticket), true; });
 }
 
 STicketFactory ticketFactory{{}, CreateTicket, DestroyTicket};
