@@ -3,12 +3,12 @@
 namespace standin
 {
 TicketWrites::TicketWrites(TicketAddress address, Ticket const& ticket, KeyPool const& pool,
-                           SETMULTIPAR* table)
+                           SETMULTIPAR* table, KeyFilter const* limit)
     : m_address(address), m_ticket(ticket), m_pool(pool)
 {
     for (SETMULTIPAR* record = table; record->key; ++record)
     {
-        if (!*record->key || record->pos > LargestPosition)
+        if (!*record->key || record->pos > LargestPosition || (limit && !limit->Selects(record->key)))
             continue;
         if (record->type == PARAM_NONE)
             AddDelete(*record);

@@ -3,6 +3,7 @@
 #pragma once
 
 #include "comgui/ticket/SETMULTIPAR.h"
+#include "standin/server/KeyFilter.h"
 #include "standin/server/Storage.h"
 #include "standin/server/Ticket.h"
 #include <map>
@@ -27,8 +28,10 @@ public:
         TicketValue value;
     };
 
-    // Leaves the table's ok bytes alone; a record that cannot be carried out gets no step.
-    TicketWrites(TicketAddress address, Ticket const& ticket, KeyPool const& pool, SETMULTIPAR* table);
+    // Leaves the table's ok bytes alone; a record that cannot be carried out gets no step, nor does one whose
+    // key is outside the limit.
+    TicketWrites(TicketAddress address, Ticket const& ticket, KeyPool const& pool, SETMULTIPAR* table,
+                 KeyFilter const* limit = nullptr);
 
     // Keys and texts of the changes lie in the table and in the steps, where they stay if the steps are
     // moved.
