@@ -1,5 +1,6 @@
 #include "standin/module/Entries.h"
 
+#include "standin/module/Commands.h"
 #include "standin/module/Guard.h"
 #include "standin/module/Handles.h"
 #include "standin/module/LocalTickets.h"
@@ -173,9 +174,10 @@ int GetTicketData(void* hInstance, void* hSession, int type, int id, int format,
                         });
 }
 
-int SendCommand(void* hInstance, void* hSession, char const*, int, void*)
+int SendCommand(void* hInstance, void* hSession, char const* command, int, void* data)
 {
-    return NotSupported(hInstance, hSession);
+    return SessionEntry(hInstance, hSession, [&](Container const& container)
+                        { return RunCommand(container, command, data); });
 }
 
 int TransferFile(void* hInstance, void* hSession, char*, char*) { return NotSupported(hInstance, hSession); }
