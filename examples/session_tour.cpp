@@ -1,12 +1,23 @@
 // A whole session with a server, step by step, told on the screen: finding the plug-in, testing the server,
-// logging in, reading the system ticket, writing a job ticket that a second session reads, logging out.
-// The exit status is 0 only if every step gave what it should.
+// logging in, reading the system ticket, writing a job ticket that a second session reads, hearing of
+// changes, creating and listing tickets, working on a ticket file, logging out. The exit status is 0 only if
+// every step gave what it should.
 #include <comgui/comgui.h>
 
+#include <algorithm>
+#include <chrono>
+#include <condition_variable>
 #include <cstdio>
+#include <filesystem>
+#include <fstream>
+#include <future>
 #include <iostream>
+#include <mutex>
 #include <sstream>
 #include <string>
+#include <unistd.h>
+#include <vector>
+#include <wx/init.h>
 
 namespace
 {
@@ -175,6 +186,16 @@ public:
 
     int Uninitialize() { return m_manager.UninitializeAsync(&m_login); }
 
+    // To be told of every change of a job ticket.
+    int Subscribe()
+    {
+        char const* const everyKey[] = {nullptr};
+        int const result = m_manager.SetCallback(&m_login, nullptr);
+        return result != 0 ? result : m_manager.EnableNotifications(&m_login, JobType, everyKey);
+    }
+
+    void Unsubscribe() { m_manager.DisableNotifications(&m_login, JobType); }
+
     int Read(char const* key, PARAM_TYPE type, void* value) const
     {
         return m_manager.GetParameter(m_container, JobType, JobId, key, type, value, -1);
@@ -235,6 +256,115 @@ void ShareJobTicket(Tour& tour, ComGUIManager& manager, SecondSession& second)
     tour.Expect("  and its list holds so many values", second.Ints("Tour/Pages").size(), std::size_t{0});
 }
 
+// The library's receiver deletes itself at its end; this one tells when.
+class Receiver : public ReceiverThread
+{
+public:
+    explicit Receiver(std::promise<void>& ended) : m_ended(ended) {}
+    ~Receiver() override { m_ended.set_value(); }
+
+private:
+    std::promise<void>& m_ended;
+};
+
+// Events as they come, to be waited for.
+class EventLog
+{
+public:
+    EventLog()
+        : m_subscription(CEventManager::GetInstance()->Subscribe(
+              [this](wxEvent& event)
+              {
+                  std::lock_guard const guard(m_lock);
+                  m_ids.push_back(event.GetId());
+                  m_changed.notify_all();
+              }))
+    {
+    }
+    EventLog(EventLog const&) = delete;
+    EventLog& operator=(EventLog const&) = delete;
+    ~EventLog() { CEventManager::GetInstance()->Unsubscribe(m_subscription); }
+
+    bool WaitFor(int id)
+    {
+        std::unique_lock guard(m_lock);
+        return m_changed.wait_for(guard, std::chrono::seconds(10),
+                                  [&] { return std::find(m_ids.begin(), m_ids.end(), id) != m_ids.end(); });
+    }
+
+private:
+    std::mutex m_lock;
+    std::condition_variable m_changed;
+    std::vector<int> m_ids;
+    unsigned long long m_subscription;
+};
+
+// What the first session does to job tickets, and the second one hears of.
+void ChangeJobs(Tour& tour, ComGUIManager& manager, EventLog& log)
+{
+    MTICKET_ACCESS const* const container = manager.GetClientContainer();
+    MTICKET_READ const& read = *MTICKET_READ::Of(container);
+    MTICKET_ADMIN const& admin = *MTICKET_ADMIN::Of(container);
+
+    int const job = admin.CreateNextTicket(JobType);
+    tour.Show(job > 0, "First session creates a job ticket; its id", job);
+    tour.Show(log.WaitFor(1000002), "  second session hears of it as event", 1000002);
+
+    STICKET_ACCESS const* const ticket = read.OpenTicket(JobType, job);
+    tour.Show(ticket != nullptr, "First session opens it", YesOrNo(ticket != nullptr));
+    if (!ticket)
+        return;
+    tour.Expect("  writes a text into it",
+                STICKET_MODIFY::Of(ticket)->SetParameter("Job/Identification/Name", "Tour", -1), 1);
+    tour.Show(log.WaitFor(1000004), "  second session hears of it as event", 1000004);
+    tour.Expect("  reads it back",
+                Text(STICKET_READ::Of(ticket)->GetWxStringParameter(-1, "Job/Identification/Name", "")),
+                std::string("Tour"));
+    tour.Expect("  and closes it", admin.CloseTicket(JobType, job, false), 1);
+
+    std::vector<int> ids;
+    read.GetTickets(JobType, ids);
+    tour.ShowText("The job tickets there are", Joined(ids, [](int id) { return id; }));
+    tour.Expect("First session deletes its own", manager.DeleteTicketOfType(JobType, job), 1);
+    tour.Show(log.WaitFor(1000003), "  second session hears of it as event", 1000003);
+}
+
+void HearOfChanges(Tour& tour, ComGUIManager& manager, SecondSession& second)
+{
+    tour.Chapter("Being told of changes");
+    EventLog log;
+    std::promise<void> ended;
+    auto* const receiver = new Receiver(ended);
+    receiver->Run();
+    tour.Expect("Second session subscribes to job tickets", second.Subscribe(), 0);
+    ChangeJobs(tour, manager, log);
+    receiver->ShutDown();
+    ended.get_future().wait();
+    second.Unsubscribe();
+}
+
+void WorkOnATicketFile(Tour& tour, ComGUIManager& manager)
+{
+    tour.Chapter("Working on a ticket file, without a server");
+    std::filesystem::path const file =
+        std::filesystem::temp_directory_path() / ("session_tour-" + std::to_string(getpid()) + ".xml");
+    std::ofstream(file) << "<ticket version=\"1\"/>\n";
+    wxString const path = wxString::FromUTF8(file.c_str());
+
+    tour.Expect("SetParameterToLocal writes an int", manager.SetParameterToLocal(path, "Copies", 25), 1);
+    tour.Expect("  which the file holds from then on",
+                manager.GetIntParameterFromLocal(path, "Copies", 0, -1), 25);
+    tour.Expect("AddStringToStringListLocal adds a text",
+                manager.AddStringToStringListLocal(path, "Papers", "matt"), 1);
+    tour.Expect("  another one", manager.AddStringToStringListLocal(path, "Papers", "glossy"), 1);
+    tour.Expect("  but none that is there", manager.AddStringToStringListLocal(path, "Papers", "matt"), 0);
+    tour.Expect("  so the list is", Joined(manager.GetStringArrayParameterFromLocal(path, "Papers")),
+                std::string("matt, glossy"));
+    std::filesystem::remove(file);
+    tour.Expect("A file that is not there gives -1, whatever the default",
+                manager.GetIntParameterFromLocal(path, "Copies", 7, -1), -1);
+}
+
 void LogOut(Tour& tour, ComGUIManager& manager, SecondSession& second)
 {
     tour.Chapter("Logging out");
@@ -252,6 +382,7 @@ void LogOut(Tour& tour, ComGUIManager& manager, SecondSession& second)
 
 int main()
 {
+    wxInitializer const wx;  // the receiver is a thread of wxWidgets
     Tour tour;
     tour.Chapter("Opening the communication plug-in");
     ComGUIManager* const manager = FindPlugIn();
@@ -267,6 +398,8 @@ int main()
         ReadSystemTicket(tour, *manager);
         SecondSession second(*manager);
         ShareJobTicket(tour, *manager, second);
+        HearOfChanges(tour, *manager, second);
+        WorkOnATicketFile(tour, *manager);
         LogOut(tour, *manager, second);
     }
     tour.Farewell();

@@ -1,5 +1,6 @@
 #include "standin/module/Container.h"
 
+#include "comgui/ticket/TICKET_ID.h"
 #include "standin/module/Guard.h"
 
 namespace standin
@@ -10,59 +11,154 @@ namespace
 template <typename Work>
 int Slot(void* instance, Work const& work) noexcept
 {
-    auto const* const container = static_cast<Container const*>(instance);
-    return container
-               ? Guarded<int>(0, [&] { return work(container->Server(), container->Session()) ? 1 : 0; })
-               : 0;
+    auto* const container = static_cast<Container*>(instance);
+    return container ? Guarded<int>(0, [&] { return work(*container) ? 1 : 0; }) : 0;
 }
 
 int OnGet(void* instance, int type, int id, char const* key, PARAM_TYPE ptype, void* value, int pos)
 {
     return Slot(instance,
-                [&](TicketServer& server, Session& session) {
-                    return server.Get(session, {type, id}, key, ptype, value, pos);
+                [&](Container& container) {
+                    return container.Server().Get(container.Session(), {type, id}, key, ptype, value, pos);
                 });
 }
 
 int OnGetTable(void* instance, int type, int id, GETMULTIPAR* table)
 {
     return Slot(instance,
-                [&](TicketServer& server, Session& session) {
-                    return server.GetTable(session, {type, id}, table);
+                [&](Container& container) {
+                    return container.Server().GetTable(container.Session(), {type, id}, table);
                 });
 }
 
 int OnSet(void* instance, int type, int id, char const* key, PARAM_TYPE ptype, void const* value, int pos)
 {
     return Slot(instance,
-                [&](TicketServer& server, Session& session) {
-                    return server.Set(session, {type, id}, key, ptype, value, pos);
+                [&](Container& container) {
+                    return container.Server().Set(container.Session(), {type, id}, key, ptype, value, pos);
                 });
 }
 
 int OnSetTable(void* instance, int type, int id, SETMULTIPAR* table)
 {
     return Slot(instance,
-                [&](TicketServer& server, Session& session) {
-                    return server.SetTable(session, {type, id}, table);
+                [&](Container& container) {
+                    return container.Server().SetTable(container.Session(), {type, id}, table);
                 });
 }
 
-int OnOperation(void* instance, int type, int id, TICKET_OP op, void*)
+bool Open(Container& container, TicketAddress address, void* arg)
+{
+    STICKET_ACCESS const* const access = arg ? container.Tickets().Open(address) : nullptr;
+    if (!access)
+        return false;
+    *static_cast<STICKET_ACCESS const**>(arg) = access;
+    return true;
+}
+
+bool CreateNext(Container& container, TicketAddress address, void* arg)
+{
+    if (address.id != TICKET_ID_NEXT || !arg)
+        return false;
+    int const id = container.Server().CreateNext(container.Session(), address.type);
+    if (id < 0)
+        return false;
+    container.Session().Limit({address.type, id},
+                              KeyFilter(nullptr));  // one of that address may have had one
+    *static_cast<int*>(arg) = id;
+    return true;
+}
+
+bool SetPartial(Container& container, TicketAddress address, void* arg)
+{
+    if (container.Session().Ended() || !container.Server().Exists(address))
+        return false;
+    container.Session().Limit(address, KeyFilter(static_cast<char const* const*>(arg)));
+    return true;
+}
+
+int OnOperation(void* instance, int type, int id, TICKET_OP op, void* arg)
 {
     return Slot(instance,
-                [&](TicketServer& server, Session& session) {
-                    return op.GetInt() == MTICKET_OP_DELETE && server.Delete(session, {type, id});
+                [&](Container& container)
+                {
+                    switch (op.GetInt())
+                    {
+                    case STICKET_OP_SET_PARTIAL:
+                        return SetPartial(container, {type, id}, arg);
+                    case MTICKET_OP_OPEN:
+                        return Open(container, {type, id}, arg);
+                    case MTICKET_OP_CREATE_NEXT:
+                        return CreateNext(container, {type, id}, arg);
+                    case MTICKET_OP_DELETE:
+                        return container.Server().Delete(container.Session(), {type, id});
+                    case MTICKET_OP_CLOSE:  // whatever the flag says: there is one way of closing
+                        return container.Tickets().Close({type, id});
+                    default:
+                        return false;
+                    }
                 });
 }
 
-int OnWalk(void*, MWALKTICKETS_ACTION, void*, int) { return 0; }
+// Over the tickets that there are at the beginning, so that a walk that makes tickets comes to an end.
+bool Walk(Container& container, MWALKTICKETS_ACTION action, void* context, int type)
+{
+    TicketServer& server = container.Server();
+    if (!action || container.Session().Ended() || !IsValid({type, 0}))
+        return false;
+    std::vector<int> ids;
+    for (int id = server.NextTicket(type, -1); id >= 0; id = server.NextTicket(type, id))
+        ids.push_back(id);
+    for (int const id : ids)
+    {
+        Birth const birth = server.BirthOf({type, id});
+        if (container.Session().Ended())
+            break;
+        if (birth == NoBirth)
+            continue;
+        OpenTicket ticket(server, container.Session(), {type, id}, birth);
+        if (!action(context, type, id, ticket.Access()))
+            break;
+    }
+    return true;
+}
 
-int OnSwitch(void*, int, int, int, bool, char const* const*) { return 0; }
+int OnWalk(void* instance, MWALKTICKETS_ACTION action, void* context, int type)
+{
+    return Slot(instance, [&](Container& container) { return Walk(container, action, context, type); });
+}
+
+int OnSwitch(void* instance, int type, int id, int notification, bool enable, char const* const* keys)
+{
+    return Slot(
+        instance,
+        [&](Container& container)
+        {
+            NotificationService& service = container.Server().Notifications();
+            if (!enable)
+                return service.Disable(container.Session(), notification, {type, id});
+            return keys && service.Enable(container.Session(), notification, {type, id}, KeyFilter(keys));
+        });
+}
+
+STICKET_ACCESS const* OnCreate(void* instance, int type, int id, char const* const* keys)
+{
+    STICKET_ACCESS const* access = nullptr;
+    Slot(instance,
+         [&](Container& container)
+         {
+             if (!container.Server().Create(container.Session(), {type, id}))
+                 return false;
+             container.Session().Limit({type, id}, KeyFilter(keys));
+             access = container.Tickets().Open({type, id});
+             return access != nullptr;
+         });
+    return access;
+}
 }  // namespace
 
 Container::Container(TicketServer& server, std::shared_ptr<standin::Session> session)
-    : m_server(server), m_session(std::move(session))
+    : m_server(server), m_session(std::move(session)), m_tickets(server, *m_session)
 {
     m_access.Instance = this;
     m_access.MGETPARAMETER = OnGet;
@@ -72,5 +168,6 @@ Container::Container(TicketServer& server, std::shared_ptr<standin::Session> ses
     m_access.MSETMULTIPAR = OnSetTable;
     m_access.MOPERATION = OnOperation;
     m_access.MENDISNOTIF = OnSwitch;
+    m_access.MCREATETICKET = OnCreate;
 }
 }  // namespace standin

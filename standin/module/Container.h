@@ -1,9 +1,10 @@
 // What a client of the module sees of its session: the handle and the table of the ticket container. It
 // stays allocated to the end of the process, since a client may hold the table longer than the session
-// lives; once the session has ended, every slot answers 0.
+// lives; once the session has ended, every slot answers 0. The same holds for the tables of its tickets.
 #pragma once
 
 #include "comgui/ticket/MTICKET_ACCESS.h"
+#include "standin/module/OpenTickets.h"
 #include "standin/server/TicketServer.h"
 
 namespace standin
@@ -18,10 +19,12 @@ public:
     MTICKET_ACCESS const* Access() const { return &m_access; }
     TicketServer& Server() const { return m_server; }
     standin::Session& Session() const { return *m_session; }
+    OpenTickets& Tickets() { return m_tickets; }
 
 private:
     TicketServer& m_server;
     std::shared_ptr<standin::Session> const m_session;
+    OpenTickets m_tickets;
     MTICKET_ACCESS m_access{};
 };
 }  // namespace standin

@@ -1,7 +1,9 @@
 #include "standin/module/Entries.h"
 
+#include "standin/module/Commands.h"
 #include "standin/module/Guard.h"
 #include "standin/module/Handles.h"
+#include "standin/module/LocalTickets.h"
 #include "standin/module/ModuleCodes.h"
 #include "standin/module/SiteServer.h"
 #include "standin/module/TicketData.h"
@@ -174,9 +176,10 @@ int GetTicketData(void* hInstance, void* hSession, int type, int id, int format,
                         });
 }
 
-int SendCommand(void* hInstance, void* hSession, char const*, int, void*)
+int SendCommand(void* hInstance, void* hSession, char const* command, int, void* data)
 {
-    return NotSupported(hInstance, hSession);
+    return SessionEntry(hInstance, hSession, [&](Container const& container)
+                        { return RunCommand(container, command, data); });
 }
 
 int TransferFile(void* hInstance, void* hSession, char*, char*) { return NotSupported(hInstance, hSession); }
@@ -186,12 +189,14 @@ int SendJob(void* hInstance, void* hSession, TJobIdentification*, char*, char*)
     return NotSupported(hInstance, hSession);
 }
 
-STICKET_ACCESS const* CreateTicket(char const*) { return nullptr; }
+STICKET_ACCESS const* CreateTicket(char const* path)
+{
+    return Guarded<STICKET_ACCESS const*>(nullptr, [path] { return LocalTickets::Get().Create(path); });
+}
 
 void DestroyTicket(STICKET_ACCESS const** ticket)
 {
-    if (ticket)
-        *ticket = nullptr;
+    Guarded<bool>(false, [ticket] { return LocalTickets::Get().Destroy(ticket), true; });
 }
 
 STicketFactory ticketFactory{{}, CreateTicket, DestroyTicket};

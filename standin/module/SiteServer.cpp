@@ -33,11 +33,27 @@ OpenSite::OpenSite(std::filesystem::path const& folder)
 {
 }
 
+using Sites = std::map<std::filesystem::path, std::unique_ptr<OpenSite>>;
+
+// At the end of the process the clients' callbacks go before this module does; no thread of ours may call
+// them then. A callback that hangs holds up the end for a moment only.
+struct EndOfNotifications
+{
+    Sites const& sites;
+
+    ~EndOfNotifications()
+    {
+        for (auto const& [folder, site] : sites)
+            site->server.Notifications().Stop(std::chrono::seconds(1));
+    }
+};
+
 TicketServer& ServerOf(std::filesystem::path const& folder)
 {
     // Never destroyed: containers may be used while the process comes to its end.
     static auto& lock = *new std::mutex;
-    static auto& sites = *new std::map<std::filesystem::path, std::unique_ptr<OpenSite>>;
+    static auto& sites = *new Sites;
+    static EndOfNotifications const atExit{sites};
     std::lock_guard const guard(lock);
     auto const known = sites.find(folder);
     if (known != sites.end())

@@ -1,5 +1,6 @@
 #include "standin/module/TicketTable.h"
 
+#include "comgui/ticket/TICKET_ID.h"
 #include "standin/module/Guard.h"
 
 namespace standin
@@ -54,5 +55,15 @@ TicketTable::TicketTable(TicketSubject& subject)
     m_access.SSETPARAMETER = OnSet;
     m_access.SSETMULTIPAR = OnSetTable;
     m_access.SOPTION = OnOption;
+}
+
+bool TellWhoAmI(std::optional<TicketAddress> const& address, void* out)
+{
+    if (!out)
+        return false;
+    TicketAddress const told = address.value_or(TicketAddress{TICKET_ID_NONE, TICKET_ID_NONE});
+    auto const word = [](int number) { return static_cast<unsigned long long>(number); };
+    *static_cast<STICKET_OPTION_WHOAMI*>(out) = {word(told.type), word(told.id)};
+    return true;
 }
 }  // namespace standin

@@ -3,6 +3,8 @@
 #pragma once
 
 #include "comgui/ticket/STICKET_ACCESS.h"
+#include "standin/server/TicketAddress.h"
+#include <optional>
 
 namespace standin
 {
@@ -34,4 +36,8 @@ public:
 private:
     STICKET_ACCESS m_access{};
 };
+
+// Answers STICKET_OP_WHOAMI into a STICKET_OPTION_WHOAMI: the ticket's type and its id, both TICKET_ID_NONE
+// for a ticket without an address. False for a null out.
+bool TellWhoAmI(std::optional<TicketAddress> const& address, void* out);
 }  // namespace standin

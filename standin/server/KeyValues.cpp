@@ -32,6 +32,12 @@ TicketValue const* KeyValues::At(int pos) const
     return index < m_entries.size() && m_entries[index].pos == pos ? &m_entries[index].value : nullptr;
 }
 
+KeyValues::Entry const* KeyValues::From(int pos) const
+{
+    auto const index = LowerBound(pos);
+    return index < m_entries.size() ? &m_entries[index] : nullptr;
+}
+
 void KeyValues::Put(int pos, TicketValue value, TicketTexts& removed)
 {
     auto const index = LowerBound(pos);

@@ -22,6 +22,7 @@ public:
     std::span<Entry const> Entries() const { return m_entries; }                    // by ascending position
     int Count() const { return m_entries.empty() ? 0 : m_entries.back().pos + 1; }  // gaps count, too
     TicketValue const* At(int pos) const;  // null in a gap and past the end
+    Entry const* From(int pos) const;      // the first at pos or behind, null past the end
 
     // The changes. Texts they take out go to removed.
     void Put(int pos, TicketValue value, TicketTexts& removed);

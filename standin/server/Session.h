@@ -1,8 +1,13 @@
-// One login at the server: who it is, and whether it still is. Several threads may use one.
+// One login at the server: who it is, whether it still is, and which keys of its tickets it wants to see.
+// Several threads may use one.
 #pragma once
 
+#include "standin/server/KeyFilter.h"
 #include "standin/server/Storage.h"
 #include <atomic>
+#include <map>
+#include <memory>
+#include <mutex>
 #include <utility>
 
 namespace standin
@@ -21,9 +26,20 @@ public:
     bool Ended() const { return m_ended.load(std::memory_order_acquire); }
     bool End() { return !m_ended.exchange(true, std::memory_order_acq_rel); }  // false if it had ended before
 
+    // Limits what the session reads, walks over and writes of whatever ticket has that address. A filter that
+    // selects every key lifts the limit.
+    void Limit(TicketAddress address, KeyFilter keys);
+
+    // Null if the session sees the ticket whole.
+    std::shared_ptr<KeyFilter const> LimitOf(TicketAddress address) const;
+
 private:
     unsigned long long const m_number;
     User const m_user;
     std::atomic<bool> m_ended{false};
+
+    mutable std::mutex m_lock;
+    std::map<TicketAddress, std::shared_ptr<KeyFilter const>> m_limits;
+    std::atomic<bool> m_limited{false};  // spares sessions without limits the lock
 };
 }  // namespace standin

@@ -1,9 +1,24 @@
 #include "standin/server/Ticket.h"
 
+#include <algorithm>
+
 namespace standin
 {
+std::vector<Key> Ticket::SortedKeys(std::string_view prefix) const
+{
+    std::vector<Key> sorted;
+    sorted.reserve(prefix.empty() ? keys.size() : 0);
+    for (auto const& [key, values] : keys)
+        if (key->starts_with(prefix))
+            sorted.push_back(key);
+    std::sort(sorted.begin(), sorted.end(), [](Key left, Key right) { return *left < *right; });
+    return sorted;
+}
+
 bool ReadValue(KeyValues const& values, PARAM_TYPE type, void* out, int pos)
 {
+    if (!out || pos < -1)
+        return false;
     if (type == PARAM_COUNT)
     {
         if (pos != -1)

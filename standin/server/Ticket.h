@@ -20,8 +20,12 @@ struct Ticket
         auto const found = keys.find(key);
         return found == keys.end() ? nullptr : &found->second;
     }
+
+    // The keys that begin with the prefix, bytewise in order.
+    std::vector<Key> SortedKeys(std::string_view prefix = {}) const;
 };
 
-// Answers a read of a key's values as the slots promise; *out is untouched when it gives false.
+// Answers a read of a key's values as the slots promise; *out is untouched when it gives false. False for a
+// null out, too.
 bool ReadValue(KeyValues const& values, PARAM_TYPE type, void* out, int pos);
 }  // namespace standin

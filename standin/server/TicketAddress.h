@@ -16,6 +16,13 @@ struct TicketAddress
 };
 
 inline constexpr TicketAddress SystemTicket{0, 0};
+inline constexpr int LargestId = 0xFFFFFF;
+
+// Can a ticket have it? The reserved ids are no tickets.
+constexpr bool IsValid(TicketAddress address)
+{
+    return address.type >= 0 && address.type < 100 && address.id >= 0 && address.id <= LargestId;
+}
 }  // namespace standin
 
 template <>

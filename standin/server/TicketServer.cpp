@@ -2,7 +2,6 @@
 
 #include "standin/server/Password.h"
 #include "standin/server/TicketWrites.h"
-#include <algorithm>
 #include <cstdio>
 #include <shared_mutex>
 
@@ -10,14 +9,22 @@ namespace standin
 {
 namespace
 {
-constexpr int LargestId = 0xFFFFFF;
-
-bool InRange(TicketAddress address)
-{
-    return address.type >= 0 && address.type < 100 && address.id >= 0 && address.id <= LargestId;
-}
-
 void Report(char const* line) { std::fprintf(stderr, "%s\n", line); }
+
+// What the steps will have changed, one for one; the keys are filled in where they have. Made before the
+// change, so that nothing can fail after it.
+ChangedParameters NewsOf(TicketWrites& writes)
+{
+    ChangedParameters news;
+    news.reserve(writes.Steps().size());
+    for (TicketWrites::Step const& step : writes.Steps())
+    {
+        bool const isOfTheKey =
+            step.kind == TicketWrites::Step::StartAnew || step.kind == TicketWrites::Step::EraseKey;
+        news.push_back({nullptr, isOfTheKey ? -1 : step.pos, TicketValue::FromStored(step.value.ToStored())});
+    }
+    return news;
+}
 }  // namespace
 
 TicketServer::TicketServer(Storage& storage, std::function<void()> systemTicketChanged)
@@ -27,9 +34,9 @@ TicketServer::TicketServer(Storage& storage, std::function<void()> systemTicketC
     m_tickets.reserve(addresses.size());
     for (TicketAddress const address : addresses)
     {
-        if (!InRange(address))
+        if (!IsValid(address))
             continue;  // no slot can name it
-        m_tickets.try_emplace(address);
+        m_tickets[address].birth = ++m_newestBirth;
         auto& ids = m_ids[static_cast<std::size_t>(address.type)];
         ids.insert(ids.end(), address.id);
     }
@@ -57,35 +64,41 @@ bool TicketServer::Logout(Session& session)
 {
     if (!session.End())
         return false;
+    m_notifications.Remove(session);
     m_sessions.Close(session.Number());
     return true;
 }
 
-Ticket* TicketServer::Find(TicketAddress address)
+TicketServer::ServedTicket* TicketServer::Find(TicketAddress address, Birth birth)
 {
     auto const found = m_tickets.find(address);
-    return found == m_tickets.end() ? nullptr : &found->second;
+    bool const isIt = found != m_tickets.end() && (birth == AnyBirth || birth == found->second.birth);
+    return isIt ? &found->second : nullptr;
 }
 
 bool TicketServer::Get(Session const& session, TicketAddress address, char const* key, PARAM_TYPE type,
-                       void* value, int pos)
+                       void* value, int pos, Birth birth)
 {
-    return !session.Ended() && key && value && pos >= -1 && Read(address, key, type, value, pos);
+    if (session.Ended() || !key)
+        return false;
+    auto const limit = session.LimitOf(address);
+    return (!limit || limit->Selects(key)) && Read(address, birth, key, type, value, pos);
 }
 
 std::optional<int> TicketServer::Int(TicketAddress address, char const* key)
 {
     int value = 0;
-    return Read(address, key, PARAM_INT, &value, -1) ? std::optional(value) : std::nullopt;
+    return Read(address, AnyBirth, key, PARAM_INT, &value, -1) ? std::optional(value) : std::nullopt;
 }
 
-bool TicketServer::Read(TicketAddress address, std::string_view key, PARAM_TYPE type, void* value, int pos)
+bool TicketServer::Read(TicketAddress address, Birth birth, std::string_view key, PARAM_TYPE type,
+                        void* value, int pos)
 {
     for (;;)
     {
         {
             std::shared_lock const lock(m_memory);
-            Ticket const* const ticket = Find(address);
+            Ticket const* const ticket = Find(address, birth);
             if (!ticket)
                 return false;
             if (ticket->loaded)
@@ -95,23 +108,23 @@ bool TicketServer::Read(TicketAddress address, std::string_view key, PARAM_TYPE 
             }
         }
         std::lock_guard const lock(m_change);
-        if (!Loaded(address))
+        if (!Loaded(address, birth))
             return false;
     }
 }
 
-bool TicketServer::GetTable(Session const& session, TicketAddress address, GETMULTIPAR* table)
+bool TicketServer::GetTable(Session const& session, TicketAddress address, GETMULTIPAR* table, Birth birth)
 {
     if (!table)
         return false;
     for (GETMULTIPAR* record = table; record->key; ++record)
-        record->ok = Get(session, address, record->key, record->type, record->value, record->pos);
+        record->ok = Get(session, address, record->key, record->type, record->value, record->pos, birth);
     return !session.Ended();
 }
 
-Ticket* TicketServer::Loaded(TicketAddress address)
+Ticket* TicketServer::Loaded(TicketAddress address, Birth birth)
 {
-    Ticket* const ticket = Find(address);
+    Ticket* const ticket = Find(address, birth);
     if (!ticket || ticket->loaded)
         return ticket;
     std::vector<std::pair<std::string, KeyValues>> keys;
@@ -151,17 +164,18 @@ bool TicketServer::MayWrite(Session const& session, TicketAddress address)
 }
 
 bool TicketServer::Set(Session const& session, TicketAddress address, char const* key, PARAM_TYPE type,
-                       void const* value, int pos)
+                       void const* value, int pos, Birth birth)
 {
     SETMULTIPAR table[2] = {};
     table[0].key = key;
     table[0].type = type;
     table[0].value = value;
     table[0].pos = pos;
-    return SetTable(session, address, table) && table[0].ok;  // a null key ends the table: ok stays false
+    return SetTable(session, address, table, birth) &&
+           table[0].ok;  // a null key ends the table: ok stays false
 }
 
-bool TicketServer::SetTable(Session const& session, TicketAddress address, SETMULTIPAR* table)
+bool TicketServer::SetTable(Session const& session, TicketAddress address, SETMULTIPAR* table, Birth birth)
 {
     if (!table)
         return false;
@@ -170,16 +184,21 @@ bool TicketServer::SetTable(Session const& session, TicketAddress address, SETMU
     if (!MayWrite(session, address))
         return false;
 
+    auto const limit = session.LimitOf(address);
     std::lock_guard const lock(m_change);
-    Ticket* const ticket = Loaded(address);
+    Ticket* const ticket = Loaded(address, birth);
     if (!ticket)
         return false;
-    TicketWrites writes(address, *ticket, m_keys, table);
+    TicketWrites writes(address, *ticket, m_keys, table, limit.get());
+    ChangedParameters news;
+    if (m_notifications.AreWanted(address))
+        news = NewsOf(writes);
     if (!Store(writes.Changes()))
         return false;
-    CarryOut(*ticket, writes);
+    CarryOut(*ticket, writes, news);
     if (!writes.Steps().empty())
         Changed(address);
+    m_notifications.Post(ParametersChanged, address, std::move(news));
     return true;
 }
 
@@ -199,26 +218,16 @@ bool TicketServer::Store(std::vector<Change> const& changes)
     }
 }
 
-void TicketServer::CarryOut(Ticket& ticket, TicketWrites& writes)
+void TicketServer::CarryOut(Ticket& ticket, TicketWrites& writes, ChangedParameters& news)
 {
     TicketTexts removed;
-    for (TicketWrites::Step& step : writes.Steps())
+    for (std::size_t i = 0; i < writes.Steps().size(); ++i)
     {
-        bool const puts = step.kind == TicketWrites::Step::StartAnew || step.kind == TicketWrites::Step::Put;
+        TicketWrites::Step& step = writes.Steps()[i];
         std::lock_guard const lock(m_memory);
-        step.record->ok = true;
-        Key const key = puts ? m_keys.Intern(step.record->key) : m_keys.Find(step.record->key);
-        if (!key)
-            continue;  // no ticket ever held what is to be deleted
-        KeyValues& values = ticket.keys[key];
-        if (step.kind == TicketWrites::Step::StartAnew || step.kind == TicketWrites::Step::EraseKey)
-            values.Clear(removed);
-        if (step.kind == TicketWrites::Step::Erase)
-            values.Erase(step.pos, removed);
-        if (puts)
-            values.Put(step.pos, std::move(step.value), removed);
-        if (values.Count() == 0)
-            ticket.keys.erase(key);
+        bool const changed = TicketWrites::CarryOut(step, ticket, m_keys, removed);
+        if (changed && !news.empty())
+            news[i].key = m_keys.Find(step.record->key);
     }
     m_sessions.Retire(std::move(removed));
 }
@@ -237,15 +246,16 @@ void TicketServer::Changed(TicketAddress address)
     }
 }
 
-bool TicketServer::Exists(TicketAddress address) const
+Birth TicketServer::BirthOf(TicketAddress address) const
 {
     std::shared_lock const lock(m_memory);
-    return m_tickets.contains(address);
+    auto const found = m_tickets.find(address);
+    return found == m_tickets.end() ? NoBirth : found->second.birth;
 }
 
 int TicketServer::NextTicket(int type, int after) const
 {
-    if (!InRange({type, 0}))
+    if (!IsValid({type, 0}))
         return -1;
     std::shared_lock const lock(m_memory);
     auto const& ids = m_ids[static_cast<std::size_t>(type)];
@@ -255,14 +265,37 @@ int TicketServer::NextTicket(int type, int after) const
 
 bool TicketServer::Create(Session const& session, TicketAddress address)
 {
-    if (!InRange(address) || !MayWrite(session, address))
+    if (!IsValid(address) || !MayWrite(session, address))
         return false;
     std::lock_guard const lock(m_change);
+    return CreateHere(address);
+}
+
+int TicketServer::CreateNext(Session const& session, int type)
+{
+    if (!IsValid({type, 0}))
+        return -1;
+    std::lock_guard const lock(m_change);
+    auto const& ids = m_ids[static_cast<std::size_t>(type)];
+    int id = ids.empty() ? 1 : *ids.rbegin() + 1;
+    if (id > LargestId)
+        for (id = 0; ids.contains(id);)
+            ++id;
+    return IsValid({type, id}) && MayWrite(session, {type, id}) && CreateHere({type, id}) ? id : -1;
+}
+
+bool TicketServer::CreateHere(TicketAddress address)
+{
     if (Find(address) || !Store({Change{Change::CreateTicket, address}}))
         return false;
-    std::lock_guard const memory(m_memory);
-    m_ids[static_cast<std::size_t>(address.type)].insert(address.id);
-    m_tickets[address].loaded = true;
+    {
+        std::lock_guard const memory(m_memory);
+        m_ids[static_cast<std::size_t>(address.type)].insert(address.id);
+        ServedTicket& ticket = m_tickets[address];
+        ticket.loaded = true;
+        ticket.birth = ++m_newestBirth;
+    }
+    m_notifications.Post(TicketCreated, address);
     return true;
 }
 
@@ -285,6 +318,7 @@ bool TicketServer::Delete(Session const& session, TicketAddress address)
     for (auto& [key, values] : ticket.mapped().keys)
         values.Clear(removed);
     m_sessions.Retire(std::move(removed));
+    m_notifications.Post(TicketDeleted, address);
     return true;
 }
 
@@ -296,15 +330,34 @@ bool TicketServer::Visit(Session const& session, TicketAddress address, Take con
     Ticket const* const ticket = Loaded(address);
     if (!ticket)
         return false;
-    std::vector<Ticket::Keys::const_pointer> byKey;
-    byKey.reserve(ticket->keys.size());
-    for (auto const& entry : ticket->keys)
-        byKey.push_back(&entry);
-    std::sort(byKey.begin(), byKey.end(),
-              [](auto* left, auto* right) { return *left->first < *right->first; });
-    for (auto const* const entry : byKey)
-        for (KeyValues::Entry const& value : entry->second.Entries())
-            take(*entry->first, value.pos, value.value.ToStored());
+    auto const limit = session.LimitOf(address);
+    for (Key const key : ticket->SortedKeys())
+        for (KeyValues::Entry const& value : ticket->Find(key)->Entries())
+            if (!limit || limit->Selects(*key))
+                take(*key, value.pos, value.value.ToStored());
     return true;
+}
+
+std::optional<std::vector<WalkedValue>> TicketServer::Values(Session const& session, TicketAddress address,
+                                                             std::string_view prefix, Birth birth)
+{
+    if (session.Ended())
+        return std::nullopt;
+    auto const limit = session.LimitOf(address);
+    std::lock_guard const lock(m_change);
+    Ticket const* const ticket = Loaded(address, birth);
+    if (!ticket)
+        return std::nullopt;
+    std::vector<WalkedValue> values;
+    for (Key const key : ticket->SortedKeys(prefix))
+        for (KeyValues::Entry const& entry : ticket->Find(key)->Entries())
+            if (!limit || limit->Selects(*key))
+            {
+                TicketText* const text = entry.value.text.get();
+                if (text)
+                    text->handedOut.store(true, std::memory_order_relaxed);
+                values.push_back({key, entry.pos, entry.value.type, entry.value.word, text});
+            }
+    return values;
 }
 }  // namespace standin

@@ -8,9 +8,13 @@
 //
 // A text or BIN_STRING that was read stays where it is until the session that read it logs out, also when
 // its ticket has long got another value.
+//
+// What a session has limited to some keys of a ticket it reads and writes as if the others were not there.
+// Every change is told to the sessions that want to know, once it is safe and in memory.
 #pragma once
 
 #include "comgui/ticket/SETMULTIPAR.h"
+#include "standin/server/NotificationService.h"
 #include "standin/server/ReadWriteLock.h"
 #include "standin/server/Session.h"
 #include "standin/server/SessionRegister.h"
@@ -28,6 +32,21 @@ inline constexpr int UserTicketType = 17;
 
 class TicketWrites;
 
+// Tells a ticket from another that had, or will have, its address. None is given twice in a server's life.
+using Birth = unsigned long long;
+inline constexpr Birth AnyBirth = 0;     // whichever ticket has the address
+inline constexpr Birth NoBirth = ~0ULL;  // of no ticket at all
+
+// A value of a ticket at one moment. The text is the ticket's own, kept as one that was read.
+struct WalkedValue
+{
+    Key key;
+    int pos;
+    PARAM_TYPE type;
+    unsigned long long word;
+    TicketText const* text;  // STRING, BINSTRING
+};
+
 class TicketServer
 {
 public:
@@ -40,25 +59,33 @@ public:
 
     // Null for a wrong user or password, which is not told apart. Throws StorageError.
     std::shared_ptr<Session> Login(std::string const& user, std::string const& password);
-    bool Logout(Session& session);  // false if it had ended before
+
+    // False if it had ended before. Waits for the end of a notification callback that runs for the session.
+    bool Logout(Session& session);
 
     // The reads and writes are what PARAM_TYPE.h says of value words. Positions: -1 the key as a whole, 0 and
     // up one value, -2 appends. A failed read leaves *value untouched. GetTable is false only for a null
     // table and an ended session; a record's ok tells of the record.
     bool Get(Session const& session, TicketAddress address, char const* key, PARAM_TYPE type, void* value,
-             int pos);
-    bool GetTable(Session const& session, TicketAddress address, GETMULTIPAR* table);
+             int pos, Birth birth = AnyBirth);
+    bool GetTable(Session const& session, TicketAddress address, GETMULTIPAR* table, Birth birth = AnyBirth);
     bool Set(Session const& session, TicketAddress address, char const* key, PARAM_TYPE type,
-             void const* value, int pos);
+             void const* value, int pos, Birth birth = AnyBirth);
 
     // All records that can be carried out are, in order and in one transaction; ok tells which. False, with
     // every ok false, for a ticket that is missing or not the user's to write, and when the storage fails.
-    bool SetTable(Session const& session, TicketAddress address, SETMULTIPAR* table);
+    bool SetTable(Session const& session, TicketAddress address, SETMULTIPAR* table, Birth birth = AnyBirth);
+
+    // Every value of the keys that begin with the prefix, by key, bytewise, and by position; nothing if there
+    // is no such ticket.
+    std::optional<std::vector<WalkedValue>> Values(Session const& session, TicketAddress address,
+                                                   std::string_view prefix, Birth birth = AnyBirth);
 
     // The server's own look at a ticket, with nobody logged in.
     std::optional<int> Int(TicketAddress address, char const* key);
 
-    bool Exists(TicketAddress address) const;
+    bool Exists(TicketAddress address) const { return BirthOf(address) != NoBirth; }
+    Birth BirthOf(TicketAddress address) const;  // NoBirth if there is no such ticket
 
     // The smallest id above after among the tickets of a type, -1 if there is none. Starts at after -1.
     int NextTicket(int type, int after) const;
@@ -67,7 +94,11 @@ public:
     // storage fails.
     bool Create(Session const& session, TicketAddress address);
 
-    // The same for a ticket that is missing; tickets of type 0 cannot be deleted.
+    // Makes a ticket of a type and gives its id: the one above the largest in use, 1 for the first of a type;
+    // the smallest free one when the largest possible is taken. -1 where Create would refuse.
+    int CreateNext(Session const& session, int type);
+
+    // False where Create would refuse, for a ticket that is missing, and for type 0, which is never deleted.
     bool Delete(Session const& session, TicketAddress address);
 
     // Hands out a ticket's values as Storage::Load does, pointers included; false if there is no such
@@ -75,15 +106,27 @@ public:
     using Take = std::function<void(std::string_view key, int pos, StoredValue const& value)>;
     bool Visit(Session const& session, TicketAddress address, Take const& take);
 
+    NotificationService& Notifications() { return m_notifications; }
+
     std::size_t RetiredTexts() const { return m_sessions.Kept(); }
 
 private:
-    bool Read(TicketAddress address, std::string_view key, PARAM_TYPE type, void* value, int pos);
+    struct ServedTicket : Ticket
+    {
+        Birth birth = NoBirth;
+    };
+
+    bool Read(TicketAddress address, Birth birth, std::string_view key, PARAM_TYPE type, void* value,
+              int pos);
     static bool MayWrite(Session const& session, TicketAddress address);
-    Ticket* Find(TicketAddress address);
-    Ticket* Loaded(TicketAddress address);  // m_change is held; null if missing or unreadable
+    ServedTicket* Find(TicketAddress address, Birth birth = AnyBirth);
+
+    // m_change is held for these four. Loaded: null if missing or unreadable.
+    Ticket* Loaded(TicketAddress address, Birth birth = AnyBirth);
     bool Store(std::vector<Change> const& changes);
-    void CarryOut(Ticket& ticket, TicketWrites& writes);
+    void CarryOut(Ticket& ticket, TicketWrites& writes, ChangedParameters& news);
+    bool CreateHere(TicketAddress address);
+
     void Changed(TicketAddress address);
 
     Storage& m_storage;
@@ -92,9 +135,12 @@ private:
     std::mutex m_change;             // held for a change as a whole, and for every use of the storage
     mutable ReadWriteLock m_memory;  // the members below; written to only while m_change is held, too
     KeyPool m_keys;
-    std::unordered_map<TicketAddress, Ticket> m_tickets;
+    std::unordered_map<TicketAddress, ServedTicket> m_tickets;
     std::array<std::set<int>, 100> m_ids;  // of m_tickets, by type
+    Birth m_newestBirth = 0;
 
-    SessionRegister m_sessions;  // has a lock of its own, taken last
+    // These have locks of their own, taken last.
+    SessionRegister m_sessions;
+    NotificationService m_notifications;
 };
 }  // namespace standin

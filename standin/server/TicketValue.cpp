@@ -1,6 +1,5 @@
 #include "standin/server/TicketValue.h"
 
-#include "comgui/ticket/BIN_STRING.h"
 #include <bit>
 #include <cstring>
 
@@ -106,5 +105,18 @@ void TicketValue::CopyTo(void* out) const
         *static_cast<char const**>(out) = text->bytes.c_str();
     else
         *static_cast<BIN_STRING*>(out) = {text->bytes.data(), text->bytes.size()};
+}
+
+void const* TicketValue::Word(BIN_STRING& binary) const
+{
+    if (type == PARAM_POINTER)
+        return std::bit_cast<void const*>(word);
+    if (!text)
+        return &word;  // little-endian: a short number's bytes come first
+    text->handedOut.store(true, std::memory_order_relaxed);
+    if (type == PARAM_STRING)
+        return text->bytes.c_str();
+    binary = {text->bytes.data(), text->bytes.size()};
+    return &binary;
 }
 }  // namespace standin

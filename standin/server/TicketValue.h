@@ -3,6 +3,7 @@
 // the ticket.
 #pragma once
 
+#include "comgui/ticket/BIN_STRING.h"
 #include "standin/server/StoredValue.h"
 #include <atomic>
 #include <memory>
@@ -41,5 +42,9 @@ struct TicketValue
 
     // Puts the value to where a read of its type wants it.
     void CopyTo(void* out) const;
+
+    // The value word of a write of this value. It points into this value, for a BINSTRING at binary, which
+    // is filled in.
+    void const* Word(BIN_STRING& binary) const;
 };
 }  // namespace standin

@@ -3,12 +3,12 @@
 namespace standin
 {
 TicketWrites::TicketWrites(TicketAddress address, Ticket const& ticket, KeyPool const& pool,
-                           SETMULTIPAR* table)
+                           SETMULTIPAR* table, KeyFilter const* limit)
     : m_address(address), m_ticket(ticket), m_pool(pool)
 {
     for (SETMULTIPAR* record = table; record->key; ++record)
     {
-        if (!*record->key || record->pos > LargestPosition)
+        if (!*record->key || record->pos > LargestPosition || (limit && !limit->Selects(record->key)))
             continue;
         if (record->type == PARAM_NONE)
             AddDelete(*record);
@@ -81,6 +81,27 @@ void TicketWrites::Add(SETMULTIPAR& record, Step::Kind kind, int pos, TicketValu
     else if (kind == Step::Erase)
         Store(Change::DeleteValue, record.key, pos);
     m_steps.push_back(Step{&record, kind, pos, std::move(value)});
+}
+
+bool TicketWrites::CarryOut(Step& step, Ticket& ticket, KeyPool& pool, TicketTexts& removed)
+{
+    bool const puts = step.kind == Step::StartAnew || step.kind == Step::Put;
+    step.record->ok = true;
+    Key const key = puts ? pool.Intern(step.record->key) : pool.Find(step.record->key);
+    if (!key)
+        return false;  // no ticket ever held what is to be deleted
+    KeyValues& values = ticket.keys[key];
+    auto const before = values.Entries().size();
+    if (step.kind == Step::StartAnew || step.kind == Step::EraseKey)
+        values.Clear(removed);
+    if (step.kind == Step::Erase)
+        values.Erase(step.pos, removed);
+    if (puts)
+        values.Put(step.pos, std::move(step.value), removed);
+    bool const changed = puts || values.Entries().size() != before;
+    if (values.Count() == 0)
+        ticket.keys.erase(key);
+    return changed;
 }
 
 void TicketWrites::Store(Change::Kind kind, std::string_view key, int pos, StoredValue const& value)

@@ -3,6 +3,7 @@
 #pragma once
 
 #include "comgui/ticket/SETMULTIPAR.h"
+#include "standin/server/KeyFilter.h"
 #include "standin/server/Storage.h"
 #include "standin/server/Ticket.h"
 #include <map>
@@ -27,13 +28,19 @@ public:
         TicketValue value;
     };
 
-    // Leaves the table's ok bytes alone; a record that cannot be carried out gets no step.
-    TicketWrites(TicketAddress address, Ticket const& ticket, KeyPool const& pool, SETMULTIPAR* table);
+    // Leaves the table's ok bytes alone; a record that cannot be carried out gets no step, nor does one whose
+    // key is outside the limit.
+    TicketWrites(TicketAddress address, Ticket const& ticket, KeyPool const& pool, SETMULTIPAR* table,
+                 KeyFilter const* limit = nullptr);
 
     // Keys and texts of the changes lie in the table and in the steps, where they stay if the steps are
     // moved.
     std::vector<Change> const& Changes() const { return m_changes; }
     std::vector<Step>& Steps() { return m_steps; }
+
+    // Carries one step out, sets its record's ok and moves its value away. Texts that it takes out of the
+    // ticket go to removed. False if it was a deletion of what is not there.
+    static bool CarryOut(Step& step, Ticket& ticket, KeyPool& pool, TicketTexts& removed);
 
 private:
     // What earlier records of the table did to a key.

@@ -77,7 +77,14 @@ TicketXml TicketXml::Parse(std::string_view text, std::string const& name)
     return reader.Ticket(reader.Root("ticket"));
 }
 
-void TicketXml::Write(std::filesystem::path const& file) const { ReplaceFile(file, Text()); }
+void TicketXml::Write(std::filesystem::path const& file) const
+{
+    std::string const text = Text();
+    if (text.size() > SizeLimit)
+        throw StorageError(file.string() + ": cannot be written: the ticket takes more than " +
+                           std::to_string(SizeLimit >> 20) + " MiB; delete values, then try again");
+    ReplaceFile(file, text);
+}
 
 std::string TicketXml::Text() const
 {

@@ -48,7 +48,7 @@ public:
     static TicketXml Read(std::filesystem::path const& file);
     static TicketXml Parse(std::string_view text, std::string const& name);
 
-    // Replaces the file as a whole; throws StorageError.
+    // Replaces the file as a whole; throws StorageError, also for more than Read would take.
     void Write(std::filesystem::path const& file) const;
     std::string Text() const;
 

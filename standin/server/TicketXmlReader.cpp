@@ -1,5 +1,6 @@
 #include "standin/server/TicketXmlReader.h"
 
+#include "standin/server/KeyValues.h"
 #include "standin/server/TicketXmlText.h"
 #include <algorithm>
 #include <charconv>
@@ -234,7 +235,7 @@ void TicketXmlReader::Parameter(TicketXml& ticket, pugi::xml_node node) const
         if (child.name() != std::string_view("value"))
             Fail(child, std::string("unknown element <") + child.name() + ">");
         ExpectAttributes(child, {"pos", "type", "encoding"});
-        int const pos = Number(child, "pos", INT_MAX);
+        int const pos = Number(child, "pos", LargestPosition);
         if (!positions.insert(pos).second)
             Fail(child, "position " + std::to_string(pos) + " stands twice");
         Value(ticket, key, pos, child.attribute("type") ? Type(child) : type, child);
@@ -244,11 +245,15 @@ void TicketXmlReader::Parameter(TicketXml& ticket, pugi::xml_node node) const
 std::string TicketXmlReader::Key(pugi::xml_node node) const
 {
     std::string key = Attribute(node, "key");
-    if (!node.attribute("key-encoding"))
-        return key;
-    if (Attribute(node, "key-encoding") != "base64")
-        Fail(node, "unknown encoding " + Attribute(node, "key-encoding"));
-    return Decoded(node, key);
+    if (node.attribute("key-encoding"))
+    {
+        if (Attribute(node, "key-encoding") != "base64")
+            Fail(node, "unknown encoding " + Attribute(node, "key-encoding"));
+        key = Decoded(node, key);
+    }
+    if (key.empty() || key.find('\0') != std::string::npos)
+        Fail(node, "a key is a text of at least one byte, without a zero byte");
+    return key;
 }
 
 void TicketXmlReader::Value(TicketXml& ticket, std::string const& key, int pos, PARAM_TYPE type,

@@ -282,7 +282,7 @@ TEST_F(Entries, CommandsFilesAndJobs_AreNotSupportedYet)
     char text[] = "x";
     void* const i = module.Instance();
     EXPECT_EQ(module->SendCommandEntry(i, hSession, "Command", 0, nullptr), MODULE_NOT_SUPPORTED);
-    EXPECT_EQ(module->SendCommandEntry(i, hSession, nullptr, 0, nullptr), MODULE_NOT_SUPPORTED);
+    EXPECT_EQ(module->SendCommandEntry(i, hSession, nullptr, 0, nullptr), MODULE_INVALID_ARGUMENT);
     EXPECT_EQ(module->PutFileEntry(i, hSession, text, text), MODULE_NOT_SUPPORTED);
     EXPECT_EQ(module->GetFileEntry(i, hSession, text, text), MODULE_NOT_SUPPORTED);
     EXPECT_EQ(module->PutFileSyncEntry(i, hSession, text, text), MODULE_NOT_SUPPORTED);

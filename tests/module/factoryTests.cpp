@@ -67,15 +67,3 @@ TEST(ModuleFactory, Open_GivesEachCallerAnInstanceOfItsOwn)
     EXPECT_NE(one.Instance(), other.Instance());
     EXPECT_NE(one->Open(nullptr), 0);
 }
-
-TEST(ModuleFactory, TicketFactory_MakesNoTicketsYetAndClearsThePointer)
-{
-    MODULE const module;
-    ASSERT_TRUE(module->STicketFactory);
-    STICKET_ACCESS ticket{};
-    STICKET_ACCESS const* pointer = &ticket;
-    EXPECT_EQ(module->STicketFactory->CreateTicket(nullptr), nullptr);
-    module->STicketFactory->DestroyTicket(&pointer);
-    EXPECT_EQ(pointer, nullptr);
-    module->STicketFactory->DestroyTicket(nullptr);
-}

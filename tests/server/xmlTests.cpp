@@ -237,7 +237,7 @@ TEST(TicketXml, RandomTickets_ComeBack)
         for (int count = below(20); count > 0; --count)
         {
             std::string key, text;
-            for (int size = below(4); size > 0; --size)
+            for (int size = 1 + below(3); size > 0; --size)
                 key.push_back(static_cast<char>(1 + below(255)));
             for (int size = below(10); size > 0; --size)
                 text.push_back(static_cast<char>(1 + below(255)));
@@ -346,6 +346,12 @@ INSTANTIATE_TEST_SUITE_P(
                 "2: the attribute pos is missing in <value>"},
         BadText{"NegativePosition", "<parameter key='K' type='int'><value pos='-1'>1</value></parameter>",
                 "2: pos is out of range: -1"},
+        BadText{"PositionTooFar", "<parameter key='K' type='int'><value pos='16777216'>1</value></parameter>",
+                "2: pos is out of range: 16777216"},
+        BadText{"EmptyKey", "<parameter key='' type='int'>1</parameter>",
+                "2: a key is a text of at least one byte, without a zero byte"},
+        BadText{"ZeroByteInAKey", "<parameter key='AEE=' key-encoding='base64' type='int'>1</parameter>",
+                "2: a key is a text of at least one byte, without a zero byte"},
         BadText{"TextBesideValues", "<parameter key='K' type='string'>a<value pos='0'>1</value></parameter>",
                 "2: text where none is expected: a"},
         BadText{"ElementInAValue", "<parameter key='K' type='string'><value pos='0'><b/></value></parameter>",

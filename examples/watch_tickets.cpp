@@ -1,0 +1,315 @@
+// Watches a server: logs in, asks to be told of all changes, prints each event as it comes, and leaves in
+// good order on Ctrl-C. With --busy a second session changes tickets meanwhile, so that there is something
+// to see.
+#include <comgui/comgui.h>
+
+#include <chrono>
+#include <condition_variable>
+#include <csignal>
+#include <cstdio>
+#include <cstdlib>
+#include <future>
+#include <mutex>
+#include <string>
+#include <thread>
+#include <wx/cmdline.h>
+#include <wx/datetime.h>
+#include <wx/init.h>
+
+namespace
+{
+constexpr int JobType = 3;
+constexpr int WatchedTypes[] = {0, 2, 3, 7, 12, 17};
+constexpr char const* EveryKey[] = {nullptr};
+constexpr int Stamp = 20260101;  // a host's own mark; the plug-in only carries it
+
+struct OPTIONS
+{
+    wxString user = "admin";
+    wxString password = "admin";
+    wxString host = "localhost";
+    long port = 50000;
+    long events = 0;  // leave after so many; 0: on Ctrl-C only
+    bool busy = false;
+};
+
+// False if the program is to end at once: after --help, or with a usage message on a wrong command line.
+bool Parse(int argc, char** argv, OPTIONS& options)
+{
+    wxCmdLineParser parser(argc, argv);
+    parser.SetLogo("Prints what changes in the tickets of a server, until Ctrl-C.");
+    parser.AddSwitch("h", "help", "show this text", wxCMD_LINE_OPTION_HELP);
+    parser.AddSwitch("b", "busy", "change tickets meanwhile, in a second session (as operator)");
+    parser.AddOption("u", "user", "log in as this user (admin)");
+    parser.AddOption("p", "password", "with this password (admin)");
+    parser.AddOption("s", "server", "at this host (localhost)");
+    parser.AddOption("o", "port", "and port (50000)", wxCMD_LINE_VAL_NUMBER);
+    parser.AddOption("n", "events", "leave after so many events", wxCMD_LINE_VAL_NUMBER);
+    if (parser.Parse() != 0)
+        return false;
+    parser.Found("user", &options.user);
+    parser.Found("password", &options.password);
+    parser.Found("server", &options.host);
+    parser.Found("port", &options.port);
+    parser.Found("events", &options.events);
+    options.busy = parser.Found("busy");
+    return true;
+}
+
+bool Fail(char const* what, int code)
+{
+    std::fprintf(stderr, "watch_tickets: %s (the plug-in's code: %d)\n", what, code);
+    return false;
+}
+
+// One session by a record of the host's own. calloc, since a record that is logged in becomes the manager's.
+TLogin* NewRecord(char const* user, char const* password, OPTIONS const& options)
+{
+    auto* const login = static_cast<TLogin*>(std::calloc(1, sizeof(TLogin)));
+    if (!login)
+        std::abort();
+    login->nSize = sizeof(TLogin);
+    login->iGUINotificationID = -1;
+    stracpy(login->szUser, user, sizeof login->szUser);
+    stracpy(login->szPassword, password, sizeof login->szPassword);
+    stracpy(login->szServerHost, options.host.utf8_str(), sizeof login->szServerHost);
+    login->iServerPort = static_cast<int>(options.port);
+    return login;
+}
+
+std::string ValueOf(NotifData const& data)
+{
+    switch (data.NotifValueType)
+    {
+    case PARAM_NONE:
+        return data.NotifKind == 1 ? "(deleted)" : "";
+    case PARAM_INT:
+        return wxString::Format("%.0f", data.NotifNumber).utf8_string();
+    case PARAM_DOUBLE:
+        return wxString::Format("%g", data.NotifNumber).utf8_string();
+    case PARAM_STRING:
+        return "\"" + data.NotifText.utf8_string() + "\"";
+    case PARAM_COUNT:
+        return "(several values)";
+    default:
+        return "(a value)";
+    }
+}
+
+// Prints events on the receiver's thread, quickly, since the plug-in waits meanwhile.
+class Printer
+{
+public:
+    explicit Printer(long limit) : m_limit(limit) {}
+
+    void Print(ServerNotificationEvent const& event)
+    {
+        NotifData const& data = event.GetNotifData();
+        std::printf("%s  event %d  ticket %d/%d  %s %s\n",
+                    wxDateTime::UNow().Format("%H:%M:%S.%l").utf8_string().c_str(), event.GetId(),
+                    data.NotifCode, data.NotifArgA, data.NotifKey.utf8_string().c_str(),
+                    ValueOf(data).c_str());
+        std::fflush(stdout);
+        if (m_limit != 0 && ++m_printed == m_limit)
+            std::raise(SIGTERM);  // as if somebody had pressed Ctrl-C
+    }
+
+private:
+    long const m_limit;
+    long m_printed = 0;
+};
+
+// The library's receiver deletes itself at its end; this one tells when.
+class Receiver : public ReceiverThread
+{
+public:
+    explicit Receiver(std::promise<void>& ended) : m_ended(ended) {}
+    ~Receiver() override { m_ended.set_value(); }
+
+private:
+    std::promise<void>& m_ended;
+};
+
+// A second session of this program, which works on tickets. It uses the slots of its container alone, since
+// the manager itself is for one thread.
+class BusySession
+{
+public:
+    BusySession(ComGUIManager& manager, OPTIONS const& options)
+        : m_manager(manager), m_login(NewRecord("operator", "operator", options))
+    {
+    }
+    BusySession(BusySession const&) = delete;
+    BusySession& operator=(BusySession const&) = delete;
+    ~BusySession() { std::free(m_login); }
+
+    bool Start()
+    {
+        int result = m_manager.InitializeBackward(m_login, Stamp);
+        if (result == 0)
+            result = m_manager.LoginBackward(m_login);
+        if (result != 0)
+            return Fail("the second session cannot log in as operator", result);
+        m_container = m_manager.GetBackwardContainer();
+        m_thread = std::thread([this] { Work(); });
+        return true;
+    }
+
+    void Stop()
+    {
+        if (!m_thread.joinable())
+            return;
+        {
+            std::lock_guard const guard(m_lock);
+            m_stop = true;
+        }
+        m_stopped.notify_all();
+        m_thread.join();
+        m_manager.LogoutBackward(m_login);
+    }
+
+private:
+    void Work()
+    {
+        MTICKET_MODIFY const& modify = *MTICKET_MODIFY::Of(m_container);
+        MTICKET_ADMIN const& admin = *MTICKET_ADMIN::Of(m_container);
+        MTICKET_READ const& read = *MTICKET_READ::Of(m_container);
+        for (int round = 1; Pause(); ++round)
+        {
+            int const job = admin.CreateNextTicket(JobType);
+            if (job < 0)
+                continue;
+            modify.SetParameter(JobType, job, "Job/Identification/Name",
+                                wxString::Format("Brochure %d", round), -1);
+            modify.SetParameter(JobType, job, "Job/Progress", 12.5, -1);
+            if (STICKET_ACCESS const* const ticket = read.OpenTicket(JobType, job))
+            {
+                STICKET_MODIFY::Of(ticket)->SetParameter("Job/Copies", 100 * round, -1);
+                admin.CloseTicket(JobType, job, false);
+            }
+            modify.DelParameter(JobType, job, "Job/Progress", -1);
+            m_container->MOPERATION(m_container->Instance, JobType, job, MTICKET_OP_DELETE, nullptr);
+        }
+    }
+
+    // False when it is time to stop.
+    bool Pause()
+    {
+        std::unique_lock guard(m_lock);
+        return !m_stopped.wait_for(guard, std::chrono::milliseconds(500), [this] { return m_stop; });
+    }
+
+    ComGUIManager& m_manager;
+    TLogin* m_login;
+    MTICKET_ACCESS const* m_container = nullptr;
+    std::thread m_thread;
+    std::mutex m_lock;
+    std::condition_variable m_stopped;
+    bool m_stop = false;
+};
+
+// Waits for Ctrl-C and its like. They are blocked from the start, in every thread, so none is lost.
+class EndSignals
+{
+public:
+    EndSignals()
+    {
+        sigemptyset(&m_signals);
+        for (int const signal : {SIGINT, SIGTERM, SIGHUP})
+            sigaddset(&m_signals, signal);
+        pthread_sigmask(SIG_BLOCK, &m_signals, nullptr);
+    }
+
+    void Wait() const
+    {
+        int signal = 0;
+        sigwait(&m_signals, &signal);
+    }
+
+private:
+    sigset_t m_signals;
+};
+
+bool LogIn(ComGUIManager& manager, TLogin* login)
+{
+    if (!manager.IsServerOnline(login))
+        return Fail("no server answers there", -2005);
+    if (int const result = manager.Initialize(login, Stamp); result != 0)
+        return Fail("cannot prepare a session", result);
+    if (int const result = manager.Login(login); result != 0)
+        return Fail("the server refuses the login", result);
+    return manager.GetClientContainer() != nullptr;
+}
+
+bool Subscribe(ComGUIManager& manager, TLogin* login)
+{
+    if (int const result = manager.SetCallback(login, nullptr); result != 0)
+        return Fail("the plug-in takes no callback", result);
+    for (int const type : WatchedTypes)
+        manager.EnableNotifications(login, type, EveryKey);
+    return true;
+}
+
+int Watch(ComGUIManager& manager, TLogin* login, OPTIONS const& options, EndSignals const& end)
+{
+    if (!Subscribe(manager, login))
+        return 1;
+    Printer printer(options.events);
+    auto const subscription = CEventManager::GetInstance()->Subscribe(
+        [&](wxEvent& event)
+        {
+            if (auto const* const notified = dynamic_cast<ServerNotificationEvent*>(&event))
+                printer.Print(*notified);
+        });
+    std::promise<void> ended;
+    auto* const receiver = new Receiver(ended);
+    receiver->Run();
+
+    BusySession busy(manager, options);
+    bool const started = !options.busy || busy.Start();
+    if (started)
+    {
+        std::printf("Watching %s as %s; Ctrl-C ends it.\n", options.host.utf8_string().c_str(),
+                    manager.GetCurrentlyLoggedUser().utf8_string().c_str());
+        std::fflush(stdout);
+        end.Wait();
+    }
+    std::puts("\nLeaving.");
+    busy.Stop();
+
+    // The order in which a host leaves: receiver, notifications, session.
+    receiver->ShutDown();
+    ended.get_future().wait();
+    CEventManager::GetInstance()->Unsubscribe(subscription);
+    for (int const type : WatchedTypes)
+        manager.DisableNotifications(login, type);
+    return started ? 0 : 1;
+}
+}  // namespace
+
+int main(int argc, char** argv)
+{
+    EndSignals const end;
+    wxInitializer const wx(argc, argv);
+    OPTIONS options;
+    if (!wx.IsOk() || !Parse(argc, argv, options))
+        return 1;
+
+    ComGUIManager* const manager = ComGUIManager::GetInstance();
+    if (!hSTicketInstance)
+    {
+        wxString path;
+        UtilityObjects::GetPlugInsPath(path, L"" COMGUI_BUNDLE_NAME);
+        std::fprintf(stderr,
+                     "watch_tickets: cannot open the communication plug-in %s: build or install it there\n",
+                     path.utf8_string().c_str());
+        return 1;
+    }
+    TLogin* const login = NewRecord(options.user.utf8_str(), options.password.utf8_str(), options);
+    if (!LogIn(*manager, login))
+        return 1;
+    int const status = Watch(*manager, login, options, end);
+    manager->Logout();
+    manager->Uninitialize();
+    return status;
+}

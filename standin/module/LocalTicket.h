@@ -1,0 +1,42 @@
+// A single ticket outside any container: in memory, or out of a ticket file, which it saves to when it has
+// changed. For one thread at a time; several tickets, also of one file, are independent of each other.
+#pragma once
+
+#include "standin/module/TicketTable.h"
+#include "standin/server/OwnedTicket.h"
+#include <filesystem>
+
+namespace standin
+{
+class LocalTicket : private TicketSubject
+{
+public:
+    LocalTicket() = default;  // in memory
+
+    // Throws XmlError and StorageError. A file that is not there is told by FileToOpen, and not here.
+    explicit LocalTicket(std::filesystem::path file);
+
+    // The file that a client means by a path: absolute, so that the ticket is saved to where it came from
+    // even if the current folder changes, and with backslashes as separators, since that is what clients
+    // written for other systems send. Nothing if no such file is there.
+    static std::optional<std::filesystem::path> FileToOpen(std::string path);
+
+    // Puts the changes into the file, if there are any and if there is a file; throws StorageError, with the
+    // old file as it was.
+    void Save() const;
+
+    STICKET_ACCESS const* Access() const { return m_table.Access(); }
+
+private:
+    bool Get(char const* key, PARAM_TYPE type, void* value, int pos) override;
+    bool GetTable(GETMULTIPAR* table) override;
+    bool Set(char const* key, PARAM_TYPE type, void const* value, int pos) override;
+    bool SetTable(SETMULTIPAR* table) override;
+    bool Walk(SWALKPARAMETERS_ACTION action, void* context, char const* prefix, int limit) override;
+    bool Option(int code, void* out) override;
+
+    std::filesystem::path const m_file;  // empty in memory
+    OwnedTicket m_ticket;
+    TicketTable const m_table{*this};
+};
+}  // namespace standin

@@ -1,0 +1,35 @@
+#include "standin/module/OpenTickets.h"
+
+namespace standin
+{
+STICKET_ACCESS const* OpenTickets::Open(TicketAddress address)
+{
+    Birth const birth = m_server.BirthOf(address);
+    if (birth == NoBirth || m_session.Ended())
+        return nullptr;
+    std::lock_guard const lock(m_lock);
+    Entry& entry = m_open[address];
+    bool const isAnother = entry.ticket && entry.openings && entry.ticket->Which() != birth;
+    if (isAnother)
+    {
+        m_outlived.push_back(std::move(entry.ticket));
+        entry.openings = 0;
+    }
+    if (!entry.ticket)
+        entry.ticket = std::make_unique<OpenTicket>(m_server, m_session, address, birth);
+    entry.ticket->StandFor(birth);
+    ++entry.openings;
+    return entry.ticket->Access();
+}
+
+bool OpenTickets::Close(TicketAddress address)
+{
+    std::lock_guard const lock(m_lock);
+    auto const entry = m_open.find(address);
+    if (m_session.Ended() || entry == m_open.end() || !entry->second.openings)
+        return false;
+    if (--entry->second.openings == 0)
+        entry->second.ticket->StandFor(NoBirth);
+    return true;
+}
+}  // namespace standin

@@ -1,0 +1,35 @@
+// The tickets that one session has open. A ticket has one table, however often it is opened, and keeps it
+// for the next time when it is closed, so that a client's stale pointer leads to a table that answers 0 and
+// never to freed memory. For any thread.
+#pragma once
+
+#include "standin/module/OpenTicket.h"
+#include <map>
+
+namespace standin
+{
+class OpenTickets
+{
+public:
+    OpenTickets(TicketServer& server, Session const& session) : m_server(server), m_session(session) {}
+
+    // Null if there is no such ticket, or no session any more.
+    STICKET_ACCESS const* Open(TicketAddress address);
+
+    // Undoes one Open; false if the ticket is not open. Works for a ticket that has been deleted, too.
+    bool Close(TicketAddress address);
+
+private:
+    struct Entry
+    {
+        std::unique_ptr<OpenTicket> ticket;
+        unsigned openings = 0;
+    };
+
+    TicketServer& m_server;
+    Session const& m_session;
+    std::mutex m_lock;
+    std::map<TicketAddress, Entry> m_open;
+    std::vector<std::unique_ptr<OpenTicket>> m_outlived;  // open when their ticket was made anew
+};
+}  // namespace standin

@@ -1,0 +1,23 @@
+#include "standin/server/Session.h"
+
+namespace standin
+{
+void Session::Limit(TicketAddress address, KeyFilter keys)
+{
+    std::lock_guard const lock(m_lock);
+    if (keys.SelectsAll())
+        m_limits.erase(address);
+    else
+        m_limits[address] = std::make_shared<KeyFilter const>(std::move(keys));
+    m_limited.store(!m_limits.empty(), std::memory_order_release);
+}
+
+std::shared_ptr<KeyFilter const> Session::LimitOf(TicketAddress address) const
+{
+    if (!m_limited.load(std::memory_order_acquire))
+        return nullptr;
+    std::lock_guard const lock(m_lock);
+    auto const limit = m_limits.find(address);
+    return limit == m_limits.end() ? nullptr : limit->second;
+}
+}  // namespace standin
