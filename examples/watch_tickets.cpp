@@ -12,6 +12,7 @@
 #include <mutex>
 #include <string>
 #include <thread>
+#include <unistd.h>
 #include <wx/cmdline.h>
 #include <wx/datetime.h>
 #include <wx/init.h>
@@ -111,7 +112,7 @@ public:
                     ValueOf(data).c_str());
         std::fflush(stdout);
         if (m_limit != 0 && ++m_printed == m_limit)
-            std::raise(SIGTERM);  // as if somebody had pressed Ctrl-C
+            kill(getpid(), SIGTERM);  // as if somebody had ended it from outside
     }
 
 private:
