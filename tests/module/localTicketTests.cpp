@@ -4,7 +4,7 @@
 
 #include "comgui/ticket/BIN_STRING.h"
 #include "comgui/ticket/TICKET_OP.h"
-#include "tests/support/TicketContract.h"
+#include "tests/support/ContainerContract.h"
 #include <climits>
 #include <cmath>
 #include <csignal>
@@ -97,7 +97,7 @@ std::unique_ptr<CONTAINER_SUBJECT> New()
 }
 }  // namespace
 
-INSTANTIATE_TEST_SUITE_P(SingleTickets, TicketContract,
+INSTANTIATE_TEST_SUITE_P(SingleTickets, ContainerContract,
                          testing::Values(CONTAINER_MAKER{"InMemory", New<false>},
                                          CONTAINER_MAKER{"InAFile", New<true>}),
                          [](auto const& maker) { return std::string(maker.param.name); });
