@@ -443,9 +443,9 @@ TEST_F(SqliteStorageFile, RandomChanges_EqualAPlainMap)
 TEST_F(SqliteStorageFile, ManyTickets_AreListedAndReadQuickly)
 {
     int const count = IsSanitized ? 1000 : 5000;
-    std::vector<std::string> keys;
-    for (int i = 0; i < 50; ++i)
-        keys.push_back("Job/Some/Parameter/" + std::to_string(i));
+    std::vector<std::string> keys(50);
+    for (std::size_t i = 0; i < keys.size(); ++i)
+        keys[i] = "Job/Some/Parameter/" + std::to_string(i);
     std::vector<Change> changes;
     for (int id = 0; id < count; ++id)
     {
@@ -632,10 +632,10 @@ TEST_F(SqliteStorageFile, KilledAtAnyInstant_KeepsAcknowledgedChangesWhole)
                 SqliteStorage storage(File(), [] { return StorageContent{{Create(Job)}, {}}; });
                 for (std::int64_t number = last + 1;; ++number)
                 {
-                    std::vector<Change> changes;
-                    for (std::string const& key : keys)
-                        changes.push_back(Put(Job, key, 0, Integer(PARAM_INT64, number)));
-                    storage.Apply(changes);
+                    StoredValue const value = Integer(PARAM_INT64, number);
+                    storage.Apply({Put(Job, keys[0], 0, value), Put(Job, keys[1], 0, value),
+                                   Put(Job, keys[2], 0, value), Put(Job, keys[3], 0, value),
+                                   Put(Job, keys[4], 0, value)});
                     report(number);
                 }
             });
