@@ -44,6 +44,13 @@ private:
     bool m_reached = false;
     bool m_open = false;
 };
+
+// Stands for whatever a host's callback uses and destroys at its end.
+struct HOST_STATIC
+{
+    ~HOST_STATIC() { gone = true; }
+    static inline std::atomic<bool> gone{false};
+} const hostStatic;
 }  // namespace
 
 class Notifications : public ClientTest
@@ -80,6 +87,7 @@ protected:
 
 using Registering = Notifications;
 using Switching = Notifications;
+using EndsDeathTest = Notifications;
 using Slowness = Notifications;
 using FromTheCallback = Notifications;
 using Ends = Notifications;
@@ -452,6 +460,30 @@ TEST_F(Ends, ANewRegistration_WaitsForTheCallbackOfTheOldOne)
     admin.Register(second);
     EXPECT_EQ(listener.running, 0);
     opener.join();
+}
+
+TEST_F(EndsDeathTest, TheEndOfTheProcess_GoesBeforeTheHostsOwnObjects)
+{
+    GTEST_FLAG_SET(death_test_style, "threadsafe");
+    auto const endWhileOthersWrite = [this]
+    {
+        ASSERT_EQ(admin.Enable(3, 1, admin.Register(listener)), 1);
+        listener.onCall = []
+        {
+            if (HOST_STATIC::gone)
+                std::abort();
+        };
+        std::thread(
+            [this]
+            {
+                for (int value = 0;; ++value)
+                    other.Write(3, 1, "K", value);
+            })
+            .detach();
+        listener.Wait(10);
+        std::exit(0);
+    };
+    EXPECT_EXIT(endWhileOthersWrite(), testing::ExitedWithCode(0), "");
 }
 
 TEST_F(FromTheCallback, EverySlotMayBeUsed)
