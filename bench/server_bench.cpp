@@ -1,6 +1,7 @@
 // A scalar read of the stand-in server with ever more tickets. The working set is the same 64 tickets
-// whatever the number, so what grows is the look-up and not the traffic to main memory; ScalarReadOfAnyTicket reads all
-// of them at random, and shows that traffic. The storage makes up its tickets, so no disk is in the way.
+// whatever the number, so what grows is the look-up and not the traffic to main memory; ScalarReadOfAnyTicket
+// reads all of them at random, and shows that traffic. The storage makes up its tickets, so no disk is in the
+// way.
 #include "standin/server/Password.h"
 #include "standin/server/TicketServer.h"
 #include <benchmark/benchmark.h>

@@ -178,8 +178,8 @@ int GetTicketData(void* hInstance, void* hSession, int type, int id, int format,
 
 int SendCommand(void* hInstance, void* hSession, char const* command, int, void* data)
 {
-    return SessionEntry(hInstance, hSession, [&](Container const& container)
-                        { return RunCommand(container, command, data); });
+    return SessionEntry(hInstance, hSession,
+                        [&](Container const& container) { return RunCommand(container, command, data); });
 }
 
 int TransferFile(void* hInstance, void* hSession, char*, char*) { return NotSupported(hInstance, hSession); }

@@ -57,8 +57,9 @@ public:
 
     // Hands out every value of a ticket, ordered by key (bytewise) and position. What is handed out lives
     // until the function returns. A ticket that does not exist has no values.
-    virtual void Load(TicketAddress address,
-                      std::function<void(std::string_view key, int pos, StoredValue const& value)> const& take) = 0;
+    virtual void
+    Load(TicketAddress address,
+         std::function<void(std::string_view key, int pos, StoredValue const& value)> const& take) = 0;
 
     // Makes all changes, in order, or none. When it returns they survive the end of the process at any
     // instant.

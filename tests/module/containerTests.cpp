@@ -1,9 +1,9 @@
-// The container contract, kept by the container of a session and by the fake that other tests use in its place;
-// and what is the bundle's own about its containers.
+// The container contract, kept by the container of a session and by the fake that other tests use in its
+// place; and what is the bundle's own about its containers.
 #include "tests/module/ModuleUnderTest.h"
 
-#include "tests/support/ContainerFake.h"
 #include "tests/support/ContainerContract.h"
+#include "tests/support/ContainerFake.h"
 #include <fstream>
 #include <iterator>
 #include <stdexcept>

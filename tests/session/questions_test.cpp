@@ -1,9 +1,9 @@
 // Questions answered from local state.
 #include "comgui/session/ComGUIManager.h"
 
+#include "comgui/foundation/stracpy.h"
 #include "tests/session/FakeModule.h"
 #include <clocale>
-#include <cstring>
 #include <filesystem>
 #include <fstream>
 #include <gmock/gmock.h>
@@ -17,7 +17,10 @@ class Questions : public WithManager
 protected:
     ~Questions() override { EXPECT_THAT(module.calls, testing::IsEmpty()); }  // none asks the plug-in
 
-    static void Put(char (&field)[128], std::string const& text) { std::strcpy(field, text.c_str()); }
+    static void Put(char (&field)[128], std::string const& text)
+    {
+        stracpy(field, text.c_str(), sizeof field);
+    }
 
     TLogin record = {};
 };
