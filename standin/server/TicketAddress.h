@@ -12,7 +12,10 @@ struct TicketAddress
     int id;
 
     friend bool operator==(TicketAddress const&, TicketAddress const&) = default;
-    friend auto operator<=>(TicketAddress const&, TicketAddress const&) = default;
+    friend bool operator<(TicketAddress const& left, TicketAddress const& right)
+    {
+        return left.type != right.type ? left.type < right.type : left.id < right.id;
+    }
 };
 
 inline constexpr TicketAddress SystemTicket{0, 0};

@@ -3,6 +3,9 @@
 #include "comgui/foundation/stracpy.h"
 #include "comgui/host/CEventManager.h"
 #include "comgui/host/ServerNotificationEvent.h"
+#include <csignal>
+#include <thread>
+#include <unistd.h>
 #include <wx/init.h>
 
 namespace
@@ -19,6 +22,7 @@ public:
     {
         std::lock_guard const guard(m_test.m_lock);
         m_test.m_ended = true;
+        m_test.m_threadId = gettid();
         m_test.m_changed.notify_all();
     }
 
@@ -85,6 +89,9 @@ void Receiver::WaitForTheEnd()
     std::unique_lock guard(m_lock);
     m_changed.wait(guard, [this] { return m_ended; });
     m_thread = nullptr;
+    // wxWidgets goes on for a moment behind the thread's end, in data that the end of the program destroys.
+    while (tgkill(getpid(), m_threadId, 0) == 0)
+        std::this_thread::yield();
 }
 
 void Receiver::WaitUntilHandled()

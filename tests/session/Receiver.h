@@ -53,6 +53,7 @@ private:
     int m_markersSeen = 0;
     int m_markersSent = 0;
     bool m_ended = true;
+    int m_threadId = 0;
     THREAD* m_thread = nullptr;
     unsigned long long m_subscription = 0;
 };
