@@ -55,7 +55,7 @@ void* ReceiverThread::Entry()
     static std::string const szLocalEndPoint = m_pManager->GetLocalEndPoint().utf8_string();
 
     NotifData* inHand = nullptr;
-    while (!__atomic_load_n(&m_bStop, __ATOMIC_RELAXED))
+    while (!__atomic_load_n(&m_bStop, __ATOMIC_ACQUIRE))
     {
         wxMilliSleep(PollInterval);
         try
@@ -75,7 +75,8 @@ void* ReceiverThread::Entry()
 
 bool ReceiverThread::ShutDown()
 {
-    __atomic_store_n(&m_bStop, true, __ATOMIC_RELAXED);
+    // Release, and acquire in the loop: the thread deletes itself after it has seen this.
+    __atomic_store_n(&m_bStop, true, __ATOMIC_RELEASE);
     return true;
 }
 

@@ -28,5 +28,5 @@ public:
 
 private:
     ComGUIManager* m_pManager;
-    bool m_bStop = false;  // looked at by two threads, so only by way of relaxed atomics
+    bool m_bStop = false;  // looked at by two threads, so only by way of atomics
 };
