@@ -377,26 +377,6 @@ TEST_F(Switching, OffWhatIsNotOn_Succeeds)
     EXPECT_EQ(admin.Disable(-3, All, id), 1);
 }
 
-TEST_F(Switching, OffPartOfWhatWaits_LeavesTheRest)
-{
-    int const id = admin.Register(listener);
-    ASSERT_TRUE(admin.Enable(7, 1, id) && admin.Enable(3, 1, id, {"A"}) && admin.Enable(3, All, id, {"B"}));
-    GATE gate;
-    listener.onCall = [&] { gate.Pass(); };
-    admin.Write(7, 1, "First", 0);
-    gate.AwaitSomebody();
-    int const number = 7;
-    SETMULTIPAR table[] = {
-        {"A", PARAM_INT, 0, &number, -1, false, {}}, {"B", PARAM_INT, 0, &number, -1, false, {}}, {}};
-    ASSERT_EQ(admin.Access()->MSETMULTIPAR(admin.Access()->Instance, 3, 1, table), 1);
-    admin.Write(3, 1, "A", 8);
-    // It waits for the callback that runs, so somebody else has to let that one go on.
-    std::thread opener([&] { gate.Open(); });
-    EXPECT_EQ(admin.Disable(3, 1, id), 1);
-    opener.join();
-    EXPECT_THAT(CallsUpTo(listener, id), ElementsAre("changed 7/1 First@-1=0", "changed 3/1 B@-1=7"));
-}
-
 TEST_F(Ends, ADisable_WaitsForTheCallbackThatRuns_AndNoneComesAfterIt)
 {
     for (int round = 0; round < 30; ++round)
