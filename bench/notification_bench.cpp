@@ -55,7 +55,7 @@ void CopiesAlone(benchmark::State& state)
         copies.clear();
         state.ResumeTiming();
     }
-    state.SetItemsProcessed(static_cast<std::int64_t>(state.iterations() * Keys));
+    state.SetItemsProcessed(state.iterations() * static_cast<std::int64_t>(Keys));
 }
 
 void CallbackWithATable(benchmark::State& state)
@@ -68,7 +68,7 @@ void CallbackWithATable(benchmark::State& state)
         Drain();
         state.ResumeTiming();
     }
-    state.SetItemsProcessed(static_cast<std::int64_t>(state.iterations() * Keys));
+    state.SetItemsProcessed(state.iterations() * static_cast<std::int64_t>(Keys));
 }
 
 void Append(benchmark::State& state)

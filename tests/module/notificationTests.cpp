@@ -5,6 +5,7 @@
 #include "standin/module/ModuleCodes.h"
 #include <gmock/gmock.h>
 #include <thread>
+#include <utility>
 
 using namespace standin;
 using testing::ElementsAre;
@@ -390,13 +391,14 @@ TEST_F(Ends, ADisable_WaitsForTheCallbackThatRuns_AndNoneComesAfterIt)
             std::this_thread::yield();
             late += over;
         };
+        auto const before = listener.Calls().size();
         std::thread writer(
             [&]
             {
                 for (int step = 0; step < 20; ++step)
                     other.Write(3, 1, "K", step);
             });
-        listener.Wait(static_cast<std::size_t>(listener.Calls().size() + 1));
+        listener.Wait(before + 1);
         EXPECT_EQ(admin.Disable(3, All, id), 1);
         over = true;
         EXPECT_EQ(listener.running, 0);
@@ -500,6 +502,30 @@ TEST_F(FromTheCallback, ADisable_TakesEffectAtOnce)
     gate.Open();
     listener.Wait(1);
     EXPECT_THAT(CallsUpTo(listener, id), ElementsAre("changed 3/1 K@-1=1"));
+}
+
+TEST_F(FromTheCallback, ADisableOfPartOfWhatWaits_LeavesTheRest)
+{
+    int const id = admin.Register(listener);
+    ASSERT_TRUE(admin.Enable(7, 1, id) && admin.Enable(3, 1, id, {"A"}) && admin.Enable(3, All, id, {"B"}));
+    GATE gate;
+    bool isFirst = true;
+    listener.onCall = [&]
+    {
+        gate.Pass();
+        if (std::exchange(isFirst, false))
+        {
+            EXPECT_EQ(admin.Disable(3, 1, id), 1);
+        }
+    };
+    admin.Write(7, 1, "First", 0);
+    int const number = 7;
+    SETMULTIPAR table[] = {
+        {"A", PARAM_INT, 0, &number, -1, false, {}}, {"B", PARAM_INT, 0, &number, -1, false, {}}, {}};
+    ASSERT_EQ(admin.Access()->MSETMULTIPAR(admin.Access()->Instance, 3, 1, table), 1);
+    admin.Write(3, 1, "A", 8);
+    gate.Open();
+    EXPECT_THAT(CallsUpTo(listener, id), ElementsAre("changed 7/1 First@-1=0", "changed 3/1 B@-1=7"));
 }
 
 TEST_F(FromTheCallback, ALogoutOrANewRegistration_DoesNotWaitForItself)
