@@ -34,6 +34,7 @@
 #include "comgui/ticket/MultiParList.h"
 #include "comgui/ticket/MultiParameter.h"
 #include "comgui/ticket/PARAM_TYPE.h"
+#include "comgui/ticket/PARTIAL_MODE.h"
 #include "comgui/ticket/SETMULTIPAR.h"
 #include "comgui/ticket/SETMULTIPAR_LIST.h"
 #include "comgui/ticket/STICKET_ACCESS.h"

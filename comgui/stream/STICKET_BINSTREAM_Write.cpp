@@ -8,9 +8,6 @@ using namespace comgui::detail;
 
 namespace
 {
-constexpr char const* WholeTicket = "";  // prefix and limit of a walk
-constexpr int WalkLimit = 8000;
-
 // Eight bytes a step: the lowest byte that differs is the first, as the target is little-endian.
 unsigned long SharedBytes(char const* left, char const* right, unsigned long limit)
 {
@@ -262,8 +259,7 @@ STICKET_BINSTREAM::WRITE Written(SETMULTIPAR* table, unsigned long reserve)
 STICKET_BINSTREAM::WRITE Written(STICKET_ACCESS const* ticket, unsigned long reserve)
 {
     STICKET_BINSTREAM::WRITE writer(reserve);
-    ticket->SWALKPARAMETERS(ticket->Instance, STICKET_BINSTREAM::ExportAction, &writer, WholeTicket,
-                            WalkLimit);
+    Walk(ticket, STICKET_BINSTREAM::ExportAction, &writer);
     return writer;
 }
 
