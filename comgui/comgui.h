@@ -25,6 +25,7 @@
 #include "comgui/session/ReceiverThread.h"
 #include "comgui/session/STicketFactory.h"
 #include "comgui/session/TLogin.h"
+#include "comgui/stream/MTICKET_BINSTREAM.h"
 #include "comgui/stream/STICKET_BINSTREAM.h"
 #include "comgui/ticket/BIN_STRING.h"
 #include "comgui/ticket/BIN_STRING_BUFFER.h"
