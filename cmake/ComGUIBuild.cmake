@@ -24,6 +24,10 @@ if(COMGUI_SANITIZE)
     add_link_options(-fsanitize=${COMGUI_SANITIZE})
 endif()
 
+if(COMGUI_FUZZ)
+    add_compile_options(-fsanitize=fuzzer-no-link)    # the library tells the fuzzer which way an input takes
+endif()
+
 # The warnings are the tree's own matter: whoever links an installed target does not get them.
 function(comgui_own_target target)
     target_link_libraries(${target} PRIVATE $<BUILD_INTERFACE:comgui_warnings>)

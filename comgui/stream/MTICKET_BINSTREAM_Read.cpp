@@ -129,10 +129,10 @@ MTICKET_BINSTREAM::eGetTicketResult MTICKET_BINSTREAM::Read::ParseOperation(int&
         GetInt(code);
         GetInt(size);
         if (!Fits(size, left))
-            throw GET_TICKET_ERROR;
+            throw eGetTicketResult(GET_TICKET_ERROR);
         op = operation = Accepted(code);
         if (op.GetInt() == STICKET_OP_INVALID)
-            throw GET_TICKET_ERROR;
+            throw eGetTicketResult(GET_TICKET_ERROR);
         SkipPayload(size);
         return GET_TICKET_OK;
     }
@@ -201,7 +201,7 @@ MTICKET_BINSTREAM::eGetTicketResult MTICKET_BINSTREAM::Read::GetPartialTable(cha
 void MTICKET_BINSTREAM::Read::GetInt(int& value)
 {
     if (cursor == nullptr || left < sizeof(std::uint32_t))
-        throw GET_TICKET_ERROR;
+        throw eGetTicketResult(GET_TICKET_ERROR);
     auto const* const bytes = static_cast<unsigned char const*>(cursor);
     value = static_cast<int>(GetBytes<std::uint32_t>(bytes));
     cursor = bytes + sizeof(std::uint32_t);
