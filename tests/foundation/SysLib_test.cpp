@@ -159,6 +159,7 @@ TEST(MUTEX_LOCK, ManyThreads_EnterOneByOneAndFindTheirOwnCount)
         }
     };
     std::vector<std::thread> threads;
+    threads.reserve(4);
     for (int i = 0; i < 4; ++i)
         threads.emplace_back(work);
     for (std::thread& thread : threads)
