@@ -96,7 +96,7 @@ public:
         if (m_last && KIND::Same(*m_last, value))
             return *m_last;
         HASH const hash = KIND::Hash(value, Seed());
-        if (m_count >= m_slotCount / 2)
+        if (m_count == m_limit)
             Grow();
         std::size_t const mask = m_slotCount - 1;
         std::size_t at = hash & mask;
@@ -116,7 +116,7 @@ public:
     {
         m_last = nullptr;
         m_count = 0;
-        m_slotCount = 0;
+        m_slotCount = m_limit = 0;
     }
 
 private:
@@ -156,6 +156,7 @@ private:
         if (m_count > UINT32_MAX / 4)
             throw std::bad_alloc();
         m_slotCount = m_slotCount == 0 ? 16 : m_slotCount * 4;
+        m_limit = static_cast<NUMBER>(m_slotCount / 2);
         std::size_t const size = m_slotCount * sizeof(NUMBER);
         m_slots = static_cast<NUMBER*>(std::memset(m_pool.Take(size, alignof(NUMBER)), FreeSlot, size));
         std::size_t const mask = m_slotCount - 1;
@@ -173,6 +174,7 @@ private:
     std::size_t m_slotCount = 0;  // a power of two, more than twice the entries
     ENTRY* m_blocks[32 - FirstBlockBits];
     NUMBER m_count = 0;
+    NUMBER m_limit = 0;  // how many entries there may be before the slots have to grow
     ENTRY const* m_last = nullptr;
 };
 }  // namespace comgui::detail
