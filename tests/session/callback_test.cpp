@@ -138,7 +138,7 @@ TEST_F(Callback, EnableNotifications_OfATypeOrATicket_SwitchesThemOn)
 {
     login.iGUINotificationID = 5;
     login.hSession = &login;
-    fake.success = 0;  // the slot's result is dropped
+    fake.success = 0;  // a failure of the slot does not show
     EXPECT_EQ(manager.EnableNotifications(&login, 3, keys), 0);
     EXPECT_EQ(manager.EnableNotifications(&login, 3, 7, keys), 0);
     EXPECT_EQ(manager.DisableNotifications(&login, 3), 0);
