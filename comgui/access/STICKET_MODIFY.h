@@ -37,11 +37,16 @@ public:
     // The slot gets a pointer into value, so no other thread may touch that meanwhile.
     COMGUI_EXPORT int SetParameter(char const* key, wxString const& value, int pos) const;
 
-    // UTF-8. Without this form a text literal would be taken for a bool.
-    template <typename Char, typename = std::enable_if_t<std::is_same_v<Char, char>>>
+    // Text literals, UTF-8 or wide as wxT() makes them: without these forms they would be taken for a bool.
+    template <typename Char, std::enable_if_t<std::is_same_v<Char, char>, int> = 0>
     int SetParameter(char const* key, Char const* value, int pos) const
     {
         return Slots().Set(key, PARAM_STRING, value, pos);
+    }
+    template <typename Char, std::enable_if_t<std::is_same_v<Char, wchar_t>, int> = 0>
+    int SetParameter(char const* key, Char const* value, int pos) const
+    {
+        return SetParameter(key, wxString(value), pos);
     }
 
     // Removes one value, or at -1 the key as a whole.

@@ -238,11 +238,16 @@ TEST_F(LocalTicket, Arrays_OfAMissingKey_AreEmpty)
 TEST_F(LocalTicket, Writes_GoToTheirPositionAndGiveTheSlotsResult)
 {
     file.container.success = 6;
-    EXPECT_EQ(manager.SetParameterToLocal(Path, "k", wxString("x")), 6);
+    EXPECT_EQ(manager.SetParameterToLocal(Path, "k", wxString::FromUTF8("Gr\xC3\xBCn")), 6);
     EXPECT_EQ(manager.SetParameterToLocal(Path, "k", wxString("y"), 1), 6);
+    EXPECT_EQ(file.container.Text(0, 0, "k", 0), "Gr\xC3\xBCn");
+    EXPECT_EQ(file.container.Text(0, 0, "k", 1), "y");
     EXPECT_EQ(manager.SetParameterToLocal(Path, "k", 5), 6);
+    EXPECT_EQ(file.container.Int(0, 0, "k"), 5);
     EXPECT_EQ(manager.SetParameterToLocal(Path, "k", 2.5), 6);
+    EXPECT_EQ(file.container.Double(0, 0, "k"), 2.5);
     EXPECT_EQ(manager.DeleteParameterFromLocal(Path, "k", 0), 6);
+    EXPECT_EQ(file.container.Count(0, 0, "k"), 0u);
     EXPECT_THAT(Writes(), ElementsAre(Set(PARAM_STRING, -1), Set(PARAM_STRING, 1), Set(PARAM_INT, -1),
                                       Set(PARAM_DOUBLE, -1), Set(PARAM_NONE, 0)));
 }
