@@ -1,7 +1,6 @@
 // What the callback makes of the plug-in's notifications.
 #include "tests/session/NotificationQueue.h"
 #include "tests/session/ScarceMemory.h"
-#include <gmock/gmock.h>
 #include <new>
 
 namespace
@@ -110,7 +109,8 @@ TEST_F(ParameterChanges, Int_ArrivesAsADoubleWithItsSign)
 TEST_F(ParameterChanges, Double_ArrivesAsItIs)
 {
     SETMULTIPAR table[] = {Record(keyA, PARAM_DOUBLE, &fraction, -1), {}};
-    EXPECT_EQ(One(1, table)->NotifNumber, 2.5);
+    auto const notification = One(1, table);
+    EXPECT_EQ(notification->NotifNumber, 2.5);
 }
 
 TEST_F(ParameterChanges, Text_ArrivesBesideItsKey)
