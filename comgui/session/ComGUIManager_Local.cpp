@@ -1,5 +1,5 @@
-// One-shot operations on ticket files: each call opens the ticket, does one thing and closes it again. What
-// makes a change lasting is the factory's affair.
+// Ticket files, one call at a time: nothing stays open between two of them. When a change reaches the disk is
+// the factory's affair.
 #include "comgui/session/ComGUIManager.h"
 
 #include "comgui/access/STICKET_MODIFY.h"
