@@ -15,27 +15,27 @@ template <HASH Different>
 struct COLLIDING
 {
     using VALUE = int;
-    using STORED = int;
+    using ENTRY = int;
 
     static HASH Hash(int number, HASH) { return static_cast<HASH>(number) % Different; }
-    static bool Same(int stored, int number) { return stored == number; }
-    static int const* Store(POOL& pool, int number)
-    {
-        return new (pool.Take(sizeof number, alignof(int))) int(number);
-    }
+    static HASH HashOf(int number, HASH seed) { return Hash(number, seed); }
+    static bool MayBe(int, HASH) { return true; }
+    static bool Same(int entry, int number) { return entry == number; }
+    static int* Make(void* place, int number, HASH, POOL&) { return new (place) int(number); }
 };
 
 template <typename INDEX>
 void ExpectASetOf(int limit, int count)
 {
-    INDEX index;
+    POOL pool;
+    INDEX index(pool);
     std::mt19937 random(1);
     std::vector<int const*> known(static_cast<std::size_t>(limit));
     std::set<int const*> addresses;
     for (int i = 0; i < count; ++i)
     {
         auto const number = static_cast<std::size_t>(random()) % known.size();
-        int const* const kept = index.Keep(static_cast<int>(number));
+        int const* const kept = &index.Keep(static_cast<int>(number));
         ASSERT_EQ(*kept, static_cast<int>(number));
         if (known[number])
             ASSERT_EQ(kept, known[number]);
@@ -54,11 +54,13 @@ TEST(VALUE_INDEX, ManyValues_AreToldApart) { ExpectASetOf<VALUE_INDEX<COLLIDING<
 
 TEST(VALUE_INDEX, Clear_DropsTheValueThatCameLast)
 {
-    VALUE_INDEX<COLLIDING<7>> index;
+    POOL pool;
+    VALUE_INDEX<COLLIDING<7>> index(pool);
     index.Keep(5);
     index.Clear();
-    EXPECT_EQ(*index.Keep(5), 5);
-    EXPECT_EQ(*index.Keep(6), 6);
+    pool.Clear();
+    EXPECT_EQ(index.Keep(5), 5);
+    EXPECT_EQ(index.Keep(6), 6);
 }
 
 TEST(HashOfBytes, EveryByte_Counts)
