@@ -25,124 +25,150 @@ unsigned long SharedBytes(char const* left, char const* right, unsigned long lim
         ++shared;
     return shared;
 }
+
+// The types that a stream holds, a bit each: no pointers and no counts. Of a null value it holds only that a
+// parameter is deleted, and a text, as the empty one.
+constexpr unsigned int WithValue = 1u << PARAM_INT | 1u << PARAM_DOUBLE | 1u << PARAM_STRING |
+                                   1u << PARAM_BINSTRING | 1u << PARAM_INT64 | 1u << PARAM_UNSIGNED |
+                                   1u << PARAM_UNSIGNED64;
+constexpr unsigned int WithNull = 1u << PARAM_NONE | 1u << PARAM_STRING;
+
+inline bool IsWritable(PARAM_TYPE type, void const* value)
+{
+    auto const bit = static_cast<unsigned int>(type);
+    return bit <= PARAM_UNSIGNED64 && ((value ? WithValue : WithNull) >> bit & 1) != 0;
+}
 }  // namespace
 
-// Adds values to a writer, many in a row: key and position are carried along here, and bytes gathered in a
-// chunk, until Finish() hands all to the writer.
+// Adds the records of a table to a writer. Key and position are carried along here, and bytes gathered in a
+// chunk, until Finish() hands all to the writer. Whatever puts bytes takes the place where they go and
+// returns where they end, which is cheaper to hand around than to keep. Throws if there is no memory, and
+// what the items throw.
 class STICKET_BINSTREAM::WRITE::ENCODER
 {
 public:
-    explicit ENCODER(WRITE& writer) : m_writer(writer), m_chunk(writer.data), m_key(writer.lastKey) {}
-
-    // key and its text must stay until Finish().
-    bool Add(char const* key, PARAM_TYPE type, void const* value, int pos)
+    explicit ENCODER(WRITE& writer)
+        : m_writer(writer), m_chunk(writer.data), m_key(writer.lastKey), m_pos(writer.pos)
     {
-        if (m_writer.failed || !Valid(type, value))
-            return false;
-        return Guarded(
-            [&]
-            {
-                if (m_writer.first)
-                    PutSignature();
-                if (key != m_key.data())
-                    PutKey(key);
-                char* to = m_chunk.Room(2 * MaxItemHeader);
-                if (pos != m_writer.pos)
-                    to = PutPosition(to, m_writer.pos = pos);
-                PutValue(to, type, value);
-                IncPos(m_writer.pos);
-            });
     }
 
-    void Finish()
+    char* Begin() { return m_chunk.Begin(); }
+
+    // Puts the record, or passes it over; with it those that follow without any further word. Leaves record
+    // at the first that is not dealt with. The keys must stay until Finish().
+    char* Put(char* to, SETMULTIPAR*& record)
     {
-        if (!m_writer.failed)
-            Guarded(
-                [&]
-                {
-                    m_chunk.Flush();
-                    if (m_key.data() != m_writer.lastKey.data())
-                        m_writer.lastKey = m_key;
-                });
+        if (!IsWritable(record->type, record->value))
+        {
+            record++->ok = false;
+            return to;
+        }
+        if (m_writer.first)
+            to = PutSignature(to);
+        if (record->key != m_key.data())
+            to = PutKey(to, record->key);
+        if (record->pos != m_pos)
+            to = PutPosition(m_chunk.Room(to, MaxItemHeader), m_pos = record->pos);
+        return PutValue(to, record);
+    }
+
+    void Finish(char* to)
+    {
+        m_chunk.Flush(to);
+        if (m_key.data() != m_writer.lastKey.data())
+            m_writer.lastKey = m_key;
+        m_writer.pos = m_pos;
     }
 
 private:
-    // Whatever is thrown on the way (an overflow, no memory), there is no stream from here on.
-    template <typename F>
-    bool Guarded(F step)
-    {
-        try
-        {
-            step();
-            return true;
-        }
-        catch (...)
-        {
-            m_writer.failed = true;
-            return false;
-        }
-    }
-
-    void PutText(char* to, unsigned char itemClass, void const* bytes, unsigned long size)
-    {
-        m_chunk.End(PutItemTag(to, itemClass, size));
-        m_chunk.Put(bytes, size);
-    }
-
-    void PutSignature()
+    [[gnu::noinline]] char* PutSignature(char* to)
     {
         m_writer.first = false;
-        PutText(m_chunk.Room(MaxItemHeader), ITEM_FULL_KEY, TicketSignature.data(), TicketSignature.size());
+        return PutBytes(to, ITEM_FULL_KEY, TicketSignature);
     }
 
-    void PutKey(std::string_view key)
+    char* PutKey(char* to, std::string_view key)
     {
         unsigned long const shared =
             SharedBytes(m_key.data(), key.data(), std::min(m_key.size(), key.size()));
         bool const isSame = shared == key.size() && shared == m_key.size();
         m_key = key;
         if (isSame)
-            return;
-        char* const to = m_chunk.Room(MaxItemHeader);
-        std::string_view const tail = key.substr(shared);
+            return to;
         if (shared == 0)
-            return PutText(to, ITEM_FULL_KEY, key.data(), key.size());
-        m_chunk.End(PutKeyHeader(to, shared, tail.size()));
-        m_chunk.Put(tail.data(), tail.size());
+            return PutBytes(to, ITEM_FULL_KEY, key);
+        std::string_view const tail = key.substr(shared);
+        return m_chunk.Put(PutKeyHeader(m_chunk.Room(to, MaxItemHeader), shared, tail.size()), tail);
     }
 
-    void PutValue(char* to, PARAM_TYPE type, void const* value)
+    char* PutValue(char* to, SETMULTIPAR*& record)
     {
-        switch (type)
+        switch (record->type)
         {
         case PARAM_INT:
-            return m_chunk.End(PutInteger(to, *static_cast<int const*>(value)));
+            return PutNumbers<int>(to, record, PutInteger);
         case PARAM_DOUBLE:
-            return m_chunk.End(PutOptimizedDouble(to, *static_cast<double const*>(value)));
+            return PutNumbers<double>(to, record, PutOptimizedDouble);
         case PARAM_STRING:
-        {
-            std::string_view const text = value ? static_cast<char const*>(value) : "";
-            return PutText(to, ITEM_STRING, text.data(), text.size());
-        }
+            to = PutBytes(to, ITEM_STRING, record->value ? static_cast<char const*>(record->value) : "");
+            return Done(to, record);
         case PARAM_BINSTRING:
-        {
-            BIN_STRING const& bytes = *static_cast<BIN_STRING const*>(value);
-            return PutText(to, ITEM_BINARY, bytes.data, bytes.valid() ? bytes.size : 0);
-        }
+            to = PutBytes(to, ITEM_BINARY, Bytes(*static_cast<BIN_STRING const*>(record->value)));
+            return Done(to, record);
         case PARAM_INT64:
-            return m_chunk.End(PutInt64(to, *static_cast<long long const*>(value)));
+            return PutNumbers<long long>(to, record, PutInt64);
         case PARAM_UNSIGNED:
-            return m_chunk.End(PutOptimizedDouble(to, *static_cast<unsigned int const*>(value)));
+            return PutNumbers<unsigned int>(to, record, PutOptimizedDouble);
         case PARAM_UNSIGNED64:
-            return m_chunk.End(PutUnsigned64(to, *static_cast<unsigned long long const*>(value)));
-        default:  // PARAM_NONE alone, as all else is not valid
-            return m_chunk.End(PutItemTag(to, ITEM_DELETE, 0));
+            return PutNumbers<unsigned long long>(to, record, PutUnsigned64);
+        default:  // PARAM_NONE alone, as all else is not writable
+            return Done(PutItemTag(m_chunk.Room(to, MaxItemHeader), ITEM_DELETE, 0), record);
         }
+    }
+
+    // A vector: as long as key, type and position are the expected ones, there is nothing to put but numbers.
+    template <typename T, typename F>
+    char* PutNumbers(char* to, SETMULTIPAR*& first, F put)
+    {
+        SETMULTIPAR* record = first;
+        char const* const key = record->key;
+        PARAM_TYPE const type = record->type;
+        int pos = m_pos;
+        do
+        {
+            to = m_chunk.Room(to, MaxItemHeader);
+            to = put(to, *static_cast<T const*>(record->value));
+            record->ok = true;
+            first = ++record;
+            pos = NextPosition(pos);
+        } while (record->key == key && record->type == type && record->pos == pos && record->value);
+        m_pos = pos;
+        return to;
+    }
+
+    char* Done(char* to, SETMULTIPAR*& record)
+    {
+        m_pos = NextPosition(m_pos);
+        record++->ok = true;
+        return to;
+    }
+
+    // Out of line, as its text takes long anyway, and the loop over the records keeps its registers.
+    [[gnu::noinline]] char* PutBytes(char* to, unsigned char itemClass, std::string_view bytes)
+    {
+        to = PutItemTag(m_chunk.Room(to, MaxItemHeader), itemClass, bytes.size());
+        return m_chunk.Put(to, bytes);
+    }
+
+    static std::string_view Bytes(BIN_STRING const& value)
+    {
+        return value.valid() ? std::string_view(static_cast<char const*>(value.data), value.size) : "";
     }
 
     WRITE& m_writer;
     BYTE_CHUNK m_chunk;
     std::string_view m_key;  // the previous one, wherever it stands
+    int m_pos;
 };
 
 STICKET_BINSTREAM::WRITE::WRITE(unsigned long reserve)
@@ -153,20 +179,32 @@ STICKET_BINSTREAM::WRITE::WRITE(unsigned long reserve)
 
 bool STICKET_BINSTREAM::WRITE::SetParameter(char const* key, PARAM_TYPE type, void const* value, int position)
 {
-    ENCODER encoder(*this);
-    bool const isWritten = encoder.Add(key, type, value, position);
-    encoder.Finish();
-    return isWritten && !failed;
+    SETMULTIPAR table[] = {{key, type, 0, value, position, false, {}}, {}};
+    SetMultiParameter(table);
+    return table->ok;
 }
 
 void STICKET_BINSTREAM::WRITE::SetMultiParameter(SETMULTIPAR* table)
 {
     if (table == nullptr)
         return;
-    ENCODER encoder(*this);
-    for (; table->key; ++table)
-        table->ok = encoder.Add(table->key, table->type, table->value, table->pos);
-    encoder.Finish();
+    try
+    {
+        if (!failed && table->key)
+        {
+            ENCODER encoder(*this);
+            char* to = encoder.Begin();
+            while (table->key)
+                to = encoder.Put(to, table);
+            encoder.Finish(to);
+        }
+    }
+    catch (...)  // an overflow, or no memory: there is no stream from here on
+    {
+        failed = true;
+    }
+    for (; table->key; ++table)  // from the one that failed on
+        table->ok = false;
 }
 
 bool STICKET_BINSTREAM::WRITE::SetParameter(STICKET* writer, char const* key, PARAM_TYPE type,
@@ -297,34 +335,11 @@ bool STICKET_BINSTREAM::Write(char const* filename, STICKET_ACCESS const* ticket
     return IntoFile(Written(ticket, reserve), filename);
 }
 
-bool STICKET_BINSTREAM::Valid(PARAM_TYPE type, void const* value)
-{
-    switch (type)
-    {
-    case PARAM_NONE:
-        return value == nullptr;
-    case PARAM_STRING:
-        return true;
-    case PARAM_INT:
-    case PARAM_DOUBLE:
-    case PARAM_BINSTRING:
-    case PARAM_INT64:
-    case PARAM_UNSIGNED:
-    case PARAM_UNSIGNED64:
-        return value != nullptr;
-    default:
-        return false;
-    }
-}
+bool STICKET_BINSTREAM::Valid(PARAM_TYPE type, void const* value) { return IsWritable(type, value); }
 
 unsigned long STICKET_BINSTREAM::strsame(char const* previous, char const* key)
 {
     return SharedBytes(previous, key, std::min(std::strlen(previous), std::strlen(key)));
 }
 
-void STICKET_BINSTREAM::IncPos(int& pos)
-{
-    // Unsigned, as a stream of 2^31 values would overflow.
-    if (pos >= 0)
-        pos = static_cast<int>(static_cast<unsigned int>(pos) + 1);
-}
+void STICKET_BINSTREAM::IncPos(int& pos) { pos = NextPosition(pos); }

@@ -12,19 +12,26 @@ namespace comgui::detail
 struct TEXT
 {
     using VALUE = std::string_view;  // without zero bytes
-    using STORED = char;
+    struct ENTRY
+    {
+        char const* text;
+        std::size_t size;
+        HASH hash;
+    };
 
     static HASH Hash(VALUE text, HASH seed) { return HashOfBytes(text.data(), text.size(), seed); }
-    static bool Same(char const& stored, VALUE text)
+    static HASH HashOf(ENTRY const& entry, HASH) { return entry.hash; }
+    static bool MayBe(ENTRY const& entry, HASH hash) { return entry.hash == hash; }
+    static bool Same(ENTRY const& entry, VALUE text)
     {
-        return std::strncmp(&stored, text.data(), text.size()) == 0 && (&stored)[text.size()] == '\0';
+        return entry.size == text.size() && SameBytes(entry.text, text.data(), text.size());
     }
-    static char const* Store(POOL& pool, VALUE text)
+    static ENTRY* Make(void* place, VALUE text, HASH hash, POOL& pool)
     {
-        char* const place = static_cast<char*>(pool.Take(text.size() + 1, 1));
-        std::memcpy(place, text.data(), text.size());
-        place[text.size()] = '\0';
-        return place;
+        char* const copy = static_cast<char*>(pool.Take(text.size() + 1, 1));
+        std::memcpy(copy, text.data(), text.size());
+        copy[text.size()] = '\0';
+        return new (place) ENTRY{copy, text.size(), hash};
     }
 };
 }  // namespace comgui::detail
@@ -32,18 +39,28 @@ struct TEXT
 class COMGUI_EXPORT STRINGCACHE
 {
 public:
+    STRINGCACHE() : m_texts(m_ownPool) {}
+
+    // Takes all memory from that pool, where it stays when the cache is cleared.
+    explicit STRINGCACHE(comgui::detail::POOL& pool) : m_texts(pool) {}
+
     // Replaces text by the address of the cached copy, and returns that address. Null stays null.
     char const* operator()(char const*& text) { return text = (*this)[text]; }
 
     // The same, with the argument left alone.
-    char const* operator[](char const* text) { return text ? m_texts.Keep(text) : nullptr; }
+    char const* operator[](char const* text) { return text ? m_texts.Keep(text).text : nullptr; }
 
     // The same for bytes that no zero byte need follow. The text ends at the first one within.
-    char const* Keep(std::string_view bytes) { return m_texts.Keep(bytes.substr(0, bytes.find('\0'))); }
+    char const* Keep(std::string_view bytes) { return m_texts.Keep(bytes.substr(0, bytes.find('\0'))).text; }
 
     // Drops all texts; every address given out dies.
-    void clear() { m_texts.Clear(); }
+    void clear()
+    {
+        m_texts.Clear();
+        m_ownPool.Clear();
+    }
 
 private:
+    comgui::detail::POOL m_ownPool;
     comgui::detail::VALUE_INDEX<comgui::detail::TEXT> m_texts;
 };

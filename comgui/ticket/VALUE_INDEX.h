@@ -1,17 +1,22 @@
 // Keeps each distinct value once, at an address that stays until Clear(): what the caches of a
-// SETMULTIPAR_LIST are made of. Nobody sees the order of the values, so they are found by their hash. One
-// thread at a time.
+// SETMULTIPAR_LIST are made of. Nobody sees the order of the values, so they are found by their hash. All
+// memory is the pool's, which several may share. One thread at a time.
 //
 // KIND says what the values are:
-//   VALUE    what is looked for, cheap to copy          STORED   what an address is given out of
-//   Hash(value, seed)      Same(stored, value)          Store(pool, value) -> STORED const*
+//   VALUE                           what is looked for, cheap to copy
+//   ENTRY                           what is kept, and stays where it is; its destructor is not run
+//   Hash(value, seed)               the same for equal values
+//   HashOf(entry, seed)             the same again
+//   MayBe(entry, hash)              false only if the entry's hash is another one
+//   Same(entry, value)
+//   Make(place, value, hash, pool)  the new entry, at that place
 #pragma once
 
 #include "comgui/ticket/POOL.h"
 #include <cstddef>
 #include <cstdint>
 #include <cstring>
-#include <vector>
+#include <new>
 
 namespace comgui::detail
 {
@@ -33,6 +38,16 @@ HASH LoadWord(char const* from)
     WORD word;
     std::memcpy(&word, from, sizeof word);
     return word;
+}
+
+// Texts of one ticket tend to begin alike, so the ends are compared first.
+inline bool SameBytes(char const* left, char const* right, std::size_t size)
+{
+    if (size < 8)
+        return size == 0 || std::memcmp(left, right, size) == 0;
+    std::size_t const end = size - 8;
+    return LoadWord<std::uint64_t>(left + end) == LoadWord<std::uint64_t>(right + end) &&
+           std::memcmp(left, right, end) == 0;
 }
 
 // Sixteen bytes a step; the last step looks at the last bytes, which may overlap those before.
@@ -67,79 +82,99 @@ class VALUE_INDEX
 {
 public:
     using VALUE = typename KIND::VALUE;
-    using STORED = typename KIND::STORED;
+    using ENTRY = typename KIND::ENTRY;
 
-    VALUE_INDEX() = default;
+    // The pool must outlive the index.
+    explicit VALUE_INDEX(POOL& pool) : m_pool(pool) {}
     VALUE_INDEX(VALUE_INDEX const&) = delete;
     VALUE_INDEX& operator=(VALUE_INDEX const&) = delete;
 
-    // The stored value that equals this one, which is stored first if there is none. Throws std::bad_alloc.
-    STORED const* Keep(VALUE value)
+    // The entry of that value, which is made first if there is none. Throws std::bad_alloc.
+    ENTRY const& Keep(VALUE value)
     {
         // Values come in runs: a vector of like values asks for the same one again and again.
         if (m_last && KIND::Same(*m_last, value))
-            return m_last;
+            return *m_last;
         HASH const hash = KIND::Hash(value, Seed());
-        if (m_count >= m_slots.size() / 2)
+        if (m_count == m_limit)
             Grow();
-        SLOT& slot = Find(hash, value);
-        if (!slot.value)
+        std::size_t const mask = m_slotCount - 1;
+        std::size_t at = hash & mask;
+        for (; m_slots[at] != FreeSlot; at = (at + 1) & mask)
         {
-            slot = {hash, KIND::Store(m_pool, value)};
-            ++m_count;
+            ENTRY const& entry = *EntryAt(m_slots[at]);
+            if (KIND::MayBe(entry, hash) && KIND::Same(entry, value))
+                return *(m_last = &entry);
         }
-        return m_last = slot.value;
+        ENTRY const& entry = AddEntry(value, hash);
+        m_slots[at] = m_count;
+        return *(m_last = &entry);
     }
 
-    // Drops all values; every address given out dies.
+    // Forgets all values; every address given out dies. Their memory is the pool's to free.
     void Clear()
     {
         m_last = nullptr;
         m_count = 0;
-        m_slots = std::vector<SLOT>();
-        m_pool.Clear();
+        m_slotCount = m_limit = 0;
     }
 
 private:
-    struct SLOT
-    {
-        HASH hash;
-        STORED const* value;  // null: free
-    };
+    using NUMBER = std::uint32_t;  // entries count from 1, half the size of their addresses
+    static constexpr NUMBER FreeSlot = 0;
+    static constexpr unsigned int FirstBlockBits = 4;
 
     // Differs from run to run, so that no stream can be made in which all values fall together.
     HASH Seed() const { return Mix(reinterpret_cast<std::uintptr_t>(this), 0xD6E8FEB86659FD93); }
 
-    // The slot of that value, or the free one where it belongs.
-    SLOT& Find(HASH hash, VALUE value)
+    // Entries stand in blocks of doubling size, so that none ever moves: the highest bit tells the block.
+    static unsigned int BlockOf(NUMBER place)
     {
-        std::size_t const mask = m_slots.size() - 1;
-        std::size_t at = hash & mask;
-        while (m_slots[at].value && (m_slots[at].hash != hash || !KIND::Same(*m_slots[at].value, value)))
-            at = (at + 1) & mask;
-        return m_slots[at];
+        return 31u - static_cast<unsigned int>(__builtin_clz(place));
+    }
+
+    ENTRY* EntryAt(NUMBER number) const
+    {
+        NUMBER const place = number - 1 + (NUMBER(1) << FirstBlockBits);
+        unsigned int const block = BlockOf(place);
+        return m_blocks[block - FirstBlockBits] + (place - (NUMBER(1) << block));
+    }
+
+    ENTRY const& AddEntry(VALUE value, HASH hash)
+    {
+        NUMBER const place = m_count + (NUMBER(1) << FirstBlockBits);
+        if ((place & (place - 1)) == 0)
+            m_blocks[BlockOf(place) - FirstBlockBits] =
+                static_cast<ENTRY*>(m_pool.Take(place * sizeof(ENTRY), alignof(ENTRY)));
+        ENTRY* const entry = KIND::Make(EntryAt(m_count + 1), value, hash, m_pool);
+        ++m_count;
+        return *entry;
     }
 
     void Grow()
     {
-        std::vector<SLOT> old(m_slots.empty() ? FirstSlots : m_slots.size() * 2, SLOT{});
-        old.swap(m_slots);
-        std::size_t const mask = m_slots.size() - 1;
-        for (SLOT const& slot : old)
-            if (slot.value)
-            {
-                std::size_t at = slot.hash & mask;
-                while (m_slots[at].value)
-                    at = (at + 1) & mask;
-                m_slots[at] = slot;
-            }
+        if (m_count > UINT32_MAX / 4)
+            throw std::bad_alloc();
+        m_slotCount = m_slotCount == 0 ? 16 : m_slotCount * 4;
+        m_limit = static_cast<NUMBER>(m_slotCount / 2);
+        std::size_t const size = m_slotCount * sizeof(NUMBER);
+        m_slots = static_cast<NUMBER*>(std::memset(m_pool.Take(size, alignof(NUMBER)), FreeSlot, size));
+        std::size_t const mask = m_slotCount - 1;
+        for (NUMBER number = 1; number <= m_count; ++number)
+        {
+            std::size_t at = KIND::HashOf(*EntryAt(number), Seed()) & mask;
+            while (m_slots[at] != FreeSlot)
+                at = (at + 1) & mask;
+            m_slots[at] = number;
+        }
     }
 
-    static constexpr std::size_t FirstSlots = 16;  // a power of two, as is every later size
-
-    POOL m_pool;
-    std::vector<SLOT> m_slots;  // at most half full
-    std::size_t m_count = 0;
-    STORED const* m_last = nullptr;
+    POOL& m_pool;
+    NUMBER* m_slots = nullptr;    // the entry whose hash says this place or, if that is taken, one before
+    std::size_t m_slotCount = 0;  // a power of two, more than twice the entries
+    ENTRY* m_blocks[32 - FirstBlockBits];
+    NUMBER m_count = 0;
+    NUMBER m_limit = 0;  // how many entries there may be before the slots have to grow
+    ENTRY const* m_last = nullptr;
 };
 }  // namespace comgui::detail
