@@ -128,21 +128,21 @@ private:
 
     // A vector: as long as key, type and position are the expected ones, there is nothing to put but numbers.
     template <typename T, typename F>
-    char* PutNumbers(char* to, SETMULTIPAR*& first, F put)
+    char* PutNumbers(char* to, SETMULTIPAR*& begin, F put)
     {
-        SETMULTIPAR* record = first;
+        SETMULTIPAR* record = begin;
         char const* const key = record->key;
         PARAM_TYPE const type = record->type;
-        int pos = m_pos;
+        int position = m_pos;
         do
         {
             to = m_chunk.Room(to, MaxItemHeader);
             to = put(to, *static_cast<T const*>(record->value));
             record->ok = true;
-            first = ++record;
-            pos = NextPosition(pos);
-        } while (record->key == key && record->type == type && record->pos == pos && record->value);
-        m_pos = pos;
+            begin = ++record;
+            position = NextPosition(position);
+        } while (record->key == key && record->type == type && record->pos == position && record->value);
+        m_pos = position;
         return to;
     }
 

@@ -97,7 +97,8 @@ inline char* PutItemTag(char* to, unsigned char itemClass, unsigned long size)
     if (size < ShortSizes)
         return PutByte(to, itemClass | bits);
     if (size < MediumSizes)
-        return PutBytes(to, static_cast<std::uint16_t>((itemClass | MediumForm) << 8 | bits));
+        return PutBytes(
+            to, static_cast<std::uint16_t>(static_cast<std::uint32_t>(itemClass | MediumForm) << 8 | bits));
     if (size < LongSizes)
         return PutBytes(to, static_cast<std::uint32_t>(itemClass | LongForm) << 24 | bits);
     throw "Tag size overflow";
