@@ -3,6 +3,7 @@
 #include "comgui/stream/STICKET_BINSTREAM.h"
 #include "comgui/stream/ticket_items.h"
 #include <algorithm>
+#include <exception>
 
 using namespace comgui::detail;
 
@@ -57,16 +58,18 @@ public:
             });
     }
 
-    void Finish()
+    // False if the writing fails only now, with values that Add() took.
+    bool Finish()
     {
-        if (!m_writer.failed)
-            Guarded(
-                [&]
-                {
-                    m_chunk.Flush();
-                    if (m_key.data() != m_writer.lastKey.data())
-                        m_writer.lastKey = m_key;
-                });
+        if (m_writer.failed)
+            return true;
+        return Guarded(
+            [&]
+            {
+                m_chunk.Flush();
+                if (m_key.data() != m_writer.lastKey.data())
+                    m_writer.lastKey = m_key;
+            });
     }
 
 private:
@@ -150,16 +153,22 @@ private:
 
 STICKET_BINSTREAM::WRITE::WRITE(unsigned long reserve)
 {
-    if (reserve != 0)
-        data.reserve(reserve);
+    try
+    {
+        if (reserve != 0)
+            data.reserve(reserve);
+    }
+    catch (std::exception const&)
+    {
+        // Only a hint: the stream may turn out smaller.
+    }
 }
 
 bool STICKET_BINSTREAM::WRITE::SetParameter(char const* key, PARAM_TYPE type, void const* value, int position)
 {
     ENCODER encoder(*this);
     bool const isWritten = encoder.Add(key, type, value, position);
-    encoder.Finish();
-    return isWritten && !failed;
+    return encoder.Finish() && isWritten;
 }
 
 void STICKET_BINSTREAM::WRITE::SetMultiParameter(SETMULTIPAR* table)
@@ -167,9 +176,15 @@ void STICKET_BINSTREAM::WRITE::SetMultiParameter(SETMULTIPAR* table)
     if (table == nullptr)
         return;
     ENCODER encoder(*this);
+    SETMULTIPAR* last = nullptr;  // that was written
     for (; table->key; ++table)
+    {
         table->ok = encoder.Add(table->key, table->type, table->value, table->pos);
-    encoder.Finish();
+        if (table->ok)
+            last = table;
+    }
+    if (!encoder.Finish() && last)
+        last->ok = false;
 }
 
 bool STICKET_BINSTREAM::WRITE::SetParameter(STICKET* writer, char const* key, PARAM_TYPE type,
