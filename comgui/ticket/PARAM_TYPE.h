@@ -35,6 +35,15 @@ enum PARAM_TYPE : int
     PARAM_UNSIGNED64 = 9,  // 64 bits, unsigned
 };
 
+namespace comgui::detail
+{
+// Whether a record of that type holds a parameter: a walk may deliver other records too, to be passed over.
+inline bool IsParameter(PARAM_TYPE type)
+{
+    return type > PARAM_NONE && type <= PARAM_UNSIGNED64 && type != PARAM_COUNT;
+}
+}  // namespace comgui::detail
+
 // The type under which a ticket stores values of T. Exists for void*, int, double, char const*, long long,
 // unsigned int and unsigned long long; any other T does not link.
 template <typename T>

@@ -1,0 +1,291 @@
+#include "comgui/foundation/utf8func.h"
+#include "comgui/stream/STICKET_BINSTREAM.h"
+#include "comgui/stream/ticket_items.h"
+#include "comgui/ticket/SETMULTIPAR_LIST.h"
+#include <algorithm>
+#include <memory>
+#include <new>
+#include <utility>
+
+using namespace comgui::detail;
+
+STICKET_BINSTREAM::IMPORT_INTERN::IMPORT_INTERN(void const* data, unsigned long size)
+    : address(static_cast<unsigned char const*>(data)), left(size)
+{
+}
+
+// The only bounds check of the reader, and the only place that moves the cursor. The size is compared with
+// what is left; a size from the stream is never added to an address first.
+unsigned char const* STICKET_BINSTREAM::IMPORT_INTERN::Take(unsigned long size)
+{
+    if (size > left)
+        throw "Unexpected EOF";
+    left -= size;
+    return std::exchange(address, address + size);
+}
+
+unsigned char STICKET_BINSTREAM::IMPORT_INTERN::GetByte() { return *Take(1); }
+
+void STICKET_BINSTREAM::IMPORT_INTERN::GetShort(short& value)
+{
+    value = static_cast<short>(GetBytes<std::uint16_t>(Take(2)));
+}
+
+void STICKET_BINSTREAM::IMPORT_INTERN::GetInt(int& value)
+{
+    value = static_cast<int>(GetBytes<std::uint32_t>(Take(4)));
+}
+
+void STICKET_BINSTREAM::IMPORT_INTERN::GetFloat(double& value)
+{
+    // The marker in front is not looked at: any byte is good.
+    float const single = std::bit_cast<float>(GetBytes<std::uint32_t>(Take(5) + 1));
+    value = IsNotANumber(single) ? NotADoubleNumber : static_cast<double>(single);
+}
+
+void STICKET_BINSTREAM::IMPORT_INTERN::GetDouble(double& value)
+{
+    value = CastToNotANumber(std::bit_cast<double>(GetBytes<std::uint64_t>(Take(8))));
+}
+
+void STICKET_BINSTREAM::IMPORT_INTERN::GetPoly64(PARAM_TYPE& type, unsigned long long& value)
+{
+    unsigned char const* const bytes = Take(9);
+    type = *bytes == SignedMarker ? PARAM_INT64 : *bytes == UnsignedMarker ? PARAM_UNSIGNED64 : PARAM_NONE;
+    if (type == PARAM_NONE)
+        throw "Unexpected POLY64_";
+    value = GetBytes<std::uint64_t>(bytes + 1);
+}
+
+unsigned char STICKET_BINSTREAM::IMPORT_INTERN::GetTag(unsigned long& size)
+{
+    unsigned char const tag = GetByte();
+    if ((tag & MediumForm) == 0)
+        size = tag & (ShortSizes - 1);
+    else if ((tag & LongForm) == MediumForm)
+        size = (tag & 7ul) << 8 | GetByte();
+    else
+    {
+        unsigned char const* const bytes = Take(3);
+        size = (tag & 7ul) << 24 | static_cast<unsigned long>(bytes[0]) << 16 |
+               GetBytes<std::uint16_t>(bytes + 1);
+    }
+    return tag & ItemClassBits;
+}
+
+void STICKET_BINSTREAM::IMPORT_INTERN::GetString(std::string& value, unsigned long size)
+{
+    unsigned char const* const bytes = Take(size);  // before the copy: a false size must not allocate
+    value.assign(reinterpret_cast<char const*>(bytes), size);
+}
+
+void STICKET_BINSTREAM::IMPORT_INTERN::GetKeyOpt(std::string& key, unsigned long size, bool compressed)
+{
+    key = NextKey(size, compressed);
+}
+
+std::string const& STICKET_BINSTREAM::IMPORT_INTERN::NextKey(unsigned long size, bool compressed)
+{
+    IMPORT_INTERN item(Take(size), size);
+    unsigned long shared = 0;
+    if (compressed)
+        shared = item.GetShared();
+    // A key may claim to share more than there is: it shares all.
+    previousKey.resize(std::min(shared, previousKey.size()));
+    previousKey.append(reinterpret_cast<char const*>(item.address), item.left);
+    return previousKey;
+}
+
+// How many bytes a compressed key shares with the previous one; the cursor covers that key's item alone.
+unsigned long STICKET_BINSTREAM::IMPORT_INTERN::GetShared()
+{
+    if (left == 0)
+        throw "Unexpected EOT 1";
+    unsigned long const first = GetByte();
+    if (first < ByteShares)
+        return first;
+    if (left == 0)
+        throw "Unexpected EOT 2";
+    unsigned long const second = GetByte();
+    if ((first & LongShareBit) == 0)
+        return (first & 0x7F) << 8 | second;
+    if (left < 2)
+        throw "Unexpected EOT 4";
+    return (first & 0x3F) << 24 | second << 16 | GetBytes<std::uint16_t>(Take(2));
+}
+
+// One reading of a stream into a list.
+class STICKET_BINSTREAM::RECORDS
+{
+public:
+    RECORDS(SETMULTIPAR_LIST& list, void const* data, unsigned long size, bool fixPositions)
+        : m_list(list), m_cursor(data, size), m_fixPositions(fixPositions)
+    {
+    }
+
+    // Adds all records of the stream, or throws at its first error. There is at least one byte.
+    void AddAll()
+    {
+        TakeSignature();
+        while (m_cursor.HasData())
+            TakeItem();
+    }
+
+private:
+    void TakeSignature()
+    {
+        unsigned long size;
+        if (m_cursor.GetTag(size) != ITEM_FULL_KEY)
+            throw "Signature not found";
+        TakeKey(size, false);
+        if (m_cursor.previousKey != TicketSignature)
+            throw "Wrong signature";
+    }
+
+    void TakeItem()
+    {
+        unsigned long size;
+        switch (m_cursor.GetTag(size))
+        {
+        case ITEM_FULL_KEY:
+            return TakeKey(size, false);
+        case ITEM_COMPRESSED_KEY:
+            return TakeKey(size, true);
+        case ITEM_NUMBER:
+            return TakeNumber(size);
+        case ITEM_STRING:
+            return Add(PARAM_STRING, m_list.m_stringCache.Keep(TakeText(size)));
+        case ITEM_BINARY:
+            return Add(PARAM_BINSTRING, m_list.m_binCache.Keep(BIN_STRING(m_cursor.Take(size), size)));
+        case ITEM_POSITION:
+            m_pos = static_cast<int>(size) - PositionBias;
+            return;
+        case ITEM_DELETE:
+            m_fixNext = false;  // a delete stands where it says, also behind a key
+            return Add(PARAM_NONE, nullptr);
+        default:
+            throw "Invalid tag";
+        }
+    }
+
+    void TakeKey(unsigned long size, bool compressed)
+    {
+        m_cursor.NextKey(size, compressed);
+        m_cachedKey = nullptr;
+        m_fixNext = m_fixNext || m_fixPositions;
+    }
+
+    void TakeNumber(unsigned long size)
+    {
+        switch (size)
+        {
+        case NUMBER_ZERO:
+            return AddInteger(0);
+        case NUMBER_INT8:
+            return AddInteger(static_cast<signed char>(m_cursor.GetByte()));
+        case NUMBER_INT16:
+            return AddInteger(static_cast<short>(GetBytes<std::uint16_t>(m_cursor.Take(2))));
+        case NUMBER_INT32:
+            return AddInteger(static_cast<int>(GetBytes<std::uint32_t>(m_cursor.Take(4))));
+        case NUMBER_SINGLE:
+            return AddDouble(&IMPORT_INTERN::GetFloat);
+        case NUMBER_DOUBLE:
+            return AddDouble(&IMPORT_INTERN::GetDouble);
+        case NUMBER_INT64:
+            return AddInteger64();
+        default:
+            throw "Invalid number size";
+        }
+    }
+
+    std::string_view TakeText(unsigned long size)
+    {
+        return {reinterpret_cast<char const*>(m_cursor.Take(size)), size};
+    }
+
+    void AddInteger(int value) { Add(PARAM_INT, m_list.m_intCache.Keep(value)); }
+
+    void AddDouble(void (IMPORT_INTERN::*get)(double&))
+    {
+        double value;
+        (m_cursor.*get)(value);
+        Add(PARAM_DOUBLE, m_list.Cached(value));
+    }
+
+    void AddInteger64()
+    {
+        PARAM_TYPE type;
+        unsigned long long value;
+        m_cursor.GetPoly64(type, value);
+        Add(type, m_list.Cached(type, &value));
+    }
+
+    void Add(PARAM_TYPE type, void const* cachedValue)
+    {
+        if (m_cachedKey == nullptr)
+            m_cachedKey = m_list.m_keyCache.Keep(m_cursor.previousKey);
+        m_list.Add(m_cachedKey, type, cachedValue, FixPos(m_fixNext, m_pos));
+    }
+
+    SETMULTIPAR_LIST& m_list;
+    IMPORT_INTERN m_cursor;
+    bool const m_fixPositions;
+    bool m_fixNext = false;  // the next value is the first behind a key whose position is to be fixed
+    int m_pos = -1;
+    char const* m_cachedKey = nullptr;  // the list's copy of the current key, once it was needed
+};
+
+bool STICKET_BINSTREAM::Read(SETMULTIPAR_LIST& list, void const* data, unsigned long size, bool fixPositions)
+{
+    if (size == 0)
+        return true;
+    try
+    {
+        RECORDS(list, data, size, fixPositions).AddAll();
+        return true;
+    }
+    catch (...)  // a broken stream, or no memory: what was read stays in the list
+    {
+        return false;
+    }
+}
+
+bool STICKET_BINSTREAM::Read(STICKET_ACCESS const* ticket, void const* data, unsigned long size,
+                             bool fixPositions)
+{
+    if (ticket == nullptr || ticket->SSETMULTIPAR == nullptr)
+        return false;
+    if (size == 0)
+        return true;
+    SETMULTIPAR_LIST list(false);
+    return Read(list, data, size, fixPositions) &&
+           ticket->SSETMULTIPAR(ticket->Instance, list.Table(false)) != 0;
+}
+
+bool STICKET_BINSTREAM::Read(STICKET_ACCESS const* ticket, char const* filename)
+{
+    FILE* const file = utf8func::fopen(filename, "rb");
+    if (file == nullptr)
+        return false;
+    unsigned long const size = fsize(file);
+    std::unique_ptr<char[]> const bytes(size != 0 ? new (std::nothrow) char[size] : nullptr);
+    if (bytes && std::fread(bytes.get(), 1, size, file) == size)
+        Read(ticket, bytes.get(), size, true);
+    std::fclose(file);
+    return true;  // whatever was in it: a caller learns only whether there is such a file
+}
+
+int STICKET_BINSTREAM::FixPos(bool& fixNext, int& pos)
+{
+    int const here = pos;
+    IncPos(pos);
+    bool const isFixed = std::exchange(fixNext, false) && (here == 0 || here == -2);
+    return isFixed ? -1 : here;
+}
+
+unsigned long STICKET_BINSTREAM::fsize(FILE* file)
+{
+    long const size = std::fseek(file, 0, SEEK_END) == 0 ? std::ftell(file) : -1;
+    std::rewind(file);
+    return size > 0 ? static_cast<unsigned long>(size) : 0;
+}

@@ -1,0 +1,143 @@
+#include "comgui/ticket/SETMULTIPAR_LIST.h"
+
+#include "comgui/foundation/MathLib.h"
+#include "comgui/foundation/number_bits.h"
+#include <algorithm>
+
+SETMULTIPAR_LIST::SETMULTIPAR_LIST(bool copyValues)
+    : m_copyValues(copyValues), m_records(comgui::detail::POOL_ALLOCATOR<SETMULTIPAR>(m_recordPool))
+{
+}
+
+SETMULTIPAR_LIST::~SETMULTIPAR_LIST() { freeTbl(); }
+
+int SETMULTIPAR_LIST::xSetParameter(char const* key, PARAM_TYPE type, void const* value, int pos)
+{
+    return Add(m_keyCache[key], type, Cached(type, value), pos);
+}
+
+int SETMULTIPAR_LIST::ySetParameter(char const* key, PARAM_TYPE type, void const* value, int pos)
+{
+    if (pos == 0)
+        pos = -1;
+    bool const isCopied = m_copyValues || type == PARAM_BINSTRING || type == PARAM_INT;
+    return Add(m_keyCache[key], type, isCopied ? Cached(type, value) : value, pos);
+}
+
+int SETMULTIPAR_LIST::SetParameter(char const* key, int value, int pos)
+{
+    return xSetParameter(key, PARAM_INT, &value, pos);
+}
+
+int SETMULTIPAR_LIST::SetParameter(char const* key, double value, int pos)
+{
+    return xSetParameter(key, PARAM_DOUBLE, &value, pos);
+}
+
+int SETMULTIPAR_LIST::SetParameter(char const* key, std::string const& value, int pos)
+{
+    return xSetParameter(key, PARAM_STRING, value.c_str(), pos);
+}
+
+int SETMULTIPAR_LIST::SetParameter(char const* key, wxString const& value, int pos)
+{
+    return xSetParameter(key, PARAM_STRING, value.utf8_str(), pos);
+}
+
+int SETMULTIPAR_LIST::SetParameter(char const* key, BIN_STRING const& value, int pos)
+{
+    return xSetParameter(key, PARAM_BINSTRING, &value, pos);
+}
+
+int SETMULTIPAR_LIST::DelParameter(char const* key, int pos)
+{
+    return xSetParameter(key, PARAM_NONE, nullptr, pos);
+}
+
+void const* SETMULTIPAR_LIST::Cached(PARAM_TYPE type, void const* value)
+{
+    if (value == nullptr)
+        return nullptr;
+    switch (type)
+    {
+    case PARAM_INT:
+        return m_intCache.Keep(*static_cast<int const*>(value));
+    case PARAM_DOUBLE:
+        return Cached(*static_cast<double const*>(value));
+    case PARAM_STRING:
+        return m_stringCache[static_cast<char const*>(value)];
+    case PARAM_BINSTRING:
+        return m_binCache.Keep(*static_cast<BIN_STRING const*>(value));
+    case PARAM_INT64:
+        return m_int64Cache.Keep(*static_cast<long long const*>(value));
+    case PARAM_UNSIGNED:
+        return m_unsignedCache.Keep(*static_cast<unsigned int const*>(value));
+    case PARAM_UNSIGNED64:
+        return m_unsigned64Cache.Keep(*static_cast<unsigned long long const*>(value));
+    default:
+        return value;
+    }
+}
+
+// All that is no number is one value: a NaN could not be found again.
+void const* SETMULTIPAR_LIST::Cached(double value)
+{
+    if (comgui::detail::IsNotANumber(value))
+        return &MathLib::NOT_A_DOUBLE_NUMBER;
+    return m_doubleCache.Keep(value);
+}
+
+int SETMULTIPAR_LIST::Add(char const* cachedKey, PARAM_TYPE type, void const* value, int pos)
+{
+    m_records.push_back({cachedKey, type, 0, value, pos, false, {}});
+    ++m_count;
+    freeTbl();
+    return 1;
+}
+
+SETMULTIPAR* SETMULTIPAR_LIST::Table(bool sort)
+{
+    if (sort && !m_isSorted)
+        freeTbl();
+    if (m_table == nullptr && m_count != 0)
+    {
+        if (sort)
+        {
+            m_records.sort();
+            m_isSorted = true;
+        }
+        m_table = new SETMULTIPAR[m_count + 1];
+        *std::copy(m_records.begin(), m_records.end(), m_table) = SETMULTIPAR{};
+    }
+    return m_table;
+}
+
+void SETMULTIPAR_LIST::Clear()
+{
+    freeTbl();
+    m_records.clear();
+    m_recordPool.Clear();
+    m_count = 0;
+    m_keyCache.clear();
+    m_intCache.clear();
+    m_unsignedCache.clear();
+    m_int64Cache.clear();
+    m_unsigned64Cache.clear();
+    m_doubleCache.clear();
+    m_stringCache.clear();
+    m_binCache.clear();
+}
+
+void SETMULTIPAR_LIST::freeTbl()
+{
+    delete[] m_table;
+    m_table = nullptr;
+    m_isSorted = false;
+}
+
+bool SETMULTIPAR_LIST::CollectAction(void* list, char const* key, PARAM_TYPE type, void const* value, int pos)
+{
+    if (comgui::detail::IsParameter(type))
+        static_cast<SETMULTIPAR_LIST*>(list)->ySetParameter(key, type, value, pos);
+    return true;
+}

@@ -1,0 +1,46 @@
+// Keeps each distinct number once and gives out its address. 0.0 and -0.0 are one number, the first of them
+// that came. NaN equals nothing, so keep it out. Otherwise as STRINGCACHE.
+#pragma once
+
+#include "comgui/ticket/VALUE_INDEX.h"
+#include <new>
+#include <type_traits>
+
+namespace comgui::detail
+{
+template <typename T>
+struct NUMBER
+{
+    using VALUE = T;
+    using STORED = T;
+
+    static HASH Hash(T number, HASH seed)
+    {
+        if constexpr (std::is_floating_point_v<T>)
+            number += T(0);  // turns -0.0 into 0.0
+        HASH bits = 0;
+        std::memcpy(&bits, &number, sizeof number);
+        return HashOfNumber(bits, seed);
+    }
+    static bool Same(T stored, T number) { return stored == number; }
+    static T const* Store(POOL& pool, T number) { return new (pool.Take(sizeof(T), alignof(T))) T(number); }
+};
+}  // namespace comgui::detail
+
+// T: int, unsigned int, long long, unsigned long long or double.
+template <typename T>
+class VALCACHE
+{
+public:
+    // Replaces number by the address of the cached copy, and returns that address. Null stays null.
+    T const* operator()(T const*& number) { return number ? number = m_numbers.Keep(*number) : nullptr; }
+
+    // The address of the cached copy.
+    T const* Keep(T number) { return m_numbers.Keep(number); }
+
+    // Drops all numbers; every address given out dies.
+    void clear() { m_numbers.Clear(); }
+
+private:
+    comgui::detail::VALUE_INDEX<comgui::detail::NUMBER<T>> m_numbers;
+};
