@@ -34,10 +34,12 @@ public:
     virtual std::size_t Build(SETMULTIPAR* table) = 0;
 };
 
+std::unique_ptr<PEER> MakeComgui();
 std::unique_ptr<PEER> MakeProtobuf();      // a vector is one packed field
 std::unique_ptr<PEER> MakeProtobufEach();  // each value of a vector is a message
 std::unique_ptr<PEER> MakeMsgpack();
 std::unique_ptr<PEER> MakeIpp();
 std::unique_ptr<PEER> MakeCbor();
 
+std::unique_ptr<BUILDER> MakeComguiBuilder();
 std::unique_ptr<BUILDER> MakeProtobufBuilder();
