@@ -18,9 +18,27 @@ void TellRecord(SETMULTIPAR const& record, COMPARISON& comparison)
         return comparison.Text(record.key, record.pos, TextOf(record));
     case PARAM_BINSTRING:
         return comparison.Bytes(record.key, record.pos, BytesOf(record));
+    case PARAM_UNSIGNED:
+        return comparison.Number(record.key, record.pos, ValueOf<unsigned int>(record));
+    case PARAM_INT64:
+        return comparison.Number(record.key, record.pos,
+                                 static_cast<long double>(ValueOf<long long>(record)));
     default:
-        break;  // the streams of these records hold nothing else
+        break;  // none of the workloads holds anything else
     }
+}
+
+void TellList(SETMULTIPAR_LIST& list, COMPARISON& comparison)
+{
+    if (list.Size() != 0)
+        for (SETMULTIPAR const* record = list.Table(false); record->key; ++record)
+            TellRecord(*record, comparison);
+}
+
+void Fill(SETMULTIPAR_LIST& list, SETMULTIPAR const* record)
+{
+    for (; record->key; ++record)
+        list.xSetParameter(record->key, record->type, record->value, record->pos);
 }
 
 class COMGUI : public PEER, public BUILDER
@@ -38,20 +56,25 @@ public:
         return STICKET_BINSTREAM::Read(list, bytes.data(), bytes.size(), false) ? list.Size() : 0;
     }
 
-    std::size_t Build(SETMULTIPAR* table) override
+    std::size_t Build(SETMULTIPAR const* table) override
     {
         SETMULTIPAR_LIST list(false);
-        for (SETMULTIPAR const* record = table; record->key; ++record)
-            list.xSetParameter(record->key, record->type, record->value, record->pos);
+        Fill(list, table);
         return list.Table(false) ? list.Size() : 0;
+    }
+
+    void TellBuilt(SETMULTIPAR const* table, COMPARISON& comparison) override
+    {
+        SETMULTIPAR_LIST list(false);
+        Fill(list, table);
+        TellList(list, comparison);
     }
 
     void Tell(std::string_view bytes, COMPARISON& comparison) override
     {
         SETMULTIPAR_LIST list(false);
-        if (STICKET_BINSTREAM::Read(list, bytes.data(), bytes.size(), false) && list.Size() != 0)
-            for (SETMULTIPAR const* record = list.Table(false); record->key; ++record)
-                TellRecord(*record, comparison);
+        if (STICKET_BINSTREAM::Read(list, bytes.data(), bytes.size(), false))
+            TellList(list, comparison);
     }
 
 private:

@@ -3,11 +3,13 @@
 // 8 bytes, which the client knows how to take. Texts are handed over as constants, which are not copied.
 #include "peer.h"
 
+#include <algorithm>
 #include <climits>
 #include <cstring>
 #include <cups/ipp.h>
 #include <string>
 #include <sys/types.h>
+#include <utility>
 
 namespace
 {

@@ -31,7 +31,10 @@ public:
     virtual ~BUILDER() = default;
 
     // Builds a message from the records and destroys it. Gives the number of entries.
-    virtual std::size_t Build(SETMULTIPAR* table) = 0;
+    virtual std::size_t Build(SETMULTIPAR const* table) = 0;
+
+    // Builds one and tells each of its values to comparison.
+    virtual void TellBuilt(SETMULTIPAR const* table, COMPARISON& comparison) = 0;
 };
 
 std::unique_ptr<PEER> MakeComgui();

@@ -1,6 +1,7 @@
-// A keyed, repeated message. Used as it is fastest: each message lives in an arena whose one block is kept
-// from one time to the next and is large enough after the first, and bytes are written to a string that is
-// kept as well.
+// A keyed, repeated message, used as it is fastest in each case. A writer fills one message again and again,
+// which keeps its memory, and writes to a string that is kept as well. A message that is read or built, and
+// destroyed after its use, lives in an arena whose one block is kept and is large enough from the second time
+// on.
 #include "peer.h"
 
 #include "ticket.pb.h"
@@ -25,23 +26,20 @@ public:
         ArenaOptions options;
         options.initial_block = memory.data();
         options.initial_block_size = memory.size();
-        Arena arena(options);
-        std::size_t const result = use(arena);
-        if (arena.SpaceAllocated() > memory.size())
-            wanted = arena.SpaceAllocated() * 2;
+        std::size_t used = 0;
+        std::size_t result = 0;
+        {
+            Arena arena(options);
+            result = use(arena);
+            used = arena.SpaceAllocated();
+        }
+        if (used > memory.size())
+            memory.resize(2 * used);  // for the next one like this
         return result;
-    }
-
-    // Between two messages: makes room for one like the last.
-    void Grow()
-    {
-        if (wanted > memory.size())
-            memory.resize(wanted);
     }
 
 private:
     std::vector<char> memory;
-    std::size_t wanted = 0;
 };
 
 void SetValue(peers::Parameter& parameter, SETMULTIPAR const& record)
@@ -109,7 +107,7 @@ void TellVector(std::string_view key, Values const& values, COMPARISON& comparis
         comparison.Number(key, pos++, value);
 }
 
-void Tell(peers::Parameter const& parameter, COMPARISON& comparison)
+void TellParameter(peers::Parameter const& parameter, COMPARISON& comparison)
 {
     std::string_view const key = parameter.key();
     int const pos = parameter.pos();
@@ -136,6 +134,12 @@ void Tell(peers::Parameter const& parameter, COMPARISON& comparison)
     }
 }
 
+void TellTicket(peers::Ticket const& ticket, COMPARISON& comparison)
+{
+    for (peers::Parameter const& parameter : ticket.parameters())
+        TellParameter(parameter, comparison);
+}
+
 class PROTOBUF : public PEER, public BUILDER
 {
 public:
@@ -143,13 +147,9 @@ public:
 
     std::string_view Write(SETMULTIPAR* table) override
     {
-        WithTicket(
-            [&](peers::Ticket& ticket)
-            {
-                Fill(ticket, table, packed);
-                ticket.SerializeToString(&written);
-                return written.size();
-            });
+        toWrite.Clear();
+        Fill(toWrite, table, packed);
+        toWrite.SerializeToString(&written);
         return written;
     }
 
@@ -158,7 +158,7 @@ public:
         return WithTicket([&](peers::Ticket& ticket) { return Parse(ticket, bytes); });
     }
 
-    std::size_t Build(SETMULTIPAR* table) override
+    std::size_t Build(SETMULTIPAR const* table) override
     {
         return WithTicket(
             [&](peers::Ticket& ticket)
@@ -172,15 +172,20 @@ public:
     {
         peers::Ticket ticket;
         Parse(ticket, bytes);
-        for (peers::Parameter const& parameter : ticket.parameters())
-            ::Tell(parameter, comparison);
+        TellTicket(ticket, comparison);
+    }
+
+    void TellBuilt(SETMULTIPAR const* table, COMPARISON& comparison) override
+    {
+        peers::Ticket ticket;
+        Fill(ticket, table, packed);
+        TellTicket(ticket, comparison);
     }
 
 private:
     template <typename Use>
     std::size_t WithTicket(Use use)
     {
-        block.Grow();
         return block.With([&](Arena& arena) { return use(*Arena::CreateMessage<peers::Ticket>(&arena)); });
     }
 
@@ -193,6 +198,7 @@ private:
 
     bool packed;
     BLOCK block;
+    peers::Ticket toWrite;
     std::string written;
 };
 }  // namespace
