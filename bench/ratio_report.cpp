@@ -17,6 +17,8 @@ double Median(std::vector<double> values)
 class REPORTER : public benchmark::ConsoleReporter
 {
 public:
+    REPORTER() : ConsoleReporter(OO_Tabular) {}  // no colours: the output is often kept in a file
+
     void ReportRuns(std::vector<Run> const& runs) override
     {
         ConsoleReporter::ReportRuns(runs);
