@@ -35,8 +35,8 @@ public:
     // The value of locker that means no thread.
     static pthread_t NO_LOCKER();
 
-    // Hooks for tracing, empty: a program may bring its own. They may be called without the lock, and must
-    // not throw where an instance or a lock ends.
+    // Hooks for tracing, empty here. Logger is called without the lock, too. What they throw where an
+    // instance or a lock ends, ends the process.
     void InitID();
     static void Logger(MUTEX_INSTANCE const& instance, eWHAT what);
 

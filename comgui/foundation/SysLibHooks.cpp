@@ -1,5 +1,5 @@
-// A file of their own for the hooks, so that no compiler sees at the place of a call that they are empty, and
-// the calls remain for a program that brings its own.
+// The hooks stand in a file of their own: a build that traces puts another in its place, and no compiler
+// drops the calls because it sees that they lead to nothing.
 #include "comgui/foundation/SysLib.h"
 
 void SysLib::MUTEX_INSTANCE::InitID() {}

@@ -1,10 +1,12 @@
 // A small buffer in front of a growing string, for many small appends: room is tested once an item instead of
-// once a byte, and the string grows by the chunk.
+// once a byte, and the string grows by the chunk. The place where the next byte goes is the caller's to
+// carry.
 #pragma once
 
 #include <cstddef>
 #include <cstring>
 #include <string>
+#include <string_view>
 
 namespace comgui::detail
 {
@@ -13,41 +15,37 @@ class BYTE_CHUNK
 public:
     explicit BYTE_CHUNK(std::string& data) : m_data(data) {}
 
-    // A place for an item of that many bytes at most, which must be far fewer than a chunk has; End() tells
-    // where it ended.
-    char* Room(std::size_t size)
+    char* Begin() { return m_bytes; }
+
+    // The place to go on at, with room for that many bytes, which must be at most half a chunk.
+    char* Room(char* to, std::size_t size)
     {
-        if (size > static_cast<std::size_t>(m_bytes + sizeof m_bytes - m_end))
-            Flush();
-        return m_end;
+        return size <= static_cast<std::size_t>(m_bytes + sizeof m_bytes - to) ? to : Flush(to);
     }
-    void End(char* end) { m_end = end; }
 
     // Bytes of any number.
-    void Put(void const* bytes, std::size_t size)
+    char* Put(char* to, std::string_view bytes)
     {
-        if (size > sizeof m_bytes / 2)
+        if (bytes.size() > sizeof m_bytes / 2)
         {
-            Flush();
-            m_data.append(static_cast<char const*>(bytes), size);
-            return;
+            to = Flush(to);
+            m_data.append(bytes);
+            return to;
         }
-        char* const place = Room(size);
-        if (size != 0)
-            std::memcpy(place, bytes, size);
-        End(place + size);
+        to = Room(to, bytes.size());
+        std::memcpy(to, bytes.data(), bytes.size());
+        return to + bytes.size();
     }
 
     // Hands on to the string; what is not handed on is lost with the chunk.
-    void Flush()
+    __attribute__((noinline)) char* Flush(char* to)
     {
-        m_data.append(m_bytes, static_cast<std::size_t>(m_end - m_bytes));
-        m_end = m_bytes;
+        m_data.append(m_bytes, static_cast<std::size_t>(to - m_bytes));
+        return m_bytes;
     }
 
 private:
     std::string& m_data;
     char m_bytes[4096];
-    char* m_end = m_bytes;
 };
 }  // namespace comgui::detail

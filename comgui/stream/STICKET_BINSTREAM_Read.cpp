@@ -278,7 +278,7 @@ bool STICKET_BINSTREAM::Read(STICKET_ACCESS const* ticket, char const* filename)
 int STICKET_BINSTREAM::FixPos(bool& fixNext, int& pos)
 {
     int const here = pos;
-    IncPos(pos);
+    pos = NextPosition(pos);
     bool const isFixed = std::exchange(fixNext, false) && (here == 0 || here == -2);
     return isFixed ? -1 : here;
 }

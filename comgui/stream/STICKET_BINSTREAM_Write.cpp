@@ -8,6 +8,9 @@ using namespace comgui::detail;
 
 namespace
 {
+// Calls of what is rarely needed, or takes long anyway, leave the registers of the loop over a table alone.
+#define COMGUI_OUT_OF_LINE __attribute__((noinline))
+
 constexpr char const* WholeTicket = "";  // prefix and limit of a walk
 constexpr int WalkLimit = 8000;
 
@@ -28,124 +31,116 @@ unsigned long SharedBytes(char const* left, char const* right, unsigned long lim
         ++shared;
     return shared;
 }
+
+// The types that a stream holds, a bit each: no pointers and no counts. Of a null value it holds only that a
+// parameter is deleted, and a text, as the empty one.
+constexpr unsigned int WithValue = 1u << PARAM_INT | 1u << PARAM_DOUBLE | 1u << PARAM_STRING |
+                                   1u << PARAM_BINSTRING | 1u << PARAM_INT64 | 1u << PARAM_UNSIGNED |
+                                   1u << PARAM_UNSIGNED64;
+constexpr unsigned int WithNull = 1u << PARAM_NONE | 1u << PARAM_STRING;
+
+inline bool IsWritable(PARAM_TYPE type, void const* value)
+{
+    auto const bit = static_cast<unsigned int>(type);
+    return bit <= PARAM_UNSIGNED64 && ((value ? WithValue : WithNull) >> bit & 1) != 0;
+}
 }  // namespace
 
 // Adds values to a writer, many in a row: key and position are carried along here, and bytes gathered in a
-// chunk, until Finish() hands all to the writer.
+// chunk, until Finish() hands all to the writer. Whatever puts bytes takes the place where they go and
+// returns where they end, which is cheaper to hand around than to keep.
 class STICKET_BINSTREAM::WRITE::ENCODER
 {
 public:
-    explicit ENCODER(WRITE& writer) : m_writer(writer), m_chunk(writer.data), m_key(writer.lastKey) {}
-
-    // key and its text must stay until Finish().
-    bool Add(char const* key, PARAM_TYPE type, void const* value, int pos)
+    explicit ENCODER(WRITE& writer)
+        : m_writer(writer), m_chunk(writer.data), m_key(writer.lastKey), m_pos(writer.pos)
     {
-        if (m_writer.failed || !Valid(type, value))
-            return false;
-        return Guarded(
-            [&]
-            {
-                if (m_writer.first)
-                    PutSignature();
-                if (key != m_key.data())
-                    PutKey(key);
-                char* to = m_chunk.Room(2 * MaxItemHeader);
-                if (pos != m_writer.pos)
-                    to = PutPosition(to, m_writer.pos = pos);
-                PutValue(to, type, value);
-                IncPos(m_writer.pos);
-            });
     }
 
-    void Finish()
+    char* Begin() { return m_chunk.Begin(); }
+
+    // value must be valid for type; key and its text must stay until Finish(). Throws if there is no memory,
+    // and what the items throw.
+    char* Put(char* to, char const* key, PARAM_TYPE type, void const* value, int pos)
     {
-        if (!m_writer.failed)
-            Guarded(
-                [&]
-                {
-                    m_chunk.Flush();
-                    if (m_key.data() != m_writer.lastKey.data())
-                        m_writer.lastKey = m_key;
-                });
+        if (m_writer.first)
+            to = PutSignature(to);
+        if (key != m_key.data())
+            to = PutKey(to, key);
+        to = m_chunk.Room(to, 2 * MaxItemHeader);
+        if (pos != m_pos)
+            to = PutPosition(to, pos);
+        m_pos = NextPosition(pos);
+        return PutValue(to, type, value);
+    }
+
+    void Finish(char* to)
+    {
+        m_chunk.Flush(to);
+        if (m_key.data() != m_writer.lastKey.data())
+            m_writer.lastKey = m_key;
+        m_writer.pos = m_pos;
     }
 
 private:
-    // Whatever is thrown on the way (an overflow, no memory), there is no stream from here on.
-    template <typename F>
-    bool Guarded(F step)
-    {
-        try
-        {
-            step();
-            return true;
-        }
-        catch (...)
-        {
-            m_writer.failed = true;
-            return false;
-        }
-    }
-
-    void PutText(char* to, unsigned char itemClass, void const* bytes, unsigned long size)
-    {
-        m_chunk.End(PutItemTag(to, itemClass, size));
-        m_chunk.Put(bytes, size);
-    }
-
-    void PutSignature()
+    COMGUI_OUT_OF_LINE char* PutSignature(char* to)
     {
         m_writer.first = false;
-        PutText(m_chunk.Room(MaxItemHeader), ITEM_FULL_KEY, TicketSignature.data(), TicketSignature.size());
+        return PutText(to, ITEM_FULL_KEY, TicketSignature);
     }
 
-    void PutKey(std::string_view key)
+    COMGUI_OUT_OF_LINE char* PutText(char* to, unsigned char itemClass, std::string_view text)
+    {
+        to = PutItemTag(m_chunk.Room(to, MaxItemHeader), itemClass, text.size());
+        return m_chunk.Put(to, text);
+    }
+
+    COMGUI_OUT_OF_LINE char* PutKey(char* to, std::string_view key)
     {
         unsigned long const shared =
             SharedBytes(m_key.data(), key.data(), std::min(m_key.size(), key.size()));
         bool const isSame = shared == key.size() && shared == m_key.size();
         m_key = key;
         if (isSame)
-            return;
-        char* const to = m_chunk.Room(MaxItemHeader);
-        std::string_view const tail = key.substr(shared);
+            return to;
         if (shared == 0)
-            return PutText(to, ITEM_FULL_KEY, key.data(), key.size());
-        m_chunk.End(PutKeyHeader(to, shared, tail.size()));
-        m_chunk.Put(tail.data(), tail.size());
+            return PutText(to, ITEM_FULL_KEY, key);
+        std::string_view const tail = key.substr(shared);
+        return m_chunk.Put(PutKeyHeader(m_chunk.Room(to, MaxItemHeader), shared, tail.size()), tail);
     }
 
-    void PutValue(char* to, PARAM_TYPE type, void const* value)
+    char* PutValue(char* to, PARAM_TYPE type, void const* value)
     {
         switch (type)
         {
         case PARAM_INT:
-            return m_chunk.End(PutInteger(to, *static_cast<int const*>(value)));
+            return PutInteger(to, *static_cast<int const*>(value));
         case PARAM_DOUBLE:
-            return m_chunk.End(PutOptimizedDouble(to, *static_cast<double const*>(value)));
+            return PutOptimizedDouble(to, *static_cast<double const*>(value));
         case PARAM_STRING:
-        {
-            std::string_view const text = value ? static_cast<char const*>(value) : "";
-            return PutText(to, ITEM_STRING, text.data(), text.size());
-        }
+            return PutText(to, ITEM_STRING, value ? static_cast<char const*>(value) : "");
         case PARAM_BINSTRING:
-        {
-            BIN_STRING const& bytes = *static_cast<BIN_STRING const*>(value);
-            return PutText(to, ITEM_BINARY, bytes.data, bytes.valid() ? bytes.size : 0);
-        }
+            return PutText(to, ITEM_BINARY, Bytes(*static_cast<BIN_STRING const*>(value)));
         case PARAM_INT64:
-            return m_chunk.End(PutInt64(to, *static_cast<long long const*>(value)));
+            return PutInt64(to, *static_cast<long long const*>(value));
         case PARAM_UNSIGNED:
-            return m_chunk.End(PutOptimizedDouble(to, *static_cast<unsigned int const*>(value)));
+            return PutOptimizedDouble(to, *static_cast<unsigned int const*>(value));
         case PARAM_UNSIGNED64:
-            return m_chunk.End(PutUnsigned64(to, *static_cast<unsigned long long const*>(value)));
+            return PutUnsigned64(to, *static_cast<unsigned long long const*>(value));
         default:  // PARAM_NONE alone, as all else is not valid
-            return m_chunk.End(PutItemTag(to, ITEM_DELETE, 0));
+            return PutItemTag(to, ITEM_DELETE, 0);
         }
+    }
+
+    static std::string_view Bytes(BIN_STRING const& value)
+    {
+        return value.valid() ? std::string_view(static_cast<char const*>(value.data), value.size) : "";
     }
 
     WRITE& m_writer;
     BYTE_CHUNK m_chunk;
     std::string_view m_key;  // the previous one, wherever it stands
+    int m_pos;
 };
 
 STICKET_BINSTREAM::WRITE::WRITE(unsigned long reserve)
@@ -156,20 +151,44 @@ STICKET_BINSTREAM::WRITE::WRITE(unsigned long reserve)
 
 bool STICKET_BINSTREAM::WRITE::SetParameter(char const* key, PARAM_TYPE type, void const* value, int position)
 {
-    ENCODER encoder(*this);
-    bool const isWritten = encoder.Add(key, type, value, position);
-    encoder.Finish();
-    return isWritten && !failed;
+    if (failed || !IsWritable(type, value))
+        return false;
+    try
+    {
+        ENCODER encoder(*this);
+        encoder.Finish(encoder.Put(encoder.Begin(), key, type, value, position));
+        return true;
+    }
+    catch (...)  // an overflow, or no memory: there is no stream from here on
+    {
+        failed = true;
+        return false;
+    }
 }
 
 void STICKET_BINSTREAM::WRITE::SetMultiParameter(SETMULTIPAR* table)
 {
     if (table == nullptr)
         return;
-    ENCODER encoder(*this);
-    for (; table->key; ++table)
-        table->ok = encoder.Add(table->key, table->type, table->value, table->pos);
-    encoder.Finish();
+    try
+    {
+        ENCODER encoder(*this);
+        char* to = encoder.Begin();
+        for (; table->key && !failed; ++table)
+        {
+            bool const isValid = IsWritable(table->type, table->value);
+            if (isValid)
+                to = encoder.Put(to, table->key, table->type, table->value, table->pos);
+            table->ok = isValid;
+        }
+        encoder.Finish(to);
+    }
+    catch (...)
+    {
+        failed = true;
+    }
+    for (; table->key; ++table)  // from the one that failed on
+        table->ok = false;
 }
 
 bool STICKET_BINSTREAM::WRITE::SetParameter(STICKET* writer, char const* key, PARAM_TYPE type,
@@ -301,34 +320,11 @@ bool STICKET_BINSTREAM::Write(char const* filename, STICKET_ACCESS const* ticket
     return IntoFile(Written(ticket, reserve), filename);
 }
 
-bool STICKET_BINSTREAM::Valid(PARAM_TYPE type, void const* value)
-{
-    switch (type)
-    {
-    case PARAM_NONE:
-        return value == nullptr;
-    case PARAM_STRING:
-        return true;
-    case PARAM_INT:
-    case PARAM_DOUBLE:
-    case PARAM_BINSTRING:
-    case PARAM_INT64:
-    case PARAM_UNSIGNED:
-    case PARAM_UNSIGNED64:
-        return value != nullptr;
-    default:
-        return false;
-    }
-}
+bool STICKET_BINSTREAM::Valid(PARAM_TYPE type, void const* value) { return IsWritable(type, value); }
 
 unsigned long STICKET_BINSTREAM::strsame(char const* previous, char const* key)
 {
     return SharedBytes(previous, key, std::min(std::strlen(previous), std::strlen(key)));
 }
 
-void STICKET_BINSTREAM::IncPos(int& pos)
-{
-    // Unsigned, as a stream of 2^31 values would overflow.
-    if (pos >= 0)
-        pos = static_cast<int>(static_cast<unsigned int>(pos) + 1);
-}
+void STICKET_BINSTREAM::IncPos(int& pos) { pos = NextPosition(pos); }

@@ -117,6 +117,13 @@ inline char* PutKeyHeader(char* to, unsigned long shared, unsigned long tailSize
     throw "Key same overflow";
 }
 
+// Where the value behind one at pos is expected: one further, but a negative position stays.
+inline int NextPosition(int pos)
+{
+    // Unsigned, as a stream of 2^31 values would overflow.
+    return pos < 0 ? pos : static_cast<int>(static_cast<unsigned int>(pos) + 1);
+}
+
 // A position below -2 wraps to a size that no tag can hold.
 inline char* PutPosition(char* to, int pos)
 {

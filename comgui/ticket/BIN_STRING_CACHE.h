@@ -11,26 +11,28 @@ namespace comgui::detail
 struct BINARY
 {
     using VALUE = BIN_STRING;  // of size 0 if it is not valid
-    using STORED = BIN_STRING;
+    struct ENTRY
+    {
+        BIN_STRING view;
+        HASH hash;
+    };
 
     static HASH Hash(VALUE value, HASH seed)
     {
         return HashOfBytes(static_cast<char const*>(value.data), value.size, seed);
     }
-    static bool Same(STORED const& stored, VALUE value)
+    static HASH HashOf(ENTRY const& entry, HASH) { return entry.hash; }
+    static bool MayBe(ENTRY const& entry, HASH hash) { return entry.hash == hash; }
+    static bool Same(ENTRY const& entry, VALUE value)
     {
-        return stored.size == value.size &&
-               (value.size == 0 || std::memcmp(stored.data, value.data, value.size) == 0);
+        return entry.view.size == value.size &&
+               (value.size == 0 || std::memcmp(entry.view.data, value.data, value.size) == 0);
     }
-    static STORED const* Store(POOL& pool, VALUE value)
+    static ENTRY* Make(void* place, VALUE value, HASH hash, POOL& pool)
     {
-        BIN_STRING* const stored = new (pool.Take(sizeof(BIN_STRING), alignof(BIN_STRING))) BIN_STRING;
         if (value.size != 0)
-        {
-            stored->data = std::memcpy(pool.Take(value.size, 1), value.data, value.size);
-            stored->size = value.size;
-        }
-        return stored;
+            value.data = std::memcpy(pool.Take(value.size, 1), value.data, value.size);
+        return new (place) ENTRY{value, hash};
     }
 };
 }  // namespace comgui::detail
@@ -42,7 +44,10 @@ public:
     BIN_STRING const* operator()(BIN_STRING const*& value) { return value ? value = Keep(*value) : nullptr; }
 
     // The address of the cached copy.
-    BIN_STRING const* Keep(BIN_STRING value) { return m_values.Keep(value.valid() ? value : BIN_STRING()); }
+    BIN_STRING const* Keep(BIN_STRING value)
+    {
+        return &m_values.Keep(value.valid() ? value : BIN_STRING()).view;
+    }
 
     // Drops all values; every address given out dies.
     void clear() { m_values.Clear(); }

@@ -87,26 +87,18 @@ void const* SETMULTIPAR_LIST::Cached(double value)
     return m_doubleCache.Keep(value);
 }
 
-int SETMULTIPAR_LIST::Add(char const* cachedKey, PARAM_TYPE type, void const* value, int pos)
-{
-    m_records.push_back({cachedKey, type, 0, value, pos, false, {}});
-    ++m_count;
-    freeTbl();
-    return 1;
-}
-
 SETMULTIPAR* SETMULTIPAR_LIST::Table(bool sort)
 {
     if (sort && !m_isSorted)
         freeTbl();
-    if (m_table == nullptr && m_count != 0)
+    if (m_table == nullptr && !m_records.empty())
     {
         if (sort)
         {
             m_records.sort();
             m_isSorted = true;
         }
-        m_table = new SETMULTIPAR[m_count + 1];
+        m_table = new SETMULTIPAR[m_records.size() + 1];
         *std::copy(m_records.begin(), m_records.end(), m_table) = SETMULTIPAR{};
     }
     return m_table;
@@ -117,7 +109,6 @@ void SETMULTIPAR_LIST::Clear()
     freeTbl();
     m_records.clear();
     m_recordPool.Clear();
-    m_count = 0;
     m_keyCache.clear();
     m_intCache.clear();
     m_unsignedCache.clear();

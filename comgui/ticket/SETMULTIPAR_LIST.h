@@ -50,7 +50,7 @@ public:
     int DelParameter(char const* key, int pos);
 
     // Number of records.
-    unsigned long Size() const { return m_count; }
+    unsigned long Size() const { return m_records.size(); }
 
     // The table, null while the list is empty. It belongs to the list and dies at the next add, at Clear()
     // and at the next Table(true) that has to sort. sort: by key, bytewise, records of one key staying in
@@ -80,7 +80,13 @@ private:
 
     COMGUI_LOCAL void const* Cached(PARAM_TYPE type, void const* value);
     COMGUI_LOCAL void const* Cached(double value);
-    COMGUI_LOCAL int Add(char const* cachedKey, PARAM_TYPE type, void const* value, int pos);
+    int Add(char const* cachedKey, PARAM_TYPE type, void const* value, int pos)
+    {
+        m_records.push_back({cachedKey, type, 0, value, pos, false, {}});
+        if (m_table)
+            freeTbl();
+        return 1;
+    }
 
     STRINGCACHE m_keyCache;
     VALCACHE<int> m_intCache;
@@ -90,7 +96,6 @@ private:
     VALCACHE<double> m_doubleCache;
     STRINGCACHE m_stringCache;
     BIN_STRING_CACHE m_binCache;
-    unsigned long m_count = 0;
     bool m_isSorted = false;  // the table was built after sorting
     bool const m_copyValues;
     comgui::detail::POOL m_recordPool;

@@ -12,19 +12,25 @@ namespace comgui::detail
 struct TEXT
 {
     using VALUE = std::string_view;  // without zero bytes
-    using STORED = char;
+    struct ENTRY
+    {
+        char const* text;
+        HASH hash;
+    };
 
     static HASH Hash(VALUE text, HASH seed) { return HashOfBytes(text.data(), text.size(), seed); }
-    static bool Same(char const& stored, VALUE text)
+    static HASH HashOf(ENTRY const& entry, HASH) { return entry.hash; }
+    static bool MayBe(ENTRY const& entry, HASH hash) { return entry.hash == hash; }
+    static bool Same(ENTRY const& entry, VALUE text)
     {
-        return std::strncmp(&stored, text.data(), text.size()) == 0 && (&stored)[text.size()] == '\0';
+        return std::strncmp(entry.text, text.data(), text.size()) == 0 && entry.text[text.size()] == '\0';
     }
-    static char const* Store(POOL& pool, VALUE text)
+    static ENTRY* Make(void* place, VALUE text, HASH hash, POOL& pool)
     {
-        char* const place = static_cast<char*>(pool.Take(text.size() + 1, 1));
-        std::memcpy(place, text.data(), text.size());
-        place[text.size()] = '\0';
-        return place;
+        char* const copy = static_cast<char*>(pool.Take(text.size() + 1, 1));
+        std::memcpy(copy, text.data(), text.size());
+        copy[text.size()] = '\0';
+        return new (place) ENTRY{copy, hash};
     }
 };
 }  // namespace comgui::detail
@@ -36,10 +42,10 @@ public:
     char const* operator()(char const*& text) { return text = (*this)[text]; }
 
     // The same, with the argument left alone.
-    char const* operator[](char const* text) { return text ? m_texts.Keep(text) : nullptr; }
+    char const* operator[](char const* text) { return text ? m_texts.Keep(text).text : nullptr; }
 
     // The same for bytes that no zero byte need follow. The text ends at the first one within.
-    char const* Keep(std::string_view bytes) { return m_texts.Keep(bytes.substr(0, bytes.find('\0'))); }
+    char const* Keep(std::string_view bytes) { return m_texts.Keep(bytes.substr(0, bytes.find('\0'))).text; }
 
     // Drops all texts; every address given out dies.
     void clear() { m_texts.Clear(); }

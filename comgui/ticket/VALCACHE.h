@@ -12,7 +12,7 @@ template <typename T>
 struct NUMBER
 {
     using VALUE = T;
-    using STORED = T;
+    using ENTRY = T;
 
     static HASH Hash(T number, HASH seed)
     {
@@ -22,8 +22,10 @@ struct NUMBER
         std::memcpy(&bits, &number, sizeof number);
         return HashOfNumber(bits, seed);
     }
-    static bool Same(T stored, T number) { return stored == number; }
-    static T const* Store(POOL& pool, T number) { return new (pool.Take(sizeof(T), alignof(T))) T(number); }
+    static HASH HashOf(T number, HASH seed) { return Hash(number, seed); }
+    static bool MayBe(T, HASH) { return true; }  // to compare the numbers themselves is as quick
+    static bool Same(T entry, T number) { return entry == number; }
+    static T* Make(void* place, T number, HASH, POOL&) { return new (place) T(number); }
 };
 }  // namespace comgui::detail
 
@@ -33,10 +35,10 @@ class VALCACHE
 {
 public:
     // Replaces number by the address of the cached copy, and returns that address. Null stays null.
-    T const* operator()(T const*& number) { return number ? number = m_numbers.Keep(*number) : nullptr; }
+    T const* operator()(T const*& number) { return number ? number = Keep(*number) : nullptr; }
 
     // The address of the cached copy.
-    T const* Keep(T number) { return m_numbers.Keep(number); }
+    T const* Keep(T number) { return &m_numbers.Keep(number); }
 
     // Drops all numbers; every address given out dies.
     void clear() { m_numbers.Clear(); }

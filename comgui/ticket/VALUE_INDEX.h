@@ -3,14 +3,20 @@
 // thread at a time.
 //
 // KIND says what the values are:
-//   VALUE    what is looked for, cheap to copy          STORED   what an address is given out of
-//   Hash(value, seed)      Same(stored, value)          Store(pool, value) -> STORED const*
+//   VALUE                           what is looked for, cheap to copy
+//   ENTRY                           what is kept, and stays where it is; its destructor is not run
+//   Hash(value, seed)               the same for equal values
+//   HashOf(entry, seed)             the same again
+//   MayBe(entry, hash)              false only if the entry's hash is another one
+//   Same(entry, value)
+//   Make(place, value, hash, pool)  the new entry, at that place
 #pragma once
 
 #include "comgui/ticket/POOL.h"
 #include <cstddef>
 #include <cstdint>
 #include <cstring>
+#include <new>
 #include <vector>
 
 namespace comgui::detail
@@ -67,28 +73,32 @@ class VALUE_INDEX
 {
 public:
     using VALUE = typename KIND::VALUE;
-    using STORED = typename KIND::STORED;
+    using ENTRY = typename KIND::ENTRY;
 
     VALUE_INDEX() = default;
     VALUE_INDEX(VALUE_INDEX const&) = delete;
     VALUE_INDEX& operator=(VALUE_INDEX const&) = delete;
 
-    // The stored value that equals this one, which is stored first if there is none. Throws std::bad_alloc.
-    STORED const* Keep(VALUE value)
+    // The entry of that value, which is made first if there is none. Throws std::bad_alloc.
+    ENTRY const& Keep(VALUE value)
     {
         // Values come in runs: a vector of like values asks for the same one again and again.
         if (m_last && KIND::Same(*m_last, value))
-            return m_last;
+            return *m_last;
         HASH const hash = KIND::Hash(value, Seed());
         if (m_count >= m_slots.size() / 2)
             Grow();
-        SLOT& slot = Find(hash, value);
-        if (!slot.value)
+        std::size_t const mask = m_slots.size() - 1;
+        std::size_t at = hash & mask;
+        for (; m_slots[at] != FreeSlot; at = (at + 1) & mask)
         {
-            slot = {hash, KIND::Store(m_pool, value)};
-            ++m_count;
+            ENTRY const& entry = *EntryAt(m_slots[at]);
+            if (KIND::MayBe(entry, hash) && KIND::Same(entry, value))
+                return *(m_last = &entry);
         }
-        return m_last = slot.value;
+        ENTRY const& entry = AddEntry(value, hash);
+        m_slots[at] = m_count;
+        return *(m_last = &entry);
     }
 
     // Drops all values; every address given out dies.
@@ -96,50 +106,61 @@ public:
     {
         m_last = nullptr;
         m_count = 0;
-        m_slots = std::vector<SLOT>();
+        m_slots = std::vector<NUMBER>();
         m_pool.Clear();
     }
 
 private:
-    struct SLOT
-    {
-        HASH hash;
-        STORED const* value;  // null: free
-    };
+    using NUMBER = std::uint32_t;  // entries count from 1, half the size of their addresses
+    static constexpr NUMBER FreeSlot = 0;
+    static constexpr unsigned int FirstBlockBits = 4;
 
     // Differs from run to run, so that no stream can be made in which all values fall together.
     HASH Seed() const { return Mix(reinterpret_cast<std::uintptr_t>(this), 0xD6E8FEB86659FD93); }
 
-    // The slot of that value, or the free one where it belongs.
-    SLOT& Find(HASH hash, VALUE value)
+    // Entries stand in blocks of doubling size, so that none ever moves: the highest bit tells the block.
+    static unsigned int BlockOf(NUMBER place)
     {
-        std::size_t const mask = m_slots.size() - 1;
-        std::size_t at = hash & mask;
-        while (m_slots[at].value && (m_slots[at].hash != hash || !KIND::Same(*m_slots[at].value, value)))
-            at = (at + 1) & mask;
-        return m_slots[at];
+        return 31u - static_cast<unsigned int>(__builtin_clz(place));
+    }
+
+    ENTRY* EntryAt(NUMBER number) const
+    {
+        NUMBER const place = number - 1 + (NUMBER(1) << FirstBlockBits);
+        unsigned int const block = BlockOf(place);
+        return m_blocks[block - FirstBlockBits] + (place - (NUMBER(1) << block));
+    }
+
+    ENTRY const& AddEntry(VALUE value, HASH hash)
+    {
+        NUMBER const place = m_count + (NUMBER(1) << FirstBlockBits);
+        if ((place & (place - 1)) == 0)
+            m_blocks[BlockOf(place) - FirstBlockBits] =
+                static_cast<ENTRY*>(m_pool.Take(place * sizeof(ENTRY), alignof(ENTRY)));
+        ENTRY* const entry = KIND::Make(EntryAt(m_count + 1), value, hash, m_pool);
+        ++m_count;
+        return *entry;
     }
 
     void Grow()
     {
-        std::vector<SLOT> old(m_slots.empty() ? FirstSlots : m_slots.size() * 2, SLOT{});
-        old.swap(m_slots);
+        if (m_count > UINT32_MAX / 4)
+            throw std::bad_alloc();
+        m_slots = std::vector<NUMBER>(m_slots.empty() ? 16 : m_slots.size() * 4, FreeSlot);
         std::size_t const mask = m_slots.size() - 1;
-        for (SLOT const& slot : old)
-            if (slot.value)
-            {
-                std::size_t at = slot.hash & mask;
-                while (m_slots[at].value)
-                    at = (at + 1) & mask;
-                m_slots[at] = slot;
-            }
+        for (NUMBER number = 1; number <= m_count; ++number)
+        {
+            std::size_t at = KIND::HashOf(*EntryAt(number), Seed()) & mask;
+            while (m_slots[at] != FreeSlot)
+                at = (at + 1) & mask;
+            m_slots[at] = number;
+        }
     }
 
-    static constexpr std::size_t FirstSlots = 16;  // a power of two, as is every later size
-
     POOL m_pool;
-    std::vector<SLOT> m_slots;  // at most half full
-    std::size_t m_count = 0;
-    STORED const* m_last = nullptr;
+    std::vector<NUMBER> m_slots;  // which entry is where its hash says, or in the next free place; half full
+    ENTRY* m_blocks[32 - FirstBlockBits];
+    NUMBER m_count = 0;
+    ENTRY const* m_last = nullptr;
 };
 }  // namespace comgui::detail
