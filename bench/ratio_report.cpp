@@ -34,7 +34,7 @@ public:
 #ifndef NDEBUG
         std::puts("\nNot an optimised build: these ratios say nothing about the goals.");
 #endif
-        std::puts("\n| measure| measure | ours | peer | ratio | goal | met |\n|---|---|---|---|---|---|");
+        std::puts("\n| measure | ours | peer | ratio | goal | met |\n|---|---|---|---|---|---|");
         for (GOAL const& goal : goals)
             Print(goal);
     }
