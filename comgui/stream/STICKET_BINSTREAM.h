@@ -11,6 +11,7 @@
 #include "comgui/ticket/STICKET_ACCESS.h"
 #include <cstdio>
 #include <string>
+#include <string_view>
 
 class SETMULTIPAR_LIST;
 struct STICKET;  // a WRITE as an opaque handle
@@ -131,7 +132,7 @@ public:
     // The bytes must outlive the cursor.
     IMPORT_INTERN(void const* data, unsigned long size);
 
-    bool HasData() const { return left != 0; }
+    bool HasData() const { return bytes.left != 0; }
 
     unsigned char GetByte();
     void GetShort(short& value);
@@ -152,11 +153,29 @@ public:
 private:
     friend class STICKET_BINSTREAM;
 
-    COMGUI_LOCAL unsigned char const* Take(unsigned long size);
-    COMGUI_LOCAL std::string const& NextKey(unsigned long size, bool compressed);
-    COMGUI_LOCAL unsigned long GetShared();
+    struct BYTES
+    {
+        unsigned char const* address;
+        unsigned long left;
 
-    unsigned char const* address;
-    unsigned long left;
-    std::string previousKey;
+        // The only bounds check of the reader, and the only place that moves the cursor. The size is compared
+        // with what is left; a size from the stream is never added to an address first.
+        unsigned char const* Take(unsigned long size)
+        {
+            if (size > left)
+                throw "Unexpected EOF";
+            left -= size;
+            unsigned char const* const taken = address;
+            address += size;
+            return taken;
+        }
+    };
+
+    COMGUI_LOCAL unsigned char TakeTag(unsigned long& size);
+    COMGUI_LOCAL std::string_view TakeKey(unsigned long size, bool compressed);
+    COMGUI_LOCAL static unsigned long TakeShared(BYTES& item);
+
+    BYTES bytes;
+    std::string previousKey;  // as long as the longest key so far
+    unsigned long previousSize = 0;
 };

@@ -10,108 +10,101 @@
 using namespace comgui::detail;
 
 STICKET_BINSTREAM::IMPORT_INTERN::IMPORT_INTERN(void const* data, unsigned long size)
-    : address(static_cast<unsigned char const*>(data)), left(size)
+    : bytes{static_cast<unsigned char const*>(data), size}
 {
 }
 
-// The only bounds check of the reader, and the only place that moves the cursor. The size is compared with
-// what is left; a size from the stream is never added to an address first.
-unsigned char const* STICKET_BINSTREAM::IMPORT_INTERN::Take(unsigned long size)
-{
-    if (size > left)
-        throw "Unexpected EOF";
-    left -= size;
-    return std::exchange(address, address + size);
-}
-
-unsigned char STICKET_BINSTREAM::IMPORT_INTERN::GetByte() { return *Take(1); }
+unsigned char STICKET_BINSTREAM::IMPORT_INTERN::GetByte() { return *bytes.Take(1); }
 
 void STICKET_BINSTREAM::IMPORT_INTERN::GetShort(short& value)
 {
-    value = static_cast<short>(GetBytes<std::uint16_t>(Take(2)));
+    value = static_cast<short>(GetBytes<std::uint16_t>(bytes.Take(2)));
 }
 
 void STICKET_BINSTREAM::IMPORT_INTERN::GetInt(int& value)
 {
-    value = static_cast<int>(GetBytes<std::uint32_t>(Take(4)));
+    value = static_cast<int>(GetBytes<std::uint32_t>(bytes.Take(4)));
 }
 
 void STICKET_BINSTREAM::IMPORT_INTERN::GetFloat(double& value)
 {
     // The marker in front is not looked at: any byte is good.
-    float const single = std::bit_cast<float>(GetBytes<std::uint32_t>(Take(5) + 1));
+    float const single = std::bit_cast<float>(GetBytes<std::uint32_t>(bytes.Take(5) + 1));
     value = IsNotANumber(single) ? NotADoubleNumber : static_cast<double>(single);
 }
 
 void STICKET_BINSTREAM::IMPORT_INTERN::GetDouble(double& value)
 {
-    value = CastToNotANumber(std::bit_cast<double>(GetBytes<std::uint64_t>(Take(8))));
+    value = CastToNotANumber(std::bit_cast<double>(GetBytes<std::uint64_t>(bytes.Take(8))));
 }
 
 void STICKET_BINSTREAM::IMPORT_INTERN::GetPoly64(PARAM_TYPE& type, unsigned long long& value)
 {
-    unsigned char const* const bytes = Take(9);
-    type = *bytes == SignedMarker ? PARAM_INT64 : *bytes == UnsignedMarker ? PARAM_UNSIGNED64 : PARAM_NONE;
+    unsigned char const* const item = bytes.Take(9);
+    type = *item == SignedMarker ? PARAM_INT64 : *item == UnsignedMarker ? PARAM_UNSIGNED64 : PARAM_NONE;
     if (type == PARAM_NONE)
         throw "Unexpected POLY64_";
-    value = GetBytes<std::uint64_t>(bytes + 1);
+    value = GetBytes<std::uint64_t>(item + 1);
 }
 
-unsigned char STICKET_BINSTREAM::IMPORT_INTERN::GetTag(unsigned long& size)
+unsigned char STICKET_BINSTREAM::IMPORT_INTERN::GetTag(unsigned long& size) { return TakeTag(size); }
+
+inline unsigned char STICKET_BINSTREAM::IMPORT_INTERN::TakeTag(unsigned long& size)
 {
-    unsigned char const tag = GetByte();
+    unsigned char const tag = *bytes.Take(1);
     if ((tag & MediumForm) == 0)
         size = tag & (ShortSizes - 1);
     else if ((tag & LongForm) == MediumForm)
-        size = (tag & 7ul) << 8 | GetByte();
+        size = (tag & 7ul) << 8 | *bytes.Take(1);
     else
     {
-        unsigned char const* const bytes = Take(3);
-        size = (tag & 7ul) << 24 | static_cast<unsigned long>(bytes[0]) << 16 |
-               GetBytes<std::uint16_t>(bytes + 1);
+        unsigned char const* const rest = bytes.Take(3);
+        size =
+            (tag & 7ul) << 24 | static_cast<unsigned long>(rest[0]) << 16 | GetBytes<std::uint16_t>(rest + 1);
     }
     return tag & ItemClassBits;
 }
 
 void STICKET_BINSTREAM::IMPORT_INTERN::GetString(std::string& value, unsigned long size)
 {
-    unsigned char const* const bytes = Take(size);  // before the copy: a false size must not allocate
-    value.assign(reinterpret_cast<char const*>(bytes), size);
+    unsigned char const* const text = bytes.Take(size);  // before the copy: a false size must not allocate
+    value.assign(reinterpret_cast<char const*>(text), size);
 }
 
 void STICKET_BINSTREAM::IMPORT_INTERN::GetKeyOpt(std::string& key, unsigned long size, bool compressed)
 {
-    key = NextKey(size, compressed);
+    key = TakeKey(size, compressed);
 }
 
-std::string const& STICKET_BINSTREAM::IMPORT_INTERN::NextKey(unsigned long size, bool compressed)
+// The key is put together in place, behind what it shares with the previous one.
+std::string_view STICKET_BINSTREAM::IMPORT_INTERN::TakeKey(unsigned long size, bool compressed)
 {
-    IMPORT_INTERN item(Take(size), size);
-    unsigned long shared = 0;
-    if (compressed)
-        shared = item.GetShared();
+    BYTES item{bytes.Take(size), size};
     // A key may claim to share more than there is: it shares all.
-    previousKey.resize(std::min(shared, previousKey.size()));
-    previousKey.append(reinterpret_cast<char const*>(item.address), item.left);
-    return previousKey;
+    unsigned long const shared = compressed ? std::min(TakeShared(item), previousSize) : 0;
+    previousSize = shared + item.left;
+    if (previousSize > previousKey.size())
+        previousKey.resize(std::max(previousSize, 2 * previousKey.size()));
+    std::memcpy(previousKey.data() + shared, item.address, item.left);
+    return {previousKey.data(), previousSize};
 }
 
-// How many bytes a compressed key shares with the previous one; the cursor covers that key's item alone.
-unsigned long STICKET_BINSTREAM::IMPORT_INTERN::GetShared()
+// How many bytes a compressed key shares with the previous one; the item is that key's alone.
+unsigned long STICKET_BINSTREAM::IMPORT_INTERN::TakeShared(BYTES& item)
 {
-    if (left == 0)
+    if (item.left == 0)
         throw "Unexpected EOT 1";
-    unsigned long const first = GetByte();
+    unsigned long const first = *item.Take(1);
     if (first < ByteShares)
         return first;
-    if (left == 0)
+    if (item.left == 0)
         throw "Unexpected EOT 2";
-    unsigned long const second = GetByte();
+    unsigned long const second = *item.Take(1);
     if ((first & LongShareBit) == 0)
         return (first & 0x7F) << 8 | second;
-    if (left < 2)
+    if (item.left < 2)
         throw "Unexpected EOT 4";
-    return (first & 0x3F) << 24 | second << 16 | GetBytes<std::uint16_t>(Take(2));
+    return (first & 0x3F) << 24 | second << 16 | GetBytes<std::uint16_t>(item.Take(2));
 }
 
 // One reading of a stream into a list.
@@ -135,17 +128,17 @@ private:
     void TakeSignature()
     {
         unsigned long size;
-        if (m_cursor.GetTag(size) != ITEM_FULL_KEY)
+        if (m_cursor.TakeTag(size) != ITEM_FULL_KEY)
             throw "Signature not found";
         TakeKey(size, false);
-        if (m_cursor.previousKey != TicketSignature)
+        if (m_key != TicketSignature)
             throw "Wrong signature";
     }
 
     void TakeItem()
     {
         unsigned long size;
-        switch (m_cursor.GetTag(size))
+        switch (m_cursor.TakeTag(size))
         {
         case ITEM_FULL_KEY:
             return TakeKey(size, false);
@@ -154,9 +147,9 @@ private:
         case ITEM_NUMBER:
             return TakeNumber(size);
         case ITEM_STRING:
-            return Add(PARAM_STRING, m_list.m_stringCache.Keep(TakeText(size)));
+            return AddText({reinterpret_cast<char const*>(m_cursor.bytes.Take(size)), size});
         case ITEM_BINARY:
-            return Add(PARAM_BINSTRING, m_list.m_binCache.Keep(BIN_STRING(m_cursor.Take(size), size)));
+            return Add(PARAM_BINSTRING, m_list.m_binCache.Keep(BIN_STRING(m_cursor.bytes.Take(size), size)));
         case ITEM_POSITION:
             m_pos = static_cast<int>(size) - PositionBias;
             return;
@@ -170,9 +163,9 @@ private:
 
     void TakeKey(unsigned long size, bool compressed)
     {
-        m_cursor.NextKey(size, compressed);
+        m_key = m_cursor.TakeKey(size, compressed);
         m_cachedKey = nullptr;
-        m_fixNext = m_fixNext || m_fixPositions;
+        m_fixNext |= m_fixPositions;
     }
 
     void TakeNumber(unsigned long size)
@@ -182,11 +175,11 @@ private:
         case NUMBER_ZERO:
             return AddInteger(0);
         case NUMBER_INT8:
-            return AddInteger(static_cast<signed char>(m_cursor.GetByte()));
+            return AddInteger(static_cast<signed char>(*m_cursor.bytes.Take(1)));
         case NUMBER_INT16:
-            return AddInteger(static_cast<short>(GetBytes<std::uint16_t>(m_cursor.Take(2))));
+            return AddInteger(static_cast<short>(GetBytes<std::uint16_t>(m_cursor.bytes.Take(2))));
         case NUMBER_INT32:
-            return AddInteger(static_cast<int>(GetBytes<std::uint32_t>(m_cursor.Take(4))));
+            return AddInteger(static_cast<int>(GetBytes<std::uint32_t>(m_cursor.bytes.Take(4))));
         case NUMBER_SINGLE:
             return AddDouble(&IMPORT_INTERN::GetFloat);
         case NUMBER_DOUBLE:
@@ -198,10 +191,7 @@ private:
         }
     }
 
-    std::string_view TakeText(unsigned long size)
-    {
-        return {reinterpret_cast<char const*>(m_cursor.Take(size)), size};
-    }
+    void AddText(std::string_view text) { Add(PARAM_STRING, m_list.m_stringCache.Keep(text)); }
 
     void AddInteger(int value) { Add(PARAM_INT, m_list.m_intCache.Keep(value)); }
 
@@ -223,7 +213,7 @@ private:
     void Add(PARAM_TYPE type, void const* cachedValue)
     {
         if (m_cachedKey == nullptr)
-            m_cachedKey = m_list.m_keyCache.Keep(m_cursor.previousKey);
+            m_cachedKey = m_list.m_keyCache.Keep(m_key);
         m_list.Add(m_cachedKey, type, cachedValue, FixPos(m_fixNext, m_pos));
     }
 
@@ -232,6 +222,7 @@ private:
     bool const m_fixPositions;
     bool m_fixNext = false;  // the next value is the first behind a key whose position is to be fixed
     int m_pos = -1;
+    std::string_view m_key;
     char const* m_cachedKey = nullptr;  // the list's copy of the current key, once it was needed
 };
 

@@ -25,8 +25,8 @@ struct BINARY
     static bool MayBe(ENTRY const& entry, HASH hash) { return entry.hash == hash; }
     static bool Same(ENTRY const& entry, VALUE value)
     {
-        return entry.view.size == value.size &&
-               (value.size == 0 || std::memcmp(entry.view.data, value.data, value.size) == 0);
+        return entry.view.size == value.size && SameBytes(static_cast<char const*>(entry.view.data),
+                                                          static_cast<char const*>(value.data), value.size);
     }
     static ENTRY* Make(void* place, VALUE value, HASH hash, POOL& pool)
     {
@@ -40,6 +40,11 @@ struct BINARY
 class BIN_STRING_CACHE
 {
 public:
+    BIN_STRING_CACHE() : m_values(m_ownPool) {}
+
+    // Takes all memory from that pool, where it stays when the cache is cleared.
+    explicit BIN_STRING_CACHE(comgui::detail::POOL& pool) : m_values(pool) {}
+
     // Replaces value by the address of the cached copy, and returns that address. Null stays null.
     BIN_STRING const* operator()(BIN_STRING const*& value) { return value ? value = Keep(*value) : nullptr; }
 
@@ -50,8 +55,13 @@ public:
     }
 
     // Drops all values; every address given out dies.
-    void clear() { m_values.Clear(); }
+    void clear()
+    {
+        m_values.Clear();
+        m_ownPool.Clear();
+    }
 
 private:
+    comgui::detail::POOL m_ownPool;
     comgui::detail::VALUE_INDEX<comgui::detail::BINARY> m_values;
 };

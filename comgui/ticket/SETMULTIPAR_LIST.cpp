@@ -5,7 +5,7 @@
 #include <algorithm>
 
 SETMULTIPAR_LIST::SETMULTIPAR_LIST(bool copyValues)
-    : m_copyValues(copyValues), m_records(comgui::detail::POOL_ALLOCATOR<SETMULTIPAR>(m_recordPool))
+    : m_copyValues(copyValues), m_records(comgui::detail::POOL_ALLOCATOR<SETMULTIPAR>(m_pool))
 {
 }
 
@@ -108,7 +108,6 @@ void SETMULTIPAR_LIST::Clear()
 {
     freeTbl();
     m_records.clear();
-    m_recordPool.Clear();
     m_keyCache.clear();
     m_intCache.clear();
     m_unsignedCache.clear();
@@ -117,6 +116,7 @@ void SETMULTIPAR_LIST::Clear()
     m_doubleCache.clear();
     m_stringCache.clear();
     m_binCache.clear();
+    m_pool.Clear();
 }
 
 void SETMULTIPAR_LIST::freeTbl()

@@ -82,23 +82,27 @@ private:
     COMGUI_LOCAL void const* Cached(double value);
     int Add(char const* cachedKey, PARAM_TYPE type, void const* value, int pos)
     {
-        m_records.push_back({cachedKey, type, 0, value, pos, false, {}});
+        SETMULTIPAR& record = m_records.emplace_back();  // all zero, and filled in where it stands
+        record.key = cachedKey;
+        record.type = type;
+        record.value = value;
+        record.pos = pos;
         if (m_table)
             freeTbl();
         return 1;
     }
 
-    STRINGCACHE m_keyCache;
-    VALCACHE<int> m_intCache;
-    VALCACHE<unsigned int> m_unsignedCache;
-    VALCACHE<long long> m_int64Cache;
-    VALCACHE<unsigned long long> m_unsigned64Cache;
-    VALCACHE<double> m_doubleCache;
-    STRINGCACHE m_stringCache;
-    BIN_STRING_CACHE m_binCache;
+    comgui::detail::POOL m_pool;  // of all that follows, and freed as a whole
+    STRINGCACHE m_keyCache{m_pool};
+    VALCACHE<int> m_intCache{m_pool};
+    VALCACHE<unsigned int> m_unsignedCache{m_pool};
+    VALCACHE<long long> m_int64Cache{m_pool};
+    VALCACHE<unsigned long long> m_unsigned64Cache{m_pool};
+    VALCACHE<double> m_doubleCache{m_pool};
+    STRINGCACHE m_stringCache{m_pool};
+    BIN_STRING_CACHE m_binCache{m_pool};
     bool m_isSorted = false;  // the table was built after sorting
     bool const m_copyValues;
-    comgui::detail::POOL m_recordPool;
     std::list<SETMULTIPAR, comgui::detail::POOL_ALLOCATOR<SETMULTIPAR>> m_records;
     SETMULTIPAR* m_table = nullptr;
 };

@@ -15,6 +15,7 @@ struct TEXT
     struct ENTRY
     {
         char const* text;
+        std::size_t size;
         HASH hash;
     };
 
@@ -23,14 +24,14 @@ struct TEXT
     static bool MayBe(ENTRY const& entry, HASH hash) { return entry.hash == hash; }
     static bool Same(ENTRY const& entry, VALUE text)
     {
-        return std::strncmp(entry.text, text.data(), text.size()) == 0 && entry.text[text.size()] == '\0';
+        return entry.size == text.size() && SameBytes(entry.text, text.data(), text.size());
     }
     static ENTRY* Make(void* place, VALUE text, HASH hash, POOL& pool)
     {
         char* const copy = static_cast<char*>(pool.Take(text.size() + 1, 1));
         std::memcpy(copy, text.data(), text.size());
         copy[text.size()] = '\0';
-        return new (place) ENTRY{copy, hash};
+        return new (place) ENTRY{copy, text.size(), hash};
     }
 };
 }  // namespace comgui::detail
@@ -38,6 +39,11 @@ struct TEXT
 class COMGUI_EXPORT STRINGCACHE
 {
 public:
+    STRINGCACHE() : m_texts(m_ownPool) {}
+
+    // Takes all memory from that pool, where it stays when the cache is cleared.
+    explicit STRINGCACHE(comgui::detail::POOL& pool) : m_texts(pool) {}
+
     // Replaces text by the address of the cached copy, and returns that address. Null stays null.
     char const* operator()(char const*& text) { return text = (*this)[text]; }
 
@@ -48,8 +54,13 @@ public:
     char const* Keep(std::string_view bytes) { return m_texts.Keep(bytes.substr(0, bytes.find('\0'))).text; }
 
     // Drops all texts; every address given out dies.
-    void clear() { m_texts.Clear(); }
+    void clear()
+    {
+        m_texts.Clear();
+        m_ownPool.Clear();
+    }
 
 private:
+    comgui::detail::POOL m_ownPool;
     comgui::detail::VALUE_INDEX<comgui::detail::TEXT> m_texts;
 };

@@ -34,6 +34,11 @@ template <typename T>
 class VALCACHE
 {
 public:
+    VALCACHE() : m_numbers(m_ownPool) {}
+
+    // Takes all memory from that pool, where it stays when the cache is cleared.
+    explicit VALCACHE(comgui::detail::POOL& pool) : m_numbers(pool) {}
+
     // Replaces number by the address of the cached copy, and returns that address. Null stays null.
     T const* operator()(T const*& number) { return number ? number = Keep(*number) : nullptr; }
 
@@ -41,8 +46,13 @@ public:
     T const* Keep(T number) { return &m_numbers.Keep(number); }
 
     // Drops all numbers; every address given out dies.
-    void clear() { m_numbers.Clear(); }
+    void clear()
+    {
+        m_numbers.Clear();
+        m_ownPool.Clear();
+    }
 
 private:
+    comgui::detail::POOL m_ownPool;
     comgui::detail::VALUE_INDEX<comgui::detail::NUMBER<T>> m_numbers;
 };

@@ -1,6 +1,6 @@
 // Keeps each distinct value once, at an address that stays until Clear(): what the caches of a
-// SETMULTIPAR_LIST are made of. Nobody sees the order of the values, so they are found by their hash. One
-// thread at a time.
+// SETMULTIPAR_LIST are made of. Nobody sees the order of the values, so they are found by their hash. All
+// memory is the pool's, which several may share. One thread at a time.
 //
 // KIND says what the values are:
 //   VALUE                           what is looked for, cheap to copy
@@ -17,7 +17,6 @@
 #include <cstdint>
 #include <cstring>
 #include <new>
-#include <vector>
 
 namespace comgui::detail
 {
@@ -39,6 +38,16 @@ HASH LoadWord(char const* from)
     WORD word;
     std::memcpy(&word, from, sizeof word);
     return word;
+}
+
+// Texts of one ticket tend to begin alike, so the ends are compared first.
+inline bool SameBytes(char const* left, char const* right, std::size_t size)
+{
+    if (size < 8)
+        return size == 0 || std::memcmp(left, right, size) == 0;
+    std::size_t const end = size - 8;
+    return LoadWord<std::uint64_t>(left + end) == LoadWord<std::uint64_t>(right + end) &&
+           std::memcmp(left, right, end) == 0;
 }
 
 // Sixteen bytes a step; the last step looks at the last bytes, which may overlap those before.
@@ -75,7 +84,8 @@ public:
     using VALUE = typename KIND::VALUE;
     using ENTRY = typename KIND::ENTRY;
 
-    VALUE_INDEX() = default;
+    // The pool must outlive the index.
+    explicit VALUE_INDEX(POOL& pool) : m_pool(pool) {}
     VALUE_INDEX(VALUE_INDEX const&) = delete;
     VALUE_INDEX& operator=(VALUE_INDEX const&) = delete;
 
@@ -86,9 +96,9 @@ public:
         if (m_last && KIND::Same(*m_last, value))
             return *m_last;
         HASH const hash = KIND::Hash(value, Seed());
-        if (m_count >= m_slots.size() / 2)
+        if (m_count == m_limit)
             Grow();
-        std::size_t const mask = m_slots.size() - 1;
+        std::size_t const mask = m_slotCount - 1;
         std::size_t at = hash & mask;
         for (; m_slots[at] != FreeSlot; at = (at + 1) & mask)
         {
@@ -101,13 +111,12 @@ public:
         return *(m_last = &entry);
     }
 
-    // Drops all values; every address given out dies.
+    // Forgets all values; every address given out dies. Their memory is the pool's to free.
     void Clear()
     {
         m_last = nullptr;
         m_count = 0;
-        m_slots = std::vector<NUMBER>();
-        m_pool.Clear();
+        m_slotCount = m_limit = 0;
     }
 
 private:
@@ -146,8 +155,11 @@ private:
     {
         if (m_count > UINT32_MAX / 4)
             throw std::bad_alloc();
-        m_slots = std::vector<NUMBER>(m_slots.empty() ? 16 : m_slots.size() * 4, FreeSlot);
-        std::size_t const mask = m_slots.size() - 1;
+        m_slotCount = m_slotCount == 0 ? 16 : m_slotCount * 4;
+        m_limit = static_cast<NUMBER>(m_slotCount / 2);
+        std::size_t const size = m_slotCount * sizeof(NUMBER);
+        m_slots = static_cast<NUMBER*>(std::memset(m_pool.Take(size, alignof(NUMBER)), FreeSlot, size));
+        std::size_t const mask = m_slotCount - 1;
         for (NUMBER number = 1; number <= m_count; ++number)
         {
             std::size_t at = KIND::HashOf(*EntryAt(number), Seed()) & mask;
@@ -157,10 +169,12 @@ private:
         }
     }
 
-    POOL m_pool;
-    std::vector<NUMBER> m_slots;  // which entry is where its hash says, or in the next free place; half full
+    POOL& m_pool;
+    NUMBER* m_slots = nullptr;    // the entry whose hash says this place or, if that is taken, one before
+    std::size_t m_slotCount = 0;  // a power of two, more than twice the entries
     ENTRY* m_blocks[32 - FirstBlockBits];
     NUMBER m_count = 0;
+    NUMBER m_limit = 0;  // how many entries there may be before the slots have to grow
     ENTRY const* m_last = nullptr;
 };
 }  // namespace comgui::detail
