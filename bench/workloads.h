@@ -61,12 +61,13 @@ inline SETMULTIPAR const* EndOfKey(SETMULTIPAR const* first)
 
 inline bool IsVector(SETMULTIPAR const& first) { return first.pos >= 0; }
 
-inline std::size_t CountKeys(SETMULTIPAR const* table)
+// The end of each key in turn, for formats that must tell how many keys and values follow: one look at the
+// table for both. ends is to be kept, for its memory.
+inline void FindEnds(SETMULTIPAR const* table, std::vector<SETMULTIPAR const*>& ends)
 {
-    std::size_t keys = 0;
-    for (; table->key; table = EndOfKey(table))
-        ++keys;
-    return keys;
+    ends.clear();
+    while (table->key)
+        ends.push_back(table = EndOfKey(table));
 }
 
 // The value of a record that is known to be of that type.

@@ -135,11 +135,12 @@ public:
     std::string_view Write(SETMULTIPAR* table) override
     {
         encoder.Clear();
-        encoder.Put(cbor_encode_map_start, CountKeys(table));
-        for (SETMULTIPAR const* record = table; record->key;)
+        FindEnds(table, ends);
+        encoder.Put(cbor_encode_map_start, ends.size());
+        SETMULTIPAR const* record = table;
+        for (SETMULTIPAR const* const end : ends)
         {
             encoder.PutBytes(cbor_encode_string_start, record->key);
-            SETMULTIPAR const* const end = EndOfKey(record);
             if (IsVector(*record))
                 encoder.Put(cbor_encode_array_start, static_cast<std::size_t>(end - record));
             for (; record != end; ++record)
@@ -167,6 +168,7 @@ private:
     }
 
     ENCODER encoder;
+    std::vector<SETMULTIPAR const*> ends;
 };
 }  // namespace
 

@@ -1,11 +1,12 @@
 // One map from key to value, a vector as an array; the type of a value is what msgpack itself tells apart
-// (integer, double, text, bytes). Used as it is fastest: the buffer is kept from one Write to the next, and
+// (integer, double, text, bytes). Used as it is fastest: the buffers are kept from one Write to the next, and
 // what was read refers to the bytes instead of copying texts out of them.
 #include "peer.h"
 
 #include <cstdint>
 #include <cstring>
 #include <msgpack.hpp>
+#include <vector>
 
 namespace
 {
@@ -78,11 +79,12 @@ public:
     {
         written.clear();
         PACKER packer(written);
-        packer.pack_map(static_cast<std::uint32_t>(CountKeys(table)));
-        for (SETMULTIPAR const* record = table; record->key;)
+        FindEnds(table, ends);
+        packer.pack_map(static_cast<std::uint32_t>(ends.size()));
+        SETMULTIPAR const* record = table;
+        for (SETMULTIPAR const* const end : ends)
         {
             PackText(packer, record->key);
-            SETMULTIPAR const* const end = EndOfKey(record);
             if (IsVector(*record))
                 packer.pack_array(static_cast<std::uint32_t>(end - record));
             for (; record != end; ++record)
@@ -125,6 +127,7 @@ private:
     }
 
     msgpack::sbuffer written;
+    std::vector<SETMULTIPAR const*> ends;
 };
 }  // namespace
 
