@@ -46,9 +46,10 @@ inline bool IsWritable(PARAM_TYPE type, void const* value)
 }
 }  // namespace
 
-// Adds values to a writer, many in a row: key and position are carried along here, and bytes gathered in a
+// Adds the records of a table to a writer. Key and position are carried along here, and bytes gathered in a
 // chunk, until Finish() hands all to the writer. Whatever puts bytes takes the place where they go and
-// returns where they end, which is cheaper to hand around than to keep.
+// returns where they end, which is cheaper to hand around than to keep. Throws if there is no memory, and
+// what the items throw.
 class STICKET_BINSTREAM::WRITE::ENCODER
 {
 public:
@@ -59,19 +60,22 @@ public:
 
     char* Begin() { return m_chunk.Begin(); }
 
-    // value must be valid for type; key and its text must stay until Finish(). Throws if there is no memory,
-    // and what the items throw.
-    char* Put(char* to, char const* key, PARAM_TYPE type, void const* value, int pos)
+    // Puts the record, or passes it over; with it those that follow without any further word. Leaves record
+    // at the first that is not dealt with. The keys must stay until Finish().
+    char* Put(char* to, SETMULTIPAR*& record)
     {
+        if (!IsWritable(record->type, record->value))
+        {
+            record++->ok = false;
+            return to;
+        }
         if (m_writer.first)
             to = PutSignature(to);
-        if (key != m_key.data())
-            to = PutKey(to, key);
-        to = m_chunk.Room(to, 2 * MaxItemHeader);
-        if (pos != m_pos)
-            to = PutPosition(to, pos);
-        m_pos = NextPosition(pos);
-        return PutValue(to, type, value);
+        if (record->key != m_key.data())
+            to = PutKey(to, record->key);
+        if (record->pos != m_pos)
+            to = PutPosition(m_chunk.Room(to, MaxItemHeader), m_pos = record->pos);
+        return PutValue(to, record);
     }
 
     void Finish(char* to)
@@ -86,16 +90,10 @@ private:
     COMGUI_OUT_OF_LINE char* PutSignature(char* to)
     {
         m_writer.first = false;
-        return PutText(to, ITEM_FULL_KEY, TicketSignature);
+        return PutBytes(to, ITEM_FULL_KEY, TicketSignature);
     }
 
-    COMGUI_OUT_OF_LINE char* PutText(char* to, unsigned char itemClass, std::string_view text)
-    {
-        to = PutItemTag(m_chunk.Room(to, MaxItemHeader), itemClass, text.size());
-        return m_chunk.Put(to, text);
-    }
-
-    COMGUI_OUT_OF_LINE char* PutKey(char* to, std::string_view key)
+    char* PutKey(char* to, std::string_view key)
     {
         unsigned long const shared =
             SharedBytes(m_key.data(), key.data(), std::min(m_key.size(), key.size()));
@@ -104,32 +102,67 @@ private:
         if (isSame)
             return to;
         if (shared == 0)
-            return PutText(to, ITEM_FULL_KEY, key);
+            return PutBytes(to, ITEM_FULL_KEY, key);
         std::string_view const tail = key.substr(shared);
         return m_chunk.Put(PutKeyHeader(m_chunk.Room(to, MaxItemHeader), shared, tail.size()), tail);
     }
 
-    char* PutValue(char* to, PARAM_TYPE type, void const* value)
+    char* PutValue(char* to, SETMULTIPAR*& record)
     {
-        switch (type)
+        switch (record->type)
         {
         case PARAM_INT:
-            return PutInteger(to, *static_cast<int const*>(value));
+            return PutNumbers<int>(to, record, PutInteger);
         case PARAM_DOUBLE:
-            return PutOptimizedDouble(to, *static_cast<double const*>(value));
+            return PutNumbers<double>(to, record, PutOptimizedDouble);
         case PARAM_STRING:
-            return PutText(to, ITEM_STRING, value ? static_cast<char const*>(value) : "");
+            to = PutBytes(to, ITEM_STRING, record->value ? static_cast<char const*>(record->value) : "");
+            return Done(to, record);
         case PARAM_BINSTRING:
-            return PutText(to, ITEM_BINARY, Bytes(*static_cast<BIN_STRING const*>(value)));
+            to = PutBytes(to, ITEM_BINARY, Bytes(*static_cast<BIN_STRING const*>(record->value)));
+            return Done(to, record);
         case PARAM_INT64:
-            return PutInt64(to, *static_cast<long long const*>(value));
+            return PutNumbers<long long>(to, record, PutInt64);
         case PARAM_UNSIGNED:
-            return PutOptimizedDouble(to, *static_cast<unsigned int const*>(value));
+            return PutNumbers<unsigned int>(to, record, PutOptimizedDouble);
         case PARAM_UNSIGNED64:
-            return PutUnsigned64(to, *static_cast<unsigned long long const*>(value));
-        default:  // PARAM_NONE alone, as all else is not valid
-            return PutItemTag(to, ITEM_DELETE, 0);
+            return PutNumbers<unsigned long long>(to, record, PutUnsigned64);
+        default:  // PARAM_NONE alone, as all else is not writable
+            return Done(PutItemTag(m_chunk.Room(to, MaxItemHeader), ITEM_DELETE, 0), record);
         }
+    }
+
+    // A vector: as long as key, type and position are the expected ones, there is nothing to put but numbers.
+    template <typename T, typename F>
+    char* PutNumbers(char* to, SETMULTIPAR*& first, F put)
+    {
+        SETMULTIPAR* record = first;
+        char const* const key = record->key;
+        PARAM_TYPE const type = record->type;
+        int pos = m_pos;
+        do
+        {
+            to = m_chunk.Room(to, MaxItemHeader);
+            to = put(to, *static_cast<T const*>(record->value));
+            record->ok = true;
+            first = ++record;
+            pos = NextPosition(pos);
+        } while (record->key == key && record->type == type && record->pos == pos && record->value);
+        m_pos = pos;
+        return to;
+    }
+
+    char* Done(char* to, SETMULTIPAR*& record)
+    {
+        m_pos = NextPosition(m_pos);
+        record++->ok = true;
+        return to;
+    }
+
+    COMGUI_OUT_OF_LINE char* PutBytes(char* to, unsigned char itemClass, std::string_view bytes)
+    {
+        to = PutItemTag(m_chunk.Room(to, MaxItemHeader), itemClass, bytes.size());
+        return m_chunk.Put(to, bytes);
     }
 
     static std::string_view Bytes(BIN_STRING const& value)
@@ -151,19 +184,9 @@ STICKET_BINSTREAM::WRITE::WRITE(unsigned long reserve)
 
 bool STICKET_BINSTREAM::WRITE::SetParameter(char const* key, PARAM_TYPE type, void const* value, int position)
 {
-    if (failed || !IsWritable(type, value))
-        return false;
-    try
-    {
-        ENCODER encoder(*this);
-        encoder.Finish(encoder.Put(encoder.Begin(), key, type, value, position));
-        return true;
-    }
-    catch (...)  // an overflow, or no memory: there is no stream from here on
-    {
-        failed = true;
-        return false;
-    }
+    SETMULTIPAR table[] = {{key, type, 0, value, position, false, {}}, {}};
+    SetMultiParameter(table);
+    return table->ok;
 }
 
 void STICKET_BINSTREAM::WRITE::SetMultiParameter(SETMULTIPAR* table)
@@ -172,18 +195,16 @@ void STICKET_BINSTREAM::WRITE::SetMultiParameter(SETMULTIPAR* table)
         return;
     try
     {
-        ENCODER encoder(*this);
-        char* to = encoder.Begin();
-        for (; table->key && !failed; ++table)
+        if (!failed && table->key)
         {
-            bool const isValid = IsWritable(table->type, table->value);
-            if (isValid)
-                to = encoder.Put(to, table->key, table->type, table->value, table->pos);
-            table->ok = isValid;
+            ENCODER encoder(*this);
+            char* to = encoder.Begin();
+            while (table->key)
+                to = encoder.Put(to, table);
+            encoder.Finish(to);
         }
-        encoder.Finish(to);
     }
-    catch (...)
+    catch (...)  // an overflow, or no memory: there is no stream from here on
     {
         failed = true;
     }
