@@ -1,8 +1,8 @@
 // What it costs to gather records in a list and lay them out as a table, beside building a protobuf message
 // of the same records; and to ask a key filter about each key of a ticket, beside looking at each of its
 // patterns.
-#include "peers/peer.h"
-#include "ratio_report.h"
+#include "bench/peers/peer.h"
+#include "bench/ratio_report.h"
 
 #include <algorithm>
 #include <benchmark/benchmark.h>

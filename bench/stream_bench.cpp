@@ -3,8 +3,8 @@
 // to go by, on a quiet machine and with a release build:
 //
 //   taskset -c 1 stream_bench --benchmark_repetitions=9 --benchmark_enable_random_interleaving=true
-#include "peers/peer.h"
-#include "ratio_report.h"
+#include "bench/peers/peer.h"
+#include "bench/ratio_report.h"
 
 #include <benchmark/benchmark.h>
 #include <cstring>

@@ -1,6 +1,6 @@
 // One map from key to value, a vector as an array, like the msgpack peer. Used as it is fastest: written item
 // by item into a buffer that is kept, with no tree in between; read into the library's tree.
-#include "peer.h"
+#include "bench/peers/peer.h"
 
 #include <cbor.h>
 #include <cstdint>

@@ -1,6 +1,6 @@
 // The library itself: the stream, and the list that a client reads it into. The size of the last stream is
 // the hint for the next one, as a sender of many tickets gives it.
-#include "peer.h"
+#include "bench/peers/peer.h"
 
 #include <string>
 

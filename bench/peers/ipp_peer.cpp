@@ -1,7 +1,7 @@
 // Attributes of an IPP message, as printers and their clients exchange them; a vector is an attribute with as
 // many values. IPP has integers of 32 bits and no doubles: a double or a larger integer is an octet string of
 // 8 bytes, which the client knows how to take. Texts are handed over as constants, which are not copied.
-#include "peer.h"
+#include "bench/peers/peer.h"
 
 #include <algorithm>
 #include <climits>

@@ -1,7 +1,7 @@
 // One map from key to value, a vector as an array; the type of a value is what msgpack itself tells apart
 // (integer, double, text, bytes). Used as it is fastest: the buffers are kept from one Write to the next, and
 // what was read refers to the bytes instead of copying texts out of them.
-#include "peer.h"
+#include "bench/peers/peer.h"
 
 #include <cstdint>
 #include <cstring>

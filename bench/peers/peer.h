@@ -2,7 +2,7 @@
 // place. All start from the same table and end with what their users look at, so that the costs compare.
 #pragma once
 
-#include "../workloads.h"
+#include "bench/workloads.h"
 
 #include <cstddef>
 #include <memory>

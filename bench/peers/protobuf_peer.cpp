@@ -2,7 +2,7 @@
 // which keeps its memory, and writes to a string that is kept as well. A message that is read or built, and
 // destroyed after its use, lives in an arena whose one block is kept and is large enough from the second time
 // on.
-#include "peer.h"
+#include "bench/peers/peer.h"
 
 #include "ticket.pb.h"
 
