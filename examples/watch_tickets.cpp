@@ -10,6 +10,7 @@
 #include <cstdlib>
 #include <future>
 #include <mutex>
+#include <optional>
 #include <string>
 #include <thread>
 #include <unistd.h>
@@ -34,8 +35,8 @@ struct OPTIONS
     bool busy = false;
 };
 
-// False if the program is to end at once: after --help, or with a usage message on a wrong command line.
-bool Parse(int argc, char** argv, OPTIONS& options)
+// Nothing, or the status with which to end at once: after --help, or after a message on a wrong command line.
+std::optional<int> Parse(int argc, char** argv, OPTIONS& options)
 {
     wxCmdLineParser parser(argc, argv);
     parser.SetLogo("Prints what changes in the tickets of a server, until Ctrl-C.");
@@ -46,15 +47,20 @@ bool Parse(int argc, char** argv, OPTIONS& options)
     parser.AddOption("s", "server", "at this host (localhost)");
     parser.AddOption("o", "port", "and port (50000)", wxCMD_LINE_VAL_NUMBER);
     parser.AddOption("n", "events", "leave after so many events", wxCMD_LINE_VAL_NUMBER);
-    if (parser.Parse() != 0)
-        return false;
+    if (int const result = parser.Parse(); result != 0)
+        return result < 0 ? 0 : 1;  // negative: that was --help
     parser.Found("user", &options.user);
     parser.Found("password", &options.password);
     parser.Found("server", &options.host);
     parser.Found("port", &options.port);
     parser.Found("events", &options.events);
     options.busy = parser.Found("busy");
-    return true;
+    if (options.events < 0)
+    {
+        std::fputs("watch_tickets: the number of events is 0 (no limit) or more\n", stderr);
+        return 1;
+    }
+    return std::nullopt;
 }
 
 bool Fail(char const* what, int code)
@@ -105,13 +111,15 @@ public:
 
     void Print(ServerNotificationEvent const& event)
     {
+        if (m_limit != 0 && m_printed == m_limit)
+            return;  // what still comes while the program is leaving
         NotifData const& data = event.GetNotifData();
         std::printf("%s  event %d  ticket %d/%d  %s %s\n",
                     wxDateTime::UNow().Format("%H:%M:%S.%l").utf8_string().c_str(), event.GetId(),
                     data.NotifCode, data.NotifArgA, data.NotifKey.utf8_string().c_str(),
                     ValueOf(data).c_str());
         std::fflush(stdout);
-        if (m_limit != 0 && ++m_printed == m_limit)
+        if (++m_printed == m_limit)
             kill(getpid(), SIGTERM);  // as if somebody had ended it from outside
     }
 
@@ -239,7 +247,7 @@ bool LogIn(ComGUIManager& manager, TLogin* login)
         return Fail("cannot prepare a session", result);
     if (int const result = manager.Login(login); result != 0)
         return Fail("the server refuses the login", result);
-    return manager.GetClientContainer() != nullptr;
+    return manager.GetClientContainer() || Fail("the session has no tickets", 0);
 }
 
 bool Subscribe(ComGUIManager& manager, TLogin* login)
@@ -293,8 +301,13 @@ int main(int argc, char** argv)
     EndSignals const end;
     wxInitializer const wx(argc, argv);
     OPTIONS options;
-    if (!wx.IsOk() || !Parse(argc, argv, options))
+    if (!wx.IsOk())
+    {
+        std::fputs("watch_tickets: wxWidgets cannot be started\n", stderr);
         return 1;
+    }
+    if (auto const status = Parse(argc, argv, options))
+        return *status;
 
     ComGUIManager* const manager = ComGUIManager::GetInstance();
     if (!hSTicketInstance)

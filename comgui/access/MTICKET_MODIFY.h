@@ -33,10 +33,15 @@ public:
         return Slots(type, id).Set(key, PARAM_STRING, value.utf8_str(), pos);
     }
 
-    template <typename Char, typename = std::enable_if_t<std::is_same_v<Char, char>>>
+    template <typename Char, std::enable_if_t<std::is_same_v<Char, char>, int> = 0>
     int SetParameter(int type, int id, char const* key, Char const* value, int pos) const
     {
         return Slots(type, id).Set(key, PARAM_STRING, value, pos);
+    }
+    template <typename Char, std::enable_if_t<std::is_same_v<Char, wchar_t>, int> = 0>
+    int SetParameter(int type, int id, char const* key, Char const* value, int pos) const
+    {
+        return SetParameter(type, id, key, wxString(value), pos);
     }
 
     int DelParameter(int type, int id, char const* key, int pos) const

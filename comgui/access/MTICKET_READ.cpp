@@ -12,7 +12,7 @@ wxString MTICKET_READ::Decode(char const* value) const
     return comgui::detail::Decode(Slots(TICKET_ID_NONE, TICKET_ID_NONE), value);
 }
 
-// A listing never stops early.
+// True: a listing wants all of them.
 static bool WalkGetTickets(void* user, int, int id, STICKET_ACCESS const*)
 {
     static_cast<std::vector<int>*>(user)->push_back(id);

@@ -65,11 +65,12 @@ public:
                                                                                             : nullptr;
     }
 
-    // The ids of all tickets of a type, in the module's order; false if there are none, or the type is not
-    // one. What ids held before is gone.
+    // Puts the ids of that type's tickets into ids, and nothing else, in the module's order; false if there
+    // are none, or the type is not one.
     COMGUI_EXPORT bool GetTickets(int type, std::vector<int>& ids) const;
 
-    // Calls fn for each ticket of a type, in the module's order, until it returns false. The slot's result.
+    // Shows the tickets of that type to fn, one by one in the module's order, until it returns false. The
+    // slot's result.
     int WalkTickets(MWALKTICKETS_ACTION fn, void* user, int type) const
     {
         return Access()->MWALKTICKETS(Access()->Instance, fn, user, type);

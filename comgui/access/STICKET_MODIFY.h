@@ -1,6 +1,6 @@
 // Typed writes of one ticket. A view: a STICKET_ACCESS pointer is one, see STICKET_READ.h for what holds of
 // keys, positions and threads; and -2 as a position appends behind the last value. Results are the slot's,
-// unchanged: not zero is success. Nothing is encoded into variable form.
+// unchanged: not zero is success. A path is stored as it is given: who wants $(VARIABLE) form encodes it.
 #pragma once
 
 #include "comgui/access/TICKET_SLOTS.h"
@@ -34,14 +34,19 @@ public:
         return Slots().Set(key, PARAM_POINTER, value, pos);
     }
 
-    // value must not change during the call: its own UTF-8 form goes to the slot.
+    // The slot gets a pointer into value, so no other thread may touch that meanwhile.
     COMGUI_EXPORT int SetParameter(char const* key, wxString const& value, int pos) const;
 
-    // UTF-8. Without this form a text literal would be taken for a bool.
-    template <typename Char, typename = std::enable_if_t<std::is_same_v<Char, char>>>
+    // Text literals, UTF-8 or wide as wxT() makes them: without these forms they would be taken for a bool.
+    template <typename Char, std::enable_if_t<std::is_same_v<Char, char>, int> = 0>
     int SetParameter(char const* key, Char const* value, int pos) const
     {
         return Slots().Set(key, PARAM_STRING, value, pos);
+    }
+    template <typename Char, std::enable_if_t<std::is_same_v<Char, wchar_t>, int> = 0>
+    int SetParameter(char const* key, Char const* value, int pos) const
+    {
+        return SetParameter(key, wxString(value), pos);
     }
 
     // Removes one value, or at -1 the key as a whole.

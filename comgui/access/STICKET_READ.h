@@ -2,8 +2,8 @@
 // it may be used from any thread that may call the ticket's slots.
 //
 // key is UTF-8 and not null. pos: -1 the key as a whole, or its single value; 0 and up one value of a list;
-// forms without it pass -1. A missing key, a position past the end and a value of another type all are a
-// failed read, and give the default. Nothing is converted from one type to another here.
+// forms without it pass -1. The default comes back whenever the slot fails, be it for the key, the position
+// or the type: views cannot tell these apart, and convert nothing.
 #pragma once
 
 #include "comgui/access/TICKET_SLOTS.h"
@@ -61,7 +61,7 @@ public:
     // A PARAM_TYPE: at -1 PARAM_COUNT for a list, else the value's own type. 0 where nothing is stored.
     int ParameterType(char const* key, int pos) const { return comgui::detail::ReadType(Slots(), key, pos); }
 
-    // Number of values under the key, 0 without the key.
+    // How many values the key holds; 0 if there is no such key.
     unsigned long GetVectorSize(char const* key) const
     {
         return comgui::detail::Read(Slots(), PARAM_COUNT, -1, key, 0ul);

@@ -63,7 +63,7 @@ Value Read(Slots const& slots, PARAM_TYPE type, int pos, char const* key, Value 
     return slots.Get(key, type, &value, pos) ? value : def;
 }
 
-// There is no type for bool: it is stored as an int.
+// Tickets know no bool: 0 and any other int stand for it.
 template <typename Slots>
 bool ReadBool(Slots const& slots, int pos, char const* key, bool def)
 {

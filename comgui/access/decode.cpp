@@ -22,7 +22,7 @@ bool ReadText(Slots const& slots, char const* key, wxString& value, int pos)
     char const* text = nullptr;
     if (!slots.Get(key, PARAM_STRING, &text, pos))
     {
-        value.clear();  // a failed read never leaves the caller's old text in place
+        value.clear();  // what a caller overlooks must not look like a value of this ticket
         return false;
     }
     value = Decode(slots, text);

@@ -27,7 +27,7 @@ static TLogin* NewLoginRecord()
 ComGUIManager::ComGUIManager() : m_pLogin(NewLoginRecord())
 {
     __CFBundle* plugIn = nullptr;
-    RegisterPlugIn(&plugIn);  // a failure shows in the next step, which finds no factory
+    RegisterPlugIn(&plugIn);  // null after a failure, and that has no factories
 
     if (CreateComGUIModuleInterface(plugIn, &m_pModule) == 0)
     {

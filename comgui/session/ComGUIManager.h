@@ -192,7 +192,7 @@ public:
     int SetParameterToLocal(wxString path, char const* key, double value);
     int DeleteParameterFromLocal(wxString path, char const* key, int pos);
 
-    // Appends a text to a list unless it is there, letter case included. 0 if it is.
+    // Appends a text to a list that does not hold it yet, in this letter case. 0 if it does.
     int AddStringToStringListLocal(wxString path, char const* key, wxString value);
 
     // --- Notifications -----------------------------------------------------------------------------------
@@ -211,12 +211,12 @@ public:
     int DisableNotifications(TLogin* login, int type);
 
     // What the plug-in calls on a thread of its own: copies the notification and queues it for a
-    // ReceiverThread. data: for kind 1 a table of changed parameters, which gives one notification for each
-    // run of records that share one key pointer; for other kinds one record, or null.
+    // ReceiverThread. data: with kind 1 what changed, a SETMULTIPAR table, which gives one notification for
+    // each run of records that share one key pointer; with other kinds one record, or null.
     static void fGUI2NOTIFICATION(void* pUser, int kind, int argA, int argB, int code, void* data);
 
-    // The queue, first in, first out, without a bound, and its lock. Its records come from new and are the
-    // queue's until the receiver takes and deletes them.
+    // The queue and its lock. Records go in at the back, as many as come, and out at the front. They come
+    // from new and are the queue's until the receiver takes and deletes them.
     static std::list<NotifData*> m_notificationList;
     static wxCriticalSection m_csNotificationList;
 

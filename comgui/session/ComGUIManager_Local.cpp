@@ -1,5 +1,5 @@
-// One-shot operations on ticket files: each call opens the ticket, does one thing and closes it again. What
-// makes a change lasting is the factory's affair.
+// Ticket files, one call at a time: nothing stays open between two of them. When a change reaches the disk is
+// the factory's affair.
 #include "comgui/session/ComGUIManager.h"
 
 #include "comgui/access/STICKET_MODIFY.h"
@@ -23,7 +23,7 @@ Result WithTicket(wxString const& path, Result ifNone, Operation operation)
     return result;
 }
 
-// Takes the texts under a key one by one, up to the first position that cannot be read: a gap ends a list.
+// Takes the texts under a key one by one, up to the first position that cannot be read, a gap included.
 template <typename Take>
 void ForEachText(STICKET_ACCESS const* ticket, char const* key, Take take)
 {
@@ -90,8 +90,8 @@ wxArrayInt ComGUIManager::GetIntArrayParameterFromLocal(wxString path, char cons
     return WithTicket(path, wxArrayInt(),
                       [&](STICKET_ACCESS const* ticket)
                       {
-                          // -1 is the end, so a stored -1 cuts the array. The doubles below
-                          // go by the count instead.
+                          // The default for a missing value marks the end, and so does a stored
+                          // -1. The doubles below go by the count instead.
                           wxArrayInt array;
                           for (int pos = 0, value;
                                (value = STICKET_READ::Of(ticket)->GetIntParameter(pos, key, -1)) != -1; ++pos)

@@ -55,7 +55,7 @@ void FillWithValue(NotifData& notification, SETMULTIPAR const& record)
         notification.NotifNumber = *static_cast<int const*>(record.value);
 }
 
-// One notification a key. One value comes along; of several the receiver learns only that they changed.
+// One notification a key. It carries a single value; where there are several, hosts read the ticket.
 void QueueTable(NotifData const& pattern, SETMULTIPAR const* first)
 {
     while (first->key)
@@ -93,7 +93,7 @@ void ComGUIManager::fGUI2NOTIFICATION(void* pUser, int kind, int argA, int argB,
         {
             QueueTable(NotifData(pUser, kind, argA, argB, code, PARAM_NONE, nullptr), records);
         }
-        catch (...)  // the rest of the table is lost; the plug-in must not notice
+        catch (...)  // no memory: what is queued by now stays, and the plug-in must not notice
         {
         }
         return;

@@ -22,7 +22,7 @@ constexpr int AnyCode = INT_MIN;
 constexpr int JobParameterChanged = 1000004;
 constexpr int OwnRemoteEndPoint = 1000101;
 
-// A client hears of a job's remote end point only when it is its own.
+// Jobs name the client that they belong to; the others have no use for that word.
 std::optional<int> RemoteEndPointFilter(NotifData const& notification, std::string const& localEndPoint)
 {
     if (notification.NotifKey != "Job/Identification/RemoteEndpoint")

@@ -37,7 +37,7 @@ void HandleNext(NotifData*& inHand, std::string const& localEndPoint)
     if (!inHand)
         return;
     Publish(*inHand, localEndPoint);
-    if (inHand->NotifKind == 0)  // kind 0 is neither published nor freed: it stays in hand
+    if (inHand->NotifKind == 0)  // kept in hand, and freed by nobody: no such kind is sent
         return;
     inHand->NotifKind = 0;
     delete inHand;
@@ -51,7 +51,7 @@ ReceiverThread::~ReceiverThread() = default;
 
 void* ReceiverThread::Entry()
 {
-    // Made once in the life of the process, whatever session is logged in later.
+    // Static on purpose: a later thread keeps this one, though another session may be logged in by then.
     static std::string const szLocalEndPoint = m_pManager->GetLocalEndPoint().utf8_string();
 
     NotifData* inHand = nullptr;

@@ -3,8 +3,9 @@
 // of the process to run fixes the local end point for all that follow. It is detached, so it deletes itself.
 //
 // Event handlers run on this thread while the queue is locked: a slow one makes the plug-in wait, and one
-// that waits for a further notification waits for ever. An exception of a handler is reported on stdout, and
-// the notification is published again.
+// that waits for the plug-in may wait for ever, be it for a further notification or in a call that lets a
+// running callback end first, as switching notifications and logging out may do. An exception of a handler
+// is reported on stdout, and the notification is published again.
 #pragma once
 
 #include "comgui/foundation/export.h"

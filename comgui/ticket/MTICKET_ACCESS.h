@@ -14,7 +14,7 @@
 typedef int (*MGETPARAMETER)(void* Instance, int ticketType, int ticketId, char const* key, PARAM_TYPE type,
                              void* value, int pos);
 
-// The result means nothing: each record's ok tells.
+// Success stands in each record's ok, and nowhere else.
 typedef int (*MGETMULTIPAR)(void* Instance, int ticketType, int ticketId, GETMULTIPAR* table);
 
 // Called for each ticket of a walk; false ends it. The ticket's table lives until it returns.

@@ -16,7 +16,7 @@ struct SETMULTIPAR
     int reserved12;      // zero
     void const* value;   // the text or pointer itself, else the value's address: see PARAM_TYPE.h
     int pos;             // -1 the key as a whole, 0 and up one value, -2 append
-    bool ok;             // result, set by whoever carried the record out
+    bool ok;             // out: whether this record succeeded
     char reserved29[3];  // zero
 };
 static_assert(std::is_standard_layout_v<SETMULTIPAR> && std::is_trivial_v<SETMULTIPAR>);

@@ -12,7 +12,7 @@
 // Reads one value to where value points, see PARAM_TYPE.h; after a failure that place is as it was.
 typedef int (*SGETPARAMETER)(void* Instance, char const* key, PARAM_TYPE type, void* value, int pos);
 
-// Reads a table. The result of the call means nothing: each record's ok tells.
+// Reads a table. Success stands in each record's ok, and nowhere else.
 typedef int (*SGETMULTIPAR)(void* Instance, GETMULTIPAR* table);
 
 // Called for each parameter of a walk, with the value word as on a write; false ends the walk. Records of

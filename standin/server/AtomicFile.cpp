@@ -3,8 +3,10 @@
 #include <algorithm>
 #include <atomic>
 #include <cerrno>
+#include <csignal>
 #include <cstdio>
 #include <fcntl.h>
+#include <regex>
 #include <sys/stat.h>
 #include <system_error>
 #include <unistd.h>
@@ -115,10 +117,25 @@ private:
     Descriptor m_descriptor;
 };
 
+// suffix: what a name has behind that of the file for which Temporary may have made it.
+bool IsOfADeadProcess(std::string const& suffix)
+{
+    std::smatch parts;
+    if (!std::regex_match(suffix, parts, std::regex(R"(\.([0-9]{1,9})-[0-9]+\.tmp)")))
+        return false;
+    pid_t const process = std::stoi(parts[1]);
+    return process > 0 && kill(process, 0) != 0 && errno == ESRCH;
+}
+
+std::filesystem::path FolderOf(std::filesystem::path const& file)
+{
+    return file.has_parent_path() ? file.parent_path() : ".";
+}
+
 // Without this a power cut may bring the old name back. Some file systems cannot flush a folder.
 void FlushFolderOf(std::filesystem::path const& file)
 {
-    std::filesystem::path const folder = file.has_parent_path() ? file.parent_path() : ".";
+    std::filesystem::path const folder = FolderOf(file);
     Descriptor const descriptor(open(folder.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
     if (descriptor.Number() >= 0 && fsync(descriptor.Number()) != 0 && errno != EINVAL)
         throw FileError(folder, "cannot be flushed to the disk", errno);
@@ -160,5 +177,18 @@ void ReplaceFile(std::filesystem::path const& file, std::string_view content)
     temporary.Write(content, name);
     temporary.TakeThePlaceOf(name);
     FlushFolderOf(name);
+}
+
+void RemoveLeftovers(std::filesystem::path const& file)
+{
+    std::string const name = file.filename().string();
+    std::error_code error;
+    std::filesystem::directory_iterator entry(FolderOf(file), error);
+    for (; !error && entry != std::filesystem::directory_iterator(); entry.increment(error))
+    {
+        std::string const found = entry->path().filename().string();
+        if (found.starts_with(name) && IsOfADeadProcess(found.substr(name.size())))
+            unlink(entry->path().c_str());
+    }
 }
 }  // namespace standin

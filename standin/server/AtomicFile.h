@@ -21,4 +21,8 @@ std::string ReadFile(std::filesystem::path const& file, std::size_t limit);
 // permissions it takes over. A link stays, and what it points at is replaced. On failure the old content is
 // there as it was and nothing else is left. A process killed in between leaves NAME.PID-N.tmp behind.
 void ReplaceFile(std::filesystem::path const& file, std::string_view content);
+
+// Removes what killed processes have left behind beside the file. What belongs to a process that lives, this
+// one included, stays, and so does what cannot be removed.
+void RemoveLeftovers(std::filesystem::path const& file);
 }  // namespace standin

@@ -127,9 +127,8 @@ private:
     std::deque<Message> m_waiting;
     std::condition_variable m_work;
     std::condition_variable m_done;
-    int m_running = 0;  // the id whose callback runs, 0 for none
-    unsigned long long m_run =
-        0;  // counts callbacks, so that a wait for one does not become one for the next
+    int m_running = 0;             // the id whose callback runs, 0 for none
+    unsigned long long m_run = 0;  // counts callbacks: a wait for one must not become one for the next
     bool m_stopped = false;
     std::thread m_thread;  // begun at the first registration
 };

@@ -14,6 +14,8 @@ namespace standin
 namespace
 {
 constexpr std::string_view InstallFolderKey = "System/InstallFolder";
+constexpr char SeedFile[] = "seed.xml";
+constexpr char SystemTicketFile[] = "tickets/SYS_0000.xml";
 constexpr std::string_view OwnFolders[] = {"tickets", "temp", "job", "upload", "preview", "log"};
 
 std::filesystem::path FromEnvironment(char const* name)
@@ -32,7 +34,7 @@ std::filesystem::path MadeAbsolute(std::filesystem::path const& folder)
 // the program's own has proved to be sound.
 Seed SeedOfSite(std::filesystem::path const& folder, std::filesystem::path const& shipped)
 {
-    std::filesystem::path const file = folder / "seed.xml";
+    std::filesystem::path const file = folder / SeedFile;
     if (std::filesystem::exists(file))
     {
         try
@@ -109,6 +111,8 @@ Site Site::Open(std::filesystem::path const& folder, std::filesystem::path const
 Site::Site(std::filesystem::path const& folder, std::filesystem::path const& seedFile)
     : m_folder(Prepared(folder)), m_lock(m_folder), m_storage(OpenStorage(m_folder, seedFile))
 {
+    for (char const* const file : {SeedFile, SystemTicketFile})
+        RemoveLeftovers(m_folder / file);
     KeepInstallFolder();
     MakeFolders();
     MirrorSystemTicket();
@@ -167,7 +171,7 @@ void Site::MirrorSystemTicket() noexcept
         ticket.address = SystemTicket;
         m_storage.Load(SystemTicket, [&ticket](std::string_view key, int pos, StoredValue const& value)
                        { ticket.Put(key, pos, value); });
-        ticket.Write(m_folder / "tickets" / "SYS_0000.xml");
+        ticket.Write(m_folder / SystemTicketFile);
     }
     catch (std::exception const& error)
     {

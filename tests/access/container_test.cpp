@@ -3,6 +3,7 @@
 
 #include "comgui/access/MTICKET_MODIFY.h"
 #include "comgui/access/MTICKET_READ.h"
+#include "tests/access/FolderVariablesFake.h"
 #include "tests/support/ContainerFake.h"
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
@@ -32,6 +33,25 @@ int WalkBackwards(void*, MWALKTICKETS_ACTION action, void* context, int type)
     return 0;
 }
 }  // namespace
+
+TEST_F(Container, Views_AreTheAddressOfTheRecord)
+{
+    EXPECT_EQ(static_cast<void const*>(&read), fake.Access());
+    EXPECT_EQ(static_cast<void const*>(&modify), fake.Access());
+    EXPECT_EQ(static_cast<void const*>(&admin), fake.Access());
+}
+
+TEST_F(Container, Translator_OfAnOperationThatFailedAndWrote_IsNotUsed)
+{
+    FolderVariablesFake folders;
+    fake.folders = &folders;
+    fake.Access()->MOPERATION = [](void* instance, int, int, TICKET_OP, void* arg)
+    {
+        *static_cast<clFOLDER_VARIABLES**>(arg) = static_cast<ContainerFake*>(instance)->folders;
+        return 0;
+    };
+    EXPECT_EQ(read.Decode("$(TEMP)/x"), "$(TEMP)/x");
+}
 
 TEST_F(Container, GetTickets_OfATypeThatIsNone_ClearsAndCallsNoSlot)
 {

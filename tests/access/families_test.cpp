@@ -161,6 +161,19 @@ TYPED_TEST(TypedWrite, TextLiteral_IsATextAndNoBool)
     EXPECT_EQ(this->ticket.fake.Text(TypeParam::Type, TypeParam::Id, "k"), "text");
 }
 
+TYPED_TEST(TypedWrite, WideTextLiteral_IsATextAndNoBool)
+{
+    EXPECT_EQ(this->ticket.SetParameter("k", wxT("Gr\u00FCn"), -1), 1);
+    EXPECT_EQ(this->OneCall(), this->Set(PARAM_STRING, -1));
+    EXPECT_EQ(this->ticket.fake.Text(TypeParam::Type, TypeParam::Id, "k"), "Gr\xC3\xBCn");
+}
+
+TYPED_TEST(TypedWrite, NullPointer_IsAPointer)
+{
+    EXPECT_EQ(this->ticket.SetParameter("k", nullptr, -1), 1);
+    EXPECT_EQ(this->OneCall(), this->Set(PARAM_POINTER, -1));
+}
+
 TYPED_TEST(TypedWrite, PathInVariableForm_IsStoredAsItIs)
 {
     this->ticket.SetParameter("k", wxString("$(TEMP)/x"), -1);

@@ -121,6 +121,18 @@ TEST_F(SingleTicket, Translator_AnswerWithAClearLowestBit_CountsAllTheSame_ByDes
     EXPECT_THAT(fake.options, ElementsAre(10));
 }
 
+TEST_F(SingleTicket, Translator_OfAnOptionThatFailedAndWrote_IsNotUsed)
+{
+    FolderVariablesFake folders;
+    fake.container.folders = &folders;
+    fake.Access()->SOPTION = [](void* instance, int, void* out)
+    {
+        *static_cast<clFOLDER_VARIABLES**>(out) = static_cast<TicketFake*>(instance)->container.folders;
+        return 0;
+    };
+    EXPECT_EQ(read.Decode("$(TEMP)/x"), "$(TEMP)/x");
+}
+
 TEST_F(SingleTicket, SetParameter_Int_GoesByAddress)
 {
     EXPECT_EQ(modify.SetParameter("k", 42, -2), 1);

@@ -298,6 +298,18 @@ TEST_F(SiteFolder, SystemTicketFile_IsWrittenAtEveryStart)
     EXPECT_THAT(ContentOf(File("tickets/SYS_0000.xml")), HasSubstr(">Changed<"));
 }
 
+TEST_F(SiteFolder, WhatKilledProcessesLeftOfItsFiles_GoesAtTheNextStart)
+{
+    MakeSite();
+    std::string const suffix = "." + NumberOfADeadProcess() + "-3.tmp";
+    for (char const* const name : {"seed.xml", "tickets/SYS_0000.xml", "tickets/own.xml"})
+        WriteFile(File(name + suffix), "half");
+    MakeSite();
+    EXPECT_FALSE(std::filesystem::exists(File("seed.xml" + suffix)));
+    EXPECT_FALSE(std::filesystem::exists(File("tickets/SYS_0000.xml" + suffix)));
+    EXPECT_TRUE(std::filesystem::exists(File("tickets/own.xml" + suffix))) << "no file of the site's own";
+}
+
 TEST_F(SiteFolder, MirrorSystemTicket_WritesWhatStandsInTheStorage)
 {
     Site site = Site::Open(Folder(), ShippedSeed);

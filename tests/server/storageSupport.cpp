@@ -113,6 +113,14 @@ std::int64_t ChildProcess::Last(std::int64_t otherwise)
     return otherwise;
 }
 
+std::string NumberOfADeadProcess()
+{
+    ChildProcess child([](ChildProcess::Report const&) {});
+    std::string const number = std::to_string(child.Id());
+    child.Wait();
+    return number;
+}
+
 bool SameValue(standin::StoredValue const& left, standin::StoredValue const& right)
 {
     return left.type == right.type && left.integer == right.integer &&

@@ -63,5 +63,8 @@ private:
     int m_reports = -1;
 };
 
+// As text, for the names of files that such a process may have left behind.
+std::string NumberOfADeadProcess();
+
 // Equal as bits, so that -0.0 differs from 0.0 and a NaN equals itself.
 bool SameValue(standin::StoredValue const& left, standin::StoredValue const& right);

@@ -21,6 +21,7 @@ using namespace standin;
 using testing::AllOf;
 using testing::ElementsAre;
 using testing::HasSubstr;
+using testing::UnorderedElementsAreArray;
 
 namespace
 {
@@ -612,4 +613,45 @@ TEST(ReplaceFile, KilledAtAnyInstant_HasTheOldContentOrTheNew)
         ASSERT_EQ(content.size(), 100000u);
         ASSERT_EQ(content.find_first_not_of(content[0]), std::string::npos);
     }
+    RemoveLeftovers(folder / "file");
+    EXPECT_THAT(folder.Names(), ElementsAre("file"));
+}
+
+TEST(RemoveLeftovers, OfProcessesThatAreGone_GoAndNothingElseDoes)
+{
+    TemporaryFolder folder;
+    std::string const gone = NumberOfADeadProcess();
+    std::string const own = std::to_string(getpid());
+    std::vector<std::string> kept = {"file",
+                                     "file." + own + "-0.tmp",
+                                     "file." + std::to_string(getppid()) + "-0.tmp",
+                                     "file." + gone + ".tmp",
+                                     "file." + gone + "-.tmp",
+                                     "file." + gone + "-0.tmp.old",
+                                     "file.0-0.tmp",
+                                     "file.99999999999-0.tmp",
+                                     "file.xml." + gone + "-0.tmp",
+                                     "file.tmp",
+                                     "other." + gone + "-0.tmp"};
+    for (std::string const& name : kept)
+        WriteFile(folder / name, "kept");
+    WriteFile(folder / ("file." + gone + "-0.tmp"), "half");
+    WriteFile(folder / ("file." + gone + "-12.tmp"), "half");
+    RemoveLeftovers(folder / "file");
+    EXPECT_THAT(folder.Names(), UnorderedElementsAreArray(kept));
+}
+
+TEST(RemoveLeftovers, AFolderOfSuchAName_Stays)
+{
+    TemporaryFolder folder;
+    std::string const name = "file." + NumberOfADeadProcess() + "-0.tmp";
+    std::filesystem::create_directory(folder / name);
+    RemoveLeftovers(folder / "file");
+    EXPECT_THAT(folder.Names(), ElementsAre(name));
+}
+
+TEST(RemoveLeftovers, InNoFolder_IsNothingToDo)
+{
+    TemporaryFolder folder;
+    EXPECT_NO_THROW(RemoveLeftovers(folder / "none" / "file"));
 }

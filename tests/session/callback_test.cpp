@@ -106,8 +106,10 @@ TEST_F(Callback, OfARecordWithoutAnId_SkipsThatAndRegisters)
 TEST_F(Callback, OfARecord_WithoutATicket_GivesMinus1)
 {
     module.ticket = nullptr;
+    login.iGUINotificationID = 5;
     EXPECT_EQ(manager.SetCallback(&login, this), -1);
     EXPECT_THAT(commands, IsEmpty());
+    EXPECT_THAT(fake.calls, ElementsAre(Switch(-3, -3, 5, false)));  // before the ticket is asked for
 }
 
 TEST_F(CallbackDeathTest, OfTheImplicitSession_WithoutATicket_GoesThroughNull_ByDesign)
@@ -138,7 +140,7 @@ TEST_F(Callback, EnableNotifications_OfATypeOrATicket_SwitchesThemOn)
 {
     login.iGUINotificationID = 5;
     login.hSession = &login;
-    fake.success = 0;  // the slot's result is dropped
+    fake.success = 0;  // a failure of the slot does not show
     EXPECT_EQ(manager.EnableNotifications(&login, 3, keys), 0);
     EXPECT_EQ(manager.EnableNotifications(&login, 3, 7, keys), 0);
     EXPECT_EQ(manager.DisableNotifications(&login, 3), 0);

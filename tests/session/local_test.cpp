@@ -8,6 +8,7 @@
 #include <cstring>
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
+#include <stdexcept>
 #include <wx/filefn.h>
 
 using testing::ElementsAre;
@@ -27,7 +28,7 @@ protected:
     ~LocalTicket() override
     {
         int const opened = module.ticket ? static_cast<int>(module.paths.size()) : 0;
-        EXPECT_EQ(module.destroyed, opened);  // each ticket has been given back
+        EXPECT_EQ(module.destroyed, opened - leftOpen);  // each other ticket has been given back
     }
 
     template <typename Value>
@@ -53,6 +54,7 @@ protected:
     static CALL Set(PARAM_TYPE type, int pos) { return {SLOT::SET, 0, 0, "k", type, pos}; }
 
     TicketFake file;
+    int leftOpen = 0;
 };
 
 // The same with a factory that opens nothing.
@@ -60,6 +62,13 @@ class MissingFile : public LocalTicket
 {
 protected:
     MissingFile() { module.ticket = nullptr; }
+};
+
+using WithoutPlugIn = WithModule;
+
+struct BrokenTranslator : FolderVariablesFake
+{
+    std::string Decode(std::string const&, bool) const override { throw std::runtime_error("broken"); }
 };
 
 std::vector<std::string> Values(wxArrayString const& array)
@@ -90,7 +99,7 @@ TEST_F(LocalTicket, CreateTicket_HandsThePathToTheFactory)
     EXPECT_THAT(module.paths, ElementsAre("a\\b", "(null)"));
 }
 
-TEST_F(WithModule, CreateTicket_WithoutAPlugIn_IsNullAndDestroyTicketDoesNothing)
+TEST_F(WithoutPlugIn, CreateTicket_IsNullAndDestroyTicketDoesNothing)
 {
     hSTicketInstance = nullptr;
     EXPECT_EQ(CreateTicket("a"), nullptr);
@@ -138,7 +147,7 @@ TEST_F(MissingFile, Writes_Give0)
     EXPECT_EQ(module.destroyed, 0);
 }
 
-TEST_F(WithModule, LocalOperations_WithoutAPlugIn_GiveTheValuesOfAMissingFile)
+TEST_F(WithoutPlugIn, LocalOperations_GiveTheValuesOfAMissingFile)
 {
     LoseTheBundle();
     testing::internal::CaptureStderr();
@@ -180,6 +189,24 @@ TEST_F(LocalTicket, Texts_EndAtTheFirstGapInBothForms)
     EXPECT_THAT(Values(manager.GetStringArrayParameterFromLocal(Path, "k")), ElementsAre("a", "b"));
 }
 
+TEST_F(LocalTicket, Texts_AreResolvedOnTheirWay)
+{
+    Put({"$(TEMP)/x", "b"});
+    FolderVariablesFake folders;
+    file.container.folders = &folders;
+    EXPECT_THAT(Values(manager.GetStringListParameterFromLocal(Path, "k")), ElementsAre("<$(TEMP)/x>", "b"));
+    EXPECT_THAT(Values(manager.GetStringArrayParameterFromLocal(Path, "k")), ElementsAre("<$(TEMP)/x>", "b"));
+}
+
+TEST_F(LocalTicket, OperationThatThrows_LeavesItsTicketOpen_ByDesign)
+{
+    Put({"$(TEMP)/x"});
+    BrokenTranslator folders;
+    file.container.folders = &folders;
+    EXPECT_THROW(manager.GetStringParameterFromLocal(Path, "k", -1), std::runtime_error);
+    leftOpen = 1;
+}
+
 TEST_F(LocalTicket, IntArray_EndsAtAStoredMinus1_ByDesign)
 {
     Put({3, -1, 7});
@@ -211,11 +238,16 @@ TEST_F(LocalTicket, Arrays_OfAMissingKey_AreEmpty)
 TEST_F(LocalTicket, Writes_GoToTheirPositionAndGiveTheSlotsResult)
 {
     file.container.success = 6;
-    EXPECT_EQ(manager.SetParameterToLocal(Path, "k", wxString("x")), 6);
+    EXPECT_EQ(manager.SetParameterToLocal(Path, "k", wxString::FromUTF8("Gr\xC3\xBCn")), 6);
     EXPECT_EQ(manager.SetParameterToLocal(Path, "k", wxString("y"), 1), 6);
+    EXPECT_EQ(file.container.Text(0, 0, "k", 0), "Gr\xC3\xBCn");
+    EXPECT_EQ(file.container.Text(0, 0, "k", 1), "y");
     EXPECT_EQ(manager.SetParameterToLocal(Path, "k", 5), 6);
+    EXPECT_EQ(file.container.Int(0, 0, "k"), 5);
     EXPECT_EQ(manager.SetParameterToLocal(Path, "k", 2.5), 6);
+    EXPECT_EQ(file.container.Double(0, 0, "k"), 2.5);
     EXPECT_EQ(manager.DeleteParameterFromLocal(Path, "k", 0), 6);
+    EXPECT_EQ(file.container.Count(0, 0, "k"), 0u);
     EXPECT_THAT(Writes(), ElementsAre(Set(PARAM_STRING, -1), Set(PARAM_STRING, 1), Set(PARAM_INT, -1),
                                       Set(PARAM_DOUBLE, -1), Set(PARAM_NONE, 0)));
 }
@@ -242,6 +274,15 @@ TEST_F(LocalTicket, AddString_ThatIsThere_Gives0AndWritesNothing_ButReadsToTheEn
     EXPECT_EQ(manager.AddStringToStringListLocal(Path, "k", "a"), 0);
     EXPECT_THAT(Writes(), IsEmpty());
     EXPECT_EQ(file.container.calls.size(), 4u);
+}
+
+TEST_F(LocalTicket, AddString_IsComparedWithWhatAReadGives)
+{
+    Put({"$(TEMP)/x"});
+    FolderVariablesFake folders;
+    file.container.folders = &folders;
+    EXPECT_EQ(manager.AddStringToStringListLocal(Path, "k", "<$(TEMP)/x>"), 0);
+    EXPECT_EQ(manager.AddStringToStringListLocal(Path, "k", "$(TEMP)/x"), 1);
 }
 
 TEST_F(LocalTicket, AddString_ToAKeyWithoutValues_WritesTheFirst)

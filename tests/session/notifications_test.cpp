@@ -1,5 +1,7 @@
 // What the callback makes of the plug-in's notifications.
 #include "tests/session/NotificationQueue.h"
+#include "tests/session/ScarceMemory.h"
+#include <new>
 
 namespace
 {
@@ -36,6 +38,7 @@ protected:
 };
 
 using ParameterChanges = Notifications;
+using ScarceNotifications = Notifications;
 }  // namespace
 
 TEST_F(Notifications, WithoutARecord_CarriesTheArgumentsAlone)
@@ -106,7 +109,8 @@ TEST_F(ParameterChanges, Int_ArrivesAsADoubleWithItsSign)
 TEST_F(ParameterChanges, Double_ArrivesAsItIs)
 {
     SETMULTIPAR table[] = {Record(keyA, PARAM_DOUBLE, &fraction, -1), {}};
-    EXPECT_EQ(One(1, table)->NotifNumber, 2.5);
+    auto const notification = One(1, table);
+    EXPECT_EQ(notification->NotifNumber, 2.5);
 }
 
 TEST_F(ParameterChanges, Text_ArrivesBesideItsKey)
@@ -175,4 +179,54 @@ TEST_F(ParameterChanges, KeyThatComesAgainLater_IsARunOfItsOwn)
     ASSERT_EQ(all.size(), 3u);
     EXPECT_EQ(all[2]->NotifKey, "Key/A");
     EXPECT_EQ(all[2]->NotifPos, 1);
+}
+
+TEST_F(ScarceNotifications, OfATable_AreLostFromTheFirstWithoutMemoryOn_AndThePlugInDoesNotNotice)
+{
+    char const keyC[] = "Key/C";
+    SETMULTIPAR table[] = {Record(keyA, PARAM_STRING, "a long enough text", -1),
+                           Record(keyB, PARAM_STRING, "a long enough text", -1),
+                           Record(keyC, PARAM_STRING, "a long enough text", -1),
+                           {}};
+    std::vector<std::string> const keys = {"Key/A", "Key/B", "Key/C"};
+    std::size_t most = 0;
+    int allocations = 0;
+    for (; most < keys.size(); ++allocations)
+    {
+        {
+            ScarceMemory const memory(allocations);
+            EXPECT_NO_THROW(ComGUIManager::fGUI2NOTIFICATION(this, 1, 0, 0, 3, table));
+        }
+        auto const queued = Take();
+        ASSERT_GE(queued.size(), most);
+        ASSERT_LE(queued.size(), keys.size());
+        most = queued.size();
+        for (std::size_t i = 0; i < most; ++i)
+        {
+            EXPECT_EQ(queued[i]->NotifKey, keys[i]);
+            EXPECT_EQ(queued[i]->NotifText, "a long enough text");
+        }
+    }
+    EXPECT_GE(allocations, 9);  // three each: the record, its key, its place in the queue
+}
+
+TEST_F(ScarceNotifications, OfOtherKinds_PassTheFailureToThePlugInAndQueueNothing_ByDesign)
+{
+    SETMULTIPAR record = Record(keyA, PARAM_STRING, "a long enough text", -1);
+    int failures = 0;
+    for (bool failed = true; failed; failures += failed ? 1 : 0)
+    {
+        failed = false;
+        try
+        {
+            ScarceMemory const memory(failures);
+            ComGUIManager::fGUI2NOTIFICATION(this, 4, 0, 0, 3, &record);
+        }
+        catch (std::bad_alloc const&)
+        {
+            failed = true;
+        }
+        EXPECT_EQ(Take().size(), failed ? 0u : 1u);
+    }
+    EXPECT_GE(failures, 3);  // the record, its text, and its place in the queue
 }

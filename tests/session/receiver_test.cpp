@@ -147,7 +147,7 @@ TEST_F(Receiver, ThreadThatIsShutDownBeforeItRuns_HandlesNothing)
 {
     ReceiverThread thread;
     EXPECT_TRUE(thread.ShutDown());
-    EXPECT_TRUE(thread.ShutDown());  // true also if it was set already
+    EXPECT_TRUE(thread.ShutDown());  // not only the first time
     Queue(4, 3);
     testing::internal::CaptureStdout();
     EXPECT_EQ(thread.Entry(), nullptr);

@@ -1,0 +1,30 @@
+#include "tests/session/ScarceMemory.h"
+
+#include <cstdlib>
+#include <new>
+
+namespace
+{
+constexpr int Plenty = -1;
+thread_local int allocationsLeft = Plenty;
+}  // namespace
+
+ScarceMemory::ScarceMemory(int allocations) { allocationsLeft = allocations; }
+
+ScarceMemory::~ScarceMemory() { allocationsLeft = Plenty; }
+
+// The whole program's, the library included. The forms that are not here come down to these.
+void* operator new(std::size_t size)
+{
+    if (allocationsLeft == 0)
+        throw std::bad_alloc();
+    if (allocationsLeft != Plenty)
+        --allocationsLeft;
+    if (void* const memory = std::malloc(size ? size : 1))
+        return memory;
+    throw std::bad_alloc();
+}
+
+void operator delete(void* memory) noexcept { std::free(memory); }
+
+void operator delete(void* memory, std::size_t) noexcept { std::free(memory); }
