@@ -38,7 +38,7 @@ public:
     }
 
     // Hands on to the string; what is not handed on is lost with the chunk.
-    __attribute__((noinline)) char* Flush(char* to)
+    [[gnu::noinline]] char* Flush(char* to)
     {
         m_data.append(m_bytes, static_cast<std::size_t>(to - m_bytes));
         return m_bytes;

@@ -38,6 +38,9 @@ public:
     // at -1 if it stands at 0, which is how a table for a write begins a vector.
     static bool Read(SETMULTIPAR_LIST& list, void const* data, unsigned long size, bool fixPositions);
 
+    // Whether Read would read the whole stream. Takes memory for no more than a key.
+    static bool Check(void const* data, unsigned long size);
+
     // Reads the stream and writes its records to the ticket in one call, whose success is the result. A
     // stream with an error does not touch the ticket, nor do no bytes, which are a success. False for a null
     // ticket and for one that cannot be written.
@@ -68,6 +71,9 @@ public:
 
 private:
     class RECORDS;
+
+    COMGUI_LOCAL static bool ReadAll(SETMULTIPAR_LIST* list, void const* data, unsigned long size,
+                                     bool fixPositions);
 };
 
 // Writes one stream: made, fed, read out once by Swap or ToFile.

@@ -107,17 +107,17 @@ unsigned long STICKET_BINSTREAM::IMPORT_INTERN::TakeShared(BYTES& item)
     return (first & 0x3F) << 24 | second << 16 | GetBytes<std::uint16_t>(item.Take(2));
 }
 
-// One reading of a stream into a list.
+// One reading of a stream into a list, or without one just to see whether it can be read.
 class STICKET_BINSTREAM::RECORDS
 {
 public:
-    RECORDS(SETMULTIPAR_LIST& list, void const* data, unsigned long size, bool fixPositions)
+    RECORDS(SETMULTIPAR_LIST* list, void const* data, unsigned long size, bool fixPositions)
         : m_list(list), m_cursor(data, size), m_fixPositions(fixPositions)
     {
     }
 
-    // Adds all records of the stream, or throws at its first error. There is at least one byte.
-    void AddAll()
+    // Goes through all records of the stream, or throws at its first error. There is at least one byte.
+    void TakeAll()
     {
         TakeSignature();
         while (m_cursor.HasData())
@@ -147,15 +147,15 @@ private:
         case ITEM_NUMBER:
             return TakeNumber(size);
         case ITEM_STRING:
-            return AddText({reinterpret_cast<char const*>(m_cursor.bytes.Take(size)), size});
+            return AddText(m_cursor.bytes.Take(size), size);
         case ITEM_BINARY:
-            return Add(PARAM_BINSTRING, m_list.m_binCache.Keep(BIN_STRING(m_cursor.bytes.Take(size), size)));
+            return AddBinary(m_cursor.bytes.Take(size), size);
         case ITEM_POSITION:
             m_pos = static_cast<int>(size) - PositionBias;
             return;
         case ITEM_DELETE:
             m_fixNext = false;  // a delete stands where it says, also behind a key
-            return Add(PARAM_NONE, nullptr);
+            return Add(PARAM_NONE, [] { return nullptr; });
         default:
             throw "Invalid tag";
         }
@@ -191,15 +191,27 @@ private:
         }
     }
 
-    void AddText(std::string_view text) { Add(PARAM_STRING, m_list.m_stringCache.Keep(text)); }
+    void AddText(unsigned char const* text, unsigned long size)
+    {
+        std::string_view const bytes(reinterpret_cast<char const*>(text), size);
+        Add(PARAM_STRING, [&] { return m_list->m_stringCache.Keep(bytes); });
+    }
 
-    void AddInteger(int value) { Add(PARAM_INT, m_list.m_intCache.Keep(value)); }
+    void AddBinary(unsigned char const* bytes, unsigned long size)
+    {
+        Add(PARAM_BINSTRING, [&] { return m_list->m_binCache.Keep(BIN_STRING(bytes, size)); });
+    }
+
+    void AddInteger(int value)
+    {
+        Add(PARAM_INT, [&] { return m_list->m_intCache.Keep(value); });
+    }
 
     void AddDouble(void (IMPORT_INTERN::*get)(double&))
     {
         double value;
         (m_cursor.*get)(value);
-        Add(PARAM_DOUBLE, m_list.Cached(value));
+        Add(PARAM_DOUBLE, [&] { return m_list->Cached(value); });
     }
 
     void AddInteger64()
@@ -207,17 +219,21 @@ private:
         PARAM_TYPE type;
         unsigned long long value;
         m_cursor.GetPoly64(type, value);
-        Add(type, m_list.Cached(type, &value));
+        Add(type, [&] { return m_list->Cached(type, &value); });
     }
 
-    void Add(PARAM_TYPE type, void const* cachedValue)
+    // cached: puts the value into a cache of the list and gives its address there.
+    template <typename CACHED>
+    void Add(PARAM_TYPE type, CACHED cached)
     {
+        if (m_list == nullptr)
+            return;
         if (m_cachedKey == nullptr)
-            m_cachedKey = m_list.m_keyCache.Keep(m_key);
-        m_list.Add(m_cachedKey, type, cachedValue, FixPos(m_fixNext, m_pos));
+            m_cachedKey = m_list->m_keyCache.Keep(m_key);
+        m_list->Add(m_cachedKey, type, cached(), FixPos(m_fixNext, m_pos));
     }
 
-    SETMULTIPAR_LIST& m_list;
+    SETMULTIPAR_LIST* const m_list;
     IMPORT_INTERN m_cursor;
     bool const m_fixPositions;
     bool m_fixNext = false;  // the next value is the first behind a key whose position is to be fixed
@@ -226,19 +242,30 @@ private:
     char const* m_cachedKey = nullptr;  // the list's copy of the current key, once it was needed
 };
 
-bool STICKET_BINSTREAM::Read(SETMULTIPAR_LIST& list, void const* data, unsigned long size, bool fixPositions)
+bool STICKET_BINSTREAM::ReadAll(SETMULTIPAR_LIST* list, void const* data, unsigned long size,
+                                bool fixPositions)
 {
     if (size == 0)
         return true;
     try
     {
-        RECORDS(list, data, size, fixPositions).AddAll();
+        RECORDS(list, data, size, fixPositions).TakeAll();
         return true;
     }
     catch (...)  // a broken stream, or no memory: what was read stays in the list
     {
         return false;
     }
+}
+
+bool STICKET_BINSTREAM::Read(SETMULTIPAR_LIST& list, void const* data, unsigned long size, bool fixPositions)
+{
+    return ReadAll(&list, data, size, fixPositions);
+}
+
+bool STICKET_BINSTREAM::Check(void const* data, unsigned long size)
+{
+    return ReadAll(nullptr, data, size, false);
 }
 
 bool STICKET_BINSTREAM::Read(STICKET_ACCESS const* ticket, void const* data, unsigned long size,

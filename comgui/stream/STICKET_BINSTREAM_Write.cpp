@@ -8,12 +8,6 @@ using namespace comgui::detail;
 
 namespace
 {
-// Calls of what is rarely needed, or takes long anyway, leave the registers of the loop over a table alone.
-#define COMGUI_OUT_OF_LINE __attribute__((noinline))
-
-constexpr char const* WholeTicket = "";  // prefix and limit of a walk
-constexpr int WalkLimit = 8000;
-
 // Eight bytes a step: the lowest byte that differs is the first, as the target is little-endian.
 unsigned long SharedBytes(char const* left, char const* right, unsigned long limit)
 {
@@ -87,7 +81,7 @@ public:
     }
 
 private:
-    COMGUI_OUT_OF_LINE char* PutSignature(char* to)
+    [[gnu::noinline]] char* PutSignature(char* to)
     {
         m_writer.first = false;
         return PutBytes(to, ITEM_FULL_KEY, TicketSignature);
@@ -159,7 +153,8 @@ private:
         return to;
     }
 
-    COMGUI_OUT_OF_LINE char* PutBytes(char* to, unsigned char itemClass, std::string_view bytes)
+    // Out of line, as its text takes long anyway, and the loop over the records keeps its registers.
+    [[gnu::noinline]] char* PutBytes(char* to, unsigned char itemClass, std::string_view bytes)
     {
         to = PutItemTag(m_chunk.Room(to, MaxItemHeader), itemClass, bytes.size());
         return m_chunk.Put(to, bytes);
@@ -302,8 +297,7 @@ STICKET_BINSTREAM::WRITE Written(SETMULTIPAR* table, unsigned long reserve)
 STICKET_BINSTREAM::WRITE Written(STICKET_ACCESS const* ticket, unsigned long reserve)
 {
     STICKET_BINSTREAM::WRITE writer(reserve);
-    ticket->SWALKPARAMETERS(ticket->Instance, STICKET_BINSTREAM::ExportAction, &writer, WholeTicket,
-                            WalkLimit);
+    Walk(ticket, STICKET_BINSTREAM::ExportAction, &writer);
     return writer;
 }
 

@@ -45,7 +45,7 @@ private:
     std::size_t m_nextSize = FirstSize;
 
     static constexpr std::size_t FirstSize = 512;
-    static constexpr std::size_t LargestSize = 32 * 1024 * 1024;
+    static constexpr std::size_t LargestSize = 32ul * 1024 * 1024;
 };
 
 // Lets a standard container take its nodes from a pool, which must outlive it.

@@ -20,7 +20,7 @@ typedef int (*SGETMULTIPAR)(void* Instance, GETMULTIPAR* table);
 typedef bool (*SWALKPARAMETERS_ACTION)(void* context, char const* key, PARAM_TYPE type, void const* value,
                                        int pos);
 
-// Calls action for each parameter. This library always passes the prefix "" and the limit 8000.
+// Calls action for each parameter. This library always walks with comgui::detail::Walk, below.
 typedef int (*SWALKPARAMETERS)(void* Instance, SWALKPARAMETERS_ACTION action, void* context,
                                char const* prefix, int limit);
 
@@ -64,3 +64,12 @@ static_assert(offsetof(STICKET_ACCESS, SSETPARAMETER) == 208);
 static_assert(offsetof(STICKET_ACCESS, SSETMULTIPAR) == 216);
 static_assert(offsetof(STICKET_ACCESS, reserved224) == 224);
 static_assert(offsetof(STICKET_ACCESS, SOPTION) == 232);
+
+namespace comgui::detail
+{
+// Walks over the whole ticket: every walk of this library.
+inline int Walk(STICKET_ACCESS const* ticket, SWALKPARAMETERS_ACTION action, void* context)
+{
+    return ticket->SWALKPARAMETERS(ticket->Instance, action, context, "", 8000);
+}
+}  // namespace comgui::detail

@@ -1,6 +1,9 @@
 #include "comgui/ticket/STRINGCACHE.h"
 
 #include <gtest/gtest.h>
+#include <map>
+#include <random>
+#include <string>
 
 TEST(STRINGCACHE, Call_ReplacesTheArgumentByItsCachedCopy)
 {
@@ -53,4 +56,74 @@ TEST(STRINGCACHE, Clear_LeavesACacheThatWorks)
     cache["text"];
     cache.clear();
     EXPECT_STREQ(cache["text"], "text");
+}
+
+TEST(STRINGCACHE, EmptyText_IsATextLikeOthers)
+{
+    STRINGCACHE cache;
+    char const* const empty = cache[""];
+    ASSERT_NE(empty, nullptr);
+    EXPECT_STREQ(empty, "");
+    cache["text"];
+    EXPECT_EQ(cache[""], empty);
+}
+
+TEST(STRINGCACHE, BeginningOfAnother_IsATextOfItsOwn)
+{
+    STRINGCACHE cache;
+    char const* const whole = cache["whole"];
+    char const* const beginning = cache["who"];
+    EXPECT_NE(whole, beginning);
+    EXPECT_STREQ(whole, "whole");
+    EXPECT_STREQ(beginning, "who");
+    EXPECT_EQ(cache["whole"], whole);
+}
+
+TEST(STRINGCACHE, Keep_TakesBytesThatNoZeroByteFollows)
+{
+    STRINGCACHE cache;
+    EXPECT_STREQ(cache.Keep(std::string_view("text and more", 4)), "text");
+    EXPECT_EQ(cache.Keep("text"), cache["text"]);
+}
+
+TEST(STRINGCACHE, Keep_EndsAtTheFirstZeroByte)
+{
+    STRINGCACHE cache;
+    EXPECT_EQ(cache.Keep(std::string_view("be\0af", 5)), cache["be"]);
+    EXPECT_EQ(cache.Keep(std::string_view("be\0other", 8)), cache["be"]);
+    EXPECT_EQ(cache.Keep(std::string_view("\0af", 3)), cache[""]);
+}
+
+TEST(STRINGCACHE, Keep_NoBytesAtAll_IsTheEmptyText)
+{
+    STRINGCACHE cache;
+    EXPECT_STREQ(cache.Keep(std::string_view()), "");
+    EXPECT_EQ(cache.Keep(std::string_view()), cache[""]);
+}
+
+TEST(STRINGCACHE, Text_IsCopiedAndNotKeptInPlace)
+{
+    STRINGCACHE cache;
+    std::string source = "text";
+    char const* const kept = cache[source.c_str()];
+    source = "____";
+    EXPECT_STREQ(kept, "text");
+}
+
+TEST(STRINGCACHE, ManyTexts_AreOneForOneAsInAMap)
+{
+    STRINGCACHE cache;
+    std::mt19937 random(1);
+    std::map<std::string, char const*> known;
+    for (int i = 0; i < 20000; ++i)
+    {
+        std::string text(random() % 40, 'a');
+        for (char& byte : text)
+            byte = static_cast<char>('a' + random() % 2);
+        char const* const kept = cache[text.c_str()];
+        ASSERT_EQ(kept, text);
+        ASSERT_EQ(known.emplace(text, kept).first->second, kept);
+    }
+    for (auto const& [text, kept] : known)
+        ASSERT_EQ(kept, text);
 }
