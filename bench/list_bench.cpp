@@ -127,8 +127,10 @@ int main(int argc, char** argv)
 {
     benchmark::RegisterBenchmark("Build/job/comgui", Build, JobTicket, MakeComguiBuilder);
     benchmark::RegisterBenchmark("Build/job/protobuf", Build, JobTicket, MakeProtobufBuilder);
+    benchmark::RegisterBenchmark("Build/job/protobuf_heap", Build, JobTicket, MakeProtobufHeapBuilder);
     benchmark::RegisterBenchmark("Build/system/comgui", Build, SystemTicket, MakeComguiBuilder);
     benchmark::RegisterBenchmark("Build/system/protobuf", Build, SystemTicket, MakeProtobufBuilder);
+    benchmark::RegisterBenchmark("Build/system/protobuf_heap", Build, SystemTicket, MakeProtobufHeapBuilder);
     benchmark::RegisterBenchmark("Contains/prefix200/comgui", Contains<PARTIAL_MODE>, MakePartialMode);
     benchmark::RegisterBenchmark("Contains/prefix200/linear", Contains<LINEAR_FILTER>,
                                  [](std::vector<std::string> const& patterns)

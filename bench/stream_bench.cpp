@@ -92,12 +92,13 @@ void RegisterAll()
     {
         benchmark::RegisterBenchmark((std::string("Write/") + workload.name + "/memcpy").c_str(), Copy,
                                      workload);
-        for (FORMAT const format :
-             {FORMAT{"comgui", MakeComgui}, FORMAT{"protobuf", MakeProtobuf}, FORMAT{"msgpack", MakeMsgpack},
-              FORMAT{"ipp", MakeIpp}, FORMAT{"cbor", MakeCbor}})
+        for (FORMAT const format : {FORMAT{"comgui", MakeComgui}, FORMAT{"protobuf", MakeProtobuf},
+                                    FORMAT{"protobuf_heap", MakeProtobufHeap}, FORMAT{"msgpack", MakeMsgpack},
+                                    FORMAT{"ipp", MakeIpp}, FORMAT{"cbor", MakeCbor}})
             Register(workload, format);
     }
     Register({"vector", BigVector}, {"protobuf_each", MakeProtobufEach});
+    Register({"vector", BigVector}, {"protobuf_each_heap", MakeProtobufEachHeap});
 }
 }  // namespace
 

@@ -40,9 +40,12 @@ public:
 std::unique_ptr<PEER> MakeComgui();
 std::unique_ptr<PEER> MakeProtobuf();      // a vector is one packed field
 std::unique_ptr<PEER> MakeProtobufEach();  // each value of a vector is a message
+std::unique_ptr<PEER> MakeProtobufHeap();
+std::unique_ptr<PEER> MakeProtobufEachHeap();
 std::unique_ptr<PEER> MakeMsgpack();
 std::unique_ptr<PEER> MakeIpp();
 std::unique_ptr<PEER> MakeCbor();
 
 std::unique_ptr<BUILDER> MakeComguiBuilder();
 std::unique_ptr<BUILDER> MakeProtobufBuilder();
+std::unique_ptr<BUILDER> MakeProtobufHeapBuilder();

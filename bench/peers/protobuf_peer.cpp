@@ -143,7 +143,7 @@ void TellTicket(peers::Ticket const& ticket, COMPARISON& comparison)
 class PROTOBUF : public PEER, public BUILDER
 {
 public:
-    explicit PROTOBUF(bool packVectors) : packed(packVectors) {}
+    PROTOBUF(bool packVectors, bool useArena) : packed(packVectors), inArena(useArena) {}
 
     std::string_view Write(SETMULTIPAR* table) override
     {
@@ -186,6 +186,11 @@ private:
     template <typename Use>
     std::size_t WithTicket(Use use)
     {
+        if (!inArena)
+        {
+            peers::Ticket ticket;
+            return use(ticket);
+        }
         return block.With([&](Arena& arena) { return use(*Arena::CreateMessage<peers::Ticket>(&arena)); });
     }
 
@@ -197,12 +202,16 @@ private:
     }
 
     bool packed;
+    bool inArena;
     BLOCK block;
     peers::Ticket toWrite;
     std::string written;
 };
 }  // namespace
 
-std::unique_ptr<PEER> MakeProtobuf() { return std::make_unique<PROTOBUF>(true); }
-std::unique_ptr<PEER> MakeProtobufEach() { return std::make_unique<PROTOBUF>(false); }
-std::unique_ptr<BUILDER> MakeProtobufBuilder() { return std::make_unique<PROTOBUF>(true); }
+std::unique_ptr<PEER> MakeProtobuf() { return std::make_unique<PROTOBUF>(true, true); }
+std::unique_ptr<PEER> MakeProtobufEach() { return std::make_unique<PROTOBUF>(false, true); }
+std::unique_ptr<PEER> MakeProtobufHeap() { return std::make_unique<PROTOBUF>(true, false); }
+std::unique_ptr<PEER> MakeProtobufEachHeap() { return std::make_unique<PROTOBUF>(false, false); }
+std::unique_ptr<BUILDER> MakeProtobufBuilder() { return std::make_unique<PROTOBUF>(true, true); }
+std::unique_ptr<BUILDER> MakeProtobufHeapBuilder() { return std::make_unique<PROTOBUF>(true, false); }
