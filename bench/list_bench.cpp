@@ -88,6 +88,7 @@ private:
 PARTIAL_MODE MakePartialMode(std::vector<std::string> const& patterns)
 {
     std::vector<char const*> table;
+    table.reserve(patterns.size() + 1);
     for (std::string const& pattern : patterns)
         table.push_back(pattern.c_str());
     table.push_back(nullptr);
