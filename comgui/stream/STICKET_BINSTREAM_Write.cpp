@@ -3,6 +3,7 @@
 #include "comgui/stream/STICKET_BINSTREAM.h"
 #include "comgui/stream/ticket_items.h"
 #include <algorithm>
+#include <exception>
 
 using namespace comgui::detail;
 
@@ -173,8 +174,15 @@ private:
 
 STICKET_BINSTREAM::WRITE::WRITE(unsigned long reserve)
 {
-    if (reserve != 0)
-        data.reserve(reserve);
+    try
+    {
+        if (reserve != 0)
+            data.reserve(reserve);
+    }
+    catch (std::exception const&)
+    {
+        // Only a hint: the stream may turn out smaller.
+    }
 }
 
 bool STICKET_BINSTREAM::WRITE::SetParameter(char const* key, PARAM_TYPE type, void const* value, int position)
@@ -188,6 +196,7 @@ void STICKET_BINSTREAM::WRITE::SetMultiParameter(SETMULTIPAR* table)
 {
     if (table == nullptr)
         return;
+    SETMULTIPAR* const begin = table;
     try
     {
         if (!failed && table->key)
@@ -202,6 +211,9 @@ void STICKET_BINSTREAM::WRITE::SetMultiParameter(SETMULTIPAR* table)
     catch (...)  // an overflow, or no memory: there is no stream from here on
     {
         failed = true;
+        if (table->key == nullptr)  // it failed behind them all, so the last that was put has failed
+            while (table != begin && !(--table)->ok)
+                continue;
     }
     for (; table->key; ++table)  // from the one that failed on
         table->ok = false;
