@@ -29,7 +29,7 @@ struct TEXT
     static ENTRY* Make(void* place, VALUE text, HASH hash, POOL& pool)
     {
         char* const copy = static_cast<char*>(pool.Take(text.size() + 1, 1));
-        std::memcpy(copy, text.data(), text.size());
+        text.copy(copy, text.size());  // no bytes may be a null address
         copy[text.size()] = '\0';
         return new (place) ENTRY{copy, text.size(), hash};
     }
