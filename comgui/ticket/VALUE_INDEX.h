@@ -53,7 +53,7 @@ inline bool SameBytes(char const* left, char const* right, std::size_t size)
 // Sixteen bytes a step; the last step looks at the last bytes, which may overlap those before.
 inline HASH HashOfBytes(char const* bytes, std::size_t size, HASH seed)
 {
-    HASH hash = seed ^ size;
+    HASH hash = seed ^ size * 0xD6E8FEB86659FD93;
     HASH head = 0;
     HASH tail = 0;
     if (size >= 8)
