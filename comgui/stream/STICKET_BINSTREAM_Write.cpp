@@ -9,22 +9,29 @@ using namespace comgui::detail;
 
 namespace
 {
-// Eight bytes a step: the lowest byte that differs is the first, as the target is little-endian.
 unsigned long SharedBytes(char const* left, char const* right, unsigned long limit)
 {
+    constexpr unsigned long step = sizeof(std::uint64_t);
     unsigned long shared = 0;
-    for (; shared + sizeof(std::uint64_t) <= limit; shared += sizeof(std::uint64_t))
+    if (limit < step)
+    {
+        while (shared < limit && left[shared] == right[shared])
+            ++shared;
+        return shared;
+    }
+    // The last step looks at the last bytes, which may overlap those before.
+    for (;; shared = std::min(shared + step, limit - step))
     {
         std::uint64_t leftWord;
         std::uint64_t rightWord;
         std::memcpy(&leftWord, left + shared, sizeof leftWord);
         std::memcpy(&rightWord, right + shared, sizeof rightWord);
+        // The lowest byte that differs is the first, as the target is little-endian.
         if (leftWord != rightWord)
             return shared + static_cast<unsigned long>(std::countr_zero(leftWord ^ rightWord)) / 8;
+        if (shared == limit - step)
+            return limit;
     }
-    while (shared < limit && left[shared] == right[shared])
-        ++shared;
-    return shared;
 }
 
 // The types that a stream holds, a bit each: no pointers and no counts. Of a null value it holds only that a
