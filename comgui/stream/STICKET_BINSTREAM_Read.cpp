@@ -135,7 +135,8 @@ private:
             throw "Wrong signature";
     }
 
-    void TakeItem()
+    // Part of the loop over the items, with the rarer and longer ones out of its way.
+    [[gnu::always_inline]] void TakeItem()
     {
         unsigned long size;
         switch (m_cursor.TakeTag(size))
@@ -191,13 +192,13 @@ private:
         }
     }
 
-    void AddText(unsigned char const* text, unsigned long size)
+    [[gnu::noinline]] void AddText(unsigned char const* text, unsigned long size)
     {
         std::string_view const bytes(reinterpret_cast<char const*>(text), size);
         Add(PARAM_STRING, [&] { return m_list->m_stringCache.Keep(bytes); });
     }
 
-    void AddBinary(unsigned char const* bytes, unsigned long size)
+    [[gnu::noinline]] void AddBinary(unsigned char const* bytes, unsigned long size)
     {
         Add(PARAM_BINSTRING, [&] { return m_list->m_binCache.Keep(BIN_STRING(bytes, size)); });
     }
@@ -207,14 +208,14 @@ private:
         Add(PARAM_INT, [&] { return m_list->m_intCache.Keep(value); });
     }
 
-    void AddDouble(void (IMPORT_INTERN::*get)(double&))
+    [[gnu::noinline]] void AddDouble(void (IMPORT_INTERN::*get)(double&))
     {
         double value;
         (m_cursor.*get)(value);
         Add(PARAM_DOUBLE, [&] { return m_list->Cached(value); });
     }
 
-    void AddInteger64()
+    [[gnu::noinline]] void AddInteger64()
     {
         PARAM_TYPE type;
         unsigned long long value;
