@@ -138,7 +138,9 @@ int main(int argc, char** argv)
                                  { return LINEAR_FILTER(patterns); });
     return RunAndReport(
         argc, argv,
-        {{"build, job ticket", "Build/job/comgui", "Build/job/protobuf", 0.35},
+        {{"build, job ticket", "Build/job/comgui", "Build/job/protobuf_heap", 0.35},
+         {"build, job ticket", "Build/job/comgui", "Build/job/protobuf", 0.35},
+         {"build, system ticket", "Build/system/comgui", "Build/system/protobuf_heap", 0.40},
          {"build, system ticket", "Build/system/comgui", "Build/system/protobuf", 0.40},
          {"key filter, 200 patterns", "Contains/prefix200/comgui", "Contains/prefix200/linear", 0.65}});
 }
