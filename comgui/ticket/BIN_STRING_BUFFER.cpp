@@ -16,8 +16,11 @@ BIN_STRING_BUFFER::BIN_STRING_BUFFER(BIN_STRING_BUFFER const& source) : m_bytes(
 
 BIN_STRING_BUFFER& BIN_STRING_BUFFER::operator=(BIN_STRING_BUFFER const& source)
 {
-    m_bytes = source.m_bytes;
-    PointAtOwnBytes();
+    if (this != &source)
+    {
+        m_bytes = source.m_bytes;
+        PointAtOwnBytes();
+    }
     return *this;
 }
 
