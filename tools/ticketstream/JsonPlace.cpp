@@ -1,0 +1,137 @@
+#include "tools/ticketstream/JsonPlace.h"
+
+#include "tools/ticketstream/Trouble.h"
+#include "tools/ticketstream/text.h"
+#include <algorithm>
+
+namespace ticketstream
+{
+namespace
+{
+struct MemberRule
+{
+    Part owner;
+    char const* name;
+    Part part;
+};
+constexpr MemberRule Rules[] = {
+    {Part::Document, "stream", Part::Scalar},
+    {Part::Document, "records", Part::Records},
+    {Part::Document, "operations", Part::Operations},
+    {Part::Operation, "ticketType", Part::Scalar},
+    {Part::Operation, "ticketId", Part::Scalar},
+    {Part::Operation, "operation", Part::Scalar},
+    {Part::Operation, "records", Part::Records},
+    {Part::Operation, "keys", Part::Keys},
+    {Part::Operation, "payload", Part::Bytes},
+    {Part::Record, "key", Part::Bytes},
+    {Part::Record, "type", Part::Scalar},
+    {Part::Record, "pos", Part::Scalar},
+    {Part::Record, "value", Part::Bytes},
+    {Part::Bytes, "hex", Part::Scalar},
+};
+
+MemberRule const* RuleOf(Part owner, std::string const& name)
+{
+    auto const* const found =
+        std::find_if(std::begin(Rules), std::end(Rules),
+                     [&](MemberRule const& rule) { return rule.owner == owner && rule.name == name; });
+    return found == std::end(Rules) ? nullptr : found;
+}
+
+std::string MembersOf(Part owner)
+{
+    std::string names;
+    for (MemberRule const& rule : Rules)
+        if (rule.owner == owner)
+            names += (names.empty() ? "\"" : ", \"") + std::string(rule.name) + '"';
+    return names;
+}
+
+bool IsList(Part part) { return part == Part::Records || part == Part::Operations || part == Part::Keys; }
+
+char const* Needed(Part part)
+{
+    if (IsList(part))
+        return "a list is needed here";
+    return part == Part::Scalar ? "a number or a text is needed here" : "an object is needed here";
+}
+
+// As JSON pointers have it.
+std::string Escaped(std::string const& member)
+{
+    std::string text;
+    for (char const c : member)
+        text += c == '~' ? "~0" : c == '/' ? "~1" : std::string(1, c);
+    return text;
+}
+}  // namespace
+
+Part JsonPlace::Expected() const
+{
+    if (m_levels.empty())
+        return Part::Document;
+    Level const& level = m_levels.back();
+    switch (level.part)
+    {
+    case Part::Records:
+        return Part::Record;
+    case Part::Operations:
+        return Part::Operation;
+    case Part::Keys:
+        return Part::Bytes;
+    default:
+        return RuleOf(level.part, level.member)->part;
+    }
+}
+
+void JsonPlace::Begin(bool isArray)
+{
+    Part const part = Expected();
+    if (part == Part::Scalar || IsList(part) != isArray)
+        throw WrongJson(Text(), Needed(part));
+    m_levels.push_back({part, isArray, 0, {}, {}});
+}
+
+Part JsonPlace::End()
+{
+    Part const part = m_levels.back().part;
+    m_levels.pop_back();
+    return part;
+}
+
+void JsonPlace::Next()
+{
+    if (!m_levels.empty() && m_levels.back().isArray)
+        ++m_levels.back().index;
+}
+
+void JsonPlace::Scalar()
+{
+    Part const part = Expected();
+    if (part != Part::Scalar && part != Part::Bytes)
+        throw WrongJson(Text(), Needed(part));
+}
+
+void JsonPlace::Member(std::string const& name)
+{
+    Level& level = m_levels.back();
+    if (RuleOf(level.part, name) == nullptr)
+        throw WrongJson(Text(), "unknown member " + Shown(name, 40) + "; known are " + MembersOf(level.part));
+    level.member = name;
+    if (std::find(level.members.begin(), level.members.end(), name) != level.members.end())
+        throw WrongJson(Text(), "given twice");
+    level.members.push_back(name);
+}
+
+std::string JsonPlace::Text() const
+{
+    std::string text;
+    for (Level const& level : m_levels)
+        if (level.isArray)
+            text += '/' + std::to_string(level.index);
+        else if (!level.member.empty())
+            text += '/' + Escaped(level.member);
+    return text;
+}
+}  // namespace ticketstream
