@@ -1,0 +1,95 @@
+// What docs/stream-formats.md shows is what the library and the tool do.
+#include "tests/tools/Streams.h"
+#include "tools/ticketstream/ItemWalk.h"
+#include "tools/ticketstream/OperationWalk.h"
+#include "tools/ticketstream/json.h"
+#include "tools/ticketstream/make.h"
+#include <fstream>
+#include <gtest/gtest.h>
+#include <regex>
+#include <sstream>
+
+using namespace ticketstream;
+
+namespace
+{
+std::string Page()
+{
+    std::ifstream file(STREAM_FORMATS);
+    std::stringstream text;
+    text << file.rdbuf();
+    return text.str();
+}
+
+// What stands behind the words, to the end of the paragraph.
+std::string Behind(std::string const& words)
+{
+    std::string const page = Page();
+    std::size_t const from = page.find(words);
+    if (from == std::string::npos)
+        throw std::runtime_error("the page does not say: " + words);
+    return page.substr(from + words.size(), page.find("\n\n", from + words.size()) - from - words.size());
+}
+
+// The pairs of digits in the text, without what follows a wide gap behind them.
+std::string BytesIn(std::string const& text)
+{
+    std::regex const line("\n +([0-9A-F]{2}( +[0-9A-F]{2})*)( {4}.*)?(?=\n|$)");
+    std::string hex;
+    for (std::sregex_iterator match(text.begin(), text.end(), line), end; match != end; ++match)
+        hex += (*match)[1];
+    return BytesOf(hex);
+}
+}  // namespace
+
+TEST(StreamFormats, TicketByteByByte_IsTheStreamOfTheTests)
+{
+    std::string const listing = Behind("    offset  bytes                               what it says");
+    std::regex const line("\n +([0-9]+)  (([0-9A-F]{2} )+) ");
+    std::string stream;
+    for (std::sregex_iterator match(listing.begin(), listing.end(), line), end; match != end; ++match)
+    {
+        EXPECT_EQ(std::stoul((*match)[1]), stream.size());
+        stream += BytesOf((*match)[2].str());
+    }
+    EXPECT_EQ(HexOf(stream), HexOf(Streams::Job()));
+}
+
+TEST(StreamFormats, OperationThatDeletes_IsWhatTheWriterMakes)
+{
+    MTICKET_BINSTREAM::Write writer(0);
+    writer.PutVoidOperation(3, 12, MTICKET_OP_DELETE);
+    std::string stream;
+    writer.GetAndClear(stream);
+    EXPECT_EQ(stream.size(), 25u);
+    EXPECT_EQ(HexOf(BytesIn(Behind("the nine of the signature, then\n"))), HexOf(stream.substr(9)));
+}
+
+TEST(StreamFormats, TableOfKeys_IsWhatTheWriterMakes)
+{
+    char const* const keys[] = {"Job/*", "System/Name", nullptr};
+    MTICKET_BINSTREAM::Write writer(0);
+    writer.PutPartialTableOperation(3, 1, STICKET_OP_SET_PARTIAL, keys);
+    std::string stream;
+    writer.GetAndClear(stream);
+    EXPECT_EQ(HexOf(BytesIn(Behind("`Job/*` and `System/Name` make 35 bytes:\n"))), HexOf(stream.substr(25)));
+}
+
+TEST(StreamFormats, Json_IsTakenByMakeAndPrintedAlike)
+{
+    std::string const samples = Behind("```json\n");
+    std::size_t const second = samples.find("{\"stream\": \"MTICKET_1\"");
+    std::string const ticket = samples.substr(0, second);
+    std::string const container = samples.substr(second, samples.find("```") - second);
+
+    Output out;
+    PrintJson(MakeStream(ticket), out);
+    EXPECT_EQ(out.Text(), ticket);
+
+    std::string const stream = MakeStream(container);
+    OperationWalk walk(stream);
+    std::vector<int> codes;
+    while (walk.Next())
+        codes.push_back(walk.Current().code);
+    EXPECT_EQ(codes, (std::vector<int>{98, 3, 7, 106}));
+}
