@@ -11,17 +11,18 @@
 
 namespace
 {
-// Mostly a key near the one before, at times far longer than the input: sizes past every form of a tag.
-std::string NextKey(INPUT& input, std::string const& previous)
+// Mostly a key near the one before. The first few may be far longer than the input: past every form of a tag,
+// and of the number of bytes that a key shares.
+std::string NextKey(INPUT& input, std::string const& previous, std::size_t longest)
 {
     auto const choice = input.Take<std::uint8_t>();
     std::string key = choice & 1 ? previous : previous.substr(0, previous.size() * (choice >> 4) / 15);
     if (choice & 2)
         key += input.Bytes(input.Take<std::uint8_t>() % 24);
-    if (choice & 4)
+    if ((choice & 12) == 12)
         key.append(input.Take<std::uint16_t>() % 17000, 'k');
     std::replace(key.begin(), key.end(), '\0', '0');  // keys are C texts
-    return key.substr(0, 40000);
+    return key.substr(0, longest);
 }
 
 int NextPosition(INPUT& input, int previous)
@@ -79,20 +80,20 @@ double NextNumber(INPUT& input)
 std::string NextText(INPUT& input)
 {
     auto const size = input.Take<std::uint16_t>();
-    return input.Bytes(size % 40) + std::string(size % 3 == 0 ? size % 5000 : 0, 't');
+    return input.Bytes(size % 40) + std::string(size % 16 == 0 ? size % 5000 : 0, 't');
 }
 
 std::vector<MODEL_RECORD> Records(INPUT& input)
 {
     std::vector<MODEL_RECORD> records;
     MODEL_RECORD record;
-    while (!input.IsEmpty() && records.size() < 200)
+    while (!input.IsEmpty() && records.size() < 60)
     {
         auto const choice = input.Take<std::uint8_t>();
         record.type = static_cast<PARAM_TYPE>(choice % 16);
         record.isNull = ((choice & 0x70) == 0x70) != (record.type == PARAM_NONE);
         if (choice & 0x80)
-            record.key = NextKey(input, record.key);
+            record.key = NextKey(input, record.key, records.size() < 3 ? 20000 : 300);
         record.pos = NextPosition(input, record.pos);
         record.integer = NextInteger(input);
         record.number = NextNumber(input);

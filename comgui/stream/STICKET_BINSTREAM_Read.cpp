@@ -276,8 +276,18 @@ bool STICKET_BINSTREAM::Read(STICKET_ACCESS const* ticket, void const* data, uns
     if (size == 0)
         return true;
     SETMULTIPAR_LIST list(false);
-    return Read(list, data, size, fixPositions) &&
-           ticket->SSETMULTIPAR(ticket->Instance, list.Table(false)) != 0;
+    SETMULTIPAR* table;
+    try
+    {
+        if (!Read(list, data, size, fixPositions))
+            return false;
+        table = list.Table(false);
+    }
+    catch (std::bad_alloc const&)
+    {
+        return false;
+    }
+    return ticket->SSETMULTIPAR(ticket->Instance, table) != 0;
 }
 
 bool STICKET_BINSTREAM::Read(STICKET_ACCESS const* ticket, char const* filename)

@@ -3,27 +3,35 @@
 #include "comgui/stream/STICKET_BINSTREAM.h"
 #include "comgui/stream/ticket_items.h"
 #include <algorithm>
+#include <exception>
 
 using namespace comgui::detail;
 
 namespace
 {
-// Eight bytes a step: the lowest byte that differs is the first, as the target is little-endian.
 unsigned long SharedBytes(char const* left, char const* right, unsigned long limit)
 {
+    constexpr unsigned long step = sizeof(std::uint64_t);
     unsigned long shared = 0;
-    for (; shared + sizeof(std::uint64_t) <= limit; shared += sizeof(std::uint64_t))
+    if (limit < step)
+    {
+        while (shared < limit && left[shared] == right[shared])
+            ++shared;
+        return shared;
+    }
+    // The last step looks at the last bytes, which may overlap those before.
+    for (;; shared = std::min(shared + step, limit - step))
     {
         std::uint64_t leftWord;
         std::uint64_t rightWord;
         std::memcpy(&leftWord, left + shared, sizeof leftWord);
         std::memcpy(&rightWord, right + shared, sizeof rightWord);
+        // The lowest byte that differs is the first, as the target is little-endian.
         if (leftWord != rightWord)
             return shared + static_cast<unsigned long>(std::countr_zero(leftWord ^ rightWord)) / 8;
+        if (shared == limit - step)
+            return limit;
     }
-    while (shared < limit && left[shared] == right[shared])
-        ++shared;
-    return shared;
 }
 
 // The types that a stream holds, a bit each: no pointers and no counts. Of a null value it holds only that a
@@ -173,8 +181,15 @@ private:
 
 STICKET_BINSTREAM::WRITE::WRITE(unsigned long reserve)
 {
-    if (reserve != 0)
-        data.reserve(reserve);
+    try
+    {
+        if (reserve != 0)
+            data.reserve(reserve);
+    }
+    catch (std::exception const&)
+    {
+        // Only a hint: the stream may turn out smaller.
+    }
 }
 
 bool STICKET_BINSTREAM::WRITE::SetParameter(char const* key, PARAM_TYPE type, void const* value, int position)
@@ -188,6 +203,7 @@ void STICKET_BINSTREAM::WRITE::SetMultiParameter(SETMULTIPAR* table)
 {
     if (table == nullptr)
         return;
+    SETMULTIPAR* const begin = table;
     try
     {
         if (!failed && table->key)
@@ -202,6 +218,9 @@ void STICKET_BINSTREAM::WRITE::SetMultiParameter(SETMULTIPAR* table)
     catch (...)  // an overflow, or no memory: there is no stream from here on
     {
         failed = true;
+        if (table->key == nullptr)  // it failed behind them all, so the last that was put has failed
+            while (table != begin && !(--table)->ok)
+                continue;
     }
     for (; table->key; ++table)  // from the one that failed on
         table->ok = false;

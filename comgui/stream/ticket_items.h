@@ -133,15 +133,17 @@ inline char* PutPosition(char* to, int pos)
 
 inline char* PutNumberTag(char* to, NUMBER_FORM form) { return PutItemTag(to, ITEM_NUMBER, form); }
 
+// The shortest form, found without a branch: in a vector of mixed sizes no branch could be foreseen.
 inline char* PutInteger(char* to, int value)
 {
-    if (value == 0)
-        return PutNumberTag(to, NUMBER_ZERO);
-    if (value == static_cast<std::int8_t>(value))
-        return PutByte(PutNumberTag(to, NUMBER_INT8), static_cast<unsigned int>(value));
-    if (value == static_cast<std::int16_t>(value))
-        return PutBytes(PutNumberTag(to, NUMBER_INT16), static_cast<std::uint16_t>(value));
-    return PutBytes(PutNumberTag(to, NUMBER_INT32), static_cast<std::uint32_t>(value));
+    bool const fitsByte = value == static_cast<std::int8_t>(value);
+    bool const fitsShort = value == static_cast<std::int16_t>(value);
+    unsigned int const size = value == 0 ? 0u : unsigned{NUMBER_INT32} >> (fitsByte + fitsShort);
+    to = PutByte(to, ITEM_NUMBER | size);
+    // The low bytes of the value come first; what stands behind them is overwritten by the next item.
+    auto const bits = static_cast<std::uint64_t>(static_cast<std::uint32_t>(value)) << (32 - 8 * size);
+    PutBytes(to, static_cast<std::uint32_t>(bits));
+    return to + size;
 }
 
 inline char* PutSingle(char* to, float value)

@@ -29,7 +29,7 @@ struct TEXT
     static ENTRY* Make(void* place, VALUE text, HASH hash, POOL& pool)
     {
         char* const copy = static_cast<char*>(pool.Take(text.size() + 1, 1));
-        std::memcpy(copy, text.data(), text.size());
+        text.copy(copy, text.size());  // no bytes may be a null address
         copy[text.size()] = '\0';
         return new (place) ENTRY{copy, text.size(), hash};
     }
@@ -50,7 +50,7 @@ public:
     // The same, with the argument left alone.
     char const* operator[](char const* text) { return text ? m_texts.Keep(text).text : nullptr; }
 
-    // The same for bytes that no zero byte need follow. The text ends at the first one within.
+    // The same for bytes, not null, that no zero byte need follow. The text ends at the first one within.
     char const* Keep(std::string_view bytes) { return m_texts.Keep(bytes.substr(0, bytes.find('\0'))).text; }
 
     // Drops all texts; every address given out dies.

@@ -53,7 +53,7 @@ inline bool SameBytes(char const* left, char const* right, std::size_t size)
 // Sixteen bytes a step; the last step looks at the last bytes, which may overlap those before.
 inline HASH HashOfBytes(char const* bytes, std::size_t size, HASH seed)
 {
-    HASH hash = seed ^ size;
+    HASH hash = seed ^ size * 0xD6E8FEB86659FD93;
     HASH head = 0;
     HASH tail = 0;
     if (size >= 8)
@@ -123,6 +123,7 @@ private:
     using NUMBER = std::uint32_t;  // entries count from 1, half the size of their addresses
     static constexpr NUMBER FreeSlot = 0;
     static constexpr unsigned int FirstBlockBits = 4;
+    static constexpr std::size_t ManySlots = 65536;
 
     // Differs from run to run, so that no stream can be made in which all values fall together.
     HASH Seed() const { return Mix(reinterpret_cast<std::uintptr_t>(this), 0xD6E8FEB86659FD93); }
@@ -151,27 +152,28 @@ private:
         return *entry;
     }
 
+    // Sparse slots are found sooner, as long as they all stay in the processor's cache.
     void Grow()
     {
         if (m_count > UINT32_MAX / 4)
             throw std::bad_alloc();
-        m_slotCount = m_slotCount == 0 ? 16 : m_slotCount * 4;
-        m_limit = static_cast<NUMBER>(m_slotCount / 2);
-        std::size_t const size = m_slotCount * sizeof(NUMBER);
+        std::size_t const slotCount = m_slotCount == 0 ? 16 : m_slotCount * 4;
+        std::size_t const size = slotCount * sizeof(NUMBER);
         m_slots = static_cast<NUMBER*>(std::memset(m_pool.Take(size, alignof(NUMBER)), FreeSlot, size));
-        std::size_t const mask = m_slotCount - 1;
+        m_slotCount = slotCount;
+        m_limit = static_cast<NUMBER>(slotCount / (slotCount > ManySlots ? 2 : 4));
         for (NUMBER number = 1; number <= m_count; ++number)
         {
-            std::size_t at = KIND::HashOf(*EntryAt(number), Seed()) & mask;
+            std::size_t at = KIND::HashOf(*EntryAt(number), Seed()) & (slotCount - 1);
             while (m_slots[at] != FreeSlot)
-                at = (at + 1) & mask;
+                at = (at + 1) & (slotCount - 1);
             m_slots[at] = number;
         }
     }
 
     POOL& m_pool;
     NUMBER* m_slots = nullptr;    // the entry whose hash says this place or, if that is taken, one before
-    std::size_t m_slotCount = 0;  // a power of two, more than twice the entries
+    std::size_t m_slotCount = 0;  // a power of two, at least twice the entries
     ENTRY* m_blocks[32 - FirstBlockBits];
     NUMBER m_count = 0;
     NUMBER m_limit = 0;  // how many entries there may be before the slots have to grow

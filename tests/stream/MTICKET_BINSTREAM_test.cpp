@@ -423,10 +423,11 @@ TEST(ParseOperation, NegativePayloadSize_MovesTheCursorBack_ByDesign)
     EXPECT_EQ(walk.op.GetInt(), 3);
 }
 
-// A payload of no bytes would be good. These are looked at, and refused at the first text, within the buffer.
+// A payload of no bytes would be good. This one is looked at, and refused for its first text and its first
+// tag (a text of one byte), both within the buffer.
 TEST(ParseOperation, NegativePayloadSize_MakesAHugePayload_ByDesign)
 {
-    Walk walk(Signature + Operation(3, "x\0"s, -16));
+    Walk walk(Signature + Operation(3, "a\0"s, -16));
     EXPECT_EQ(walk.Next(), OK);
     EXPECT_EQ(walk.Keys(), ERROR);
     SETMULTIPAR_LIST list(false);

@@ -33,7 +33,7 @@ inline std::string BytesOf(std::string_view hex)
         if (value == std::string_view::npos)
             throw std::invalid_argument("no hexadecimal digit");
         if (isHalf)
-            bytes.back() = static_cast<char>(static_cast<unsigned char>(bytes.back()) << 4 | value);
+            bytes.back() = static_cast<char>(static_cast<std::size_t>(bytes.back()) << 4 | value);
         else
             bytes += static_cast<char>(value);
         isHalf = !isHalf;

@@ -156,11 +156,12 @@ std::vector<RECORD> RecordsOf(SETMULTIPAR const* table)
     return records;
 }
 
-TABLE::TABLE(std::vector<RECORD> const& records) : m_values(records.size()), m_table(records.size() + 1)
+TABLE::TABLE(std::vector<RECORD> records)
+    : m_records(std::move(records)), m_values(m_records.size()), m_table(m_records.size() + 1)
 {
-    for (std::size_t i = 0; i < records.size(); ++i)
+    for (std::size_t i = 0; i < m_records.size(); ++i)
     {
-        RECORD const& record = records[i];
+        RECORD const& record = m_records[i];
         VALUE& value = m_values[i];
         value = {static_cast<int>(record.number),
                  static_cast<unsigned int>(record.number),

@@ -38,12 +38,11 @@ RECORD Delete(std::string key, int pos = -1);
 // The records of a library's table, terminator left out; nothing for null.
 std::vector<RECORD> RecordsOf(SETMULTIPAR const* table);
 
-// A library's table of such records. Its addresses live as long as the object, and the records it was made
-// of must stay as well.
+// A library's table of such records, whose addresses live as long as the object.
 class TABLE
 {
 public:
-    explicit TABLE(std::vector<RECORD> const& records);
+    explicit TABLE(std::vector<RECORD> records);
     TABLE(TABLE const&) = delete;
     TABLE& operator=(TABLE const&) = delete;
 
@@ -63,6 +62,7 @@ private:
             unsigned long size;
         } asBytes;
     };
+    std::vector<RECORD> const m_records;  // own the texts and bytes
     std::vector<VALUE> m_values;
     std::vector<SETMULTIPAR> m_table;
 };

@@ -94,13 +94,6 @@ TEST(STRINGCACHE, Keep_EndsAtTheFirstZeroByte)
     EXPECT_EQ(cache.Keep(std::string_view("\0af", 3)), cache[""]);
 }
 
-TEST(STRINGCACHE, Keep_NoBytesAtAll_IsTheEmptyText)
-{
-    STRINGCACHE cache;
-    EXPECT_STREQ(cache.Keep(std::string_view()), "");
-    EXPECT_EQ(cache.Keep(std::string_view()), cache[""]);
-}
-
 TEST(STRINGCACHE, Text_IsCopiedAndNotKeptInPlace)
 {
     STRINGCACHE cache;

@@ -1,0 +1,99 @@
+#include "bench/ratio_report.h"
+
+#include <algorithm>
+#include <benchmark/benchmark.h>
+#include <cstdio>
+#include <map>
+
+namespace
+{
+double Median(std::vector<double> values)
+{
+    std::sort(values.begin(), values.end());
+    std::size_t const half = values.size() / 2;
+    return values.size() % 2 ? values[half] : (values[half - 1] + values[half]) / 2;
+}
+
+class REPORTER : public benchmark::ConsoleReporter
+{
+public:
+    REPORTER() : ConsoleReporter(OO_Tabular) {}  // no colours: the output is often kept in a file
+
+    void ReportRuns(std::vector<Run> const& runs) override
+    {
+        ConsoleReporter::ReportRuns(runs);
+        for (Run const& run : runs)
+            if (run.error_occurred)
+                failed = true;
+            else if (run.run_type == Run::RT_Iteration)
+                Take(run);
+    }
+
+    void Print(std::vector<GOAL> const& goals) const
+    {
+#ifndef NDEBUG
+        std::puts("\nNot an optimised build: these ratios say nothing about the goals.");
+#endif
+        std::puts("\n| measure | ours | peer | ratio | goal | met |\n|---|---|---|---|---|---|");
+        for (GOAL const& goal : goals)
+            Print(goal);
+    }
+
+    bool Failed() const { return failed; }
+
+private:
+    struct FIGURES
+    {
+        std::vector<double> nanoseconds;
+        std::vector<double> bytes;
+    };
+
+    void Take(Run const& run)
+    {
+        FIGURES& taken = figures[run.run_name.str()];
+        taken.nanoseconds.push_back(run.cpu_accumulated_time * 1e9 / static_cast<double>(run.iterations));
+        auto const bytes = run.counters.find(BytesARecord);
+        if (bytes != run.counters.end())
+            taken.bytes.push_back(bytes->second);
+    }
+
+    std::vector<double> const* Values(std::string const& name, GOAL::KIND kind) const
+    {
+        auto const found = figures.find(name);
+        if (found == figures.end())
+            return nullptr;
+        std::vector<double> const& values =
+            kind == GOAL::CPU_TIME ? found->second.nanoseconds : found->second.bytes;
+        return values.empty() ? nullptr : &values;
+    }
+
+    void Print(GOAL const& goal) const
+    {
+        std::vector<double> const* const ours = Values(goal.ours, goal.kind);
+        std::vector<double> const* const peer = Values(goal.peer, goal.kind);
+        if (!ours || !peer)
+            return;
+        double const ratio = Median(*ours) / Median(*peer);
+        std::printf("| %s | %s %.4g %s | %s %.4g %s | %.3f | %.2f | %s |\n", goal.measure, goal.ours.c_str(),
+                    Median(*ours), Unit(goal), goal.peer.c_str(), Median(*peer), Unit(goal), ratio, goal.most,
+                    ratio <= goal.most ? "yes" : "NO");
+    }
+
+    static char const* Unit(GOAL const& goal) { return goal.kind == GOAL::CPU_TIME ? "ns" : "bytes"; }
+
+    std::map<std::string, FIGURES> figures;
+    bool failed = false;
+};
+}  // namespace
+
+int RunAndReport(int argc, char** argv, std::vector<GOAL> const& goals)
+{
+    benchmark::Initialize(&argc, argv);
+    if (benchmark::ReportUnrecognizedArguments(argc, argv))
+        return 1;
+    REPORTER reporter;
+    benchmark::RunSpecifiedBenchmarks(&reporter);
+    benchmark::Shutdown();
+    reporter.Print(goals);
+    return reporter.Failed() ? 1 : 0;
+}

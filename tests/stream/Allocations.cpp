@@ -1,0 +1,66 @@
+#include "tests/stream/Allocations.h"
+
+#include <atomic>
+#include <cstdlib>
+#include <new>
+
+namespace
+{
+std::atomic<long> live = 0;
+std::atomic<int> failIn = -1;
+std::atomic<bool> hasFailed = false;
+
+void* Allocated(std::size_t size) noexcept
+{
+    if (failIn >= 0 && failIn-- == 0)
+    {
+        hasFailed = true;
+        return nullptr;
+    }
+    void* const block = std::malloc(size != 0 ? size : 1);
+    if (block)
+        ++live;
+    return block;
+}
+
+void* AllocatedOrThrown(std::size_t size)
+{
+    void* const block = Allocated(size);
+    if (block == nullptr)
+        throw std::bad_alloc();
+    return block;
+}
+
+void Freed(void* block) noexcept
+{
+    if (block)
+        --live;
+    std::free(block);
+}
+}  // namespace
+
+// All of them, as a sanitizer brings its own for those that are left out.
+void* operator new(std::size_t size) { return AllocatedOrThrown(size); }
+void* operator new[](std::size_t size) { return AllocatedOrThrown(size); }
+void* operator new(std::size_t size, std::nothrow_t const&) noexcept { return Allocated(size); }
+void* operator new[](std::size_t size, std::nothrow_t const&) noexcept { return Allocated(size); }
+void operator delete(void* block) noexcept { Freed(block); }
+void operator delete[](void* block) noexcept { Freed(block); }
+void operator delete(void* block, std::size_t) noexcept { Freed(block); }
+void operator delete[](void* block, std::size_t) noexcept { Freed(block); }
+void operator delete(void* block, std::nothrow_t const&) noexcept { Freed(block); }
+void operator delete[](void* block, std::nothrow_t const&) noexcept { Freed(block); }
+
+long LiveAllocations() { return live; }
+
+FailingAllocation::FailingAllocation(int n)
+{
+    hasFailed = false;
+    failIn = n;
+}
+
+FailingAllocation::~FailingAllocation() { Stop(); }
+
+void FailingAllocation::Stop() { failIn = -1; }
+
+bool FailingAllocation::HasHappened() const { return hasFailed; }

@@ -1,0 +1,252 @@
+// Memory that runs out at every place where it can.
+#include "comgui/stream/STICKET_BINSTREAM.h"
+#include "comgui/ticket/SETMULTIPAR_LIST.h"
+#include "tests/stream/Allocations.h"
+#include "tests/support/StreamOracle.h"
+#include "tests/support/TemporaryFolder.h"
+#include <algorithm>
+#include <gtest/gtest.h>
+#include <new>
+
+using namespace StreamOracle;
+
+namespace
+{
+// A key too long to lie inside a string, and more bytes than are gathered before they are handed on.
+std::vector<RECORD> const Sample = {Int("System/Folders/Temporary", 1, 0),
+                                    Text("System/Folders/Text", std::string(3000, 'x')),
+                                    Text("System/Folders/Text", std::string(3000, 'y'), 0),
+                                    Bytes("Bytes", std::string(40, 'z')),
+                                    Double("Double", 0.1),
+                                    Int64("Int64", 1ll << 60),
+                                    Unsigned64("Unsigned64", 1ull << 63),
+                                    Delete("Last key of all")};
+
+// What the slot of a ticket was given.
+int tables;
+std::vector<RECORD> given;
+
+void Forget()
+{
+    tables = 0;
+    std::vector<RECORD>().swap(given);
+}
+
+STICKET_ACCESS Ticket()
+{
+    STICKET_ACCESS access = {};
+    access.SSETMULTIPAR = [](void*, SETMULTIPAR* table)
+    {
+        FailingAllocation::Stop();
+        ++tables;
+        given = RecordsOf(table);
+        return 1;
+    };
+    return access;
+}
+}  // namespace
+
+TEST(NoMemory, Counting_SeesTheLibrarysOwnAllocations)
+{
+    long const before = LiveAllocations();
+    SETMULTIPAR_LIST list(false);
+    list.SetParameter("k", 1, -1);
+    EXPECT_GT(LiveAllocations(), before);
+}
+
+TEST(NoMemory, WriteTable_LeavesOutAsItWas)
+{
+    std::string const expected = Encode(Sample).value();
+    TABLE table(Sample);
+    for (unsigned long const reserve : {0ul, 100ul, 100000ul})
+    {
+        unsigned long size = 0;
+        bool isStream = false;
+        bool isUntouched = false;
+        int const failures = FailEachAllocation(
+            [&]
+            {
+                std::string out = "before";
+                size = STICKET_BINSTREAM::Write(out, table.Records(), reserve);
+                isStream = out == expected && size == expected.size();
+                isUntouched = out == "before" && size == 6;
+            },
+            [&](bool hasHappened)
+            {
+                EXPECT_TRUE(isStream || (hasHappened && isUntouched));
+                bool isOk = true;
+                for (std::size_t i = 0; i < Sample.size(); ++i)
+                    isOk = isOk && table.Records()[i].ok;
+                EXPECT_EQ(isOk, isStream);
+            });
+        EXPECT_GT(failures, 0);
+    }
+}
+
+TEST(NoMemory, WriteSmallTable_TellsItByAnOk)
+{
+    TABLE table({Int("a", 1), Int("k", 2), Text("k", "some text of no great length")});
+    bool isEmpty = false;
+    int const failures = FailEachAllocation(
+        [&]
+        {
+            std::string out;
+            isEmpty = STICKET_BINSTREAM::Write(out, table.Records(), 0) == 0;
+        },
+        [&](bool hasHappened)
+        {
+            EXPECT_EQ(isEmpty, hasHappened);
+            EXPECT_EQ(table.Records()[2].ok, !hasHappened);
+        });
+    EXPECT_GT(failures, 0);
+}
+
+TEST(NoMemory, WriteOneByOne_FailsTheWriterForGood)
+{
+    TABLE table(Sample);
+    bool hasFailed = false;
+    bool isAnyOkBehindAFailure = false;
+    int const failures = FailEachAllocation(
+        [&]
+        {
+            STICKET_BINSTREAM::WRITE writer(0);
+            bool isOk = true;
+            isAnyOkBehindAFailure = false;
+            for (SETMULTIPAR const* record = table.Records(); record->key; ++record)
+            {
+                bool const isWritten =
+                    writer.SetParameter(record->key, record->type, record->value, record->pos);
+                isAnyOkBehindAFailure = isAnyOkBehindAFailure || (isWritten && !isOk);
+                isOk = isOk && isWritten;
+            }
+            hasFailed = writer.Failed();
+            EXPECT_EQ(isOk, !hasFailed);
+        },
+        [&](bool hasHappened)
+        {
+            EXPECT_EQ(hasFailed, hasHappened);
+            EXPECT_FALSE(isAnyOkBehindAFailure);
+        });
+    EXPECT_GT(failures, 3);
+}
+
+TEST(NoMemory, WriteFile_LeavesTheOlderFileAlone)
+{
+    TemporaryFolder const folder;
+    std::string const path = (folder.Path() / "stream").string();
+    TABLE table(Sample);
+    bool isWritten = false;
+    FailEachAllocation([&] { isWritten = STICKET_BINSTREAM::Write(path.c_str(), table.Records(), 0); },
+                       [&](bool hasHappened)
+                       {
+                           EXPECT_EQ(isWritten, !hasHappened);
+                           EXPECT_EQ(std::filesystem::exists(path), isWritten);
+                       });
+}
+
+TEST(NoMemory, ReadIntoAList_IsFalseAndKeepsWhatWasRead)
+{
+    std::string const stream = Encode(Sample).value();
+    std::vector<RECORD> const expected = ReadBack(Sample, false);
+    bool isGood = false;
+    bool isBeginning = false;
+    bool isWhole = false;
+    int const failures = FailEachAllocation(
+        [&]
+        {
+            SETMULTIPAR_LIST list(false);
+            isGood = STICKET_BINSTREAM::Read(list, stream.data(), stream.size(), false);
+            FailingAllocation::Stop();
+            std::vector<RECORD> const records = RecordsOf(list.Table(false));
+            isWhole = records == expected;
+            isBeginning = records.size() < expected.size() &&
+                          std::equal(records.begin(), records.end(), expected.begin());
+        },
+        [&](bool hasHappened)
+        {
+            EXPECT_EQ(isGood, !hasHappened);
+            EXPECT_TRUE(isGood ? isWhole : isBeginning);
+        });
+    EXPECT_GT(failures, 3);
+}
+
+TEST(NoMemory, ReadIntoATicket_IsFalseAndDoesNotTouchIt)
+{
+    std::string const stream = Encode(Sample).value();
+    std::vector<RECORD> const expected = ReadBack(Sample, true);
+    STICKET_ACCESS const ticket = Ticket();
+    bool isGood = false;
+    int const failures = FailEachAllocation(
+        [&]
+        {
+            Forget();
+            isGood = STICKET_BINSTREAM::Read(&ticket, stream.data(), stream.size(), true);
+            FailingAllocation::Stop();
+            EXPECT_EQ(tables, isGood ? 1 : 0);
+            EXPECT_TRUE(!isGood || given == expected);
+            Forget();
+        },
+        [&](bool hasHappened) { EXPECT_EQ(isGood, !hasHappened); });
+    EXPECT_GT(failures, 3);
+}
+
+TEST(NoMemory, ReadFileIntoATicket_IsTrueAndDoesNotTouchIt_ByDesign)
+{
+    TemporaryFolder const folder;
+    std::string const path = folder.Write("stream", Encode(Sample).value()).string();
+    STICKET_ACCESS const ticket = Ticket();
+    bool isGood = false;
+    int calls = 0;
+    int const failures = FailEachAllocation(
+        [&]
+        {
+            Forget();
+            isGood = STICKET_BINSTREAM::Read(&ticket, path.c_str());
+            calls = tables;
+            Forget();
+        },
+        [&](bool hasHappened)
+        {
+            EXPECT_TRUE(isGood);
+            EXPECT_EQ(calls, hasHappened ? 0 : 1);
+        });
+    EXPECT_GT(failures, 3);
+}
+
+TEST(NoMemory, AddToAList_ThrowsAndLeavesTheRecordsAsTheyWere)
+{
+    TABLE table(Sample);
+    bool hasThrown = false;
+    int const failures = FailEachAllocation(
+        [&]
+        {
+            SETMULTIPAR_LIST list(false);
+            std::size_t added = 0;
+            hasThrown = false;
+            try
+            {
+                for (; added < Sample.size(); ++added)
+                {
+                    SETMULTIPAR const& record = table.Records()[added];
+                    list.xSetParameter(record.key, record.type, record.value, record.pos);
+                    list.Table(true);
+                }
+            }
+            catch (std::bad_alloc const&)
+            {
+                hasThrown = true;
+            }
+            FailingAllocation::Stop();
+            for (std::size_t i = list.Size(); i < Sample.size(); ++i)
+            {
+                SETMULTIPAR const& record = table.Records()[i];
+                list.xSetParameter(record.key, record.type, record.value, record.pos);
+            }
+            std::vector<RECORD> sorted = Sample;
+            std::stable_sort(sorted.begin(), sorted.end(),
+                             [](RECORD const& left, RECORD const& right) { return left.key < right.key; });
+            EXPECT_TRUE(RecordsOf(list.Table(true)) == sorted);
+        },
+        [&](bool hasHappened) { EXPECT_EQ(hasThrown, hasHappened); });
+    EXPECT_GT(failures, 3);
+}
