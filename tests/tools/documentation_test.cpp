@@ -6,7 +6,6 @@
 #include "tools/ticketstream/make.h"
 #include <fstream>
 #include <gtest/gtest.h>
-#include <regex>
 #include <sstream>
 
 using namespace ticketstream;
@@ -31,26 +30,45 @@ std::string Behind(std::string const& words)
     return page.substr(from + words.size(), page.find("\n\n", from + words.size()) - from - words.size());
 }
 
-// The pairs of digits in the text, without what follows a wide gap behind them.
-std::string BytesIn(std::string const& text)
+bool IsByte(std::string const& word)
 {
-    std::regex const line("\n +([0-9A-F]{2}( +[0-9A-F]{2})*)( {4}.*)?(?=\n|$)");
+    return word.size() == 2 && word.find_first_not_of("0123456789ABCDEF") == std::string::npos;
+}
+
+// The bytes at the head of a line.
+std::string BytesIn(std::istream& line)
+{
     std::string hex;
-    for (std::sregex_iterator match(text.begin(), text.end(), line), end; match != end; ++match)
-        hex += (*match)[1];
+    for (std::string word; line >> word && IsByte(word);)
+        hex += word;
     return BytesOf(hex);
+}
+
+std::string BytesOfAllLines(std::string const& text)
+{
+    std::string bytes;
+    std::istringstream lines(text);
+    for (std::string line; std::getline(lines, line);)
+    {
+        std::istringstream words(line);
+        bytes += BytesIn(words);
+    }
+    return bytes;
 }
 }  // namespace
 
 TEST(StreamFormats, TicketByteByByte_IsTheStreamOfTheTests)
 {
-    std::string const listing = Behind("    offset  bytes                               what it says");
-    std::regex const line("\n +([0-9]+)  (([0-9A-F]{2} )+) ");
+    std::string const listing = Behind("    offset  bytes                               what it says\n");
     std::string stream;
-    for (std::sregex_iterator match(listing.begin(), listing.end(), line), end; match != end; ++match)
+    std::istringstream lines(listing);
+    for (std::string line; std::getline(lines, line);)
     {
-        EXPECT_EQ(std::stoul((*match)[1]), stream.size());
-        stream += BytesOf((*match)[2].str());
+        std::istringstream words(line);
+        std::size_t offset;
+        ASSERT_TRUE(words >> offset) << line;
+        EXPECT_EQ(offset, stream.size());
+        stream += BytesIn(words);
     }
     EXPECT_EQ(HexOf(stream), HexOf(Streams::Job()));
 }
@@ -62,7 +80,7 @@ TEST(StreamFormats, OperationThatDeletes_IsWhatTheWriterMakes)
     std::string stream;
     writer.GetAndClear(stream);
     EXPECT_EQ(stream.size(), 25u);
-    EXPECT_EQ(HexOf(BytesIn(Behind("the nine of the signature, then\n"))), HexOf(stream.substr(9)));
+    EXPECT_EQ(HexOf(BytesOfAllLines(Behind("the nine of the signature, then\n"))), HexOf(stream.substr(9)));
 }
 
 TEST(StreamFormats, TableOfKeys_IsWhatTheWriterMakes)
@@ -72,7 +90,8 @@ TEST(StreamFormats, TableOfKeys_IsWhatTheWriterMakes)
     writer.PutPartialTableOperation(3, 1, STICKET_OP_SET_PARTIAL, keys);
     std::string stream;
     writer.GetAndClear(stream);
-    EXPECT_EQ(HexOf(BytesIn(Behind("`Job/*` and `System/Name` make 35 bytes:\n"))), HexOf(stream.substr(25)));
+    EXPECT_EQ(HexOf(BytesOfAllLines(Behind("`Job/*` and `System/Name` make 35 bytes:\n"))),
+              HexOf(stream.substr(25)));
 }
 
 TEST(StreamFormats, Json_IsTakenByMakeAndPrintedAlike)

@@ -88,30 +88,28 @@ Value& ItemWalk::NewValue(PARAM_TYPE type)
     return m_record.value;
 }
 
+void ItemWalk::NewInteger(int value) { NewValue(PARAM_INT).integer = value; }
+
 void ItemWalk::TakeNumber(unsigned long size)
 {
     m_end += size;
     switch (size)
     {
     case 0:
-        NewValue(PARAM_INT).integer = 0;
-        return;
+        return NewInteger(0);
     case 1:
-        NewValue(PARAM_INT).integer = static_cast<signed char>(m_cursor.GetByte());
-        return;
+        return NewInteger(static_cast<signed char>(m_cursor.GetByte()));
     case 2:
     {
         short value;
         m_cursor.GetShort(value);
-        NewValue(PARAM_INT).integer = value;
-        return;
+        return NewInteger(value);
     }
     case 4:
     {
         int value;
         m_cursor.GetInt(value);
-        NewValue(PARAM_INT).integer = value;
-        return;
+        return NewInteger(value);
     }
     case 5:
         return m_cursor.GetFloat(NewValue(PARAM_DOUBLE).number);

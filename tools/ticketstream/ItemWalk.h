@@ -38,6 +38,7 @@ private:
     void TakeNumber64();
     void TakeBytes(PARAM_TYPE type, unsigned long size);
     Value& NewValue(PARAM_TYPE type);
+    void NewInteger(int value);
 
     std::string_view m_stream;
     unsigned long m_start;

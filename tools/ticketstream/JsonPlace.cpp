@@ -11,24 +11,24 @@ namespace
 struct MemberRule
 {
     Part owner;
-    char const* name;
     Part part;
+    char const* name;
 };
 constexpr MemberRule Rules[] = {
-    {Part::Document, "stream", Part::Scalar},
-    {Part::Document, "records", Part::Records},
-    {Part::Document, "operations", Part::Operations},
-    {Part::Operation, "ticketType", Part::Scalar},
-    {Part::Operation, "ticketId", Part::Scalar},
-    {Part::Operation, "operation", Part::Scalar},
-    {Part::Operation, "records", Part::Records},
-    {Part::Operation, "keys", Part::Keys},
-    {Part::Operation, "payload", Part::Bytes},
-    {Part::Record, "key", Part::Bytes},
-    {Part::Record, "type", Part::Scalar},
-    {Part::Record, "pos", Part::Scalar},
-    {Part::Record, "value", Part::Bytes},
-    {Part::Bytes, "hex", Part::Scalar},
+    {Part::Document, Part::Scalar, "stream"},
+    {Part::Document, Part::Records, "records"},
+    {Part::Document, Part::Operations, "operations"},
+    {Part::Operation, Part::Scalar, "ticketType"},
+    {Part::Operation, Part::Scalar, "ticketId"},
+    {Part::Operation, Part::Scalar, "operation"},
+    {Part::Operation, Part::Records, "records"},
+    {Part::Operation, Part::Keys, "keys"},
+    {Part::Operation, Part::Bytes, "payload"},
+    {Part::Record, Part::Bytes, "key"},
+    {Part::Record, Part::Scalar, "type"},
+    {Part::Record, Part::Scalar, "pos"},
+    {Part::Record, Part::Bytes, "value"},
+    {Part::Bytes, Part::Scalar, "hex"},
 };
 
 MemberRule const* RuleOf(Part owner, std::string const& name)

@@ -258,6 +258,7 @@ private:
                 throw WrongJson(place, "a key ends at its zero byte in such a table");
         }
         std::vector<char const*> table;
+        table.reserve(keys.size() + 1);
         for (std::string const& key : keys)
             table.push_back(key.c_str());
         table.push_back(nullptr);
