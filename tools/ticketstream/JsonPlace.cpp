@@ -3,6 +3,7 @@
 #include "tools/ticketstream/Trouble.h"
 #include "tools/ticketstream/text.h"
 #include <algorithm>
+#include <string_view>
 
 namespace ticketstream
 {
@@ -31,7 +32,7 @@ constexpr MemberRule Rules[] = {
     {Part::Bytes, Part::Scalar, "hex"},
 };
 
-MemberRule const* RuleOf(Part owner, std::string const& name)
+MemberRule const* RuleOf(Part owner, std::string_view name)
 {
     auto const* const found =
         std::find_if(std::begin(Rules), std::end(Rules),
@@ -55,15 +56,6 @@ char const* Needed(Part part)
     if (IsList(part))
         return "a list is needed here";
     return part == Part::Scalar ? "a number or a text is needed here" : "an object is needed here";
-}
-
-// As JSON pointers have it.
-std::string Escaped(std::string const& member)
-{
-    std::string text;
-    for (char const c : member)
-        text += c == '~' ? "~0" : c == '/' ? "~1" : std::string(1, c);
-    return text;
 }
 }  // namespace
 
@@ -90,7 +82,7 @@ void JsonPlace::Begin(bool isArray)
     Part const part = Expected();
     if (part == Part::Scalar || IsList(part) != isArray)
         throw WrongJson(Text(), Needed(part));
-    m_levels.push_back({part, isArray, 0, {}, {}});
+    m_levels.push_back({part, isArray});
 }
 
 Part JsonPlace::End()
@@ -116,12 +108,15 @@ void JsonPlace::Scalar()
 void JsonPlace::Member(std::string const& name)
 {
     Level& level = m_levels.back();
-    if (RuleOf(level.part, name) == nullptr)
+    MemberRule const* const rule = RuleOf(level.part, name);
+    level.member = nullptr;  // an unknown one is a matter of the object
+    if (rule == nullptr)
         throw WrongJson(Text(), "unknown member " + Shown(name, 40) + "; known are " + MembersOf(level.part));
-    level.member = name;
-    if (std::find(level.members.begin(), level.members.end(), name) != level.members.end())
+    level.member = rule->name;
+    unsigned int const bit = 1u << (rule - Rules);
+    if ((level.given & bit) != 0)
         throw WrongJson(Text(), "given twice");
-    level.members.push_back(name);
+    level.given |= bit;
 }
 
 std::string JsonPlace::Text() const
@@ -130,8 +125,8 @@ std::string JsonPlace::Text() const
     for (Level const& level : m_levels)
         if (level.isArray)
             text += '/' + std::to_string(level.index);
-        else if (!level.member.empty())
-            text += '/' + Escaped(level.member);
+        else if (level.member != nullptr)
+            text += std::string("/") + level.member;
     return text;
 }
 }  // namespace ticketstream

@@ -41,8 +41,8 @@ private:
         Part part;
         bool isArray;
         unsigned long index = 0;
-        std::string member;
-        std::vector<std::string> members;  // so far
+        char const* member = nullptr;
+        unsigned int given = 0;  // a bit for each member so far
     };
 
     Part Expected() const;

@@ -21,14 +21,14 @@ using nlohmann::json;
 class Members
 {
 public:
-    Members(json const& object, std::string place) : m_object(object), m_place(std::move(place)) {}
+    Members(json const& object, JsonPlace const& place) : m_object(object), m_place(place) {}
 
     bool Has(char const* name) const { return m_object.contains(name); }
 
     json const& Get(char const* name) const
     {
         if (!Has(name))
-            throw WrongJson(m_place, "\"" + std::string(name) + "\" is missing");
+            throw WrongJson(m_place.Text(), "\"" + std::string(name) + "\" is missing");
         return m_object[name];
     }
 
@@ -65,18 +65,26 @@ public:
         return value.is_string() ? value.get<std::string>() : Bytes(name);
     }
 
-    std::string Bytes(char const* name) const { return BytesOf(Get(name), Place(name)); }
-
-    static std::string BytesOf(json const& value, std::string const& place)
+    std::string Bytes(char const* name) const
     {
-        bool const isObject = value.is_object() && value.contains("hex") && value["hex"].is_string();
-        auto bytes = isObject ? BytesOfHex(value["hex"].get_ref<std::string const&>()) : std::nullopt;
+        auto bytes = BytesOf(Get(name));
         if (!bytes)
-            throw WrongJson(place, "bytes are told as {\"hex\": \"00ff\"}, two digits a byte");
+            RefuseBytes(Place(name));
         return *std::move(bytes);
     }
 
-    std::string Place(char const* name) const { return m_place + '/' + name; }
+    static std::optional<std::string> BytesOf(json const& value)
+    {
+        bool const isObject = value.is_object() && value.contains("hex") && value["hex"].is_string();
+        return isObject ? BytesOfHex(value["hex"].get_ref<std::string const&>()) : std::nullopt;
+    }
+
+    [[noreturn]] static void RefuseBytes(std::string const& place)
+    {
+        throw WrongJson(place, "bytes are told as {\"hex\": \"00ff\"}, two digits a byte");
+    }
+
+    std::string Place(char const* name) const { return m_place.Text() + '/' + name; }
 
     [[noreturn]] void Refuse(char const* name, std::string const& wanted) const
     {
@@ -90,7 +98,7 @@ private:
     }
 
     json const& m_object;
-    std::string m_place;
+    JsonPlace const& m_place;
 };
 
 double DoubleOf(Members const& members)
@@ -168,7 +176,7 @@ public:
         {
             json const document = json::parse(text, [this](int, json::parse_event_t event, json& parsed)
                                               { return Take(event, parsed); });
-            return Finished(Members(document, ""));
+            return Finished(Members(document, m_place));
         }
         catch (json::exception const& e)
         {
@@ -204,9 +212,9 @@ private:
     bool Ended(Part part, json const& parsed)
     {
         if (part == Part::Record)
-            Add(Members(parsed, m_place.Text()));
+            Add(Members(parsed, m_place));
         if (part == Part::Operation)
-            AddOperation(Members(parsed, m_place.Text()));
+            AddOperation(Members(parsed, m_place));
         return part != Part::Record && part != Part::Operation;
     }
 
@@ -253,7 +261,10 @@ private:
         for (json const& key : members.Get("keys"))
         {
             std::string const place = members.Place("keys") + '/' + std::to_string(keys.size());
-            keys.push_back(key.is_string() ? key.get<std::string>() : Members::BytesOf(key, place));
+            auto text = key.is_string() ? key.get<std::string>() : Members::BytesOf(key);
+            if (!text)
+                Members::RefuseBytes(place);
+            keys.push_back(*std::move(text));
             if (keys.back().find('\0') != std::string::npos)
                 throw WrongJson(place, "a key ends at its zero byte in such a table");
         }
