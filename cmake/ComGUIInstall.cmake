@@ -35,6 +35,12 @@ install(TARGETS comgui_module LIBRARY DESTINATION ${COMGUI_BUNDLE_DIR}/Contents/
 install(DIRECTORY ${PROJECT_BINARY_DIR}/lib/ComGUI.Bundle/ DESTINATION ${COMGUI_BUNDLE_DIR}
     PATTERN Contents/${comgui_system} EXCLUDE)
 
+if(COMGUI_TOOLS)
+    file(RELATIVE_PATH comgui_libraries ${CMAKE_INSTALL_FULL_BINDIR} ${CMAKE_INSTALL_FULL_LIBDIR})
+    set_target_properties(ticketstream PROPERTIES INSTALL_RPATH ${comgui_beside}/${comgui_libraries})
+    install(TARGETS ticketstream RUNTIME DESTINATION ${CMAKE_INSTALL_BINDIR})
+endif()
+
 # What a consumer's wxWidgets and standard library must have in common with those of this build.
 function(comgui_describe_build)
     set(CMAKE_REQUIRED_LIBRARIES comgui_wxwidgets)
