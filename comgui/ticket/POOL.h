@@ -44,8 +44,8 @@ private:
     std::size_t m_left = 0;  // bytes of it
     std::size_t m_nextSize = FirstSize;
 
-    static constexpr std::size_t FirstSize = 512;
-    static constexpr std::size_t LargestSize = 32ul * 1024 * 1024;
+    static constexpr std::size_t FirstSize = 1024;
+    static constexpr std::size_t LargestSize = 16ul * 1024 * 1024;
 };
 
 // Lets a standard container take its nodes from a pool, which must outlive it.
