@@ -581,6 +581,18 @@ TEST(RefusedRecord, LeavesNoTrace)
     }
 }
 
+TEST(RefusedRecord, NullInAVector_LeavesNoTrace)
+{
+    TABLE table({Int("k", 1, 0), Int("k", 2, 1), Int("k", 3, 1)});
+    table.Records()[1].value = nullptr;
+    table.Records()[1].key = table.Records()[2].key = table.Records()[0].key;
+    std::string out;
+    STICKET_BINSTREAM::Write(out, table.Records(), 0);
+    EXPECT_EQ(HexOf(out), std::string(Signature) + " 01 6B A2 41 01 41 03");
+    EXPECT_FALSE(table.Records()[1].ok);
+    EXPECT_TRUE(table.Records()[2].ok);
+}
+
 TEST(RefusedRecord, Alone_GivesNoSignatureEither)
 {
     RECORD pointer = Int("k", 0);
@@ -717,7 +729,8 @@ TEST(Strsame, EveryPlaceOfTheFirstDifference_IsFound)
 
 TEST(IncPos, GoesOnFromZeroAndStaysBelow)
 {
-    int const positions[][2] = {{-2, -2}, {-1, -1}, {0, 1}, {1, 2}, {134217725, 134217726}};
+    int const positions[][2] = {{-2, -2},          {-1, -1}, {0, 1}, {1, 2}, {134217725, 134217726},
+                                {INT_MAX, INT_MIN}};
     for (auto const& [before, after] : positions)
     {
         int pos = before;

@@ -54,6 +54,21 @@ TEST(NoMemory, Counting_SeesTheLibrarysOwnAllocations)
     EXPECT_GT(LiveAllocations(), before);
 }
 
+TEST(ClearedList, GivesItsMemoryBack)
+{
+    SETMULTIPAR_LIST list(false);
+    long const before = LiveAllocations();
+    for (int round = 0; round < 3; ++round)
+    {
+        for (int i = 0; i < 1000; ++i)
+            list.SetParameter(std::to_string(i).c_str(), std::to_string(-i), i);
+        list.Table(true);
+        EXPECT_GT(LiveAllocations(), before);
+        list.Clear();
+        EXPECT_EQ(LiveAllocations(), before);
+    }
+}
+
 TEST(NoMemory, WriteTable_LeavesOutAsItWas)
 {
     std::string const expected = Encode(Sample).value();
@@ -85,7 +100,9 @@ TEST(NoMemory, WriteTable_LeavesOutAsItWas)
 
 TEST(NoMemory, WriteSmallTable_TellsItByAnOk)
 {
-    TABLE table({Int("a", 1), Int("k", 2), Text("k", "some text of no great length")});
+    RECORD refused = Int("k", 3);
+    refused.type = PARAM_POINTER;
+    TABLE table({Int("a", 1), Int("k", 2), Text("k", "some text of no great length"), refused});
     bool isEmpty = false;
     int const failures = FailEachAllocation(
         [&]
@@ -97,6 +114,7 @@ TEST(NoMemory, WriteSmallTable_TellsItByAnOk)
         {
             EXPECT_EQ(isEmpty, hasHappened);
             EXPECT_EQ(table.Records()[2].ok, !hasHappened);
+            EXPECT_FALSE(table.Records()[3].ok);
         });
     EXPECT_GT(failures, 0);
 }
@@ -249,4 +267,30 @@ TEST(NoMemory, AddToAList_ThrowsAndLeavesTheRecordsAsTheyWere)
         },
         [&](bool hasHappened) { EXPECT_EQ(hasThrown, hasHappened); });
     EXPECT_GT(failures, 3);
+}
+
+TEST(NoMemory, SortedTable_ThatWasNotMade_DoesNotCountAsSorted)
+{
+    bool hasThrown = false;
+    int const failures = FailEachAllocation(
+        [&]
+        {
+            SETMULTIPAR_LIST list(false);
+            hasThrown = false;
+            try
+            {
+                list.SetParameter("b", 1, -1);
+                list.Table(true);
+            }
+            catch (std::bad_alloc const&)
+            {
+                hasThrown = true;
+            }
+            FailingAllocation::Stop();
+            list.SetParameter("a", 1, -1);
+            list.Table(false);
+            EXPECT_STREQ(list.Table(true)->key, "a");
+        },
+        [&](bool hasHappened) { EXPECT_EQ(hasThrown, hasHappened); });
+    EXPECT_GT(failures, 1);
 }
