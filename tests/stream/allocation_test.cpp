@@ -1,4 +1,5 @@
 // Memory that runs out at every place where it can.
+#include "comgui/stream/MTICKET_BINSTREAM.h"
 #include "comgui/stream/STICKET_BINSTREAM.h"
 #include "comgui/ticket/SETMULTIPAR_LIST.h"
 #include "tests/stream/Allocations.h"
@@ -290,6 +291,88 @@ TEST(NoMemory, SortedTable_ThatWasNotMade_DoesNotCountAsSorted)
             list.SetParameter("a", 1, -1);
             list.Table(false);
             EXPECT_STREQ(list.Table(true)->key, "a");
+        },
+        [&](bool hasHappened) { EXPECT_EQ(hasThrown, hasHappened); });
+    EXPECT_GT(failures, 1);
+}
+
+TEST(NoMemory, WriteIntoAContainerStream_LeavesTheOperationOut)
+{
+    char const* const keys[] = {"System/Folders/*", "Job/Copies", nullptr};
+    std::string const payload(100, 'x');
+    TABLE table(Sample);
+    bool isEveryOperationThere = false;
+    int const failures = FailEachAllocation(
+        [&]
+        {
+            MTICKET_BINSTREAM::Write writer(0);
+            int expected = 0;
+            auto const put = [&](auto operation)
+            {
+                try
+                {
+                    operation();
+                    ++expected;
+                }
+                catch (std::bad_alloc const&)
+                {
+                }
+            };
+            put([&] { writer.PutOperation(5, 1, MTICKET_OP_DELETE, payload); });
+            put([&] { writer.PutVoidOperation(5, 1, MTICKET_OP_DELETE); });
+            put([&] { writer.PutPartialTableOperation(5, 1, STICKET_OP_SET_PARTIAL, keys); });
+            put([&] { writer.PutSetMultipar(5, 1, table.Records(), 0); });
+            FailingAllocation::Stop();
+            std::string stream;
+            writer.GetAndClear(stream);
+            EXPECT_TRUE(MTICKET_BINSTREAM::Check(stream.data(), stream.size()));
+            MTICKET_BINSTREAM::Read reader(stream.data(), stream.size(), false);
+            int type;
+            int id;
+            TICKET_OP op = STICKET_OP_INVALID;
+            int operations = 0;
+            while (reader.ParseOperation(type, id, op) == MTICKET_BINSTREAM::GET_TICKET_OK)
+                ++operations;
+            int const unwritten = table.Records()[Sample.size() - 1].ok ? 0 : 1;  // left out without a word
+            EXPECT_EQ(operations, expected - unwritten);
+            isEveryOperationThere = operations == 4;
+        },
+        [&](bool hasHappened) { EXPECT_EQ(isEveryOperationThere, !hasHappened); });
+    EXPECT_GT(failures, 3);
+}
+
+TEST(NoMemory, ReadKeysOfAContainerStream_ThrowsAndCanBeAskedForAgain)
+{
+    char const* const keys[] = {"a", "b", "c", "d", "e", nullptr};
+    MTICKET_BINSTREAM::Write writer(0);
+    writer.PutPartialTableOperation(5, 1, STICKET_OP_SET_PARTIAL, keys);
+    std::string stream;
+    writer.GetAndClear(stream);
+    bool hasThrown = false;
+    int const failures = FailEachAllocation(
+        [&]
+        {
+            MTICKET_BINSTREAM::Read reader(stream.data(), stream.size(), false);
+            int type;
+            int id;
+            TICKET_OP op = STICKET_OP_INVALID;
+            reader.ParseOperation(type, id, op);
+            char const* const* table = keys;
+            hasThrown = false;
+            try
+            {
+                reader.GetPartialTable(table);
+            }
+            catch (std::bad_alloc const&)
+            {
+                hasThrown = true;
+            }
+            FailingAllocation::Stop();
+            EXPECT_EQ(table == nullptr, hasThrown);
+            EXPECT_EQ(reader.GetPartialTable(table), MTICKET_BINSTREAM::GET_TICKET_OK);
+            for (int i = 0; i < 5; ++i)
+                EXPECT_STREQ(table[i], keys[i]);
+            EXPECT_EQ(table[5], nullptr);
         },
         [&](bool hasHappened) { EXPECT_EQ(hasThrown, hasHappened); });
     EXPECT_GT(failures, 1);
