@@ -19,7 +19,7 @@ std::vector<RECORD> const Sample = {Int("System/Folders/Temporary", 1, 0),
                                     Text("System/Folders/Text", std::string(3000, 'y'), 0),
                                     Bytes("Bytes", std::string(40, 'z')),
                                     Double("Double", 0.1),
-                                    Int64("Int64", 1ll << 60),
+                                    Int64("Int64", 1LL << 60),
                                     Unsigned64("Unsigned64", 1ull << 63),
                                     Delete("Last key of all")};
 
