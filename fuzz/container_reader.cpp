@@ -58,7 +58,7 @@ std::optional<std::vector<OPERATION>> Operations(std::string_view bytes)
     return operations;
 }
 
-// The texts behind the first; bytes behind the last zero byte count for nothing.
+// The texts behind the first; what no zero byte ends is none.
 std::vector<std::string> Keys(std::string const& payload)
 {
     std::vector<std::string> texts;

@@ -1,7 +1,6 @@
-// Numbers as the whole system understands them: what counts as no number, conversions from double that stop
-// at the limits of the target, rounding half away from zero, comparisons with a tolerance, and what of a
-// 64-bit integer survives in a double. Pure functions, safe from any thread; no tolerance is built in. Every
-// comparison with a NaN is false.
+// Numbers as the whole system understands them: which ones are missing, how a double becomes an integer and
+// where that stops, how it is rounded and how near counts as equal, and which 64-bit integers a double can
+// hold. Pure functions, safe from any thread; no tolerance is built in. Every comparison with a NaN is false.
 #pragma once
 
 #include "comgui/foundation/export.h"
@@ -52,7 +51,7 @@ COMGUI_EXPORT long long RoundToI64(double v);
 COMGUI_EXPORT unsigned long long RoundToU64(double v);
 
 // v rounded to a multiple of granularity (100: to hundreds), or to a granularity-th part (10: to tenths).
-// With a granularity below 1 v comes back as it is.
+// v itself if granularity is below 1.
 COMGUI_EXPORT double RoundToBigGranularity(double v, int granularity);
 COMGUI_EXPORT double RoundToSmallGranularity(double v, int granularity);
 
@@ -90,7 +89,7 @@ COMGUI_EXPORT bool FitsIntoDouble(unsigned long long v);
 // Whether v is below 2^63.
 COMGUI_EXPORT bool FitsIntoLongLong(unsigned long long v);
 
-// The resolution nearest to the wanted one that divides base into a whole number of steps, both in the same
-// unit. No number if resolution is above base, or either is not above 0.
+// What an encoder of that base can do that comes nearest to resolution: base over a whole number of steps,
+// both in the same unit. NOT_A_DOUBLE_NUMBER if resolution is above base, or either is not above 0.
 COMGUI_EXPORT double ResolutionToEncoderGranularity(double resolution, double base);
 }  // namespace MathLib

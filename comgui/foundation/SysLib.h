@@ -1,5 +1,5 @@
-// What touches the operating system directly: a mutex that its holder may enter again, with its scoped lock,
-// the listing of a folder, and a rename.
+// What touches the operating system directly: a mutex that its holder may enter again, the lock that holds it
+// for a scope, what is in a folder, and how a file gets another name.
 #pragma once
 
 #include "comgui/foundation/export.h"
@@ -65,9 +65,9 @@ private:
 };
 static_assert(sizeof(MUTEX_LOCK) == sizeof(void*));
 
-// Replaces names by the bare names of the folder's entries that end with suffix, byte for byte, in the order
-// of the system. With an empty suffix nothing is left out, not even "." and "..". A folder that cannot be
-// opened leaves the list empty.
+// Replaces names by the bare names of the folder's entries that end with suffix, byte for byte, unsorted.
+// With an empty suffix nothing is left out, not even "." and "..". A folder that cannot be opened leaves the
+// list empty.
 COMGUI_EXPORT void GetAllFilenames(std::list<std::string>& names, std::string const& folder,
                                    std::string const& suffix);
 

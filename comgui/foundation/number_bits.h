@@ -45,7 +45,7 @@ constexpr double U64ToDouble(unsigned long long v)
     constexpr unsigned long long limit = ~TopBit - half;
     unsigned long long mantissa = v & ~TopBit;
     if (mantissa > limit)
-        mantissa = limit;  // keeps the carry out of the exponent
+        mantissa = limit;  // or the sum would spill into the exponent
     return std::bit_cast<double>(0x43E0000000000000 | ((mantissa + half) >> 11));
 }
 }  // namespace comgui::detail

@@ -33,9 +33,9 @@ public:
     static bool Write(char const* filename, SETMULTIPAR* table, unsigned long reserve);
     static bool Write(char const* filename, STICKET_ACCESS const* ticket, unsigned long reserve);
 
-    // Adds the stream's records to the list; true if the whole stream was read. What was read before an error
-    // stays in the list. No bytes are a good stream. fixPositions: the first value behind each key is given
-    // at -1 if it stands at 0, which is how a table for a write begins a vector.
+    // Adds what the stream holds to the list. False at the first error, with what came before it in the list.
+    // No bytes are a good stream. fixPositions: the first value behind each key is given at -1 if it stands
+    // at 0 or -2, which is how a table for a write begins a vector.
     static bool Read(SETMULTIPAR_LIST& list, void const* data, unsigned long size, bool fixPositions);
 
     // Whether Read would read the whole stream. Takes memory for no more than a key.
@@ -56,7 +56,7 @@ public:
     // counts as the empty text, and PARAM_NONE, where it must be.
     static bool Valid(PARAM_TYPE type, void const* value);
 
-    // Number of equal bytes at the start of both texts.
+    // How many bytes both texts begin with alike.
     static unsigned long strsame(char const* previous, char const* key);
 
     // On to the position of the next value: one more, but a negative position stays.

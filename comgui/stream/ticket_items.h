@@ -157,7 +157,7 @@ inline char* PutDouble(char* to, double value)
     return PutBytes(PutNumberTag(to, NUMBER_DOUBLE), std::bit_cast<std::uint64_t>(value));
 }
 
-// The smallest form that gives back exactly the same number. -0.0 becomes the integer 0, and an infinity NaN.
+// The shortest form from which the number can be had back. -0.0 becomes the integer 0, and an infinity NaN.
 inline char* PutOptimizedDouble(char* to, double value)
 {
     if (IsNotANumber(value))

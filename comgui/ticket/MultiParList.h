@@ -1,5 +1,5 @@
-// A SETMULTIPAR_LIST for callers that hold it as an opaque handle, such as those that find functions by name.
-// A null list is put up with everywhere. Nothing is thrown but std::bad_alloc.
+// A SETMULTIPAR_LIST by plain functions, for callers that do not know the class: those that find them by
+// name. A null list is put up with everywhere. Nothing is thrown but std::bad_alloc.
 #pragma once
 
 #include "comgui/foundation/export.h"

@@ -62,8 +62,8 @@ public:
     void set(char const* const* keys);
     void clear();
 
-    // Adds or erases one pattern. No pattern is added by the empty text, and every key by "*". A prefix that
-    // is erased takes with it the shorter one that covers it.
+    // Adds or erases one pattern. The empty text adds none, and "*" adds the one that selects every key. What
+    // goes when a prefix is erased is the one that covers it, however much shorter that is.
     void insert(std::string key);
     void erase(std::string key);
 

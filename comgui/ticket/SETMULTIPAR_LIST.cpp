@@ -94,11 +94,9 @@ SETMULTIPAR* SETMULTIPAR_LIST::Table(bool sort)
     if (m_table == nullptr && !m_records.empty())
     {
         if (sort)
-        {
             m_records.sort();
-            m_isSorted = true;
-        }
         m_table = new SETMULTIPAR[m_records.size() + 1];
+        m_isSorted = sort;  // of the table that is there now: if memory ran out above, none was built
         *std::copy(m_records.begin(), m_records.end(), m_table) = SETMULTIPAR{};
     }
     return m_table;

@@ -1,8 +1,7 @@
-// The owning builder of a SETMULTIPAR table. A table's records hold bare pointers; the list owns what they
-// point at. Records are added in any order, and Table() lays them out as one array that ends at a record
-// with a null key, ready for SSETMULTIPAR, MSETMULTIPAR or a stream. Equal keys and equal values are stored
-// once, and their addresses stay valid until Clear() or the list's end. Running out of memory throws
-// std::bad_alloc; there are no other errors. One thread at a time.
+// Builds a SETMULTIPAR table and owns what its records point at. Records are added in any order, and Table()
+// lays them out as the one array that SSETMULTIPAR, MSETMULTIPAR and the streams take. Equal keys and equal
+// values are stored once, and their addresses stay valid until Clear() or the list's end. Running out of
+// memory throws std::bad_alloc; there are no other errors. One thread at a time.
 #pragma once
 
 #include "comgui/foundation/export.h"

@@ -2,7 +2,6 @@
 #pragma once
 
 #include <string>
-#include <vector>
 
 using namespace std::string_literals;
 
@@ -28,19 +27,3 @@ inline std::string Operation(int code, std::string const& payload = "")
 {
     return Operation(code, payload, static_cast<int>(payload.size()));
 }
-
-// A block of exactly its size on the heap: a sanitizer sees one byte too far.
-class Block
-{
-public:
-    explicit Block(std::string const& bytes) : m_bytes(bytes.begin(), bytes.end())
-    {
-        m_bytes.shrink_to_fit();
-    }
-
-    char const* data() const { return m_bytes.data(); }
-    unsigned long size() const { return m_bytes.size(); }
-
-private:
-    std::vector<char> m_bytes;
-};

@@ -3,6 +3,7 @@
 #include "comgui/stream/STICKET_BINSTREAM.h"
 #include "comgui/ticket/SETMULTIPAR_LIST.h"
 #include "tests/stream/ContainerBytes.h"
+#include "tests/support/HexText.h"
 #include <gtest/gtest.h>
 #include <set>
 #include <sys/resource.h>
@@ -15,16 +16,16 @@ std::string const GoodTable = PartialHeader + "Job/*\0"s;
 
 bool Checked(std::string const& bytes)
 {
-    Block const block(bytes);
-    return MTICKET_BINSTREAM::Check(block.data(), block.size());
+    ExactBytes const block(bytes);
+    return MTICKET_BINSTREAM::Check(block.Data(), block.Size());
 }
 
 // Walks to the end as a client would, reading every payload in either way. Whether all that had to be good
 // was; a sanitizer sees whatever lies outside of the block.
 bool WalksToTheEnd(std::string const& bytes)
 {
-    Block const block(bytes);
-    MTICKET_BINSTREAM::Read reader(block.data(), block.size(), true);
+    ExactBytes const block(bytes);
+    MTICKET_BINSTREAM::Read reader(block.Data(), block.Size(), true);
     SETMULTIPAR_LIST list(false);
     for (;;)
     {
@@ -163,10 +164,10 @@ TEST(TicketCheck, Answer_IsThatOfRead)
     ASSERT_TRUE(STICKET_BINSTREAM::Check(nullptr, 0));
     auto const isSame = [](std::string const& bytes)
     {
-        Block const block(bytes);
+        ExactBytes const block(bytes);
         SETMULTIPAR_LIST list(false);
-        return STICKET_BINSTREAM::Check(block.data(), block.size()) ==
-               STICKET_BINSTREAM::Read(list, block.data(), block.size(), false);
+        return STICKET_BINSTREAM::Check(block.Data(), block.Size()) ==
+               STICKET_BINSTREAM::Read(list, block.Data(), block.Size(), false);
     };
     for (unsigned long size = 0; size <= good.size(); ++size)
         EXPECT_TRUE(isSame(good.substr(0, size))) << size;

@@ -3,8 +3,10 @@
 #include "comgui/stream/STICKET_BINSTREAM.h"
 #include "comgui/ticket/SETMULTIPAR_LIST.h"
 #include "tests/stream/ContainerBytes.h"
+#include "tests/support/HexText.h"
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
+#include <vector>
 
 using testing::ElementsAre;
 using testing::IsEmpty;
@@ -17,8 +19,8 @@ constexpr auto ERROR = MTICKET_BINSTREAM::GET_TICKET_ERROR;
 
 int Detected(std::string const& bytes)
 {
-    Block const block(bytes);
-    return MTICKET_BINSTREAM::Detect(block.data(), block.size());
+    ExactBytes const block(bytes);
+    return MTICKET_BINSTREAM::Detect(block.Data(), block.Size());
 }
 
 std::string Taken(MTICKET_BINSTREAM::Write& writer)
@@ -53,7 +55,7 @@ class Walk
 {
 public:
     explicit Walk(std::string const& bytes, bool fixPositions = false)
-        : m_block(bytes), reader(m_block.data(), m_block.size(), fixPositions)
+        : m_block(bytes), reader(m_block.Data(), m_block.Size(), fixPositions)
     {
     }
 
@@ -71,7 +73,7 @@ public:
     }
 
 private:
-    Block m_block;
+    ExactBytes m_block;
 
 public:
     MTICKET_BINSTREAM::Read reader;

@@ -43,11 +43,16 @@ std::string HexOfDouble(double value)
     return HexBy([=](WRITE& writer) { writer.PutOptimizedTDouble(value); });
 }
 
+// The same bytes wherever the keys stand.
 std::string HexOfTable(std::vector<RECORD> const& records)
 {
-    TABLE table(records);
+    TABLE apart(records);
     std::string bytes;
-    STICKET_BINSTREAM::Write(bytes, table.Records(), 0);
+    STICKET_BINSTREAM::Write(bytes, apart.Records(), 0);
+    TABLE shared(records, KEYS::SHARED);
+    std::string same;
+    STICKET_BINSTREAM::Write(same, shared.Records(), 0);
+    EXPECT_EQ(HexOf(same), HexOf(bytes));
     return HexOf(bytes);
 }
 
@@ -534,6 +539,41 @@ TEST(Position, RefusedRecordDoesNotMoveIt)
     EXPECT_EQ(HexBehindSignature({Int("k", 0, 0), refused, Int("k", 0, 1)}), "01 6B A2 40 40");
 }
 
+// Vectors.
+
+TEST(Vector, OfOneType_IsNumbersAlone)
+{
+    EXPECT_EQ(HexBehindSignature({Unsigned("k", 1, 0), Unsigned("k", 2, 1), Unsigned("k", 3, 2)}),
+              "01 6B A2 41 01 41 02 41 03");
+    EXPECT_EQ(HexBehindSignature({Double("k", 0.5, 0), Double("k", 2, 1)}),
+              "01 6B A2 45 69 3F 00 00 00 41 02");
+}
+
+TEST(Vector, OfManyTypes_HasEachValueInItsOwnForm)
+{
+    EXPECT_EQ(HexBehindSignature({Int("k", 1, 0), Double("k", 1.5, 1), Int64("k", 1, 2), Unsigned("k", 1, 3),
+                                  Unsigned64("k", 1ull << 63, 4), Text("k", "A4", 5), Int("k", 2, 6)}),
+              "01 6B A2 41 01 45 69 3F C0 00 00 41 01 41 01 49 75 80 00 00 00 00 00 00 00 62 41 34 41 02");
+}
+
+TEST(Vector, Gap_IsToldByAPosition)
+{
+    EXPECT_EQ(HexBehindSignature({Int("k", 1, 0), Int("k", 2, 1), Int("k", 3, 3), Int("k", 4, -1)}),
+              "01 6B A2 41 01 41 02 A5 41 03 A1 41 04");
+}
+
+TEST(Vector, LongerThanABuffer_IsWrittenWhole)
+{
+    std::vector<RECORD> records;
+    std::string expected = "01 6B A2";
+    for (int i = 0; i < 5000; ++i)
+    {
+        records.push_back(Int("k", 128, i));
+        expected += " 42 00 80";
+    }
+    EXPECT_EQ(HexBehindSignature(records), expected);
+}
+
 // What a stream can hold.
 
 TEST(Valid, Table)
@@ -579,6 +619,17 @@ TEST(RefusedRecord, LeavesNoTrace)
         writer.Swap(bytes);
         EXPECT_EQ(HexOf(bytes), std::string(Signature) + " 01 6B 40") << type;
     }
+}
+
+TEST(RefusedRecord, NullInAVector_LeavesNoTrace)
+{
+    TABLE table({Int("k", 1, 0), Int("k", 2, 1), Int("k", 3, 1)}, KEYS::SHARED);
+    table.Records()[1].value = nullptr;
+    std::string out;
+    STICKET_BINSTREAM::Write(out, table.Records(), 0);
+    EXPECT_EQ(HexOf(out), std::string(Signature) + " 01 6B A2 41 01 41 03");
+    EXPECT_FALSE(table.Records()[1].ok);
+    EXPECT_TRUE(table.Records()[2].ok);
 }
 
 TEST(RefusedRecord, Alone_GivesNoSignatureEither)
@@ -717,7 +768,8 @@ TEST(Strsame, EveryPlaceOfTheFirstDifference_IsFound)
 
 TEST(IncPos, GoesOnFromZeroAndStaysBelow)
 {
-    int const positions[][2] = {{-2, -2}, {-1, -1}, {0, 1}, {1, 2}, {134217725, 134217726}};
+    int const positions[][2] = {{-2, -2},          {-1, -1}, {0, 1}, {1, 2}, {134217725, 134217726},
+                                {INT_MAX, INT_MIN}};
     for (auto const& [before, after] : positions)
     {
         int pos = before;

@@ -1,4 +1,5 @@
 // Memory that runs out at every place where it can.
+#include "comgui/stream/MTICKET_BINSTREAM.h"
 #include "comgui/stream/STICKET_BINSTREAM.h"
 #include "comgui/ticket/SETMULTIPAR_LIST.h"
 #include "tests/stream/Allocations.h"
@@ -18,7 +19,7 @@ std::vector<RECORD> const Sample = {Int("System/Folders/Temporary", 1, 0),
                                     Text("System/Folders/Text", std::string(3000, 'y'), 0),
                                     Bytes("Bytes", std::string(40, 'z')),
                                     Double("Double", 0.1),
-                                    Int64("Int64", 1ll << 60),
+                                    Int64("Int64", 1LL << 60),
                                     Unsigned64("Unsigned64", 1ull << 63),
                                     Delete("Last key of all")};
 
@@ -54,6 +55,21 @@ TEST(NoMemory, Counting_SeesTheLibrarysOwnAllocations)
     EXPECT_GT(LiveAllocations(), before);
 }
 
+TEST(ClearedList, GivesItsMemoryBack)
+{
+    SETMULTIPAR_LIST list(false);
+    long const before = LiveAllocations();
+    for (int round = 0; round < 3; ++round)
+    {
+        for (int i = 0; i < 1000; ++i)
+            list.SetParameter(std::to_string(i).c_str(), std::to_string(-i), i);
+        list.Table(true);
+        EXPECT_GT(LiveAllocations(), before);
+        list.Clear();
+        EXPECT_EQ(LiveAllocations(), before);
+    }
+}
+
 TEST(NoMemory, WriteTable_LeavesOutAsItWas)
 {
     std::string const expected = Encode(Sample).value();
@@ -85,7 +101,9 @@ TEST(NoMemory, WriteTable_LeavesOutAsItWas)
 
 TEST(NoMemory, WriteSmallTable_TellsItByAnOk)
 {
-    TABLE table({Int("a", 1), Int("k", 2), Text("k", "some text of no great length")});
+    RECORD refused = Int("k", 3);
+    refused.type = PARAM_POINTER;
+    TABLE table({Int("a", 1), Int("k", 2), Text("k", "some text of no great length"), refused});
     bool isEmpty = false;
     int const failures = FailEachAllocation(
         [&]
@@ -97,6 +115,7 @@ TEST(NoMemory, WriteSmallTable_TellsItByAnOk)
         {
             EXPECT_EQ(isEmpty, hasHappened);
             EXPECT_EQ(table.Records()[2].ok, !hasHappened);
+            EXPECT_FALSE(table.Records()[3].ok);
         });
     EXPECT_GT(failures, 0);
 }
@@ -249,4 +268,112 @@ TEST(NoMemory, AddToAList_ThrowsAndLeavesTheRecordsAsTheyWere)
         },
         [&](bool hasHappened) { EXPECT_EQ(hasThrown, hasHappened); });
     EXPECT_GT(failures, 3);
+}
+
+TEST(NoMemory, SortedTable_ThatWasNotMade_DoesNotCountAsSorted)
+{
+    bool hasThrown = false;
+    int const failures = FailEachAllocation(
+        [&]
+        {
+            SETMULTIPAR_LIST list(false);
+            hasThrown = false;
+            try
+            {
+                list.SetParameter("b", 1, -1);
+                list.Table(true);
+            }
+            catch (std::bad_alloc const&)
+            {
+                hasThrown = true;
+            }
+            FailingAllocation::Stop();
+            list.SetParameter("a", 1, -1);
+            list.Table(false);
+            EXPECT_STREQ(list.Table(true)->key, "a");
+        },
+        [&](bool hasHappened) { EXPECT_EQ(hasThrown, hasHappened); });
+    EXPECT_GT(failures, 1);
+}
+
+TEST(NoMemory, WriteIntoAContainerStream_LeavesTheOperationOut)
+{
+    char const* const keys[] = {"System/Folders/*", "Job/Copies", nullptr};
+    std::string const payload(100, 'x');
+    TABLE table(Sample);
+    bool isEveryOperationThere = false;
+    int const failures = FailEachAllocation(
+        [&]
+        {
+            MTICKET_BINSTREAM::Write writer(0);
+            int expected = 0;
+            auto const put = [&](auto operation)
+            {
+                try
+                {
+                    operation();
+                    ++expected;
+                }
+                catch (std::bad_alloc const&)
+                {
+                }
+            };
+            put([&] { writer.PutOperation(5, 1, MTICKET_OP_DELETE, payload); });
+            put([&] { writer.PutVoidOperation(5, 1, MTICKET_OP_DELETE); });
+            put([&] { writer.PutPartialTableOperation(5, 1, STICKET_OP_SET_PARTIAL, keys); });
+            put([&] { writer.PutSetMultipar(5, 1, table.Records(), 0); });
+            FailingAllocation::Stop();
+            std::string stream;
+            writer.GetAndClear(stream);
+            EXPECT_TRUE(MTICKET_BINSTREAM::Check(stream.data(), stream.size()));
+            MTICKET_BINSTREAM::Read reader(stream.data(), stream.size(), false);
+            int type;
+            int id;
+            TICKET_OP op = STICKET_OP_INVALID;
+            int operations = 0;
+            while (reader.ParseOperation(type, id, op) == MTICKET_BINSTREAM::GET_TICKET_OK)
+                ++operations;
+            int const unwritten = table.Records()[Sample.size() - 1].ok ? 0 : 1;  // left out without a word
+            EXPECT_EQ(operations, expected - unwritten);
+            isEveryOperationThere = operations == 4;
+        },
+        [&](bool hasHappened) { EXPECT_EQ(isEveryOperationThere, !hasHappened); });
+    EXPECT_GT(failures, 3);
+}
+
+TEST(NoMemory, ReadKeysOfAContainerStream_ThrowsAndCanBeAskedForAgain)
+{
+    char const* const keys[] = {"a", "b", "c", "d", "e", nullptr};
+    MTICKET_BINSTREAM::Write writer(0);
+    writer.PutPartialTableOperation(5, 1, STICKET_OP_SET_PARTIAL, keys);
+    std::string stream;
+    writer.GetAndClear(stream);
+    bool hasThrown = false;
+    int const failures = FailEachAllocation(
+        [&]
+        {
+            MTICKET_BINSTREAM::Read reader(stream.data(), stream.size(), false);
+            int type;
+            int id;
+            TICKET_OP op = STICKET_OP_INVALID;
+            reader.ParseOperation(type, id, op);
+            char const* const* table = keys;
+            hasThrown = false;
+            try
+            {
+                reader.GetPartialTable(table);
+            }
+            catch (std::bad_alloc const&)
+            {
+                hasThrown = true;
+            }
+            FailingAllocation::Stop();
+            EXPECT_EQ(table == nullptr, hasThrown);
+            EXPECT_EQ(reader.GetPartialTable(table), MTICKET_BINSTREAM::GET_TICKET_OK);
+            for (int i = 0; i < 5; ++i)
+                EXPECT_STREQ(table[i], keys[i]);
+            EXPECT_EQ(table[5], nullptr);
+        },
+        [&](bool hasHappened) { EXPECT_EQ(hasThrown, hasHappened); });
+    EXPECT_GT(failures, 1);
 }

@@ -58,7 +58,7 @@ INSTANTIATE_TEST_SUITE_P(
                     SMALL_STREAM{"OfLongKeys",
                                  {Int(std::string(130, 'k'), 1), Int(std::string(130, 'k') + "a", 2, 0),
                                   Delete("k", 0)}},
-                    SMALL_STREAM{"OfTheSignatureAlone", {Text("", "", -1)}}),
+                    SMALL_STREAM{"OfAValueWithoutAKey", {Text("", "", -1)}}),
     [](auto const& stream) { return std::string(stream.param.name); });
 }  // namespace
 

@@ -9,6 +9,7 @@
 #include <limits>
 #include <random>
 
+using StreamOracle::KEYS;
 using StreamOracle::RECORD;
 
 namespace
@@ -148,16 +149,22 @@ std::vector<RECORD> Read(std::string const& stream, bool fixPositions)
     return StreamOracle::RecordsOf(list.Table(false));
 }
 
-void ExpectTheSame(std::vector<RECORD> const& records)
+void ExpectWritten(std::vector<RECORD> const& records, KEYS keys, std::string const& expected)
 {
-    StreamOracle::TABLE table(records);
+    StreamOracle::TABLE table(records, keys);
     std::string stream;
     unsigned long const size = STICKET_BINSTREAM::Write(stream, table.Records(), 0);
     ASSERT_EQ(size, stream.size());
     for (std::size_t i = 0; i < records.size(); ++i)
         ASSERT_EQ(table.Records()[i].ok, StreamOracle::IsWritable(records[i])) << i;
-    std::string const expectedStream = StreamOracle::Encode(records).value();
-    ASSERT_TRUE(stream == expectedStream) << HexOf(stream) << "\ninstead of\n" << HexOf(expectedStream);
+    ASSERT_TRUE(stream == expected) << HexOf(stream) << "\ninstead of\n" << HexOf(expected);
+}
+
+void ExpectTheSame(std::vector<RECORD> const& records)
+{
+    std::string const stream = StreamOracle::Encode(records).value();
+    ASSERT_NO_FATAL_FAILURE(ExpectWritten(records, KEYS::APART, stream));
+    ASSERT_NO_FATAL_FAILURE(ExpectWritten(records, KEYS::SHARED, stream));
     for (bool const fixPositions : {false, true})
     {
         std::vector<RECORD> const expected = StreamOracle::ReadBack(records, fixPositions);

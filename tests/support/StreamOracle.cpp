@@ -156,7 +156,7 @@ std::vector<RECORD> RecordsOf(SETMULTIPAR const* table)
     return records;
 }
 
-TABLE::TABLE(std::vector<RECORD> records)
+TABLE::TABLE(std::vector<RECORD> records, KEYS keys)
     : m_records(std::move(records)), m_values(m_records.size()), m_table(m_records.size() + 1)
 {
     for (std::size_t i = 0; i < m_records.size(); ++i)
@@ -196,7 +196,8 @@ TABLE::TABLE(std::vector<RECORD> records)
         default:
             break;
         }
-        m_table[i].key = record.key.c_str();
+        bool const isShared = keys == KEYS::SHARED && i != 0 && record.key == m_records[i - 1].key;
+        m_table[i].key = isShared ? m_table[i - 1].key : record.key.c_str();
         m_table[i].type = record.type;
         m_table[i].value = record.isNull ? nullptr : word;
         m_table[i].pos = record.pos;

@@ -38,11 +38,19 @@ RECORD Delete(std::string key, int pos = -1);
 // The records of a library's table, terminator left out; nothing for null.
 std::vector<RECORD> RecordsOf(SETMULTIPAR const* table);
 
+// Whether every record has a key of its own, or equal ones in a row stand at one address, as in the table of
+// a list: a writer may tell them by their addresses then.
+enum class KEYS
+{
+    APART,
+    SHARED,
+};
+
 // A library's table of such records, whose addresses live as long as the object.
 class TABLE
 {
 public:
-    explicit TABLE(std::vector<RECORD> records);
+    explicit TABLE(std::vector<RECORD> records, KEYS keys = KEYS::APART);
     TABLE(TABLE const&) = delete;
     TABLE& operator=(TABLE const&) = delete;
 

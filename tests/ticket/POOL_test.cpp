@@ -72,6 +72,14 @@ TEST_F(Pool, LargePiece_LosesNothingOfTheCurrentBlock)
     ExpectAllUnspoilt();
 }
 
+TEST_F(Pool, PieceOfMoreThanAQuarterOfTheNextBlock_LosesNothingOfTheCurrentOne)
+{
+    char* const before = static_cast<char*>(Take(8, 8));
+    Take(600);
+    EXPECT_EQ(Take(8, 8), before + 8);
+    ExpectAllUnspoilt();
+}
+
 TEST_F(Pool, LargePieceFirst_IsAlignedAndWhole)
 {
     Take(1000000, 16);

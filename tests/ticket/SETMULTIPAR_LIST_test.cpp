@@ -533,6 +533,26 @@ TEST_F(List, Clear_LeavesAListThatWorks)
     }
 }
 
+// What comes first behind a Clear() takes the memory of what went.
+TYPED_TEST(CopiedNumber, Clear_ForgetsTheNumber)
+{
+    SETMULTIPAR_LIST list(false);
+    auto const value = TypeParam::Value;
+    for (int round = 0; round < 3; ++round)
+    {
+        list.SetParameter("Key", std::string(400, 'x'), -1);
+        list.xSetParameter("Key", TypeParam::Type, &value, -1);
+        void const* const kept = list.Table(false)[1].value;
+        EXPECT_EQ(Value<std::remove_const_t<decltype(value)>>(list.Table(false)[1]), value);
+        for (int i = 0; i < 300; ++i)
+            list.SetParameter("Key", std::string(100, static_cast<char>('a' + i % 26)) + std::to_string(i),
+                              -1);
+        EXPECT_EQ(list.Table(false)[1].value, kept);
+        EXPECT_EQ(Value<std::remove_const_t<decltype(value)>>(list.Table(false)[1]), value);
+        list.Clear();
+    }
+}
+
 TEST(ListThatCopies, Clear_LeavesItCopying)
 {
     SETMULTIPAR_LIST list(true);
