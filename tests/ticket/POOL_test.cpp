@@ -75,7 +75,7 @@ TEST_F(Pool, LargePiece_LosesNothingOfTheCurrentBlock)
 TEST_F(Pool, PieceOfMoreThanAQuarterOfTheNextBlock_LosesNothingOfTheCurrentOne)
 {
     char* const before = static_cast<char*>(Take(8, 8));
-    Take(600);
+    Take(3000);
     EXPECT_EQ(Take(8, 8), before + 8);
     ExpectAllUnspoilt();
 }
