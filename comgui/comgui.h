@@ -9,6 +9,7 @@
 #include "comgui/access/STICKET_MODIFY.h"
 #include "comgui/access/STICKET_READ.h"
 #include "comgui/folders/clFOLDER_VARIABLES.h"
+#include "comgui/foundation/CharSets.h"
 #include "comgui/foundation/MathLib.h"
 #include "comgui/foundation/SysLib.h"
 #include "comgui/foundation/export.h"
