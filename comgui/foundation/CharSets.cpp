@@ -161,15 +161,27 @@ void CharSets::FilterString::setReplace(char const* bytes, char with)
 
 std::string CharSets::FilterString::operator()(std::string const& s) const
 {
-    // Each entry is written, and the next one over it if it was 0: no branch depends on the text.
+    // Each entry is written, and the next one over it if it was 0: no branch depends on the text. A block
+    // counts for itself, so that it need not wait for the last byte of the one before.
+    constexpr int Block = 16;
     std::string result(s.size(), '\0');
     char* end = result.data();
-    for (char const c : s)
+    auto const take = [&](char const* from, int size)
     {
-        char const entry = (*this)(c);
-        *end = entry;
-        end += entry != 0;
-    }
+        std::size_t taken = 0;
+        for (int i = 0; i < size; ++i)
+        {
+            char const entry = (*this)(from[i]);
+            end[taken] = entry;
+            taken += entry != 0;
+        }
+        end += taken;
+    };
+    char const* next = s.data();
+    char const* const last = next + s.size();
+    for (; last - next >= Block; next += Block)
+        take(next, Block);
+    take(next, static_cast<int>(last - next));
     result.resize(static_cast<std::size_t>(end - result.data()));
     return result;
 }

@@ -21,11 +21,13 @@ protected:
     Locking(Locking const&) = delete;
     Locking& operator=(Locking const&) = delete;
 
+    // What the operation does to the lock. atStep, if it is set, looks on.
     template <typename OPERATION>
     STEPS Of(OPERATION operation)
     {
         watched.steps.clear();
         operation();
+        watched.atStep = nullptr;
         return watched.steps;
     }
 
