@@ -15,7 +15,9 @@ extern "C"
 
     // A new translator, which may be used from any thread; the caller deletes it. It asks the container for
     // its folders at once, and once more at each Load(); so the container must outlive it. With null it
-    // begins without folders, enabled, for those that SetFolderVariable brings.
+    // begins without folders, enabled, for those that SetFolderVariable brings. Loading does not end where a
+    // folder begins with $( but not with the variable of one before it, in the order of the 28 keys, or where
+    // nothing is decoded: that is for the server to get right.
     COMGUI_EXPORT clFOLDER_VARIABLES* CreateFolderVariables(MTICKET_ACCESS const* access);
 
     // Encode(path), Encode(key, relative) and Decode(path, backslashes) of the translator. The action is
