@@ -433,6 +433,7 @@ TEST(XmlEscaping, WhatLiesBeforeTheLastFindOfALowerByte_StaysRaw_ByDesign)
     EXPECT_EQ(Escaped("<&>"), "<&amp;&gt;");
     EXPECT_EQ(Escaped("&\""), "&&quot;");
     EXPECT_EQ(Escaped("\"&\""), "&quot;&&quot;");
+    EXPECT_EQ(Escaped("&'\""), "&'&quot;");  // nor does the & take the scan back
     EXPECT_EQ(Escaped("\xFC\"\xFC&\xFC"), "\xFC&quot;\xFC&amp;&#252;");
 }
 
