@@ -1,6 +1,7 @@
 // What is asked of the server beside its tickets: commands by name, files, jobs.
 #include "comgui/session/ComGUIManager.h"
 
+#include "comgui/foundation/CharSets.h"
 #include "comgui/session/TCommandRecord.h"
 #include "comgui/session/TJobIdentification.h"
 #include <cstdio>
@@ -125,6 +126,6 @@ int ComGUIManager::UploadJob(std::string path, int a, unsigned int b, int c, int
 
 std::string ComGUIManager::LeafName(std::string const& path)
 {
-    std::size_t const separator = path.find_last_of("\\/");
+    std::size_t const separator = CharSets::DBCS::find_last_of(path, "\\/", std::string::npos);
     return separator == std::string::npos ? path : path.substr(separator + 1);
 }
