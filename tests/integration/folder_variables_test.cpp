@@ -2,7 +2,9 @@
 // bundle.
 #include "tests/integration/Host.h"
 
+#include <link.h>
 #include <memory>
+#include <string>
 
 namespace
 {
@@ -79,6 +81,21 @@ TEST_F(FolderVariables, OfAnEndedSession_AreNotHandedOut)
     ASSERT_EQ(Manager().LogoutBackward(&operatorRecord), 0);
     EXPECT_EQ(MTICKET_READ::Of(container)->Decode("$(JOB)/x"), "$(JOB)/x");
     EXPECT_EQ(STICKET_READ::Of(ticket)->Decode("$(JOB)/x"), "$(JOB)/x");
+}
+
+TEST_F(FolderVariables, PlugInThatTranslates_UsesTheLibraryThatTheHostHasLoaded)
+{
+    ASSERT_EQ(ReadFromContainer(), InSite("job/x"));
+    int copies = 0;
+    dl_iterate_phdr(
+        [](dl_phdr_info* loaded, std::size_t, void* count)
+        {
+            bool const isLibrary = std::string(loaded->dlpi_name).find("/libcomgui.") != std::string::npos;
+            *static_cast<int*>(count) += isLibrary ? 1 : 0;
+            return 0;
+        },
+        &copies);
+    EXPECT_EQ(copies, 1);
 }
 
 TEST_F(FolderVariables, TranslatorOfTheHostsOwn_LoadsFromTheContainer)
