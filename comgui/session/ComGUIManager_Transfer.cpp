@@ -103,8 +103,8 @@ int ComGUIManager::PrepareJob(std::string path, int a, int b, int c, int d, int 
     record.iResult = b;
     if (c >= 0)
         std::snprintf(record.szText1, sizeof record.szText1, "%d", c);
-    // A long name fills the field to the last byte, without a zero byte: the server counts.
-    ("$(JOB)/" + LeafName(path)).copy(record.szText2, sizeof record.szText2);
+    path = "$(JOB)/" + LeafName(path);
+    path.copy(record.szText2, sizeof record.szText2);  // a long one to the last byte: the server counts
     return SendRecord("remote.job.prepare", record) == 0 ? record.iResult : -1;
 }
 

@@ -271,7 +271,7 @@ TEST_F(UploadJob, FillsTheRecordInAnOrderOfItsOwn_ByDesign)
     expected.iJobArg4 = 3;
     expected.pszUploadFolder = sent.pszUploadFolder;
     EXPECT_EQ(std::memcmp(&sent, &expected, sizeof sent), 0);
-    EXPECT_EQ(folder, std::string("$(UPLOADJOB)", 13));
+    EXPECT_EQ(folder, std::string("$(UPLOADJOB)\0", 13));
 }
 
 TEST_F(UploadJob, SendsThePathAndItsLeafName)
