@@ -218,9 +218,9 @@ TEST_F(FolderTranslators, UsedByManyThreadsWhileTheFoldersChange_GiveOldOrNewFol
     clFOLDER_VARIABLES& folders = *OfTheContainer(other);
     std::string const first = folders.Decode("$(TEMP)/x", false);
     std::atomic<bool> stop{false};
-    std::vector<std::thread> threads;
-    for (int i = 0; i < 3; ++i)
-        threads.emplace_back(
+    std::vector<std::thread> threads(3);
+    for (std::thread& thread : threads)
+        thread = std::thread(
             [&]
             {
                 while (!stop)
