@@ -65,7 +65,7 @@ public:
     std::optional<std::string> FolderOf(std::string_view variable) const;
 
     // The rows that cannot be resolved, ascending; a row that leans on one of them is one of them.
-    std::vector<std::size_t> const& Unresolved() const { return m_unresolved; }
+    std::vector<std::size_t> Unresolved() const { return m_unresolved; }
 
 private:
     std::array<std::string, FolderRows.size()> m_folders;

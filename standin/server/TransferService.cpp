@@ -187,7 +187,8 @@ void TransferService::Work()
         off_t size = 0;
         TransferResult const result =
             Finish(place, [&](RunningTransfer const& running) { size = CarryNow(waiting.request, running); });
-        Tell(waiting, result, size);
+        if (result != TransferCut)  // then nobody is there to be told
+            Tell(waiting, result, size);
         lock.lock();
     }
 }
