@@ -205,3 +205,17 @@ TEST(ReadWriteLock, AWriterThatWaits_GoesBeforeReadersThatComeLater)
     EXPECT_TRUE(lock.try_lock_shared());
     lock.unlock_shared();
 }
+
+TEST_F(ServerTest, Session_RemembersWhereItsClientIs)
+{
+    standin::Session& session = As("operator");
+    EXPECT_EQ(session.EndPoint(), "");
+    EXPECT_EQ(session.Folder(standin::Session::PreviewFolder), "");
+    session.SetEndPoint("127.0.0.1:50106");
+    session.SetFolder(standin::Session::PreviewFolder, "/preview");
+    session.SetFolder(standin::Session::ThumbnailFolder, "/thumbnail");
+    EXPECT_EQ(session.EndPoint(), "127.0.0.1:50106");
+    EXPECT_EQ(session.Folder(standin::Session::PreviewFolder), "/preview");
+    EXPECT_EQ(session.Folder(standin::Session::ThumbnailFolder), "/thumbnail");
+    EXPECT_EQ(As("guest").EndPoint(), "");
+}

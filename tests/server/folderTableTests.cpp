@@ -1,0 +1,345 @@
+// The folders by variable, and how the server keeps them such that clients come to an end with them.
+#include "standin/server/FolderTable.h"
+
+#include "standin/server/Site.h"
+#include "tests/server/ServerTest.h"
+#include "tests/server/storageSupport.h"
+#include <cstring>
+#include <gmock/gmock.h>
+
+using namespace standin;
+using testing::AllOf;
+using testing::HasSubstr;
+
+namespace
+{
+constexpr std::size_t Install = 0;
+constexpr std::size_t Temp = 1;
+constexpr std::size_t JobRow = 11;
+constexpr std::size_t Analytics = 27;
+
+FolderSettings Settings(int use, std::initializer_list<std::pair<std::size_t, char const*>> values)
+{
+    FolderSettings settings;
+    settings.use = use;
+    for (auto const& [row, value] : values)
+        settings.values[row] = value;
+    return settings;
+}
+
+// What a client does with the settings, step by step and in the plainest way; false if it never ends.
+bool ClientComesToAnEnd(FolderSettings const& settings)
+{
+    std::vector<std::pair<std::string, std::string>> mappings;
+    int const flags = settings.use & 3;
+    for (std::size_t row = 0; flags && row < FolderRows.size(); ++row)
+    {
+        std::string value = settings.values[row];
+        if (value.empty())
+            continue;
+        for (char& byte : value)
+            byte = byte == '\\' ? '/' : byte;
+        if (value.back() == '/')
+            value.pop_back();
+        for (int turn = 0; value.size() >= 4 && value[0] == '$' && value[1] == '('; ++turn)
+        {
+            if (turn == 1000)
+                return false;
+            auto const end = value.find(')');
+            if (!(flags & 1) || end == std::string::npos)
+                continue;
+            for (auto const& [variable, folder] : mappings)
+                if (variable == value.substr(2, end - 2))
+                {
+                    value = folder + value.substr(end + 1);
+                    break;
+                }
+        }
+        mappings.emplace_back(FolderRows[row].variable, value);
+    }
+    return true;
+}
+}  // namespace
+
+TEST(FolderTable, Folder_LeansOnThoseAboveIt)
+{
+    FolderTable const table(
+        Settings(3, {{Install, "/site/"}, {Temp, "$(INSTALL)/temp"}, {JobRow, "$(TEMP)\\jobs\\"}}).values);
+    EXPECT_EQ(table.FolderOf("INSTALL"), "/site");
+    EXPECT_EQ(table.FolderOf("TEMP"), "/site/temp");
+    EXPECT_EQ(table.FolderOf("JOB"), "/site/temp/jobs");
+    EXPECT_TRUE(table.Unresolved().empty());
+}
+
+TEST(FolderTable, UnknownVariable_AndOneWithoutValue_HaveNoFolder)
+{
+    FolderTable const table(Settings(3, {{Install, "/site"}}).values);
+    EXPECT_EQ(table.FolderOf("NOPE"), std::nullopt);
+    EXPECT_EQ(table.FolderOf("install"), std::nullopt);
+    EXPECT_EQ(table.FolderOf(""), std::nullopt);
+    EXPECT_EQ(table.FolderOf("TEMP"), std::nullopt);
+}
+
+TEST(FolderTable, WhatLeansOnAFolderBelow_IsUnresolved_AndSoIsWhatLeansOnThat)
+{
+    FolderTable const table(
+        Settings(3, {{Install, "/site"}, {Temp, "$(JOB)/x"}, {JobRow, "/job"}, {Analytics, "$(TEMP)"}})
+            .values);
+    EXPECT_THAT(table.Unresolved(), testing::ElementsAre(Temp, Analytics));
+    EXPECT_EQ(table.FolderOf("TEMP"), std::nullopt);
+    EXPECT_EQ(table.FolderOf("JOB"), "/job");
+}
+
+TEST(FolderTable, ValueWithoutAnEndOfItsVariable_IsUnresolved)
+{
+    EXPECT_FALSE(FolderTable(Settings(3, {{Temp, "$(INSTALL/x"}}).values).Unresolved().empty());
+    EXPECT_FALSE(FolderTable(Settings(3, {{Temp, "$()/x"}}).values).Unresolved().empty());
+    EXPECT_FALSE(FolderTable(Settings(3, {{Temp, "$(TEMP)/x"}}).values).Unresolved().empty());
+    EXPECT_TRUE(
+        FolderTable(Settings(3, {{Temp, "$()"}}).values).Unresolved().empty());  // no variable to a client
+}
+
+struct READING_FACT
+{
+    char const* name;
+    int use;
+    char const* temp;
+    bool canBeRead;
+};
+class Reading : public testing::TestWithParam<READING_FACT>
+{
+};
+
+TEST_P(Reading, CanBeRead_IsWhatAClientFinds)
+{
+    FolderSettings const settings = Settings(GetParam().use, {{Install, "/site"}, {Temp, GetParam().temp}});
+    EXPECT_EQ(settings.CanBeRead(), GetParam().canBeRead);
+    EXPECT_EQ(ClientComesToAnEnd(settings), GetParam().canBeRead);
+}
+
+INSTANTIATE_TEST_SUITE_P(Facts, Reading,
+                         testing::Values(READING_FACT{"Plain", 3, "/temp", true},
+                                         READING_FACT{"LeansOnOneAbove", 3, "$(INSTALL)/temp", true},
+                                         READING_FACT{"LeansOnOneBelow", 3, "$(JOB)/temp", false},
+                                         READING_FACT{"LeansOnItself", 1, "$(TEMP)", false},
+                                         READING_FACT{"Off", 0, "$(JOB)/temp", true},
+                                         READING_FACT{"OffByItsLowBits", 4, "$(JOB)/temp", true},
+                                         READING_FACT{"WriteOnlyAndPlain", 2, "/temp", true},
+                                         READING_FACT{"WriteOnlyAndAVariable", 2, "$(INSTALL)/temp", false},
+                                         READING_FACT{"WriteOnlyByItsLowBits", 6, "$(INSTALL)/temp", false},
+                                         READING_FACT{"VariableInTheMiddle", 3, "/temp/$(JOB)", true}),
+                         [](auto const& fact) { return std::string(fact.param.name); });
+
+TEST(Reading, RandomFolders_CanBeReadJustWhenAClientComesToAnEnd)
+{
+    std::mt19937_64 random = RandomFrom(28);
+    std::vector<std::string> const parts{"$(", "INSTALL", "TEMP",       ")",        "/",
+                                         "\\", "a",       "$(INSTALL)", "$(TEMP)/b"};
+    int readable = 0;
+    for (int round = 0; round < 20000; ++round)
+    {
+        FolderSettings settings;
+        settings.use = static_cast<int>(random() % 4);
+        for (std::size_t const row : {Install, Temp, JobRow})
+            for (auto count = random() % 5; count > 0; --count)
+                settings.values[row] += parts[random() % parts.size()];
+        bool const canBeRead = settings.CanBeRead();
+        readable += canBeRead ? 1 : 0;
+        ASSERT_EQ(canBeRead, ClientComesToAnEnd(settings))
+            << settings.use << " " << settings.values[Install] << " | " << settings.values[Temp] << " | "
+            << settings.values[JobRow];
+    }
+    EXPECT_GT(readable, 2000);
+    EXPECT_LT(readable, 18000);
+}
+
+class FolderWrites : public ServerTest
+{
+protected:
+    FolderWrites()
+    {
+        Set(SystemTicket, "System/UseFolderVariables", 3);
+        Set(SystemTicket, "System/InstallFolder", "/site");
+        Set(SystemTicket, "System/Folders/Temp", "$(INSTALL)/temp");
+    }
+};
+
+TEST_F(FolderWrites, WriteThatClientsCannotResolve_IsRefused)
+{
+    EXPECT_FALSE(Set(SystemTicket, "System/Folders/Temp", "$(JOB)/x"));
+    EXPECT_FALSE(Set(SystemTicket, "System/Folders/Temp", "$(JOB)/x", 0));
+    EXPECT_FALSE(Set(SystemTicket, "System/Folders/Thumbnail", "$(THUMBNAIL)"));
+    EXPECT_FALSE(Set(SystemTicket, "System/Folders/Thumbnail", "$(oops/x", -2));  // appended: its first value
+    EXPECT_STREQ(Text(SystemTicket, "System/Folders/Temp"), "$(INSTALL)/temp");
+    EXPECT_EQ(Text(SystemTicket, "System/Folders/Thumbnail"), nullptr);
+    EXPECT_EQ(storage.tickets[SystemTicket].count({"System/Folders/Thumbnail", 0}), 0u);
+}
+
+TEST_F(FolderWrites, WriteThatResolves_IsDone)
+{
+    EXPECT_TRUE(Set(SystemTicket, "System/Folders/Job", "$(TEMP)/job"));
+    EXPECT_EQ(Server().Folders().FolderOf("JOB"), "/site/temp/job");
+    EXPECT_TRUE(Set(SystemTicket, "System/Folders/Temp", "/elsewhere"));
+    EXPECT_EQ(Server().Folders().FolderOf("JOB"), "/elsewhere/job");
+}
+
+TEST_F(FolderWrites, LaterPositions_AreNotRead_AndMayHoldAnything)
+{
+    EXPECT_TRUE(Set(SystemTicket, "System/Folders/Temp", "$(JOB)/x", 1));
+}
+
+TEST_F(FolderWrites, FolderThatOthersLeanOn_CannotBeTakenAway)
+{
+    EXPECT_FALSE(Server().Set(As("admin"), SystemTicket, "System/InstallFolder", PARAM_NONE, nullptr, -1));
+    EXPECT_FALSE(Server().Set(As("admin"), SystemTicket, "System/InstallFolder", PARAM_NONE, nullptr, 0));
+    EXPECT_FALSE(Set(SystemTicket, "System/InstallFolder", ""));
+    EXPECT_FALSE(Set(SystemTicket, "System/InstallFolder", 7));  // no text: clients read nothing
+    EXPECT_STREQ(Text(SystemTicket, "System/InstallFolder"), "/site");
+    EXPECT_TRUE(Server().Set(As("admin"), SystemTicket, "System/Folders/Temp", PARAM_NONE, nullptr, -1));
+    EXPECT_TRUE(Server().Set(As("admin"), SystemTicket, "System/InstallFolder", PARAM_NONE, nullptr, -1));
+}
+
+TEST_F(FolderWrites, UseWithoutResolving_IsRefusedWhileAFolderHasAVariable)
+{
+    EXPECT_FALSE(Set(SystemTicket, "System/UseFolderVariables", 2));
+    EXPECT_TRUE(Set(SystemTicket, "System/UseFolderVariables", 0));
+    EXPECT_TRUE(Set(SystemTicket, "System/Folders/Temp", "$(NOPE)"));  // nobody looks at it
+    EXPECT_FALSE(Set(SystemTicket, "System/UseFolderVariables", 1));
+    EXPECT_TRUE(Set(SystemTicket, "System/Folders/Temp", "/temp"));
+    EXPECT_TRUE(Set(SystemTicket, "System/UseFolderVariables", 2));
+    EXPECT_FALSE(Set(SystemTicket, "System/Folders/Temp", "$(INSTALL)/temp"));
+}
+
+TEST_F(FolderWrites, Table_IsJudgedRecordByRecord)
+{
+    SETMULTIPAR table[5] = {};
+    auto const put = [&table](int index, char const* key, char const* value)
+    {
+        table[index].key = key;
+        table[index].type = PARAM_STRING;
+        table[index].value = value;
+        table[index].pos = -1;
+    };
+    put(0, "System/Folders/Print", "$(THUMBNAIL)/print");  // too early
+    put(1, "System/Folders/Thumbnail", "/thumbnail");
+    put(2, "System/Folders/RemoteIn", "$(THUMBNAIL)/in");  // now it is there
+    put(3, "System/Folders/Thumbnail", "$(NOPE)");
+    EXPECT_TRUE(Server().SetTable(As("admin"), SystemTicket, table));
+    EXPECT_FALSE(table[0].ok);
+    EXPECT_TRUE(table[1].ok);
+    EXPECT_TRUE(table[2].ok);
+    EXPECT_FALSE(table[3].ok);
+    EXPECT_EQ(Server().Folders().FolderOf("REMOTE_IN"), "/thumbnail/in");
+    EXPECT_EQ(Server().Folders().FolderOf("PRINT"), std::nullopt);
+}
+
+TEST_F(FolderWrites, OtherTickets_MayHoldSuchKeys)
+{
+    EXPECT_TRUE(Set(Job, "System/Folders/Temp", "$(NOPE)"));
+}
+
+class FoldersOfASite : public testing::Test
+{
+protected:
+    std::filesystem::path Folder() const { return folder / "site"; }
+
+    // Writes past the server, as a seed or an older program may have done.
+    void Put(std::string_view key, std::string_view text, int pos = 0)
+    {
+        StoredValue value;
+        value.type = PARAM_STRING;
+        value.bytes = text;
+        Site::Open(Folder(), COMGUI_TEST_SEED)
+            .storage()
+            .Apply({{Change::PutValue, SystemTicket, key, pos, value}});
+    }
+    void Put(std::string_view key, int number)
+    {
+        StoredValue value;
+        value.type = PARAM_INT;
+        value.integer = number;
+        Site::Open(Folder(), COMGUI_TEST_SEED)
+            .storage()
+            .Apply({{Change::PutValue, SystemTicket, key, 0, value}});
+    }
+
+    // Opens the site, keeps what it says, and gives the folders as they are then.
+    FolderSettings Opened()
+    {
+        testing::internal::CaptureStderr();
+        Site site = Site::Open(Folder(), COMGUI_TEST_SEED);
+        said = testing::internal::GetCapturedStderr();
+        FolderSettings settings;
+        site.storage().Load(SystemTicket,
+                            [&](std::string_view key, int pos, StoredValue const& value)
+                            {
+                                if (FolderSettings::Concern(key, pos))
+                                    settings.Put(key, value);
+                            });
+        return settings;
+    }
+
+    TemporaryFolder folder;
+    std::string said;
+};
+
+TEST_F(FoldersOfASite, ShippedOnes_CanBeRead)
+{
+    FolderSettings const settings = Opened();
+    EXPECT_EQ(said, "");
+    EXPECT_TRUE(settings.CanBeRead());
+    for (FolderRow const row : FolderRows)
+        EXPECT_TRUE(FolderTable(settings.values).FolderOf(row.variable)) << row.variable;
+}
+
+TEST_F(FoldersOfASite, UnresolvableOne_IsToldAndSwitchedOff)
+{
+    Put("System/Folders/Temp", "$(JOB)/temp");
+    FolderSettings const settings = Opened();
+    EXPECT_THAT(said,
+                AllOf(HasSubstr("System/Folders/Temp"), HasSubstr("$(JOB)/temp"), HasSubstr("give it")));
+    EXPECT_EQ(std::count(said.begin(), said.end(), '\n'), 1);
+    EXPECT_EQ(settings.values[Temp], "");
+    EXPECT_TRUE(settings.CanBeRead());
+    Opened();
+    EXPECT_EQ(said, "");  // once is enough
+}
+
+TEST_F(FoldersOfASite, WhatLeansOnAnUnresolvableOne_GoesWithIt)
+{
+    StoredValue temp;
+    temp.type = PARAM_STRING;
+    temp.bytes = "$(NOPE)";
+    StoredValue print = temp;
+    print.bytes = "$(TEMP)/print";
+    Site::Open(Folder(), COMGUI_TEST_SEED)
+        .storage()
+        .Apply({{Change::PutValue, SystemTicket, "System/Folders/Temp", 0, temp},
+                {Change::PutValue, SystemTicket, "System/Folders/Print", 0, print}});
+    FolderSettings const settings = Opened();
+    EXPECT_EQ(std::count(said.begin(), said.end(), '\n'), 2) << said;
+    EXPECT_TRUE(settings.CanBeRead());
+    EXPECT_EQ(settings.values[3], "");
+}
+
+TEST_F(FoldersOfASite, UseWithoutResolving_IsToldAndSwitchedOff)
+{
+    Put("System/UseFolderVariables", 2);
+    FolderSettings const settings = Opened();
+    EXPECT_THAT(said, AllOf(HasSubstr("System/UseFolderVariables is 2"), HasSubstr("set it to 3")));
+    EXPECT_EQ(settings.use, 0);
+    EXPECT_EQ(settings.values[Temp], "$(INSTALL)/temp");  // the folders stay
+}
+
+TEST_F(FoldersOfASite, Seed_KeepsTheOriginal)
+{
+    Opened();
+    std::string seed = ContentOf(Folder() / "seed.xml");
+    std::string const before = "$(INSTALL)/temp";
+    seed.replace(seed.find(before), before.size(), "$(JOB)/temp");
+    WriteFile(Folder() / "seed.xml", seed);
+    std::filesystem::remove(Folder() / "site.db");
+    EXPECT_EQ(Opened().values[Temp], "");
+    EXPECT_THAT(said, HasSubstr("System/Folders/Temp"));
+    EXPECT_EQ(ContentOf(Folder() / "seed.xml"), seed);
+}
