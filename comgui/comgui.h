@@ -8,6 +8,7 @@
 #include "comgui/access/MTICKET_READ.h"
 #include "comgui/access/STICKET_MODIFY.h"
 #include "comgui/access/STICKET_READ.h"
+#include "comgui/access/list_templates.h"
 #include "comgui/folders/clFOLDER_VARIABLES.h"
 #include "comgui/foundation/MathLib.h"
 #include "comgui/foundation/SysLib.h"
