@@ -61,7 +61,9 @@ template <typename List>
 void DropFailed(List& list, READ_TABLE const& table)
 {
     std::size_t kept = 0;
-    for (std::size_t i = 0; i < list.size(); ++i)
+    while (kept < list.size() && IsOk(table[kept]))
+        ++kept;
+    for (std::size_t i = kept; i < list.size(); ++i)
         if (IsOk(table[i]))
             list[kept++] = list[i];
     list.resize(kept);

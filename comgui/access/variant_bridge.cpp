@@ -36,7 +36,9 @@ template <typename Slots>
 wxString ReadTextOr(Slots const& slots, int pos, char const* key, wxString const& def)
 {
     wxString text;
-    return ReadText(slots, key, text, pos) ? text : def;
+    if (!ReadText(slots, key, text, pos))
+        return def;
+    return text;
 }
 
 // Whether the key holds nothing but texts, or nothing at all.
@@ -94,16 +96,20 @@ wxVariant ReadStored(Slots const& slots, char const* key, int pos)
 }
 
 template <typename Slots>
-wxVariant ReadListLike(Slots const& slots, wxVariant const& def)
+wxVariant ReadAs(Slots const& slots, char const* key, wxVariant const& def, int pos);
+
+// A list names its elements, whatever they were called in def.
+template <typename Slots>
+wxVariant ReadListLike(Slots const& slots, char const* key, wxVariant const& def)
 {
     wxVariant list;
     list.NullList();
     int pos = 0;
     for (wxVariant const* const element : def.GetList())
     {
-        wxVariant child = *element;
-        child.SetName(def.GetName());
-        list.Append(ReadVariantLike(slots, child, pos++));
+        wxVariant value = ReadAs(slots, key, *element, pos++);
+        value.SetName(def.GetName());
+        list.Append(value);
     }
     return list;
 }
@@ -118,16 +124,16 @@ wxVariant ReadTextsLike(Slots const& slots, char const* key, wxVariant const& de
 }
 
 template <typename Slots>
-wxVariant ReadAs(KIND kind, Slots const& slots, char const* key, wxVariant const& def, int pos)
+wxVariant ReadAs(Slots const& slots, char const* key, wxVariant const& def, int pos)
 {
-    switch (kind)
+    switch (KindOf(def))
     {
     case KIND::BOOL:
         return ReadBool(slots, pos, key, def.GetBool());
     case KIND::DOUBLE:
         return Read(slots, PARAM_DOUBLE, pos, key, def.GetDouble());
     case KIND::LIST:
-        return pos == -1 ? ReadListLike(slots, def) : def;
+        return pos == -1 ? ReadListLike(slots, key, def) : def;
     case KIND::LONG:
         return static_cast<long>(Read(slots, PARAM_INT, pos, key, static_cast<int>(def.GetLong())));
     case KIND::STRING:
@@ -168,7 +174,7 @@ wxVariant ReadVariantLike(Slots const& slots, wxVariant const& def, int pos)
 {
     // The local encoding, unlike the names that ReadVariant gives: names are the host's own.
     wxString const& name = def.GetName();
-    wxVariant value = ReadAs(KindOf(def), slots, name.mb_str(wxConvLibc), def, pos);
+    wxVariant value = ReadAs(slots, name.mb_str(wxConvLibc), def, pos);
     value.SetName(name);
     return value;
 }
