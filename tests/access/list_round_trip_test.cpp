@@ -9,6 +9,8 @@ namespace
 {
 constexpr int Rounds = 300;
 
+std::mt19937 RandomFrom(unsigned seed) { return std::mt19937(seed); }
+
 // The values of a key as a ticket should hold them.
 template <typename T>
 class MODEL
@@ -49,7 +51,7 @@ template <typename Family>
 class RoundTrip : public ListsInBothFamilies<Family>
 {
 protected:
-    std::mt19937 random{20261121};
+    std::mt19937 random = RandomFrom(20261121);
 
     std::size_t Below(std::size_t limit)
     {

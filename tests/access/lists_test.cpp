@@ -2,10 +2,6 @@
 #include "tests/access/ListFamilies.h"
 
 #include <cstring>
-#include <gmock/gmock.h>
-
-using testing::ElementsAre;
-using testing::IsEmpty;
 
 namespace
 {
@@ -26,6 +22,8 @@ protected:
     PARAM_TYPE const type = GetParamType<T>();
     std::vector<T> const three = SomeValues<T>(3);
     std::vector<T> list = std::vector<T>(5, SomeValues<T>()[1]);
+
+    static std::vector<T> List(std::initializer_list<T> values) { return values; }
 
     std::vector<T> Stored()
     {
@@ -71,6 +69,8 @@ using Cases =
                    LIST_CASE<CONTAINED, unsigned int>, LIST_CASE<CONTAINED, long long>,
                    LIST_CASE<CONTAINED, unsigned long long>, LIST_CASE<CONTAINED, double>>;
 
+std::vector<CALL> Calls(std::initializer_list<CALL> calls) { return calls; }
+
 // Slots of tables that report failure and success in their records, and something else in their result.
 int ReadNothingButSayOk(void*, int, int, GETMULTIPAR* table)
 {
@@ -100,9 +100,9 @@ TYPED_TEST(VectorRead, Values_ComeWithOneCountAndOneTableFrom0)
     this->ticket.StoreList(this->three);
     EXPECT_TRUE(this->ticket.GetVector(this->list));
     EXPECT_EQ(this->list, this->three);
-    EXPECT_THAT(this->calls, ElementsAre(this->ticket.Get(PARAM_COUNT, -1), this->ticket.GetTable(),
-                                         this->ticket.Get(this->type, 0), this->ticket.Get(this->type, 1),
-                                         this->ticket.Get(this->type, 2)));
+    EXPECT_EQ(this->calls, Calls({this->ticket.Get(PARAM_COUNT, -1), this->ticket.GetTable(),
+                                  this->ticket.Get(this->type, 0), this->ticket.Get(this->type, 1),
+                                  this->ticket.Get(this->type, 2)}));
 }
 
 TYPED_TEST(VectorRead, AllOfTheRange_ComesBack)
@@ -117,7 +117,7 @@ TYPED_TEST(VectorRead, SingleValue_IsAListOfOne)
 {
     this->ticket.Store(this->three[0], -1);
     EXPECT_TRUE(this->ticket.GetVector(this->list));
-    EXPECT_THAT(this->list, ElementsAre(this->three[0]));
+    EXPECT_EQ(this->list, this->List({this->three[0]}));
 }
 
 TYPED_TEST(VectorRead, MissingKey_IsFalseAndLeavesTheVector)
@@ -125,7 +125,7 @@ TYPED_TEST(VectorRead, MissingKey_IsFalseAndLeavesTheVector)
     auto const old = this->list;
     EXPECT_FALSE(this->ticket.GetVector(this->list));
     EXPECT_EQ(this->list, old);
-    EXPECT_THAT(this->calls, ElementsAre(this->ticket.Get(PARAM_COUNT, -1)));
+    EXPECT_EQ(this->calls, Calls({this->ticket.Get(PARAM_COUNT, -1)}));
 }
 
 TYPED_TEST(VectorRead, CountThatTheSlotDoesNotWrite_Is0)
@@ -136,7 +136,7 @@ TYPED_TEST(VectorRead, CountThatTheSlotDoesNotWrite_Is0)
     auto const old = this->list;
     EXPECT_FALSE(this->ticket.GetVector(this->list));
     EXPECT_EQ(this->list, old);
-    EXPECT_THAT(this->calls, IsEmpty());
+    EXPECT_TRUE(this->calls.empty());
 }
 
 TYPED_TEST(VectorRead, RecordThatFails_IsLeftOutAndTheLaterOnesMoveUp)
@@ -144,7 +144,7 @@ TYPED_TEST(VectorRead, RecordThatFails_IsLeftOutAndTheLaterOnesMoveUp)
     this->ticket.StoreList(this->three);
     this->ticket.fake.FailPosition(1);
     EXPECT_TRUE(this->ticket.GetVector(this->list));
-    EXPECT_THAT(this->list, ElementsAre(this->three[0], this->three[2]));
+    EXPECT_EQ(this->list, this->List({this->three[0], this->three[2]}));
 }
 
 TYPED_TEST(VectorRead, FirstAndLastRecordsThatFail_AreLeftOut)
@@ -152,10 +152,10 @@ TYPED_TEST(VectorRead, FirstAndLastRecordsThatFail_AreLeftOut)
     this->ticket.StoreList(this->three);
     this->ticket.fake.FailPosition(0);
     EXPECT_TRUE(this->ticket.GetVector(this->list));
-    EXPECT_THAT(this->list, ElementsAre(this->three[1], this->three[2]));
+    EXPECT_EQ(this->list, this->List({this->three[1], this->three[2]}));
     this->ticket.fake.FailPosition(2);
     EXPECT_TRUE(this->ticket.GetVector(this->list));
-    EXPECT_THAT(this->list, ElementsAre(this->three[0], this->three[1]));
+    EXPECT_EQ(this->list, this->List({this->three[0], this->three[1]}));
 }
 
 TYPED_TEST(VectorRead, AllRecordsFail_IsFalseAndEmpty)
@@ -163,14 +163,14 @@ TYPED_TEST(VectorRead, AllRecordsFail_IsFalseAndEmpty)
     this->ticket.StoreList(this->three);
     this->ticket.fake.FailCall(1);
     EXPECT_FALSE(this->ticket.GetVector(this->list));
-    EXPECT_THAT(this->list, IsEmpty());
+    EXPECT_TRUE(this->list.empty());
 }
 
 TYPED_TEST(VectorRead, ValuesOfAnotherType_Fail)
 {
     this->ticket.Store("text", -1);
     EXPECT_FALSE(this->ticket.GetVector(this->list));
-    EXPECT_THAT(this->list, IsEmpty());
+    EXPECT_TRUE(this->list.empty());
 }
 
 TYPED_TEST(VectorRead, ListThatShrinksBetweenTheCalls_IsReadAsItIs)
@@ -185,7 +185,7 @@ TYPED_TEST(VectorRead, ListThatShrinksBetweenTheCalls_IsReadAsItIs)
         return read(instance, ticketType, id, table);
     };
     EXPECT_TRUE(this->ticket.GetVector(this->list));
-    EXPECT_THAT(this->list, ElementsAre(this->three[0], this->three[1]));
+    EXPECT_EQ(this->list, this->List({this->three[0], this->three[1]}));
 }
 
 TYPED_TEST(VectorRead, ResultOfTheTableSlot_DoesNotCount)
@@ -196,7 +196,7 @@ TYPED_TEST(VectorRead, ResultOfTheTableSlot_DoesNotCount)
     EXPECT_EQ(this->list.size(), 3u);
     this->ticket.fake.Access()->MGETMULTIPAR = SayOkAndReadNothing;
     EXPECT_FALSE(this->ticket.GetVector(this->list));
-    EXPECT_THAT(this->list, IsEmpty());
+    EXPECT_TRUE(this->list.empty());
 }
 
 TYPED_TEST(ArrayRead, AsLongAsTheList_IsReadWithOneTableAndNoCount)
@@ -204,9 +204,9 @@ TYPED_TEST(ArrayRead, AsLongAsTheList_IsReadWithOneTableAndNoCount)
     this->ticket.StoreList(this->three);
     auto const old = this->list;
     EXPECT_TRUE(this->ticket.GetArray(this->list.data(), 3));
-    EXPECT_THAT(this->list, ElementsAre(this->three[0], this->three[1], this->three[2], old[3], old[4]));
-    EXPECT_THAT(this->calls, ElementsAre(this->ticket.GetTable(), this->ticket.Get(this->type, 0),
-                                         this->ticket.Get(this->type, 1), this->ticket.Get(this->type, 2)));
+    EXPECT_EQ(this->list, this->List({this->three[0], this->three[1], this->three[2], old[3], old[4]}));
+    EXPECT_EQ(this->calls, Calls({this->ticket.GetTable(), this->ticket.Get(this->type, 0),
+                                  this->ticket.Get(this->type, 1), this->ticket.Get(this->type, 2)}));
 }
 
 TYPED_TEST(ArrayRead, ShorterThanTheList_IsTrueWithTheFirstValues)
@@ -214,7 +214,7 @@ TYPED_TEST(ArrayRead, ShorterThanTheList_IsTrueWithTheFirstValues)
     this->ticket.StoreList(this->three);
     auto const old = this->list;
     EXPECT_TRUE(this->ticket.GetArray(this->list.data(), 2));
-    EXPECT_THAT(this->list, ElementsAre(this->three[0], this->three[1], old[2], old[3], old[4]));
+    EXPECT_EQ(this->list, this->List({this->three[0], this->three[1], old[2], old[3], old[4]}));
 }
 
 TYPED_TEST(ArrayRead, LongerThanTheList_IsFalseWithItsHeadWritten)
@@ -222,7 +222,7 @@ TYPED_TEST(ArrayRead, LongerThanTheList_IsFalseWithItsHeadWritten)
     this->ticket.StoreList(this->three);
     auto const old = this->list;
     EXPECT_FALSE(this->ticket.GetArray(this->list.data(), 4));
-    EXPECT_THAT(this->list, ElementsAre(this->three[0], this->three[1], this->three[2], old[3], old[4]));
+    EXPECT_EQ(this->list, this->List({this->three[0], this->three[1], this->three[2], old[3], old[4]}));
 }
 
 TYPED_TEST(ArrayRead, RecordThatFails_IsFalseAndItsPlaceIsAsItWas)
@@ -231,7 +231,7 @@ TYPED_TEST(ArrayRead, RecordThatFails_IsFalseAndItsPlaceIsAsItWas)
     this->ticket.fake.FailPosition(0);
     auto const old = this->list;
     EXPECT_FALSE(this->ticket.GetArray(this->list.data(), 3));
-    EXPECT_THAT(this->list, ElementsAre(old[0], this->three[1], this->three[2], old[3], old[4]));
+    EXPECT_EQ(this->list, this->List({old[0], this->three[1], this->three[2], old[3], old[4]}));
 }
 
 TYPED_TEST(ArrayRead, MissingKey_IsFalseAndLeavesTheArray)
@@ -247,7 +247,7 @@ TYPED_TEST(ArrayRead, CountOf0_IsFalseAndCallsNoSlot)
     this->ticket.StoreList(this->three);
     EXPECT_FALSE(this->ticket.GetArray(this->list.data(), 0));
     EXPECT_FALSE(this->ticket.xGetArray(this->list.data(), 0));
-    EXPECT_THAT(this->calls, IsEmpty());
+    EXPECT_TRUE(this->calls.empty());
 }
 
 TYPED_TEST(ArrayRead, ResultOfTheTableSlot_DoesNotCount)
@@ -265,9 +265,8 @@ TYPED_TEST(ListWrite, Three_GoAsOneTableFromMinus1)
         {
             EXPECT_TRUE(write(this->three));
             EXPECT_EQ(this->Stored(), this->three);
-            EXPECT_THAT(this->calls,
-                        ElementsAre(this->ticket.SetTable(), this->ticket.Set(this->type, -1),
-                                    this->ticket.Set(this->type, 1), this->ticket.Set(this->type, 2)));
+            EXPECT_EQ(this->calls, Calls({this->ticket.SetTable(), this->ticket.Set(this->type, -1),
+                                          this->ticket.Set(this->type, 1), this->ticket.Set(this->type, 2)}));
         });
 }
 
@@ -288,8 +287,8 @@ TYPED_TEST(ListWrite, One_GoesAsAScalarDoes)
         [this](auto write)
         {
             EXPECT_TRUE(write({this->three[0]}));
-            EXPECT_THAT(this->Stored(), ElementsAre(this->three[0]));
-            EXPECT_THAT(this->calls, ElementsAre(this->ticket.SetTable(), this->ticket.Set(this->type, -1)));
+            EXPECT_EQ(this->Stored(), this->List({this->three[0]}));
+            EXPECT_EQ(this->calls, Calls({this->ticket.SetTable(), this->ticket.Set(this->type, -1)}));
         });
 }
 
@@ -301,7 +300,7 @@ TYPED_TEST(ListWrite, Empty_DeletesTheKey)
             this->ticket.StoreList(this->three);
             EXPECT_TRUE(write({}));
             EXPECT_EQ(this->ticket.Count(), 0u);
-            EXPECT_THAT(this->calls, ElementsAre(this->ticket.Delete()));
+            EXPECT_EQ(this->calls, Calls({this->ticket.Delete()}));
         });
 }
 
@@ -336,7 +335,7 @@ TYPED_TEST(ListWrite, RecordThatFails_IsFalseAndTheOthersStayWritten)
             this->ticket.fake.FailPosition(2);
             EXPECT_FALSE(write(this->three));
             this->ticket.fake.FailPosition(1000);
-            EXPECT_THAT(this->Stored(), ElementsAre(this->three[0], this->three[1]));
+            EXPECT_EQ(this->Stored(), this->List({this->three[0], this->three[1]}));
         });
 }
 
