@@ -1,16 +1,12 @@
 // What a typed read costs above the slot that it calls: a test of the result, and nothing allocated. The
 // slot only stores a number, so that the difference shows.
-#include <comgui/comgui.h>
+#include "bench/heap_count.h"
 
-#include <atomic>
 #include <benchmark/benchmark.h>
-#include <cstdlib>
-#include <new>
+#include <comgui/comgui.h>
 
 namespace
 {
-std::atomic<long> allocations{0};
-
 int StoreNumber(void*, int, int, char const*, PARAM_TYPE, void* value, int)
 {
     *static_cast<int*>(value) = 25;
@@ -32,10 +28,10 @@ void Measure(benchmark::State& state, Read read)
     benchmark::DoNotOptimize(access);  // the slot is not known at compile time
     if (read(access) != 25)
         return state.SkipWithError("the read does not give what it should");
-    long const before = allocations;
+    long const before = BlocksTaken();
     for (auto _ : state)
         benchmark::DoNotOptimize(read(access));
-    state.counters["allocations"] = static_cast<double>(allocations - before);
+    state.counters["allocations"] = static_cast<double>(BlocksTaken() - before);
 }
 
 void SlotDirectly(benchmark::State& state)
@@ -56,19 +52,6 @@ void GetIntParameter(benchmark::State& state)
             { return MTICKET_READ::Of(access)->GetIntParameter(3, 1, "Job/Copies", -1); });
 }
 }  // namespace
-
-// Not inlined, or the compiler takes malloc and delete, or new and free, for a mismatched pair.
-[[gnu::noinline]] void* operator new(std::size_t size)
-{
-    allocations.fetch_add(1, std::memory_order_relaxed);
-    if (void* const memory = std::malloc(size ? size : 1))
-        return memory;
-    throw std::bad_alloc();
-}
-
-[[gnu::noinline]] void operator delete(void* memory) noexcept { std::free(memory); }
-
-[[gnu::noinline]] void operator delete(void* memory, std::size_t) noexcept { std::free(memory); }
 
 BENCHMARK(SlotDirectly);
 BENCHMARK(GetIntParameter);

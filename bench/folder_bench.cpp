@@ -1,24 +1,20 @@
 // What a translation of a path costs beside the least that it can cost, a copy of its result; and the filter
 // of bytes beside the loop that anyone would write.
+#include "bench/heap_count.h"
 #include "bench/ratio_report.h"
 
 #include <comgui/comgui.h>
 
 #include <algorithm>
-#include <atomic>
 #include <benchmark/benchmark.h>
 #include <cstdint>
-#include <cstdlib>
 #include <iterator>
 #include <memory>
-#include <new>
 #include <random>
 #include <string>
 
 namespace
 {
-std::atomic<long> allocations{0};
-
 // As a server has them: 28 folders, most of them side by side in one.
 std::unique_ptr<clFOLDER_VARIABLES> Translator()
 {
@@ -44,11 +40,11 @@ void Measure(benchmark::State& state, TRANSLATE translate, std::string const& ex
 {
     if (Path.size() != 60 || translate() != expected)
         return state.SkipWithError("the translation is not what it should be");
-    long const before = allocations;
+    long const before = BlocksTaken();
     for (auto _ : state)
         benchmark::DoNotOptimize(translate());
     state.counters["allocations"] =
-        benchmark::Counter(static_cast<double>(allocations - before), benchmark::Counter::kAvgIterations);
+        benchmark::Counter(static_cast<double>(BlocksTaken() - before), benchmark::Counter::kAvgIterations);
 }
 
 void Encode(benchmark::State& state)
@@ -139,19 +135,6 @@ void OneCycleAByte(benchmark::State& state)
             asm volatile("" : "+r"(i));
 }
 }  // namespace
-
-// Not inlined, or the compiler takes malloc and delete, or new and free, for a mismatched pair.
-[[gnu::noinline]] void* operator new(std::size_t size)
-{
-    allocations.fetch_add(1, std::memory_order_relaxed);
-    if (void* const memory = std::malloc(size ? size : 1))
-        return memory;
-    throw std::bad_alloc();
-}
-
-[[gnu::noinline]] void operator delete(void* memory) noexcept { std::free(memory); }
-
-[[gnu::noinline]] void operator delete(void* memory, std::size_t) noexcept { std::free(memory); }
 
 int main(int argc, char** argv)
 {

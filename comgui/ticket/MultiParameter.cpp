@@ -1,6 +1,5 @@
 #include "comgui/ticket/MultiParameter.h"
 
-#include <algorithm>
 #include <cstdlib>
 
 namespace
@@ -32,13 +31,21 @@ Record* NewTable(unsigned long count, char const* key, PARAM_TYPE type)
 template <typename Record>
 bool AllOk(Record const* table)
 {
-    return table && std::all_of(table, table + Length(table), comgui::detail::IsOk<Record>);
+    if (table == nullptr)
+        return false;
+    while (table->key && comgui::detail::IsOk(*table))
+        ++table;
+    return table->key == nullptr;
 }
 
 template <typename Record>
 bool AnyOk(Record const* table)
 {
-    return table && std::any_of(table, table + Length(table), comgui::detail::IsOk<Record>);
+    if (table == nullptr)
+        return false;
+    while (table->key && !comgui::detail::IsOk(*table))
+        ++table;
+    return table->key != nullptr;
 }
 }  // namespace
 
