@@ -27,14 +27,15 @@ namespace fs = std::filesystem;
 
 void WriteFile(fs::path const& file, std::size_t mebibytes)
 {
-    std::mt19937_64 random(4711);
-    std::vector<std::uint64_t> block(1024 * 1024 / sizeof(std::uint64_t));
+    constexpr std::size_t BlockSize = std::size_t{1024} * 1024;
+    std::mt19937_64 random{std::random_device()()};
+    std::vector<std::uint64_t> block(BlockSize / sizeof(std::uint64_t));
     std::generate(block.begin(), block.end(), random);
     std::ofstream stream(file, std::ios::binary);
     for (std::size_t i = 0; i < mebibytes; ++i)
     {
         block[0] = i;  // lest a file system find out that all blocks are one
-        stream.write(reinterpret_cast<char const*>(block.data()), 1024 * 1024);
+        stream.write(reinterpret_cast<char const*>(block.data()), BlockSize);
     }
     if (!stream.flush())
         Fail("the file to be sent cannot be written");
@@ -117,7 +118,7 @@ void Measure(fs::path const& folder, std::size_t mebibytes, int rounds)
 int main(int argc, char** argv)
 {
     std::size_t const mebibytes = argc > 1 ? std::strtoul(argv[1], nullptr, 10) : 1024;
-    int const rounds = argc > 2 ? std::atoi(argv[2]) : 5;
+    int const rounds = argc > 2 ? static_cast<int>(std::strtol(argv[2], nullptr, 10)) : 5;
     if (mebibytes == 0 || rounds < 1)
         return std::fputs("usage: transfer_bench [MiB [rounds]]\n", stderr), 1;
     // On a disk, beside which /tmp may be memory.

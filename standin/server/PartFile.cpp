@@ -26,8 +26,7 @@ std::optional<pid_t> ProcessOf(std::string_view name)
     auto const dash = name.find('-');
     auto const areDigits = [](std::string_view text)
     { return !text.empty() && text.find_first_not_of("0123456789") == text.npos; };
-    if (dash == name.npos || dash > 9 || !areDigits(name.substr(0, dash)) ||
-        !areDigits(name.substr(dash + 1)))
+    if (dash > 9 || !areDigits(name.substr(0, dash)) || !areDigits(name.substr(dash + 1)))
         return std::nullopt;
     return std::stoi(std::string(name.substr(0, dash)));
 }
