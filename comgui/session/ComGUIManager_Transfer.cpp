@@ -1,6 +1,7 @@
 // What is asked of the server beside its tickets: commands by name, files, jobs.
 #include "comgui/session/ComGUIManager.h"
 
+#include "comgui/foundation/CharSets.h"
 #include "comgui/session/TCommandRecord.h"
 #include "comgui/session/TJobIdentification.h"
 #include <cstdio>
@@ -102,8 +103,8 @@ int ComGUIManager::PrepareJob(std::string path, int a, int b, int c, int d, int 
     record.iResult = b;
     if (c >= 0)
         std::snprintf(record.szText1, sizeof record.szText1, "%d", c);
-    // A long name fills the field to the last byte, without a zero byte: the server counts.
-    ("$(JOB)/" + LeafName(path)).copy(record.szText2, sizeof record.szText2);
+    path = "$(JOB)/" + LeafName(path);
+    path.copy(record.szText2, sizeof record.szText2);  // a long one to the last byte: the server counts
     return SendRecord("remote.job.prepare", record) == 0 ? record.iResult : -1;
 }
 
@@ -125,6 +126,6 @@ int ComGUIManager::UploadJob(std::string path, int a, unsigned int b, int c, int
 
 std::string ComGUIManager::LeafName(std::string const& path)
 {
-    std::size_t const separator = path.find_last_of("\\/");
+    std::size_t const separator = CharSets::DBCS::find_last_of(path, "\\/", std::string::npos);
     return separator == std::string::npos ? path : path.substr(separator + 1);
 }

@@ -1,10 +1,9 @@
-// A small buffer in front of a growing string, for many small appends: room is tested once an item instead of
-// once a byte, and the string grows by the chunk. The place where the next byte goes is the caller's to
-// carry.
+// A small buffer in front of a growing string, for many small appends: room is asked for once in a while
+// instead of once a byte, and the string grows by the chunk. The place where the next byte goes is the
+// caller's to carry; wherever one is handed out, Spare bytes may be put without asking.
 #pragma once
 
-#include <cstddef>
-#include <cstring>
+#include "comgui/foundation/short_copy.h"
 #include <string>
 #include <string_view>
 
@@ -13,27 +12,21 @@ namespace comgui::detail
 class BYTE_CHUNK
 {
 public:
+    static constexpr std::size_t Spare = 64;
+
     explicit BYTE_CHUNK(std::string& data) : m_data(data) {}
 
     char* Begin() { return m_bytes; }
 
-    // The place to go on at, with room for that many bytes, which must be at most half a chunk.
-    char* Room(char* to, std::size_t size)
-    {
-        return size <= static_cast<std::size_t>(m_bytes + sizeof m_bytes - to) ? to : Flush(to);
-    }
+    // The place to go on at.
+    char* Room(char* to) { return to <= m_bytes + Size - Spare ? to : Flush(to); }
 
-    // Bytes of any number.
+    // Puts bytes of any number. A few, up to ShortCopy, come out of what is spare.
     char* Put(char* to, std::string_view bytes)
     {
-        if (bytes.size() > sizeof m_bytes / 2)
-        {
-            to = Flush(to);
-            m_data.append(bytes);
-            return to;
-        }
-        to = Room(to, bytes.size());
-        std::memcpy(to, bytes.data(), bytes.size());
+        if (bytes.size() > ShortCopy)
+            return PutMany(to, bytes);
+        CopyShort(to, bytes.data(), bytes.size());
         return to + bytes.size();
     }
 
@@ -45,7 +38,23 @@ public:
     }
 
 private:
+    static constexpr std::size_t Size = 4096;
+
+    [[gnu::noinline]] char* PutMany(char* to, std::string_view bytes)
+    {
+        if (bytes.size() > Size / 2)
+        {
+            to = Flush(to);
+            m_data.append(bytes);
+            return to;
+        }
+        if (bytes.size() > static_cast<std::size_t>(m_bytes + Size - to))
+            to = Flush(to);
+        std::memcpy(to, bytes.data(), bytes.size());
+        return Room(to + bytes.size());
+    }
+
     std::string& m_data;
-    char m_bytes[4096];
+    char m_bytes[Size];
 };
 }  // namespace comgui::detail

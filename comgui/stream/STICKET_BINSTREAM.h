@@ -119,7 +119,6 @@ public:
     void PutUnsigned(unsigned int value);
 
 private:
-    class ENCODER;
     template <typename... T>
     COMGUI_LOCAL void Append(char* (*put)(char*, T...), T... value);
 
@@ -180,8 +179,10 @@ private:
     COMGUI_LOCAL unsigned char TakeTag(unsigned long& size);
     COMGUI_LOCAL std::string_view TakeKey(unsigned long size, bool compressed);
     COMGUI_LOCAL static unsigned long TakeShared(BYTES& item);
+    std::string_view Key() const { return {previousKey.data(), previousText}; }
 
     BYTES bytes;
     std::string previousKey;  // as long as the longest key so far
     unsigned long previousSize = 0;
+    unsigned long previousText = 0;  // bytes in front of the key's first zero byte
 };

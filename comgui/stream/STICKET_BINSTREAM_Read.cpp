@@ -85,7 +85,9 @@ std::string_view STICKET_BINSTREAM::IMPORT_INTERN::TakeKey(unsigned long size, b
     previousSize = shared + item.left;
     if (previousSize > previousKey.size())
         previousKey.resize(std::max(previousSize, 2 * previousKey.size()));
-    std::memcpy(previousKey.data() + shared, item.address, item.left);
+    std::string_view const tail(reinterpret_cast<char const*>(item.address), item.left);
+    Copy(previousKey.data() + shared, tail.data(), tail.size());
+    previousText = previousText < shared ? previousText : shared + std::min(tail.find('\0'), tail.size());
     return {previousKey.data(), previousSize};
 }
 
@@ -130,8 +132,7 @@ private:
         unsigned long size;
         if (m_cursor.TakeTag(size) != ITEM_FULL_KEY)
             throw "Signature not found";
-        TakeKey(size, false);
-        if (m_key != TicketSignature)
+        if (TakeKey(size, false) != TicketSignature)
             throw "Wrong signature";
     }
 
@@ -142,9 +143,11 @@ private:
         switch (m_cursor.TakeTag(size))
         {
         case ITEM_FULL_KEY:
-            return TakeKey(size, false);
+            TakeKey(size, false);
+            return;
         case ITEM_COMPRESSED_KEY:
-            return TakeKey(size, true);
+            TakeKey(size, true);
+            return;
         case ITEM_NUMBER:
             return TakeNumber(size);
         case ITEM_STRING:
@@ -162,11 +165,11 @@ private:
         }
     }
 
-    void TakeKey(unsigned long size, bool compressed)
+    std::string_view TakeKey(unsigned long size, bool compressed)
     {
-        m_key = m_cursor.TakeKey(size, compressed);
         m_cachedKey = nullptr;
         m_fixNext |= m_fixPositions;
+        return m_cursor.TakeKey(size, compressed);
     }
 
     void TakeNumber(unsigned long size)
@@ -182,9 +185,9 @@ private:
         case NUMBER_INT32:
             return AddInteger(static_cast<int>(GetBytes<std::uint32_t>(m_cursor.bytes.Take(4))));
         case NUMBER_SINGLE:
-            return AddDouble(&IMPORT_INTERN::GetFloat);
+            return AddDouble<&IMPORT_INTERN::GetFloat>();
         case NUMBER_DOUBLE:
-            return AddDouble(&IMPORT_INTERN::GetDouble);
+            return AddDouble<&IMPORT_INTERN::GetDouble>();
         case NUMBER_INT64:
             return AddInteger64();
         default:
@@ -195,7 +198,7 @@ private:
     [[gnu::noinline]] void AddText(unsigned char const* text, unsigned long size)
     {
         std::string_view const bytes(reinterpret_cast<char const*>(text), size);
-        Add(PARAM_STRING, [&] { return m_list->m_stringCache.Keep(bytes); });
+        Add(PARAM_STRING, [&] { return m_list->m_stringCache.Keep(bytes.substr(0, bytes.find('\0'))); });
     }
 
     [[gnu::noinline]] void AddBinary(unsigned char const* bytes, unsigned long size)
@@ -208,10 +211,11 @@ private:
         Add(PARAM_INT, [&] { return m_list->m_intCache.Keep(value); });
     }
 
-    [[gnu::noinline]] void AddDouble(void (IMPORT_INTERN::*get)(double&))
+    template <void (IMPORT_INTERN::*Get)(double&)>
+    [[gnu::noinline]] void AddDouble()
     {
         double value;
-        (m_cursor.*get)(value);
+        (m_cursor.*Get)(value);
         Add(PARAM_DOUBLE, [&] { return m_list->Cached(value); });
     }
 
@@ -229,9 +233,11 @@ private:
     {
         if (m_list == nullptr)
             return;
+        // The key last: its bytes were put together just now, and to load them at once would stall.
+        void const* const value = cached();
         if (m_cachedKey == nullptr)
-            m_cachedKey = m_list->m_keyCache.Keep(m_key);
-        m_list->Add(m_cachedKey, type, cached(), FixPos(m_fixNext, m_pos));
+            m_cachedKey = m_list->m_keyCache.Keep(m_cursor.Key());
+        m_list->Add(m_cachedKey, type, value, FixPos(m_fixNext, m_pos));
     }
 
     SETMULTIPAR_LIST* const m_list;
@@ -239,7 +245,6 @@ private:
     bool const m_fixPositions;
     bool m_fixNext = false;  // the next value is the first behind a key whose position is to be fixed
     int m_pos = -1;
-    std::string_view m_key;
     char const* m_cachedKey = nullptr;  // the list's copy of the current key, once it was needed
 };
 

@@ -9,9 +9,27 @@ using namespace comgui::detail;
 
 namespace
 {
-unsigned long SharedBytes(char const* left, char const* right, unsigned long limit)
+using Word = std::uint64_t;
+
+// Zero if a word of the one text is as in the other.
+Word Difference(char const* left, char const* right)
 {
-    constexpr unsigned long step = sizeof(std::uint64_t);
+    Word leftWord;
+    Word rightWord;
+    std::memcpy(&leftWord, left, sizeof leftWord);
+    std::memcpy(&rightWord, right, sizeof rightWord);
+    return leftWord ^ rightWord;
+}
+
+// The lowest byte that differs is the first, as the target is little-endian.
+unsigned long SharedBytes(Word difference)
+{
+    return static_cast<unsigned int>(std::countr_zero(difference)) / 8;
+}
+
+inline unsigned long SharedBytes(char const* left, char const* right, unsigned long limit)
+{
+    constexpr unsigned long step = sizeof(Word);
     unsigned long shared = 0;
     if (limit < step)
     {
@@ -19,19 +37,11 @@ unsigned long SharedBytes(char const* left, char const* right, unsigned long lim
             ++shared;
         return shared;
     }
-    // The last step looks at the last bytes, which may overlap those before.
-    for (;; shared = std::min(shared + step, limit - step))
-    {
-        std::uint64_t leftWord;
-        std::uint64_t rightWord;
-        std::memcpy(&leftWord, left + shared, sizeof leftWord);
-        std::memcpy(&rightWord, right + shared, sizeof rightWord);
-        // The lowest byte that differs is the first, as the target is little-endian.
-        if (leftWord != rightWord)
-            return shared + static_cast<unsigned long>(std::countr_zero(leftWord ^ rightWord)) / 8;
-        if (shared == limit - step)
-            return limit;
-    }
+    for (; shared < limit - step; shared += step)
+        if (Word const difference = Difference(left + shared, right + shared))
+            return shared + SharedBytes(difference);
+    shared = limit - step;  // the last step looks at the last bytes, which may overlap those before
+    return shared + SharedBytes(Difference(left + shared, right + shared));
 }
 
 // The types that a stream holds, a bit each: no pointers and no counts. Of a null value it holds only that a
@@ -41,58 +51,68 @@ constexpr unsigned int WithValue = 1u << PARAM_INT | 1u << PARAM_DOUBLE | 1u << 
                                    1u << PARAM_UNSIGNED64;
 constexpr unsigned int WithNull = 1u << PARAM_NONE | 1u << PARAM_STRING;
 
-inline bool IsWritable(PARAM_TYPE type, void const* value)
+inline bool IsOneOf(unsigned int types, PARAM_TYPE type)
 {
     auto const bit = static_cast<unsigned int>(type);
-    return bit <= PARAM_UNSIGNED64 && ((value ? WithValue : WithNull) >> bit & 1) != 0;
+    return bit <= PARAM_UNSIGNED64 && (types >> bit & 1) != 0;
 }
-}  // namespace
 
-// Adds the records of a table to a writer. Key and position are carried along here, and bytes gathered in a
-// chunk, until Finish() hands all to the writer. Whatever puts bytes takes the place where they go and
-// returns where they end, which is cheaper to hand around than to keep. Throws if there is no memory, and
-// what the items throw.
-class STICKET_BINSTREAM::WRITE::ENCODER
+inline bool IsWritable(PARAM_TYPE type, void const* value)
+{
+    return IsOneOf(value ? WithValue : WithNull, type);
+}
+
+// Adds the records of a table to a stream. Key and position are carried along here, and bytes gathered in a
+// chunk, until Finish() hands all on. Whatever puts bytes takes the place where they go and returns where
+// they end, which is cheaper to hand around than to keep. Throws if there is no memory, and what the items
+// throw.
+class ENCODER
 {
 public:
-    explicit ENCODER(WRITE& writer)
-        : m_writer(writer), m_chunk(writer.data), m_key(writer.lastKey), m_pos(writer.pos)
+    // The state of a WRITE, which outlives the encoder.
+    ENCODER(std::string& data, bool& first, std::string& lastKey, int& position)
+        : m_chunk(data), m_first(first), m_lastKey(lastKey), m_key(lastKey), m_lastPosition(position),
+          m_pos(position)
     {
     }
 
     char* Begin() { return m_chunk.Begin(); }
 
     // Puts the record, or passes it over; with it those that follow without any further word. Leaves record
-    // at the first that is not dealt with. The keys must stay until Finish().
+    // at the first that is not dealt with. The keys must stay until Finish(). What is put without asking for
+    // room: 10 bytes of signature, 8 of the key's header, 4 of position, 4 of the value's header, and 16 each
+    // of key and value.
     char* Put(char* to, SETMULTIPAR*& record)
     {
-        if (!IsWritable(record->type, record->value))
+        // As IsWritable, in an order that is quick for nearly all records.
+        if (record->value == nullptr) [[unlikely]]
         {
-            record++->ok = false;
-            return to;
+            if (!IsOneOf(WithNull, record->type))
+                return Refuse(to, record);
         }
-        if (m_writer.first)
-            to = PutSignature(to);
+        else if (!IsOneOf(WithValue, record->type)) [[unlikely]]
+            return Refuse(to, record);
+        to = m_chunk.Room(to);
         if (record->key != m_key.data())
             to = PutKey(to, record->key);
         if (record->pos != m_pos)
-            to = PutPosition(m_chunk.Room(to, MaxItemHeader), m_pos = record->pos);
+            to = PutPosition(to, m_pos = record->pos);
         return PutValue(to, record);
     }
 
     void Finish(char* to)
     {
         m_chunk.Flush(to);
-        if (m_key.data() != m_writer.lastKey.data())
-            m_writer.lastKey = m_key;
-        m_writer.pos = m_pos;
+        if (m_key.data() != m_lastKey.data())
+            m_lastKey = m_key;
+        m_lastPosition = m_pos;
     }
 
 private:
-    [[gnu::noinline]] char* PutSignature(char* to)
+    static char* Refuse(char* to, SETMULTIPAR*& record)
     {
-        m_writer.first = false;
-        return PutBytes(to, ITEM_FULL_KEY, TicketSignature);
+        record++->ok = false;
+        return to;
     }
 
     char* PutKey(char* to, std::string_view key)
@@ -101,12 +121,21 @@ private:
             SharedBytes(m_key.data(), key.data(), std::min(m_key.size(), key.size()));
         bool const isSame = shared == key.size() && shared == m_key.size();
         m_key = key;
+        if (shared == 0)
+            return PutFullKey(to, key, isSame);
         if (isSame)
             return to;
-        if (shared == 0)
-            return PutBytes(to, ITEM_FULL_KEY, key);
-        std::string_view const tail = key.substr(shared);
-        return m_chunk.Put(PutKeyHeader(m_chunk.Room(to, MaxItemHeader), shared, tail.size()), tail);
+        std::string_view const tail(key.data() + shared, key.size() - shared);
+        return m_chunk.Put(PutKeyHeader(to, shared, tail.size()), tail);
+    }
+
+    // A key that has nothing to build on, as the first one of all. That goes without saying if it is empty.
+    [[gnu::noinline]] char* PutFullKey(char* to, std::string_view key, bool isSame)
+    {
+        if (m_first)
+            to = PutBytes(to, ITEM_FULL_KEY, TicketSignature);
+        m_first = false;
+        return isSame ? to : PutBytes(to, ITEM_FULL_KEY, key);
     }
 
     char* PutValue(char* to, SETMULTIPAR*& record)
@@ -129,8 +158,10 @@ private:
             return PutNumbers<unsigned int>(to, record, PutOptimizedDouble);
         case PARAM_UNSIGNED64:
             return PutNumbers<unsigned long long>(to, record, PutUnsigned64);
-        default:  // PARAM_NONE alone, as all else is not writable
-            return Done(PutItemTag(m_chunk.Room(to, MaxItemHeader), ITEM_DELETE, 0), record);
+        case PARAM_NONE:
+            return Done(PutItemTag(to, ITEM_DELETE, 0), record);
+        default:
+            __builtin_unreachable();  // not writable
         }
     }
 
@@ -142,14 +173,15 @@ private:
         char const* const key = record->key;
         PARAM_TYPE const type = record->type;
         int position = m_pos;
-        do
+        for (;; to = m_chunk.Room(to))
         {
-            to = m_chunk.Room(to, MaxItemHeader);
             to = put(to, *static_cast<T const*>(record->value));
             record->ok = true;
             begin = ++record;
             position = NextPosition(position);
-        } while (record->key == key && record->type == type && record->pos == position && record->value);
+            if (record->key != key || record->type != type || record->pos != position || !record->value)
+                break;
+        }
         m_pos = position;
         return to;
     }
@@ -161,11 +193,9 @@ private:
         return to;
     }
 
-    // Out of line, as its text takes long anyway, and the loop over the records keeps its registers.
-    [[gnu::noinline]] char* PutBytes(char* to, unsigned char itemClass, std::string_view bytes)
+    char* PutBytes(char* to, unsigned char itemClass, std::string_view bytes)
     {
-        to = PutItemTag(m_chunk.Room(to, MaxItemHeader), itemClass, bytes.size());
-        return m_chunk.Put(to, bytes);
+        return m_chunk.Put(PutItemTag(to, itemClass, bytes.size()), bytes);
     }
 
     static std::string_view Bytes(BIN_STRING const& value)
@@ -173,11 +203,14 @@ private:
         return value.valid() ? std::string_view(static_cast<char const*>(value.data), value.size) : "";
     }
 
-    WRITE& m_writer;
     BYTE_CHUNK m_chunk;
+    bool& m_first;
+    std::string& m_lastKey;
     std::string_view m_key;  // the previous one, wherever it stands
+    int& m_lastPosition;
     int m_pos;
 };
+}  // namespace
 
 STICKET_BINSTREAM::WRITE::WRITE(unsigned long reserve)
 {
@@ -208,7 +241,7 @@ void STICKET_BINSTREAM::WRITE::SetMultiParameter(SETMULTIPAR* table)
     {
         if (!failed && table->key)
         {
-            ENCODER encoder(*this);
+            ENCODER encoder(data, first, lastKey, pos);
             char* to = encoder.Begin();
             while (table->key)
                 to = encoder.Put(to, table);

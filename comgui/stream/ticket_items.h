@@ -133,17 +133,30 @@ inline char* PutPosition(char* to, int pos)
 
 inline char* PutNumberTag(char* to, NUMBER_FORM form) { return PutItemTag(to, ITEM_NUMBER, form); }
 
-// The shortest form, found without a branch: in a vector of mixed sizes no branch could be foreseen.
+struct INTEGER_FORM
+{
+    unsigned char size;
+    unsigned char shift;  // to the upper end of a word
+};
+
+// By the place of the highest bit that matters, the sign included, in eights.
+inline constexpr INTEGER_FORM IntegerForms[] = {{NUMBER_INT8, 24},
+                                                {NUMBER_INT16, 16},
+                                                {NUMBER_INT32, 0},
+                                                {NUMBER_INT32, 0}};
+
+// The shortest form, found without a branch but for 0: in a vector of mixed sizes none could be foreseen.
 inline char* PutInteger(char* to, int value)
 {
-    bool const fitsByte = value == static_cast<std::int8_t>(value);
-    bool const fitsShort = value == static_cast<std::int16_t>(value);
-    unsigned int const size = value == 0 ? 0u : unsigned{NUMBER_INT32} >> (fitsByte + fitsShort);
-    to = PutByte(to, ITEM_NUMBER | size);
-    // The low bytes of the value come first; what stands behind them is overwritten by the next item.
-    auto const bits = static_cast<std::uint64_t>(static_cast<std::uint32_t>(value)) << (32 - 8 * size);
-    PutBytes(to, static_cast<std::uint32_t>(bits));
-    return to + size;
+    if (value == 0)
+        return PutNumberTag(to, NUMBER_ZERO);
+    auto const bits = static_cast<std::uint32_t>(value);
+    std::uint32_t const matter = (value < 0 ? ~bits : bits) << 1 | 1;
+    INTEGER_FORM const form = IntegerForms[(31u ^ static_cast<unsigned int>(std::countl_zero(matter))) / 8];
+    to = PutByte(to, ITEM_NUMBER | unsigned{form.size});
+    // What stands behind the bytes that count is overwritten by the next item.
+    PutBytes(to, bits << form.shift);
+    return to + form.size;
 }
 
 inline char* PutSingle(char* to, float value)
@@ -160,10 +173,14 @@ inline char* PutDouble(char* to, double value)
 // The shortest form from which the number can be had back. -0.0 becomes the integer 0, and an infinity NaN.
 inline char* PutOptimizedDouble(char* to, double value)
 {
-    if (IsNotANumber(value))
+    if (value >= -0x1p31 && value < 0x1p31)  // no NaN
+    {
+        int const integer = static_cast<int>(value);
+        if (integer == value)
+            return PutInteger(to, integer);
+    }
+    else if (IsNotANumber(value))
         return PutDouble(to, NotADoubleNumber);
-    if (value >= -0x1p31 && value < 0x1p31 && static_cast<int>(value) == value)
-        return PutInteger(to, static_cast<int>(value));
     if (static_cast<float>(value) == value)
         return PutSingle(to, static_cast<float>(value));
     return PutDouble(to, value);

@@ -4,6 +4,7 @@
 #pragma once
 
 #include "comgui/foundation/export.h"
+#include "comgui/foundation/short_copy.h"
 #include "comgui/ticket/VALUE_INDEX.h"
 #include <string_view>
 
@@ -29,7 +30,7 @@ struct TEXT
     static ENTRY* Make(void* place, VALUE text, HASH hash, POOL& pool)
     {
         char* const copy = static_cast<char*>(pool.Take(text.size() + 1, 1));
-        text.copy(copy, text.size());  // no bytes may be a null address
+        Copy(copy, text.data(), text.size());
         copy[text.size()] = '\0';
         return new (place) ENTRY{copy, text.size(), hash};
     }
@@ -50,8 +51,8 @@ public:
     // The same, with the argument left alone.
     char const* operator[](char const* text) { return text ? m_texts.Keep(text).text : nullptr; }
 
-    // The same for bytes, not null, that no zero byte need follow. The text ends at the first one within.
-    char const* Keep(std::string_view bytes) { return m_texts.Keep(bytes.substr(0, bytes.find('\0'))).text; }
+    // The same for a text, not null, that holds no zero byte; none need follow.
+    char const* Keep(std::string_view text) { return m_texts.Keep(text).text; }
 
     // Drops all texts; every address given out dies.
     void clear()

@@ -85,7 +85,10 @@ public:
     using ENTRY = typename KIND::ENTRY;
 
     // The pool must outlive the index.
-    explicit VALUE_INDEX(POOL& pool) : m_pool(pool) {}
+    explicit VALUE_INDEX(POOL& pool)
+        : m_pool(pool), m_seed(Mix(reinterpret_cast<std::uintptr_t>(this), 0xD6E8FEB86659FD93))
+    {
+    }
     VALUE_INDEX(VALUE_INDEX const&) = delete;
     VALUE_INDEX& operator=(VALUE_INDEX const&) = delete;
 
@@ -95,7 +98,7 @@ public:
         // Values come in runs: a vector of like values asks for the same one again and again.
         if (m_last && KIND::Same(*m_last, value))
             return *m_last;
-        HASH const hash = KIND::Hash(value, Seed());
+        HASH const hash = KIND::Hash(value, m_seed);
         if (m_count == m_limit)
             Grow();
         std::size_t const mask = m_slotCount - 1;
@@ -106,15 +109,16 @@ public:
             if (KIND::MayBe(entry, hash) && KIND::Same(entry, value))
                 return *(m_last = &entry);
         }
-        ENTRY const& entry = AddEntry(value, hash);
+        m_last = AddEntry(value, hash);
         m_slots[at] = m_count;
-        return *(m_last = &entry);
+        return *m_last;
     }
 
     // Forgets all values; every address given out dies. Their memory is the pool's to free.
     void Clear()
     {
         m_last = nullptr;
+        m_next = m_blockEnd = nullptr;
         m_count = 0;
         m_slotCount = m_limit = 0;
     }
@@ -124,9 +128,6 @@ private:
     static constexpr NUMBER FreeSlot = 0;
     static constexpr unsigned int FirstBlockBits = 4;
     static constexpr std::size_t ManySlots = 65536;
-
-    // Differs from run to run, so that no stream can be made in which all values fall together.
-    HASH Seed() const { return Mix(reinterpret_cast<std::uintptr_t>(this), 0xD6E8FEB86659FD93); }
 
     // Entries stand in blocks of doubling size, so that none ever moves: the highest bit tells the block.
     static unsigned int BlockOf(NUMBER place)
@@ -141,15 +142,22 @@ private:
         return m_blocks[block - FirstBlockBits] + (place - (NUMBER(1) << block));
     }
 
-    ENTRY const& AddEntry(VALUE value, HASH hash)
+    ENTRY* AddEntry(VALUE value, HASH hash)
     {
-        NUMBER const place = m_count + (NUMBER(1) << FirstBlockBits);
-        if ((place & (place - 1)) == 0)
-            m_blocks[BlockOf(place) - FirstBlockBits] =
-                static_cast<ENTRY*>(m_pool.Take(place * sizeof(ENTRY), alignof(ENTRY)));
-        ENTRY* const entry = KIND::Make(EntryAt(m_count + 1), value, hash, m_pool);
+        if (m_next == m_blockEnd)
+            AddBlock();
+        ENTRY* const entry = KIND::Make(m_next, value, hash, m_pool);
+        ++m_next;
         ++m_count;
-        return *entry;
+        return entry;
+    }
+
+    void AddBlock()
+    {
+        NUMBER const size = m_count + (NUMBER(1) << FirstBlockBits);
+        m_next = static_cast<ENTRY*>(m_pool.Take(size * sizeof(ENTRY), alignof(ENTRY)));
+        m_blockEnd = m_next + size;
+        m_blocks[BlockOf(size) - FirstBlockBits] = m_next;
     }
 
     // Sparse slots are found sooner, as long as they all stay in the processor's cache.
@@ -157,14 +165,14 @@ private:
     {
         if (m_count > UINT32_MAX / 4)
             throw std::bad_alloc();
-        std::size_t const slotCount = m_slotCount == 0 ? 16 : m_slotCount * 4;
+        std::size_t const slotCount = m_slotCount == 0 ? 32 : m_slotCount * (m_slotCount < ManySlots ? 8 : 4);
         std::size_t const size = slotCount * sizeof(NUMBER);
         m_slots = static_cast<NUMBER*>(std::memset(m_pool.Take(size, alignof(NUMBER)), FreeSlot, size));
         m_slotCount = slotCount;
-        m_limit = static_cast<NUMBER>(slotCount / (slotCount > ManySlots ? 2 : 4));
+        m_limit = static_cast<NUMBER>(slotCount / (slotCount > ManySlots ? 2 : 3));
         for (NUMBER number = 1; number <= m_count; ++number)
         {
-            std::size_t at = KIND::HashOf(*EntryAt(number), Seed()) & (slotCount - 1);
+            std::size_t at = KIND::HashOf(*EntryAt(number), m_seed) & (slotCount - 1);
             while (m_slots[at] != FreeSlot)
                 at = (at + 1) & (slotCount - 1);
             m_slots[at] = number;
@@ -172,9 +180,12 @@ private:
     }
 
     POOL& m_pool;
+    HASH const m_seed;            // differs from run to run, so that no stream makes all values fall together
     NUMBER* m_slots = nullptr;    // the entry whose hash says this place or, if that is taken, one before
     std::size_t m_slotCount = 0;  // a power of two, at least twice the entries
     ENTRY* m_blocks[32 - FirstBlockBits];
+    ENTRY* m_next = nullptr;  // where the next entry goes, unless the newest block is full
+    ENTRY* m_blockEnd = nullptr;
     NUMBER m_count = 0;
     NUMBER m_limit = 0;  // how many entries there may be before the slots have to grow
     ENTRY const* m_last = nullptr;

@@ -322,7 +322,10 @@ void TicketServer::CarryOut(Ticket& ticket, TicketWrites& writes, ChangedParamet
 
 void TicketServer::Changed(TicketAddress address)
 {
-    if (address != SystemTicket || !m_systemTicketChanged)
+    if (address != SystemTicket)
+        return;
+    m_systemTicketChanges.fetch_add(1, std::memory_order_release);
+    if (!m_systemTicketChanged)
         return;
     try
     {

@@ -22,6 +22,7 @@
 #include "standin/server/Storage.h"
 #include "standin/server/Ticket.h"
 #include <array>
+#include <atomic>
 #include <functional>
 #include <memory>
 #include <mutex>
@@ -110,6 +111,12 @@ public:
     bool Exists(TicketAddress address) const { return BirthOf(address) != NoBirth; }
     Birth BirthOf(TicketAddress address) const;  // NoBirth if there is no such ticket
 
+    // How often ticket 0/0 has changed, counted once all of a change is in memory.
+    unsigned long long SystemTicketChanges() const
+    {
+        return m_systemTicketChanges.load(std::memory_order_acquire);
+    }
+
     // The smallest id above after among the tickets of a type, -1 if there is none. Starts at after -1.
     int NextTicket(int type, int after) const;
 
@@ -162,6 +169,7 @@ private:
 
     Storage& m_storage;
     std::function<void()> const m_systemTicketChanged;
+    std::atomic<unsigned long long> m_systemTicketChanges{0};
 
     std::mutex m_change;             // held for a change as a whole, and for every use of the storage
     mutable ReadWriteLock m_memory;  // the members below; written to only while m_change is held, too

@@ -3,6 +3,7 @@
 
 #include "comgui/session/TCommandRecord.h"
 #include "tests/session/FakeModule.h"
+#include <algorithm>
 #include <cstring>
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
@@ -96,6 +97,24 @@ TEST_F(Commands, SendCommand_GivesThePlugInsCode)
     code = -77;
     EXPECT_EQ(manager.SendCommand(name, 0, nullptr), -77);
     EXPECT_EQ(manager.SendCommand(&record, name, 0, nullptr), -77);
+}
+
+TEST_F(Commands, AreSentLoggedInOrNot)
+{
+    char name[] = "remote.nonsense";
+    auto const sendAll = [&]
+    {
+        manager.SendCommand(name, 0, nullptr);
+        manager.SendCommand(&record, name, 0, nullptr);
+        manager.IsAlive(nullptr, 0);
+        manager.PrepareJob("a", 0, 0, 0, 0, 0);
+    };
+    sendAll();
+    LogIn();
+    sendAll();
+    manager.Logout();
+    sendAll();
+    EXPECT_EQ(std::count(module.calls.begin(), module.calls.end(), "SendCommandEntry"), 12);
 }
 
 TEST_P(FolderCommand, SendCommand_PassesTheTextsLengthWhateverTheSize)

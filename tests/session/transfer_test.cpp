@@ -4,6 +4,7 @@
 #include "comgui/session/TCommandRecord.h"
 #include "comgui/session/TJobIdentification.h"
 #include "tests/session/FakeModule.h"
+#include "tests/session/Faults.h"
 #include "tests/session/ScarceMemory.h"
 #include <algorithm>
 #include <climits>
@@ -11,6 +12,7 @@
 #include <functional>
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
+#include <memory>
 
 using testing::ElementsAre;
 using testing::IsEmpty;
@@ -155,6 +157,38 @@ INSTANTIATE_TEST_SUITE_P(
                  [](M& m, R r, char* a, char* b) { return m.SendJob(r, &job, a, b); }}),
     [](auto const& fact) { return std::string(fact.param.name); });
 
+// The same without a plug-in.
+namespace
+{
+class TransferDeathTest : public WithModule
+{
+protected:
+    TransferDeathTest()
+    {
+        LoseTheBundle();
+        testing::internal::CaptureStderr();
+        manager = std::make_unique<M>();
+        testing::internal::GetCapturedStderr();
+    }
+
+    std::unique_ptr<M> manager;
+    char text[2] = "1";
+};
+}  // namespace
+
+TEST_F(TransferDeathTest, WithoutAPlugIn_GoesThroughNull_ByDesign)
+{
+    EXPECT_EXIT(manager->SendCommand(text, 0, nullptr), Faults, "");
+    EXPECT_EXIT(manager->IsAlive(nullptr, 0), Faults, "");
+    EXPECT_EXIT(manager->PutFile(text, text), Faults, "");
+    EXPECT_EXIT(manager->PutFileSync(text, text), Faults, "");
+    EXPECT_EXIT(manager->GetFile(text, text), Faults, "");
+    EXPECT_EXIT(manager->GetFileSync(text, text), Faults, "");
+    EXPECT_EXIT(manager->SendJob(&job, text, text), Faults, "");
+    EXPECT_EXIT(manager->PrepareJob("a", 0, 0, 0, 0, 0), Faults, "");
+    EXPECT_EXIT(manager->UploadJob("a", 0, 0, 0, 0), Faults, "");
+}
+
 // --- leaf names ------------------------------------------------------------------------------------------
 
 TEST_P(LeafName, IsWhatStandsBehindTheLastSeparator)
@@ -271,7 +305,7 @@ TEST_F(UploadJob, FillsTheRecordInAnOrderOfItsOwn_ByDesign)
     expected.iJobArg4 = 3;
     expected.pszUploadFolder = sent.pszUploadFolder;
     EXPECT_EQ(std::memcmp(&sent, &expected, sizeof sent), 0);
-    EXPECT_EQ(folder, std::string("$(UPLOADJOB)", 13));
+    EXPECT_EQ(folder, std::string("$(UPLOADJOB)\0", 13));
 }
 
 TEST_F(UploadJob, SendsThePathAndItsLeafName)

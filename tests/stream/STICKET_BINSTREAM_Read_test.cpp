@@ -594,6 +594,13 @@ TEST_F(Reader, KeyWithAZeroByte_IsCutInTheListAlone_ByDesign)
     EXPECT_THAT(Records(), ElementsAre(Int("a", 1), Int("a", 2), Int("a", 3)));
 }
 
+TEST_F(Reader, KeyThatSharesLessThanTheZeroByte_IsWhole)
+{
+    // "ab\0c", then "ab" and "d", then all of that and a zero byte of its own.
+    EXPECT_TRUE(ReadBehindSignature("04 61 62 00 63 41 01 22 02 64 41 02 23 03 00 65 41 03"));
+    EXPECT_THAT(Records(), ElementsAre(Int("ab", 1), Int("abd", 2), Int("abd", 3)));
+}
+
 TEST_F(Reader, SharedBytesBehindAZeroByte_AreNotLost)
 {
     // "a\0b", then nothing of it but its first byte, then that and a tail: the reader counts all bytes.

@@ -301,7 +301,7 @@ int ContainerFake::OnOperation(void* instance, int type, int id, TICKET_OP op, v
     }
     if (op.GetInt() != MTICKET_OP_OPEN || !arg || !fake.HasTicket(type, id))
         return 0;
-    *static_cast<STICKET_ACCESS const**>(arg) = &fake.m_ticket;
+    *static_cast<STICKET_ACCESS const**>(arg) = fake.opened ? fake.opened : &fake.m_ticket;
     return fake.success;
 }
 

@@ -74,6 +74,9 @@ public:
     // What MTICKET_OP_FOLDER_VARIABLES gives out; the operation fails while there is none.
     clFOLDER_VARIABLES* folders = nullptr;
 
+    // What MTICKET_OP_OPEN gives out for any ticket there is, instead of a table with nothing in it.
+    STICKET_ACCESS const* opened = nullptr;
+
     // Reads of texts succeed and give null.
     bool nullTexts = false;
 

@@ -86,14 +86,6 @@ TEST(STRINGCACHE, Keep_TakesBytesThatNoZeroByteFollows)
     EXPECT_EQ(cache.Keep("text"), cache["text"]);
 }
 
-TEST(STRINGCACHE, Keep_EndsAtTheFirstZeroByte)
-{
-    STRINGCACHE cache;
-    EXPECT_EQ(cache.Keep(std::string_view("be\0af", 5)), cache["be"]);
-    EXPECT_EQ(cache.Keep(std::string_view("be\0other", 8)), cache["be"]);
-    EXPECT_EQ(cache.Keep(std::string_view("\0af", 3)), cache[""]);
-}
-
 TEST(STRINGCACHE, Text_IsCopiedAndNotKeptInPlace)
 {
     STRINGCACHE cache;

@@ -1,0 +1,202 @@
+#include "comgui/folders/clFOLDER_VARIABLES_IMP.h"
+
+#include "comgui/access/MTICKET_READ.h"
+#include "comgui/access/STICKET_READ.h"
+#include "comgui/folders/Variables.h"
+#include "comgui/folders/clSETMULTIPAR_FOLDER_VARIABLES.h"
+#include "comgui/folders/folder_paths.h"
+#include "comgui/foundation/CharSets.h"
+#include <algorithm>
+
+using SysLib::MUTEX_LOCK;
+
+namespace
+{
+// "$(variable)" with room for more behind it.
+std::string VariableForm(std::string_view variable, std::size_t room)
+{
+    std::string form;
+    form.reserve(variable.size() + 3 + room);
+    form += "$(";
+    form += variable;
+    form += ')';
+    return form;
+}
+
+std::string Below(std::string_view variable, std::string relative)
+{
+    comgui::detail::MakeSlash(relative);
+    std::string form = VariableForm(variable, 1 + relative.size());
+    if (!relative.empty() && relative[0] != '/')
+        form += '/';
+    form += relative;
+    return form;
+}
+
+std::string Separated(std::string path, bool backslashes)
+{
+    backslashes ? comgui::detail::MakeBackslash(path) : comgui::detail::MakeSlash(path);
+    return path;
+}
+
+// A folder as the system ticket holds it, with one slash at the end less.
+void TrimFolder(std::string& folder)
+{
+    comgui::detail::MakeSlash(folder);
+    std::size_t const last = CharSets::DBCS::LastAsciiPos(folder);
+    if (last != std::string::npos && folder[last] == '/')
+        folder.erase(last);
+}
+}  // namespace
+
+comgui::detail::clFOLDER_VARIABLES_IMP::clFOLDER_VARIABLES_IMP(MTICKET_ACCESS const* container)
+    : access(container), flags(container ? 0 : DECODES | ENCODES)
+{
+    if (access)
+        clFOLDER_VARIABLES_IMP::Load();
+}
+
+bool comgui::detail::clFOLDER_VARIABLES_IMP::IsEnabled() const
+{
+    MUTEX_LOCK const lock(mutex);
+    return flags != 0;
+}
+
+void comgui::detail::clFOLDER_VARIABLES_IMP::Load()
+{
+    MUTEX_LOCK const lock(mutex);
+    mappings.clear();
+    flags = 0;
+    if (access == nullptr)
+        return;
+    STICKET_READ const* const ticket = STICKET_READ::Of(MTICKET_READ::Of(access)->OpenTicket(0, 0));
+    if (ticket == nullptr)
+        return;
+    flags =
+        static_cast<unsigned>(ticket->GetIntParameter("System/UseFolderVariables", 0)) & (DECODES | ENCODES);
+    if (flags == 0)
+        return;
+    for (FOLDER_VARIABLE const* row = Variables; row->key; ++row)
+    {
+        std::string folder = ticket->GetStringParameter(row->key, std::string());
+        if (folder.empty())
+            continue;
+        TrimFolder(folder);
+        // No bound, by design: a folder that leans on one further down, or on any while nothing is decoded,
+        // is the server's error, and stays here with the lock held.
+        while (NeedsDecode(folder))
+            folder = Decode(folder, false);  // NOLINT(clang-analyzer-optin*): this class's own, at first
+        mappings.emplace_back(row->key, row->variable, std::move(folder));
+    }
+}
+
+std::string comgui::detail::clFOLDER_VARIABLES_IMP::Encode(std::string const& path) const
+{
+    MUTEX_LOCK const lock(mutex);
+    if ((flags & ENCODES) == 0)
+        return path;
+    FOLDER_MAPPING const* best = nullptr;
+    std::size_t bestLength = 0;
+    for (FOLDER_MAPPING const& mapping : mappings)
+    {
+        std::size_t const length = MatchLength(mapping.folder, path);
+        if (length > bestLength)
+        {
+            best = &mapping;
+            bestLength = length;
+        }
+    }
+    if (best == nullptr)
+        return path;
+    std::string form = VariableForm(best->variable, path.size() - bestLength);
+    auto const rest = static_cast<std::ptrdiff_t>(form.size());
+    form.append(path, bestLength);
+    std::replace(form.begin() + rest, form.end(), '\\', '/');  // not in the variable, which is taken as it is
+    return form;
+}
+
+std::string comgui::detail::clFOLDER_VARIABLES_IMP::Encode(char const* key, std::string relative) const
+{
+    MUTEX_LOCK const lock(mutex);
+    if (key == nullptr || (flags & ENCODES) == 0)
+        return relative;
+    if (FOLDER_MAPPING const* const mapping = FindKey(key))
+        return Below(mapping->variable, std::move(relative));
+    return relative;
+}
+
+std::string comgui::detail::clFOLDER_VARIABLES_IMP::EncodeV(char const* variable, std::string relative) const
+{
+    MUTEX_LOCK const lock(mutex);
+    if (variable == nullptr || (flags & ENCODES) == 0)
+        return relative;
+    return Below(variable, std::move(relative));
+}
+
+std::string comgui::detail::clFOLDER_VARIABLES_IMP::Decode(std::string const& path, bool backslashes) const
+{
+    MUTEX_LOCK const lock(mutex);
+    if ((flags & DECODES) == 0)
+        return path;
+    if (!NeedsDecode(path))
+        return Separated(path, backslashes);
+    std::size_t const end = path.find(')', 2);
+    if (end == std::string::npos || end == 2)
+        return path;
+    FOLDER_MAPPING const* const mapping = FindVariable(std::string_view(path).substr(2, end - 2));
+    if (mapping == nullptr)
+        return path;
+    std::string decoded;
+    decoded.reserve(mapping->folder.size() + path.size() - end - 1);
+    decoded += mapping->folder;
+    decoded.append(path, end + 1);
+    return Separated(std::move(decoded), backslashes);
+}
+
+void comgui::detail::clFOLDER_VARIABLES_IMP::SetFolderVariable(char const* variable, char const* folder)
+{
+    if (variable == nullptr)
+        return;
+    MUTEX_LOCK const lock(mutex);
+    auto const mapping = FindVariable(variable);
+    if (mapping == mappings.end())
+    {
+        if (folder)
+            mappings.emplace_back(std::string(), variable, folder);
+    }
+    else if (folder)
+        mapping->folder = folder;
+    else
+        mappings.erase(mapping);
+}
+
+clSETMULTIPAR_FOLDER_VARIABLES*
+comgui::detail::clFOLDER_VARIABLES_IMP::New_clSETMULTIPAR_FOLDER_VARIABLES(clFOLDER_VARIABLES* folders,
+                                                                           SETMULTIPAR* table, bool encode)
+{
+    return new clSETMULTIPAR_FOLDER_VARIABLES(folders, table, encode);
+}
+
+comgui::detail::FOLDER_MAPPING const*
+comgui::detail::clFOLDER_VARIABLES_IMP::FindKey(std::string_view key) const
+{
+    auto const mapping = std::find_if(mappings.begin(), mappings.end(),
+                                      [key](FOLDER_MAPPING const& each) { return each.key == key; });
+    return mapping != mappings.end() ? &*mapping : nullptr;
+}
+
+comgui::detail::FOLDER_MAPPING const*
+comgui::detail::clFOLDER_VARIABLES_IMP::FindVariable(std::string_view variable) const
+{
+    auto const mapping =
+        std::find_if(mappings.begin(), mappings.end(),
+                     [variable](FOLDER_MAPPING const& each) { return each.variable == variable; });
+    return mapping != mappings.end() ? &*mapping : nullptr;
+}
+
+std::vector<comgui::detail::FOLDER_MAPPING>::iterator
+comgui::detail::clFOLDER_VARIABLES_IMP::FindVariable(std::string_view variable)
+{
+    return std::find_if(mappings.begin(), mappings.end(),
+                        [variable](FOLDER_MAPPING const& each) { return each.variable == variable; });
+}

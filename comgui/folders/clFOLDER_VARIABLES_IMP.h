@@ -1,0 +1,66 @@
+// The translator of the server's folders, the only one of the library: a snapshot of what the system ticket
+// said at the last Load(), with what SetFolderVariable did to it since. From any thread: each operation holds
+// the lock from its beginning to its end.
+#pragma once
+
+#include "comgui/folders/clFOLDER_VARIABLES.h"
+#include "comgui/foundation/SysLib.h"
+#include "comgui/ticket/MTICKET_ACCESS.h"
+#include <string>
+#include <string_view>
+#include <utility>
+#include <vector>
+
+namespace comgui::detail
+{
+struct FOLDER_MAPPING
+{
+    FOLDER_MAPPING(std::string itsKey, std::string itsVariable, std::string itsFolder)
+        : key(std::move(itsKey)), variable(std::move(itsVariable)), folder(std::move(itsFolder))
+    {
+    }
+
+    std::string key;       // in the system ticket; empty if SetFolderVariable made the mapping
+    std::string variable;  // its bare name
+    std::string
+        folder;  // absolute, with slashes and none at the end, unless SetFolderVariable said otherwise
+};
+
+class clFOLDER_VARIABLES_IMP : public clFOLDER_VARIABLES
+{
+public:
+    // Loads from the container, which must outlive this. With null there is nothing to load from, and all
+    // that SetFolderVariable brings is translated both ways.
+    explicit clFOLDER_VARIABLES_IMP(MTICKET_ACCESS const* container);
+
+    bool IsEnabled() const override;
+    void Load() override;
+    std::string Encode(std::string const& path) const override;
+    std::string Encode(char const* key, std::string relative) const override;
+    std::string EncodeV(char const* variable, std::string relative) const override;
+    std::string Decode(std::string const& path, bool backslashes) const override;
+    void SetFolderVariable(char const* variable, char const* folder) override;
+
+    // folders alone decides, not the object it is called on.
+    clSETMULTIPAR_FOLDER_VARIABLES*
+    New_clSETMULTIPAR_FOLDER_VARIABLES(clFOLDER_VARIABLES* folders, SETMULTIPAR* table, bool encode) override;
+
+private:
+    // As System/UseFolderVariables has them.
+    enum FLAG : unsigned
+    {
+        DECODES = 1,
+        ENCODES = 2,
+    };
+
+    // The first mapping of that key or variable, null or the end if there is none. With the lock held.
+    FOLDER_MAPPING const* FindKey(std::string_view key) const;
+    FOLDER_MAPPING const* FindVariable(std::string_view variable) const;
+    std::vector<FOLDER_MAPPING>::iterator FindVariable(std::string_view variable);
+
+    mutable SysLib::MUTEX_INSTANCE mutex;
+    MTICKET_ACCESS const* access;          // may be null
+    std::vector<FOLDER_MAPPING> mappings;  // in the order in which they came
+    unsigned flags;                        // of FLAG
+};
+}  // namespace comgui::detail

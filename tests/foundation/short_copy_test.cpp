@@ -1,0 +1,33 @@
+#include "comgui/foundation/short_copy.h"
+
+#include <gtest/gtest.h>
+#include <string>
+#include <vector>
+
+using namespace comgui::detail;
+
+namespace
+{
+// Exact blocks on the heap, so that a sanitizer sees every byte too many.
+void ExpectCopied(void (*copy)(char*, char const*, std::size_t), std::size_t size)
+{
+    std::vector<char> from(size);
+    for (std::size_t i = 0; i < size; ++i)
+        from[i] = static_cast<char>(i + 1);
+    std::vector<char> to(size);
+    copy(to.data(), from.data(), size);
+    EXPECT_EQ(to, from) << size << " bytes";
+}
+
+TEST(CopyShort, EverySizeUpToItsLimit_IsCopiedAndNothingElseTouched)
+{
+    for (std::size_t size = 0; size <= ShortCopy; ++size)
+        ExpectCopied(CopyShort, size);
+}
+
+TEST(Copy, EverySize_IsCopiedAndNothingElseTouched)
+{
+    for (std::size_t size = 0; size <= 100; ++size)
+        ExpectCopied(Copy, size);
+}
+}  // namespace
