@@ -7,7 +7,6 @@
 #include <csignal>
 #include <cstdio>
 #include <fcntl.h>
-#include <regex>
 #include <sys/stat.h>
 #include <system_error>
 #include <unistd.h>
@@ -101,16 +100,6 @@ private:
     Descriptor m_descriptor;
 };
 
-// suffix: what a name has behind that of the file for which Temporary may have made it.
-bool IsOfADeadProcess(std::string const& suffix)
-{
-    std::smatch parts;
-    if (!std::regex_match(suffix, parts, std::regex(R"(\.([0-9]{1,9})-[0-9]+\.tmp)")))
-        return false;
-    pid_t const process = std::stoi(parts[1]);
-    return process > 0 && kill(process, 0) != 0 && errno == ESRCH;
-}
-
 std::filesystem::path FolderOf(std::filesystem::path const& file)
 {
     return file.has_parent_path() ? file.parent_path() : ".";
@@ -163,6 +152,23 @@ void ReplaceFile(std::filesystem::path const& file, std::string_view content)
     FlushFolderOf(name);
 }
 
+std::optional<pid_t> ProcessOfTemporary(std::string_view ending)
+{
+    auto const areDigits = [](std::string_view text)
+    { return !text.empty() && text.find_first_not_of("0123456789") == text.npos; };
+    constexpr std::string_view Tail = ".tmp";
+    if (!ending.starts_with('.') || !ending.ends_with(Tail))
+        return std::nullopt;
+    ending.remove_prefix(1);
+    ending.remove_suffix(std::min(Tail.size(), ending.size()));
+    auto const dash = ending.find('-');
+    if (dash > 9 || !areDigits(ending.substr(0, dash)) || !areDigits(ending.substr(dash + 1)))
+        return std::nullopt;
+    return std::stoi(std::string(ending.substr(0, dash)));
+}
+
+bool IsAlive(pid_t process) { return process <= 0 || kill(process, 0) == 0 || errno != ESRCH; }
+
 void RemoveLeftovers(std::filesystem::path const& file)
 {
     std::string const name = file.filename().string();
@@ -171,7 +177,10 @@ void RemoveLeftovers(std::filesystem::path const& file)
     for (; !error && entry != std::filesystem::directory_iterator(); entry.increment(error))
     {
         std::string const found = entry->path().filename().string();
-        if (found.starts_with(name) && IsOfADeadProcess(found.substr(name.size())))
+        if (!found.starts_with(name))
+            continue;
+        auto const process = ProcessOfTemporary(std::string_view(found).substr(name.size()));
+        if (process && !IsAlive(*process))
             unlink(entry->path().c_str());
     }
 }

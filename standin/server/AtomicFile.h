@@ -6,8 +6,10 @@
 #include "standin/server/Storage.h"
 #include <cstddef>
 #include <filesystem>
+#include <optional>
 #include <string>
 #include <string_view>
+#include <sys/types.h>
 
 namespace standin
 {
@@ -21,6 +23,12 @@ std::string ReadFile(std::filesystem::path const& file, std::size_t limit);
 // permissions it takes over. A link stays, and what it points at is replaced. On failure the old content is
 // there as it was and nothing else is left. A process killed in between leaves NAME.PID-N.tmp behind.
 void ReplaceFile(std::filesystem::path const& file, std::string_view content);
+
+// The process that a temporary name tells of, by what stands in it behind its beginning: ".PID-N.tmp".
+// Nothing for another text.
+std::optional<pid_t> ProcessOfTemporary(std::string_view ending);
+
+bool IsAlive(pid_t process);
 
 // Removes what killed processes have left behind beside the file. What belongs to a process that lives, this
 // one included, stays, and so does what cannot be removed.

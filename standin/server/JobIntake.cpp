@@ -56,7 +56,18 @@ SourceFile SourceOf(std::string const& clientPath)
 
 [[noreturn]] void FailAsGone()
 {
-    throw TransferError(JobGone, "the job's ticket has been deleted or cannot be written; send the job anew");
+    throw TransferError(JobGone,
+                        "the job's ticket has been deleted while the job came in; send the job anew");
+}
+
+// Of a ticket that is there and cannot be written the storage has told on stderr.
+void WriteOrFail(TicketServer& server, TicketServer::MadeTicket const& ticket, Table& table)
+{
+    if (server.Write(ticket, table.Records()))
+        return;
+    if (server.BirthOf(ticket.address) == ticket.birth)
+        throw TransferError(TargetUnwritable, "");
+    FailAsGone();
 }
 
 // Writes how far a job is, every now and then.
@@ -76,8 +87,7 @@ public:
             return;
         m_last = now;
         m_percent = percent;
-        if (!m_server.Write(m_ticket, Table().Put(ProgressKey, percent).Records()))
-            FailAsGone();
+        WriteOrFail(m_server, m_ticket, Table().Put(ProgressKey, percent));
     }
 
 private:
@@ -188,8 +198,7 @@ void JobIntake::Receive(Session const& session, TicketServer::MadeTicket const& 
     table.Put(NameKey, name).Put(UserKey, session.Who().name).Put(EndPointKey, endPoint);
     table.Put("Job/File", jobFile).Put("Job/Folder", jobFolder).Put("Job/Size", PARAM_INT64, &size);
     table.Put(StateKey, arrived).Put(ProgressKey, percent).Put(JobPreparedKey, PARAM_NONE, nullptr);
-    if (!m_server.Write(ticket, table.Records()))
-        FailAsGone();
+    WriteOrFail(m_server, ticket, table);
 }
 
 void JobIntake::End(Session const& session)

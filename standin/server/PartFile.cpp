@@ -5,39 +5,27 @@
 #include <algorithm>
 #include <atomic>
 #include <cerrno>
-#include <csignal>
 #include <fcntl.h>
-#include <optional>
 #include <sys/stat.h>
 
 namespace standin
 {
 namespace
 {
+constexpr std::string_view PartNameBeginning = ".transfer";
+
 // The process that made the part file of that name; nothing for other names.
 std::optional<pid_t> ProcessOf(std::string_view name)
 {
-    constexpr std::string_view Begin = ".transfer.";
-    constexpr std::string_view End = ".tmp";
-    if (!name.starts_with(Begin) || !name.ends_with(End) || name.size() < Begin.size() + End.size())
-        return std::nullopt;
-    name.remove_prefix(Begin.size());
-    name.remove_suffix(End.size());
-    auto const dash = name.find('-');
-    auto const areDigits = [](std::string_view text)
-    { return !text.empty() && text.find_first_not_of("0123456789") == text.npos; };
-    if (dash == name.npos || dash > 9 || !areDigits(name.substr(0, dash)) ||
-        !areDigits(name.substr(dash + 1)))
-        return std::nullopt;
-    return std::stoi(std::string(name.substr(0, dash)));
+    return name.starts_with(PartNameBeginning) ? ProcessOfTemporary(name.substr(PartNameBeginning.size()))
+                                               : std::nullopt;
 }
-
-bool IsAlive(pid_t process) { return process > 0 && (kill(process, 0) == 0 || errno != ESRCH); }
 
 std::string NewPartName()
 {
     static std::atomic<unsigned> counter{0};
-    return ".transfer." + std::to_string(getpid()) + "-" + std::to_string(counter++) + ".tmp";
+    return std::string(PartNameBeginning) + "." + std::to_string(getpid()) + "-" + std::to_string(counter++) +
+           ".tmp";
 }
 }  // namespace
 

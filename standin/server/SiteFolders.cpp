@@ -36,7 +36,7 @@ std::optional<int> JobOf(std::string const& name)
 
 bool IsBelow(path const& folder, path const& site)
 {
-    auto const relative = folder.lexically_relative(site);
+    auto const relative = folder.lexically_normal().lexically_relative(site);
     return !relative.empty() && *relative.begin() != "..";
 }
 

@@ -75,7 +75,7 @@ public:
     // while one runs.
     struct Pace
     {
-        std::size_t piece = 1024 * 1024;
+        std::size_t piece = std::size_t{1024} * 1024;
         std::function<void()> after{};
     };
     void Set(Pace pace) { m_pace = std::move(pace); }

@@ -398,7 +398,7 @@ TEST_F(FailedJob, DatabaseThatFailsAtTheEnd_LeavesTheTicketUnsent)
     Server().Transfers().Set({1, [this] { storage.fail = true; }});
     As("operator");
     testing::internal::CaptureStderr();
-    EXPECT_EQ(Intake().Send(As("operator"), file, "file.pdf"), JobGone);
+    EXPECT_EQ(Intake().Send(As("operator"), file, "file.pdf"), TargetUnwritable);
     testing::internal::GetCapturedStderr();
     storage.fail = false;
     Restart();
