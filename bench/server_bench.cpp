@@ -42,6 +42,9 @@ public:
         }
     }
 
+    // Asked for when a site opens, and there is none.
+    std::vector<standin::TicketAddress> TicketsWith(int, std::string_view) override { return {}; }
+
     void Apply(std::vector<standin::Change> const&) override {}
 
     std::optional<standin::User> FindUser(std::string_view name) override
