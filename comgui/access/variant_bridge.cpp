@@ -164,8 +164,9 @@ void WriteVariants(Slots const& slots, char const* key, wxVariant const& list)
 template <typename Slots>
 bool ReadVariant(Slots const& slots, char const* key, wxVariant& value, int pos)
 {
+    wxString const name(key, wxConvUTF8);  // first, as key may be a conversion of the name that value has
     value = ReadStored(slots, key, pos);
-    value.SetName(wxString(key, wxConvUTF8));
+    value.SetName(name);
     return !value.IsNull();
 }
 
