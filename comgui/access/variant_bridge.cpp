@@ -148,7 +148,7 @@ wxVariant ReadAs(Slots const& slots, char const* key, wxVariant const& def, int 
     return def;
 }
 
-// Value by value, so that the kinds may differ; the first starts the key anew.
+// Value by value, so that the kinds may differ; the first at -1, where it replaces all that was there.
 template <typename Slots>
 void WriteVariants(Slots const& slots, char const* key, wxVariant const& list)
 {
@@ -173,7 +173,7 @@ bool ReadVariant(Slots const& slots, char const* key, wxVariant& value, int pos)
 template <typename Slots>
 wxVariant ReadVariantLike(Slots const& slots, wxVariant const& def, int pos)
 {
-    // The local encoding, unlike the names that ReadVariant gives: names are the host's own.
+    // Looks like a mistake beside the UTF-8 of ReadVariant, but is required: the local encoding.
     wxString const& name = def.GetName();
     wxVariant value = ReadAs(slots, name.mb_str(wxConvLibc), def, pos);
     value.SetName(name);
