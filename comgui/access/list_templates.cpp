@@ -13,10 +13,10 @@ namespace
 using READ_TABLE = std::unique_ptr<GETMULTIPAR[], FREE>;
 using WRITE_TABLE = std::unique_ptr<SETMULTIPAR[], FREE>;
 
-// Whether a read asks if there is a table before it fills it in. It looks like a mistake that a vector of a
+// Whether a read makes sure of its table before it fills it in. It looks like a mistake that a vector of a
 // container's ticket does not, but so it has to be: out of memory ends the process there.
 template <typename Slots, typename List>
-constexpr bool AsksForTable = std::is_same_v<Slots, STICKET_SLOTS> || std::is_same_v<List, wxArrayInt>;
+constexpr bool ChecksTable = std::is_same_v<Slots, STICKET_SLOTS> || std::is_same_v<List, wxArrayInt>;
 
 // A vector keeps what it holds until the slot writes over it, a wxArrayInt does not.
 template <typename T>
@@ -77,7 +77,7 @@ bool ReadList(Slots const& slots, char const* key, List& out)
     if (count == 0)
         return false;
     READ_TABLE const table(NewGetMultipar(count, key, GetParamType<T>()));
-    if (AsksForTable<Slots, List> && !table)
+    if (ChecksTable<Slots, List> && !table)
         return false;
     MakeRoom(out, count);
     Fill(table, &out[0], count, Place<T>);

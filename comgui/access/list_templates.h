@@ -2,9 +2,9 @@
 // templates as members; the templates themselves take the record that a view stands on. No state, so any
 // thread may call that may call the record's slots.
 //
-// key is UTF-8 and not null. The positions of a read are 0, 1, 2 ..., those of a write -1, 1, 2 ...: at -1
-// the key begins anew, so that nothing of a longer list stays behind. A list of one value is what a single
-// value is, and an empty list is no key. Lists of 2^31 values and more are beyond these functions.
+// key is UTF-8 and not null. The positions of a read are 0, 1, 2 ..., those of a write -1, 1, 2 ...: the
+// first value replaces all that the key held, so that nothing of a longer list stays behind. A list of one
+// value is what a single value is, and an empty list is no key. A list has fewer than 2^31 values.
 //
 // Each template exists for the element types named with it; any other does not link. Where a comment does
 // not say otherwise, running out of memory for the table ends the process.

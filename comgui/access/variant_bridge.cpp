@@ -148,7 +148,7 @@ wxVariant ReadAs(Slots const& slots, char const* key, wxVariant const& def, int 
     return def;
 }
 
-// Value by value, so that the kinds may differ; the first starts the key anew.
+// Value by value, so that the kinds may differ; the first at -1, where it replaces all that was there.
 template <typename Slots>
 void WriteVariants(Slots const& slots, char const* key, wxVariant const& list)
 {
@@ -164,15 +164,16 @@ void WriteVariants(Slots const& slots, char const* key, wxVariant const& list)
 template <typename Slots>
 bool ReadVariant(Slots const& slots, char const* key, wxVariant& value, int pos)
 {
+    wxString const name(key, wxConvUTF8);  // first, as key may be a conversion of the name that value has
     value = ReadStored(slots, key, pos);
-    value.SetName(wxString(key, wxConvUTF8));
+    value.SetName(name);
     return !value.IsNull();
 }
 
 template <typename Slots>
 wxVariant ReadVariantLike(Slots const& slots, wxVariant const& def, int pos)
 {
-    // The local encoding, unlike the names that ReadVariant gives: names are the host's own.
+    // Looks like a mistake beside the UTF-8 of ReadVariant, but is required: the local encoding.
     wxString const& name = def.GetName();
     wxVariant value = ReadAs(slots, name.mb_str(wxConvLibc), def, pos);
     value.SetName(name);

@@ -7,11 +7,11 @@
 
 namespace comgui::detail
 {
-// GetWxVariantParameterChk: the ticket decides the type.
+// GetWxVariantParameterChk.
 template <typename Slots>
 bool ReadVariant(Slots const& slots, char const* key, wxVariant& value, int pos);
 
-// GetWxVariantParameterDef: def decides the type, names the key and is the default.
+// GetWxVariantParameterDef.
 template <typename Slots>
 wxVariant ReadVariantLike(Slots const& slots, wxVariant const& def, int pos);
 

@@ -71,12 +71,13 @@ class ListMemoryDeathTest : public ListsInBothFamilies<Family>
 protected:
     ListMemoryDeathTest() { this->ticket.StoreList(std::vector<int>{1, 2, 3}); }
 
+    // failing: which of the operation's callocs gives null.
     template <typename Operation>
-    static void ExpectDeath(Operation operation)
+    static void ExpectDeath(Operation operation, int failing = 0)
     {
         EXPECT_DEATH(
             {
-                FailingCalloc const failing(0);
+                FailingCalloc const failingCalloc(failing);
                 operation();
             },
             "");
@@ -124,6 +125,14 @@ TYPED_TEST(ListMemory, ReadOfABoolArray_TakesABlockForTheIntsToo)
     EXPECT_THAT(array, Each(true));
 }
 
+TYPED_TEST(ListMemory, WriteOfABoolArray_TakesABlockForTheIntsAlone)
+{
+    this->ticket.fake.Access()->MSETPARAMETER = [](void*, int, int, char const*, PARAM_TYPE, void const*, int)
+    { return 1; };
+    bool const array[Size] = {};
+    EXPECT_EQ(this->Tables([&] { return this->ticket.SetArray(array, Size); }), 1);
+}
+
 TYPED_TEST(ListMemory, BoolArrayThatCannotBeRead_LeavesTheArray)
 {
     this->ticket.StoreList(std::vector<int>{0, 0});
@@ -168,36 +177,53 @@ TEST(ListMemorySingle, VectorWithoutATable_IsFalseAndLeavesTheVector)
     std::vector<int> list = {99};
     std::vector<bool> bools = {true};
     std::vector<wxString> texts = {"old"};
-    for (int i = 0; i < 3; ++i)
+    wxArrayString array;
+    array.Add("old");
+    for (int i = 0; i < 4; ++i)
     {
         FailingCalloc const failing(0);
         EXPECT_FALSE(i == 0   ? ticket.GetVector(list)
                      : i == 1 ? ticket.GetVector(bools)
-                              : ticket.GetVector(texts));
+                     : i == 2 ? ticket.GetVector(texts)
+                              : ticket.GetWxArray(array));
     }
     EXPECT_THAT(list, ElementsAre(99));
     EXPECT_THAT(bools, ElementsAre(true));
     EXPECT_THAT(texts, ElementsAre("old"));
+    EXPECT_THAT(array, ElementsAre("old"));
     EXPECT_THAT(ticket.fake.calls, Each(ticket.Get(PARAM_COUNT, -1)));
 }
 
-TEST(ListMemoryContainedDeathTest, VectorWithoutATable_EndsTheProcess_ByDesign)
+using ContainedListDeathTest = ListMemoryDeathTest<CONTAINED>;
+
+TEST_F(ContainedListDeathTest, VectorReadWithoutATable_EndsTheProcess_ByDesign)
 {
-    LISTS<CONTAINED> ticket;
-    ticket.StoreList(std::vector<int>{1, 2});
-    std::vector<int> list;
-    EXPECT_DEATH(
+    ExpectDeath(
+        [this]
         {
-            FailingCalloc const failing(0);
+            std::vector<int> list;
             ticket.GetVector(list);
-        },
-        "");
+        });
+    ExpectDeath(
+        [this]
+        {
+            std::vector<bool> bools;
+            ticket.GetVector(bools);
+        });
+    ExpectDeath(
+        [this]
+        {
+            std::vector<wxString> texts;
+            ticket.GetVector(texts);
+        });
 }
 
 TYPED_TEST(ListMemoryDeathTest, ArrayReadWithoutATable_EndsTheProcess_ByDesign)
 {
     int array[3] = {};
     this->ExpectDeath([&] { this->ticket.GetArray(array, 3); });
+    bool bools[3] = {};
+    this->ExpectDeath([&] { this->ticket.GetArray(bools, 3); }, 1);  // behind the ints
 }
 
 TYPED_TEST(ListMemoryDeathTest, VectorWriteWithoutATable_EndsTheProcess_ByDesign)

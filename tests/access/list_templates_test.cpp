@@ -45,15 +45,22 @@ int Look(void*, int, int, Record* table)
     return 1;
 }
 
-// A type has a public member if a view takes a vector of it.
-template <typename View, typename T>
-concept TakesVector = requires(View const& view, std::vector<T>& list)
+// A type has a public member if a view takes a vector of it. TicketAndKey: what stands before the vector.
+template <typename View, typename T, typename... TicketAndKey>
+concept TakesVector = requires(View const& view, std::vector<T>& list, TicketAndKey... ticketAndKey)
 {
-    view.GetVectorParameter("k", list);
+    view.GetVectorParameter(ticketAndKey..., list);
 }
-|| requires(View const& view, std::vector<T>& list) { view.SetVectorParameter("k", list); };
-static_assert(TakesVector<STICKET_READ, wxString> && TakesVector<STICKET_MODIFY, void*>);
-static_assert(!TakesVector<STICKET_READ, char const*> && !TakesVector<STICKET_MODIFY, char const*>);
+|| requires(View const& view, std::vector<T>& list, TicketAndKey... ticketAndKey)
+{
+    view.SetVectorParameter(ticketAndKey..., list);
+};
+static_assert(TakesVector<STICKET_READ, wxString, char const*>);
+static_assert(TakesVector<MTICKET_MODIFY, void*, int, int, char const*>);
+static_assert(!TakesVector<STICKET_READ, char const*, char const*>);
+static_assert(!TakesVector<STICKET_MODIFY, char const*, char const*>);
+static_assert(!TakesVector<MTICKET_READ, char const*, int, int, char const*>);
+static_assert(!TakesVector<MTICKET_MODIFY, char const*, int, int, char const*>);
 }  // namespace
 
 TYPED_TEST_SUITE(ListTemplate, Families);

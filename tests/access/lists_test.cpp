@@ -82,6 +82,11 @@ int ReadNothingButSayOk(void*, int, int, GETMULTIPAR* table)
     return 0;
 }
 int SayOkAndReadNothing(void*, int, int, GETMULTIPAR*) { return 1; }
+int FailButWriteACount(void*, int, int, char const*, PARAM_TYPE, void* value, int)
+{
+    *static_cast<unsigned long*>(value) = 3;
+    return 0;
+}
 int WriteNothingButSayOk(void*, int, int, SETMULTIPAR* table)
 {
     for (; table->key; ++table)
@@ -137,6 +142,26 @@ TYPED_TEST(VectorRead, CountThatTheSlotDoesNotWrite_Is0)
     EXPECT_FALSE(this->ticket.GetVector(this->list));
     EXPECT_EQ(this->list, old);
     EXPECT_TRUE(this->calls.empty());
+}
+
+TYPED_TEST(VectorRead, CountOfASlotThatFails_DoesNotCount)
+{
+    this->ticket.StoreList(this->three);
+    this->ticket.fake.Access()->MGETPARAMETER = FailButWriteACount;
+    auto const old = this->list;
+    EXPECT_FALSE(this->ticket.GetVector(this->list));
+    EXPECT_EQ(this->list, old);
+    EXPECT_TRUE(this->calls.empty());
+}
+
+TYPED_TEST(VectorRead, ValueThatTheSlotDoesNotWrite_IsWhatTheVectorHeldThereOr0_ByDesign)
+{
+    auto const old = this->list[0];
+    this->list.resize(2);
+    this->ticket.StoreList(this->three);
+    this->ticket.fake.Access()->MGETMULTIPAR = ReadNothingButSayOk;
+    EXPECT_TRUE(this->ticket.GetVector(this->list));
+    EXPECT_EQ(this->list, this->List({old, old, {}}));
 }
 
 TYPED_TEST(VectorRead, RecordThatFails_IsLeftOutAndTheLaterOnesMoveUp)
@@ -252,10 +277,12 @@ TYPED_TEST(ArrayRead, CountOf0_IsFalseAndCallsNoSlot)
 
 TYPED_TEST(ArrayRead, ResultOfTheTableSlot_DoesNotCount)
 {
+    auto const old = this->list;
     this->ticket.fake.Access()->MGETMULTIPAR = ReadNothingButSayOk;
     EXPECT_TRUE(this->ticket.GetArray(this->list.data(), 3));
     this->ticket.fake.Access()->MGETMULTIPAR = SayOkAndReadNothing;
     EXPECT_FALSE(this->ticket.GetArray(this->list.data(), 3));
+    EXPECT_EQ(this->list, old);
 }
 
 TYPED_TEST(ListWrite, Three_GoAsOneTableFromMinus1)

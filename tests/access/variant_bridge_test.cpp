@@ -71,6 +71,15 @@ protected:
     std::optional<int> Int(int pos = -1) { return this->ticket.fake.Int(Family::Type, Family::Id, "k", pos); }
 };
 
+// A variant of a type that nobody knows, in spite of its name.
+class LookAlikeData : public wxVariantData
+{
+public:
+    bool Eq(wxVariantData& other) const override { return &other == this; }
+    wxString GetType() const override { return "Long"; }
+};
+wxVariant LookAlike() { return wxVariant(new LookAlikeData, "k"); }
+
 // The local encoding while it lives.
 class Locale
 {
@@ -181,12 +190,24 @@ TYPED_TEST(VariantChk, TypesThatNobodyKnows_AreFalseAndNull)
     }
 }
 
-TYPED_TEST(VariantChk, ValueThatGoesBetweenTheCalls_Is0)
+TYPED_TEST(VariantChk, ValueThatGoesBetweenTheCalls_Is0NullOrTheEmptyText)
 {
-    this->ticket.Store(5, -1);
-    this->ticket.fake.FailCall(1);
-    EXPECT_TRUE(this->ticket.GetVariantChk(this->value, -1));
+    auto const readGone = [this](auto stored)
+    {
+        this->ticket.Store(stored, -1);
+        this->ticket.fake.FailCall(1);
+        EXPECT_TRUE(this->ticket.GetVariantChk(this->value, -1));
+        EXPECT_EQ(this->value.GetName(), "k");
+    };
+    readGone(5);
     EXPECT_EQ(this->value, this->Long(0));
+    readGone(2.5);
+    EXPECT_EQ(this->value, wxVariant(0.0));
+    readGone("text");
+    EXPECT_EQ(this->value, wxVariant(""));
+    readGone(static_cast<void*>(this));
+    EXPECT_EQ(this->value.GetType(), "void*");
+    EXPECT_EQ(this->value.GetVoidPtr(), nullptr);
 }
 
 TYPED_TEST(VariantChk, VectorOfTexts_IsAnArrstringResolved)
@@ -200,6 +221,28 @@ TYPED_TEST(VariantChk, VectorOfTexts_IsAnArrstringResolved)
     EXPECT_EQ(this->value.GetType(), "arrstring");
     EXPECT_EQ(this->value.GetName(), "k");
     EXPECT_THAT(this->value.GetArrayString(), ElementsAre("a", "<$(B)/x>", "c"));
+}
+
+TYPED_TEST(VariantChk, VectorOfTexts_IsAskedForEachTypeAndThenReadAsOneTable)
+{
+    this->ticket.Store("a", -1);
+    this->ticket.Store("b", 1);
+    EXPECT_TRUE(this->ticket.GetVariantChk(this->value, -1));
+    EXPECT_THAT(this->calls,
+                ElementsAre(this->ticket.Get(PARAM_NONE, -1), this->ticket.Get(PARAM_NONE, 0),
+                            this->ticket.Get(PARAM_NONE, 1), this->ticket.Get(PARAM_NONE, 2),
+                            this->ticket.Get(PARAM_COUNT, -1), this->ticket.GetTable(),
+                            this->ticket.Get(PARAM_STRING, 0), this->ticket.Get(PARAM_STRING, 1)));
+}
+
+TYPED_TEST(VariantChk, VectorOfTextsThatGoesBetweenTheCalls_IsAnEmptyArrstring)
+{
+    this->ticket.Store("a", -1);
+    this->ticket.Store("b", 1);
+    this->ticket.fake.FailCall(4);  // the count of the read
+    EXPECT_TRUE(this->ticket.GetVariantChk(this->value, -1));
+    EXPECT_EQ(this->value.GetType(), "arrstring");
+    EXPECT_TRUE(this->value.GetArrayString().empty());
 }
 
 TYPED_TEST(VariantChk, VectorWithoutValues_IsAnEmptyArrstring)
@@ -226,6 +269,20 @@ TYPED_TEST(VariantChk, VectorOfAnIntAndAText_IsAListNamedByTheKey)
     EXPECT_EQ(this->value.GetType(), "list");
     EXPECT_EQ(this->value.GetName(), "k");
     EXPECT_THAT(this->Told(this->value), ElementsAre("k: long 5", "k: string b"));
+    EXPECT_THAT(this->calls, ElementsAre(this->ticket.Get(PARAM_NONE, -1), this->ticket.Get(PARAM_NONE, 0),
+                                         this->ticket.Get(PARAM_NONE, 0), this->ticket.Get(PARAM_INT, 0),
+                                         this->ticket.Get(PARAM_NONE, 1), this->ticket.Get(PARAM_STRING, 1),
+                                         this->ticket.Get(PARAM_NONE, 2)));
+}
+
+TYPED_TEST(VariantChk, VectorOfPointers_IsAListOfThem)
+{
+    std::vector<void*> const pointers = SomeValues<void*>(2);
+    this->ticket.StoreList(pointers);
+    EXPECT_TRUE(this->ticket.GetVariantChk(this->value, -1));
+    ASSERT_EQ(this->value.GetCount(), 2u);
+    EXPECT_EQ(this->value[0].GetVoidPtr(), pointers[0]);
+    EXPECT_EQ(this->value[1].GetVoidPtr(), pointers[1]);
 }
 
 TYPED_TEST(VariantChk, VectorThatBeginsWithTexts_IsAListIfANumberFollows)
@@ -320,6 +377,8 @@ TYPED_TEST(VariantDef, Bool_IsAnIntThatIsNot0)
     EXPECT_TRUE(value.GetBool());
     EXPECT_EQ(value.GetName(), "k");
     EXPECT_THAT(this->calls, ElementsAre(this->ticket.Get(PARAM_INT, -1)));
+    this->ticket.Store(0, -1);
+    EXPECT_FALSE(this->ticket.GetVariantDef(wxVariant(true, "k"), -1).GetBool());
 }
 
 TYPED_TEST(VariantDef, Double_IsADouble)
@@ -397,6 +456,40 @@ TYPED_TEST(VariantDef, List_IsReadElementByElementUnderItsOwnName)
     EXPECT_THAT(this->Told(def), ElementsAre("other: string x", "names: long 7"));
 }
 
+TYPED_TEST(VariantDef, List_MayHoldEachKindAtItsPosition)
+{
+    void* const pointer = this;
+    this->ticket.Store(1, -1);
+    this->ticket.Store(2.5, 1);
+    this->ticket.Store(5, 2);
+    this->ticket.Store("text", 3);
+    this->ticket.Store(pointer, 4);
+    wxVariant const nowhere(static_cast<void*>(nullptr));
+    wxVariant const def =
+        this->List({wxVariant(false), wxVariant(0.0), this->Long(0), wxVariant(""), nowhere});
+    wxVariant const value = this->ticket.GetVariantDef(def, -1);
+    EXPECT_THAT(this->calls, ElementsAre(this->ticket.Get(PARAM_INT, 0), this->ticket.Get(PARAM_DOUBLE, 1),
+                                         this->ticket.Get(PARAM_INT, 2), this->ticket.Get(PARAM_STRING, 3),
+                                         this->ticket.Get(PARAM_POINTER, 4)));
+    ASSERT_EQ(value.GetCount(), 5u);
+    EXPECT_EQ(value[0], wxVariant(true));
+    EXPECT_EQ(value[1], wxVariant(2.5));
+    EXPECT_EQ(value[2], wxVariant(5L));
+    EXPECT_EQ(value[3], wxVariant("text"));
+    EXPECT_EQ(value[4].GetVoidPtr(), pointer);
+}
+
+TYPED_TEST(VariantDef, ElementOfAnotherType_IsACopyUnderTheListsName)
+{
+    this->ticket.Store(5, -1);
+    wxDateTime const day(1, wxDateTime::Feb, 2003);
+    wxVariant const value = this->ticket.GetVariantDef(this->List({wxVariant(day, "other")}), -1);
+    ASSERT_EQ(value.GetCount(), 1u);
+    EXPECT_EQ(value[0], wxVariant(day));
+    EXPECT_EQ(value[0].GetName(), "k");
+    EXPECT_THAT(this->calls, IsEmpty());
+}
+
 TYPED_TEST(VariantDef, List_IsAsLongAsTheDefault)
 {
     this->ticket.StoreList(std::vector<int>{1, 2, 3});
@@ -463,6 +556,7 @@ TYPED_TEST(VariantDef, AnyOtherType_IsACopyOfTheDefault)
     wxVariant null;
     null.SetName("k");
     EXPECT_TRUE(this->ticket.GetVariantDef(null, -1).IsNull());
+    EXPECT_EQ(this->ticket.GetVariantDef(LookAlike(), -1).GetType(), "Long");
     EXPECT_THAT(this->calls, IsEmpty());
 }
 
@@ -538,10 +632,20 @@ TYPED_TEST(VariantSet, AnyResultOfTheSlotBut0_IsTrue)
 
 TYPED_TEST(VariantSet, List_IsOneCallAnElementFromMinus1)
 {
-    wxVariant const list = this->List({wxVariant("a"), wxVariant(true), wxVariant(2.5)});
+    void* const pointer = this;
+    wxVariant const list = this->List(
+        {wxVariant("a"), wxVariant(true), wxVariant(2.5), this->Long(5), wxVariant(pointer), wxVariant("b")});
     EXPECT_TRUE(this->ticket.SetVariant(list, -1));
-    EXPECT_THAT(this->calls, ElementsAre(this->ticket.Set(PARAM_STRING, -1), this->ticket.Set(PARAM_INT, 1),
-                                         this->ticket.Set(PARAM_DOUBLE, 2)));
+    EXPECT_THAT(this->calls,
+                ElementsAre(this->ticket.Set(PARAM_STRING, -1), this->ticket.Set(PARAM_INT, 1),
+                            this->ticket.Set(PARAM_DOUBLE, 2), this->ticket.Set(PARAM_DOUBLE, 3),
+                            this->ticket.Set(PARAM_POINTER, 4), this->ticket.Set(PARAM_STRING, 5)));
+    EXPECT_EQ(this->ticket.Text(0), "a");
+    EXPECT_EQ(this->Int(1), 1);
+    EXPECT_EQ(this->Double(2), 2.5);
+    EXPECT_EQ(this->Double(3), 5.0);
+    EXPECT_EQ(this->ticket.GetVoidParameter(4, "k", nullptr), pointer);
+    EXPECT_EQ(this->ticket.Text(5), "b");
 }
 
 TYPED_TEST(VariantSet, ListOverALongerOne_StartsTheKeyAnew)
@@ -581,6 +685,16 @@ TYPED_TEST(VariantSet, ListInAList_IsWrittenInFirstPlaceAndDroppedBehind_ByDesig
     EXPECT_TRUE(this->ticket.SetVariant(this->List({inner, inner}), -1));
     EXPECT_THAT(this->calls,
                 ElementsAre(this->ticket.Set(PARAM_STRING, -1), this->ticket.Set(PARAM_STRING, 1)));
+}
+
+TYPED_TEST(VariantSet, ArrstringInAList_IsWrittenInFirstPlaceAndDroppedBehind_ByDesign)
+{
+    wxArrayString const texts = this->Texts({"a", "b"});
+    EXPECT_TRUE(this->ticket.SetVariant(this->List({wxVariant(texts), wxVariant(texts)}), -1));
+    auto const written = this->calls;
+    this->calls.clear();
+    EXPECT_TRUE(this->ticket.SetWxArray(texts));
+    EXPECT_EQ(written, this->calls);
 }
 
 TYPED_TEST(VariantSet, Arrstring_IsWrittenAsTheWxArrayIs)
@@ -629,5 +743,6 @@ TYPED_TEST(VariantSet, AnyOtherType_IsFalseAndCallsNoSlot)
     EXPECT_FALSE(this->ticket.SetVariant(wxVariant(wxDateTime::Now()), -1));
     EXPECT_FALSE(this->ticket.SetVariant(wxVariant(), -1));
     EXPECT_FALSE(this->ticket.SetVariant(wxVariant(wxLongLong(5)), -1));
+    EXPECT_FALSE(this->ticket.SetVariant(LookAlike(), -1));
     EXPECT_THAT(this->calls, IsEmpty());
 }
