@@ -2,6 +2,7 @@
 
 #include <cstdio>
 #include <cstdlib>
+#include <memory>
 #include <utility>
 
 namespace
@@ -26,18 +27,24 @@ void SERVER::AddOptions(wxCmdLineParser& parser)
     parser.AddOption("o", "port", "and port (50000)", wxCMD_LINE_VAL_NUMBER);
 }
 
-void SERVER::TakeOptions(wxCmdLineParser const& parser)
+bool SERVER::TakeOptions(wxCmdLineParser const& parser)
 {
     parser.Found("user", &user);
     parser.Found("password", &password);
     parser.Found("server", &host);
     parser.Found("port", &port);
+    return (port >= 1 && port <= 65535) || Fail("a port is a number from 1 to 65535");
 }
 
-bool Fail(char const* what, int code)
+bool Fail(std::string const& what)
 {
-    std::fprintf(stderr, "%s: %s (the plug-in's code: %d)\n", ProgramName, what, code);
+    std::fprintf(stderr, "%s: %s\n", ProgramName, what.c_str());
     return false;
+}
+
+bool Fail(std::string const& what, int code)
+{
+    return Fail(what + " (the plug-in's code: " + std::to_string(code) + ")");
 }
 
 bool IsPlugInThere()
@@ -67,13 +74,15 @@ TLogin* NewRecord(char const* user, char const* password, SERVER const& server)
 
 bool LogIn(ComGUIManager& manager, TLogin* login)
 {
+    std::unique_ptr<TLogin, decltype(&std::free)> record(login, std::free);
     if (!manager.IsServerOnline(login))
-        return Fail("no server answers there", -2005);
+        return Fail("no server answers at " + std::string(login->szServerHost) + ", port " +
+                    std::to_string(login->iServerPort));
     if (int const result = manager.Initialize(login, Stamp); result != 0)
         return Fail("cannot prepare a session", result);
-    if (int const result = manager.Login(login); result != 0)
+    if (int const result = manager.Login(record.release()); result != 0)
         return Fail("the server refuses the login", result);
-    return manager.GetClientContainer() || Fail("the session has no tickets", 0);
+    return manager.GetClientContainer() || Fail("the session has no tickets");
 }
 
 EventReceiver::EventReceiver(std::function<void(ServerNotificationEvent const&)> handler)
@@ -85,7 +94,10 @@ EventReceiver::EventReceiver(std::function<void(ServerNotificationEvent const&)>
           })),
       m_thread(new Receiver(m_ended))
 {
-    m_thread->Run();
+    if (m_thread->Run() == wxTHREAD_NO_ERROR)
+        return;
+    Fail("cannot start a thread to hear events with");  // and would wait for its end for ever
+    std::exit(1);
 }
 
 EventReceiver::~EventReceiver()

@@ -5,6 +5,7 @@
 #include <comgui/comgui.h>
 #include <functional>
 #include <future>
+#include <string>
 #include <wx/cmdline.h>
 
 extern char const ProgramName[];  // each program's own, for its messages
@@ -13,7 +14,7 @@ extern char const ProgramName[];  // each program's own, for its messages
 struct SERVER
 {
     static void AddOptions(wxCmdLineParser& parser);
-    void TakeOptions(wxCmdLineParser const& parser);
+    bool TakeOptions(wxCmdLineParser const& parser);  // false, and says why, if one cannot be
 
     wxString user = "admin";
     wxString password = "admin";
@@ -21,8 +22,9 @@ struct SERVER
     long port = 50000;
 };
 
-// Says on stderr what went wrong; always false.
-bool Fail(char const* what, int code);
+// Says on stderr what went wrong, with the plug-in's code where it was the plug-in; always false.
+bool Fail(std::string const& what);
+bool Fail(std::string const& what, int code);
 
 // Whether the library found its plug-in; says so if not.
 bool IsPlugInThere();
@@ -30,7 +32,8 @@ bool IsPlugInThere();
 // A record of the host's own for one session. From calloc, since one that is logged in becomes the manager's.
 TLogin* NewRecord(char const* user, char const* password, SERVER const& server);
 
-// Looks for the server, prepares a session and logs in. The record is the manager's from then on.
+// Looks for the server, prepares a session and logs in; says why if it cannot. Takes the record over: it is
+// the manager's once it comes to the login, and is freed if it does not.
 bool LogIn(ComGUIManager& manager, TLogin* login);
 
 // A host's own mark of its sessions; the plug-in only carries it.

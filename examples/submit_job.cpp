@@ -57,7 +57,8 @@ std::optional<int> Parse(int argc, char** argv, OPTIONS& options)
     parser.AddParam("FILE", wxCMD_LINE_VAL_STRING, wxCMD_LINE_PARAM_MULTIPLE);
     if (int const result = parser.Parse(); result != 0)
         return result < 0 ? 0 : 1;  // negative: that was --help
-    options.server.TakeOptions(parser);
+    if (!options.server.TakeOptions(parser))
+        return 1;
     parser.Found("copies", &options.copies);
     parser.Found("queue", &options.queue);
     if (std::min(options.copies, options.queue) < 0 || std::max(options.copies, options.queue) > INT_MAX)

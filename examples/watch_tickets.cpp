@@ -44,7 +44,8 @@ std::optional<int> Parse(int argc, char** argv, OPTIONS& options)
     parser.AddOption("n", "events", "leave after so many events", wxCMD_LINE_VAL_NUMBER);
     if (int const result = parser.Parse(); result != 0)
         return result < 0 ? 0 : 1;  // negative: that was --help
-    options.server.TakeOptions(parser);
+    if (!options.server.TakeOptions(parser))
+        return 1;
     parser.Found("events", &options.events);
     options.busy = parser.Found("busy");
     if (options.events < 0)

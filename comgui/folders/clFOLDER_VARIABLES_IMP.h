@@ -22,8 +22,7 @@ struct FOLDER_MAPPING
 
     std::string key;       // in the system ticket; empty if SetFolderVariable made the mapping
     std::string variable;  // its bare name
-    std::string
-        folder;  // absolute, with slashes and none at the end, unless SetFolderVariable said otherwise
+    std::string folder;    // as Load() tidied it up, or as SetFolderVariable got it
 };
 
 class clFOLDER_VARIABLES_IMP : public clFOLDER_VARIABLES
@@ -41,7 +40,7 @@ public:
     std::string Decode(std::string const& path, bool backslashes) const override;
     void SetFolderVariable(char const* variable, char const* folder) override;
 
-    // folders alone decides, not the object it is called on.
+    // Translates with the given folders, and not with its own.
     clSETMULTIPAR_FOLDER_VARIABLES*
     New_clSETMULTIPAR_FOLDER_VARIABLES(clFOLDER_VARIABLES* folders, SETMULTIPAR* table, bool encode) override;
 

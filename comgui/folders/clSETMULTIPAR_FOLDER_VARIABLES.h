@@ -1,6 +1,7 @@
-// Translates the folders in a whole table of parameters for one write: construct it, hand current to the
-// write, call ResultCpy(), destroy it. The caller's table is left as it is, and must live as long as this,
-// with all it points at; the translated texts die with this. One thread at a time.
+// Translates the folders in a whole table of parameters for one write. The write gets current instead of the
+// caller's table, and ResultCpy() then takes home what became of each record. Not a word of the caller's
+// table changes but for that. current points into this object and into the caller's data, so both must
+// outlive the write. One thread at a time.
 #pragma once
 
 #include "comgui/foundation/export.h"

@@ -1,6 +1,6 @@
-// Everything that depends on how narrow texts are coded. They are UTF-8 throughout this system, so the
-// conversions copy and the double-byte functions work on bytes; what is left is to recognise UTF-8, to filter
-// bytes and to escape XML. Pure functions on their arguments, safe from any thread.
+// Texts and the bytes they are made of: telling UTF-8 from other codings, filtering, escaping for XML. What
+// is called a conversion copies, since both its sides are UTF-8. Nothing is shared between calls, so they may
+// come from any thread.
 #pragma once
 
 #include "comgui/foundation/export.h"
@@ -62,10 +62,10 @@ COMGUI_EXPORT std::size_t LastAsciiPos(std::string const& s);
 COMGUI_EXPORT std::size_t find_last_of(std::string const& s, std::string const& set, std::size_t pos);
 }  // namespace DBCS
 
-// Lets each byte of a text pass, removes it or puts another in its place. Rules apply in the order of the
-// calls, the later one overrides. A range includes both ends, taken as unsigned, and is empty if first is
-// above last; a list of bytes ends at its zero byte, and null is an empty one. Many threads may filter while
-// none sets a rule.
+// Lets each byte of a text pass, removes it or puts another in its place. Of several rules for one byte the
+// one set last holds. A range includes both ends, taken as unsigned, and is empty if first is above last; a
+// list of bytes ends at its zero byte, and null is an empty one. Many threads may filter while none sets a
+// rule.
 class COMGUI_EXPORT FilterString
 {
 public:

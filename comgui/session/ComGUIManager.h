@@ -225,9 +225,10 @@ public:
     int SendJob(TJobIdentification* job, char* path, char* name);
     int SendJob(TLogin* login, TJobIdentification* job, char* path, char* name);
 
-    // Announce a job and send it. The numbers go to the server as they are, and it says what they mean.
-    // PrepareJob gives the server's answer, or -1 if the command failed; UploadJob gives 1 if the job was
-    // sent and 0 if not. A negative c is left out.
+    // Announce a job and send it. path: a file on this side; its leaf name, cut at 251 bytes, is all that is
+    // announced. The numbers go to the server as they are, and it says what they mean; only a negative c of
+    // PrepareJob does not go. PrepareJob gives the server's answer, which may be negative too, or -1 if the
+    // command failed; UploadJob gives 1 if the job was sent and 0 if not, or if there is no memory.
     int PrepareJob(std::string path, int a, int b, int c, int d, int e);
     int UploadJob(std::string path, int a, unsigned int b, int c, int d);
 

@@ -1,5 +1,6 @@
-// What goes with a remote command: the plug-in carries it to the server as it is, and back. All of it is
-// zero but for what a command uses; the texts are UTF-8 and need no zero byte where they fill their field.
+// What goes with a remote command. It travels byte for byte, and the server's answer comes in the same
+// record; so what a command does not use is zero. The texts are UTF-8 and need no zero byte where they fill
+// their field.
 #pragma once
 
 #include <cstddef>
@@ -7,8 +8,8 @@
 
 struct TCommandRecord
 {
-    unsigned int nMagic;  // always 0x49494949, the bytes "IIII"; what ComGUIManager::GetEndian() says
-    unsigned int nSize;   // always 540
+    unsigned int nMagic;  // 0x49494949, what ComGUIManager::GetEndian() gives
+    unsigned int nSize;   // 540
     int iArgA;            // what the arguments say is between the command's sender and the server
     int iArgB;
     int iArgC;

@@ -7,7 +7,7 @@
 
 struct TJobIdentification
 {
-    unsigned int nSize;  // always 160
+    unsigned int nSize;  // 160
     int iJobArg1;        // what the arguments say is between the sender and the server
     unsigned int iJobArg2;
     int iJobArg3;

@@ -2,6 +2,8 @@
 
 #include "comgui/folders/FolderVariables.h"
 #include "standin/module/Guard.h"
+#include "standin/server/FolderTable.h"
+#include <new>
 
 namespace standin
 {
@@ -78,11 +80,14 @@ void FolderTranslator::Reload() const
 {
     // Counted before anything is read: a change that comes meanwhile is one more reason to load.
     unsigned long long const changes = m_server.SystemTicketChanges();
+    m_loadedAt.store(Never, std::memory_order_relaxed);  // what ends halfway is begun again
+    m_copy.reset();
     if (m_translator)
         m_translator->Load();
     else
         m_translator.reset(CreateFolderVariables(&m_access));
-    m_loadedAt.store(changes, std::memory_order_release);
+    if (m_copy)  // else nothing is known
+        m_loadedAt.store(changes, std::memory_order_release);
 }
 
 // Called while m_translator loads.
@@ -94,13 +99,13 @@ int FolderTranslator::OnOperation(void* instance, int type, int id, TICKET_OP op
                         [&]
                         {
                             auto const& self = *static_cast<FolderTranslator const*>(instance);
-                            self.m_copy = self.CopyOfTheSystemTicket();
+                            self.m_copy = self.CopyOfTheFolders();
                             *static_cast<STICKET_ACCESS const**>(arg) = self.m_copy->Access();
                             return 1;
                         });
 }
 
-std::unique_ptr<LocalTicket> FolderTranslator::CopyOfTheSystemTicket() const
+std::unique_ptr<LocalTicket> FolderTranslator::CopyOfTheFolders() const
 {
     auto copy = std::make_unique<LocalTicket>();
     STICKET_ACCESS const& ticket = *copy->Access();
@@ -108,10 +113,13 @@ std::unique_ptr<LocalTicket> FolderTranslator::CopyOfTheSystemTicket() const
     m_server.Visit(nobody, SystemTicket,
                    [&](std::string_view key, int pos, StoredValue const& stored)
                    {
+                       if (!FolderSettings::Concern(key, pos))
+                           return;
                        TicketValue const value = TicketValue::FromStored(stored);
                        BIN_STRING binary;
-                       ticket.SSETPARAMETER(ticket.Instance, std::string(key).c_str(), value.type,
-                                            value.Word(binary), pos);
+                       if (!ticket.SSETPARAMETER(ticket.Instance, std::string(key).c_str(), value.type,
+                                                 value.Word(binary), pos))
+                           throw std::bad_alloc();  // it refuses nothing that a ticket holds
                    });
     return copy;
 }

@@ -34,17 +34,17 @@ private:
     clFOLDER_VARIABLES& UpToDate() const;  // the library's translator
     void Reload() const;                   // with m_reload locked
 
-    // What the library's translator loads from is no client's view of the system ticket but a copy of it: of
-    // one moment, whole whatever the session limits itself to, and not counted among its open tickets. And
-    // no text of it goes away if the session ends meanwhile.
+    // What the library's translator loads from is no client's view of the system ticket but a copy of what it
+    // says of folders: of one moment, all of them whatever the session limits itself to, and not counted
+    // among its open tickets. And no text of it goes away if the session ends meanwhile.
     static int OnOperation(void* instance, int type, int id, TICKET_OP op, void* arg);
-    std::unique_ptr<LocalTicket> CopyOfTheSystemTicket() const;
+    std::unique_ptr<LocalTicket> CopyOfTheFolders() const;
 
     TicketServer& m_server;
     MTICKET_ACCESS m_access{};
 
     mutable std::mutex m_reload;
-    mutable std::unique_ptr<LocalTicket> m_copy;
+    mutable std::unique_ptr<LocalTicket> m_copy;  // of the last load; null if it could not be made
     mutable std::unique_ptr<clFOLDER_VARIABLES> m_translator;
     mutable std::atomic<unsigned long long> m_loadedAt;  // after so many changes of the system ticket
 };

@@ -1,4 +1,5 @@
 // What a translation takes from the heap, and what is left when there is nothing to take.
+#include "comgui/folders/clSETMULTIPAR_FOLDER_VARIABLES.h"
 #include "tests/folders/FolderRows.h"
 #include "tests/folders/FolderServer.h"
 #include "tests/stream/Allocations.h"
@@ -78,4 +79,14 @@ TEST_F(Allocations, OfEncodeBelowAFolder_AreTheArgumentAndTheResult)
     EXPECT_EQ(Of([&] { return folders->Encode("System/Folders/Log", relative); }, expected), 2);
     EXPECT_EQ(Of([&] { return folders->EncodeV("LOG", relative); }, expected), 2);
     EXPECT_EQ(Of([&] { return folders->Encode("Nope", relative); }, relative.c_str()), 1);
+}
+
+TEST_F(Allocations, OfATableWithoutTexts_AreNone)
+{
+    int const number = 7;
+    SETMULTIPAR table[] = {
+        {"I", PARAM_INT, 0, &number, -1, false, {}}, {"E", PARAM_STRING, 0, "", -1, false, {}}, {}};
+    auto const translate = [&]
+    { clSETMULTIPAR_FOLDER_VARIABLES const translated(folders.get(), table, true); };
+    EXPECT_EQ(FailEachAllocation(translate, [](bool) {}), 0);
 }

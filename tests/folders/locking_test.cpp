@@ -55,6 +55,20 @@ TEST_F(Locking, EveryOperation_TakesTheLockOnce)
     }
 }
 
+TEST_F(Locking, EveryOperation_LetsTheTextOfALockThatFailsPass)
+{
+    clFOLDER_VARIABLES_IMP folders(server.container.Access());
+    watched.atStep = [](SysLib::MUTEX_INSTANCE const&, std::string const&) { throw "no lock"; };
+    EXPECT_THROW(folders.IsEnabled(), char const*);
+    EXPECT_THROW(folders.Load(), char const*);
+    EXPECT_THROW(folders.Encode("/a"), char const*);
+    EXPECT_THROW(folders.Encode("K", "a"), char const*);
+    EXPECT_THROW(folders.EncodeV("V", "a"), char const*);
+    EXPECT_THROW(folders.Decode("$(V)", false), char const*);
+    EXPECT_THROW(folders.SetFolderVariable("V", "/v"), char const*);
+    watched.atStep = nullptr;
+}
+
 TEST_F(Locking, SetFolderVariable_OfNull_DoesNotTakeIt)
 {
     clFOLDER_VARIABLES_IMP folders(nullptr);

@@ -1,10 +1,12 @@
 #include "comgui/foundation/CharSets.h"
 
+#include "tests/stream/Allocations.h"
 #include "tests/support/HexText.h"
 #include <algorithm>
 #include <cstdlib>
 #include <gtest/gtest.h>
 #include <memory>
+#include <new>
 #include <random>
 #include <sys/mman.h>
 #include <unistd.h>
@@ -136,6 +138,15 @@ TEST(DuplicateAndConvert, EmptyText_IsOneByte)
     std::unique_ptr<char[]> const copy(
         CharSets::DuplicateAndConvert("", CharSets::WIN_TO_UTF8, CharSets::ALLOC_NEW));
     EXPECT_STREQ(copy.get(), "");
+}
+
+TEST(DuplicateAndConvert, WithoutMemory_GivesNull)
+{
+    FailingAllocation const failing(0);
+    char* const copy = CharSets::DuplicateAndConvert("text", CharSets::WIN_TO_UTF8, CharSets::ALLOC_NEW);
+    FailingAllocation::Stop();
+    EXPECT_EQ(copy, nullptr);
+    EXPECT_TRUE(failing.HasHappened());
 }
 
 TEST(DuplicateAndConvert, Methods_HaveTheirNumbers)
@@ -357,6 +368,23 @@ TEST(FilterString, Copy_HasRulesOfItsOwn)
     EXPECT_EQ(copy("ab"), "b");
 }
 
+TEST(FilterString, Result_IsAllocatedOnce)
+{
+    FilterString const filter(true);
+    std::string const text(1000, 'a');
+    auto const filterIt = [&]
+    {
+        try
+        {
+            filter(text);
+        }
+        catch (std::bad_alloc const&)
+        {
+        }
+    };
+    EXPECT_EQ(FailEachAllocation(filterIt, [](bool) {}), 1);
+}
+
 TEST(FilterString, RandomTextAndRules_GiveWhatOneByteAfterTheOtherGives)
 {
     std::mt19937 random(20);
@@ -451,6 +479,29 @@ TEST(XmlEscaping, LeadingByteInUtf8_IsReplacedWithItsFollowerLeftBehind_ByDesign
 TEST(XmlEscaping, ZeroBytes_AreBytesLikeOthers)
 {
     EXPECT_EQ(HexOf(Escaped(std::string("\0&\0<\0", 5))), HexOf(std::string("\0&amp;\0&lt;\0", 12)));
+}
+
+// Nothing but these bytes, so that each kind stands before and behind each other.
+TEST(XmlEscaping, RandomText_IsEscapedAsByOneReplacementAfterTheOther)
+{
+    constexpr std::pair<char, char const*> Kinds[] = {
+        {'"', "&quot;"},    {'&', "&amp;"},     {'\'', "&apos;"},   {'<', "&lt;"},
+        {'>', "&gt;"},      {'\xC4', "&#196;"}, {'\xD6', "&#214;"}, {'\xDC', "&#220;"},
+        {'\xDF', "&#223;"}, {'\xE4', "&#228;"}, {'\xF6', "&#246;"}, {'\xFC', "&#252;"},
+    };
+    std::mt19937 random(21);
+    for (int run = 0; run < 2000; ++run)
+    {
+        std::string text(random() % 10, '\0');
+        for (char& c : text)
+            c = Kinds[random() % std::size(Kinds)].first;
+        std::string expected = text;
+        std::size_t scan = 0;
+        for (auto const& [byte, escape] : Kinds)
+            for (std::size_t i; (i = expected.find(byte, scan)) != std::string::npos; scan = i + 1)
+                expected.replace(i, 1, escape);
+        EXPECT_EQ(HexOf(Escaped(text)), HexOf(expected)) << HexOf(text);
+    }
 }
 
 TEST(ReplaceAll, EveryByteOfTheKind_IsReplacedInPlace)

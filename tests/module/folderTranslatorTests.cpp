@@ -5,7 +5,9 @@
 #include "comgui/access/STICKET_READ.h"
 #include "comgui/folders/clFOLDER_VARIABLES.h"
 #include "comgui/folders/clSETMULTIPAR_FOLDER_VARIABLES.h"
+#include "tests/stream/Allocations.h"
 #include <climits>
+#include <new>
 #include <thread>
 
 namespace
@@ -236,4 +238,30 @@ TEST_F(FolderTranslators, UsedByManyThreadsWhileTheFoldersChange_GiveOldOrNewFol
     for (std::thread& thread : threads)
         thread.join();
     EXPECT_EQ(folders.Decode("$(TEMP)/x", false), "/a/x");
+}
+
+// Without memory a load fails where it stands, and leaves folders out or all of them.
+TEST_F(FolderTranslators, LoadedWithoutMemory_LoadOnceMoreAtTheNextOperation)
+{
+    clFOLDER_VARIABLES& folders = *OfTheContainer(other);
+    std::string const expected = folders.Decode("$(TEMP)/x", false);
+    ASSERT_EQ(expected, SiteFolder() + "/temp/x");
+    testing::internal::CaptureStderr();  // the module tells of each
+    bool hasFailed = true;
+    for (int n = 0; hasFailed && !HasFailure(); ++n)
+    {
+        {
+            FailingAllocation const failing(n);
+            try
+            {
+                folders.Load();
+            }
+            catch (std::bad_alloc const&)
+            {
+            }
+            hasFailed = failing.HasHappened();
+        }
+        EXPECT_EQ(folders.Decode("$(TEMP)/x", false), expected) << n;
+    }
+    testing::internal::GetCapturedStderr();
 }
