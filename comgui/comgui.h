@@ -27,6 +27,8 @@
 #include "comgui/session/LocalTicket.h"
 #include "comgui/session/ReceiverThread.h"
 #include "comgui/session/STicketFactory.h"
+#include "comgui/session/TCommandRecord.h"
+#include "comgui/session/TJobIdentification.h"
 #include "comgui/session/TLogin.h"
 #include "comgui/stream/MTICKET_BINSTREAM.h"
 #include "comgui/stream/STICKET_BINSTREAM.h"

@@ -1,14 +1,14 @@
 // Watches a server: logs in, asks to be told of all changes, prints each event as it comes, and leaves in
 // good order on Ctrl-C. With --busy a second session changes tickets meanwhile, so that there is something
 // to see.
-#include <comgui/comgui.h>
+#include "examples/ServerSession.h"
 
 #include <chrono>
 #include <condition_variable>
 #include <csignal>
 #include <cstdio>
 #include <cstdlib>
-#include <future>
+#include <memory>
 #include <mutex>
 #include <optional>
 #include <string>
@@ -18,19 +18,17 @@
 #include <wx/datetime.h>
 #include <wx/init.h>
 
+char const ProgramName[] = "watch_tickets";
+
 namespace
 {
 constexpr int JobType = 3;
 constexpr int WatchedTypes[] = {0, 2, 3, 7, 12, 17};
 constexpr char const* EveryKey[] = {nullptr};
-constexpr int Stamp = 20260101;  // a host's own mark; the plug-in only carries it
 
 struct OPTIONS
 {
-    wxString user = "admin";
-    wxString password = "admin";
-    wxString host = "localhost";
-    long port = 50000;
+    SERVER server;
     long events = 0;  // leave after so many; 0: on Ctrl-C only
     bool busy = false;
 };
@@ -42,17 +40,11 @@ std::optional<int> Parse(int argc, char** argv, OPTIONS& options)
     parser.SetLogo("Prints what changes in the tickets of a server, until Ctrl-C.");
     parser.AddSwitch("h", "help", "show this text", wxCMD_LINE_OPTION_HELP);
     parser.AddSwitch("b", "busy", "change tickets meanwhile, in a second session (as operator)");
-    parser.AddOption("u", "user", "log in as this user (admin)");
-    parser.AddOption("p", "password", "with this password (admin)");
-    parser.AddOption("s", "server", "at this host (localhost)");
-    parser.AddOption("o", "port", "and port (50000)", wxCMD_LINE_VAL_NUMBER);
+    SERVER::AddOptions(parser);
     parser.AddOption("n", "events", "leave after so many events", wxCMD_LINE_VAL_NUMBER);
     if (int const result = parser.Parse(); result != 0)
         return result < 0 ? 0 : 1;  // negative: that was --help
-    parser.Found("user", &options.user);
-    parser.Found("password", &options.password);
-    parser.Found("server", &options.host);
-    parser.Found("port", &options.port);
+    options.server.TakeOptions(parser);
     parser.Found("events", &options.events);
     options.busy = parser.Found("busy");
     if (options.events < 0)
@@ -61,27 +53,6 @@ std::optional<int> Parse(int argc, char** argv, OPTIONS& options)
         return 1;
     }
     return std::nullopt;
-}
-
-bool Fail(char const* what, int code)
-{
-    std::fprintf(stderr, "watch_tickets: %s (the plug-in's code: %d)\n", what, code);
-    return false;
-}
-
-// One session by a record of the host's own. calloc, since a record that is logged in becomes the manager's.
-TLogin* NewRecord(char const* user, char const* password, OPTIONS const& options)
-{
-    auto* const login = static_cast<TLogin*>(std::calloc(1, sizeof(TLogin)));
-    if (!login)
-        std::abort();
-    login->nSize = sizeof(TLogin);
-    login->iGUINotificationID = -1;
-    stracpy(login->szUser, user, sizeof login->szUser);
-    stracpy(login->szPassword, password, sizeof login->szPassword);
-    stracpy(login->szServerHost, options.host.utf8_str(), sizeof login->szServerHost);
-    login->iServerPort = static_cast<int>(options.port);
-    return login;
 }
 
 std::string ValueOf(NotifData const& data)
@@ -128,24 +99,13 @@ private:
     long m_printed = 0;
 };
 
-// The library's receiver deletes itself at its end; this one tells when.
-class Receiver : public ReceiverThread
-{
-public:
-    explicit Receiver(std::promise<void>& ended) : m_ended(ended) {}
-    ~Receiver() override { m_ended.set_value(); }
-
-private:
-    std::promise<void>& m_ended;
-};
-
 // A second session of this program, which works on tickets. It uses the slots of its container alone, since
 // the manager itself is for one thread.
 class BusySession
 {
 public:
-    BusySession(ComGUIManager& manager, OPTIONS const& options)
-        : m_manager(manager), m_login(NewRecord("operator", "operator", options))
+    BusySession(ComGUIManager& manager, SERVER const& server)
+        : m_manager(manager), m_login(NewRecord("operator", "operator", server))
     {
     }
     BusySession(BusySession const&) = delete;
@@ -239,17 +199,6 @@ private:
     sigset_t m_signals;
 };
 
-bool LogIn(ComGUIManager& manager, TLogin* login)
-{
-    if (!manager.IsServerOnline(login))
-        return Fail("no server answers there", -2005);
-    if (int const result = manager.Initialize(login, Stamp); result != 0)
-        return Fail("cannot prepare a session", result);
-    if (int const result = manager.Login(login); result != 0)
-        return Fail("the server refuses the login", result);
-    return manager.GetClientContainer() || Fail("the session has no tickets", 0);
-}
-
 bool Subscribe(ComGUIManager& manager, TLogin* login)
 {
     if (int const result = manager.SetCallback(login, nullptr); result != 0)
@@ -264,21 +213,14 @@ int Watch(ComGUIManager& manager, TLogin* login, OPTIONS const& options, EndSign
     if (!Subscribe(manager, login))
         return 1;
     Printer printer(options.events);
-    auto const subscription = CEventManager::GetInstance()->Subscribe(
-        [&](wxEvent& event)
-        {
-            if (auto const* const notified = dynamic_cast<ServerNotificationEvent*>(&event))
-                printer.Print(*notified);
-        });
-    std::promise<void> ended;
-    auto* const receiver = new Receiver(ended);
-    receiver->Run();
+    auto receiver =
+        std::make_unique<EventReceiver>([&](ServerNotificationEvent const& event) { printer.Print(event); });
 
-    BusySession busy(manager, options);
+    BusySession busy(manager, options.server);
     bool const started = !options.busy || busy.Start();
     if (started)
     {
-        std::printf("Watching %s as %s; Ctrl-C ends it.\n", options.host.utf8_string().c_str(),
+        std::printf("Watching %s as %s; Ctrl-C ends it.\n", options.server.host.utf8_string().c_str(),
                     manager.GetCurrentlyLoggedUser().utf8_string().c_str());
         std::fflush(stdout);
         end.Wait();
@@ -287,9 +229,7 @@ int Watch(ComGUIManager& manager, TLogin* login, OPTIONS const& options, EndSign
     busy.Stop();
 
     // The order in which a host leaves: receiver, notifications, session.
-    receiver->ShutDown();
-    ended.get_future().wait();
-    CEventManager::GetInstance()->Unsubscribe(subscription);
+    receiver.reset();
     for (int const type : WatchedTypes)
         manager.DisableNotifications(login, type);
     return started ? 0 : 1;
@@ -310,16 +250,10 @@ int main(int argc, char** argv)
         return *status;
 
     ComGUIManager* const manager = ComGUIManager::GetInstance();
-    if (!hSTicketInstance)
-    {
-        wxString path;
-        UtilityObjects::GetPlugInsPath(path, L"" COMGUI_BUNDLE_NAME);
-        std::fprintf(stderr,
-                     "watch_tickets: cannot open the communication plug-in %s: build or install it there\n",
-                     path.utf8_string().c_str());
+    if (!IsPlugInThere())
         return 1;
-    }
-    TLogin* const login = NewRecord(options.user.utf8_str(), options.password.utf8_str(), options);
+    TLogin* const login =
+        NewRecord(options.server.user.utf8_str(), options.server.password.utf8_str(), options.server);
     if (!LogIn(*manager, login))
         return 1;
     int const status = Watch(*manager, login, options, end);

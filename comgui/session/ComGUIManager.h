@@ -25,6 +25,7 @@
 #include "comgui/ticket/PARAM_TYPE.h"
 #include "comgui/ticket/STRINGCACHE.h"
 #include <list>
+#include <string>
 #include <wx/arrstr.h>
 #include <wx/dynarray.h>
 #include <wx/list.h>
@@ -32,6 +33,8 @@
 #include <wx/thread.h>
 
 struct __CFBundle;
+struct TCommandRecord;
+struct TJobIdentification;
 class NotifData;
 class clFOLDER_VARIABLES;
 
@@ -109,6 +112,10 @@ public:
     // system ticket's file, "tickets\\SYS_0000.xml" in the current folder, and keeps it in the record and as
     // the next local port of InitializeBackward. -1 where there is no such file.
     int IsAliveBackward(TLogin* login);
+
+    // Whether the server answers the session that is logged in: 0 or -2005. Both arguments are ignored.
+    int IsAlive(char*, int);
+    bool IsServerOnline();
 
     // --- Containers --------------------------------------------------------------------------------------
     // The plug-in's, and null if it has none. What GetClientContainer finds is the one that operations
@@ -195,6 +202,38 @@ public:
     // Appends a text to a list that does not hold it yet, in this letter case. 0 if it does.
     int AddStringToStringListLocal(wxString path, char const* key, wxString value);
 
+    // --- Commands, files and jobs ------------------------------------------------------------------------
+    // What the server is asked for beside its tickets. Texts are UTF-8. The plug-in is done with all that it
+    // was given when the call returns, and is asked logged in or not; its code comes back.
+    //
+    // Any command by its name; names are not checked. data: size bytes, a TCommandRecord for a remote
+    // command. With "local.set.previewfolder" and "local.set.thumbnailfolder" the first form takes the length
+    // of data, a text with its zero byte, for size. A null login is the implicit session.
+    int SendCommand(char* command, int size, void* data);
+    int SendCommand(TLogin* login, char* command, int size, void* data);
+
+    // Files to the server, and from it. The plug-in knows which of the two paths is the one on this side, and
+    // how one on the server is written. The Sync forms wait for the end.
+    int PutFile(char*, char*);
+    int PutFile(TLogin* login, char*, char*);
+    int PutFileSync(char*, char*);
+    int GetFile(char*, char*);
+    int GetFile(TLogin* login, char*, char*);
+    int GetFileSync(char*, char*);
+
+    // Sends the file of that local path as a job of that name.
+    int SendJob(TJobIdentification* job, char* path, char* name);
+    int SendJob(TLogin* login, TJobIdentification* job, char* path, char* name);
+
+    // Announce a job and send it. The numbers go to the server as they are, and it says what they mean.
+    // PrepareJob gives the server's answer, or -1 if the command failed; UploadJob gives 1 if the job was
+    // sent and 0 if not. A negative c is left out.
+    int PrepareJob(std::string path, int a, int b, int c, int d, int e);
+    int UploadJob(std::string path, int a, unsigned int b, int c, int d);
+
+    // What stands behind the last slash or backslash; the whole path if it has neither.
+    static std::string LeafName(std::string const& path);
+
     // --- Notifications -----------------------------------------------------------------------------------
     // Tells the plug-in to call fGUI2NOTIFICATION with pUser, and gets a notification id for it. The
     // plug-in's code, unless told otherwise. The first form faults without a plug-in; the second first
@@ -228,6 +267,8 @@ private:
                                       int& notificationId);
     COMGUI_LOCAL int LogoutRecord(TLogin* login, bool& loggedIn, bool& initialized,
                                   unsigned int& portCounter);
+
+    COMGUI_LOCAL int SendRecord(char const* command, TCommandRecord& record);
 
     COMGUI_LOCAL static ComGUIManager* m_pInstance;
 

@@ -1,6 +1,11 @@
 #include "standin/module/Commands.h"
 
+#include "comgui/session/TCommandRecord.h"
 #include "standin/module/ModuleCodes.h"
+#include "standin/server/JobIntake.h"
+#include "standin/server/PartFile.h"
+#include "standin/server/SiteFiles.h"
+#include <algorithm>
 #include <cstring>
 
 namespace standin
@@ -40,14 +45,80 @@ int SetCallback(Container const& container, STICKET_ACCESS const* ticket)
                          });
     return registered ? MODULE_DONE : MODULE_UNKNOWN_SESSION;
 }
+
+TCommandRecord* RecordIn(int size, void* data)
+{
+    constexpr unsigned Magic = 0x49494949;
+    auto* const record = static_cast<TCommandRecord*>(data);
+    bool const isRecord = record && size == sizeof *record && record->nMagic == Magic;
+    return isRecord && record->nSize == sizeof *record ? record : nullptr;
+}
+
+int IsAlive(Container const&, TCommandRecord& record)
+{
+    record.iResult = 0;
+    return MODULE_DONE;
+}
+
+// The name of the job's file comes as $(JOB)/NAME. iArgA is the job's queue, iArgC the number of copies.
+int PrepareJob(Container const& container, TCommandRecord& record)
+{
+    record.iResult = -1;
+    constexpr std::string_view Folder = "$(JOB)/";
+    std::string_view const text(record.szText2, strnlen(record.szText2, sizeof record.szText2));
+    if (!text.starts_with(Folder))
+    {
+        Report("a job was refused: its file is to be $(JOB)/NAME, not " + ForMessages(text));
+        return MODULE_PATH_REFUSED;
+    }
+    JobIntake::Announcement announcement;
+    announcement.name = text.substr(Folder.size());
+    announcement.isCut = text.size() == sizeof record.szText2;
+    announcement.queue = record.iArgA;
+    announcement.copies = record.iArgC;
+    return container.Server().Jobs().Prepare(container.Session(), announcement, record.iResult);
+}
+
+int SetFolder(Container const& container, Session::ClientFolder which, int size, char const* text)
+{
+    if (!text || size <= 0)
+        return MODULE_INVALID_ARGUMENT;
+    std::string const name(text, strnlen(text, static_cast<std::size_t>(size)));
+    auto const isControl = [](unsigned char byte) { return byte < 0x20 || byte == 0x7F; };
+    std::filesystem::path const folder = name;
+    if (!folder.is_absolute() || std::any_of(name.begin(), name.end(), isControl))
+    {
+        Report(ForMessages(name) + ": no absolute path of a folder");
+        return MODULE_PATH_REFUSED;
+    }
+    std::error_code error;
+    if (!std::filesystem::is_directory(folder, error))
+    {
+        Report(name + ": no folder; make it first");
+        return MODULE_NOT_A_FILE;
+    }
+    container.Session().SetFolder(which, folder);
+    return MODULE_DONE;
+}
 }  // namespace
 
-int RunCommand(Container const& container, char const* command, void* data)
+int RunCommand(Container const& container, char const* command, int size, void* data)
 {
     if (!command)
         return MODULE_INVALID_ARGUMENT;
-    if (std::strcmp(command, "local.set.callback") == 0)
+    std::string_view const name = command;
+    if (name == "local.set.callback")
         return SetCallback(container, static_cast<STICKET_ACCESS const*>(data));
-    return MODULE_NOT_SUPPORTED;
+    if (name == "local.set.previewfolder")
+        return SetFolder(container, Session::PreviewFolder, size, static_cast<char const*>(data));
+    if (name == "local.set.thumbnailfolder")
+        return SetFolder(container, Session::ThumbnailFolder, size, static_cast<char const*>(data));
+    auto const work = name == "remote.system.isalive" ? IsAlive
+                      : name == "remote.job.prepare"  ? PrepareJob
+                                                      : nullptr;
+    if (!work)
+        return MODULE_NOT_SUPPORTED;
+    TCommandRecord* const record = RecordIn(size, data);
+    return record ? work(container, *record) : MODULE_INVALID_ARGUMENT;
 }
 }  // namespace standin

@@ -77,6 +77,12 @@ bool SetPartial(Container& container, TicketAddress address, void* arg)
     return true;
 }
 
+bool HandOutFolders(Container& container, TicketAddress address, void* arg)
+{
+    bool const isOfTheContainer = address == TicketAddress{TICKET_ID_NONE, TICKET_ID_NONE};
+    return isOfTheContainer && !container.Session().Ended() && container.Folders().HandOut(arg);
+}
+
 int OnOperation(void* instance, int type, int id, TICKET_OP op, void* arg)
 {
     return Slot(instance,
@@ -94,6 +100,8 @@ int OnOperation(void* instance, int type, int id, TICKET_OP op, void* arg)
                         return container.Server().Delete(container.Session(), {type, id});
                     case MTICKET_OP_CLOSE:  // whatever the flag says: there is one way of closing
                         return container.Tickets().Close({type, id});
+                    case MTICKET_OP_FOLDER_VARIABLES:
+                        return HandOutFolders(container, {type, id}, arg);
                     default:
                         return false;
                     }
@@ -116,7 +124,7 @@ bool Walk(Container& container, MWALKTICKETS_ACTION action, void* context, int t
             break;
         if (birth == NoBirth)
             continue;
-        OpenTicket ticket(server, container.Session(), {type, id}, birth);
+        OpenTicket ticket(server, container.Session(), container.Folders(), {type, id}, birth);
         if (!action(context, type, id, ticket.Access()))
             break;
     }
@@ -158,7 +166,8 @@ STICKET_ACCESS const* OnCreate(void* instance, int type, int id, char const* con
 }  // namespace
 
 Container::Container(TicketServer& server, std::shared_ptr<standin::Session> session)
-    : m_server(server), m_session(std::move(session)), m_tickets(server, *m_session)
+    : m_server(server), m_session(std::move(session)), m_folders(server),
+      m_tickets(server, *m_session, m_folders)
 {
     m_access.Instance = this;
     m_access.MGETPARAMETER = OnGet;

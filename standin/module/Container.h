@@ -19,11 +19,13 @@ public:
     MTICKET_ACCESS const* Access() const { return &m_access; }
     TicketServer& Server() const { return m_server; }
     standin::Session& Session() const { return *m_session; }
+    FolderTranslator& Folders() { return m_folders; }
     OpenTickets& Tickets() { return m_tickets; }
 
 private:
     TicketServer& m_server;
     std::shared_ptr<standin::Session> const m_session;
+    FolderTranslator m_folders;
     OpenTickets m_tickets;
     MTICKET_ACCESS m_access{};
 };

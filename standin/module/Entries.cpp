@@ -7,6 +7,7 @@
 #include "standin/module/ModuleCodes.h"
 #include "standin/module/SiteServer.h"
 #include "standin/module/TicketData.h"
+#include "standin/module/Transfers.h"
 #include <cstdio>
 #include <cstring>
 #include <strings.h>
@@ -36,11 +37,6 @@ int SessionEntry(void* hInstance, void* hSession, Work const& work) noexcept
                      Container const* const container = Handles::Get().SessionOf(hSession);
                      return container ? work(*container) : MODULE_UNKNOWN_SESSION;
                  });
-}
-
-int NotSupported(void* hInstance, void* hSession) noexcept
-{
-    return SessionEntry(hInstance, hSession, [](Container const&) { return MODULE_NOT_SUPPORTED; });
 }
 
 bool IsValid(TLogin const* login) { return login && login->nSize == sizeof(TLogin); }
@@ -134,6 +130,7 @@ int LogIn(TLogin& login)
         if (!session)
             return MODULE_LOGIN_REFUSED;
         FillIn(login, session->Who(), Handles::Get().NewSession(*server, session));
+        session->SetEndPoint(login.szLocalEndPoint);
         return MODULE_DONE;
     }
     catch (StorageError const& error)
@@ -176,17 +173,24 @@ int GetTicketData(void* hInstance, void* hSession, int type, int id, int format,
                         });
 }
 
-int SendCommand(void* hInstance, void* hSession, char const* command, int, void* data)
+int SendCommand(void* hInstance, void* hSession, char const* command, int size, void* data)
 {
     return SessionEntry(hInstance, hSession,
-                        [&](Container const& container) { return RunCommand(container, command, data); });
+                        [&](Container const& container)
+                        { return RunCommand(container, command, size, data); });
 }
 
-int TransferFile(void* hInstance, void* hSession, char*, char*) { return NotSupported(hInstance, hSession); }
-
-int SendJob(void* hInstance, void* hSession, TJobIdentification*, char*, char*)
+template <int (*Work)(Container const&, char const*, char const*)>
+int TransferFile(void* hInstance, void* hSession, char* source, char* target)
 {
-    return NotSupported(hInstance, hSession);
+    return SessionEntry(hInstance, hSession,
+                        [&](Container const& container) { return Work(container, source, target); });
+}
+
+int SendJobFile(void* hInstance, void* hSession, TJobIdentification* record, char* path, char* name)
+{
+    return SessionEntry(hInstance, hSession,
+                        [&](Container const& container) { return SendJob(container, record, path, name); });
 }
 
 STICKET_ACCESS const* CreateTicket(char const* path)
@@ -214,12 +218,12 @@ void FillEntries(ComGUIModuleInterface& table)
     table.GetClientContainerEntry = GetClientContainer;
     table.GetTicketDataEntry = GetTicketData;
     table.SendCommandEntry = SendCommand;
-    table.PutFileEntry = TransferFile;
-    table.GetFileEntry = TransferFile;
-    table.SendJobEntry = SendJob;
-    table.PutFileSyncEntry = TransferFile;
+    table.PutFileEntry = TransferFile<BeginPutFile>;
+    table.GetFileEntry = TransferFile<BeginGetFile>;
+    table.SendJobEntry = SendJobFile;
+    table.PutFileSyncEntry = TransferFile<PutFile>;
     table.STicketFactory = &ticketFactory;
-    table.GetFileSyncEntry = TransferFile;
+    table.GetFileSyncEntry = TransferFile<GetFile>;
     table.UninitializeAsyncEntry = Uninitialize;
 }
 }  // namespace standin

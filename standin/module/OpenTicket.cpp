@@ -63,6 +63,10 @@ void const* OpenTicket::WordOf(WalkedValue const& value, BIN_STRING& binary)
 bool OpenTicket::Option(int code, void* out)
 {
     bool const isThere = !m_session.Ended() && m_server.BirthOf(m_address) == Which() && Which() != NoBirth;
-    return isThere && code == STICKET_OP_WHOAMI && TellWhoAmI(m_address, out);
+    if (!isThere)
+        return false;
+    if (code == STICKET_OP_FOLDER_VARIABLES)
+        return m_folders.HandOut(out);
+    return code == STICKET_OP_WHOAMI && TellWhoAmI(m_address, out);
 }
 }  // namespace standin

@@ -3,6 +3,7 @@
 // the table.
 #pragma once
 
+#include "standin/module/FolderTranslator.h"
 #include "standin/module/TicketTable.h"
 #include "standin/server/TicketServer.h"
 #include <unordered_set>
@@ -12,9 +13,10 @@ namespace standin
 class OpenTicket : private TicketSubject
 {
 public:
-    // Server and session outlive it.
-    OpenTicket(TicketServer& server, Session const& session, TicketAddress address, Birth birth)
-        : m_server(server), m_session(session), m_address(address), m_birth(birth)
+    // Server, session and the session's translator outlive it.
+    OpenTicket(TicketServer& server, Session const& session, FolderTranslator& folders, TicketAddress address,
+               Birth birth)
+        : m_server(server), m_session(session), m_folders(folders), m_address(address), m_birth(birth)
     {
     }
 
@@ -36,6 +38,7 @@ private:
 
     TicketServer& m_server;
     Session const& m_session;
+    FolderTranslator& m_folders;
     TicketAddress const m_address;
     std::atomic<Birth> m_birth;
 

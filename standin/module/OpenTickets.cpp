@@ -16,7 +16,7 @@ STICKET_ACCESS const* OpenTickets::Open(TicketAddress address)
         entry.openings = 0;
     }
     if (!entry.ticket)
-        entry.ticket = std::make_unique<OpenTicket>(m_server, m_session, address, birth);
+        entry.ticket = std::make_unique<OpenTicket>(m_server, m_session, m_folders, address, birth);
     entry.ticket->StandFor(birth);
     ++entry.openings;
     return entry.ticket->Access();

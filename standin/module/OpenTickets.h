@@ -11,7 +11,10 @@ namespace standin
 class OpenTickets
 {
 public:
-    OpenTickets(TicketServer& server, Session const& session) : m_server(server), m_session(session) {}
+    OpenTickets(TicketServer& server, Session const& session, FolderTranslator& folders)
+        : m_server(server), m_session(session), m_folders(folders)
+    {
+    }
 
     // Null if there is no such ticket, or no session any more.
     STICKET_ACCESS const* Open(TicketAddress address);
@@ -28,6 +31,7 @@ private:
 
     TicketServer& m_server;
     Session const& m_session;
+    FolderTranslator& m_folders;
     std::mutex m_lock;
     std::map<TicketAddress, Entry> m_open;
     std::vector<std::unique_ptr<OpenTicket>> m_outlived;  // open when their ticket was made anew

@@ -2,6 +2,7 @@
 
 #include "standin/module/Guard.h"
 #include "standin/server/Site.h"
+#include "standin/server/TransferService.h"
 #include <dlfcn.h>
 #include <filesystem>
 #include <map>
@@ -36,15 +37,19 @@ OpenSite::OpenSite(std::filesystem::path const& folder)
 using Sites = std::map<std::filesystem::path, std::unique_ptr<OpenSite>>;
 
 // At the end of the process the clients' callbacks go before this module does; no thread of ours may call
-// them then. A callback that hangs holds up the end for a moment only.
-struct EndOfNotifications
+// them then. A callback that hangs holds up the end for a moment only. Transfers are cut, so that they take
+// their beginnings of files away.
+struct EndOfWork
 {
     Sites const& sites;
 
-    ~EndOfNotifications()
+    ~EndOfWork()
     {
         for (auto const& [folder, site] : sites)
+        {
+            site->server.Transfers().Stop(std::chrono::seconds(1));
             site->server.Notifications().Stop(std::chrono::seconds(1));
+        }
     }
 };
 
@@ -53,7 +58,7 @@ TicketServer& ServerOf(std::filesystem::path const& folder)
     // Never destroyed: containers may be used while the process comes to its end.
     static auto& lock = *new std::mutex;
     static auto& sites = *new Sites;
-    static EndOfNotifications const atExit{sites};
+    static EndOfWork const atExit{sites};
     std::lock_guard const guard(lock);
     auto const known = sites.find(folder);
     if (known != sites.end())

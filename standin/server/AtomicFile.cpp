@@ -1,5 +1,6 @@
 #include "standin/server/AtomicFile.h"
 
+#include "standin/server/Descriptor.h"
 #include <algorithm>
 #include <atomic>
 #include <cerrno>
@@ -38,23 +39,6 @@ char const* RemedyOf(int error)
         return "check the path and the disk, then try again";
     }
 }
-
-class Descriptor
-{
-public:
-    explicit Descriptor(int number) : m_number(number) {}
-    ~Descriptor()
-    {
-        if (m_number >= 0)
-            close(m_number);
-    }
-    Descriptor(Descriptor const&) = delete;
-    Descriptor& operator=(Descriptor const&) = delete;
-    int Number() const { return m_number; }
-
-private:
-    int m_number;
-};
 
 // The new file until it has taken the old one's place.
 class Temporary

@@ -120,6 +120,7 @@ bool NotificationService::RemoveOne(Session const& session, Lock& lock)
         return false;
     auto const listener = *found;
     m_listeners.erase(found);
+    listener->gone = true;
     m_subscriptions -= listener->subscriptions.size();
     listener->subscriptions.clear();
     Withdraw(*listener);
@@ -161,7 +162,8 @@ void NotificationService::Withdraw(Listener& listener)
     std::erase_if(m_waiting,
                   [&](Message& message)
                   {
-                      if (message.listener.get() != &listener)
+                      bool const isSwitched = listener.gone || message.kind != TransferEnded;
+                      if (message.listener.get() != &listener || !isSwitched)
                           return false;
                       Unqueue(message);
                       auto const isUnwanted = [&](ChangedParameter const& change)
@@ -223,6 +225,25 @@ void NotificationService::Post(NotificationKind kind, TicketAddress ticket,
     }
 }
 
+void NotificationService::Tell(unsigned long long session, NotificationKind kind, TicketAddress ticket,
+                               ChangedParameters changes) noexcept
+{
+    try
+    {
+        std::lock_guard const lock(m_lock);
+        auto const found = std::find_if(m_listeners.begin(), m_listeners.end(),
+                                        [&](auto const& listener) { return listener->session == session; });
+        if (found == m_listeners.end() || m_stopped)
+            return;
+        Append({*found, kind, ticket, std::move(changes), 0});
+        m_work.notify_one();
+    }
+    catch (std::exception const& error)
+    {
+        std::fprintf(stderr, "a notification is lost: %s\n", error.what());
+    }
+}
+
 void NotificationService::Queue(std::shared_ptr<Listener> const& listener, NotificationKind kind,
                                 TicketAddress ticket, ChangedParameters const& changes)
 {
@@ -234,6 +255,12 @@ void NotificationService::Queue(std::shared_ptr<Listener> const& listener, Notif
             message.changes.push_back(Copy(change));
     if (message.changes.empty() && !changes.empty())
         return;
+    Append(std::move(message));
+}
+
+void NotificationService::Append(Message message)
+{
+    auto const listener = message.listener;
     message.weight = WeightOf(message.changes);
     if (listener->pending == 0 || listener->pending + message.weight <= PendingLimit)
     {

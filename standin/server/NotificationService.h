@@ -25,13 +25,14 @@ enum NotificationKind : int
     ParametersChanged = 1,
     TicketCreated = 4,
     TicketDeleted = 5,
+    TransferEnded = 6,
 };
 
 // What a callback is told; all of it dies when the callback returns.
 struct Notification
 {
     NotificationKind kind;
-    TicketAddress ticket;
+    TicketAddress ticket;  // of a transfer: type 0, and its result in the place of the id
     int id;                // under which it was asked for
     SETMULTIPAR* records;  // of changed parameters, ended by a null key; null for tickets as a whole
 };
@@ -82,6 +83,11 @@ public:
     // Leaves word of one change. Parameters are put in such an order that those of one key are neighbours.
     void Post(NotificationKind kind, TicketAddress ticket, ChangedParameters changes = {}) noexcept;
 
+    // Leaves word for one session, whatever it has switched on; nothing if it has not registered. The keys
+    // outlive the service.
+    void Tell(unsigned long long session, NotificationKind kind, TicketAddress ticket,
+              ChangedParameters changes) noexcept;
+
     // Begins no further callback, for good, and waits for a running one, but no longer than told.
     void Stop(std::chrono::milliseconds patience);
 
@@ -95,6 +101,7 @@ private:
         std::map<TicketAddress, KeyFilter> subscriptions{};
         std::size_t pending = 0;
         bool dropping = false;
+        bool gone = false;
 
         bool Wants(TicketAddress ticket) const;
         bool Wants(TicketAddress ticket, std::string_view key) const;
@@ -112,6 +119,7 @@ private:
     Listener* Find(Session const& session, int id) const;
     bool RemoveOne(Session const& session, Lock& lock);
     void Withdraw(Listener& listener);
+    void Append(Message message);
     void Unqueue(Message& message);
     void WaitFor(int id, Lock& lock);
     void Queue(std::shared_ptr<Listener> const& listener, NotificationKind kind, TicketAddress ticket,

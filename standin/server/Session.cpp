@@ -12,6 +12,31 @@ void Session::Limit(TicketAddress address, KeyFilter keys)
     m_limited.store(!m_limits.empty(), std::memory_order_release);
 }
 
+void Session::SetEndPoint(std::string endPoint)
+{
+    std::lock_guard const lock(m_lock);
+    m_endPoint = std::move(endPoint);
+}
+
+std::string Session::EndPoint() const
+{
+    std::lock_guard const lock(m_lock);
+    return m_endPoint;
+}
+
+void Session::SetFolder(ClientFolder which, std::filesystem::path folder)
+{
+    std::lock_guard const lock(m_lock);
+    m_folders[which] = std::move(folder);
+}
+
+std::filesystem::path Session::Folder(ClientFolder which) const
+{
+    std::lock_guard const lock(m_lock);
+    auto const folder = m_folders.find(which);
+    return folder == m_folders.end() ? std::filesystem::path() : folder->second;
+}
+
 std::shared_ptr<KeyFilter const> Session::LimitOf(TicketAddress address) const
 {
     if (!m_limited.load(std::memory_order_acquire))

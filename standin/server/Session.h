@@ -5,6 +5,7 @@
 #include "standin/server/KeyFilter.h"
 #include "standin/server/Storage.h"
 #include <atomic>
+#include <filesystem>
 #include <map>
 #include <memory>
 #include <mutex>
@@ -26,6 +27,19 @@ public:
     bool Ended() const { return m_ended.load(std::memory_order_acquire); }
     bool End() { return !m_ended.exchange(true, std::memory_order_acq_rel); }  // false if it had ended before
 
+    // Where the client is, as "address:port"; empty until it is told.
+    void SetEndPoint(std::string endPoint);
+    std::string EndPoint() const;
+
+    // The client's own folders for what the server draws of its jobs; empty until they are told.
+    enum ClientFolder
+    {
+        PreviewFolder,
+        ThumbnailFolder,
+    };
+    void SetFolder(ClientFolder which, std::filesystem::path folder);
+    std::filesystem::path Folder(ClientFolder which) const;
+
     // Limits what the session reads, walks over and writes of whatever ticket has that address. A filter that
     // selects every key lifts the limit.
     void Limit(TicketAddress address, KeyFilter keys);
@@ -40,6 +54,8 @@ private:
 
     mutable std::mutex m_lock;
     std::map<TicketAddress, std::shared_ptr<KeyFilter const>> m_limits;
+    std::string m_endPoint;
+    std::map<ClientFolder, std::filesystem::path> m_folders;
     std::atomic<bool> m_limited{false};  // spares sessions without limits the lock
 };
 }  // namespace standin

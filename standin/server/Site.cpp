@@ -3,6 +3,7 @@
 #include "standin/server/AtomicFile.h"
 #include "standin/server/Seed.h"
 #include "standin/server/SiteFiles.h"
+#include "standin/server/SiteFolders.h"
 #include "standin/server/TicketXml.h"
 #include <cstdlib>
 #include <string>
@@ -69,6 +70,7 @@ SqliteStorage OpenStorage(std::filesystem::path const& folder, std::filesystem::
     auto const first = [&seed, &folder, &shippedSeed]
     {
         seed = SeedOfSite(folder, shippedSeed);
+        SetJobFoldersAside(folder / "job");  // the jobs that they belong to are gone
         return seed.Content();
     };
     try
@@ -114,7 +116,9 @@ Site::Site(std::filesystem::path const& folder, std::filesystem::path const& see
     for (char const* const file : {SeedFile, SystemTicketFile})
         RemoveLeftovers(m_folder / file);
     KeepInstallFolder();
+    KeepFoldersReadable();
     MakeFolders();
+    SweepTransfers(m_storage, m_folder);
     MirrorSystemTicket();
 }
 
@@ -137,6 +141,17 @@ void Site::KeepInstallFolder()
     m_storage.Apply({{Change::CreateTicket, SystemTicket},
                      {Change::DeleteKey, SystemTicket, InstallFolderKey},
                      {Change::PutValue, SystemTicket, InstallFolderKey, 0, value}});
+}
+
+void Site::KeepFoldersReadable()
+{
+    FolderSettings const settings = FoldersIn(m_storage);
+    for (FolderFault const& fault : FaultsOf(settings))
+    {
+        Report(m_folder.string() + ": " + fault.line);
+        m_storage.Apply({{Change::DeleteKey, SystemTicket, fault.key},
+                         {Change::PutValue, SystemTicket, fault.key, 0, fault.value}});
+    }
 }
 
 // The server's own folders, and those that the system ticket places below the site. Folders elsewhere are

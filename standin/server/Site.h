@@ -7,6 +7,9 @@
 //   tickets/       SYS_0000.xml, the system ticket for programs that read a local ticket file
 //   temp/ job/ upload/ preview/ log/ ...   the folders that the system ticket names
 //
+// A folder of the system ticket that would hold up its readers for good is switched off, and told too. What
+// processes that were killed have left of files and jobs on their way goes when the site is opened.
+//
 // What turns out damaged is told on stderr and set aside under NAME.damaged-DATE-TIME, never deleted.
 // For one thread at a time, as its storage is.
 #pragma once
@@ -41,6 +44,7 @@ public:
 private:
     Site(std::filesystem::path const& folder, std::filesystem::path const& seedFile);
     void KeepInstallFolder();
+    void KeepFoldersReadable();
     void MakeFolders();
 
     std::filesystem::path m_folder;  // absolute

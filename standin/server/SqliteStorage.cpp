@@ -243,6 +243,9 @@ void SqliteStorage::PrepareStatements()
         Prepare("DELETE FROM parameter WHERE ticket_type = ? AND ticket_id = ? AND key = ? AND pos = ?");
     m_putValue = Prepare("INSERT INTO parameter VALUES (?, ?, ?, ?, ?, ?) ON CONFLICT DO UPDATE "
                          "SET value_type = excluded.value_type, value = excluded.value");
+    // Ticket by ticket, each by the index, rather than over all parameters.
+    m_ticketsWith = Prepare("SELECT type, id FROM ticket WHERE type = ?1 AND EXISTS (SELECT 1 FROM parameter "
+                            "WHERE ticket_type = ?1 AND ticket_id = ticket.id AND key = ?2) ORDER BY id");
     m_tickets = Prepare("SELECT type, id FROM ticket ORDER BY type, id");
 }
 
@@ -250,6 +253,16 @@ std::vector<TicketAddress> SqliteStorage::Tickets()
 {
     std::vector<TicketAddress> tickets;
     Run run(*this, m_tickets);
+    while (run.Step())
+        tickets.push_back({run.Int(0), run.Int(1)});
+    return tickets;
+}
+
+std::vector<TicketAddress> SqliteStorage::TicketsWith(int type, std::string_view key)
+{
+    std::vector<TicketAddress> tickets;
+    Run run(*this, m_ticketsWith);
+    run << type << key;
     while (run.Step())
         tickets.push_back({run.Int(0), run.Int(1)});
     return tickets;

@@ -49,6 +49,7 @@ public:
     ~SqliteStorage() override;
 
     std::vector<TicketAddress> Tickets() override;
+    std::vector<TicketAddress> TicketsWith(int type, std::string_view key) override;
     void
     Load(TicketAddress address,
          std::function<void(std::string_view key, int pos, StoredValue const& value)> const& take) override;
@@ -89,7 +90,7 @@ private:
 
     std::filesystem::path m_file;
     std::unique_ptr<sqlite3, CloseDatabase> m_database;
-    Statement m_tickets, m_load, m_findUser, m_putUser;
+    Statement m_tickets, m_ticketsWith, m_load, m_findUser, m_putUser;
     Statement m_createTicket, m_deleteTicket, m_deleteKey, m_deleteValue, m_putValue;
 };
 }  // namespace standin

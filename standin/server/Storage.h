@@ -61,6 +61,9 @@ public:
     Load(TicketAddress address,
          std::function<void(std::string_view key, int pos, StoredValue const& value)> const& take) = 0;
 
+    // The tickets of that type that have a value under the key, in ascending order.
+    virtual std::vector<TicketAddress> TicketsWith(int type, std::string_view key) = 0;
+
     // Makes all changes, in order, or none. When it returns they survive the end of the process at any
     // instant.
     virtual void Apply(std::vector<Change> const& changes) = 0;

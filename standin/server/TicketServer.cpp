@@ -1,7 +1,10 @@
 #include "standin/server/TicketServer.h"
 
+#include "standin/server/JobFolder.h"
+#include "standin/server/JobIntake.h"
 #include "standin/server/Password.h"
 #include "standin/server/TicketWrites.h"
+#include "standin/server/TransferService.h"
 #include <cstdio>
 #include <shared_mutex>
 
@@ -28,7 +31,8 @@ ChangedParameters NewsOf(TicketWrites& writes)
 }  // namespace
 
 TicketServer::TicketServer(Storage& storage, std::function<void()> systemTicketChanged)
-    : m_storage(storage), m_systemTicketChanged(std::move(systemTicketChanged))
+    : m_storage(storage), m_systemTicketChanged(std::move(systemTicketChanged)),
+      m_transfers(std::make_unique<TransferService>(*this)), m_jobs(std::make_unique<JobIntake>(*this))
 {
     auto const addresses = m_storage.Tickets();
     m_tickets.reserve(addresses.size());
@@ -41,6 +45,8 @@ TicketServer::TicketServer(Storage& storage, std::function<void()> systemTicketC
         ids.insert(ids.end(), address.id);
     }
 }
+
+TicketServer::~TicketServer() = default;
 
 std::shared_ptr<Session> TicketServer::Login(std::string const& user, std::string const& password)
 {
@@ -64,6 +70,8 @@ bool TicketServer::Logout(Session& session)
 {
     if (!session.End())
         return false;
+    m_transfers->End(session);
+    m_jobs->End(session);
     m_notifications.Remove(session);
     m_sessions.Close(session.Number());
     return true;
@@ -189,17 +197,97 @@ bool TicketServer::SetTable(Session const& session, TicketAddress address, SETMU
     Ticket* const ticket = Loaded(address, birth);
     if (!ticket)
         return false;
-    TicketWrites writes(address, *ticket, m_keys, table, limit.get());
+    return WriteHere(address, *ticket, table, limit.get());
+}
+
+bool TicketServer::WriteHere(TicketAddress address, Ticket& ticket, SETMULTIPAR* table,
+                             KeyFilter const* limit)
+{
+    std::optional<FolderSettings> folders;
+    if (address == SystemTicket)
+        folders = FoldersHere();
+    TicketWrites writes(address, ticket, m_keys, table, limit, folders ? &*folders : nullptr);
     ChangedParameters news;
     if (m_notifications.AreWanted(address))
         news = NewsOf(writes);
     if (!Store(writes.Changes()))
         return false;
-    CarryOut(*ticket, writes, news);
+    CarryOut(ticket, writes, news);
     if (!writes.Steps().empty())
         Changed(address);
     m_notifications.Post(ParametersChanged, address, std::move(news));
     return true;
+}
+
+FolderSettings TicketServer::FoldersHere()
+{
+    FolderSettings settings;
+    Ticket const* const ticket = Loaded(SystemTicket);
+    auto const take = [&](char const* key)
+    {
+        KeyValues const* const values = ticket->Find(m_keys.Find(key));
+        if (TicketValue const* const value = values ? values->At(0) : nullptr)
+            settings.Put(key, value->ToStored());
+    };
+    if (!ticket)
+        return settings;
+    take(UseFolderVariablesKey);
+    for (FolderRow const row : FolderRows)
+        take(row.key);
+    return settings;
+}
+
+FolderTable TicketServer::Folders()
+{
+    std::lock_guard const lock(m_change);
+    return FolderTable(FoldersHere().values);
+}
+
+std::optional<TicketServer::MadeTicket> TicketServer::Make(int type, SETMULTIPAR* table)
+{
+    std::lock_guard const lock(m_change);
+    TicketAddress const address{type, NextId(type)};
+    Ticket const nothing;
+    TicketWrites writes(address, nothing, m_keys, table);
+    std::vector<Change> changes{Change{Change::CreateTicket, address}};
+    changes.insert(changes.end(), writes.Changes().begin(), writes.Changes().end());
+    ChangedParameters news;
+    if (m_notifications.AreWanted(address))
+        news = NewsOf(writes);
+    if (!IsValid(address) || !Store(changes))
+        return std::nullopt;
+    ServedTicket& ticket = Insert(address);
+    CarryOut(ticket, writes, news);
+    m_notifications.Post(TicketCreated, address);
+    m_notifications.Post(ParametersChanged, address, std::move(news));
+    return MadeTicket{address, ticket.birth};
+}
+
+bool TicketServer::Write(MadeTicket const& ticket, SETMULTIPAR* table)
+{
+    std::lock_guard const lock(m_change);
+    Ticket* const found = Loaded(ticket.address, ticket.birth);
+    if (!found || !WriteHere(ticket.address, *found, table, nullptr))
+        return false;
+    for (SETMULTIPAR const* record = table; record->key; ++record)
+        if (!record->ok)
+            return false;
+    return true;
+}
+
+bool TicketServer::WhileItLasts(MadeTicket const& ticket, std::function<void()> const& work)
+{
+    std::lock_guard const lock(m_change);
+    if (!Find(ticket.address, ticket.birth))
+        return false;
+    work();
+    return true;
+}
+
+bool TicketServer::Remove(MadeTicket const& ticket)
+{
+    std::lock_guard const lock(m_change);
+    return Find(ticket.address, ticket.birth) && RemoveHere(ticket.address);
 }
 
 bool TicketServer::Store(std::vector<Change> const& changes)
@@ -234,7 +322,10 @@ void TicketServer::CarryOut(Ticket& ticket, TicketWrites& writes, ChangedParamet
 
 void TicketServer::Changed(TicketAddress address)
 {
-    if (address != SystemTicket || !m_systemTicketChanged)
+    if (address != SystemTicket)
+        return;
+    m_systemTicketChanges.fetch_add(1, std::memory_order_release);
+    if (!m_systemTicketChanged)
         return;
     try
     {
@@ -276,27 +367,37 @@ int TicketServer::CreateNext(Session const& session, int type)
     if (!IsValid({type, 0}))
         return -1;
     std::lock_guard const lock(m_change);
+    int const id = NextId(type);
+    return IsValid({type, id}) && MayWrite(session, {type, id}) && CreateHere({type, id}) ? id : -1;
+}
+
+int TicketServer::NextId(int type) const
+{
     auto const& ids = m_ids[static_cast<std::size_t>(type)];
     int id = ids.empty() ? 1 : *ids.rbegin() + 1;
     if (id > LargestId)
         for (id = 0; ids.contains(id);)
             ++id;
-    return IsValid({type, id}) && MayWrite(session, {type, id}) && CreateHere({type, id}) ? id : -1;
+    return id;
 }
 
 bool TicketServer::CreateHere(TicketAddress address)
 {
     if (Find(address) || !Store({Change{Change::CreateTicket, address}}))
         return false;
-    {
-        std::lock_guard const memory(m_memory);
-        m_ids[static_cast<std::size_t>(address.type)].insert(address.id);
-        ServedTicket& ticket = m_tickets[address];
-        ticket.loaded = true;
-        ticket.birth = ++m_newestBirth;
-    }
+    Insert(address);
     m_notifications.Post(TicketCreated, address);
     return true;
+}
+
+TicketServer::ServedTicket& TicketServer::Insert(TicketAddress address)
+{
+    std::lock_guard const memory(m_memory);
+    m_ids[static_cast<std::size_t>(address.type)].insert(address.id);
+    ServedTicket& ticket = m_tickets[address];
+    ticket.loaded = true;
+    ticket.birth = ++m_newestBirth;
+    return ticket;
 }
 
 bool TicketServer::Delete(Session const& session, TicketAddress address)
@@ -306,6 +407,11 @@ bool TicketServer::Delete(Session const& session, TicketAddress address)
     if (address.type == UserTicketType && !session.IsAdministrator())
         return false;  // a user's ticket goes with the user, and that is not the user's to decide
     std::lock_guard const lock(m_change);
+    return RemoveHere(address);
+}
+
+bool TicketServer::RemoveHere(TicketAddress address)
+{
     if (!Find(address) || !Store({Change{Change::DeleteTicket, address}}))
         return false;
     decltype(m_tickets)::node_type ticket;
@@ -318,6 +424,8 @@ bool TicketServer::Delete(Session const& session, TicketAddress address)
     for (auto& [key, values] : ticket.mapped().keys)
         values.Clear(removed);
     m_sessions.Retire(std::move(removed));
+    if (address.type == JobTicketType)  // before the next job may get the id, and with it the folder
+        RemoveJobFolder(FolderTable(FoldersHere().values), address.id);
     m_notifications.Post(TicketDeleted, address);
     return true;
 }

@@ -14,6 +14,7 @@
 #pragma once
 
 #include "comgui/ticket/SETMULTIPAR.h"
+#include "standin/server/FolderTable.h"
 #include "standin/server/NotificationService.h"
 #include "standin/server/ReadWriteLock.h"
 #include "standin/server/Session.h"
@@ -21,6 +22,7 @@
 #include "standin/server/Storage.h"
 #include "standin/server/Ticket.h"
 #include <array>
+#include <atomic>
 #include <functional>
 #include <memory>
 #include <mutex>
@@ -28,9 +30,12 @@
 
 namespace standin
 {
+inline constexpr int JobTicketType = 3;
 inline constexpr int UserTicketType = 17;
 
+class JobIntake;
 class TicketWrites;
+class TransferService;
 
 // Tells a ticket from another that had, or will have, its address. None is given twice in a server's life.
 using Birth = unsigned long long;
@@ -54,13 +59,15 @@ public:
     // every change of ticket 0/0, while no other change goes on: it may use the storage, not the server.
     // Throws StorageError.
     explicit TicketServer(Storage& storage, std::function<void()> systemTicketChanged = {});
+    ~TicketServer();  // not while a call is on its way
     TicketServer(TicketServer const&) = delete;
     TicketServer& operator=(TicketServer const&) = delete;
 
     // Null for a wrong user or password, which is not told apart. Throws StorageError.
     std::shared_ptr<Session> Login(std::string const& user, std::string const& password);
 
-    // False if it had ended before. Waits for the end of a notification callback that runs for the session.
+    // False if it had ended before. Waits for the end of a notification callback that runs for the session,
+    // and of its transfers, which are cut. Jobs that it has prepared and not sent go.
     bool Logout(Session& session);
 
     // The reads and writes are what PARAM_TYPE.h says of value words. Positions: -1 the key as a whole, 0 and
@@ -84,8 +91,31 @@ public:
     // The server's own look at a ticket, with nobody logged in.
     std::optional<int> Int(TicketAddress address, char const* key);
 
+    FolderTable Folders();
+
+    // What the server itself does to a ticket, whoever may write it. Make gives the id as CreateNext does and
+    // fills the ticket in one transaction; Write is false also when a record is refused.
+    struct MadeTicket
+    {
+        TicketAddress address;
+        Birth birth;
+    };
+    std::optional<MadeTicket> Make(int type, SETMULTIPAR* table);
+    bool Write(MadeTicket const& ticket, SETMULTIPAR* table);
+    bool Remove(MadeTicket const& ticket);
+
+    // Work that nobody may delete the ticket under; false, and nothing done, if it is gone. Changes wait
+    // meanwhile, so work must not use the server.
+    bool WhileItLasts(MadeTicket const& ticket, std::function<void()> const& work);
+
     bool Exists(TicketAddress address) const { return BirthOf(address) != NoBirth; }
     Birth BirthOf(TicketAddress address) const;  // NoBirth if there is no such ticket
+
+    // How often ticket 0/0 has changed, counted once all of a change is in memory.
+    unsigned long long SystemTicketChanges() const
+    {
+        return m_systemTicketChanges.load(std::memory_order_acquire);
+    }
 
     // The smallest id above after among the tickets of a type, -1 if there is none. Starts at after -1.
     int NextTicket(int type, int after) const;
@@ -99,6 +129,7 @@ public:
     int CreateNext(Session const& session, int type);
 
     // False where Create would refuse, for a ticket that is missing, and for type 0, which is never deleted.
+    // A job's folder goes with its ticket.
     bool Delete(Session const& session, TicketAddress address);
 
     // Hands out a ticket's values as Storage::Load does, pointers included; false if there is no such
@@ -107,6 +138,8 @@ public:
     bool Visit(Session const& session, TicketAddress address, Take const& take);
 
     NotificationService& Notifications() { return m_notifications; }
+    TransferService& Transfers() { return *m_transfers; }
+    JobIntake& Jobs() { return *m_jobs; }
 
     std::size_t RetiredTexts() const { return m_sessions.Kept(); }
 
@@ -121,16 +154,22 @@ private:
     static bool MayWrite(Session const& session, TicketAddress address);
     ServedTicket* Find(TicketAddress address, Birth birth = AnyBirth);
 
-    // m_change is held for these four. Loaded: null if missing or unreadable.
+    // m_change is held for these. Loaded: null if missing or unreadable.
     Ticket* Loaded(TicketAddress address, Birth birth = AnyBirth);
     bool Store(std::vector<Change> const& changes);
+    bool WriteHere(TicketAddress address, Ticket& ticket, SETMULTIPAR* table, KeyFilter const* limit);
     void CarryOut(Ticket& ticket, TicketWrites& writes, ChangedParameters& news);
+    int NextId(int type) const;  // may be no id at all
     bool CreateHere(TicketAddress address);
+    ServedTicket& Insert(TicketAddress address);
+    bool RemoveHere(TicketAddress address);
+    FolderSettings FoldersHere();
 
     void Changed(TicketAddress address);
 
     Storage& m_storage;
     std::function<void()> const m_systemTicketChanged;
+    std::atomic<unsigned long long> m_systemTicketChanges{0};
 
     std::mutex m_change;             // held for a change as a whole, and for every use of the storage
     mutable ReadWriteLock m_memory;  // the members below; written to only while m_change is held, too
@@ -142,5 +181,8 @@ private:
     // These have locks of their own, taken last.
     SessionRegister m_sessions;
     NotificationService m_notifications;
+
+    std::unique_ptr<TransferService> const m_transfers;  // these two use the server, and go before it
+    std::unique_ptr<JobIntake> const m_jobs;
 };
 }  // namespace standin

@@ -3,8 +3,8 @@
 namespace standin
 {
 TicketWrites::TicketWrites(TicketAddress address, Ticket const& ticket, KeyPool const& pool,
-                           SETMULTIPAR* table, KeyFilter const* limit)
-    : m_address(address), m_ticket(ticket), m_pool(pool)
+                           SETMULTIPAR* table, KeyFilter const* limit, FolderSettings* folders)
+    : m_address(address), m_ticket(ticket), m_pool(pool), m_folders(folders)
 {
     for (SETMULTIPAR* record = table; record->key; ++record)
     {
@@ -65,8 +65,23 @@ void TicketWrites::AddPut(SETMULTIPAR& record)
         Add(record, Step::Put, pos, std::move(*value));
 }
 
+bool TicketWrites::FoldersAllow(Step::Kind kind, std::string_view key, int pos, TicketValue const& value)
+{
+    if (!m_folders || !FolderSettings::Concern(key, pos))
+        return true;
+    bool const puts = kind == Step::StartAnew || kind == Step::Put;
+    FolderSettings after = *m_folders;
+    after.Put(key, puts ? value.ToStored() : StoredValue());
+    if (!after.CanBeRead())
+        return false;
+    *m_folders = std::move(after);
+    return true;
+}
+
 void TicketWrites::Add(SETMULTIPAR& record, Step::Kind kind, int pos, TicketValue value)
 {
+    if (!FoldersAllow(kind, record.key, pos, value))
+        return;
     Draft& draft = DraftOf(record.key);
     if (kind == Step::StartAnew || kind == Step::EraseKey)
     {

@@ -3,6 +3,7 @@
 #pragma once
 
 #include "comgui/ticket/SETMULTIPAR.h"
+#include "standin/server/FolderTable.h"
 #include "standin/server/KeyFilter.h"
 #include "standin/server/Storage.h"
 #include "standin/server/Ticket.h"
@@ -29,9 +30,10 @@ public:
     };
 
     // Leaves the table's ok bytes alone; a record that cannot be carried out gets no step, nor does one whose
-    // key is outside the limit.
+    // key is outside the limit. folders: as the ticket has them, if it is the system ticket; a record that
+    // would leave them such that clients cannot read them is refused, and the others go into folders.
     TicketWrites(TicketAddress address, Ticket const& ticket, KeyPool const& pool, SETMULTIPAR* table,
-                 KeyFilter const* limit = nullptr);
+                 KeyFilter const* limit = nullptr, FolderSettings* folders = nullptr);
 
     // Keys and texts of the changes lie in the table and in the steps, where they stay if the steps are
     // moved.
@@ -55,11 +57,13 @@ private:
     void AddDelete(SETMULTIPAR& record);
     void AddPut(SETMULTIPAR& record);
     void Add(SETMULTIPAR& record, Step::Kind kind, int pos, TicketValue value);
+    bool FoldersAllow(Step::Kind kind, std::string_view key, int pos, TicketValue const& value);
     void Store(Change::Kind kind, std::string_view key, int pos = 0, StoredValue const& value = {});
 
     TicketAddress m_address;
     Ticket const& m_ticket;
     KeyPool const& m_pool;
+    FolderSettings* m_folders;
     std::unordered_map<std::string_view, Draft> m_drafts;
     std::vector<Step> m_steps;
     std::vector<Change> m_changes;

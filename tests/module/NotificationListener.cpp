@@ -47,7 +47,11 @@ void LISTENER::Take(int kind, int argA, int argB, int code, SETMULTIPAR const* r
     if (++running > 1)
         overlapped = true;
     lastId = argB;
-    std::string text = kind == 1 ? "changed " : kind == 4 ? "created " : kind == 5 ? "deleted " : "? ";
+    std::string text = kind == 1   ? "changed "
+                       : kind == 4 ? "created "
+                       : kind == 5 ? "deleted "
+                       : kind == 6 ? "ended "
+                                   : "? ";
     text += std::to_string(code) + "/" + std::to_string(argA);
     std::set<std::string> keys;
     for (SETMULTIPAR const* record = records; record && record->key; ++record)

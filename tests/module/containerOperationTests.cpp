@@ -200,18 +200,15 @@ TEST_F(OpenTickets, WhoAmI_IsTypeAndId)
     EXPECT_EQ(ticket->SOPTION(ticket->Instance, STICKET_OP_WHOAMI, nullptr), 0);
 }
 
-TEST_F(OpenTickets, OtherOptionsAndTheFolderVariables_AreNotAnswered)
+TEST_F(OpenTickets, OtherOptions_AreNotAnswered)
 {
     auto const* const ticket = admin.Open(3, 1);
-    for (int const code : {-1, 0, STICKET_OP_FOLDER_VARIABLES + 0, 12, 110})
+    for (int const code : {-1, 0, 9, 12, 110})
     {
         void* out = this;
         EXPECT_EQ(ticket->SOPTION(ticket->Instance, code, &out), 0) << code;
         EXPECT_EQ(out, this);
     }
-    void* out = this;
-    EXPECT_EQ(admin.Operate(-1, -1, MTICKET_OP_FOLDER_VARIABLES, &out), 0);
-    EXPECT_EQ(out, this);
 }
 
 TEST_F(OpenTickets, OpenedAndClosedByManyThreads_StayCounted)

@@ -5,6 +5,7 @@
 
 #include "standin/server/Password.h"
 #include "standin/server/Storage.h"
+#include <algorithm>
 #include <map>
 
 class MemoryStorage : public standin::Storage
@@ -42,6 +43,18 @@ public:
         std::vector<Address> addresses;
         for (auto const& [address, values] : tickets)
             addresses.push_back(address);
+        return addresses;
+    }
+
+    std::vector<Address> TicketsWith(int type, std::string_view key) override
+    {
+        FailIfTold();
+        std::vector<Address> addresses;
+        for (auto const& [address, values] : tickets)
+            if (address.type == type &&
+                std::any_of(values.begin(), values.end(),
+                            [key](auto const& entry) { return entry.first.first == key; }))
+                addresses.push_back(address);
         return addresses;
     }
 

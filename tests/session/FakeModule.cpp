@@ -136,6 +136,40 @@ struct FAKE_ENTRIES
         return current->onCommand ? current->onCommand(command, size, data) : result;
     }
 
+    static int File(char const* entry, void* handle, void* session, char* first, char* second)
+    {
+        current->pointers = {first, second};
+        return WithSession(entry, handle, session);
+    }
+
+    static int PutFile(void* handle, void* session, char* first, char* second)
+    {
+        return File("PutFileEntry", handle, session, first, second);
+    }
+
+    static int PutFileSync(void* handle, void* session, char* first, char* second)
+    {
+        return File("PutFileSyncEntry", handle, session, first, second);
+    }
+
+    static int GetFile(void* handle, void* session, char* first, char* second)
+    {
+        return File("GetFileEntry", handle, session, first, second);
+    }
+
+    static int GetFileSync(void* handle, void* session, char* first, char* second)
+    {
+        return File("GetFileSyncEntry", handle, session, first, second);
+    }
+
+    static int SendJob(void* handle, void* session, TJobIdentification* job, char* path, char* name)
+    {
+        current->pointers = {job, path, name};
+        if (current->onJob)
+            current->onJob(*job, path, name);
+        return WithSession("SendJobEntry", handle, session);
+    }
+
     static STICKET_ACCESS const* CreateTicket(char const* path)
     {
         current->paths.emplace_back(path ? path : "(null)");
@@ -167,6 +201,11 @@ FakeModule::FakeModule()
     table.GetClientContainerEntry = FAKE_ENTRIES::GetClientContainer;
     table.GetTicketDataEntry = FAKE_ENTRIES::GetTicketData;
     table.SendCommandEntry = FAKE_ENTRIES::SendCommand;
+    table.PutFileEntry = FAKE_ENTRIES::PutFile;
+    table.GetFileEntry = FAKE_ENTRIES::GetFile;
+    table.SendJobEntry = FAKE_ENTRIES::SendJob;
+    table.PutFileSyncEntry = FAKE_ENTRIES::PutFileSync;
+    table.GetFileSyncEntry = FAKE_ENTRIES::GetFileSync;
     table.STicketFactory = &factory;
     factory.CreateTicket = FAKE_ENTRIES::CreateTicket;
     factory.DestroyTicket = FAKE_ENTRIES::DestroyTicket;

@@ -3,6 +3,7 @@
 #pragma once
 
 #include "comgui/session/ComGUIManager.h"
+#include "comgui/session/TJobIdentification.h"
 #include "tests/support/BundleOnDisk.h"
 #include "tests/support/ContainerFake.h"
 #include "tests/support/TemporaryFolder.h"
@@ -32,6 +33,7 @@ public:
     std::function<void()> onLogout;
     TicketFake* ticket = nullptr;  // what the factory makes; none while null
     std::function<int(char const* command, int size, void* data)> onCommand;
+    std::function<void(TJobIdentification& job, char const* path, char const* name)> onJob;
 
     // --- what it saw -------------------------------------------------------------------------------------
     std::vector<std::string> factories;  // that were asked for an instance
@@ -45,8 +47,8 @@ public:
     void* session = nullptr;                 // the session handle that came last
     std::string host;
     int port = 0;
-    std::vector<int> ints;  // the arguments of GetTicketDataEntry behind the session
-    std::vector<void*> pointers;
+    std::vector<int> ints;        // the arguments of GetTicketDataEntry behind the session
+    std::vector<void*> pointers;  // its own or those of a file's or job's entry behind the session
 
     std::vector<std::string> paths;  // asked of the factory, "(null)" for a ticket in memory
     int destroyed = 0;               // tickets given back to it

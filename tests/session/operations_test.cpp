@@ -75,6 +75,11 @@ std::vector<OPERATION> Operations()
     TEXTS const isAlive{"IsAliveEntry", "GetLocalAddressEntry"};
     TEXTS const container{"GetClientContainerEntry"};
     TEXTS const ticketData{"GetTicketDataEntry"};
+    TEXTS const command{"SendCommandEntry"};
+    TEXTS const putFile{"PutFileEntry"};
+    TEXTS const getFile{"GetFileEntry"};
+    TEXTS const sendJob{"SendJobEntry"};
+    static char text[] = "text";
     using M = ComGUIManager;
     using R = TLogin*;
     return {
@@ -105,6 +110,21 @@ std::vector<OPERATION> Operations()
         {"GetTicketData", [](M& m, R) { m.GetTicketData(0, 0, 0, nullptr, nullptr); }, ticketData, false},
         {"GetTicketDataByRecord", [](M& m, R r) { m.GetTicketData(r, 0, 0, 0, nullptr, nullptr); },
          ticketData, true},
+        {"SendCommand", [](M& m, R) { m.SendCommand(text, 0, nullptr); }, command, false},
+        {"SendCommandByRecord", [](M& m, R r) { m.SendCommand(r, text, 0, nullptr); }, command, true},
+        {"SendCommandByNull", [](M& m, R) { m.SendCommand(nullptr, text, 0, nullptr); }, command, false},
+        {"IsAliveByCommand", [](M& m, R) { m.IsAlive(text, 0); }, command, false},
+        {"IsServerOnlineByCommand", [](M& m, R) { m.IsServerOnline(); }, command, false},
+        {"PutFile", [](M& m, R) { m.PutFile(text, text); }, putFile, false},
+        {"PutFileByRecord", [](M& m, R r) { m.PutFile(r, text, text); }, putFile, true},
+        {"PutFileSync", [](M& m, R) { m.PutFileSync(text, text); }, {"PutFileSyncEntry"}, false},
+        {"GetFile", [](M& m, R) { m.GetFile(text, text); }, getFile, false},
+        {"GetFileByRecord", [](M& m, R r) { m.GetFile(r, text, text); }, getFile, true},
+        {"GetFileSync", [](M& m, R) { m.GetFileSync(text, text); }, {"GetFileSyncEntry"}, false},
+        {"SendJob", [](M& m, R) { m.SendJob(nullptr, text, text); }, sendJob, false},
+        {"SendJobByRecord", [](M& m, R r) { m.SendJob(r, nullptr, text, text); }, sendJob, true},
+        {"PrepareJob", [](M& m, R) { m.PrepareJob("a", 0, 0, 0, 0, 0); }, command, false},
+        {"UploadJob", [](M& m, R) { m.UploadJob("a", 0, 0, 0, 0); }, sendJob, false},
     };
 }
 }  // namespace

@@ -1,0 +1,53 @@
+// What the examples with a command line have in common: which server, who logs in, and how a program hears
+// of changes.
+#pragma once
+
+#include <comgui/comgui.h>
+#include <functional>
+#include <future>
+#include <wx/cmdline.h>
+
+extern char const ProgramName[];  // each program's own, for its messages
+
+// Where the server is, and as whom to log in.
+struct SERVER
+{
+    static void AddOptions(wxCmdLineParser& parser);
+    void TakeOptions(wxCmdLineParser const& parser);
+
+    wxString user = "admin";
+    wxString password = "admin";
+    wxString host = "localhost";
+    long port = 50000;
+};
+
+// Says on stderr what went wrong; always false.
+bool Fail(char const* what, int code);
+
+// Whether the library found its plug-in; says so if not.
+bool IsPlugInThere();
+
+// A record of the host's own for one session. From calloc, since one that is logged in becomes the manager's.
+TLogin* NewRecord(char const* user, char const* password, SERVER const& server);
+
+// Looks for the server, prepares a session and logs in. The record is the manager's from then on.
+bool LogIn(ComGUIManager& manager, TLogin* login);
+
+// A host's own mark of its sessions; the plug-in only carries it.
+constexpr int Stamp = 20260101;
+
+// Hears events as long as it lives. The handler runs on the receiver's thread, and should be quick, since the
+// plug-in waits meanwhile.
+class EventReceiver
+{
+public:
+    explicit EventReceiver(std::function<void(ServerNotificationEvent const&)> handler);
+    ~EventReceiver();
+    EventReceiver(EventReceiver const&) = delete;
+    EventReceiver& operator=(EventReceiver const&) = delete;
+
+private:
+    unsigned long long m_subscription;
+    std::promise<void> m_ended;
+    ReceiverThread* m_thread;
+};

@@ -1,0 +1,29 @@
+// An open file or folder of the operating system; closed with its owner. -1 for none.
+#pragma once
+
+#include <unistd.h>
+#include <utility>
+
+namespace standin
+{
+class Descriptor
+{
+public:
+    explicit Descriptor(int number = -1) : m_number(number) {}
+    ~Descriptor()
+    {
+        if (m_number >= 0)
+            close(m_number);
+    }
+    Descriptor(Descriptor&& other) noexcept : m_number(std::exchange(other.m_number, -1)) {}
+    Descriptor& operator=(Descriptor&& other) noexcept
+    {
+        std::swap(m_number, other.m_number);
+        return *this;
+    }
+    int Number() const { return m_number; }
+
+private:
+    int m_number;
+};
+}  // namespace standin
