@@ -8,6 +8,7 @@
 #include "comgui/access/MTICKET_READ.h"
 #include "comgui/access/STICKET_MODIFY.h"
 #include "comgui/access/STICKET_READ.h"
+#include "comgui/access/list_templates.h"
 #include "comgui/folders/FolderVariables.h"
 #include "comgui/folders/clFOLDER_VARIABLES.h"
 #include "comgui/folders/clSETMULTIPAR_FOLDER_VARIABLES.h"

@@ -8,7 +8,11 @@
 #include "comgui/foundation/export.h"
 #include "comgui/ticket/MTICKET_ACCESS.h"
 #include <type_traits>
+#include <vector>
+#include <wx/arrstr.h>
+#include <wx/dynarray.h>
 #include <wx/string.h>
+#include <wx/variant.h>
 
 class MTICKET_MODIFY : public comgui::detail::TICKET_VIEW<MTICKET_MODIFY, MTICKET_ACCESS>
 {
@@ -55,6 +59,45 @@ public:
         return Access()->MOPERATION(Access()->Instance, type, id, STICKET_OP_SET_PARTIAL,
                                     const_cast<char const**>(keys));
     }
+
+    COMGUI_EXPORT bool SetVectorParameter(int type, int id, char const* key,
+                                          std::vector<void*> const& in) const;
+    COMGUI_EXPORT bool SetVectorParameter(int type, int id, char const* key,
+                                          std::vector<int> const& in) const;
+    COMGUI_EXPORT bool SetVectorParameter(int type, int id, char const* key,
+                                          std::vector<unsigned int> const& in) const;
+    COMGUI_EXPORT bool SetVectorParameter(int type, int id, char const* key,
+                                          std::vector<long long> const& in) const;
+    COMGUI_EXPORT bool SetVectorParameter(int type, int id, char const* key,
+                                          std::vector<unsigned long long> const& in) const;
+    COMGUI_EXPORT bool SetVectorParameter(int type, int id, char const* key,
+                                          std::vector<double> const& in) const;
+    COMGUI_EXPORT bool SetVectorParameter(int type, int id, char const* key,
+                                          std::vector<bool> const& in) const;
+    COMGUI_EXPORT bool SetVectorParameter(int type, int id, char const* key,
+                                          std::vector<wxString> const& in) const;
+
+    COMGUI_EXPORT bool SetArrayParameter(int type, int id, char const* key, void* const* in,
+                                         unsigned long count) const;
+    COMGUI_EXPORT bool SetArrayParameter(int type, int id, char const* key, int const* in,
+                                         unsigned long count) const;
+    COMGUI_EXPORT bool SetArrayParameter(int type, int id, char const* key, unsigned int const* in,
+                                         unsigned long count) const;
+    COMGUI_EXPORT bool SetArrayParameter(int type, int id, char const* key, long long const* in,
+                                         unsigned long count) const;
+    COMGUI_EXPORT bool SetArrayParameter(int type, int id, char const* key, unsigned long long const* in,
+                                         unsigned long count) const;
+    COMGUI_EXPORT bool SetArrayParameter(int type, int id, char const* key, double const* in,
+                                         unsigned long count) const;
+    COMGUI_EXPORT bool SetArrayParameter(int type, int id, char const* key, bool const* in,
+                                         unsigned long count) const;
+
+    // The texts stand behind as many empty ones: a list of twice the size, which no other call writes.
+    COMGUI_EXPORT bool SetWxArrayParameter(int type, int id, char const* key, wxArrayString const& in) const;
+    COMGUI_EXPORT bool SetWxArrayParameter(int type, int id, char const* key, wxArrayInt const& in) const;
+
+    COMGUI_EXPORT bool SetWxVariantParameter(int type, int id, char const* key, wxVariant const& value,
+                                             int pos) const;
 
 private:
     comgui::detail::MTICKET_SLOTS Slots(int type, int id) const { return {Access(), type, id}; }

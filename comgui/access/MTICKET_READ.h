@@ -7,7 +7,10 @@
 #include "comgui/foundation/export.h"
 #include "comgui/ticket/MTICKET_ACCESS.h"
 #include <vector>
+#include <wx/arrstr.h>
+#include <wx/dynarray.h>
 #include <wx/string.h>
+#include <wx/variant.h>
 
 class MTICKET_READ : public comgui::detail::TICKET_VIEW<MTICKET_READ, MTICKET_ACCESS>
 {
@@ -75,6 +78,41 @@ public:
     {
         return Access()->MWALKTICKETS(Access()->Instance, fn, user, type);
     }
+
+    COMGUI_EXPORT bool GetVectorParameter(int type, int id, char const* key, std::vector<void*>& out) const;
+    COMGUI_EXPORT bool GetVectorParameter(int type, int id, char const* key, std::vector<int>& out) const;
+    COMGUI_EXPORT bool GetVectorParameter(int type, int id, char const* key,
+                                          std::vector<unsigned int>& out) const;
+    COMGUI_EXPORT bool GetVectorParameter(int type, int id, char const* key,
+                                          std::vector<long long>& out) const;
+    COMGUI_EXPORT bool GetVectorParameter(int type, int id, char const* key,
+                                          std::vector<unsigned long long>& out) const;
+    COMGUI_EXPORT bool GetVectorParameter(int type, int id, char const* key, std::vector<double>& out) const;
+    COMGUI_EXPORT bool GetVectorParameter(int type, int id, char const* key, std::vector<bool>& out) const;
+    COMGUI_EXPORT bool GetVectorParameter(int type, int id, char const* key,
+                                          std::vector<wxString>& out) const;
+
+    COMGUI_EXPORT bool GetArrayParameter(int type, int id, char const* key, void** out,
+                                         unsigned long count) const;
+    COMGUI_EXPORT bool GetArrayParameter(int type, int id, char const* key, int* out,
+                                         unsigned long count) const;
+    COMGUI_EXPORT bool GetArrayParameter(int type, int id, char const* key, unsigned int* out,
+                                         unsigned long count) const;
+    COMGUI_EXPORT bool GetArrayParameter(int type, int id, char const* key, long long* out,
+                                         unsigned long count) const;
+    COMGUI_EXPORT bool GetArrayParameter(int type, int id, char const* key, unsigned long long* out,
+                                         unsigned long count) const;
+    COMGUI_EXPORT bool GetArrayParameter(int type, int id, char const* key, double* out,
+                                         unsigned long count) const;
+    COMGUI_EXPORT bool GetArrayParameter(int type, int id, char const* key, bool* out,
+                                         unsigned long count) const;
+
+    COMGUI_EXPORT bool GetWxArrayParameter(int type, int id, char const* key, wxArrayString& out) const;
+    COMGUI_EXPORT bool GetWxArrayParameter(int type, int id, char const* key, wxArrayInt& out) const;
+
+    COMGUI_EXPORT bool GetWxVariantParameterChk(int type, int id, char const* key, wxVariant& value,
+                                                int pos) const;
+    COMGUI_EXPORT wxVariant GetWxVariantParameterDef(int type, int id, wxVariant const& def, int pos) const;
 
 private:
     comgui::detail::MTICKET_SLOTS Slots(int type, int id) const { return {Access(), type, id}; }

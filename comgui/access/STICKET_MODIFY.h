@@ -8,7 +8,11 @@
 #include "comgui/foundation/export.h"
 #include "comgui/ticket/STICKET_ACCESS.h"
 #include <type_traits>
+#include <vector>
+#include <wx/arrstr.h>
+#include <wx/dynarray.h>
 #include <wx/string.h>
+#include <wx/variant.h>
 
 class STICKET_MODIFY : public comgui::detail::TICKET_VIEW<STICKET_MODIFY, STICKET_ACCESS>
 {
@@ -57,6 +61,37 @@ public:
     {
         return Access()->SSETMULTIPAR(Access()->Instance, table);
     }
+
+    // Writes a whole list in one call of the module, instead of what the key held. True if all values were
+    // written; if not, those that were stay written. An empty list deletes the key, which is true whatever
+    // the slot says. bools are stored as ints, 1 and 0; the slot gets pointers into the texts.
+    COMGUI_EXPORT bool SetVectorParameter(char const* key, std::vector<void*> const& in) const;
+    COMGUI_EXPORT bool SetVectorParameter(char const* key, std::vector<int> const& in) const;
+    COMGUI_EXPORT bool SetVectorParameter(char const* key, std::vector<unsigned int> const& in) const;
+    COMGUI_EXPORT bool SetVectorParameter(char const* key, std::vector<long long> const& in) const;
+    COMGUI_EXPORT bool SetVectorParameter(char const* key, std::vector<unsigned long long> const& in) const;
+    COMGUI_EXPORT bool SetVectorParameter(char const* key, std::vector<double> const& in) const;
+    COMGUI_EXPORT bool SetVectorParameter(char const* key, std::vector<bool> const& in) const;
+    COMGUI_EXPORT bool SetVectorParameter(char const* key, std::vector<wxString> const& in) const;
+
+    // The same for count values. bools are not written: they delete the key, which is true, and a count of 0
+    // leaves even that; write them with a vector.
+    COMGUI_EXPORT bool SetArrayParameter(char const* key, void* const* in, unsigned long count) const;
+    COMGUI_EXPORT bool SetArrayParameter(char const* key, int const* in, unsigned long count) const;
+    COMGUI_EXPORT bool SetArrayParameter(char const* key, unsigned int const* in, unsigned long count) const;
+    COMGUI_EXPORT bool SetArrayParameter(char const* key, long long const* in, unsigned long count) const;
+    COMGUI_EXPORT bool SetArrayParameter(char const* key, unsigned long long const* in,
+                                         unsigned long count) const;
+    COMGUI_EXPORT bool SetArrayParameter(char const* key, double const* in, unsigned long count) const;
+    COMGUI_EXPORT bool SetArrayParameter(char const* key, bool const* in, unsigned long count) const;
+
+    COMGUI_EXPORT bool SetWxArrayParameter(char const* key, wxArrayString const& in) const;
+    COMGUI_EXPORT bool SetWxArrayParameter(char const* key, wxArrayInt const& in) const;
+
+    // Writes a variant of the types "bool" (an int), "double", "long" (as a double), "string", "void*" and,
+    // at -1, "arrstring", and gives whether the slot did. A "list", at -1, is written element by element and
+    // is true whatever becomes of them; an empty one leaves the key as it was. Anything else is false.
+    COMGUI_EXPORT bool SetWxVariantParameter(char const* key, wxVariant const& value, int pos) const;
 
 private:
     comgui::detail::STICKET_SLOTS Slots() const { return {Access()}; }

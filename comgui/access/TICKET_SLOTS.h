@@ -1,5 +1,6 @@
 // One ticket as the rules of typed access see it: four slots and a translator, whether the ticket stands
 // alone or is addressed inside a container. Each rule is written once, over either of the two.
+// What a table slot returns does not count: success stands in each record's ok.
 #pragma once
 
 #include "comgui/folders/clFOLDER_VARIABLES.h"
@@ -21,6 +22,8 @@ struct STICKET_SLOTS
     {
         return access->SSETPARAMETER(access->Instance, key, type, value, pos);
     }
+    void GetTable(GETMULTIPAR* table) const { access->SGETMULTIPAR(access->Instance, table); }
+    void SetTable(SETMULTIPAR* table) const { access->SSETMULTIPAR(access->Instance, table); }
     // The ticket's own translator; null if it has none.
     clFOLDER_VARIABLES* GetFolderVariables() const
     {
@@ -42,6 +45,14 @@ struct MTICKET_SLOTS
     int Set(char const* key, PARAM_TYPE type, void const* value, int pos) const
     {
         return access->MSETPARAMETER(access->Instance, ticketType, ticketId, key, type, value, pos);
+    }
+    void GetTable(GETMULTIPAR* table) const
+    {
+        access->MGETMULTIPAR(access->Instance, ticketType, ticketId, table);
+    }
+    void SetTable(SETMULTIPAR* table) const
+    {
+        access->MSETMULTIPAR(access->Instance, ticketType, ticketId, table);
     }
     // The container's translator, whatever ticket it is asked for.
     clFOLDER_VARIABLES* GetFolderVariables() const
@@ -75,6 +86,13 @@ template <typename Slots>
 int ReadType(Slots const& slots, char const* key, int pos)
 {
     return Read<int>(slots, PARAM_NONE, pos, key, PARAM_NONE);
+}
+
+// How many values the key holds; 0 where there is no such key.
+template <typename Slots>
+unsigned long ReadCount(Slots const& slots, char const* key)
+{
+    return Read(slots, PARAM_COUNT, -1, key, 0ul);
 }
 
 // A write of one number, by address.

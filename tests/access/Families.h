@@ -8,6 +8,7 @@
 #include "comgui/access/STICKET_READ.h"
 #include "tests/support/TicketFake.h"
 #include <gtest/gtest.h>
+#include <utility>
 
 // A single ticket, through STICKET_READ and STICKET_MODIFY.
 class SINGLE
@@ -61,6 +62,23 @@ public:
     {
         ticket.optionResult = folders ? 1 : 0;
         fake.folders = folders;
+    }
+
+    // Calls what takes a view, or the record, and then the arguments of a view's operation.
+    template <typename Operation, typename... Arguments>
+    auto OnRead(Operation operation, Arguments&&... arguments)
+    {
+        return operation(Read(), std::forward<Arguments>(arguments)...);
+    }
+    template <typename Operation, typename... Arguments>
+    auto OnModify(Operation operation, Arguments&&... arguments)
+    {
+        return operation(Modify(), std::forward<Arguments>(arguments)...);
+    }
+    template <typename Operation, typename... Arguments>
+    auto OnRecord(Operation operation, Arguments&&... arguments)
+    {
+        return operation(*ticket.Access(), std::forward<Arguments>(arguments)...);
     }
 
 private:
@@ -129,6 +147,23 @@ public:
         return asked;
     }
     void SetTranslator(clFOLDER_VARIABLES* folders) { fake.folders = folders; }
+
+    // Calls what takes a view, or the record, and then the arguments of a view's operation.
+    template <typename Operation, typename... Arguments>
+    auto OnRead(Operation operation, Arguments&&... arguments)
+    {
+        return operation(Read(), Type, Id, std::forward<Arguments>(arguments)...);
+    }
+    template <typename Operation, typename... Arguments>
+    auto OnModify(Operation operation, Arguments&&... arguments)
+    {
+        return operation(Modify(), Type, Id, std::forward<Arguments>(arguments)...);
+    }
+    template <typename Operation, typename... Arguments>
+    auto OnRecord(Operation operation, Arguments&&... arguments)
+    {
+        return operation(*fake.Access(), Type, Id, std::forward<Arguments>(arguments)...);
+    }
 
 private:
     MTICKET_READ const& Read() { return *MTICKET_READ::Of(fake.Access()); }

@@ -1,0 +1,210 @@
+#include "comgui/access/variant_bridge.h"
+
+#include "comgui/access/decode.h"
+#include "comgui/access/list_conversions.h"
+#include <wx/arrstr.h>
+#include <wx/string.h>
+
+namespace comgui::detail
+{
+namespace
+{
+enum class KIND
+{
+    BOOL,
+    DOUBLE,
+    LIST,
+    LONG,
+    STRING,
+    ARRSTRING,
+    POINTER,
+    OTHER,
+};
+
+KIND KindOf(wxVariant const& variant)
+{
+    static wchar_t const* const names[] = {L"bool",   L"double",    L"list", L"long",
+                                           L"string", L"arrstring", L"void*"};
+    wxString const type = variant.GetType();
+    int kind = 0;
+    while (kind < static_cast<int>(KIND::OTHER) && type != names[kind])
+        ++kind;
+    return static_cast<KIND>(kind);
+}
+
+template <typename Slots>
+wxString ReadTextOr(Slots const& slots, int pos, char const* key, wxString const& def)
+{
+    wxString text;
+    return ReadText(slots, key, text, pos) ? text : def;
+}
+
+// Whether the key holds nothing but texts, or nothing at all.
+template <typename Slots>
+bool HoldsTexts(Slots const& slots, char const* key)
+{
+    int pos = 0;
+    int type = 0;
+    while ((type = ReadType(slots, key, pos)) == PARAM_STRING)
+        ++pos;
+    return type == PARAM_NONE;
+}
+
+// The values of a key up to the first that cannot be read.
+template <typename Slots>
+wxVariant ReadVariants(Slots const& slots, char const* key)
+{
+    wxVariant list;
+    list.NullList();
+    wxVariant element;
+    for (int pos = 0; ReadVariant(slots, key, element, pos); ++pos)
+        list.Append(element);
+    return list;
+}
+
+template <typename Slots>
+wxVariant ReadVector(Slots const& slots, char const* key)
+{
+    if (!HoldsTexts(slots, key))
+        return ReadVariants(slots, key);
+    wxArrayString texts;
+    ReadWxArray(slots, key, texts);
+    return texts;
+}
+
+// What the ticket holds there as it is; null for what has no form as a variant.
+template <typename Slots>
+wxVariant ReadStored(Slots const& slots, char const* key, int pos)
+{
+    switch (ReadType(slots, key, pos))
+    {
+    case PARAM_POINTER:
+        return Read<void*>(slots, PARAM_POINTER, pos, key, nullptr);
+    case PARAM_INT:
+        return static_cast<long>(Read(slots, PARAM_INT, pos, key, 0));
+    case PARAM_DOUBLE:
+        return Read(slots, PARAM_DOUBLE, pos, key, 0.0);
+    case PARAM_STRING:
+        return ReadTextOr(slots, pos, key, wxString());
+    case PARAM_COUNT:
+        return pos == -1 ? ReadVector(slots, key) : wxVariant();
+    default:
+        return wxVariant();
+    }
+}
+
+template <typename Slots>
+wxVariant ReadListLike(Slots const& slots, wxVariant const& def)
+{
+    wxVariant list;
+    list.NullList();
+    int pos = 0;
+    for (wxVariant const* const element : def.GetList())
+    {
+        wxVariant child = *element;
+        child.SetName(def.GetName());
+        list.Append(ReadVariantLike(slots, child, pos++));
+    }
+    return list;
+}
+
+template <typename Slots>
+wxVariant ReadTextsLike(Slots const& slots, char const* key, wxVariant const& def)
+{
+    wxArrayString texts = def.GetArrayString();
+    for (std::size_t i = 0; i < texts.size(); ++i)
+        texts[i] = ReadTextOr(slots, static_cast<int>(i), key, texts[i]);
+    return texts;
+}
+
+template <typename Slots>
+wxVariant ReadAs(KIND kind, Slots const& slots, char const* key, wxVariant const& def, int pos)
+{
+    switch (kind)
+    {
+    case KIND::BOOL:
+        return ReadBool(slots, pos, key, def.GetBool());
+    case KIND::DOUBLE:
+        return Read(slots, PARAM_DOUBLE, pos, key, def.GetDouble());
+    case KIND::LIST:
+        return pos == -1 ? ReadListLike(slots, def) : def;
+    case KIND::LONG:
+        return static_cast<long>(Read(slots, PARAM_INT, pos, key, static_cast<int>(def.GetLong())));
+    case KIND::STRING:
+        return ReadTextOr(slots, pos, key, def.GetString());
+    case KIND::ARRSTRING:
+        return pos == -1 ? ReadTextsLike(slots, key, def) : def;
+    case KIND::POINTER:
+        return Read(slots, PARAM_POINTER, pos, key, def.GetVoidPtr());
+    case KIND::OTHER:
+        break;
+    }
+    return def;
+}
+
+// Value by value, so that the kinds may differ; the first starts the key anew.
+template <typename Slots>
+void WriteVariants(Slots const& slots, char const* key, wxVariant const& list)
+{
+    int pos = 0;
+    for (wxVariant const* const element : list.GetList())
+    {
+        WriteVariant(slots, key, *element, pos == 0 ? -1 : pos);
+        ++pos;
+    }
+}
+}  // namespace
+
+template <typename Slots>
+bool ReadVariant(Slots const& slots, char const* key, wxVariant& value, int pos)
+{
+    value = ReadStored(slots, key, pos);
+    value.SetName(wxString(key, wxConvUTF8));
+    return !value.IsNull();
+}
+
+template <typename Slots>
+wxVariant ReadVariantLike(Slots const& slots, wxVariant const& def, int pos)
+{
+    // The local encoding, unlike the names that ReadVariant gives: names are the host's own.
+    wxString const& name = def.GetName();
+    wxVariant value = ReadAs(KindOf(def), slots, name.mb_str(wxConvLibc), def, pos);
+    value.SetName(name);
+    return value;
+}
+
+template <typename Slots>
+bool WriteVariant(Slots const& slots, char const* key, wxVariant const& value, int pos)
+{
+    switch (KindOf(value))
+    {
+    case KIND::BOOL:
+        return Write(slots, key, PARAM_INT, value.GetBool() ? 1 : 0, pos) != 0;
+    case KIND::DOUBLE:
+        return Write(slots, key, PARAM_DOUBLE, value.GetDouble(), pos) != 0;
+    case KIND::LIST:
+        if (pos == -1)
+            WriteVariants(slots, key, value);
+        return pos == -1;
+    case KIND::LONG:
+        // Looks like a mistake, but is required: what comes back is a "double".
+        return Write(slots, key, PARAM_DOUBLE, static_cast<double>(value.GetLong()), pos) != 0;
+    case KIND::STRING:
+        return slots.Set(key, PARAM_STRING, value.GetString().utf8_str(), pos) != 0;
+    case KIND::ARRSTRING:
+        return pos == -1 && WriteWxArray(slots, key, value.GetArrayString());
+    case KIND::POINTER:
+        return slots.Set(key, PARAM_POINTER, value.GetVoidPtr(), pos) != 0;
+    case KIND::OTHER:
+        break;
+    }
+    return false;
+}
+
+#define COMGUI_INSTANTIATE(SLOTS)                                                                            \
+    template bool ReadVariant(SLOTS const&, char const*, wxVariant&, int);                                   \
+    template wxVariant ReadVariantLike(SLOTS const&, wxVariant const&, int);                                 \
+    template bool WriteVariant(SLOTS const&, char const*, wxVariant const&, int);
+COMGUI_INSTANTIATE(STICKET_SLOTS)
+COMGUI_INSTANTIATE(MTICKET_SLOTS)
+}  // namespace comgui::detail

@@ -1,0 +1,47 @@
+#include "tests/access/Callocs.h"
+
+#include <cstddef>
+
+#if defined(__has_feature)
+#    if __has_feature(address_sanitizer) || __has_feature(thread_sanitizer)
+#        define COMGUI_SANITIZED
+#    endif
+#endif
+#if defined(__SANITIZE_ADDRESS__) || defined(__SANITIZE_THREAD__)
+#    define COMGUI_SANITIZED
+#endif
+
+// A sanitizer has to know each block that is given back to it.
+#ifdef COMGUI_SANITIZED
+#    define COMGUI_REAL_CALLOC __interceptor_calloc
+#else
+#    define COMGUI_REAL_CALLOC __libc_calloc
+#endif
+
+extern "C"
+{
+    void* COMGUI_REAL_CALLOC(std::size_t count, std::size_t size);
+    __attribute__((visibility("default"))) void* calloc(std::size_t count, std::size_t size) noexcept;
+}
+
+namespace
+{
+thread_local int calls = 0;
+thread_local int failIn = -1;
+}  // namespace
+
+void* calloc(std::size_t count, std::size_t size) noexcept
+{
+    ++calls;
+    if (failIn >= 0 && failIn-- == 0)
+        return nullptr;
+    return COMGUI_REAL_CALLOC(count, size);
+}
+
+CountedCallocs::CountedCallocs() : m_before(calls) {}
+
+int CountedCallocs::Count() const { return calls - m_before; }
+
+FailingCalloc::FailingCalloc(int n) { failIn = n; }
+
+FailingCalloc::~FailingCalloc() { failIn = -1; }
