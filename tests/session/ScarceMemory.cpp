@@ -13,7 +13,8 @@ ScarceMemory::ScarceMemory(int allocations) { allocationsLeft = allocations; }
 
 ScarceMemory::~ScarceMemory() { allocationsLeft = Plenty; }
 
-// The whole program's, the library included. The forms that are not here come down to these.
+// The whole program's, the library included. All forms, since a sanitizer brings its own for those that are not
+// here. Blocks of a stricter alignment do not count.
 void* operator new(std::size_t size)
 {
     if (allocationsLeft == 0)
@@ -25,6 +26,27 @@ void* operator new(std::size_t size)
     throw std::bad_alloc();
 }
 
+void* operator new(std::size_t size, std::nothrow_t const&) noexcept
+try
+{
+    return operator new(size);
+}
+catch (std::bad_alloc const&)
+{
+    return nullptr;
+}
+
+void* operator new[](std::size_t size) { return operator new(size); }
+
+void* operator new[](std::size_t size, std::nothrow_t const&) noexcept
+{
+    return operator new(size, std::nothrow);
+}
+
 void operator delete(void* memory) noexcept { std::free(memory); }
 
 void operator delete(void* memory, std::size_t) noexcept { std::free(memory); }
+
+void operator delete[](void* memory) noexcept { std::free(memory); }
+
+void operator delete[](void* memory, std::size_t) noexcept { std::free(memory); }

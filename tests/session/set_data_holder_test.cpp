@@ -2,6 +2,7 @@
 #include "comgui/session/SetDataHolder.h"
 
 #include "tests/access/Callocs.h"
+#include <bit>
 #include <csignal>
 #include <cstring>
 #include <gmock/gmock.h>
@@ -82,7 +83,9 @@ TEST(SetDataHolder, Double_IsCopiedBitByBit)
     double value = std::numeric_limits<double>::signaling_NaN();
     SetDataHolder const holder("Key", PARAM_DOUBLE, &value, -1);
     ASSERT_NE(holder.m_value, &value);
-    EXPECT_EQ(std::memcmp(holder.m_value, &value, sizeof value), 0);
+    unsigned long long copy = 0;
+    std::memcpy(&copy, holder.m_value, sizeof copy);
+    EXPECT_EQ(copy, std::bit_cast<unsigned long long>(value));
 }
 
 TEST(SetDataHolder, Text_IsCopiedAsItStands)
