@@ -28,6 +28,7 @@
 #include "comgui/session/LocalTicket.h"
 #include "comgui/session/ReceiverThread.h"
 #include "comgui/session/STicketFactory.h"
+#include "comgui/session/SetDataHolder.h"
 #include "comgui/session/TCommandRecord.h"
 #include "comgui/session/TJobIdentification.h"
 #include "comgui/session/TLogin.h"

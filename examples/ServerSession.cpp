@@ -1,12 +1,17 @@
 #include "examples/ServerSession.h"
 
+#include <algorithm>
 #include <cstdio>
 #include <cstdlib>
+#include <iterator>
 #include <memory>
+#include <unistd.h>
 #include <utility>
 
 namespace
 {
+constexpr int Ends[] = {SIGINT, SIGTERM, SIGHUP};
+
 // The library's receiver deletes itself at its end; this one tells when.
 class Receiver : public ReceiverThread
 {
@@ -84,6 +89,30 @@ bool LogIn(ComGUIManager& manager, TLogin* login)
         return Fail("the server refuses the login", result);
     return manager.GetClientContainer() || Fail("the session has no tickets");
 }
+
+EndSignals::EndSignals()
+{
+    sigemptyset(&m_signals);
+    for (int const signal : Ends)
+        sigaddset(&m_signals, signal);
+    pthread_sigmask(SIG_BLOCK, &m_signals, nullptr);
+}
+
+void EndSignals::Wait() const
+{
+    int signal = 0;
+    sigwait(&m_signals, &signal);
+}
+
+bool EndSignals::ArePending()
+{
+    sigset_t pending;
+    sigpending(&pending);
+    return std::any_of(std::begin(Ends), std::end(Ends),
+                       [&](int signal) { return sigismember(&pending, signal) == 1; });
+}
+
+void EndSignals::Raise() { kill(getpid(), SIGTERM); }
 
 EventReceiver::EventReceiver(std::function<void(ServerNotificationEvent const&)> handler)
     : m_subscription(CEventManager::GetInstance()->Subscribe(

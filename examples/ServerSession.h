@@ -3,6 +3,7 @@
 #pragma once
 
 #include <comgui/comgui.h>
+#include <csignal>
 #include <functional>
 #include <future>
 #include <string>
@@ -38,6 +39,19 @@ bool LogIn(ComGUIManager& manager, TLogin* login);
 
 // A host's own mark of its sessions; the plug-in only carries it.
 constexpr int Stamp = 20260101;
+
+// Waits for Ctrl-C and its like. Made before any thread, it blocks them in all of them, so that none is lost.
+class EndSignals
+{
+public:
+    EndSignals();
+    void Wait() const;         // until one comes, or has come
+    static bool ArePending();  // has one come that nobody has waited for?
+    static void Raise();       // as if somebody had ended the program from outside
+
+private:
+    sigset_t m_signals;
+};
 
 // Hears events as long as it lives. The handler runs on the receiver's thread, and should be quick, since the
 // plug-in waits meanwhile.

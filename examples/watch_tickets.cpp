@@ -5,7 +5,6 @@
 
 #include <chrono>
 #include <condition_variable>
-#include <csignal>
 #include <cstdio>
 #include <cstdlib>
 #include <memory>
@@ -13,7 +12,6 @@
 #include <optional>
 #include <string>
 #include <thread>
-#include <unistd.h>
 #include <wx/cmdline.h>
 #include <wx/datetime.h>
 #include <wx/init.h>
@@ -92,7 +90,7 @@ public:
                     ValueOf(data).c_str());
         std::fflush(stdout);
         if (++m_printed == m_limit)
-            kill(getpid(), SIGTERM);  // as if somebody had ended it from outside
+            EndSignals::Raise();
     }
 
 private:
@@ -176,28 +174,6 @@ private:
     std::mutex m_lock;
     std::condition_variable m_stopped;
     bool m_stop = false;
-};
-
-// Waits for Ctrl-C and its like. They are blocked from the start, in every thread, so none is lost.
-class EndSignals
-{
-public:
-    EndSignals()
-    {
-        sigemptyset(&m_signals);
-        for (int const signal : {SIGINT, SIGTERM, SIGHUP})
-            sigaddset(&m_signals, signal);
-        pthread_sigmask(SIG_BLOCK, &m_signals, nullptr);
-    }
-
-    void Wait() const
-    {
-        int signal = 0;
-        sigwait(&m_signals, &signal);
-    }
-
-private:
-    sigset_t m_signals;
 };
 
 bool Subscribe(ComGUIManager& manager, TLogin* login)

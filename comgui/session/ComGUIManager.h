@@ -8,9 +8,9 @@
 // The usual order is IsAlive, Initialize, Login, the work, Logout, Uninitialize; it is not enforced.
 //
 // Results: 0 is success, and other numbers are the plug-in's, which the library does not look into, except
-// for three of its own: -1 (not logged in, or no container), -2005 (no server there), -9999. Whatever ends in
-// a slot of a container, which is reading, writing and deleting, answers the other way round: not zero is
-// success.
+// for three of its own: -1 (not logged in, or no container), -2005 (no server there, or nothing to write),
+// -9999. Whatever ends in a slot of a container, which is reading, writing and deleting, answers the other
+// way round: not zero is success.
 //
 // Threads: no lock anywhere, so one thread at a time; and GetInstance() once before there is a second one.
 //
@@ -26,16 +26,20 @@
 #include "comgui/ticket/STRINGCACHE.h"
 #include <list>
 #include <string>
+#include <vector>
 #include <wx/arrstr.h>
 #include <wx/dynarray.h>
 #include <wx/list.h>
 #include <wx/string.h>
 #include <wx/thread.h>
+#include <wx/variant.h>
 
 struct __CFBundle;
 struct TCommandRecord;
 struct TJobIdentification;
 class NotifData;
+class SETMULTIPAR_LIST;
+class SetDataHolder;
 class clFOLDER_VARIABLES;
 
 class COMGUI_EXPORT ComGUIManager
@@ -172,10 +176,86 @@ public:
     wxArrayString GetStringArray(MTICKET_ACCESS const* container, int type, int id, char* key);
     wxArrayString GetStringArray(MTICKET_ACCESS const* container, int type, int id, wxString key);
 
+    // By the type that the ticket has: see MTICKET_READ::GetWxVariantParameterChk, and at -1 a list as a
+    // whole. -1 while the first session is logged out and for a null container, which leaves the value alone;
+    // else 1, and a value that cannot be read is the long -1, as a stored -1 is.
+    int GetParameter(MTICKET_ACCESS const* container, int type, int id, char const* key, wxVariant& value,
+                     int pos);
+
+    // The same, but with a null marker a value that cannot be read gives 0, and a null variant with the key
+    // as its name. Of the marker nothing else counts.
+    int GetParameterEx(MTICKET_ACCESS const* container, int type, int id, char const* key, wxVariant& value,
+                       int pos, wxVariant marker);
+
+    // Whether the key is there. ptype: its PARAM_TYPE, PARAM_COUNT if it has several values, 0 if there is
+    // none, and while the first session is logged out or the container null. elementType: of several values,
+    // the type of the one at position 0; else left alone.
+    bool GetKeyParameterType(MTICKET_ACCESS const* container, int type, int id, char const* key, int& ptype,
+                             int& elementType);
+
+    // Reads with a default, as MTICKET_READ does them, from the container of the login. Logged in or not;
+    // there must be a container. The form of GetDoubleParameter with a position takes a whole number for a
+    // default.
+    int GetIntParameter(int type, int id, char const* key, int def) const;
+    int GetIntParameter(int type, int id, int pos, char const* key, int def) const;
+    double GetDoubleParameter(int type, int id, char const* key, double def) const;
+    double GetDoubleParameter(int type, int id, int pos, char const* key, int def) const;
+    bool GetBoolParameter(int type, int id, int pos, char const* key, bool def) const;
+    bool GetParameter(int type, int id, char const* key, wxString& value, int pos) const;
+    wxString GetwxStringParameter(int type, int id, char const* key, int pos) const;  // empty without a value
+    bool GetVectorParameter(int type, int id, char const* key, std::vector<int>& out) const;
+    bool GetVectorParameter(int type, int id, char const* key, std::vector<double>& out) const;
+    bool GetVectorParameter(int type, int id, char const* key, std::vector<wxString>& out) const;
+
+    // --- Many values at once -----------------------------------------------------------------------------
+    // Writes what the holders hold, in one table. Only PARAM_INT, PARAM_DOUBLE and PARAM_STRING are written;
+    // a holder of another type than those and PARAM_COUNT goes by the type of the one before it, and that
+    // must not make it a double if it has no value. Texts: see SetDataHolder.h, and rather use what follows.
+    // The table's slot result; 0 if there was nothing to write, or nothing was; -2005 for an empty vector, -1
+    // while the first session is logged out. Unless -1 comes back, all holders are deleted, and the pointers
+    // in the vector are dead. null holders are passed over; the second int counts for nothing. The first form
+    // fetches the container anew; neither tests it.
+    int SetMultiParameter(int type, int id, int, std::vector<SetDataHolder*>& holders);
+    int SetMultiParameter(MTICKET_ACCESS const* container, int type, int id, int,
+                          std::vector<SetDataHolder*>& holders);
+
+    // Writes what the list holds, in its order. Each record's ok in the list's Table(false) tells what became
+    // of it, and nothing else does; they are all 0 when nothing was written: logged out, or no such ticket.
+    // The ticket is opened and stays open. The first form fetches the container anew; neither tests it.
+    void SetMultiParameter(int type, int id, SETMULTIPAR_LIST& list);
+    void SetMultiParameter(MTICKET_ACCESS const* container, int type, int id, SETMULTIPAR_LIST& list);
+
+    // Put the whole list under the key, in place of what was there; an empty one deletes the key. values: of
+    // wxVariant*, none null. A "long", "double" or "string", in any letter case, is written as PARAM_INT, cut
+    // to 32 bits, PARAM_DOUBLE or PARAM_STRING; any other leaves a gap at its position. Always 0, and no word
+    // of a failure.
+    int SetMultiParameter(MTICKET_ACCESS const* container, int type, int id, char const* key, wxList& values);
+    int SetArrayParameter(MTICKET_ACCESS const* container, int type, int id, char const* key,
+                          wxArrayString& values);
+
+    // Deletes a value, or at -1 the key. The slot's result, logged in or not. The first form fetches the
+    // container of the manager that GetInstance() gives; neither tests it.
+    int DeleteParameter(int type, int id, char const* key, int pos);
+    int DeleteParameter(MTICKET_ACCESS const* container, int type, int id, char const* key, int pos);
+
     // --- Whole tickets -----------------------------------------------------------------------------------
-    // The slot's result. The first form fetches the implicit session's container anew; neither tests it.
+    // Results are the slot's unless told otherwise. They ask for no login, and test no container.
+    //
+    // The first form fetches the implicit session's container anew.
     int DeleteTicketOfType(int type, int id);
     int DeleteTicketOfType(MTICKET_ACCESS const* container, int type, int id);
+
+    // Whether the ticket is open now. One that is not there is created, of the keys in that null-ended table
+    // only; CloseTicket gives either back.
+    bool CreateOrOpenTicket(int type, int id, char const* const* keys);
+    bool CreateOrOpenTicket(MTICKET_ACCESS const* container, int type, int id, char const* const* keys);
+    int CreateNextTicket(MTICKET_ACCESS const* container,
+                         int type);  // its id, which the module chooses; or -1
+    int CloseTicket(MTICKET_ACCESS const* container, int type, int id);
+
+    // Limits this session's view of the ticket to the keys in that null-ended table.
+    int SetPartial(int type, int id, char const* const* keys);
+    int SetPartial(MTICKET_ACCESS const* container, int type, int id, char const* const* keys);
 
     // A ticket's data into a buffer of the caller. What the five values say is between host and plug-in.
     int GetTicketData(int a, int b, int c, int* d, void* data);
@@ -232,6 +312,11 @@ public:
     int PrepareJob(std::string path, int a, int b, int c, int d, int e);
     int UploadJob(std::string path, int a, unsigned int b, int c, int d);
 
+    // A path without $(VARIABLE), with the folders of the server as they were at the first call: a later
+    // login changes nothing there. So the container of that call must live as long as the manager is asked.
+    // UTF-8; empty while logged out.
+    std::string GetDecodedPath(std::string path);
+
     // What stands behind the last slash or backslash; the whole path if it has neither.
     static std::string LeafName(std::string const& path);
 
@@ -278,9 +363,9 @@ private:
     ComGUIModuleInterface** m_pModule = nullptr;
     ComGUIModuleInterface m_interface = {};  // copy of **m_pModule
     void* m_hModuleInstance = nullptr;
-    wxCriticalSection m_csManager;  // constructed and destroyed, never locked
-    STRINGCACHE m_stringCache;      // constructed and destroyed, never used
-    clFOLDER_VARIABLES* m_pFolderVariables = nullptr;
+    wxCriticalSection m_csManager;                     // constructed and destroyed, never locked
+    STRINGCACHE m_stringCache;                         // constructed and destroyed, never used
+    clFOLDER_VARIABLES* m_pFolderVariables = nullptr;  // made on first need, never freed
     int m_iGUINotificationID = -1;
     MTICKET_ACCESS const* m_pClientContainer = nullptr;
     wxString m_serverName;

@@ -13,8 +13,8 @@ ScarceMemory::ScarceMemory(int allocations) { allocationsLeft = allocations; }
 
 ScarceMemory::~ScarceMemory() { allocationsLeft = Plenty; }
 
-// The whole program's, the library included. Those of arrays come down to the others by themselves, but not
-// in a build with sanitizers. What is not here is not asked for.
+// The whole program's, the library included. All forms, since a sanitizer brings its own for those that are not
+// here. Blocks of a stricter alignment do not count.
 void* operator new(std::size_t size)
 {
     if (allocationsLeft == 0)
@@ -26,18 +26,21 @@ void* operator new(std::size_t size)
     throw std::bad_alloc();
 }
 
+void* operator new(std::size_t size, std::nothrow_t const&) noexcept
+try
+{
+    return operator new(size);
+}
+catch (std::bad_alloc const&)
+{
+    return nullptr;
+}
+
 void* operator new[](std::size_t size) { return operator new(size); }
 
 void* operator new[](std::size_t size, std::nothrow_t const&) noexcept
 {
-    try
-    {
-        return operator new(size);
-    }
-    catch (std::bad_alloc const&)
-    {
-        return nullptr;
-    }
+    return operator new(size, std::nothrow);
 }
 
 void operator delete(void* memory) noexcept { std::free(memory); }

@@ -1,8 +1,8 @@
 // Reads, writes and deletions that go from the session to the container's slots.
 #include "comgui/session/ComGUIManager.h"
 
-#include "tests/session/FakeModule.h"
 #include "tests/session/Faults.h"
+#include "tests/session/Tickets.h"
 #include <cstring>
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
@@ -14,43 +14,6 @@ namespace
 {
 char key[] = "Key";
 char const Umlaut[] = "K\xC3\xA4y";
-
-// Logged in, with the fake as the session's container and another one beside it.
-class Tickets : public WithManager
-{
-protected:
-    Tickets()
-    {
-        LogIn();
-        Reset();
-    }
-
-    void Reset()
-    {
-        module.calls.clear();
-        fake.calls.clear();
-        other.calls.clear();
-    }
-
-    // Logged in, and no container.
-    void LoseTheContainer()
-    {
-        module.container = nullptr;
-        manager.Login(nullptr, nullptr, nullptr, -1);
-    }
-
-    ContainerFake other;
-};
-
-class TicketsLoggedOut : public Tickets
-{
-protected:
-    TicketsLoggedOut()
-    {
-        manager.Logout();
-        Reset();
-    }
-};
 
 using TicketsDeathTest = Tickets;
 

@@ -1,0 +1,63 @@
+#include "comgui/session/SetDataHolder.h"
+
+#undef NDEBUG  // declares what assert() calls; builds without assertions end here, too
+#include <cassert>
+#include <cstdlib>
+#include <cstring>
+
+namespace
+{
+// What assert(this->m_value) does; not the macro, since it would tell another name of function and source.
+[[noreturn]] void Fail(unsigned int line)
+{
+    constexpr char Expression[] = "this->m_value";
+    constexpr char Function[] = "SetDataHolder";
+    constexpr char Source[] = "Ticket Server Layer/ComGUIManager";
+#ifdef __APPLE__
+    __assert_rtn(Function, Source, static_cast<int>(line), Expression);
+#else
+    __assert_fail(Expression, Source, line, Function);
+#endif
+}
+
+// room: bytes of the copy, zero behind those of the value.
+void* Copy(void const* value, std::size_t size, std::size_t room, unsigned int line)
+{
+    void* const copy = std::calloc(1, room);
+    if (!copy)
+        Fail(line);
+    return std::memcpy(copy, value, size);
+}
+
+// The text is going to be read as a wide one. It has room for such a text's end, so that what is read is no
+// text, but the holder's own memory.
+std::size_t RoomOfText(std::size_t size)
+{
+    constexpr std::size_t Wide = sizeof(wchar_t);
+    return (size / Wide + 2) * Wide;
+}
+}  // namespace
+
+SetDataHolder::SetDataHolder(wxString keyText, PARAM_TYPE type, void* value, int pos)
+{
+    std::memset(static_cast<void*>(this), 0,
+                sizeof *this);  // all of it, what lies between the fields as well
+    std::strcpy(key, keyText.utf8_str());
+    m_type = type;
+    m_pos = pos;
+    if (type == PARAM_INT)
+        m_value = Copy(value, sizeof(int), sizeof(int), __LINE__);
+    else if (type == PARAM_DOUBLE)
+        m_value = Copy(value, sizeof(double), sizeof(double), __LINE__);
+    else if (type == PARAM_STRING)
+    {
+        std::size_t const size = std::strlen(static_cast<char const*>(value)) + 1;
+        m_value = Copy(value, size, RoomOfText(size), __LINE__);
+    }
+}
+
+SetDataHolder::~SetDataHolder()
+{
+    std::free(m_value);
+    m_value = nullptr;
+}

@@ -1,0 +1,166 @@
+#include "examples/FormValue.h"
+
+#include <algorithm>
+#include <cctype>
+#include <cerrno>
+#include <charconv>
+#include <cmath>
+#include <cstdlib>
+#include <limits>
+
+namespace
+{
+struct TYPE_NAME
+{
+    PARAM_TYPE type;
+    char const* name;
+    bool isWritten;
+};
+
+constexpr TYPE_NAME Types[] = {
+    {PARAM_INT, "int", true},           {PARAM_DOUBLE, "double", true},
+    {PARAM_STRING, "text", true},       {PARAM_INT64, "int64", true},
+    {PARAM_UNSIGNED, "unsigned", true}, {PARAM_UNSIGNED64, "unsigned64", true},
+    {PARAM_BINSTRING, "bytes", false},  {PARAM_POINTER, "pointer", false},
+    {PARAM_COUNT, "list", false},
+};
+
+// As it can stand within a line.
+std::string Quoted(std::string text)
+{
+    bool const isUtf8 = text.empty() || !wxString::FromUTF8(text.c_str()).empty();
+    std::replace_if(
+        text.begin(), text.end(), [=](unsigned char c) { return c < ' ' || (c > '~' && !isUtf8); }, '?');
+    return "\"" + text + "\"";
+}
+
+[[noreturn]] void Refuse(std::string const& key, PARAM_TYPE type, std::string const& text)
+{
+    throw Refusal(key + ": " + Quoted(text) + " is not what it takes: " + WhatItTakes(type));
+}
+
+template <typename Number>
+std::string Range(char const* name)
+{
+    using Limits = std::numeric_limits<Number>;
+    return std::string(name) + ", a whole number from " + std::to_string(Limits::min()) + " to " +
+           std::to_string(Limits::max());
+}
+
+template <typename Number>
+void AddWhole(SETMULTIPAR_LIST& list, std::string const& key, PARAM_TYPE type, std::string const& text,
+              int pos)
+{
+    Number number = 0;
+    auto const [end, error] = std::from_chars(text.data(), text.data() + text.size(), number);
+    if (error != std::errc() || end != text.data() + text.size())
+        Refuse(key, type, text);
+    list.xSetParameter(key.c_str(), type, &number, pos);
+}
+
+void AddDouble(SETMULTIPAR_LIST& list, std::string const& key, std::string const& text, int pos)
+{
+    char* end = nullptr;
+    errno = 0;
+    double const number = std::strtod(text.c_str(), &end);
+    bool const isWhole = !text.empty() && std::isspace(static_cast<unsigned char>(text[0])) == 0 &&
+                         end == text.c_str() + text.size();
+    // The server takes what is no number for a missing one.
+    if (!isWhole || !std::isfinite(number))
+        Refuse(key, PARAM_DOUBLE, text);
+    list.SetParameter(key.c_str(), number, pos);
+}
+}  // namespace
+
+char const* NameOf(int type)
+{
+    for (TYPE_NAME const& known : Types)
+        if (known.type == type)
+            return known.name;
+    return "none";
+}
+
+PARAM_TYPE TypeOf(std::string const& name)
+{
+    std::string names;
+    for (TYPE_NAME const& known : Types)
+    {
+        if (!known.isWritten)
+            continue;
+        if (known.name == name)
+            return known.type;
+        names += names.empty() ? "" : ", ";
+        names += known.name;
+    }
+    throw Refusal("there is no type " + Quoted(name) + "; the types are " + names);
+}
+
+std::string WhatItTakes(PARAM_TYPE type)
+{
+    switch (type)
+    {
+    case PARAM_INT:
+        return Range<int>("an int");
+    case PARAM_UNSIGNED:
+        return Range<unsigned int>("an unsigned");
+    case PARAM_INT64:
+        return Range<long long>("an int64");
+    case PARAM_UNSIGNED64:
+        return Range<unsigned long long>("an unsigned64");
+    case PARAM_DOUBLE:
+        return "a double, a number such as -12.5 or 1e6";
+    case PARAM_STRING:
+        return "a text in UTF-8";
+    default:
+        return std::string("nothing from here, since it holds a ") + NameOf(type);
+    }
+}
+
+void AddValue(SETMULTIPAR_LIST& list, std::string const& key, PARAM_TYPE type, std::string const& text,
+              int pos)
+{
+    switch (type)
+    {
+    case PARAM_INT:
+        return AddWhole<int>(list, key, type, text, pos);
+    case PARAM_UNSIGNED:
+        return AddWhole<unsigned int>(list, key, type, text, pos);
+    case PARAM_INT64:
+        return AddWhole<long long>(list, key, type, text, pos);
+    case PARAM_UNSIGNED64:
+        return AddWhole<unsigned long long>(list, key, type, text, pos);
+    case PARAM_DOUBLE:
+        return AddDouble(list, key, text, pos);
+    case PARAM_STRING:
+        if (!text.empty() && wxString::FromUTF8(text.c_str()).empty())
+            Refuse(key, type, text);
+        list.SetParameter(key.c_str(), text, pos);
+        return;
+    default:
+        Refuse(key, type, text);
+    }
+}
+
+std::vector<std::string> SplitList(std::string const& text)
+{
+    std::vector<std::string> values;
+    if (text.empty())
+        return values;
+    bool isQuoted = false;
+    values.emplace_back();
+    for (std::size_t i = 0; i < text.size(); ++i)
+    {
+        bool const isQuote = text[i] == '"';
+        if (isQuote && isQuoted && i + 1 < text.size() && text[i + 1] == '"')
+            values.back() += text[++i];
+        else if (isQuote)
+            isQuoted = !isQuoted;
+        else if (text[i] == ',' && !isQuoted)
+            values.emplace_back();
+        else
+            values.back() += text[i];
+    }
+    if (isQuoted)
+        throw Refusal("a quote in " + text + " has no end; within quotes one is written twice");
+    return values;
+}

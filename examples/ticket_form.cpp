@@ -1,0 +1,225 @@
+// Shows and edits the tickets of a server in a terminal, as a form of a graphical client would. The command
+// line; the commands stand in a file of their own.
+#include "examples/FormCommands.h"
+#include <CLI/CLI.hpp>
+#include <algorithm>
+#include <climits>
+#include <csignal>
+#include <cstdio>
+#include <functional>
+#include <optional>
+#include <wx/init.h>
+
+char const ProgramName[] = "ticket_form";
+
+namespace
+{
+constexpr int LargestPosition = 0xFFFFFF;
+constexpr int LargestId = 0xFFFFFF;
+
+class CommandLine
+{
+public:
+    using COMMAND = std::function<void(SESSION const&)>;
+
+    explicit CommandLine(EndSignals const& end)
+    {
+        m_app.require_subcommand(0, 1);  // none is told below, once unknown words were
+        m_app.fallthrough();
+        m_app.add_option("-u,--user", m_options.user, "Log in as this user")->capture_default_str();
+        m_app.add_option("-p,--password", m_options.password, "With this password")->capture_default_str();
+        m_app.add_option("-s,--server", m_options.host, "At this host")->capture_default_str();
+        m_app.add_option("-o,--port", m_options.port, "And port")
+            ->capture_default_str()
+            ->check(CLI::Range(0, 65535));
+        m_app.add_flag("-j,--json", m_options.json, "Print JSON");
+        m_app.footer(
+            "A ticket is a TYPE and an ID, as 3 1 for job 1; types are 0 the system, 2 devices, 3 jobs, 7 "
+            "queues,\n12 papers, 17 users. ticket_form COMMAND --help tells more of a command.\n\n"
+            "  ticket_form keys 3 1\n"
+            "  ticket_form set 3 1 Job/Copies=25 'Job/Identification/Name=Spring, second run'\n"
+            "  ticket_form set-list 3 1 --type text 'Job/Notes=red,\"blue, then green\"'\n\n"
+            "Exit status: 0 all is well; 1 the answer is no: no such ticket or key, or a value that was "
+            "refused;\n2 a wrong command line, no server, no login.");
+        AddReading();
+        AddWriting();
+        AddWatch(end);
+    }
+
+    // Nothing, or the status with which to end at once.
+    std::optional<int> Parse(int argc, char** argv)
+    try
+    {
+        m_app.parse(argc, argv);
+        if (m_run)
+            return std::nullopt;
+        std::fprintf(stderr,
+                     "%s: the command is missing (list, keys, get, set, set-list, delete or watch); "
+                     "ticket_form --help tells how\n",
+                     ProgramName);
+        return Trouble;
+    }
+    catch (CLI::ParseError const& e)
+    {
+        if (e.get_exit_code() == 0)  // help
+            return m_app.exit(e);
+        std::string text = e.what();
+        std::replace(text.begin(), text.end(), '\n', ' ');
+        std::fprintf(stderr, "%s: %s; ticket_form --help tells how\n", ProgramName, text.c_str());
+        return Trouble;
+    }
+
+    OPTIONS const& Options() const { return m_options; }
+    void Run(SESSION const& session) const { m_run(session); }
+
+private:
+    CLI::App* AddCommand(char const* name, char const* description, char const* footer,
+                         void (*run)(SESSION const&, OPTIONS const&))
+    {
+        CLI::App* const command = m_app.add_subcommand(name, description);
+        command->footer(footer);
+        command->callback([this, run]
+                          { m_run = [this, run](SESSION const& session) { run(session, m_options); }; });
+        return command;
+    }
+
+    CLI::Option* AddType(CLI::App* command)
+    {
+        return command->add_option("TYPE", m_options.type, "Type of ticket")
+            ->check(CLI::Range(0, TicketTypes - 1));
+    }
+
+    CLI::Option* AddId(CLI::App* command)
+    {
+        return command->add_option("ID", m_options.id, "Its number")->check(CLI::Range(0, LargestId));
+    }
+
+    void AddTicket(CLI::App* command)
+    {
+        AddType(command)->required();
+        AddId(command)->required();
+    }
+
+    void AddPosition(CLI::App* command, char const* description)
+    {
+        command->add_option("--pos", m_options.pos, description)->check(CLI::Range(0, LargestPosition));
+    }
+
+    void AddReading()
+    {
+        AddType(AddCommand("list", "List the tickets of a type, or of all",
+                           "A line is type, id and the number of keys.", List));
+        CLI::App* const keys = AddCommand("keys", "Show a ticket: its keys with their types and values",
+                                          "Values are shown as JSON; null is a gap in a list.", Keys);
+        AddTicket(keys);
+        keys->add_option("PREFIX", m_options.key, "Only the keys that begin so");
+        CLI::App* const get =
+            AddCommand("get", "Print the value of a key",
+                       "A text is printed as it is, a list as one line a value, an empty one "
+                       "for a gap.\nFolders come as paths, without $(VARIABLE).",
+                       Get);
+        AddTicket(get);
+        get->add_option("KEY", m_options.key, "As keys shows it")->required();
+        AddPosition(get, "Only the value at this position of a list, from 0 up");
+    }
+
+    void AddFields(CLI::App* command, char const* description)
+    {
+        AddTicket(command);
+        command->add_option("KEY=VALUE", m_options.fields, description)->required();
+        command->add_option("-t,--type", m_options.typeName,
+                            "int, double, text, int64, unsigned or unsigned64, for new keys or another type");
+    }
+
+    void AddWriting()
+    {
+        CLI::App* const set = AddCommand(
+            "set", "Write values, each by the type that its key has",
+            "All values are checked before one is written. A key that is not there yet needs --type.", Set);
+        AddFields(set, "What to write");
+        AddPosition(set, "Write this position of a list, from 0 up");
+        AddFields(
+            AddCommand("set-list", "Write whole lists",
+                       "KEY=a,b,c puts three values under KEY instead of what was there; KEY= deletes it. "
+                       "Quotes keep\ncommas: KEY='a,\"b,c\"' are two values; a quote within quotes is "
+                       "written twice.",
+                       SetList),
+            "The key, and its values with commas between them");
+        CLI::App* const remove =
+            AddCommand("delete", "Delete a key, or one value of a list",
+                       "Within a list a gap stays; at its end the list gets shorter.", Delete);
+        AddTicket(remove);
+        remove->add_option("KEY", m_options.key, "As keys shows it")->required();
+        AddPosition(remove, "Only the value at this position, from 0 up");
+    }
+
+    void AddWatch(EndSignals const& end)
+    {
+        CLI::App* const watch = AddCommand(
+            "watch", "Print what changes in a ticket, or in all of a type, until Ctrl-C",
+            "A line is type, id, key, what happened and the value. With --json each line is an object.",
+            nullptr);
+        watch->callback(
+            [this, &end]
+            { m_run = [this, &end](SESSION const& session) { Watch(session, m_options, end); }; });
+        AddType(watch)->required();
+        CLI::Option* const id = AddId(watch);
+        watch->add_option("-n,--events", m_options.events, "End after so many; 0 is no limit")
+            ->check(CLI::Range(0, INT_MAX));
+        watch->add_flag("-e,--edit", m_options.edit, "Write lines KEY=VALUE of standard input meanwhile")
+            ->needs(id);
+    }
+
+    OPTIONS m_options;
+    CLI::App m_app{"Shows and edits the tickets of a server, as a form does.", ProgramName};
+    COMMAND m_run;
+};
+
+int Run(CommandLine const& commandLine)
+{
+    OPTIONS const& options = commandLine.Options();
+    ComGUIManager* const manager = ComGUIManager::GetInstance();
+    if (!IsPlugInThere())
+        return Trouble;
+    SERVER server;
+    server.host = wxString::FromUTF8(options.host.c_str());
+    server.port = options.port;
+    TLogin* const login = NewRecord(options.user.c_str(), options.password.c_str(), server);
+    if (!LogIn(*manager, login))
+        return Trouble;
+    int status = Good;
+    try
+    {
+        commandLine.Run({*manager, login, manager->GetClientContainer()});
+    }
+    catch (std::exception const& e)
+    {
+        std::fprintf(stderr, "%s: %s\n", ProgramName, e.what());
+        status = dynamic_cast<Refusal const*>(&e) ? Refused : Trouble;
+    }
+    manager->Logout();  // and no Uninitialize, which waits: the process ends here anyway
+    return status;
+}
+}  // namespace
+
+int main(int argc, char** argv)
+try
+{
+    std::signal(SIGPIPE, SIG_IGN);
+    EndSignals const end;
+    wxInitializer const wx;  // without the arguments, of which it would warn where they are no UTF-8
+    if (!wx.IsOk())
+    {
+        std::fputs("ticket_form: wxWidgets cannot be started\n", stderr);
+        return Trouble;
+    }
+    CommandLine commandLine(end);
+    if (auto const status = commandLine.Parse(argc, argv))
+        return *status;
+    return Run(commandLine);
+}
+catch (std::exception const& e)
+{
+    std::fprintf(stderr, "ticket_form: %s\n", e.what());
+    return Trouble;
+}
