@@ -44,7 +44,6 @@ void ListType(SESSION const& session, int type, Json& all)
                        {"id", id},
                        {"keys", TicketForm(session.manager, session.container, type, id).Keys().size()}});
 }
-
 }  // namespace
 
 void List(SESSION const& session, OPTIONS const& options)
@@ -89,7 +88,6 @@ void PrintFields(Json const& fields)
         Print(Bold(key) + "  " + Dim(type) + "  " + Line(field["value"]));
     }
 }
-
 }  // namespace
 
 void Keys(SESSION const& session, OPTIONS const& options)
@@ -142,7 +140,10 @@ PARAM_TYPE TypeFor(TicketForm const& form, std::string const& key, OPTIONS const
     if (field.type != PARAM_COUNT)
         return field.type;
     PARAM_TYPE const stored = options.pos == WholeKey ? PARAM_NONE : form.TypeAt(key, options.pos);
-    return stored == PARAM_NONE ? field.elementType : stored;
+    PARAM_TYPE const type = stored == PARAM_NONE ? field.elementType : stored;
+    if (type == PARAM_NONE)
+        throw Refusal(key + " begins with a gap, which has no type; say --type");
+    return type;
 }
 
 void AddFields(SETMULTIPAR_LIST& list, TicketForm const& form, OPTIONS const& options)
@@ -153,7 +154,6 @@ void AddFields(SETMULTIPAR_LIST& list, TicketForm const& form, OPTIONS const& op
         AddValue(list, key, TypeFor(form, key, options, false), value, options.pos);
     }
 }
-
 }  // namespace
 
 // All of them are checked before one is written.
@@ -283,7 +283,7 @@ void WriteLines(SESSION const& session, OPTIONS const& options)
         char bytes[4096];
         ssize_t const size = read(STDIN_FILENO, bytes, sizeof bytes);
         if (size <= 0)
-            return;
+            return line.empty() ? void() : WriteLine(session, options, line);
         for (char const byte : std::string(bytes, static_cast<std::size_t>(size)))
             if (byte != '\n')
                 line += byte;
@@ -291,7 +291,6 @@ void WriteLines(SESSION const& session, OPTIONS const& options)
                 WriteLine(session, options, std::exchange(line, {}));
     }
 }
-
 }  // namespace
 
 void Watch(SESSION const& session, OPTIONS const& options, EndSignals const& end)
