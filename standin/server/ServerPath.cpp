@@ -38,8 +38,8 @@ std::optional<Identity> IdentityOf(std::optional<std::string> const& folder)
 class Way
 {
 public:
-    Way(FolderTable const& table, Purpose purpose, std::string shown)
-        : m_purpose(purpose), m_install(IdentityOf(table.FolderOf("INSTALL"))),
+    Way(FolderTable const& table, Purpose purpose, std::string const& site, std::string shown)
+        : m_purpose(purpose), m_site(IdentityOf(site)), m_install(IdentityOf(table.FolderOf("INSTALL"))),
           m_job(IdentityOf(table.FolderOf("JOB"))), m_shown(std::move(shown))
     {
     }
@@ -81,15 +81,17 @@ private:
     void Check() const
     {
         struct stat found = {};
-        fstat(m_folder.Number(), &found);
+        if (fstat(m_folder.Number(), &found) != 0)
+            Refuse(m_shown, FileError("a folder on the way", "cannot be looked at", errno).what());
         Identity const identity{found.st_dev, found.st_ino};
-        if (m_install == identity)
+        if (m_site == identity || m_install == identity)
             Refuse(m_shown, "the server keeps its own files there; choose another folder");
         if (m_purpose == Purpose::Write && m_job == identity)
             Refuse(m_shown, "jobs are sent, not put; choose another folder");
     }
 
     Purpose m_purpose;
+    std::optional<Identity> m_site;
     std::optional<Identity> m_install;
     std::optional<Identity> m_job;
     std::string m_shown;
@@ -139,7 +141,8 @@ ServerPath ServerPath::Parse(std::string text, std::string_view leaf)
     return path;
 }
 
-Descriptor OpenFolderOf(ServerPath const& path, FolderTable const& table, Purpose purpose)
+Descriptor OpenFolderOf(ServerPath const& path, FolderTable const& table, Purpose purpose,
+                        std::string const& site)
 {
     std::string const shown = "$(" + path.variable + ")";
     auto const root = table.FolderOf(path.variable);
@@ -147,7 +150,7 @@ Descriptor OpenFolderOf(ServerPath const& path, FolderTable const& table, Purpos
         Refuse(shown, "no such folder variable, or one without a folder; see the system ticket");
     if (!root->starts_with('/'))
         Refuse(shown, "its folder is no absolute path; correct it in the system ticket");
-    Way way(table, purpose, shown + "/" + path.name);
+    Way way(table, purpose, site, shown + "/" + path.name);
     way.Begin(*root);
     for (std::string const& folder : path.folders)
         way.Enter(folder);
