@@ -47,8 +47,11 @@ public:
     void Begin(std::string const& folder)
     {
         m_folder = Descriptor(open(folder.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
+        int const reason = errno;
+        if (m_folder.Number() < 0 && (reason == ENOENT || reason == ENOTDIR))
+            Refuse(m_shown, FileError(folder, "the folder of the variable is not there", reason).what());
         if (m_folder.Number() < 0)
-            Refuse(m_shown, FileError(folder, "the folder of the variable cannot be opened", errno).what());
+            FailAtFolder(folder, reason);
         Check();
     }
 
@@ -60,9 +63,7 @@ public:
         if (below.Number() < 0 && IsLink(name))
             Refuse(m_shown, "there is a symbolic link on the way; name the folder that it points at");
         if (below.Number() < 0)
-            throw TransferError(
-                m_purpose == Purpose::Read ? SourceUnreadable : TargetUnwritable,
-                FileError(m_shown, "the folder " + name + " cannot be opened", reason).what());
+            FailAtFolder(name, reason);
         m_folder = std::move(below);
         Check();
     }
@@ -70,6 +71,12 @@ public:
     Descriptor Taken() { return std::move(m_folder); }
 
 private:
+    [[noreturn]] void FailAtFolder(std::string const& folder, int reason) const
+    {
+        throw TransferError(m_purpose == Purpose::Read ? SourceUnreadable : TargetUnwritable,
+                            FileError(m_shown, "the folder " + folder + " cannot be opened", reason).what());
+    }
+
     bool IsLink(std::string const& name) const
     {
         struct stat found = {};

@@ -494,6 +494,20 @@ TEST_F(Places, FolderOfTheVariable_MustBeAbsoluteAndThere)
     EXPECT_EQ(Put(file, "$(EXPORT)/b"), Transferred);
 }
 
+TEST_F(Places, FolderOfTheVariable_ThatMayNotBeOpenedIsNoFaultOfThePath)
+{
+    std::string const file = Write("a", "content");
+    chmod(Temp().c_str(), 0);
+    if (geteuid() == 0)
+        setfsuid(65534);
+    TransferService::Request const later{TransferService::Request::ToServer, file, "$(TEMP)/a"};
+    EXPECT_EQ(Said([&] { return Server().Transfers().CarryLater(As("operator"), later); }), TargetUnwritable);
+    EXPECT_EQ(Get("$(TEMP)/a", Client("b")), SourceUnreadable);
+    setfsuid(geteuid());
+    chmod(Temp().c_str(), 0700);
+    EXPECT_THAT(said, HasSubstr("right"));
+}
+
 TEST_F(Places, LinksBelowTheFolder_AreNotFollowed)
 {
     std::string const file = Write("a", "content");
