@@ -45,6 +45,7 @@ private:
     struct FIGURES
     {
         std::vector<double> nanoseconds;
+        std::vector<double> elapsed;
         std::vector<double> bytes;
     };
 
@@ -52,6 +53,7 @@ private:
     {
         FIGURES& taken = figures[run.run_name.str()];
         taken.nanoseconds.push_back(run.cpu_accumulated_time * 1e9 / static_cast<double>(run.iterations));
+        taken.elapsed.push_back(run.real_accumulated_time * 1e9 / static_cast<double>(run.iterations));
         auto const bytes = run.counters.find(BytesARecord);
         if (bytes != run.counters.end())
             taken.bytes.push_back(bytes->second);
@@ -62,8 +64,9 @@ private:
         auto const found = figures.find(name);
         if (found == figures.end())
             return nullptr;
-        std::vector<double> const& values =
-            kind == GOAL::CPU_TIME ? found->second.nanoseconds : found->second.bytes;
+        std::vector<double> const& values = kind == GOAL::CPU_TIME       ? found->second.nanoseconds
+                                            : kind == GOAL::ELAPSED_TIME ? found->second.elapsed
+                                                                         : found->second.bytes;
         return values.empty() ? nullptr : &values;
     }
 
@@ -79,7 +82,7 @@ private:
                     ratio <= goal.most ? "yes" : "NO");
     }
 
-    static char const* Unit(GOAL const& goal) { return goal.kind == GOAL::CPU_TIME ? "ns" : "bytes"; }
+    static char const* Unit(GOAL const& goal) { return goal.kind == GOAL::BYTES_A_RECORD ? "bytes" : "ns"; }
 
     std::map<std::string, FIGURES> figures;
     bool failed = false;

@@ -1,16 +1,19 @@
 // What a file costs on its way through the library and the stand-in server, beside cp of the same file to
-// the same disk. The two take turns, so that a busy disk is busy for both, and the middle of the rounds
-// counts. Neither waits for the disk in the end.
-//
-//     transfer_bench [MiB [rounds]]     1024 MiB and 5 rounds unless told
+// the same disk. cp is another process, so the time that passes counts. Neither waits for the disk in the
+// end. Let them take turns, so that a busy disk is busy for both: --benchmark_repetitions=5
+// --benchmark_enable_random_interleaving=true.
+#include "bench/ratio_report.h"
+
 #include <comgui/comgui.h>
 
 #include <algorithm>
+#include <benchmark/benchmark.h>
 #include <chrono>
 #include <cstdio>
 #include <cstdlib>
 #include <filesystem>
 #include <fstream>
+#include <functional>
 #include <random>
 #include <spawn.h>
 #include <stdexcept>
@@ -41,18 +44,9 @@ void WriteFile(fs::path const& file, std::size_t mebibytes)
         Fail("the file to be sent cannot be written");
 }
 
-template <typename Work>
-double SecondsOf(Work const& work)
-{
-    auto const begin = std::chrono::steady_clock::now();
-    work();
-    return std::chrono::duration<double>(std::chrono::steady_clock::now() - begin).count();
-}
-
-void CopyByCp(std::string const& from, std::string const& to)
+void CopyByCp(std::string source, std::string const& to)
 {
     std::string program = "cp";
-    std::string source = from;
     std::string target = to;
     char* const arguments[] = {program.data(), source.data(), target.data(), nullptr};
     pid_t child = 0;
@@ -60,12 +54,6 @@ void CopyByCp(std::string const& from, std::string const& to)
     if (posix_spawnp(&child, "cp", nullptr, nullptr, arguments, environ) != 0 ||
         waitpid(child, &status, 0) != child || status != 0)
         Fail("cp has failed");
-}
-
-double MedianOf(std::vector<double> seconds)
-{
-    std::sort(seconds.begin(), seconds.end());
-    return seconds[seconds.size() / 2];
 }
 
 void LogIn()
@@ -76,66 +64,81 @@ void LogIn()
         Fail("cannot log in to the stand-in server");
 }
 
-void Put(std::string from)
+// The folder of a run, with the source and the site. On a disk: /tmp may be memory.
+class PLACE
 {
-    char target[] = "$(TEMP)/put";
+public:
+    PLACE() : folder(fs::current_path() / ("transfer_bench-" + std::to_string(getpid())))
+    {
+        fs::create_directory(folder);
+        setenv("COMGUI_SITE", (folder / "site").c_str(), 1);
+    }
+    ~PLACE()
+    {
+        std::error_code ignored;
+        fs::remove_all(folder, ignored);
+    }
+    PLACE(PLACE const&) = delete;
+    PLACE& operator=(PLACE const&) = delete;
+
+    std::string Source() const { return folder / "source"; }
+    std::string Target() const { return folder / "site" / "temp" / "target"; }
+
+private:
+    fs::path folder;
+};
+
+void CopyByPut(std::string from, std::string const&)
+{
+    char target[] = "$(TEMP)/target";
     if (ComGUIManager::GetInstance()->PutFileSync(from.data(), target) != 0)
         Fail("PutFileSync has failed");
 }
 
-void Measure(fs::path const& folder, std::size_t mebibytes, int rounds)
+using COPY = void (*)(std::string source, std::string const& target);
+
+// The measured time is that of the copy alone, each into a new file and with nothing left to write.
+void Measure(benchmark::State& state, PLACE const& place, COPY copy)
 {
-    std::string const source = folder / "source";
-    fs::path const temp = folder / "site" / "temp";
-    WriteFile(source, mebibytes);
-    LogIn();
-    std::vector<double> cp;
-    std::vector<double> put;
-    for (int round = 0; round <= rounds; ++round)
+    for (auto _ : state)
     {
-        fs::remove(temp / "copied");
-        fs::remove(temp / "put");
-        ::sync();  // what earlier rounds left to write
-        double const byCp = SecondsOf([&] { CopyByCp(source, temp / "copied"); });
+        fs::remove(place.Target());
         ::sync();
-        double const byPut = SecondsOf([&] { Put(source); });
-        if (fs::file_size(temp / "put") != fs::file_size(source))
-            Fail("the file has not arrived");
-        if (round == 0)
-            continue;  // the source had to come into memory first
-        cp.push_back(byCp);
-        put.push_back(byPut);
+        auto const begin = std::chrono::steady_clock::now();
+        copy(place.Source(), place.Target());
+        auto const end = std::chrono::steady_clock::now();
+        state.SetIterationTime(std::chrono::duration<double>(end - begin).count());
+        if (fs::file_size(place.Target()) != fs::file_size(place.Source()))
+            return state.SkipWithError("the file has not arrived");
     }
-    auto const rate = [&](double seconds) { return static_cast<double>(mebibytes) / seconds; };
-    double const ratio = MedianOf(put) / MedianOf(cp);
-    std::printf("| %zu MiB | seconds | MiB/s |\n|---|---|---|\n", mebibytes);
-    std::printf("| cp | %.3f | %.0f |\n", MedianOf(cp), rate(MedianOf(cp)));
-    std::printf("| PutFileSync | %.3f | %.0f |\n", MedianOf(put), rate(MedianOf(put)));
-    std::printf("\nPutFileSync by cp: %.2f (goal: 1.5 at most%s)\n", ratio, ratio <= 1.5 ? "" : ", NOT MET");
+    state.SetBytesProcessed(state.iterations() * static_cast<std::int64_t>(fs::file_size(place.Source())));
 }
 }  // namespace
 
 int main(int argc, char** argv)
+try
 {
-    std::size_t const mebibytes = argc > 1 ? std::strtoul(argv[1], nullptr, 10) : 1024;
-    int const rounds = argc > 2 ? static_cast<int>(std::strtol(argv[2], nullptr, 10)) : 5;
-    if (mebibytes == 0 || rounds < 1)
-        return std::fputs("usage: transfer_bench [MiB [rounds]]\n", stderr), 1;
-    // On a disk, beside which /tmp may be memory.
-    fs::path const folder = fs::current_path() / ("transfer_bench-" + std::to_string(getpid()));
-    fs::create_directory(folder);
-    setenv("COMGUI_SITE", (folder / "site").c_str(), 1);
-    int result = 0;
-    try
+    constexpr std::size_t MiB = 1024;
+    PLACE const place;
+    WriteFile(place.Source(), MiB);  // which brings it into memory, too
+    LogIn();
+    auto const add = [&place](char const* name, COPY copy)
     {
-        Measure(folder, mebibytes, rounds);
-        ComGUIManager::GetInstance()->Logout();
-    }
-    catch (std::exception const& error)
-    {
-        std::fprintf(stderr, "transfer_bench: %s\n", error.what());
-        result = 1;
-    }
-    fs::remove_all(folder);
+        benchmark::RegisterBenchmark(name, Measure, std::cref(place), copy)
+            ->Iterations(1)
+            ->UseManualTime()
+            ->Unit(benchmark::kMillisecond);
+    };
+    add("PutFileSync/1GiB", CopyByPut);
+    add("cp/1GiB", CopyByCp);
+    int const result = RunAndReport(argc, argv,
+                                    {{"put, 1 GiB", "PutFileSync/1GiB/iterations:1/manual_time",
+                                      "cp/1GiB/iterations:1/manual_time", 1.5, GOAL::ELAPSED_TIME}});
+    ComGUIManager::GetInstance()->Logout();
     return result;
+}
+catch (std::exception const& error)
+{
+    std::fprintf(stderr, "transfer_bench: %s\n", error.what());
+    return 1;
 }

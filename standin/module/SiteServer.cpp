@@ -32,6 +32,7 @@ std::filesystem::path ShippedSeed()
 OpenSite::OpenSite(std::filesystem::path const& folder)
     : site(Site::Open(folder, ShippedSeed())), server(site.storage(), [this] { site.MirrorSystemTicket(); })
 {
+    server.Transfers().KeepOut(site.folder());
 }
 
 using Sites = std::map<std::filesystem::path, std::unique_ptr<OpenSite>>;

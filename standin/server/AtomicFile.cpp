@@ -25,8 +25,9 @@ char const* RemedyOf(int error)
         return "free some space, then try again";
     case EACCES:
     case EPERM:
+        return "give this user the right to it and to its folder";
     case EROFS:
-        return "make its folder one that this user may write to";
+        return "choose a folder that can be written to";
     case ENOTDIR:
         return "move away the file that stands where a folder is needed, or choose another folder";
     case ENOENT:

@@ -23,6 +23,10 @@ public:
     }
     int Number() const { return m_number; }
 
+    // For who has written: what did not reach a disk elsewhere, or is above a quota, may turn out only now.
+    // False if so, and errno tells why; closed it is all the same.
+    bool Close() { return close(std::exchange(m_number, -1)) == 0; }
+
 private:
     int m_number;
 };

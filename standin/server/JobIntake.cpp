@@ -99,14 +99,16 @@ private:
 };
 }  // namespace
 
-TicketServer::MadeTicket JobIntake::Make(Session const& session, Announcement const& announcement)
+JobIntake::Job JobIntake::Make(Session const& session, Announcement const& announcement)
 {
     std::string const endPoint = session.EndPoint();
+    std::string const mark = NewJobMark();
     int const yes = 1;
     int const announced = 0;
     Table table;
     table.Put(JobPreparedKey, yes).Put(StateKey, announced).Put(NameKey, announcement.name);
     table.Put(UserKey, session.Who().name).Put(EndPointKey, endPoint);
+    table.Put(JobMarkKey, mark);
     if (m_server.Exists({QueueTicketType, announcement.queue}))
         table.Put("Job/Queue", announcement.queue);
     if (announcement.copies > 0)
@@ -114,7 +116,7 @@ TicketServer::MadeTicket JobIntake::Make(Session const& session, Announcement co
     auto const ticket = m_server.Make(JobTicketType, table.Records());
     if (!ticket)
         throw TransferError(TargetUnwritable, "no ticket can be made for a job; see the line before");
-    return *ticket;
+    return {*ticket, mark};
 }
 
 TransferResult JobIntake::Prepare(Session const& session, Announcement const& announcement, int& id)
@@ -125,17 +127,21 @@ TransferResult JobIntake::Prepare(Session const& session, Announcement const& an
                                         CheckName(announcement.name);
                                         std::lock_guard const lock(m_lock);
                                         m_prepared.reserve(m_prepared.size() + 1);
-                                        auto const ticket = Make(session, announcement);
-                                        m_prepared.push_back({session.Number(), announcement, ticket});
-                                        id = ticket.address.id;
+                                        Job const job = Make(session, announcement);
+                                        m_prepared.push_back({session.Number(), announcement, job});
+                                        id = job.ticket.address.id;
                                     });
 }
 
-std::optional<TicketServer::MadeTicket> JobIntake::Claim(Session const& session, std::string const& name)
+std::optional<JobIntake::Job> JobIntake::Claim(Session const& session, std::string const& name)
 {
     std::lock_guard const lock(m_lock);
-    std::erase_if(m_prepared, [&](Prepared const& prepared)
-                  { return m_server.BirthOf(prepared.ticket.address) != prepared.ticket.birth; });
+    std::erase_if(m_prepared,
+                  [&](Prepared const& prepared)
+                  {
+                      TicketServer::MadeTicket const& ticket = prepared.job.ticket;
+                      return m_server.BirthOf(ticket.address) != ticket.birth;
+                  });
     auto const found = std::find_if(m_prepared.rbegin(), m_prepared.rend(),
                                     [&](Prepared const& prepared)
                                     {
@@ -145,9 +151,9 @@ std::optional<TicketServer::MadeTicket> JobIntake::Claim(Session const& session,
                                     });
     if (found == m_prepared.rend())
         return std::nullopt;
-    auto const ticket = found->ticket;
+    Job job = std::move(found->job);
     m_prepared.erase(std::next(found).base());
-    return ticket;
+    return job;
 }
 
 TransferResult JobIntake::Send(Session const& session, std::string const& clientPath, std::string const& name)
@@ -155,37 +161,57 @@ TransferResult JobIntake::Send(Session const& session, std::string const& client
     return m_server.Transfers().Run(session,
                                     [&](RunningTransfer const& running)
                                     {
-                                        auto ticket = Claim(session, name);
+                                        auto job = Claim(session, name);
                                         try
                                         {
                                             CheckName(name);
                                             SourceFile const source = SourceOf(clientPath);
-                                            if (!ticket)
-                                                ticket = Make(session, {name});
-                                            Receive(session, *ticket, source, name, running);
+                                            if (!job)
+                                                job = Make(session, {name});
+                                            Receive(session, *job, source, name, running);
                                         }
                                         catch (...)
                                         {
-                                            if (ticket)
-                                                m_server.Remove(*ticket);
+                                            if (job)
+                                                Drop(*job);
                                             throw;
                                         }
                                     });
 }
 
-void JobIntake::Receive(Session const& session, TicketServer::MadeTicket const& ticket,
-                        SourceFile const& source, std::string const& name, RunningTransfer const& running)
+// The ticket first: it must not tell of a file that is gone.
+void JobIntake::Drop(Job const& job)
 {
-    FolderTable const folders = m_server.Folders();
-    Descriptor folder;
+    bool const isGone =
+        m_server.Remove(job.ticket) || m_server.BirthOf(job.ticket.address) != job.ticket.birth;
+    if (isGone && job.folders)  // where $(JOB) was then: it may have been moved
+        RemoveJobFolder(*job.folders, job.ticket.address.id, job.mark);
+}
+
+void JobIntake::Receive(Session const& session, Job& job, SourceFile const& source, std::string const& name,
+                        RunningTransfer const& running)
+{
+    TicketServer::MadeTicket const& ticket = job.ticket;
     int const id = ticket.address.id;
+    Descriptor folder;
+    auto const begin = [&](FolderTable const& folders)
+    {
+        folder = MakeJobFolder(folders, id, job.mark);
+        job.folders = folders;
+    };
     // Together, since whoever deletes the ticket takes the folder away with it.
-    if (!m_server.WhileItLasts(ticket, [&] { folder = MakeJobFolder(folders, id); }))
+    if (!m_server.WhileItLasts(ticket, begin))
         FailAsGone();
     PartFile file(folder.Number(), name);
     m_server.Transfers().Copy(file, source, running, ProgressReport(m_server, ticket, source.Size()));
+    auto const finish = [&](FolderTable const& folders)
+    {
+        if (folders.FolderOf("JOB") != job.folders->FolderOf("JOB"))
+            throw TransferError(TargetUnwritable, "$(JOB) was moved while a job came in; send the job anew");
+        file.Finish();
+    };
     // Under the lock too: in a folder that was deleted there is nothing to give a name.
-    if (!m_server.WhileItLasts(ticket, [&] { file.Finish(); }))
+    if (!m_server.WhileItLasts(ticket, finish))
         FailAsGone();
 
     std::string const jobFolder = "$(JOB)/" + std::to_string(id);
@@ -196,7 +222,7 @@ void JobIntake::Receive(Session const& session, TicketServer::MadeTicket const& 
     int const percent = 100;
     Table table;
     table.Put(NameKey, name).Put(UserKey, session.Who().name).Put(EndPointKey, endPoint);
-    table.Put("Job/File", jobFile).Put("Job/Folder", jobFolder).Put("Job/Size", PARAM_INT64, &size);
+    table.Put(JobFileKey, jobFile).Put("Job/Folder", jobFolder).Put("Job/Size", PARAM_INT64, &size);
     table.Put(StateKey, arrived).Put(ProgressKey, percent).Put(JobPreparedKey, PARAM_NONE, nullptr);
     WriteOrFail(m_server, ticket, table);
 }
@@ -206,7 +232,7 @@ void JobIntake::End(Session const& session)
     std::lock_guard const lock(m_lock);
     for (Prepared const& prepared : m_prepared)
         if (prepared.session == session.Number())
-            m_server.Remove(prepared.ticket);
+            m_server.Remove(prepared.job.ticket);
     std::erase_if(m_prepared, [&](Prepared const& prepared) { return prepared.session == session.Number(); });
 }
 }  // namespace standin

@@ -14,6 +14,7 @@ class RunningTransfer;
 class SourceFile;
 
 inline constexpr char JobPreparedKey[] = "Job/Prepared";
+inline constexpr char JobFileKey[] = "Job/File";  // once it is there
 
 class JobIntake
 {
@@ -40,17 +41,24 @@ public:
     void End(Session const& session);  // an ended one: what it has announced and not sent goes
 
 private:
+    struct Job
+    {
+        TicketServer::MadeTicket ticket;
+        std::string mark;                      // of its folder
+        std::optional<FolderTable> folders{};  // as they were when its folder was made
+    };
     struct Prepared
     {
         unsigned long long session;
         Announcement announcement;
-        TicketServer::MadeTicket ticket;
+        Job job;
     };
 
-    TicketServer::MadeTicket Make(Session const& session, Announcement const& announcement);
-    std::optional<TicketServer::MadeTicket> Claim(Session const& session, std::string const& name);
-    void Receive(Session const& session, TicketServer::MadeTicket const& ticket, SourceFile const& source,
-                 std::string const& name, RunningTransfer const& running);
+    Job Make(Session const& session, Announcement const& announcement);
+    std::optional<Job> Claim(Session const& session, std::string const& name);
+    void Receive(Session const& session, Job& job, SourceFile const& source, std::string const& name,
+                 RunningTransfer const& running);
+    void Drop(Job const& job);
 
     TicketServer& m_server;
     std::mutex m_lock;

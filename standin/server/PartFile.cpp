@@ -27,6 +27,22 @@ std::string NewPartName()
     return std::string(PartNameBeginning) + "." + std::to_string(getpid()) + "-" + std::to_string(counter++) +
            ".tmp";
 }
+
+// A name that is taken stays: another machine or container that shares the folder may have a process of the
+// same number, and what that is writing must not come under our file's name.
+Descriptor MakePartFile(int folder, std::string& name)
+{
+    for (;;)
+    {
+        name = NewPartName();
+        Descriptor file(openat(folder, name.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_CLOEXEC, 0666));
+        if (file.Number() >= 0 || errno != EEXIST)
+            return file;
+    }
+}
+
+// A terminal that is opened must not become the process's own, and a pipe not keep it waiting for a writer.
+constexpr int ToRead = O_RDONLY | O_NONBLOCK | O_NOCTTY | O_CLOEXEC;
 }  // namespace
 
 std::string ForMessages(std::string_view text)
@@ -51,9 +67,8 @@ void RemovePartFiles(std::filesystem::path const& folder, bool all)
     }
 }
 
-// Neither form waits for whoever writes to a pipe.
 SourceFile::SourceFile(int folder, std::string const& name)
-    : m_file(openat(folder, name.c_str(), O_RDONLY | O_NONBLOCK | O_NOFOLLOW | O_CLOEXEC))
+    : m_file(openat(folder, name.c_str(), ToRead | O_NOFOLLOW))
 {
     int const reason = errno;
     if (m_file.Number() < 0 && reason == ELOOP)
@@ -61,8 +76,7 @@ SourceFile::SourceFile(int folder, std::string const& name)
     Check(name, reason);
 }
 
-SourceFile::SourceFile(std::filesystem::path const& file)
-    : m_file(open(file.c_str(), O_RDONLY | O_NONBLOCK | O_CLOEXEC))
+SourceFile::SourceFile(std::filesystem::path const& file) : m_file(open(file.c_str(), ToRead))
 {
     int const reason = errno;
     Check(file.string(), reason);
@@ -91,12 +105,11 @@ PartFile::PartFile(int folder, std::string name) : m_folder(folder), m_name(std:
     if (!isThere && errno == ENAMETOOLONG)
         Fail(errno);
     if (isThere && S_ISLNK(old.st_mode))
-        throw TransferError(PathRefused, m_name + ": a symbolic link; name the file that it points at");
+        throw TransferError(PathRefused, Shown() + ": a symbolic link; name the file that it points at");
     if (isThere && !S_ISREG(old.st_mode))
-        throw TransferError(NotAFile, m_name + ": something else than a file has that name; choose another");
-    std::string partName = NewPartName();
-    unlinkat(folder, partName.c_str(), 0);  // left by a process of the same number that was killed
-    m_file = Descriptor(openat(folder, partName.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_CLOEXEC, 0666));
+        throw TransferError(NotAFile, Shown() + ": something else than a file has that name; choose another");
+    std::string partName;
+    m_file = MakePartFile(folder, partName);
     if (m_file.Number() < 0)
         Fail(errno);
     m_partName = std::move(partName);
@@ -113,7 +126,12 @@ PartFile::~PartFile()
 void PartFile::Fail(int reason) const
 {
     throw TransferError(reason == ENAMETOOLONG ? PathRefused : TargetUnwritable,
-                        FileError(m_name, "cannot be written", reason).what());
+                        FileError(Shown(), "cannot be written", reason).what());
+}
+
+void PartFile::FailAsCut() const
+{
+    throw TransferError(SourceUnreadable, Shown() + ": the source was cut while it was read; try again");
 }
 
 void PartFile::CopyFrom(SourceFile const& source, std::size_t piece,
@@ -134,7 +152,7 @@ void PartFile::CopyFrom(SourceFile const& source, std::size_t piece,
         Fail(errno);
     struct stat now = {};
     if (fstat(source.Number(), &now) != 0 || now.st_size < size)
-        throw TransferError(SourceUnreadable, m_name + ": the source was cut while it was read; try again");
+        FailAsCut();
     after(size);
 }
 
@@ -146,7 +164,7 @@ void PartFile::CopyRange(SourceFile const& source, off_t begin, off_t end, std::
         ssize_t const count =
             CopyPiece(source, begin, std::min(piece, static_cast<std::size_t>(end - begin)));
         if (count == 0)
-            return;  // the source has become shorter, which is told at the end
+            FailAsCut();  // now: by the end it may be as long as it was, with something else in it
         begin += count;
         after(begin);
     }
@@ -170,8 +188,9 @@ ssize_t PartFile::CopyPiece(SourceFile const& source, off_t at, std::size_t size
     do
         count = pread(source.Number(), m_buffer.data(), size, at);
     while (count < 0 && errno == EINTR);
+    int const reason = errno;
     if (count < 0)
-        throw TransferError(SourceUnreadable, FileError(m_name, "the source cannot be read", errno).what());
+        throw TransferError(SourceUnreadable, FileError(Shown(), "the source cannot be read", reason).what());
     for (ssize_t done = 0; done < count;)
     {
         ssize_t const written = pwrite(m_file.Number(), m_buffer.data() + done,
@@ -186,6 +205,8 @@ ssize_t PartFile::CopyPiece(SourceFile const& source, off_t at, std::size_t size
 // Not flushed to the disk: as with tickets, what is acknowledged outlives the process and not a power cut.
 void PartFile::Finish()
 {
+    if (!m_file.Close())
+        Fail(errno);
     if (renameat(m_folder, m_partName.c_str(), m_folder, m_name.c_str()) != 0)
         Fail(errno);
     m_partName.clear();

@@ -61,6 +61,8 @@ private:
                    std::function<void(off_t done)> const& after);
     ssize_t CopyPiece(SourceFile const& source, off_t at, std::size_t size);
     [[noreturn]] void Fail(int reason) const;
+    [[noreturn]] void FailAsCut() const;
+    std::string Shown() const { return ForMessages(m_name); }
 
     int m_folder;
     std::string m_name;

@@ -38,8 +38,8 @@ std::optional<Identity> IdentityOf(std::optional<std::string> const& folder)
 class Way
 {
 public:
-    Way(FolderTable const& table, Purpose purpose, std::string shown)
-        : m_purpose(purpose), m_install(IdentityOf(table.FolderOf("INSTALL"))),
+    Way(FolderTable const& table, Purpose purpose, std::string const& site, std::string shown)
+        : m_purpose(purpose), m_site(IdentityOf(site)), m_install(IdentityOf(table.FolderOf("INSTALL"))),
           m_job(IdentityOf(table.FolderOf("JOB"))), m_shown(std::move(shown))
     {
     }
@@ -47,8 +47,11 @@ public:
     void Begin(std::string const& folder)
     {
         m_folder = Descriptor(open(folder.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
+        int const reason = errno;
+        if (m_folder.Number() < 0 && (reason == ENOENT || reason == ENOTDIR))
+            Refuse(m_shown, FileError(folder, "the folder of the variable is not there", reason).what());
         if (m_folder.Number() < 0)
-            Refuse(m_shown, FileError(folder, "the folder of the variable cannot be opened", errno).what());
+            FailAtFolder(folder, reason);
         Check();
     }
 
@@ -60,9 +63,7 @@ public:
         if (below.Number() < 0 && IsLink(name))
             Refuse(m_shown, "there is a symbolic link on the way; name the folder that it points at");
         if (below.Number() < 0)
-            throw TransferError(
-                m_purpose == Purpose::Read ? SourceUnreadable : TargetUnwritable,
-                FileError(m_shown, "the folder " + name + " cannot be opened", reason).what());
+            FailAtFolder(name, reason);
         m_folder = std::move(below);
         Check();
     }
@@ -70,6 +71,12 @@ public:
     Descriptor Taken() { return std::move(m_folder); }
 
 private:
+    [[noreturn]] void FailAtFolder(std::string const& folder, int reason) const
+    {
+        throw TransferError(m_purpose == Purpose::Read ? SourceUnreadable : TargetUnwritable,
+                            FileError(m_shown, "the folder " + folder + " cannot be opened", reason).what());
+    }
+
     bool IsLink(std::string const& name) const
     {
         struct stat found = {};
@@ -81,15 +88,17 @@ private:
     void Check() const
     {
         struct stat found = {};
-        fstat(m_folder.Number(), &found);
+        if (fstat(m_folder.Number(), &found) != 0)
+            Refuse(m_shown, FileError("a folder on the way", "cannot be looked at", errno).what());
         Identity const identity{found.st_dev, found.st_ino};
-        if (m_install == identity)
+        if (m_site == identity || m_install == identity)
             Refuse(m_shown, "the server keeps its own files there; choose another folder");
         if (m_purpose == Purpose::Write && m_job == identity)
             Refuse(m_shown, "jobs are sent, not put; choose another folder");
     }
 
     Purpose m_purpose;
+    std::optional<Identity> m_site;
     std::optional<Identity> m_install;
     std::optional<Identity> m_job;
     std::string m_shown;
@@ -139,7 +148,8 @@ ServerPath ServerPath::Parse(std::string text, std::string_view leaf)
     return path;
 }
 
-Descriptor OpenFolderOf(ServerPath const& path, FolderTable const& table, Purpose purpose)
+Descriptor OpenFolderOf(ServerPath const& path, FolderTable const& table, Purpose purpose,
+                        std::string const& site)
 {
     std::string const shown = "$(" + path.variable + ")";
     auto const root = table.FolderOf(path.variable);
@@ -147,7 +157,7 @@ Descriptor OpenFolderOf(ServerPath const& path, FolderTable const& table, Purpos
         Refuse(shown, "no such folder variable, or one without a folder; see the system ticket");
     if (!root->starts_with('/'))
         Refuse(shown, "its folder is no absolute path; correct it in the system ticket");
-    Way way(table, purpose, shown + "/" + path.name);
+    Way way(table, purpose, site, shown + "/" + path.name);
     way.Begin(*root);
     for (std::string const& folder : path.folders)
         way.Enter(folder);

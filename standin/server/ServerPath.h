@@ -29,6 +29,8 @@ enum class Purpose
 };
 
 // Opens the folder in which the file lies. Throws TransferError: also for the folder of the site itself,
-// where the server's own files are, and for writing into $(JOB), where jobs come in another way.
-Descriptor OpenFolderOf(ServerPath const& path, FolderTable const& table, Purpose purpose);
+// where the server's own files are, be it site, unless that is empty, or $(INSTALL), and for writing into
+// $(JOB), where jobs come in another way.
+Descriptor OpenFolderOf(ServerPath const& path, FolderTable const& table, Purpose purpose,
+                        std::string const& site = {});
 }  // namespace standin

@@ -34,10 +34,12 @@ std::optional<int> JobOf(std::string const& name)
     return std::stoi(name);
 }
 
+// Links on the way there count: what they lead to may belong to another site, too.
 bool IsBelow(path const& folder, path const& site)
 {
-    auto const relative = folder.lexically_normal().lexically_relative(site);
-    return !relative.empty() && *relative.begin() != "..";
+    std::error_code error;
+    auto const relative = canonical(folder, error).lexically_relative(canonical(site, error));
+    return !error && !relative.empty() && *relative.begin() != "..";
 }
 
 void RemovePartFilesBelow(path const& folder)
@@ -47,16 +49,28 @@ void RemovePartFilesBelow(path const& folder)
         RemovePartFilesBelow(below);
 }
 
+// A client may have written the mark of a prepared job into the ticket of one that has arrived: that stays.
 void SweepPreparedJobs(Storage& storage, FolderTable const& table)
 {
     for (TicketAddress const job : storage.TicketsWith(JobTicketType, JobPreparedKey))
     {
-        RemoveJobFolder(table, job.id);
+        bool hasArrived = false;
+        std::string mark;
+        storage.Load(job,
+                     [&](std::string_view key, int pos, StoredValue const& value)
+                     {
+                         hasArrived = hasArrived || key == JobFileKey;
+                         if (key == JobMarkKey && pos == 0)
+                             mark = value.bytes;
+                     });
+        if (hasArrived)
+            continue;
+        RemoveJobFolder(table, job.id, mark);
         storage.Apply({{Change::DeleteTicket, job}});
     }
 }
 
-void SweepJobFolders(Storage& storage, path const& jobs, FolderTable const& table)
+void SweepJobFolders(Storage& storage, path const& jobs)
 {
     std::set<int> ids;
     for (TicketAddress const ticket : storage.Tickets())
@@ -64,7 +78,7 @@ void SweepJobFolders(Storage& storage, path const& jobs, FolderTable const& tabl
             ids.insert(ticket.id);
     for (path const& folder : FoldersBelow(jobs))
         if (auto const id = JobOf(folder.filename().string()); id && !ids.contains(*id))
-            RemoveJobFolder(table, *id);
+            RemoveStrayJobFolder(folder);
 }
 }  // namespace
 
@@ -113,7 +127,7 @@ void SweepTransfers(Storage& storage, path const& site)
     FolderTable const table(FoldersIn(storage).values);
     SweepPreparedJobs(storage, table);
     if (auto const jobs = table.FolderOf("JOB"); jobs && path(*jobs) == site / "job")
-        SweepJobFolders(storage, *jobs, table);
+        SweepJobFolders(storage, *jobs);
     for (FolderRow const row : FolderRows)
     {
         auto const folder = table.FolderOf(row.variable);

@@ -237,6 +237,15 @@ FolderSettings TicketServer::FoldersHere()
     return settings;
 }
 
+// Empty if the ticket tells of none.
+std::string TicketServer::JobMarkHere(TicketAddress job)
+{
+    Ticket const* const ticket = Loaded(job);
+    KeyValues const* const values = ticket ? ticket->Find(m_keys.Find(JobMarkKey)) : nullptr;
+    TicketValue const* const value = values ? values->At(0) : nullptr;
+    return value && value->type == PARAM_STRING ? std::string(value->ToStored().bytes) : std::string();
+}
+
 FolderTable TicketServer::Folders()
 {
     std::lock_guard const lock(m_change);
@@ -275,12 +284,13 @@ bool TicketServer::Write(MadeTicket const& ticket, SETMULTIPAR* table)
     return true;
 }
 
-bool TicketServer::WhileItLasts(MadeTicket const& ticket, std::function<void()> const& work)
+bool TicketServer::WhileItLasts(MadeTicket const& ticket,
+                                std::function<void(FolderTable const& folders)> const& work)
 {
     std::lock_guard const lock(m_change);
     if (!Find(ticket.address, ticket.birth))
         return false;
-    work();
+    work(FolderTable(FoldersHere().values));
     return true;
 }
 
@@ -412,7 +422,11 @@ bool TicketServer::Delete(Session const& session, TicketAddress address)
 
 bool TicketServer::RemoveHere(TicketAddress address)
 {
-    if (!Find(address) || !Store({Change{Change::DeleteTicket, address}}))
+    if (!Find(address))
+        return false;
+    bool const isJob = address.type == JobTicketType;
+    std::string const mark = isJob ? JobMarkHere(address) : std::string();
+    if (!Store({Change{Change::DeleteTicket, address}}))
         return false;
     decltype(m_tickets)::node_type ticket;
     {
@@ -424,8 +438,8 @@ bool TicketServer::RemoveHere(TicketAddress address)
     for (auto& [key, values] : ticket.mapped().keys)
         values.Clear(removed);
     m_sessions.Retire(std::move(removed));
-    if (address.type == JobTicketType)  // before the next job may get the id, and with it the folder
-        RemoveJobFolder(FolderTable(FoldersHere().values), address.id);
+    if (isJob)  // before the next job may get the id, and with it the folder
+        RemoveJobFolder(FolderTable(FoldersHere().values), address.id, mark);
     m_notifications.Post(TicketDeleted, address);
     return true;
 }

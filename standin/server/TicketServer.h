@@ -104,9 +104,9 @@ public:
     bool Write(MadeTicket const& ticket, SETMULTIPAR* table);
     bool Remove(MadeTicket const& ticket);
 
-    // Work that nobody may delete the ticket under; false, and nothing done, if it is gone. Changes wait
-    // meanwhile, so work must not use the server.
-    bool WhileItLasts(MadeTicket const& ticket, std::function<void()> const& work);
+    // Work that nobody may delete the ticket or change the folders under; false, and nothing done, if the
+    // ticket is gone. Changes wait meanwhile, so work must not use the server.
+    bool WhileItLasts(MadeTicket const& ticket, std::function<void(FolderTable const& folders)> const& work);
 
     bool Exists(TicketAddress address) const { return BirthOf(address) != NoBirth; }
     Birth BirthOf(TicketAddress address) const;  // NoBirth if there is no such ticket
@@ -164,6 +164,7 @@ private:
     ServedTicket& Insert(TicketAddress address);
     bool RemoveHere(TicketAddress address);
     FolderSettings FoldersHere();
+    std::string JobMarkHere(TicketAddress job);
 
     void Changed(TicketAddress address);
 

@@ -83,14 +83,14 @@ off_t TransferService::CarryNow(Request const& request, RunningTransfer const& r
     {
         ServerPath const to = ServerPath::Parse(request.target, LeafOf(request.source));
         SourceFile const source(ClientPath(request.source));
-        Descriptor const folder = OpenFolderOf(to, m_server.Folders(), Purpose::Write);
+        Descriptor const folder = OpenFolderOf(to, m_server.Folders(), Purpose::Write, m_site);
         PartFile target(folder.Number(), to.name);
         Copy(target, source, running);
         target.Finish();
         return source.Size();
     }
     ServerPath const from = ServerPath::Parse(request.source, "");
-    Descriptor const folder = OpenFolderOf(from, m_server.Folders(), Purpose::Read);
+    Descriptor const folder = OpenFolderOf(from, m_server.Folders(), Purpose::Read, m_site);
     SourceFile const source(folder.Number(), from.name);
     std::filesystem::path file = ClientPath(request.target);
     file = Followed(file.has_filename() ? file : file / from.name);
@@ -158,7 +158,7 @@ TransferResult TransferService::CarryLater(Session const& session, Request reque
                 local = ClientPath(local).string();
                 ServerPath const path = ServerPath::Parse(toServer ? request.target : request.source,
                                                           toServer ? LeafOf(request.source) : "");
-                OpenFolderOf(path, m_server.Folders(), toServer ? Purpose::Write : Purpose::Read);
+                OpenFolderOf(path, m_server.Folders(), toServer ? Purpose::Write : Purpose::Read, m_site);
             });
     if (result != Transferred)
         return result;

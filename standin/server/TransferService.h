@@ -80,6 +80,10 @@ public:
     };
     void Set(Pace pace) { m_pace = std::move(pace); }
 
+    // The folder of the site: nothing is put there or fetched from there, whatever the system ticket has for
+    // $(INSTALL). To be told before the first transfer.
+    void KeepOut(std::filesystem::path const& site) { m_site = site; }
+
     // What the transfer calls after a piece: checks for a cut, then told.
     void Copy(PartFile& target, SourceFile const& source, RunningTransfer const& running,
               std::function<void(off_t done)> const& told = {}) const;
@@ -103,6 +107,7 @@ private:
     void Tell(Waiting const& done, TransferResult result, off_t size);
 
     TicketServer& m_server;
+    std::string m_site;
     Pace m_pace;
 
     std::mutex m_lock;  // the members below

@@ -273,6 +273,18 @@ TEST_F(PuttingFiles, BadInput_HasItsCodeAndOneLineAndLeavesNothing)
     EXPECT_THAT(NamesIn(Site() / "temp"), IsEmpty());
 }
 
+TEST_F(PuttingFiles, SitesOwnFolder_IsOutOfReachEvenIfTheAdministratorNamesIt)
+{
+    std::string const site = Site().string();
+    auto const set = [&](char const* key, char const* value)
+    { return admin.Access()->MSETPARAMETER(admin.Access()->Instance, 0, 0, key, PARAM_STRING, value, -1); };
+    ASSERT_EQ(set("System/InstallFolder", folder.Path().c_str()), 1);
+    ASSERT_EQ(set("System/Folders/Temp", site.c_str()), 1);
+    EXPECT_EQ(Get("$(TEMP)/site.db", (folder.Path() / "stolen").string()), MODULE_PATH_REFUSED);
+    EXPECT_EQ(Put(local, "$(TEMP)/site.db"), MODULE_PATH_REFUSED);
+    EXPECT_FALSE(fs::exists(folder.Path() / "stolen"));
+}
+
 TEST_F(PuttingFiles, EmptyFile_Arrives)
 {
     EXPECT_EQ(Put(folder.Write("empty", "").string(), "$(TEMP)/"), MODULE_DONE);

@@ -204,7 +204,7 @@ TEST_F(SentJob, FillsItsTicketInOneTransaction)
     EXPECT_TRUE(Server().Get(As("admin"), {3, id}, "Job/Size", PARAM_INT64, &size, -1));
     EXPECT_EQ(size, 7);
     EXPECT_EQ(ContentOf(InJob(id, "file.pdf")), "content");
-    EXPECT_THAT(NamesIn(InJob(id)), ElementsAre("file.pdf"));
+    EXPECT_THAT(NamesIn(InJob(id)), ElementsAre(".job-" + TextOf(id, "Job/FolderMark"), "file.pdf"));
 }
 
 TEST_F(SentJob, GoesIntoTheNewestOneOfThatNameOfTheSession)
@@ -241,7 +241,7 @@ TEST_F(SentJob, Changes_AreTold)
     auto const told = Calls(3);
     EXPECT_EQ(told[0], "4 3/2");
     EXPECT_EQ(told[1], "1 3/2 Job/Prepared Job/State Job/Identification/Name Job/Identification/User "
-                       "Job/Identification/RemoteEndpoint");
+                       "Job/Identification/RemoteEndpoint Job/FolderMark");
     EXPECT_EQ(told[2],
               "1 3/2 Job/Identification/Name Job/Identification/User "
               "Job/Identification/RemoteEndpoint Job/File Job/Folder Job/Size Job/State Job/Progress "
@@ -274,12 +274,11 @@ TEST_F(SentJob, Progress_IsThePercentageOfTheBytes)
     EXPECT_THAT(seen, ElementsAre(50, 100));
 }
 
-TEST_F(SentJob, FolderThatAnOldJobLeft_IsEmptiedFirst)
+TEST_F(SentJob, EmptyFolderOfItsNumber_IsTaken)
 {
-    fs::create_directory(InJob(2));
-    WriteFile(InJob(2, "old"), "old");
+    fs::create_directory(InJob(2));  // as a process leaves it that is killed before it can mark it
     EXPECT_EQ(Send(file, "file.pdf"), Transferred);
-    EXPECT_THAT(NamesIn(InJob(2)), ElementsAre("file.pdf"));
+    EXPECT_EQ(ContentOf(InJob(2, "file.pdf")), "content");
 }
 
 TEST_F(SentJob, WhenItsTicketIsDeleted_ItsFolderGoesToo)
@@ -287,6 +286,58 @@ TEST_F(SentJob, WhenItsTicketIsDeleted_ItsFolderGoesToo)
     EXPECT_EQ(Send(file, "file.pdf"), Transferred);
     EXPECT_TRUE(Server().Delete(As("guest"), {3, 2}));
     EXPECT_THAT(NamesIn(folder / "job"), IsEmpty());
+}
+
+TEST_F(SentJob, WhenItsTicketIsDeleted_FolderThatIsNoJobsStays)
+{
+    Server();
+    fs::create_directory(InJob(2));
+    WriteFile(InJob(2, "another program's"), "content");
+    EXPECT_EQ(Send(file, "file.pdf"), TargetUnwritable);  // nor is anything added to it
+    EXPECT_THAT(said, HasSubstr(InJob(2).parent_path().string()));
+    EXPECT_THAT(Ids(), ElementsAre(1));
+    EXPECT_TRUE(Server().Create(As("guest"), {3, 2}));
+    EXPECT_TRUE(Server().Delete(As("guest"), {3, 2}));
+    EXPECT_THAT(NamesIn(InJob(2)), ElementsAre("another program's"));
+}
+
+TEST_F(SentJob, WhenItsTicketIsDeleted_FolderOfItsNumberInANewPlaceStays)
+{
+    EXPECT_EQ(Send(file, "file.pdf"), Transferred);
+    fs::create_directories(folder / "new/2");
+    WriteFile(folder / "new/2/another program's", "content");
+    std::string const place = folder / "new";
+    EXPECT_TRUE(Set(SystemTicket, "System/Folders/Job", place.c_str()));
+    EXPECT_TRUE(Server().Delete(As("guest"), {3, 2}));
+    EXPECT_THAT(NamesIn(folder / "new/2"), ElementsAre("another program's"));
+}
+
+TEST_F(SentJob, MarkThatAClientHasChanged_OpensNoFolder)
+{
+    fs::create_directory(InJob(1));
+    WriteFile(InJob(1, "another program's"), "content");
+    WriteFile(InJob(1, ".job-"), "");
+    for (char const* const mark : {"", "/../another program's", "."})
+    {
+        Set({3, 1}, "Job/FolderMark", mark);
+        EXPECT_TRUE(Server().Delete(As("admin"), {3, 1}));
+        EXPECT_THAT(NamesIn(InJob(1)), ElementsAre(".job-", "another program's")) << mark;
+        EXPECT_TRUE(Server().Create(As("admin"), {3, 1}));
+    }
+}
+
+TEST_F(FailedJob, FolderForJobsChangedMeanwhile_IsToldAndLeavesNothing)
+{
+    fs::create_directory(folder / "new");
+    std::string const place = folder / "new";
+    Server().Transfers().Set(
+        {4, [&] { EXPECT_TRUE(Set(SystemTicket, "System/Folders/Job", place.c_str())); }});
+    As("admin");
+    EXPECT_EQ(Send(file, "file.pdf"), TargetUnwritable);
+    EXPECT_THAT(said, HasSubstr("send the job anew"));
+    EXPECT_THAT(Ids(), ElementsAre(1));
+    EXPECT_THAT(NamesIn(folder / "job"), IsEmpty());
+    EXPECT_THAT(NamesIn(folder / "new"), IsEmpty());
 }
 
 TEST_F(SentJob, WithoutSystemTicket_IsRefused)
@@ -359,7 +410,7 @@ TEST_F(FailedJob, CutByLogout_LeavesNothing)
     std::thread send([&] { result = Send(big, "file.pdf"); });
     while (!begun)
         std::this_thread::yield();
-    EXPECT_EQ(NamesIn(InJob(2)).size(), 1u);  // it is on its way
+    EXPECT_EQ(NamesIn(InJob(2)).size(), 2u);  // its mark, and it is on its way
     std::thread logout([&] { Server().Logout(session); });
     while (!session.Ended())
         std::this_thread::yield();
@@ -388,7 +439,7 @@ TEST_F(FailedJob, TicketDeletedMeanwhile_IsToldAndTheNextJobOfThatIdIsSafe)
     As("admin");
     EXPECT_EQ(Send(file, "file.pdf"), JobGone);
     EXPECT_THAT(Ids(), ElementsAre(1, 2));
-    EXPECT_THAT(NamesIn(InJob(2)), ElementsAre("guest.pdf"));
+    EXPECT_THAT(NamesIn(InJob(2)), ElementsAre(".job-" + TextOf(2, "Job/FolderMark"), "guest.pdf"));
     EXPECT_EQ(Int({3, 2}, "Job/State"), 1);
 }
 
@@ -425,6 +476,30 @@ protected:
         Site::Open(Folder(), COMGUI_TEST_SEED);
         return testing::internal::GetCapturedStderr();
     }
+    void PutText(TicketAddress ticket, std::string_view key, std::string const& text) const
+    {
+        StoredValue value;
+        value.type = PARAM_STRING;
+        value.bytes = text;
+        Site::Open(Folder(), COMGUI_TEST_SEED).storage().Apply({{Change::PutValue, ticket, key, 0, value}});
+    }
+    void MakePreparedJob(std::string_view file = {}) const
+    {
+        StoredValue one;
+        one.type = PARAM_INT;
+        one.integer = 1;
+        StoredValue mark;
+        mark.type = PARAM_STRING;
+        mark.bytes = std::string_view(Mark).substr(5);
+        std::vector<Change> changes{{Change::CreateTicket, {3, 9}},
+                                    {Change::PutValue, {3, 9}, "Job/Prepared", 0, one},
+                                    {Change::PutValue, {3, 9}, "Job/FolderMark", 0, mark}};
+        StoredValue name = mark;
+        name.bytes = file;
+        if (!file.empty())
+            changes.push_back({Change::PutValue, {3, 9}, "Job/File", 0, name});
+        Site::Open(Folder(), COMGUI_TEST_SEED).storage().Apply(changes);
+    }
     std::vector<int> Jobs() const
     {
         Site site = Site::Open(Folder(), COMGUI_TEST_SEED);
@@ -435,50 +510,65 @@ protected:
         return ids;
     }
 
+    std::string const Mark = ".job-0123456789abcdef";
     TemporaryFolder folder;
 };
 
 TEST_F(LeftByTheDead, PreparedJob_GoesWithItsFolder)
 {
-    {
-        Site site = Site::Open(Folder(), COMGUI_TEST_SEED);
-        StoredValue one;
-        one.type = PARAM_INT;
-        one.integer = 1;
-        site.storage().Apply(
-            {{Change::CreateTicket, {3, 9}}, {Change::PutValue, {3, 9}, "Job/Prepared", 0, one}});
-    }
+    MakePreparedJob();
+    Make("job/9/" + Mark);
     Make("job/9/whole.pdf");
     EXPECT_EQ(Open(), "");
     EXPECT_THAT(Jobs(), ElementsAre(1, 2));  // 3/2 has state 0, and nobody has prepared it
     EXPECT_FALSE(Has("job/9"));
 }
 
+TEST_F(LeftByTheDead, PreparedJob_FolderThatIsNotItsOwnStays)
+{
+    fs::create_directories(folder / "elsewhere/9");
+    WriteFile(folder / "elsewhere/9/another program's", "content");
+    PutText(SystemTicket, "System/Folders/Job", folder / "elsewhere");
+    MakePreparedJob();
+    EXPECT_EQ(Open(), "");
+    EXPECT_THAT(Jobs(), ElementsAre(1, 2));
+    EXPECT_TRUE(fs::exists(folder / "elsewhere/9/another program's"));
+}
+
+TEST_F(LeftByTheDead, JobThatHasItsFile_StaysWhateverAClientHasWrittenIntoIt)
+{
+    MakePreparedJob("$(JOB)/9/whole.pdf");
+    Make("job/9/" + Mark);
+    Make("job/9/whole.pdf");
+    EXPECT_EQ(Open(), "");
+    EXPECT_THAT(Jobs(), ElementsAre(1, 2, 9));
+    EXPECT_TRUE(Has("job/9/whole.pdf"));
+}
+
 TEST_F(LeftByTheDead, JobFolderWithoutATicket_Goes_AndOthersStay)
 {
-    for (char const* const name :
-         {"job/2/a", "job/77/a", "job/077/a", "job/78x/a", "job/notes/a", "job/16777216/a", "temp/77/a"})
-        Make(name);
+    for (std::string const name :
+         {"job/2/", "job/77/", "job/077/", "job/78x/", "job/notes/", "job/16777216/", "temp/77/"})
+    {
+        Make(name + Mark);
+        Make(name + "a");
+    }
+    Make("job/81/no job's");
     Make("job/79");  // a file
+    fs::create_directory(Folder() / "job/82");
     fs::create_directory_symlink(Folder() / "temp", Folder() / "job/80");
     EXPECT_EQ(Open(), "");
     EXPECT_FALSE(Has("job/77"));
+    EXPECT_FALSE(Has("job/82"));  // empty: killed before it was marked
     for (char const* const name : {"job/2/a", "job/077/a", "job/78x/a", "job/notes/a", "job/16777216/a",
-                                   "temp/77/a", "job/79", "job/80"})
+                                   "temp/77/a", "job/79", "job/80", "job/81/no job's"})
         EXPECT_TRUE(Has(name)) << name;
 }
 
 TEST_F(LeftByTheDead, JobFolderElsewhere_IsNotTouched)
 {
     fs::create_directories(folder / "elsewhere/77");
-    {
-        Site site = Site::Open(Folder(), COMGUI_TEST_SEED);
-        std::string const jobs = folder / "elsewhere";
-        StoredValue value;
-        value.type = PARAM_STRING;
-        value.bytes = jobs;
-        site.storage().Apply({{Change::PutValue, SystemTicket, "System/Folders/Job", 0, value}});
-    }
+    PutText(SystemTicket, "System/Folders/Job", folder / "elsewhere");
     Open();
     EXPECT_TRUE(fs::exists(folder / "elsewhere/77"));
 }
@@ -511,16 +601,23 @@ TEST_F(LeftByTheDead, BeginningsOfFiles_ElsewhereGoIfTheirProcessIsDead)
     fs::create_directory(folder / "elsewhere");
     WriteFile(folder / ("elsewhere/" + dead), "content");
     WriteFile(folder / ("elsewhere/" + alive), "content");
-    {
-        Site site = Site::Open(Folder(), COMGUI_TEST_SEED);
-        std::string const text = folder / "elsewhere";
-        StoredValue value;
-        value.type = PARAM_STRING;
-        value.bytes = text;
-        site.storage().Apply({{Change::PutValue, SystemTicket, "System/Folders/Temp", 0, value}});
-    }
+    PutText(SystemTicket, "System/Folders/Temp", folder / "elsewhere");
     Open();
     EXPECT_THAT(NamesIn(folder / "elsewhere"), ElementsAre(alive));
+}
+
+TEST_F(LeftByTheDead, BeginningsOfFiles_BehindALinkOutOfTheSiteGoIfTheirProcessIsDead)
+{
+    std::string const dead = ".transfer." + NumberOfADeadProcess() + "-3.tmp";
+    std::string const alive = ".transfer." + std::to_string(getpid()) + "-99.tmp";
+    fs::create_directories(folder / "elsewhere/below");
+    for (std::string const& name : {dead, alive, "below/" + dead})
+        WriteFile(folder / ("elsewhere/" + name), "content");
+    fs::remove(Folder() / "temp");
+    fs::create_directory_symlink(folder / "elsewhere", Folder() / "temp");
+    Open();
+    EXPECT_THAT(NamesIn(folder / "elsewhere"), ElementsAre(alive, "below"));
+    EXPECT_THAT(NamesIn(folder / "elsewhere/below"), ElementsAre(dead));
 }
 
 TEST_F(LeftByTheDead, JobsOfADatabaseThatIsMadeAnew_AreSetAside)

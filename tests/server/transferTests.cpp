@@ -268,6 +268,7 @@ TEST_F(PutFile, SourceWithoutTheRightToReadIt_IsTold)
         setfsuid(65534);  // an administrator may read everything
     EXPECT_EQ(Put(file, "$(TEMP)/a"), SourceUnreadable);
     setfsuid(geteuid());
+    EXPECT_THAT(said, AllOf(HasSubstr("right"), testing::Not(HasSubstr("write"))));
     ExpectNothingArrived();
 }
 
@@ -325,6 +326,100 @@ TEST_F(PutFile, SourceThatIsCutMeanwhile_LeavesNothing)
     ExpectNothingArrived();
 }
 
+TEST_F(PutFile, SourceThatGrowsMeanwhile_ArrivesAsLongAsItWas)
+{
+    std::string const content = Bytes(300000);
+    std::string const file = Write("a", content);
+    Server().Transfers().Set({65536, [&] { std::ofstream(file, std::ios::app) << "more"; }});
+    EXPECT_EQ(Put(file, "$(TEMP)/a"), Transferred);
+    EXPECT_TRUE(ContentOf(Temp("a")) == content);
+}
+
+TEST_F(PutFile, OntoItself_ChangesNothing)
+{
+    std::string const content = Bytes(300000);
+    WriteFile(Temp("a"), content);
+    EXPECT_EQ(Put(Temp("a"), "$(TEMP)/a"), Transferred);
+    EXPECT_EQ(Get("$(TEMP)/a", Temp("a")), Transferred);
+    EXPECT_TRUE(ContentOf(Temp("a")) == content);
+    EXPECT_THAT(NamesIn(Temp()), ElementsAre("a"));
+}
+
+// Processes on two machines, or in two containers, may have one number and one folder.
+TEST_F(PutFile, PartFileOfAProcessOfTheSameNumber_IsNotTouched)
+{
+    std::string const file = Write("a", "content");
+    std::string part;
+    Server().Transfers().Set({4096, [&] { part = NamesIn(Temp())[0]; }});
+    ASSERT_EQ(Put(file, "$(TEMP)/a"), Transferred);
+    ASSERT_TRUE(IsPartFileName(part)) << part;
+    auto const dash = part.find('-');
+    std::string const next = std::to_string(std::stoi(part.substr(dash + 1)) + 1) + ".tmp";
+    WriteFile(Temp(part.substr(0, dash + 1) + next), "half of another file");
+    EXPECT_EQ(Put(file, "$(TEMP)/b"), Transferred);
+    EXPECT_EQ(ContentOf(Temp(part.substr(0, dash + 1) + next)), "half of another file");
+    EXPECT_EQ(ContentOf(Temp("b")), "content");
+}
+
+TEST_F(PutFile, ManyToOneTarget_AreWholeAtAnyInstant)
+{
+    Server().Transfers().Set({4096});
+    As("operator");
+    std::vector<std::string> const contents{Bytes(30000), Bytes(50001)};
+    std::string const files[] = {Write("a", contents[0]), Write("b", contents[1])};
+    ASSERT_EQ(Put(files[0], "$(TEMP)/x"), Transferred);
+    std::atomic<int> arrived{0};
+    std::vector<std::thread> threads;
+    for (std::string const& file : files)
+        threads.emplace_back(
+            [&]
+            {
+                for (int i = 0; i < 200; ++i)
+                    arrived +=
+                        Server().Transfers().Carry(*sessions["operator"], {TransferService::Request::ToServer,
+                                                                           file, "$(TEMP)/x"}) == Transferred
+                            ? 1
+                            : 0;
+            });
+    bool areWhole = true;
+    while (arrived < 400 && areWhole)
+        areWhole = testing::Value(ContentOf(Temp("x")), testing::AnyOfArray(contents));
+    for (std::thread& thread : threads)
+        thread.join();
+    EXPECT_TRUE(areWhole);
+    EXPECT_EQ(arrived, 400);
+    EXPECT_THAT(NamesIn(Temp()), ElementsAre("x"));
+}
+
+TEST_F(PutFile, GoodOrBad_LeavesNothingOpen)
+{
+    auto const open = [] { return NamesIn("/proc/self/fd").size(); };
+    std::string const file = Write("a", "content");
+    fs::create_directory_symlink(folder / "client", Temp("link"));
+    Put(file, "$(TEMP)/a");
+    auto const before = open();
+    for (char const* const target :
+         {"$(TEMP)/a", "$(TEMP)/link", "$(TEMP)/link/a", "$(TEMP)/none/a", "$(INSTALL)/temp/a", "$(JOB)/a"})
+    {
+        Put(file, target);
+        Put(Client("missing"), target);
+        Put(folder / "client", target);
+        Get(target, Client("b"));
+        Get(target, Client("none/b"));
+    }
+    EXPECT_EQ(open(), before);
+}
+
+TEST(FileDescriptor, CloseThatFails_IsTold)
+{
+    Descriptor good(open("/dev/null", O_RDONLY | O_CLOEXEC));
+    int const number = good.Number();
+    EXPECT_TRUE(good.Close());
+    EXPECT_EQ(good.Number(), -1);
+    Descriptor bad(number);  // closed already
+    EXPECT_FALSE(bad.Close());
+}
+
 TEST_F(PutFile, UntilItIsWhole_TheOldFileIsThere)
 {
     WriteFile(Temp("a"), "old");
@@ -358,6 +453,9 @@ TEST_F(GetFile, TargetThatCannotBeWritten_IsTold)
     EXPECT_EQ(Get("$(TEMP)/a", "/dev/null"), NotAFile);
     EXPECT_EQ(Get("$(TEMP)/a", Client(std::string(300, 'n'))), PathRefused);
     EXPECT_THAT(NamesIn(folder / "client"), IsEmpty());
+    fs::create_directory(Client("a\nb"));
+    EXPECT_EQ(Get("$(TEMP)/a", Client("a\nb")), NotAFile);
+    EXPECT_THAT(said, HasSubstr("a?b"));
     EXPECT_TRUE(fs::is_character_file("/dev/null"));
 }
 
@@ -396,6 +494,20 @@ TEST_F(Places, FolderOfTheVariable_MustBeAbsoluteAndThere)
     EXPECT_EQ(Put(file, "$(EXPORT)/b"), Transferred);
 }
 
+TEST_F(Places, FolderOfTheVariable_ThatMayNotBeOpenedIsNoFaultOfThePath)
+{
+    std::string const file = Write("a", "content");
+    chmod(Temp().c_str(), 0);
+    if (geteuid() == 0)
+        setfsuid(65534);
+    TransferService::Request const later{TransferService::Request::ToServer, file, "$(TEMP)/a"};
+    EXPECT_EQ(Said([&] { return Server().Transfers().CarryLater(As("operator"), later); }), TargetUnwritable);
+    EXPECT_EQ(Get("$(TEMP)/a", Client("b")), SourceUnreadable);
+    setfsuid(geteuid());
+    chmod(Temp().c_str(), 0700);
+    EXPECT_THAT(said, HasSubstr("right"));
+}
+
 TEST_F(Places, LinksBelowTheFolder_AreNotFollowed)
 {
     std::string const file = Write("a", "content");
@@ -423,6 +535,19 @@ TEST_F(Places, SitesOwnFolder_IsRefusedByWhateverWay)
     }
     EXPECT_EQ(ContentOf(folder / "site/site.db"), "secret");
     EXPECT_THAT(NamesIn(folder / "client"), ElementsAre("a"));
+}
+
+TEST_F(Places, SitesOwnFolder_IsRefusedWhateverTheSystemTicketSaysOfIt)
+{
+    Server().Transfers().KeepOut(folder / "site");
+    WriteFile(folder / "site/site.db", "secret");
+    SetText("System/InstallFolder", folder / "client");
+    SetText("System/Folders/Log", folder / "site");
+    std::string const file = Write("a", "content");
+    EXPECT_EQ(Put(file, "$(LOG)/site.db"), PathRefused);
+    EXPECT_EQ(Get("$(LOG)/site.db", Client("b")), PathRefused);
+    EXPECT_EQ(Put(file, "$(INSTALL)/b"), PathRefused);
+    EXPECT_EQ(ContentOf(folder / "site/site.db"), "secret");
 }
 
 TEST_F(Places, JobsFolder_IsNotWrittenToByWhateverWay)
