@@ -12,17 +12,17 @@ namespace
 {
 struct TYPE_NAME
 {
-    PARAM_TYPE type;
     char const* name;
+    PARAM_TYPE type;
     bool isWritten;
 };
 
 constexpr TYPE_NAME Types[] = {
-    {PARAM_INT, "int", true},           {PARAM_DOUBLE, "double", true},
-    {PARAM_STRING, "text", true},       {PARAM_INT64, "int64", true},
-    {PARAM_UNSIGNED, "unsigned", true}, {PARAM_UNSIGNED64, "unsigned64", true},
-    {PARAM_BINSTRING, "bytes", false},  {PARAM_POINTER, "pointer", false},
-    {PARAM_COUNT, "list", false},
+    {"int", PARAM_INT, true},           {"double", PARAM_DOUBLE, true},
+    {"text", PARAM_STRING, true},       {"int64", PARAM_INT64, true},
+    {"unsigned", PARAM_UNSIGNED, true}, {"unsigned64", PARAM_UNSIGNED64, true},
+    {"bytes", PARAM_BINSTRING, false},  {"pointer", PARAM_POINTER, false},
+    {"list", PARAM_COUNT, false},
 };
 
 // As it can stand within a line.

@@ -35,7 +35,7 @@ int ComGUIManager::SendCommand(char* command, int size, void* data)
     // Here alone, and not in the form below, the size of a folder is its text's, whatever the caller says.
     if (TakesAFolder(command))
         size = static_cast<int>(std::strlen(static_cast<char const*>(data)));
-    return SendCommand(m_pLogin, command, size, data);
+    return SendCommand(nullptr, command, size, data);
 }
 
 int ComGUIManager::SendCommand(TLogin* login, char* command, int size, void* data)

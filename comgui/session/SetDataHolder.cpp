@@ -40,9 +40,10 @@ std::size_t RoomOfText(std::size_t size)
 
 SetDataHolder::SetDataHolder(wxString keyText, PARAM_TYPE type, void* value, int pos)
 {
-    std::memset(static_cast<void*>(this), 0,
-                sizeof *this);  // all of it, what lies between the fields as well
-    std::strcpy(key, keyText.utf8_str());
+    // All of it, what lies between the fields as well.
+    std::memset(static_cast<void*>(this), 0, sizeof *this);
+    wxScopedCharBuffer const text = keyText.utf8_str();
+    std::memcpy(key, text.data(), std::strlen(text.data()) + 1);  // whatever there is room for, by design
     m_type = type;
     m_pos = pos;
     if (type == PARAM_INT)
