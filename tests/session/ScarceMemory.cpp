@@ -13,8 +13,8 @@ ScarceMemory::ScarceMemory(int allocations) { allocationsLeft = allocations; }
 
 ScarceMemory::~ScarceMemory() { allocationsLeft = Plenty; }
 
-// The whole program's, the library included. All forms, since a sanitizer brings its own for those that are not
-// here. Blocks of a stricter alignment do not count.
+// The whole program's, the library included. All forms, since a sanitizer brings its own for those that are
+// not here. Blocks of a stricter alignment do not count.
 void* operator new(std::size_t size)
 {
     if (allocationsLeft == 0)
