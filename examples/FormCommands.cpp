@@ -40,9 +40,15 @@ void ListType(SESSION const& session, int type, Json& all)
     std::vector<int> ids;
     MTICKET_READ::Of(session.container)->GetTickets(type, ids);
     for (int const id : ids)
-        all.push_back({{"type", type},
-                       {"id", id},
-                       {"keys", TicketForm(session.manager, session.container, type, id).Keys().size()}});
+        try
+        {
+            TicketForm const form(session.manager, session.container, type, id);
+            all.push_back({{"type", type}, {"id", id}, {"keys", form.Keys().size()}});
+        }
+        catch (Refusal const&)
+        {
+            continue;  // somebody has deleted it meanwhile
+        }
 }
 }  // namespace
 
@@ -52,6 +58,8 @@ void List(SESSION const& session, OPTIONS const& options)
     for (int type = 0; type < TicketTypes; ++type)
         if (options.type == EveryType || options.type == type)
             ListType(session, type, all);
+    if (all.empty() && options.type == EveryType)
+        throw Refusal("there are no tickets");
     if (all.empty())
         throw Refusal("there are no tickets of type " + std::to_string(options.type) +
                       "; ticket_form list tells which there are");
@@ -64,10 +72,9 @@ void List(SESSION const& session, OPTIONS const& options)
 
 namespace
 {
-Json Described(TicketForm const& form, std::string const& key)
+Json Described(TicketForm const& form, FIELD const& field)
 {
-    FIELD const field = form.Field(key);
-    Json result = {{"key", key}, {"type", NameOf(field.type)}};
+    Json result = {{"key", field.key}, {"type", NameOf(field.type)}};
     if (field.type == PARAM_COUNT)
         result["of"] = NameOf(field.elementType);
     result["value"] = form.Value(field);
@@ -94,9 +101,10 @@ void Keys(SESSION const& session, OPTIONS const& options)
 {
     TicketForm const form = session.Open(options);
     Json fields = Json::array();
+    FIELD field;
     for (std::string const& key : form.Keys())
-        if (key.rfind(options.key, 0) == 0)
-            fields.push_back(Described(form, key));
+        if (key.rfind(options.key, 0) == 0 && form.Has(key, field))  // somebody may delete it meanwhile
+            fields.push_back(Described(form, field));
     if (fields.empty() && !options.key.empty())
         throw Refusal(form.Name() + " has no keys that begin with " + options.key);
     if (options.json)
@@ -122,7 +130,7 @@ std::pair<std::string, std::string> SplitField(std::string const& field)
 {
     std::size_t const equals = field.find('=');
     if (equals == std::string::npos || equals == 0)
-        throw Refusal(field + " is not KEY=VALUE");
+        throw Refusal(Quoted(field) + " is not KEY=VALUE");
     return {field.substr(0, equals), field.substr(equals + 1)};
 }
 
@@ -142,7 +150,7 @@ PARAM_TYPE TypeFor(TicketForm const& form, std::string const& key, OPTIONS const
     PARAM_TYPE const stored = options.pos == WholeKey ? PARAM_NONE : form.TypeAt(key, options.pos);
     PARAM_TYPE const type = stored == PARAM_NONE ? field.elementType : stored;
     if (type == PARAM_NONE)
-        throw Refusal(key + " begins with a gap, which has no type; say --type");
+        throw Refusal(key + " has no value any more that tells its type; say --type");
     return type;
 }
 
@@ -175,7 +183,7 @@ void SetList(SESSION const& session, OPTIONS const& options)
         PARAM_TYPE const type = TypeFor(form, key, options, true);
         list.DelParameter(key.c_str(), WholeKey);  // what the old list has more than the new one
         int pos = 0;
-        for (std::string const& element : SplitList(value))
+        for (std::string const& element : SplitList(key, value))
             AddValue(list, key, type, element, pos++);
     }
     form.Write(list);
@@ -282,7 +290,7 @@ void WriteLines(SESSION const& session, OPTIONS const& options)
             continue;
         char bytes[4096];
         ssize_t const size = read(STDIN_FILENO, bytes, sizeof bytes);
-        if (size <= 0)
+        if (size <= 0)  // the last line may lack its end
             return line.empty() ? void() : WriteLine(session, options, line);
         for (char const byte : std::string(bytes, static_cast<std::size_t>(size)))
             if (byte != '\n')

@@ -2,11 +2,18 @@
 
 #include <algorithm>
 #include <cctype>
-#include <cerrno>
 #include <charconv>
 #include <cmath>
 #include <cstdlib>
 #include <limits>
+
+std::string Quoted(std::string text)
+{
+    bool const isUtf8 = text.empty() || !wxString::FromUTF8(text.c_str()).empty();
+    std::replace_if(
+        text.begin(), text.end(), [=](unsigned char c) { return c < ' ' || (c > '~' && !isUtf8); }, '?');
+    return "\"" + text + "\"";
+}
 
 namespace
 {
@@ -24,15 +31,6 @@ constexpr TYPE_NAME Types[] = {
     {"bytes", PARAM_BINSTRING, false},  {"pointer", PARAM_POINTER, false},
     {"list", PARAM_COUNT, false},
 };
-
-// As it can stand within a line.
-std::string Quoted(std::string text)
-{
-    bool const isUtf8 = text.empty() || !wxString::FromUTF8(text.c_str()).empty();
-    std::replace_if(
-        text.begin(), text.end(), [=](unsigned char c) { return c < ' ' || (c > '~' && !isUtf8); }, '?');
-    return "\"" + text + "\"";
-}
 
 [[noreturn]] void Refuse(std::string const& key, PARAM_TYPE type, std::string const& text)
 {
@@ -61,7 +59,6 @@ void AddWhole(SETMULTIPAR_LIST& list, std::string const& key, PARAM_TYPE type, s
 void AddDouble(SETMULTIPAR_LIST& list, std::string const& key, std::string const& text, int pos)
 {
     char* end = nullptr;
-    errno = 0;
     double const number = std::strtod(text.c_str(), &end);
     bool const isWhole = !text.empty() && std::isspace(static_cast<unsigned char>(text[0])) == 0 &&
                          end == text.c_str() + text.size();
@@ -69,6 +66,39 @@ void AddDouble(SETMULTIPAR_LIST& list, std::string const& key, std::string const
     if (!isWhole || !std::isfinite(number))
         Refuse(key, PARAM_DOUBLE, text);
     list.SetParameter(key.c_str(), number, pos);
+}
+
+// A value of a list, which is left at the comma behind it, or at the end.
+std::string TakeBare(std::string const& key, std::string const& text, std::size_t& from)
+{
+    std::size_t const end = std::min(text.find(',', from), text.size());
+    std::string value = text.substr(from, end - from);
+    if (value.find('"') != std::string::npos)
+        throw Refusal(key + ": a quote stands within " + value +
+                      "; put the whole value in quotes, and write this one twice");
+    from = end;
+    return value;
+}
+
+// The same.
+std::string TakeQuoted(std::string const& key, std::string const& text, std::size_t& from)
+{
+    std::string value;
+    std::size_t i = from + 1;
+    for (; i < text.size(); ++i)
+        if (text[i] != '"')
+            value += text[i];
+        else if (text.compare(i, 2, "\"\"") == 0)
+            value += text[i++];
+        else
+            break;
+    if (i == text.size())
+        throw Refusal(key + ": a quote in " + text + " has no end; within quotes one is written twice");
+    if (i + 1 < text.size() && text[i + 1] != ',')
+        throw Refusal(key + ": a comma must follow " + text.substr(from, i + 1 - from) +
+                      "; within quotes a quote is written twice");
+    from = i + 1;
+    return value;
 }
 }  // namespace
 
@@ -112,7 +142,7 @@ std::string WhatItTakes(PARAM_TYPE type)
     case PARAM_STRING:
         return "a text in UTF-8";
     default:
-        return std::string("nothing from here, since it holds a ") + NameOf(type);
+        return std::string("nothing that can be written here, since its type is ") + NameOf(type);
     }
 }
 
@@ -141,26 +171,17 @@ void AddValue(SETMULTIPAR_LIST& list, std::string const& key, PARAM_TYPE type, s
     }
 }
 
-std::vector<std::string> SplitList(std::string const& text)
+std::vector<std::string> SplitList(std::string const& key, std::string const& text)
 {
     std::vector<std::string> values;
     if (text.empty())
         return values;
-    bool isQuoted = false;
-    values.emplace_back();
-    for (std::size_t i = 0; i < text.size(); ++i)
+    std::size_t from = 0;
+    for (bool isMore = true; isMore; ++from)  // past the comma
     {
-        bool const isQuote = text[i] == '"';
-        if (isQuote && isQuoted && i + 1 < text.size() && text[i + 1] == '"')
-            values.back() += text[++i];
-        else if (isQuote)
-            isQuoted = !isQuoted;
-        else if (text[i] == ',' && !isQuoted)
-            values.emplace_back();
-        else
-            values.back() += text[i];
+        values.push_back(from < text.size() && text[from] == '"' ? TakeQuoted(key, text, from)
+                                                                 : TakeBare(key, text, from));
+        isMore = from < text.size();
     }
-    if (isQuoted)
-        throw Refusal("a quote in " + text + " has no end; within quotes one is written twice");
     return values;
 }

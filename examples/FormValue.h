@@ -12,6 +12,9 @@ struct Refusal : std::runtime_error
     using std::runtime_error::runtime_error;
 };
 
+// In quotes, and as it can stand within a line.
+std::string Quoted(std::string text);
+
 // "int", "double", "text" and so on; of types that cannot be written here, too.
 char const* NameOf(int type);
 
@@ -26,5 +29,6 @@ void AddValue(SETMULTIPAR_LIST& list, std::string const& key, PARAM_TYPE type, s
               int pos);
 
 // The values between the commas. Quotes around a value keep its commas; a quote within them is written twice.
-// The empty text is the list without values. Throws a Refusal for a quote without its end.
-std::vector<std::string> SplitList(std::string const& text);
+// The empty text is the list without values. Throws a Refusal, which names the key, for a quote that stands
+// anywhere else or has no end.
+std::vector<std::string> SplitList(std::string const& key, std::string const& text);

@@ -1,6 +1,7 @@
 #include "examples/TicketForm.h"
 
 #include <algorithm>
+#include <set>
 
 namespace
 {
@@ -57,6 +58,9 @@ bool TicketForm::Has(std::string const& key, FIELD& field) const
     int type = PARAM_NONE;
     int elementType = PARAM_NONE;
     bool const has = m_manager.GetKeyParameterType(m_container, m_type, m_id, key.c_str(), type, elementType);
+    if (type == PARAM_COUNT)  // a list may begin with a gap
+        for (int pos = 1, count = Count(key); elementType == PARAM_NONE && pos < count; ++pos)
+            elementType = TypeAt(key, pos);
     field = {key, static_cast<PARAM_TYPE>(type), static_cast<PARAM_TYPE>(elementType)};
     return has;
 }
@@ -76,6 +80,11 @@ PARAM_TYPE TicketForm::TypeAt(std::string const& key, int pos) const
         MTICKET_READ::Of(m_container)->ParameterType(m_type, m_id, key.c_str(), pos));
 }
 
+int TicketForm::Count(std::string const& key) const
+{
+    return m_manager.GetValueCount(m_container, m_type, m_id, wxString::FromUTF8(key.c_str()));
+}
+
 template <typename T>
 Json TicketForm::Number(std::string const& key, PARAM_TYPE type, int pos) const
 {
@@ -92,9 +101,10 @@ Json TicketForm::Element(std::string const& key, int pos) const
     case PARAM_DOUBLE:
     case PARAM_STRING:
     {
-        wxVariant value;
-        m_manager.GetParameter(m_container, m_type, m_id, key.c_str(), value, pos);
-        return ToJson(value);
+        wxVariant value;  // without a marker: what goes meanwhile is missing, and no -1
+        bool const isRead =
+            m_manager.GetParameterEx(m_container, m_type, m_id, key.c_str(), value, pos, wxNullVariant) > 0;
+        return isRead ? ToJson(value) : Json();
     }
     case PARAM_INT64:  // no variant holds the others
         return Number<long long>(key, PARAM_INT64, pos);
@@ -133,9 +143,8 @@ Json TicketForm::Value(FIELD const& field) const
         all = Elements<double>(field);
     else if (field.elementType == PARAM_STRING)
         all = Elements<wxString>(field);
-    int const count =
-        m_manager.GetValueCount(m_container, m_type, m_id, wxString::FromUTF8(field.key.c_str()));
-    if (all.size() == static_cast<std::size_t>(count))
+    int const count = Count(field.key);
+    if (all.is_array() && all.size() == static_cast<std::size_t>(count))
         return all;
     all = Json::array();  // several types, or gaps
     for (int pos = 0; pos < count; ++pos)
@@ -154,8 +163,9 @@ void TicketForm::Write(SETMULTIPAR_LIST& list) const
 {
     m_manager.SetMultiParameter(m_container, m_type, m_id, list);
     std::string refused;
+    std::set<std::string> told;
     for (SETMULTIPAR const* record = list.Table(false); record && record->key; ++record)
-        if (!record->ok && refused.find(record->key) == std::string::npos)
+        if (!record->ok && told.insert(record->key).second)
             refused += (refused.empty() ? "" : ", ") + std::string(record->key);
     if (!refused.empty())
         throw Refusal("the server does not take " + refused + " in " + Name() + "; may this user write it?");

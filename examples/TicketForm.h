@@ -18,7 +18,7 @@ struct FIELD
 {
     std::string key;
     PARAM_TYPE type = PARAM_NONE;         // PARAM_COUNT: a list
-    PARAM_TYPE elementType = PARAM_NONE;  // of a list, the type of its first value
+    PARAM_TYPE elementType = PARAM_NONE;  // of a list, the type of the first value it has
 };
 
 class TicketForm
@@ -49,6 +49,7 @@ public:
     PARAM_TYPE TypeAt(std::string const& key, int pos) const;  // PARAM_NONE: nothing is there
 
 private:
+    int Count(std::string const& key) const;  // gaps included
     Json Element(std::string const& key, int pos) const;
     template <typename T>
     Json Elements(FIELD const& field) const;

@@ -31,7 +31,7 @@ public:
         m_app.add_option("-s,--server", m_options.host, "At this host")->capture_default_str();
         m_app.add_option("-o,--port", m_options.port, "And port")
             ->capture_default_str()
-            ->check(CLI::Range(0, 65535));
+            ->check(CLI::Range(1, 65535));
         m_app.add_flag("-j,--json", m_options.json, "Print JSON");
         m_app.footer(
             "A ticket is a TYPE and an ID, as 3 1 for job 1; types are 0 the system, 2 devices, 3 jobs, 7 "

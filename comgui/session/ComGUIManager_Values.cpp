@@ -35,21 +35,10 @@ struct HOLDERS
     std::vector<SetDataHolder*>::iterator const end;
 };
 
-// The list of MultiParListCreate.
-struct MULTIPAR_HANDLE
-{
-    MULTIPAR_HANDLE() = default;
-    MULTIPAR_HANDLE(MULTIPAR_HANDLE const&) = delete;
-    MULTIPAR_HANDLE& operator=(MULTIPAR_HANDLE const&) = delete;
-    ~MULTIPAR_HANDLE() { MultiParListDestroy(&list); }
-
-    SETMULTIPAR_LIST* list = MultiParListCreate();
-};
-
 bool IsWritten(PARAM_TYPE type) { return type == PARAM_INT || type == PARAM_DOUBLE || type == PARAM_STRING; }
 
-// Adds what is to be written, and ends the holders. What the last add gave, 0 without any.
-int AddHolders(SETMULTIPAR_LIST* list, HOLDERS& holders)
+// Adds what is to be written, and deletes every holder. Returns what the last add gave, 0 without any.
+int AddHolders(SETMULTIPAR_LIST& list, HOLDERS& holders)
 {
     int result = 0;
     int type = -1;
@@ -63,12 +52,12 @@ int AddHolders(SETMULTIPAR_LIST* list, HOLDERS& holders)
             type = holder->m_type;
         // The word of a text goes on as it stands, narrow as it is.
         if (auto const current = static_cast<PARAM_TYPE>(type); IsWritten(current))
-            result = MultiParListSetParameter(list, holder->key, current, holder->m_value, holder->m_pos);
+            result = MultiParListSetParameter(&list, holder->key, current, holder->m_value, holder->m_pos);
     }
     return result;
 }
 
-// Of another type than these nothing is added.
+// Passes over what is none of these; the caller counts its position all the same.
 void Add(SETMULTIPAR_LIST& list, char const* key, wxVariant const& value, int pos)
 {
     wxString const type = value.GetType();
@@ -187,11 +176,11 @@ int ComGUIManager::SetMultiParameter(MTICKET_ACCESS const* container, int type, 
     if (holders.empty())
         return NothingToWrite;
     HOLDERS rest(holders);
-    MULTIPAR_HANDLE const handle;
-    int const result = AddHolders(handle.list, rest);
-    if (MultiParListSize(handle.list) == 0)
+    SETMULTIPAR_LIST list(false);
+    int const result = AddHolders(list, rest);
+    if (list.Size() == 0)
         return result;
-    return container->MSETMULTIPAR(container->Instance, type, id, MultiParListTable(handle.list, false));
+    return container->MSETMULTIPAR(container->Instance, type, id, list.Table(false));
 }
 
 void ComGUIManager::SetMultiParameter(int type, int id, SETMULTIPAR_LIST& list)

@@ -29,8 +29,7 @@ void* Copy(void const* value, std::size_t size, std::size_t room, unsigned int l
     return std::memcpy(copy, value, size);
 }
 
-// The text is going to be read as a wide one. It has room for such a text's end, so that what is read is no
-// text, but the holder's own memory.
+// Narrow texts will be read as wide ones: zeros enough for a wide end keep that read within the copy.
 std::size_t RoomOfText(std::size_t size)
 {
     constexpr std::size_t Wide = sizeof(wchar_t);
@@ -40,8 +39,7 @@ std::size_t RoomOfText(std::size_t size)
 
 SetDataHolder::SetDataHolder(wxString keyText, PARAM_TYPE type, void* value, int pos)
 {
-    // All of it, what lies between the fields as well.
-    std::memset(static_cast<void*>(this), 0, sizeof *this);
+    std::memset(static_cast<void*>(this), 0, sizeof *this);  // with the gaps between the fields
     wxScopedCharBuffer const text = keyText.utf8_str();
     std::memcpy(key, text.data(), std::strlen(text.data()) + 1);  // whatever there is room for, by design
     m_type = type;
