@@ -1,7 +1,23 @@
-// Managers whose session has a container, for tests of what goes to one.
+// Managers whose session has a container, and words for what goes to one.
 #pragma once
 
 #include "tests/session/FakeModule.h"
+
+inline char const Key[] = "Key";
+inline char const Umlaut[] = "K\xC3\xA4y";
+
+inline CALL Operation(int type, int id, int op, void* arg = nullptr)
+{
+    return {SLOT::OPERATION, type, id, {}, PARAM_NONE, 0, op, arg};
+}
+
+// What a slot was asked to do, without where it shall put what it finds.
+inline std::vector<CALL> WithoutAddresses(std::vector<CALL> calls)
+{
+    for (CALL& call : calls)
+        call.arg = nullptr;
+    return calls;
+}
 
 // Logged in, with the fake as the session's container and another one beside it.
 class Tickets : public WithManager

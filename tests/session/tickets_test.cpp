@@ -13,7 +13,6 @@ using testing::IsEmpty;
 namespace
 {
 char key[] = "Key";
-char const Umlaut[] = "K\xC3\xA4y";
 
 using TicketsDeathTest = Tickets;
 
