@@ -1,6 +1,7 @@
 #include "comgui/foundation/utf8func.h"
 #include "comgui/stream/BYTE_CHUNK.h"
 #include "comgui/stream/STICKET_BINSTREAM.h"
+#include "comgui/stream/shared_bytes.h"
 #include "comgui/stream/ticket_items.h"
 #include <algorithm>
 #include <exception>
@@ -9,41 +10,6 @@ using namespace comgui::detail;
 
 namespace
 {
-using Word = std::uint64_t;
-
-// Zero if a word of the one text is as in the other.
-Word Difference(char const* left, char const* right)
-{
-    Word leftWord;
-    Word rightWord;
-    std::memcpy(&leftWord, left, sizeof leftWord);
-    std::memcpy(&rightWord, right, sizeof rightWord);
-    return leftWord ^ rightWord;
-}
-
-// The lowest byte that differs is the first, as the target is little-endian.
-unsigned long SharedBytes(Word difference)
-{
-    return static_cast<unsigned int>(std::countr_zero(difference)) / 8;
-}
-
-inline unsigned long SharedBytes(char const* left, char const* right, unsigned long limit)
-{
-    constexpr unsigned long step = sizeof(Word);
-    unsigned long shared = 0;
-    if (limit < step)
-    {
-        while (shared < limit && left[shared] == right[shared])
-            ++shared;
-        return shared;
-    }
-    for (; shared < limit - step; shared += step)
-        if (Word const difference = Difference(left + shared, right + shared))
-            return shared + SharedBytes(difference);
-    shared = limit - step;  // the last step looks at the last bytes, which may overlap those before
-    return shared + SharedBytes(Difference(left + shared, right + shared));
-}
-
 // The types that a stream holds, a bit each: no pointers and no counts. Of a null value it holds only that a
 // parameter is deleted, and a text, as the empty one.
 constexpr unsigned int WithValue = 1u << PARAM_INT | 1u << PARAM_DOUBLE | 1u << PARAM_STRING |
@@ -69,14 +35,13 @@ inline bool IsWritable(PARAM_TYPE type, void const* value)
 class ENCODER
 {
 public:
-    // The state of a WRITE, which outlives the encoder.
-    ENCODER(std::string& data, bool& first, std::string& lastKey, int& position)
-        : m_chunk(data), m_first(first), m_lastKey(lastKey), m_key(lastKey), m_lastPosition(position),
+    // The state of a WRITE, which outlives the encoder. The chunk stands apart, since its functions are
+    // called out of line: nobody else gets at the encoder, so that all of it can stay in registers.
+    ENCODER(BYTE_CHUNK& chunk, bool& first, std::string& lastKey, int& position)
+        : m_chunk(chunk), m_first(first), m_lastKey(lastKey), m_key(lastKey), m_lastPosition(position),
           m_pos(position)
     {
     }
-
-    char* Begin() { return m_chunk.Begin(); }
 
     // Puts the record, or passes it over; with it those that follow without any further word. Leaves record
     // at the first that is not dealt with. The keys must stay until Finish(). What is put without asking for
@@ -122,7 +87,7 @@ private:
         bool const isSame = shared == key.size() && shared == m_key.size();
         m_key = key;
         if (shared == 0)
-            return PutFullKey(to, key, isSame);
+            return PutFullKey(m_chunk, m_first, to, key, isSame);
         if (isSame)
             return to;
         std::string_view const tail(key.data() + shared, key.size() - shared);
@@ -130,12 +95,13 @@ private:
     }
 
     // A key that has nothing to build on, as the first one of all. That goes without saying if it is empty.
-    [[gnu::noinline]] char* PutFullKey(char* to, std::string_view key, bool isSame)
+    [[gnu::noinline]] static char* PutFullKey(BYTE_CHUNK& chunk, bool& first, char* to, std::string_view key,
+                                              bool isSame)
     {
-        if (m_first)
-            to = PutBytes(to, ITEM_FULL_KEY, TicketSignature);
-        m_first = false;
-        return isSame ? to : PutBytes(to, ITEM_FULL_KEY, key);
+        if (first)
+            to = PutBytes(chunk, to, ITEM_FULL_KEY, TicketSignature);
+        first = false;
+        return isSame ? to : PutBytes(chunk, to, ITEM_FULL_KEY, key);
     }
 
     char* PutValue(char* to, SETMULTIPAR*& record)
@@ -147,10 +113,11 @@ private:
         case PARAM_DOUBLE:
             return PutNumbers<double>(to, record, PutOptimizedDouble);
         case PARAM_STRING:
-            to = PutBytes(to, ITEM_STRING, record->value ? static_cast<char const*>(record->value) : "");
+            to = PutBytes(m_chunk, to, ITEM_STRING,
+                          record->value ? static_cast<char const*>(record->value) : "");
             return Done(to, record);
         case PARAM_BINSTRING:
-            to = PutBytes(to, ITEM_BINARY, Bytes(*static_cast<BIN_STRING const*>(record->value)));
+            to = PutBytes(m_chunk, to, ITEM_BINARY, Bytes(*static_cast<BIN_STRING const*>(record->value)));
             return Done(to, record);
         case PARAM_INT64:
             return PutNumbers<long long>(to, record, PutInt64);
@@ -193,9 +160,9 @@ private:
         return to;
     }
 
-    char* PutBytes(char* to, unsigned char itemClass, std::string_view bytes)
+    static char* PutBytes(BYTE_CHUNK& chunk, char* to, unsigned char itemClass, std::string_view bytes)
     {
-        return m_chunk.Put(PutItemTag(to, itemClass, bytes.size()), bytes);
+        return chunk.Put(PutItemTag(to, itemClass, bytes.size()), bytes);
     }
 
     static std::string_view Bytes(BIN_STRING const& value)
@@ -203,7 +170,7 @@ private:
         return value.valid() ? std::string_view(static_cast<char const*>(value.data), value.size) : "";
     }
 
-    BYTE_CHUNK m_chunk;
+    BYTE_CHUNK& m_chunk;
     bool& m_first;
     std::string& m_lastKey;
     std::string_view m_key;  // the previous one, wherever it stands
@@ -241,8 +208,9 @@ void STICKET_BINSTREAM::WRITE::SetMultiParameter(SETMULTIPAR* table)
     {
         if (!failed && table->key)
         {
-            ENCODER encoder(data, first, lastKey, pos);
-            char* to = encoder.Begin();
+            BYTE_CHUNK chunk(data);
+            ENCODER encoder(chunk, first, lastKey, pos);
+            char* to = chunk.Begin();
             while (table->key)
                 to = encoder.Put(to, table);
             encoder.Finish(to);
