@@ -756,14 +756,15 @@ TEST(Strsame, CountsEqualBytesUpToTheEndOfEither)
 
 TEST(Strsame, EveryPlaceOfTheFirstDifference_IsFound)
 {
-    std::string const key(40, '\x80');
-    for (std::size_t at = 0; at < key.size(); ++at)
-    {
-        std::string other = key;
-        other[at] = '\x81';
-        EXPECT_EQ(STICKET_BINSTREAM::strsame(key.c_str(), other.c_str()), at);
-        EXPECT_EQ(STICKET_BINSTREAM::strsame(key.c_str(), key.substr(0, at).c_str()), at);
-    }
+    for (std::size_t size = 1; size <= 40; ++size)
+        for (std::size_t at = 0; at < size; ++at)
+        {
+            std::string const key(size, '\x80');
+            std::string other = key;
+            other[at] = '\x81';
+            EXPECT_EQ(STICKET_BINSTREAM::strsame(key.c_str(), other.c_str()), at) << "of " << size;
+            EXPECT_EQ(STICKET_BINSTREAM::strsame(key.c_str(), key.substr(0, at).c_str()), at);
+        }
 }
 
 TEST(IncPos, GoesOnFromZeroAndStaysBelow)
