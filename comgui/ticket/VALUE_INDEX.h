@@ -183,7 +183,7 @@ private:
     HASH const m_seed;            // differs from run to run, so that no stream makes all values fall together
     NUMBER* m_slots = nullptr;    // the entry whose hash says this place or, if that is taken, one before
     std::size_t m_slotCount = 0;  // a power of two, at least twice the entries
-    ENTRY* m_blocks[32 - FirstBlockBits];
+    ENTRY* m_blocks[32 - FirstBlockBits] = {};
     ENTRY* m_next = nullptr;  // where the next entry goes, unless the newest block is full
     ENTRY* m_blockEnd = nullptr;
     NUMBER m_count = 0;

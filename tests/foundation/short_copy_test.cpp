@@ -1,7 +1,7 @@
 #include "comgui/foundation/short_copy.h"
 
 #include <gtest/gtest.h>
-#include <string>
+#include <numeric>
 #include <vector>
 
 using namespace comgui::detail;
@@ -12,8 +12,7 @@ namespace
 void ExpectCopied(void (*copy)(char*, char const*, std::size_t), std::size_t size)
 {
     std::vector<char> from(size);
-    for (std::size_t i = 0; i < size; ++i)
-        from[i] = static_cast<char>(i + 1);
+    std::iota(from.begin(), from.end(), '\1');
     std::vector<char> to(size);
     copy(to.data(), from.data(), size);
     EXPECT_EQ(to, from) << size << " bytes";
