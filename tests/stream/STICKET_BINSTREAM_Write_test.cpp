@@ -520,6 +520,12 @@ TEST(Position, AtWhichAValueStood_IsToldAgain)
     EXPECT_EQ(HexBehindSignature({Int("k", 0, 5), Int("k", 0, 5)}), "01 6B A7 40 A7 40");
 }
 
+TEST(Position, RunningOnPastTheLargestThatCanBeTold_IsNotTold)
+{
+    EXPECT_EQ(HexBehindSignature({Int("k", 0, 134217725), Int("k", 0, 134217726)}),
+              "01 6B BF FF FF FF 40 40");
+}
+
 TEST(Position, CarriesOverToTheNextKey_ByDesign)
 {
     EXPECT_EQ(HexBehindSignature({Int("a", 0, 0), Int("a", 0, 1), Int("a", 0, 2), Int("b", 0, 3)}),
@@ -572,6 +578,23 @@ TEST(Vector, LongerThanABuffer_IsWrittenWhole)
         expected += " 42 00 80";
     }
     EXPECT_EQ(HexBehindSignature(records), expected);
+}
+
+// Three texts fill the writer's buffer up to a place near its end; then come one more and a key of that size.
+TEST(Buffer, BytesOfAnySizeAtAnyPlaceOfIt_AreWrittenWhole)
+{
+    for (std::size_t const size : {0u, 1u, 15u, 16u, 17u, 63u, 64u, 65u, 2047u, 2048u, 2049u, 4096u, 4097u})
+        for (std::size_t filled = 4000; filled <= 4100; ++filled)
+        {
+            std::vector<RECORD> const records = {
+                Text("a", std::string(1300, 'a')),           Text("a", std::string(1300, 'b')),
+                Text("a", std::string(filled - 2600, 'c')),  Text("a", std::string(size, 'd')),
+                Int64(std::string(size, 'k'), 1LL << 60, 0), Double("end", 0.1, 1)};
+            TABLE table(records);
+            std::string bytes;
+            STICKET_BINSTREAM::Write(bytes, table.Records(), 0);
+            ASSERT_TRUE(bytes == Encode(records)) << size << " bytes behind " << filled;
+        }
 }
 
 // What a stream can hold.
@@ -828,6 +851,31 @@ TEST_P(FailingRecord, Writer_RefusesEverythingFromThenOn)
     int const value = 1;
     EXPECT_FALSE(writer.SetParameter("d", PARAM_INT, &value, -1));
     EXPECT_TRUE(writer.Failed());
+}
+
+TEST_P(FailingRecord, TableThatComesLater_IsNotOk)
+{
+    WRITE writer(0);
+    writer.SetMultiParameter(table.Records());
+    TABLE later({Int("d", 1), Int("e", 2)});
+    for (SETMULTIPAR* record = later.Records(); record->key; ++record)
+        record->ok = true;
+    writer.SetMultiParameter(later.Records());
+    EXPECT_FALSE(later.Records()[0].ok);
+    EXPECT_FALSE(later.Records()[1].ok);
+}
+
+TEST(FailingVector, ValuesBeforeTheOneThatFailed_AreOk)
+{
+    TABLE table({Int("k", 1, 0), Int("k", 2, 1), Int("k", 3, -3), Int("k", 4, -3)}, KEYS::SHARED);
+    for (SETMULTIPAR* record = table.Records(); record->key; ++record)
+        record->ok = true;
+    std::string out;
+    STICKET_BINSTREAM::Write(out, table.Records(), 0);
+    EXPECT_TRUE(table.Records()[0].ok);
+    EXPECT_TRUE(table.Records()[1].ok);
+    EXPECT_FALSE(table.Records()[2].ok);
+    EXPECT_FALSE(table.Records()[3].ok);
 }
 
 TEST(BytesOf128MiB, FailTheWriter)
