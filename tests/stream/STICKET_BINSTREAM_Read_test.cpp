@@ -344,6 +344,14 @@ TEST(GetKeyOptOf, EveryKey_IsThePreviousOneOfTheNext)
     EXPECT_FALSE(cursor->HasData());
 }
 
+TEST(GetKeyOptOf, LongerKeyBeforeThePreviousOne_IsForgotten)
+{
+    Cursor cursor("61 62 63 64 65 66 78 79 07 58");
+    EXPECT_EQ(Key(cursor, 6, false), "abcdef");
+    EXPECT_EQ(Key(cursor, 2, false), "xy");
+    EXPECT_EQ(Key(cursor, 2, true), "xyX");
+}
+
 TEST(GetKeyOptOf, ZeroBytes_AreKept)
 {
     Cursor cursor("61 00 62 02 63");
@@ -427,6 +435,30 @@ TEST_F(Reader, List_IsNotClearedFirst)
     list.SetParameter("before", 1, -1);
     EXPECT_TRUE(ReadBehindSignature("01 6B 41 02"));
     EXPECT_THAT(Records(), ElementsAre(Int("before", 1), Int("k", 2)));
+}
+
+TEST_F(Reader, ListWhoseTableWasTaken_GivesANewOne)
+{
+    list.SetParameter("b", 1, -1);
+    list.Table(true);
+    EXPECT_TRUE(ReadBehindSignature("01 61 41 02"));
+    EXPECT_THAT(Records(), ElementsAre(Int("b", 1), Int("a", 2)));
+}
+
+TEST_F(Reader, EqualKeysAndValues_ShareTheirAddresses)
+{
+    list.SetParameter("a", 5, -1);
+    for (char const* const value : {"41 05", "42 00 05", "61 74", "81 74", "45 69 3F C0 00 00",
+                                    "49 64 00 20 00 00 00 00 00 01", "49 75 FF FF FF FF FF FF FF FF", "60"})
+    {
+        EXPECT_TRUE(ReadBehindSignature("01 61" + std::string(value) + "01 62" + value + "01 61" + value));
+        SETMULTIPAR const* const last = list.Table(false) + list.Size() - 3;
+        EXPECT_EQ(last[0].key, list.Table(false)->key) << value;
+        EXPECT_EQ(last[2].key, list.Table(false)->key) << value;
+        EXPECT_EQ(last[0].value, last[1].value) << value;
+        EXPECT_EQ(last[0].value, last[2].value) << value;
+    }
+    EXPECT_EQ(list.Table(false)[1].value, list.Table(false)[0].value);
 }
 
 TEST_F(Reader, Error_LeavesWhatWasReadBefore)
