@@ -120,6 +120,30 @@ TEST(NoMemory, WriteSmallTable_TellsItByAnOk)
     EXPECT_GT(failures, 0);
 }
 
+TEST(NoMemory, WriteLongVector_LeavesWhatWasPutBeforeOk)
+{
+    std::vector<RECORD> records;
+    for (int i = 0; i < 20000; ++i)
+        records.push_back(Int("k", 1000, i));
+    TABLE table(records, KEYS::SHARED);
+    auto const isOk = [](SETMULTIPAR const& record) { return record.ok; };
+    int const failures = FailEachAllocation(
+        [&]
+        {
+            std::string out;
+            STICKET_BINSTREAM::Write(out, table.Records(), 0);
+        },
+        [&](bool hasHappened)
+        {
+            SETMULTIPAR const* const begin = table.Records();
+            SETMULTIPAR const* const end = begin + records.size();
+            EXPECT_TRUE(begin->ok);
+            EXPECT_EQ(end[-1].ok, !hasHappened);
+            EXPECT_TRUE(std::is_partitioned(begin, end, isOk));
+        });
+    EXPECT_GT(failures, 3);
+}
+
 TEST(NoMemory, WriteOneByOne_FailsTheWriterForGood)
 {
     TABLE table(Sample);
@@ -268,6 +292,49 @@ TEST(NoMemory, AddToAList_ThrowsAndLeavesTheRecordsAsTheyWere)
         },
         [&](bool hasHappened) { EXPECT_EQ(hasThrown, hasHappened); });
     EXPECT_GT(failures, 3);
+}
+
+// The length of the texts shifts the place at which the list's memory comes to an end.
+TEST(NoMemory, AddManyToAList_KeepsEachValueOnceAllTheSame)
+{
+    for (std::size_t length = 1; length <= 40; ++length)
+    {
+        std::vector<std::string> texts;
+        for (int i = 0; i < 100; ++i)
+            texts.push_back(std::string(length, 'x') + std::to_string(i));
+        bool hasThrown = false;
+        int const failures = FailEachAllocation(
+            [&]
+            {
+                SETMULTIPAR_LIST list(false);
+                hasThrown = false;
+                for (std::size_t i = 0; i < 2 * texts.size(); ++i)
+                {
+                    std::string const& text = texts[i % texts.size()];
+                    try
+                    {
+                        list.SetParameter(text.c_str(), text, -1);
+                    }
+                    catch (std::bad_alloc const&)
+                    {
+                        hasThrown = true;
+                        FailingAllocation::Stop();
+                        list.SetParameter(text.c_str(), text, -1);
+                    }
+                }
+                FailingAllocation::Stop();
+                SETMULTIPAR const* const table = list.Table(false);
+                for (std::size_t i = 0; i < texts.size(); ++i)
+                {
+                    EXPECT_EQ(table[i].key, texts[i]);
+                    EXPECT_EQ(static_cast<char const*>(table[i].value), texts[i]);
+                    EXPECT_EQ(table[i + texts.size()].key, table[i].key);
+                    EXPECT_EQ(table[i + texts.size()].value, table[i].value);
+                }
+            },
+            [&](bool hasHappened) { EXPECT_EQ(hasThrown, hasHappened); });
+        EXPECT_GT(failures, 3);
+    }
 }
 
 TEST(NoMemory, SortedTable_ThatWasNotMade_DoesNotCountAsSorted)
