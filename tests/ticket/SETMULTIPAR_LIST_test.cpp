@@ -180,6 +180,16 @@ TYPED_TEST(CopiedNumber, XSetParameter_KeepsACopy)
     EXPECT_EQ(record.pos, 0);
 }
 
+TYPED_TEST(CopiedNumber, EqualOnes_ShareTheirAddress)
+{
+    SETMULTIPAR_LIST list(false);
+    auto const value = TypeParam::Value;
+    auto const same = value;
+    list.xSetParameter("a", TypeParam::Type, &value, -1);
+    list.xSetParameter("b", TypeParam::Type, &same, -1);
+    EXPECT_EQ(list.Table(false)[0].value, list.Table(false)[1].value);
+}
+
 TYPED_TEST(CopiedNumber, YSetParameter_InAListThatCopies_KeepsACopy)
 {
     SETMULTIPAR_LIST list(true);
@@ -214,6 +224,19 @@ TEST_F(List, Bytes_AreCopiedWithTheirView)
     bytes = "___";
     view = BIN_STRING();
     EXPECT_EQ(Bytes(Last()), std::string("a\0b", 3));
+}
+
+TEST_F(List, EqualTextsAndBytes_ShareTheirAddresses)
+{
+    for (int i = 0; i < 2; ++i)
+    {
+        std::string const value = "same";
+        list.SetParameter("a", value, -1);
+        list.SetParameter("b", BIN_STRING(value), -1);
+    }
+    SETMULTIPAR const* const table = list.Table(false);
+    EXPECT_EQ(table[0].value, table[2].value);
+    EXPECT_EQ(table[1].value, table[3].value);
 }
 
 TEST_F(List, WordsThatAreNoValues_StayTheCallersOwn)
@@ -549,6 +572,28 @@ TYPED_TEST(CopiedNumber, Clear_ForgetsTheNumber)
                               -1);
         EXPECT_EQ(list.Table(false)[1].value, kept);
         EXPECT_EQ(Value<std::remove_const_t<decltype(value)>>(list.Table(false)[1]), value);
+        list.Clear();
+    }
+}
+
+TEST_F(List, Clear_ForgetsKeysTextsAndBytes)
+{
+    for (int round = 0; round < 3; ++round)
+    {
+        list.SetParameter("Key", std::string("text"), -1);
+        list.SetParameter("Key", BIN_STRING("bytes", 5), -1);
+        for (int i = 0; i < 300; ++i)
+        {
+            std::string const filling = std::string(100, '_') + std::to_string(i);
+            list.SetParameter(filling.c_str(), filling, -1);
+            list.SetParameter("Key", BIN_STRING(filling), -1);
+        }
+        list.SetParameter("Key", std::string("text"), -1);
+        list.SetParameter("Key", BIN_STRING("bytes", 5), -1);
+        SETMULTIPAR const* const table = list.Table(false);
+        EXPECT_STREQ(table[0].key, "Key");
+        EXPECT_STREQ(Text(table[0]), "text");
+        EXPECT_EQ(Bytes(table[1]), "bytes");
         list.Clear();
     }
 }

@@ -24,6 +24,18 @@ struct COLLIDING
     static int* Make(void* place, int number, HASH, POOL&) { return new (place) int(number); }
 };
 
+// Numbers of which some cannot be made.
+struct FAILING : COLLIDING<1000>
+{
+    static int* Make(void* place, int number, HASH hash, POOL& pool)
+    {
+        if (isFailing)
+            throw std::bad_alloc();
+        return COLLIDING::Make(place, number, hash, pool);
+    }
+    static inline bool isFailing = false;
+};
+
 template <typename INDEX>
 void ExpectASetOf(int limit, int count)
 {
@@ -51,6 +63,25 @@ TEST(VALUE_INDEX, ValuesOfOneHash_AreToldApart) { ExpectASetOf<VALUE_INDEX<COLLI
 TEST(VALUE_INDEX, ValuesOfFewHashes_AreToldApart) { ExpectASetOf<VALUE_INDEX<COLLIDING<7>>>(1000, 10000); }
 
 TEST(VALUE_INDEX, ManyValues_AreToldApart) { ExpectASetOf<VALUE_INDEX<COLLIDING<1000000>>>(100000, 300000); }
+
+TEST(VALUE_INDEX, ValueThatCannotBeMade_LeavesTheOthersAndIsMadeTheNextTime)
+{
+    POOL pool;
+    VALUE_INDEX<FAILING> index(pool);
+    std::vector<int const*> kept;
+    for (int number = 0; number < 100; ++number)
+    {
+        FAILING::isFailing = true;
+        EXPECT_THROW(index.Keep(number), std::bad_alloc);
+        FAILING::isFailing = false;
+        kept.push_back(&index.Keep(number));
+    }
+    for (int number = 0; number < 100; ++number)
+    {
+        EXPECT_EQ(*kept[static_cast<std::size_t>(number)], number);
+        EXPECT_EQ(&index.Keep(number), kept[static_cast<std::size_t>(number)]);
+    }
+}
 
 TEST(VALUE_INDEX, Clear_DropsTheValueThatCameLast)
 {
