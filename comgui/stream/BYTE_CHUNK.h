@@ -1,6 +1,6 @@
 // A small buffer in front of a growing string, for many small appends: room is asked for once in a while
 // instead of once a byte, and the string grows by the chunk. The place where the next byte goes is the
-// caller's to carry; wherever one is handed out, Spare bytes may be put without asking.
+// caller's to carry; behind what Begin(), Room() and Flush() give, Spare bytes may be put without asking.
 #pragma once
 
 #include "comgui/foundation/short_copy.h"
@@ -18,10 +18,11 @@ public:
 
     char* Begin() { return m_bytes; }
 
-    // The place to go on at.
+    // The place to go on at with Spare bytes behind it: this one, if it has them.
     char* Room(char* to) { return to <= m_bytes + Size - Spare ? to : Flush(to); }
 
-    // Puts bytes of any number. A few, up to ShortCopy, come out of what is spare.
+    // Puts bytes of any number. Up to ShortCopy of them come out of what is spare; behind more there is room
+    // again.
     char* Put(char* to, std::string_view bytes)
     {
         if (bytes.size() > ShortCopy)

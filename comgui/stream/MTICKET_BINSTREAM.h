@@ -33,9 +33,9 @@ public:
     // operation lies within the buffer, so that the walk ends with GET_TICKET_END and nothing that is asked
     // of the reader on its way looks outside; if the payload of each STICKET_OP_SET_MULTIPAR is a good ticket
     // stream and that of each STICKET_OP_SET_PARTIAL a good table of keys. Payloads of other codes mean
-    // something to the module alone and may be anything. No bytes are a good stream. Takes memory for no more
-    // than a key, which is smaller than the stream; the list of a later GetSetMultipar may take far more than
-    // the stream has bytes, since keys that begin alike are told briefly there.
+    // something to the module alone and may be anything. No bytes are a good stream. Takes memory for
+    // one key alone, which is smaller than the stream; the list of a later GetSetMultipar may take far more
+    // than the stream has bytes, since keys that begin alike are told briefly there.
     static bool Check(void const* data, unsigned long size);
 };
 

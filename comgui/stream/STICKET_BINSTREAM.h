@@ -1,8 +1,8 @@
-// One ticket's parameters as bytes: the stream that begins with "STICKET_1", in memory or in a file. It has
-// no checksum and no length; it ends where its data ends. Numbers are stored by value and not by type, so a
-// reader gives back the smallest type that holds the value: docs/stream-formats.md tells the format and what
-// changes on the way. Nothing is thrown but by the item writers and readers, which are for those who put
-// streams together or take them apart themselves. One thread at a time for each object.
+// One ticket's parameters as bytes: the stream that begins with "STICKET_1", in memory or in a file. Nothing
+// in it guards against damage, and one that was cut between two values still reads as a good one. A number
+// loses its type: a reader gives back the smallest that holds it. docs/stream-formats.md tells the format and
+// what else changes on the way. Nothing is thrown but by the item writers and readers, which are for those
+// who put streams together or take them apart themselves. One thread at a time for each object.
 #pragma once
 
 #include "comgui/foundation/export.h"
@@ -38,7 +38,7 @@ public:
     // at 0 or -2, which is how a table for a write begins a vector.
     static bool Read(SETMULTIPAR_LIST& list, void const* data, unsigned long size, bool fixPositions);
 
-    // Whether Read would read the whole stream. Takes memory for no more than a key.
+    // Whether Read would read the whole stream. Takes memory for one key alone.
     static bool Check(void const* data, unsigned long size);
 
     // Reads the stream and writes its records to the ticket in one call, whose success is the result. A
@@ -59,11 +59,11 @@ public:
     // How many bytes both texts begin with alike.
     static unsigned long strsame(char const* previous, char const* key);
 
-    // On to the position of the next value: one more, but a negative position stays.
+    // On to the position of the next value: one further within a vector, the same below 0.
     static void IncPos(int& pos);
 
     // The position to report for a value at pos, which moves on. fixNext: set if the value is the first
-    // behind its key and 0 is to be told as -1; cleared.
+    // behind its key and 0 or -2 is to be told as -1; cleared.
     static int FixPos(bool& fixNext, int& pos);
 
     // Bytes of the file, which is then at its start; 0 if it cannot be told.
@@ -182,7 +182,7 @@ private:
     std::string_view Key() const { return {previousKey.data(), previousText}; }
 
     BYTES bytes;
-    std::string previousKey;  // as long as the longest key so far
+    std::string previousKey;  // with room for the longest key so far
     unsigned long previousSize = 0;
     unsigned long previousText = 0;  // bytes in front of the key's first zero byte
 };

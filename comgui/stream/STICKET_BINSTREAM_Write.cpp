@@ -94,7 +94,7 @@ private:
         return m_chunk.Put(PutKeyHeader(to, shared, tail.size()), tail);
     }
 
-    // A key that has nothing to build on, as the first one of all. That goes without saying if it is empty.
+    // A key that has nothing to build on, as the first of all. isSame: both are empty, so none is told.
     [[gnu::noinline]] static char* PutFullKey(BYTE_CHUNK& chunk, bool& first, char* to, std::string_view key,
                                               bool isSame)
     {

@@ -53,7 +53,7 @@ public:
 
     // The table, null while the list is empty. It belongs to the list and dies at the next add, at Clear()
     // and at the next Table(true) that has to sort. sort: by key, bytewise, records of one key staying in
-    // their order; the records themselves are sorted, so a sort is never undone.
+    // their order; the records themselves are sorted, and later tables show it.
     SETMULTIPAR* Table(bool sort);
 
     // Empties the list; all its addresses die.
