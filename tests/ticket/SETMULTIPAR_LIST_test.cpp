@@ -576,28 +576,6 @@ TYPED_TEST(CopiedNumber, Clear_ForgetsTheNumber)
     }
 }
 
-TEST_F(List, Clear_ForgetsKeysTextsAndBytes)
-{
-    for (int round = 0; round < 3; ++round)
-    {
-        list.SetParameter("Key", std::string("text"), -1);
-        list.SetParameter("Key", BIN_STRING("bytes", 5), -1);
-        for (int i = 0; i < 300; ++i)
-        {
-            std::string const filling = std::string(100, '_') + std::to_string(i);
-            list.SetParameter(filling.c_str(), filling, -1);
-            list.SetParameter("Key", BIN_STRING(filling), -1);
-        }
-        list.SetParameter("Key", std::string("text"), -1);
-        list.SetParameter("Key", BIN_STRING("bytes", 5), -1);
-        SETMULTIPAR const* const table = list.Table(false);
-        EXPECT_STREQ(table[0].key, "Key");
-        EXPECT_STREQ(Text(table[0]), "text");
-        EXPECT_EQ(Bytes(table[1]), "bytes");
-        list.Clear();
-    }
-}
-
 TEST(ListThatCopies, Clear_LeavesItCopying)
 {
     SETMULTIPAR_LIST list(true);
