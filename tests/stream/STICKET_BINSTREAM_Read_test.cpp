@@ -12,7 +12,6 @@
 
 using namespace StreamOracle;
 using testing::ElementsAre;
-using testing::IsEmpty;
 using IMPORT = STICKET_BINSTREAM::IMPORT_INTERN;
 
 namespace

@@ -123,6 +123,7 @@ TEST(NoMemory, WriteSmallTable_TellsItByAnOk)
 TEST(NoMemory, WriteLongVector_LeavesWhatWasPutBeforeOk)
 {
     std::vector<RECORD> records;
+    records.reserve(20000);
     for (int i = 0; i < 20000; ++i)
         records.push_back(Int("k", 1000, i));
     TABLE table(records, KEYS::SHARED);
@@ -300,6 +301,7 @@ TEST(NoMemory, AddManyToAList_KeepsEachValueOnceAllTheSame)
     for (std::size_t length = 1; length <= 40; ++length)
     {
         std::vector<std::string> texts;
+        texts.reserve(100);
         for (int i = 0; i < 100; ++i)
             texts.push_back(std::string(length, 'x') + std::to_string(i));
         bool hasThrown = false;
