@@ -1,6 +1,6 @@
 // What becomes of a site when processes are killed, meet, or find it unusable.
-#include "tests/integration/ChildProcess.h"
 #include "tests/integration/Host.h"
+#include "tests/support/ChildProcess.h"
 #include <fstream>
 #include <gmock/gmock.h>
 #include <sstream>
@@ -27,7 +27,7 @@ protected:
 
 TEST_F(SiteOfAHost, WriteThatWasAcknowledged_SurvivesKill9)
 {
-    int acknowledged = 0;
+    std::int64_t acknowledged = 0;
     {
         ChildProcess child(
             [](auto const& tell)
@@ -38,13 +38,12 @@ TEST_F(SiteOfAHost, WriteThatWasAcknowledged_SurvivesKill9)
             });
         while (acknowledged < 200)
         {
-            std::optional<int> const number = child.Next();
+            std::optional<std::int64_t> const number = child.Next();
             ASSERT_TRUE(number);
             acknowledged = *number;
         }
         child.Kill();
-        while (std::optional<int> const number = child.Next())
-            acknowledged = *number;
+        acknowledged = child.Last(acknowledged);
     }
     ASSERT_EQ(LogIn(), 0);
     EXPECT_GE(ReadInt("Test/Counter"), acknowledged);

@@ -5,7 +5,7 @@
 #include "comgui/access/STICKET_READ.h"
 #include "comgui/folders/clFOLDER_VARIABLES.h"
 #include "comgui/folders/clSETMULTIPAR_FOLDER_VARIABLES.h"
-#include "tests/stream/Allocations.h"
+#include "tests/support/Allocations.h"
 #include <climits>
 #include <new>
 #include <thread>

@@ -2,10 +2,12 @@
 #include "standin/server/FolderTable.h"
 
 #include "standin/server/Site.h"
+#include "tests/server/MemoryFolder.h"
 #include "tests/server/ServerTest.h"
-#include "tests/server/storageSupport.h"
+#include "tests/support/Files.h"
 #include <cstring>
 #include <gmock/gmock.h>
+#include <random>
 
 using namespace standin;
 using testing::AllOf;
@@ -132,7 +134,7 @@ INSTANTIATE_TEST_SUITE_P(Facts, Reading,
 
 TEST(Reading, RandomFolders_CanBeReadJustWhenAClientComesToAnEnd)
 {
-    std::mt19937_64 random = RandomFrom(28);
+    std::mt19937_64 random(28);
     std::vector<std::string> const parts{"$(", "INSTALL", "TEMP",       ")",        "/",
                                          "\\", "a",       "$(INSTALL)", "$(TEMP)/b"};
     int readable = 0;
@@ -279,7 +281,7 @@ protected:
         return settings;
     }
 
-    TemporaryFolder folder;
+    MemoryFolder folder;
     std::string said;
 };
 

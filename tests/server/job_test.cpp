@@ -3,8 +3,10 @@
 
 #include "standin/server/Site.h"
 #include "standin/server/TransferService.h"
+#include "tests/server/MemoryFolder.h"
 #include "tests/server/ServerTest.h"
-#include "tests/server/storageSupport.h"
+#include "tests/support/ChildProcess.h"
+#include "tests/support/Files.h"
 #include <gmock/gmock.h>
 #include <thread>
 
@@ -13,18 +15,6 @@ using testing::ElementsAre;
 using testing::HasSubstr;
 using testing::IsEmpty;
 namespace fs = std::filesystem;
-
-namespace
-{
-std::vector<std::string> NamesIn(fs::path const& folder)
-{
-    std::vector<std::string> names;
-    for (auto const& entry : fs::directory_iterator(folder))
-        names.push_back(entry.path().filename().string());
-    std::sort(names.begin(), names.end());
-    return names;
-}
-}  // namespace
 
 class Jobs : public ServerTest
 {
@@ -108,7 +98,7 @@ protected:
         return calls;
     }
 
-    TemporaryFolder folder;
+    MemoryFolder folder;
     std::string const file = Write("file.pdf", "content");
     std::string said;
     std::mutex lock;
@@ -511,7 +501,7 @@ protected:
     }
 
     std::string const Mark = ".job-0123456789abcdef";
-    TemporaryFolder folder;
+    MemoryFolder folder;
 };
 
 TEST_F(LeftByTheDead, PreparedJob_GoesWithItsFolder)

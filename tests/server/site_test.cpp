@@ -4,7 +4,10 @@
 #include "standin/server/Password.h"
 #include "standin/server/Seed.h"
 #include "standin/server/TicketXml.h"
-#include "storageSupport.h"
+#include "tests/server/MemoryFolder.h"
+#include "tests/support/ChildProcess.h"
+#include "tests/support/Files.h"
+#include "tests/support/sanitizers.h"
 #include <algorithm>
 #include <chrono>
 #include <csignal>
@@ -112,7 +115,7 @@ protected:
         return names;
     }
 
-    TemporaryFolder folder;
+    MemoryFolder folder;
 };
 
 class Environment : public testing::Test
@@ -341,8 +344,7 @@ TEST_F(SiteFolder, SecondProcess_IsToldWhoHasTheSite)
             report(1);
             pause();
         });
-    std::int64_t told = 0;
-    ASSERT_TRUE(child.Next(told));
+    ASSERT_TRUE(child.Next());
     EXPECT_EQ(ReasonOfOpening(),
               Folder().string() + ": in use by process " + std::to_string(child.Id()) +
                   " (server_tests); end it first, or choose another site with COMGUI_SITE");
@@ -405,8 +407,7 @@ TEST_F(SiteFolder, DamagedDatabase_TakesItsJournalWithIt)
                 report(1);
                 pause();
             });
-        std::int64_t told = 0;
-        ASSERT_TRUE(child.Next(told));
+        ASSERT_TRUE(child.Next());
     }
     std::string const journal = ContentOf(File("site.db-wal"));
     ASSERT_FALSE(journal.empty());
@@ -551,7 +552,7 @@ TEST_F(SiteFolder, KilledAtTheFirstStart_TheNextOneFindsNoHalfSite)
     MakeSite();
     auto const whole =
         std::chrono::duration_cast<std::chrono::microseconds>(std::chrono::steady_clock::now() - start);
-    std::mt19937_64 random = RandomFrom(1234);
+    std::mt19937_64 random(1234);
     int killed = 0;
     for (int round = 0; killed < (IsSanitized ? 10 : 50); ++round)
     {
