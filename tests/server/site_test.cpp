@@ -5,6 +5,7 @@
 #include "standin/server/Seed.h"
 #include "standin/server/TicketXml.h"
 #include "tests/server/MemoryFolder.h"
+#include "tests/server/StoredValues.h"
 #include "tests/support/ChildProcess.h"
 #include "tests/support/Files.h"
 #include "tests/support/sanitizers.h"
@@ -53,10 +54,7 @@ std::string TextOf(Storage& storage, TicketAddress address, std::string const& w
 
 void Rename(Storage& storage, std::string_view name)
 {
-    StoredValue value;
-    value.type = PARAM_STRING;
-    value.bytes = name;
-    storage.Apply({{Change::PutValue, SystemTicket, "System/Name", 0, value}});
+    storage.Apply({{Change::PutValue, SystemTicket, "System/Name", 0, Bytes(PARAM_STRING, name)}});
 }
 
 class SiteFolder : public testing::Test
@@ -264,9 +262,8 @@ TEST_F(SiteFolder, InstallFolder_ThatIsNoSingleText_IsReplaced)
 {
     {
         Site site = Site::Open(Folder(), ShippedSeed);
-        StoredValue number;
-        number.type = PARAM_INT;
-        site.storage().Apply({{Change::PutValue, SystemTicket, "System/InstallFolder", 1, number}});
+        site.storage().Apply(
+            {{Change::PutValue, SystemTicket, "System/InstallFolder", 1, Integer(PARAM_INT, 0)}});
     }
     Site site = Site::Open(Folder(), ShippedSeed);
     int values = 0;
@@ -280,10 +277,8 @@ TEST_F(SiteFolder, FolderKeysThatLeaveTheSite_MakeNoFolder)
 {
     {
         Site site = Site::Open(Folder(), ShippedSeed);
-        StoredValue value;
-        value.type = PARAM_STRING;
-        value.bytes = "$(INSTALL)/../outside";
-        site.storage().Apply({{Change::PutValue, SystemTicket, "System/Folders/Temp", 0, value}});
+        StoredValue const outside = Bytes(PARAM_STRING, "$(INSTALL)/../outside");
+        site.storage().Apply({{Change::PutValue, SystemTicket, "System/Folders/Temp", 0, outside}});
     }
     EXPECT_EQ(Said(), "");
     EXPECT_FALSE(std::filesystem::exists(folder / "outside"));
