@@ -1,9 +1,8 @@
 // What becomes of a site when processes are killed, meet, or find it unusable.
 #include "tests/integration/Host.h"
 #include "tests/support/ChildProcess.h"
-#include <fstream>
+#include "tests/support/Files.h"
 #include <gmock/gmock.h>
-#include <sstream>
 
 using testing::HasSubstr;
 
@@ -109,10 +108,8 @@ TEST_F(SiteOfAHost, SystemTicket_IsKeptAsXmlToo)
 {
     ASSERT_EQ(LogIn(), 0);
     Manager().SetParameter(0, 0, "System/Test", PARAM_STRING, "mirrored", -1);
-    std::ifstream file(folder.Path() / "site" / "tickets" / "SYS_0000.xml");
-    std::stringstream xml;
-    xml << file.rdbuf();
-    EXPECT_THAT(xml.str(), testing::AllOf(HasSubstr("System/Test"), HasSubstr("mirrored")));
+    EXPECT_THAT(ContentOf(folder.Path() / "site" / "tickets" / "SYS_0000.xml"),
+                testing::AllOf(HasSubstr("System/Test"), HasSubstr("mirrored")));
 }
 
 TEST_F(SiteOfAHost, DamagedDatabase_IsSetAsideAndMadeAnew)

@@ -6,7 +6,6 @@
 #include "comgui/folders/clFOLDER_VARIABLES.h"
 #include "comgui/folders/clSETMULTIPAR_FOLDER_VARIABLES.h"
 #include "tests/support/Allocations.h"
-#include <climits>
 #include <new>
 #include <thread>
 

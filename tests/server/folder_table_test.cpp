@@ -6,7 +6,6 @@
 #include "tests/server/ServerTest.h"
 #include "tests/server/StoredValues.h"
 #include "tests/support/Files.h"
-#include <cstring>
 #include <gmock/gmock.h>
 #include <random>
 

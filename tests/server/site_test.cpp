@@ -12,13 +12,11 @@
 #include <algorithm>
 #include <chrono>
 #include <csignal>
-#include <cstdint>
 #include <cstdlib>
 #include <fcntl.h>
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 #include <map>
-#include <optional>
 #include <random>
 #include <set>
 #include <sqlite3.h>

@@ -6,7 +6,6 @@
 #include "tests/support/ChildProcess.h"
 #include "tests/support/Files.h"
 #include "tests/support/sanitizers.h"
-#include <cstring>
 #include <gtest/gtest.h>
 #include <random>
 #include <thread>

@@ -7,7 +7,6 @@
 #include "tests/server/ServerTest.h"
 #include "tests/support/Files.h"
 #include <csignal>
-#include <cstring>
 #include <fcntl.h>
 #include <fstream>
 #include <gmock/gmock.h>
