@@ -4,7 +4,6 @@
 #include "bench/peers/peer.h"
 
 #include <cstdint>
-#include <cstring>
 #include <msgpack.hpp>
 #include <vector>
 

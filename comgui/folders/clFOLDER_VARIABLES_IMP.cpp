@@ -7,6 +7,7 @@
 #include "comgui/folders/folder_paths.h"
 #include "comgui/foundation/CharSets.h"
 #include <algorithm>
+#include <string_view>
 
 using SysLib::MUTEX_LOCK;
 
@@ -120,9 +121,10 @@ std::string comgui::detail::clFOLDER_VARIABLES_IMP::Encode(char const* key, std:
     MUTEX_LOCK const lock(mutex);
     if (key == nullptr || (flags & ENCODES) == 0)
         return relative;
-    if (FOLDER_MAPPING const* const mapping = FindKey(key))
-        return Below(mapping->variable, std::move(relative));
-    return relative;
+    auto const mapping = std::ranges::find(mappings, std::string_view(key), &FOLDER_MAPPING::key);
+    if (mapping == mappings.end())
+        return relative;
+    return Below(mapping->variable, std::move(relative));
 }
 
 std::string comgui::detail::clFOLDER_VARIABLES_IMP::EncodeV(char const* variable, std::string relative) const
@@ -143,8 +145,9 @@ std::string comgui::detail::clFOLDER_VARIABLES_IMP::Decode(std::string const& pa
     std::size_t const end = path.find(')', 2);
     if (end == std::string::npos || end == 2)
         return path;
-    FOLDER_MAPPING const* const mapping = FindVariable(std::string_view(path).substr(2, end - 2));
-    if (mapping == nullptr)
+    std::string_view const variable = std::string_view(path).substr(2, end - 2);
+    auto const mapping = std::ranges::find(mappings, variable, &FOLDER_MAPPING::variable);
+    if (mapping == mappings.end())
         return path;
     std::string decoded;
     decoded.reserve(mapping->folder.size() + path.size() - end - 1);
@@ -158,7 +161,7 @@ void comgui::detail::clFOLDER_VARIABLES_IMP::SetFolderVariable(char const* varia
     if (variable == nullptr)
         return;
     MUTEX_LOCK const lock(mutex);
-    auto const mapping = FindVariable(variable);
+    auto const mapping = std::ranges::find(mappings, std::string_view(variable), &FOLDER_MAPPING::variable);
     if (mapping == mappings.end())
     {
         if (folder)
@@ -175,28 +178,4 @@ comgui::detail::clFOLDER_VARIABLES_IMP::New_clSETMULTIPAR_FOLDER_VARIABLES(clFOL
                                                                            SETMULTIPAR* table, bool encode)
 {
     return new clSETMULTIPAR_FOLDER_VARIABLES(folders, table, encode);
-}
-
-comgui::detail::FOLDER_MAPPING const*
-comgui::detail::clFOLDER_VARIABLES_IMP::FindKey(std::string_view key) const
-{
-    auto const mapping = std::find_if(mappings.begin(), mappings.end(),
-                                      [key](FOLDER_MAPPING const& each) { return each.key == key; });
-    return mapping != mappings.end() ? &*mapping : nullptr;
-}
-
-comgui::detail::FOLDER_MAPPING const*
-comgui::detail::clFOLDER_VARIABLES_IMP::FindVariable(std::string_view variable) const
-{
-    auto const mapping =
-        std::find_if(mappings.begin(), mappings.end(),
-                     [variable](FOLDER_MAPPING const& each) { return each.variable == variable; });
-    return mapping != mappings.end() ? &*mapping : nullptr;
-}
-
-std::vector<comgui::detail::FOLDER_MAPPING>::iterator
-comgui::detail::clFOLDER_VARIABLES_IMP::FindVariable(std::string_view variable)
-{
-    return std::find_if(mappings.begin(), mappings.end(),
-                        [variable](FOLDER_MAPPING const& each) { return each.variable == variable; });
 }

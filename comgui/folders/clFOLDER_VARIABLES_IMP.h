@@ -7,7 +7,6 @@
 #include "comgui/foundation/SysLib.h"
 #include "comgui/ticket/MTICKET_ACCESS.h"
 #include <string>
-#include <string_view>
 #include <utility>
 #include <vector>
 
@@ -52,14 +51,9 @@ private:
         ENCODES = 2,
     };
 
-    // The first mapping of that key or variable, null or the end if there is none. With the lock held.
-    FOLDER_MAPPING const* FindKey(std::string_view key) const;
-    FOLDER_MAPPING const* FindVariable(std::string_view variable) const;
-    std::vector<FOLDER_MAPPING>::iterator FindVariable(std::string_view variable);
-
     mutable SysLib::MUTEX_INSTANCE mutex;
     MTICKET_ACCESS const* access;          // may be null
-    std::vector<FOLDER_MAPPING> mappings;  // in the order in which they came
+    std::vector<FOLDER_MAPPING> mappings;  // in the order in which they came; of equal ones the first counts
     unsigned flags;                        // of FLAG
 };
 }  // namespace comgui::detail

@@ -90,8 +90,8 @@ wxArrayInt ComGUIManager::GetIntArrayParameterFromLocal(wxString path, char cons
     return WithTicket(path, wxArrayInt(),
                       [&](STICKET_ACCESS const* ticket)
                       {
-                          // The default for a missing value marks the end, and so does a stored
-                          // -1. The doubles below go by the count instead.
+                          // The default for a missing value marks the end, and so does a stored -1.
+                          // The doubles below go by the count instead.
                           wxArrayInt array;
                           for (int pos = 0, value;
                                (value = STICKET_READ::Of(ticket)->GetIntParameter(pos, key, -1)) != -1; ++pos)

@@ -4,7 +4,6 @@
 #include <fstream>
 #include <memory>
 #include <plist/plist.h>
-#include <string_view>
 #include <system_error>
 #include <type_traits>
 

@@ -3,7 +3,6 @@
 
 #include <CoreFoundation/CoreFoundation.h>
 #include <atomic>
-#include <cstring>
 #include <new>
 
 namespace

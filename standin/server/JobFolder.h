@@ -1,7 +1,6 @@
 // The folder of a job: $(JOB)/ID, which comes and goes with the job's ticket. The administrator may have
-// given
-// $(JOB) a place where other programs have folders, too. So the server marks each that it makes by an empty
-// file in it, whose name only the job's ticket tells, and takes no other away.
+// given $(JOB) a place where other programs have folders, too. So the server marks each that it makes by an
+// empty file in it, whose name only the job's ticket tells, and takes no other away.
 #pragma once
 
 #include "standin/server/Descriptor.h"

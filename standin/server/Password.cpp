@@ -2,7 +2,6 @@
 
 #include <cerrno>
 #include <crypt.h>
-#include <cstring>
 #include <memory>
 #include <stdexcept>
 #include <string.h>

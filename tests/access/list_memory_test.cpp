@@ -1,7 +1,7 @@
 // What lists take from the heap, and what becomes of them when there is nothing to take.
-#include "tests/access/Callocs.h"
 #include "tests/access/ListFamilies.h"
-#include "tests/stream/Allocations.h"
+#include "tests/support/Allocations.h"
+#include "tests/support/Callocs.h"
 #include <gmock/gmock.h>
 #include <new>
 

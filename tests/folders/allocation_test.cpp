@@ -2,7 +2,7 @@
 #include "comgui/folders/clSETMULTIPAR_FOLDER_VARIABLES.h"
 #include "tests/folders/FolderRows.h"
 #include "tests/folders/FolderServer.h"
-#include "tests/stream/Allocations.h"
+#include "tests/support/Allocations.h"
 #include <future>
 #include <gtest/gtest.h>
 #include <new>

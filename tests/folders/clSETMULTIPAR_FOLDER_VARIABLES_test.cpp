@@ -3,7 +3,6 @@
 #include "tests/folders/FolderServer.h"
 #include <cstring>
 #include <gtest/gtest.h>
-#include <type_traits>
 #include <utility>
 
 using TRANSLATED = clSETMULTIPAR_FOLDER_VARIABLES;

@@ -18,7 +18,7 @@ protected:
 class EncodeRelative : public testing::Test
 {
 protected:
-    explicit EncodeRelative(int flags = 3) : server(flags)
+    EncodeRelative()
     {
         server.SetFolder("System/Folders/Temp", "/srv/temp");
         server.SetFolder("System/Folders/Log", "/srv/log/");

@@ -1,6 +1,6 @@
 #include "comgui/foundation/CharSets.h"
 
-#include "tests/stream/Allocations.h"
+#include "tests/support/Allocations.h"
 #include "tests/support/HexText.h"
 #include <algorithm>
 #include <cstdlib>

@@ -1,8 +1,8 @@
 // The local family of ComGUIManager on real ticket files, with no session anywhere, and what a file is after
 // its writer was killed.
-#include "tests/integration/ChildProcess.h"
 #include "tests/integration/Host.h"
-#include <fstream>
+#include "tests/support/ChildProcess.h"
+#include "tests/support/Files.h"
 #include <gmock/gmock.h>
 #include <random>
 #include <thread>
@@ -20,11 +20,7 @@ protected:
         folder.Write("ticket.xml", "<ticket version='1'>" + parameters + "</ticket>");
     }
 
-    std::string Content() const
-    {
-        std::ifstream stream(std::filesystem::path(file.utf8_string()));
-        return {std::istreambuf_iterator<char>(stream), {}};
-    }
+    std::string Content() const { return ContentOf(file.utf8_string()); }
 
     std::vector<std::string> Texts(char const* key) const
     {
@@ -190,7 +186,7 @@ TEST_F(LocalTicketFile, WhoseWriterIsKilledAtAnyInstant_IsWholeAndOldOrNew)
     int before = 0;
     for (int kill = 0; kill < 200; ++kill)
     {
-        int acknowledged = before;
+        std::int64_t acknowledged = before;
         {
             ChildProcess child(
                 [&](auto const& tell)
@@ -207,8 +203,7 @@ TEST_F(LocalTicketFile, WhoseWriterIsKilledAtAnyInstant_IsWholeAndOldOrNew)
             std::this_thread::sleep_for(
                 std::chrono::microseconds(std::uniform_int_distribution(0, 5000)(random)));
             child.Kill();
-            while (std::optional<int> const number = child.Next())
-                acknowledged = *number;
+            acknowledged = child.Last(acknowledged);
         }
         int const round = Manager().GetIntParameterFromLocal(file, "Test/A", -2, -1);
         ASSERT_TRUE(round == acknowledged || round == acknowledged + 1) << round << " " << acknowledged;

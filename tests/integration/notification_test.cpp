@@ -2,10 +2,10 @@
 // receiver's event.
 #include "tests/integration/Host.h"
 
+#include "tests/support/Notifications.h"
 #include <chrono>
 #include <condition_variable>
 #include <future>
-#include <memory>
 #include <mutex>
 #include <thread>
 #include <vector>
@@ -39,17 +39,7 @@ protected:
     ~Notification() override
     {
         Manager().LogoutBackward(&writer);
-        Take();
-    }
-
-    static std::vector<std::unique_ptr<NotifData>> Take()
-    {
-        std::vector<std::unique_ptr<NotifData>> taken;
-        wxCriticalSectionLocker const lock(ComGUIManager::m_csNotificationList);
-        for (NotifData* const notification : ComGUIManager::m_notificationList)
-            taken.emplace_back(notification);
-        ComGUIManager::m_notificationList.clear();
-        return taken;
+        TakeNotifications();
     }
 
     // Waits until that many have come.
@@ -59,7 +49,7 @@ protected:
         auto const end = std::chrono::steady_clock::now() + std::chrono::minutes(2);
         while (all.size() < count && std::chrono::steady_clock::now() < end)
         {
-            for (auto& notification : Take())
+            for (auto& notification : TakeNotifications())
                 all.push_back(std::move(notification));
             std::this_thread::yield();
         }

@@ -1,9 +1,8 @@
 // What becomes of a site when processes are killed, meet, or find it unusable.
-#include "tests/integration/ChildProcess.h"
 #include "tests/integration/Host.h"
-#include <fstream>
+#include "tests/support/ChildProcess.h"
+#include "tests/support/Files.h"
 #include <gmock/gmock.h>
-#include <sstream>
 
 using testing::HasSubstr;
 
@@ -27,7 +26,7 @@ protected:
 
 TEST_F(SiteOfAHost, WriteThatWasAcknowledged_SurvivesKill9)
 {
-    int acknowledged = 0;
+    std::int64_t acknowledged = 0;
     {
         ChildProcess child(
             [](auto const& tell)
@@ -38,13 +37,12 @@ TEST_F(SiteOfAHost, WriteThatWasAcknowledged_SurvivesKill9)
             });
         while (acknowledged < 200)
         {
-            std::optional<int> const number = child.Next();
+            std::optional<std::int64_t> const number = child.Next();
             ASSERT_TRUE(number);
             acknowledged = *number;
         }
         child.Kill();
-        while (std::optional<int> const number = child.Next())
-            acknowledged = *number;
+        acknowledged = child.Last(acknowledged);
     }
     ASSERT_EQ(LogIn(), 0);
     EXPECT_GE(ReadInt("Test/Counter"), acknowledged);
@@ -110,10 +108,8 @@ TEST_F(SiteOfAHost, SystemTicket_IsKeptAsXmlToo)
 {
     ASSERT_EQ(LogIn(), 0);
     Manager().SetParameter(0, 0, "System/Test", PARAM_STRING, "mirrored", -1);
-    std::ifstream file(folder.Path() / "site" / "tickets" / "SYS_0000.xml");
-    std::stringstream xml;
-    xml << file.rdbuf();
-    EXPECT_THAT(xml.str(), testing::AllOf(HasSubstr("System/Test"), HasSubstr("mirrored")));
+    EXPECT_THAT(ContentOf(folder.Path() / "site" / "tickets" / "SYS_0000.xml"),
+                testing::AllOf(HasSubstr("System/Test"), HasSubstr("mirrored")));
 }
 
 TEST_F(SiteOfAHost, DamagedDatabase_IsSetAsideAndMadeAnew)

@@ -35,7 +35,7 @@ TEST_F(Flood, OfAMillionNotificationsFromFourThreads_LosesNoneAndKeepsEachThread
     while (!wasLast)
     {
         wasLast = writing == 0;  // before the take: what came until then is in it
-        for (auto const& notification : Take())
+        for (auto const& notification : TakeNotifications())
         {
             int& expected = next.at(static_cast<std::size_t>(notification->NotifArgA));
             if (notification->NotifNumber != expected++)

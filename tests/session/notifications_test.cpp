@@ -11,7 +11,7 @@ protected:
     std::vector<std::unique_ptr<NotifData>> Notified(int kind, void* data)
     {
         ComGUIManager::fGUI2NOTIFICATION(this, kind, 21, 22, 23, data);
-        return Take();
+        return TakeNotifications();
     }
 
     // The only one; a failed test otherwise.
@@ -197,7 +197,7 @@ TEST_F(ScarceNotifications, OfATable_AreLostFromTheFirstWithoutMemoryOn_AndThePl
             ScarceMemory const memory(allocations);
             EXPECT_NO_THROW(ComGUIManager::fGUI2NOTIFICATION(this, 1, 0, 0, 3, table));
         }
-        auto const queued = Take();
+        auto const queued = TakeNotifications();
         ASSERT_GE(queued.size(), most);
         ASSERT_LE(queued.size(), keys.size());
         most = queued.size();
@@ -226,7 +226,7 @@ TEST_F(ScarceNotifications, OfOtherKinds_PassTheFailureToThePlugInAndQueueNothin
         {
             failed = true;
         }
-        EXPECT_EQ(Take().size(), failed ? 0u : 1u);
+        EXPECT_EQ(TakeNotifications().size(), failed ? 0u : 1u);
     }
     EXPECT_GE(failures, 3);  // the record, its text, and its place in the queue
 }

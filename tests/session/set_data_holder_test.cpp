@@ -1,7 +1,7 @@
 // One value that a host prepares for a write of many.
 #include "comgui/session/SetDataHolder.h"
 
-#include "tests/access/Callocs.h"
+#include "tests/support/Callocs.h"
 #include <bit>
 #include <csignal>
 #include <cstring>

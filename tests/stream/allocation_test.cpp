@@ -2,7 +2,7 @@
 #include "comgui/stream/MTICKET_BINSTREAM.h"
 #include "comgui/stream/STICKET_BINSTREAM.h"
 #include "comgui/ticket/SETMULTIPAR_LIST.h"
-#include "tests/stream/Allocations.h"
+#include "tests/support/Allocations.h"
 #include "tests/support/StreamOracle.h"
 #include "tests/support/TemporaryFolder.h"
 #include <algorithm>

@@ -1,13 +1,12 @@
 // Streams that come from tickets and go to tickets and files.
 #include "comgui/stream/STICKET_BINSTREAM.h"
 #include "tests/stream/WalkedTicket.h"
+#include "tests/support/Files.h"
 #include "tests/support/HexText.h"
 #include "tests/support/StreamOracle.h"
 #include "tests/support/TemporaryFolder.h"
-#include <fstream>
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
-#include <iterator>
 
 using namespace StreamOracle;
 using testing::ElementsAre;
@@ -18,13 +17,6 @@ namespace
 std::vector<RECORD> const Sample = {Int("Job/Copies", 3), Text("Job/Name", "A4"), Int("Job/Tray", 300, 0),
                                     Int("Job/Tray", -1, 1)};
 std::vector<RECORD> const Failing = {Int("a", 1), Int("b", 2, -3), Int("c", 3)};
-
-std::string ContentsOf(std::filesystem::path const& path)
-{
-    std::ifstream file(path, std::ios::binary);
-    EXPECT_TRUE(file.is_open()) << path;
-    return {std::istreambuf_iterator<char>(file), {}};
-}
 
 RECORD Pointer()
 {
@@ -142,14 +134,14 @@ TEST_F(StreamFile, Table_IsWritten)
 {
     TABLE table(Sample);
     EXPECT_TRUE(STICKET_BINSTREAM::Write(Path("stream").c_str(), table.Records(), 0));
-    EXPECT_EQ(HexOf(ContentsOf(Path("stream"))), HexOf(Encode(Sample).value()));
+    EXPECT_EQ(HexOf(ContentOf(Path("stream"))), HexOf(Encode(Sample).value()));
 }
 
 TEST_F(StreamFile, Ticket_IsWritten)
 {
     WalkedTicket ticket(Sample);
     EXPECT_TRUE(STICKET_BINSTREAM::Write(Path("stream").c_str(), ticket.Access(), 0));
-    EXPECT_EQ(HexOf(ContentsOf(Path("stream"))), HexOf(Encode(Sample).value()));
+    EXPECT_EQ(HexOf(ContentOf(Path("stream"))), HexOf(Encode(Sample).value()));
     EXPECT_THAT(ticket.prefixes, ElementsAre(""));
     EXPECT_THAT(ticket.limits, ElementsAre(8000));
 }
@@ -158,7 +150,7 @@ TEST_F(StreamFile, NameInUtf8_IsTaken)
 {
     TABLE table(Sample);
     EXPECT_TRUE(STICKET_BINSTREAM::Write(Path("\xC3\xA4\xE2\x82\xAC").c_str(), table.Records(), 0));
-    EXPECT_EQ(ContentsOf(Path("\xC3\xA4\xE2\x82\xAC")), Encode(Sample));
+    EXPECT_EQ(ContentOf(Path("\xC3\xA4\xE2\x82\xAC")), Encode(Sample));
 }
 
 TEST_F(StreamFile, OlderFile_IsReplaced)
@@ -166,7 +158,7 @@ TEST_F(StreamFile, OlderFile_IsReplaced)
     folder.Write("stream", std::string(1000, 'x'));
     TABLE table(Sample);
     EXPECT_TRUE(STICKET_BINSTREAM::Write(Path("stream").c_str(), table.Records(), 0));
-    EXPECT_EQ(HexOf(ContentsOf(Path("stream"))), HexOf(Encode(Sample).value()));
+    EXPECT_EQ(HexOf(ContentOf(Path("stream"))), HexOf(Encode(Sample).value()));
 }
 
 TEST_F(StreamFile, NothingToWrite_LeavesAnEmptyFile)
@@ -174,11 +166,11 @@ TEST_F(StreamFile, NothingToWrite_LeavesAnEmptyFile)
     folder.Write("table", "before");
     TABLE table({Pointer()});
     EXPECT_TRUE(STICKET_BINSTREAM::Write(Path("table").c_str(), table.Records(), 0));
-    EXPECT_EQ(ContentsOf(Path("table")), "");
+    EXPECT_EQ(ContentOf(Path("table")), "");
 
     WalkedTicket ticket({});
     EXPECT_TRUE(STICKET_BINSTREAM::Write(Path("ticket").c_str(), ticket.Access(), 0));
-    EXPECT_EQ(ContentsOf(Path("ticket")), "");
+    EXPECT_EQ(ContentOf(Path("ticket")), "");
 }
 
 TEST_F(StreamFile, Failure_DoesNotTouchTheFile)
@@ -188,7 +180,7 @@ TEST_F(StreamFile, Failure_DoesNotTouchTheFile)
     EXPECT_FALSE(STICKET_BINSTREAM::Write(Path("stream").c_str(), table.Records(), 0));
     WalkedTicket ticket(Failing);
     EXPECT_FALSE(STICKET_BINSTREAM::Write(Path("stream").c_str(), ticket.Access(), 0));
-    EXPECT_EQ(ContentsOf(Path("stream")), "before");
+    EXPECT_EQ(ContentOf(Path("stream")), "before");
     EXPECT_FALSE(STICKET_BINSTREAM::Write(Path("new").c_str(), table.Records(), 0));
     EXPECT_FALSE(std::filesystem::exists(Path("new")));
 }
@@ -228,7 +220,7 @@ TEST_F(StreamFile, ToFile_LeavesTheWriterAsItWas)
     EXPECT_TRUE(writer.ToFile(Path("stream").c_str()));
     std::string bytes;
     writer.Swap(bytes);
-    EXPECT_EQ(HexOf(bytes), HexOf(ContentsOf(Path("stream"))));
+    EXPECT_EQ(HexOf(bytes), HexOf(ContentOf(Path("stream"))));
 }
 
 // Bytes into a ticket.

@@ -1,16 +1,16 @@
 #include "tests/support/TemporaryFolder.h"
 
+#include "tests/support/Files.h"
 #include <cerrno>
 #include <cstdlib>
-#include <fstream>
 #include <string>
 #include <system_error>
 
 namespace fs = std::filesystem;
 
-TemporaryFolder::TemporaryFolder()
+TemporaryFolder::TemporaryFolder(fs::path const& place)
 {
-    std::string name = (fs::canonical(fs::temp_directory_path()) / "comgui-test-XXXXXX").string();
+    std::string name = (fs::canonical(place) / "comgui-test-XXXXXX").string();
     if (mkdtemp(name.data()) == nullptr)
         throw std::system_error(errno, std::generic_category(), name);
     m_path = name;
@@ -26,10 +26,6 @@ fs::path TemporaryFolder::Write(fs::path const& name, std::string_view text) con
 {
     fs::path file = m_path / name;
     fs::create_directories(file.parent_path());
-    std::ofstream stream;
-    stream.exceptions(std::ios::failbit | std::ios::badbit);
-    stream.open(file, std::ios::binary);
-    stream.write(text.data(), static_cast<std::streamsize>(text.size()));
-    stream.close();
+    WriteFile(file, text);
     return file;
 }

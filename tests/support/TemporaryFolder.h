@@ -8,13 +8,15 @@
 class TemporaryFolder
 {
 public:
-    TemporaryFolder();
+    // place: the folder to make it in.
+    explicit TemporaryFolder(std::filesystem::path const& place = std::filesystem::temp_directory_path());
     ~TemporaryFolder();
     TemporaryFolder(TemporaryFolder const&) = delete;
     TemporaryFolder& operator=(TemporaryFolder const&) = delete;
 
     // Absolute, and free of symbolic links.
     std::filesystem::path const& Path() const { return m_path; }
+    std::filesystem::path operator/(std::filesystem::path const& name) const { return m_path / name; }
 
     // Writes a file, over an older one of that name, and gives its path. name: relative to the folder; the
     // folders in it are made.

@@ -1,7 +1,6 @@
 #include "tests/tools/Streams.h"
 #include "tools/ticketstream/Trouble.h"
 #include "tools/ticketstream/json.h"
-#include <cmath>
 #include <gmock/gmock.h>
 
 using namespace ticketstream;

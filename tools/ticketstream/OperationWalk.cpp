@@ -4,7 +4,6 @@
 #include "comgui/stream/STICKET_BINSTREAM.h"
 #include "tools/ticketstream/ItemClass.h"
 #include "tools/ticketstream/Trouble.h"
-#include <algorithm>
 #include <cstring>
 
 namespace ticketstream

@@ -7,7 +7,6 @@
 #include "tools/ticketstream/StreamBuilder.h"
 #include "tools/ticketstream/Trouble.h"
 #include "tools/ticketstream/text.h"
-#include <climits>
 #include <limits>
 #include <nlohmann/json.hpp>
 

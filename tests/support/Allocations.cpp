@@ -1,4 +1,4 @@
-#include "tests/stream/Allocations.h"
+#include "tests/support/Allocations.h"
 
 #include <atomic>
 #include <cstdlib>

@@ -1,18 +1,10 @@
-#include "tests/access/Callocs.h"
+#include "tests/support/Callocs.h"
 
+#include "tests/support/sanitizers.h"
 #include <cstddef>
 
-#if defined(__has_feature)
-#    if __has_feature(address_sanitizer) || __has_feature(thread_sanitizer)
-#        define COMGUI_SANITIZED
-#    endif
-#endif
-#if defined(__SANITIZE_ADDRESS__) || defined(__SANITIZE_THREAD__)
-#    define COMGUI_SANITIZED
-#endif
-
 // A sanitizer has to know each block that is given back to it.
-#ifdef COMGUI_SANITIZED
+#if COMGUI_SANITIZED
 #    define COMGUI_REAL_CALLOC __interceptor_calloc
 #else
 #    define COMGUI_REAL_CALLOC __libc_calloc

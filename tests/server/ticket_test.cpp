@@ -3,6 +3,7 @@
 #include "tests/server/ServerTest.h"
 
 #include "comgui/ticket/BIN_STRING.h"
+#include "tests/server/StoredValues.h"
 #include <cmath>
 #include <limits>
 
@@ -11,30 +12,6 @@ using standin::SystemTicket;
 
 namespace
 {
-StoredValue Integer(PARAM_TYPE type, long long integer)
-{
-    StoredValue value;
-    value.type = type;
-    value.integer = integer;
-    return value;
-}
-
-StoredValue Double(double number)
-{
-    StoredValue value;
-    value.type = PARAM_DOUBLE;
-    value.number = number;
-    return value;
-}
-
-StoredValue Bytes(std::string_view bytes)
-{
-    StoredValue value;
-    value.type = PARAM_BINSTRING;
-    value.bytes = bytes;
-    return value;
-}
-
 // A table of integer writes that ends itself.
 struct INT_TABLE
 {
@@ -79,7 +56,7 @@ TEST_F(Tickets, StoredValues_ComeBackWithTypeAndBits)
     storage.Put(Job, "U", 0, Integer(PARAM_UNSIGNED, 4294967295));
     storage.Put(Job, "L", 0, Integer(PARAM_UNSIGNED64, -1));
     storage.Put(Job, "D", 0, Double(-0.0));
-    storage.Put(Job, "B", 2, Bytes(std::string_view("a\0b", 3)));
+    storage.Put(Job, "B", 2, Bytes(PARAM_BINSTRING, std::string_view("a\0b", 3)));
     auto& session = As("admin");
     unsigned u = 0;
     unsigned long long l = 0;

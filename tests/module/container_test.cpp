@@ -4,8 +4,7 @@
 
 #include "tests/support/ContainerContract.h"
 #include "tests/support/ContainerFake.h"
-#include <fstream>
-#include <iterator>
+#include "tests/support/Files.h"
 #include <stdexcept>
 #include <thread>
 #include <vector>
@@ -92,8 +91,7 @@ TEST_F(Containers, AChangeOfTheSystemTicket_IsMirroredInItsFile)
     auto const* const admin = Container(LogIn());
     ASSERT_TRUE(admin);
     EXPECT_TRUE(WriteInt(admin, 0, 0, "Test/Mirrored", 4711));
-    std::ifstream file(folder.Path() / "site" / "tickets" / "SYS_0000.xml");
-    std::string const text{std::istreambuf_iterator<char>(file), {}};
+    std::string const text = ContentOf(folder.Path() / "site" / "tickets" / "SYS_0000.xml");
     EXPECT_NE(text.find("Test/Mirrored"), std::string::npos);
     EXPECT_NE(text.find("4711"), std::string::npos);
 }

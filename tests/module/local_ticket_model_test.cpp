@@ -4,20 +4,13 @@
 
 #include "comgui/access/STICKET_MODIFY.h"
 #include "comgui/access/STICKET_READ.h"
+#include "tests/support/sanitizers.h"
 #include <map>
 #include <random>
 #include <variant>
 
 namespace
 {
-#if defined(__SANITIZE_ADDRESS__) || defined(__SANITIZE_THREAD__)
-constexpr bool IsSanitized = true;
-#elif defined(__has_feature)
-constexpr bool IsSanitized = __has_feature(address_sanitizer) || __has_feature(thread_sanitizer);
-#else
-constexpr bool IsSanitized = false;
-#endif
-
 constexpr int Operations = IsSanitized ? 100'000 : 1'000'000;  // each costs some ten times as much there
 
 using VALUE = std::variant<int, double, void*, std::string>;

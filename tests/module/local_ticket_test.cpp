@@ -5,10 +5,10 @@
 #include "comgui/ticket/BIN_STRING.h"
 #include "comgui/ticket/TICKET_OP.h"
 #include "tests/support/ContainerContract.h"
+#include "tests/support/Files.h"
 #include <climits>
 #include <cmath>
 #include <csignal>
-#include <fstream>
 #include <gmock/gmock.h>
 #include <limits>
 #include <sys/resource.h>
@@ -390,20 +390,6 @@ protected:
     {
         return folder.Write(name, "<ticket version='1' type='3' id='9'>\n" + parameters + "\n</ticket>\n");
     }
-    static std::string Content(std::string const& path)
-    {
-        std::ifstream file(path);
-        return {std::istreambuf_iterator<char>(file), {}};
-    }
-    // Everything in the folder, so that nothing is left beside the file.
-    std::vector<std::string> Names() const
-    {
-        std::vector<std::string> names;
-        for (auto const& entry : std::filesystem::directory_iterator(folder.Path()))
-            names.push_back(entry.path().filename());
-        return names;
-    }
-
     // What it writes to stderr to open that path, which must fail.
     std::string LineOfFailedOpening(std::string const& path) const
     {
@@ -440,7 +426,7 @@ TEST_F(TicketFile, ThatIsMissing_GivesNullWithoutAWordAndIsNotMade)
     EXPECT_THAT(LineOfFailedOpening(Path("no folder/ticket.xml")), IsEmpty());
     EXPECT_THAT(LineOfFailedOpening(Path("file/ticket.xml")), IsEmpty());
     EXPECT_THAT(LineOfFailedOpening(""), IsEmpty());
-    EXPECT_THAT(Names(), ElementsAre("file"));
+    EXPECT_THAT(NamesIn(folder.Path()), ElementsAre("file"));
 }
 
 TEST_F(TicketFile, WithBackslashesInItsPath_IsFound)
@@ -490,9 +476,9 @@ TEST_F(TicketFile, OfTheWrongKind_GivesNullAndOneLineWithNameLineAndReason)
         EXPECT_THAT(LineOfFailedOpening(path),
                     AllOf(IsOneLine(), HasSubstr(path + fact.reason), HasSubstr("; correct the file")))
             << fact.text;
-        EXPECT_EQ(Content(path), fact.text);
+        EXPECT_EQ(ContentOf(path), fact.text);
     }
-    EXPECT_THAT(Names(), ElementsAre("ticket.xml"));
+    EXPECT_THAT(NamesIn(folder.Path()), ElementsAre("ticket.xml"));
 }
 
 TEST_F(TicketFile, ThatIsHuge_IsRefusedAtTheCap)
@@ -533,17 +519,17 @@ TEST_F(TicketFile, AChange_IsInTheFileOnceTheTicketIsDestroyed)
     {
         TICKET const ticket(factory, path);
         EXPECT_TRUE(ticket.Set("New", "text"));
-        EXPECT_THAT(Content(path), testing::Not(HasSubstr("New")));
+        EXPECT_THAT(ContentOf(path), testing::Not(HasSubstr("New")));
     }
     EXPECT_THAT(WalkOver(TICKET(factory, path)), ElementsAre("New[0]=text", "Old[0]=1"));
-    EXPECT_THAT(Content(path), HasSubstr("type=\"3\" id=\"9\""));
-    EXPECT_THAT(Names(), ElementsAre("ticket.xml"));
+    EXPECT_THAT(ContentOf(path), HasSubstr("type=\"3\" id=\"9\""));
+    EXPECT_THAT(NamesIn(folder.Path()), ElementsAre("ticket.xml"));
 }
 
 TEST_F(TicketFile, WithoutAChange_IsLeftAsItWas)
 {
     std::string const path = Written("<!-- by hand --><parameter key='K' type='int'>1</parameter>");
-    std::string const before = Content(path);
+    std::string const before = ContentOf(path);
     struct stat then = {};
     ASSERT_EQ(stat(path.c_str(), &then), 0);
     {
@@ -558,7 +544,7 @@ TEST_F(TicketFile, WithoutAChange_IsLeftAsItWas)
     struct stat now = {};
     ASSERT_EQ(stat(path.c_str(), &now), 0);
     EXPECT_EQ(now.st_ino, then.st_ino);  // not even written anew with the same content
-    EXPECT_EQ(Content(path), before);
+    EXPECT_EQ(ContentOf(path), before);
 }
 
 TEST_F(TicketFile, EveryTypeButThePointer_ComesBackBitForBit)
@@ -635,7 +621,7 @@ TEST_F(TicketFile, OpenedTwice_IsWhatTheLastOneSaved)
 TEST_F(TicketFile, ThatCannotBeWritten_IsOneLineAndStaysAsItWas)
 {
     std::string const path = Written("");
-    std::string const before = Content(path);
+    std::string const before = ContentOf(path);
     STICKET_ACCESS const* ticket = factory.Create(path.c_str());
     ASSERT_TRUE(ticket);
     std::string const text(10000, 'x');
@@ -654,14 +640,14 @@ TEST_F(TicketFile, ThatCannotBeWritten_IsOneLineAndStaysAsItWas)
     EXPECT_THAT(testing::internal::GetCapturedStderr(),
                 AllOf(IsOneLine(), HasSubstr(path + ": cannot be written"), HasSubstr("; free some space")));
     EXPECT_EQ(ticket, nullptr);
-    EXPECT_EQ(Content(path), before);
-    EXPECT_THAT(Names(), ElementsAre("ticket.xml"));
+    EXPECT_EQ(ContentOf(path), before);
+    EXPECT_THAT(NamesIn(folder.Path()), ElementsAre("ticket.xml"));
 }
 
 TEST_F(TicketFile, ThatWouldGrowPastTheCap_IsNotWrittenSinceItCouldNotBeReadAgain)
 {
     std::string const path = Written("");
-    std::string const before = Content(path);
+    std::string const before = ContentOf(path);
     STICKET_ACCESS const* ticket = factory.Create(path.c_str());
     ASSERT_TRUE(ticket);
     std::string const text((std::size_t{64} << 20) - 20, 'x');
@@ -670,7 +656,7 @@ TEST_F(TicketFile, ThatWouldGrowPastTheCap_IsNotWrittenSinceItCouldNotBeReadAgai
     factory.Destroy(ticket);
     EXPECT_THAT(testing::internal::GetCapturedStderr(),
                 AllOf(IsOneLine(), HasSubstr(path), HasSubstr("more than 64 MiB; delete values")));
-    EXPECT_EQ(Content(path), before);
+    EXPECT_EQ(ContentOf(path), before);
 }
 
 TEST_F(TicketFile, InAFolderThatIsGone_IsOneLine)
@@ -710,5 +696,5 @@ TEST_F(TicketFile, OfManyThreadsAtOnce_IsWholeAndOneOfTheirs)
     TICKET const ticket(factory, path);
     EXPECT_EQ(ticket.Int("A"), ticket.Int("B"));
     EXPECT_GE(ticket.Int("A"), 0);
-    EXPECT_THAT(Names(), ElementsAre("ticket.xml"));
+    EXPECT_THAT(NamesIn(folder.Path()), ElementsAre("ticket.xml"));
 }

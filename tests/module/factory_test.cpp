@@ -1,7 +1,6 @@
 #include "tests/module/ModuleUnderTest.h"
 
 #include <CoreFoundation/CoreFoundation.h>
-#include <algorithm>
 #include <cstring>
 
 namespace

@@ -5,8 +5,7 @@
 #include "comgui/access/STICKET_READ.h"
 #include "comgui/folders/clFOLDER_VARIABLES.h"
 #include "comgui/folders/clSETMULTIPAR_FOLDER_VARIABLES.h"
-#include "tests/stream/Allocations.h"
-#include <climits>
+#include "tests/support/Allocations.h"
 #include <new>
 #include <thread>
 

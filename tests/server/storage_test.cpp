@@ -1,6 +1,10 @@
 #include "standin/server/SqliteStorage.h"
 
-#include "storageSupport.h"
+#include "tests/server/MemoryFolder.h"
+#include "tests/server/StoredValues.h"
+#include "tests/support/ChildProcess.h"
+#include "tests/support/Files.h"
+#include "tests/support/sanitizers.h"
 #include <bit>
 #include <chrono>
 #include <csignal>
@@ -23,30 +27,6 @@ using testing::IsEmpty;
 namespace
 {
 constexpr TicketAddress Job{3, 1};
-
-StoredValue Integer(PARAM_TYPE type, long long number)
-{
-    StoredValue value;
-    value.type = type;
-    value.integer = number;
-    return value;
-}
-
-StoredValue Double(double number)
-{
-    StoredValue value;
-    value.type = PARAM_DOUBLE;
-    value.number = number;
-    return value;
-}
-
-StoredValue Bytes(PARAM_TYPE type, std::string_view bytes)
-{
-    StoredValue value;
-    value.type = type;
-    value.bytes = bytes;
-    return value;
-}
 
 Change Create(TicketAddress address) { return {Change::CreateTicket, address}; }
 
@@ -129,7 +109,7 @@ protected:
         return false;
     }
 
-    TemporaryFolder folder;
+    MemoryFolder folder;
 };
 }  // namespace
 
@@ -370,7 +350,7 @@ TEST_F(SqliteStorageFile, Load_WhenTheFunctionThrows_CanBeCalledAgain)
 // Any sequence of changes leaves in the file what it leaves in a plain map.
 TEST_F(SqliteStorageFile, RandomChanges_EqualAPlainMap)
 {
-    std::mt19937_64 random = RandomFrom(20240611);
+    std::mt19937_64 random(20240611);
     auto const below = [&random](unsigned limit) { return static_cast<int>(random() % limit); };
     std::map<TicketAddress, Values> model;
     auto const check = [&model](Storage& storage)
@@ -478,10 +458,9 @@ TEST_F(SqliteStorageFile, WithoutItsDatabase_ALeftJournalIsNotTakenUp)
             report(1);
             pause();
         });
-    std::int64_t told = 0;
-    ASSERT_TRUE(child.Next(told));
+    ASSERT_TRUE(child.Next());
     child.Kill();
-    ASSERT_THAT(folder.Names(), testing::Contains("site.db-wal"));
+    ASSERT_THAT(NamesIn(folder.Path()), testing::Contains("site.db-wal"));
     std::filesystem::remove(File());
     EXPECT_THAT(SqliteStorage(File(), Nothing).Tickets(), IsEmpty());
 }
@@ -608,9 +587,7 @@ TEST_F(SqliteStorageFile, DiskFull_FailsClearlyAndLosesNothing)
         });
     for (int i = 0; i < 3; ++i)
     {
-        std::int64_t held = 0;
-        ASSERT_TRUE(child.Next(held)) << i;
-        EXPECT_TRUE(held) << i;
+        EXPECT_EQ(child.Next(), true) << i;
     }
     EXPECT_EQ(child.Wait(), 0);
     SqliteStorage storage(File(), Nothing);
@@ -621,7 +598,7 @@ TEST_F(SqliteStorageFile, DiskFull_FailsClearlyAndLosesNothing)
 // not behind what was acknowledged.
 TEST_F(SqliteStorageFile, KilledAtAnyInstant_KeepsAcknowledgedChangesWhole)
 {
-    std::mt19937_64 random = RandomFrom(4711);
+    std::mt19937_64 random(4711);
     std::vector<std::string> const keys{"A", "B", "C", "D", "E"};
     std::int64_t last = 0;
     for (int round = 0; round < (IsSanitized ? 15 : 60); ++round)

@@ -2,9 +2,12 @@
 #include "standin/server/JobIntake.h"
 #include "standin/server/Site.h"
 #include "standin/server/TransferService.h"
-#include "tests/server/storageSupport.h"
-#include <cstring>
+#include "tests/server/MemoryFolder.h"
+#include "tests/support/ChildProcess.h"
+#include "tests/support/Files.h"
+#include "tests/support/sanitizers.h"
 #include <gtest/gtest.h>
+#include <random>
 #include <thread>
 
 using namespace standin;
@@ -76,7 +79,7 @@ protected:
         }
     }
 
-    TemporaryFolder folder;
+    MemoryFolder folder;
 };
 
 // The job's file as the ticket tells of it.
@@ -108,16 +111,15 @@ FoundJob JobIn(Storage& storage, TicketAddress address)
 
 TEST_F(KilledTransfers, LeaveNoHalfFileAndNoJobWithoutItsFile)
 {
-    std::mt19937_64 random = RandomFrom(500);
+    std::mt19937_64 random(500);
     int workers = 0;
     int beginnings = 0;
     std::size_t jobs = 0;
     for (int round = 0; round < (IsSanitized ? 40 : 500); ++round)
     {
         ChildProcess child([this](ChildProcess::Report const& report) { Work(report); });
-        std::int64_t number = 0;
         if (round == 0)
-            child.Next(number);  // one at least comes far enough, however busy the machine is
+            child.Next();  // one at least comes far enough, however busy the machine is
         std::this_thread::sleep_for(std::chrono::microseconds(random() % (IsSanitized ? 600000 : 25000)));
         child.Kill();
         workers += child.Last(-1) >= 0 ? 1 : 0;

@@ -3,13 +3,14 @@
 
 #include "standin/server/JobIntake.h"
 #include "standin/server/Site.h"
+#include "tests/server/MemoryFolder.h"
 #include "tests/server/ServerTest.h"
-#include "tests/server/storageSupport.h"
+#include "tests/support/Files.h"
 #include <csignal>
-#include <cstring>
 #include <fcntl.h>
 #include <fstream>
 #include <gmock/gmock.h>
+#include <random>
 #include <sys/fsuid.h>
 #include <sys/resource.h>
 #include <sys/stat.h>
@@ -46,18 +47,9 @@ std::string Shown(ServerPath const& path)
     return text + "|" + path.name;
 }
 
-std::vector<std::string> NamesIn(fs::path const& folder)
-{
-    std::vector<std::string> names;
-    for (auto const& entry : fs::directory_iterator(folder))
-        names.push_back(entry.path().filename().string());
-    std::sort(names.begin(), names.end());
-    return names;
-}
-
 std::string Bytes(std::size_t size)
 {
-    std::mt19937_64 random = RandomFrom(static_cast<unsigned>(size));
+    std::mt19937_64 random(static_cast<unsigned>(size));
     std::string bytes(size, '\0');
     for (char& byte : bytes)
         byte = static_cast<char>(random());
@@ -169,7 +161,7 @@ protected:
         EXPECT_THAT(NamesIn(folder / "site/job"), IsEmpty());
     }
 
-    TemporaryFolder folder;
+    MemoryFolder folder;
     std::string said;
 };
 

@@ -2,10 +2,12 @@
 #include "standin/server/FolderTable.h"
 
 #include "standin/server/Site.h"
+#include "tests/server/MemoryFolder.h"
 #include "tests/server/ServerTest.h"
-#include "tests/server/storageSupport.h"
-#include <cstring>
+#include "tests/server/StoredValues.h"
+#include "tests/support/Files.h"
 #include <gmock/gmock.h>
+#include <random>
 
 using namespace standin;
 using testing::AllOf;
@@ -132,7 +134,7 @@ INSTANTIATE_TEST_SUITE_P(Facts, Reading,
 
 TEST(Reading, RandomFolders_CanBeReadJustWhenAClientComesToAnEnd)
 {
-    std::mt19937_64 random = RandomFrom(28);
+    std::mt19937_64 random(28);
     std::vector<std::string> const parts{"$(", "INSTALL", "TEMP",       ")",        "/",
                                          "\\", "a",       "$(INSTALL)", "$(TEMP)/b"};
     int readable = 0;
@@ -244,23 +246,18 @@ protected:
     std::filesystem::path Folder() const { return folder / "site"; }
 
     // Writes past the server, as a seed or an older program may have done.
-    void Put(std::string_view key, std::string_view text, int pos = 0)
+    void Apply(std::vector<Change> const& changes)
     {
-        StoredValue value;
-        value.type = PARAM_STRING;
-        value.bytes = text;
-        Site::Open(Folder(), COMGUI_TEST_SEED)
-            .storage()
-            .Apply({{Change::PutValue, SystemTicket, key, pos, value}});
+        Site::Open(Folder(), COMGUI_TEST_SEED).storage().Apply(changes);
     }
+    static Change Text(std::string_view key, std::string_view text, int pos = 0)
+    {
+        return {Change::PutValue, SystemTicket, key, pos, Bytes(PARAM_STRING, text)};
+    }
+    void Put(std::string_view key, std::string_view text, int pos = 0) { Apply({Text(key, text, pos)}); }
     void Put(std::string_view key, int number)
     {
-        StoredValue value;
-        value.type = PARAM_INT;
-        value.integer = number;
-        Site::Open(Folder(), COMGUI_TEST_SEED)
-            .storage()
-            .Apply({{Change::PutValue, SystemTicket, key, 0, value}});
+        Apply({{Change::PutValue, SystemTicket, key, 0, Integer(PARAM_INT, number)}});
     }
 
     // Opens the site, keeps what it says, and gives the folders as they are then.
@@ -279,7 +276,7 @@ protected:
         return settings;
     }
 
-    TemporaryFolder folder;
+    MemoryFolder folder;
     std::string said;
 };
 
@@ -307,15 +304,7 @@ TEST_F(FoldersOfASite, UnresolvableOne_IsToldAndSwitchedOff)
 
 TEST_F(FoldersOfASite, WhatLeansOnAnUnresolvableOne_GoesWithIt)
 {
-    StoredValue temp;
-    temp.type = PARAM_STRING;
-    temp.bytes = "$(NOPE)";
-    StoredValue print = temp;
-    print.bytes = "$(TEMP)/print";
-    Site::Open(Folder(), COMGUI_TEST_SEED)
-        .storage()
-        .Apply({{Change::PutValue, SystemTicket, "System/Folders/Temp", 0, temp},
-                {Change::PutValue, SystemTicket, "System/Folders/Print", 0, print}});
+    Apply({Text("System/Folders/Temp", "$(NOPE)"), Text("System/Folders/Print", "$(TEMP)/print")});
     FolderSettings const settings = Opened();
     EXPECT_EQ(std::count(said.begin(), said.end(), '\n'), 2) << said;
     EXPECT_TRUE(settings.CanBeRead());

@@ -5,11 +5,10 @@
 #include "comgui/session/TCommandRecord.h"
 #include "comgui/session/TJobIdentification.h"
 #include "standin/module/ModuleCodes.h"
+#include "tests/support/Files.h"
 #include <csignal>
 #include <cstring>
-#include <fstream>
 #include <gmock/gmock.h>
-#include <sstream>
 #include <sys/resource.h>
 
 using namespace standin;
@@ -21,23 +20,6 @@ using testing::IsEmpty;
 
 namespace
 {
-std::string ContentOf(fs::path const& file)
-{
-    std::ifstream stream(file, std::ios::binary);
-    std::stringstream content;
-    content << stream.rdbuf();
-    return content.str();
-}
-
-std::vector<std::string> NamesIn(fs::path const& folder)
-{
-    std::vector<std::string> names;
-    for (auto const& entry : std::filesystem::directory_iterator(folder))
-        names.push_back(entry.path().filename().string());
-    std::sort(names.begin(), names.end());
-    return names;
-}
-
 struct COMMAND_RECORD : TCommandRecord
 {
     explicit COMMAND_RECORD(std::string const& text2 = {}) : TCommandRecord{}

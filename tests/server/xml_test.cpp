@@ -2,7 +2,11 @@
 
 #include "standin/server/AtomicFile.h"
 #include "standin/server/TicketXmlText.h"
-#include "storageSupport.h"
+#include "tests/server/MemoryFolder.h"
+#include "tests/server/StoredValues.h"
+#include "tests/support/ChildProcess.h"
+#include "tests/support/Files.h"
+#include "tests/support/sanitizers.h"
 #include <bit>
 #include <csignal>
 #include <cstdint>
@@ -25,30 +29,6 @@ using testing::UnorderedElementsAreArray;
 
 namespace
 {
-StoredValue Integer(PARAM_TYPE type, long long number)
-{
-    StoredValue value;
-    value.type = type;
-    value.integer = number;
-    return value;
-}
-
-StoredValue Double(double number)
-{
-    StoredValue value;
-    value.type = PARAM_DOUBLE;
-    value.number = number;
-    return value;
-}
-
-StoredValue Bytes(PARAM_TYPE type, std::string_view bytes)
-{
-    StoredValue value;
-    value.type = type;
-    value.bytes = bytes;
-    return value;
-}
-
 std::string OnlyTextOf(std::string const& parameter)
 {
     std::string text;
@@ -228,7 +208,7 @@ TEST(TicketXml, Pointer_TakesThePlaceAndIsNotWritten)
 
 TEST(TicketXml, RandomTickets_ComeBack)
 {
-    std::mt19937_64 random = RandomFrom(815);
+    std::mt19937_64 random(815);
     auto const below = [&random](unsigned limit) { return static_cast<int>(random() % limit); };
     for (int round = 0; round < (IsSanitized ? 100 : 500); ++round)
     {
@@ -438,14 +418,14 @@ TEST(TicketXmlParse, DeepNesting_IsRefusedWithoutHarm)
 
 TEST(TicketXmlFile, Write_ThenRead_IsTheSameTicket)
 {
-    TemporaryFolder folder;
+    MemoryFolder folder;
     TicketXml::Parse(Example, "file").Write(folder / "ticket.xml");
     EXPECT_EQ(TicketXml::Read(folder / "ticket.xml").Text(), Example);
 }
 
 TEST(TicketXmlFile, Read_NamesTheFileAndTheLine)
 {
-    TemporaryFolder folder;
+    MemoryFolder folder;
     WriteFile(folder / "ticket.xml", "\n<site/>");
     try
     {
@@ -461,7 +441,7 @@ TEST(TicketXmlFile, Read_NamesTheFileAndTheLine)
 
 TEST(TicketXmlFile, Read_OfAMissingFile_NamesItAndTheReason)
 {
-    TemporaryFolder folder;
+    MemoryFolder folder;
     try
     {
         TicketXml::Read(folder / "ticket.xml");
@@ -503,15 +483,15 @@ TEST(Base64, WhatIsNone_GivesNothing)
 
 TEST(ReplaceFile, MakesAFileThatIsNotThere)
 {
-    TemporaryFolder folder;
+    MemoryFolder folder;
     ReplaceFile(folder / "file", "new");
     EXPECT_EQ(ContentOf(folder / "file"), "new");
-    EXPECT_THAT(folder.Names(), ElementsAre("file"));
+    EXPECT_THAT(NamesIn(folder.Path()), ElementsAre("file"));
 }
 
 TEST(ReplaceFile, PutsANewFileInThePlaceOfTheOld)
 {
-    TemporaryFolder folder;
+    MemoryFolder folder;
     WriteFile(folder / "file", "the old content");
     int const reader = open((folder / "file").c_str(), O_RDONLY | O_CLOEXEC);
     ReplaceFile(folder / "file", "new");
@@ -519,12 +499,12 @@ TEST(ReplaceFile, PutsANewFileInThePlaceOfTheOld)
     char old[32];
     EXPECT_EQ(read(reader, old, sizeof(old)), 15) << "who reads the old file goes on reading it";
     close(reader);
-    EXPECT_THAT(folder.Names(), ElementsAre("file"));
+    EXPECT_THAT(NamesIn(folder.Path()), ElementsAre("file"));
 }
 
 TEST(ReplaceFile, KeepsThePermissions)
 {
-    TemporaryFolder folder;
+    MemoryFolder folder;
     WriteFile(folder / "file", "old");
     chmod((folder / "file").c_str(), 0640);
     ReplaceFile(folder / "file", "new");
@@ -535,7 +515,7 @@ TEST(ReplaceFile, KeepsThePermissions)
 
 TEST(ReplaceFile, ThroughALink_ReplacesWhatItPointsAt)
 {
-    TemporaryFolder folder;
+    MemoryFolder folder;
     WriteFile(folder / "file", "old");
     std::filesystem::create_symlink("file", folder / "link");
     ReplaceFile(folder / "link", "new");
@@ -545,7 +525,7 @@ TEST(ReplaceFile, ThroughALink_ReplacesWhatItPointsAt)
 
 TEST(ReplaceFile, WithoutItsFolder_NamesFileReasonAndRemedy)
 {
-    TemporaryFolder folder;
+    MemoryFolder folder;
     try
     {
         ReplaceFile(folder / "none" / "file", "new");
@@ -562,16 +542,16 @@ TEST(ReplaceFile, WithoutItsFolder_NamesFileReasonAndRemedy)
 
 TEST(ReplaceFile, OfAFolder_FailsAndLeavesIt)
 {
-    TemporaryFolder folder;
+    MemoryFolder folder;
     std::filesystem::create_directories(folder / "file" / "sub");
     EXPECT_THROW(ReplaceFile(folder / "file", "new"), StorageError);
-    EXPECT_THAT(folder.Names(), ElementsAre("file"));
+    EXPECT_THAT(NamesIn(folder.Path()), ElementsAre("file"));
     EXPECT_TRUE(std::filesystem::is_directory(folder / "file" / "sub"));
 }
 
 TEST(ReplaceFile, DiskFull_KeepsTheOldContentAndLeavesNothingElse)
 {
-    TemporaryFolder folder;
+    MemoryFolder folder;
     WriteFile(folder / "file", "old");
     ChildProcess child(
         [&folder](ChildProcess::Report const& report)
@@ -591,13 +571,13 @@ TEST(ReplaceFile, DiskFull_KeepsTheOldContentAndLeavesNothingElse)
     EXPECT_EQ(child.Wait(), 0);
     EXPECT_EQ(child.Last(-1), 1);
     EXPECT_EQ(ContentOf(folder / "file"), "old");
-    EXPECT_THAT(folder.Names(), ElementsAre("file"));
+    EXPECT_THAT(NamesIn(folder.Path()), ElementsAre("file"));
 }
 
 TEST(ReplaceFile, KilledAtAnyInstant_HasTheOldContentOrTheNew)
 {
-    TemporaryFolder folder;
-    std::mt19937_64 random = RandomFrom(99);
+    MemoryFolder folder;
+    std::mt19937_64 random(99);
     ReplaceFile(folder / "file", std::string(100000, 'a'));
     for (int round = 0; round < (IsSanitized ? 10 : 50); ++round)
     {
@@ -614,12 +594,12 @@ TEST(ReplaceFile, KilledAtAnyInstant_HasTheOldContentOrTheNew)
         ASSERT_EQ(content.find_first_not_of(content[0]), std::string::npos);
     }
     RemoveLeftovers(folder / "file");
-    EXPECT_THAT(folder.Names(), ElementsAre("file"));
+    EXPECT_THAT(NamesIn(folder.Path()), ElementsAre("file"));
 }
 
 TEST(RemoveLeftovers, OfProcessesThatAreGone_GoAndNothingElseDoes)
 {
-    TemporaryFolder folder;
+    MemoryFolder folder;
     std::string const gone = NumberOfADeadProcess();
     std::string const own = std::to_string(getpid());
     std::vector<std::string> kept = {"file",
@@ -638,20 +618,20 @@ TEST(RemoveLeftovers, OfProcessesThatAreGone_GoAndNothingElseDoes)
     WriteFile(folder / ("file." + gone + "-0.tmp"), "half");
     WriteFile(folder / ("file." + gone + "-12.tmp"), "half");
     RemoveLeftovers(folder / "file");
-    EXPECT_THAT(folder.Names(), UnorderedElementsAreArray(kept));
+    EXPECT_THAT(NamesIn(folder.Path()), UnorderedElementsAreArray(kept));
 }
 
 TEST(RemoveLeftovers, AFolderOfSuchAName_Stays)
 {
-    TemporaryFolder folder;
+    MemoryFolder folder;
     std::string const name = "file." + NumberOfADeadProcess() + "-0.tmp";
     std::filesystem::create_directory(folder / name);
     RemoveLeftovers(folder / "file");
-    EXPECT_THAT(folder.Names(), ElementsAre(name));
+    EXPECT_THAT(NamesIn(folder.Path()), ElementsAre(name));
 }
 
 TEST(RemoveLeftovers, InNoFolder_IsNothingToDo)
 {
-    TemporaryFolder folder;
+    MemoryFolder folder;
     EXPECT_NO_THROW(RemoveLeftovers(folder / "none" / "file"));
 }

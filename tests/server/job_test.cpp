@@ -3,8 +3,11 @@
 
 #include "standin/server/Site.h"
 #include "standin/server/TransferService.h"
+#include "tests/server/MemoryFolder.h"
 #include "tests/server/ServerTest.h"
-#include "tests/server/storageSupport.h"
+#include "tests/server/StoredValues.h"
+#include "tests/support/ChildProcess.h"
+#include "tests/support/Files.h"
 #include <gmock/gmock.h>
 #include <thread>
 
@@ -14,29 +17,14 @@ using testing::HasSubstr;
 using testing::IsEmpty;
 namespace fs = std::filesystem;
 
-namespace
-{
-std::vector<std::string> NamesIn(fs::path const& folder)
-{
-    std::vector<std::string> names;
-    for (auto const& entry : fs::directory_iterator(folder))
-        names.push_back(entry.path().filename().string());
-    std::sort(names.begin(), names.end());
-    return names;
-}
-}  // namespace
-
 class Jobs : public ServerTest
 {
 protected:
     Jobs()
     {
         fs::create_directory(folder / "job");
-        StoredValue value;
-        value.type = PARAM_STRING;
         std::string const jobs = folder / "job";
-        value.bytes = jobs;
-        storage.Put(SystemTicket, "System/Folders/Job", 0, value);
+        storage.Put(SystemTicket, "System/Folders/Job", 0, Bytes(PARAM_STRING, jobs));
         storage.tickets[{7, 2}];
         As("operator").SetEndPoint("127.0.0.1:50106");
     }
@@ -108,7 +96,7 @@ protected:
         return calls;
     }
 
-    TemporaryFolder folder;
+    MemoryFolder folder;
     std::string const file = Write("file.pdf", "content");
     std::string said;
     std::mutex lock;
@@ -478,26 +466,18 @@ protected:
     }
     void PutText(TicketAddress ticket, std::string_view key, std::string const& text) const
     {
-        StoredValue value;
-        value.type = PARAM_STRING;
-        value.bytes = text;
-        Site::Open(Folder(), COMGUI_TEST_SEED).storage().Apply({{Change::PutValue, ticket, key, 0, value}});
+        Site::Open(Folder(), COMGUI_TEST_SEED)
+            .storage()
+            .Apply({{Change::PutValue, ticket, key, 0, Bytes(PARAM_STRING, text)}});
     }
     void MakePreparedJob(std::string_view file = {}) const
     {
-        StoredValue one;
-        one.type = PARAM_INT;
-        one.integer = 1;
-        StoredValue mark;
-        mark.type = PARAM_STRING;
-        mark.bytes = std::string_view(Mark).substr(5);
+        StoredValue const mark = Bytes(PARAM_STRING, std::string_view(Mark).substr(5));
         std::vector<Change> changes{{Change::CreateTicket, {3, 9}},
-                                    {Change::PutValue, {3, 9}, "Job/Prepared", 0, one},
+                                    {Change::PutValue, {3, 9}, "Job/Prepared", 0, Integer(PARAM_INT, 1)},
                                     {Change::PutValue, {3, 9}, "Job/FolderMark", 0, mark}};
-        StoredValue name = mark;
-        name.bytes = file;
         if (!file.empty())
-            changes.push_back({Change::PutValue, {3, 9}, "Job/File", 0, name});
+            changes.push_back({Change::PutValue, {3, 9}, "Job/File", 0, Bytes(PARAM_STRING, file)});
         Site::Open(Folder(), COMGUI_TEST_SEED).storage().Apply(changes);
     }
     std::vector<int> Jobs() const
@@ -511,7 +491,7 @@ protected:
     }
 
     std::string const Mark = ".job-0123456789abcdef";
-    TemporaryFolder folder;
+    MemoryFolder folder;
 };
 
 TEST_F(LeftByTheDead, PreparedJob_GoesWithItsFolder)

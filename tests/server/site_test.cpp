@@ -4,17 +4,19 @@
 #include "standin/server/Password.h"
 #include "standin/server/Seed.h"
 #include "standin/server/TicketXml.h"
-#include "storageSupport.h"
+#include "tests/server/MemoryFolder.h"
+#include "tests/server/StoredValues.h"
+#include "tests/support/ChildProcess.h"
+#include "tests/support/Files.h"
+#include "tests/support/sanitizers.h"
 #include <algorithm>
 #include <chrono>
 #include <csignal>
-#include <cstdint>
 #include <cstdlib>
 #include <fcntl.h>
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 #include <map>
-#include <optional>
 #include <random>
 #include <set>
 #include <sqlite3.h>
@@ -50,10 +52,7 @@ std::string TextOf(Storage& storage, TicketAddress address, std::string const& w
 
 void Rename(Storage& storage, std::string_view name)
 {
-    StoredValue value;
-    value.type = PARAM_STRING;
-    value.bytes = name;
-    storage.Apply({{Change::PutValue, SystemTicket, "System/Name", 0, value}});
+    storage.Apply({{Change::PutValue, SystemTicket, "System/Name", 0, Bytes(PARAM_STRING, name)}});
 }
 
 class SiteFolder : public testing::Test
@@ -112,7 +111,7 @@ protected:
         return names;
     }
 
-    TemporaryFolder folder;
+    MemoryFolder folder;
 };
 
 class Environment : public testing::Test
@@ -261,9 +260,8 @@ TEST_F(SiteFolder, InstallFolder_ThatIsNoSingleText_IsReplaced)
 {
     {
         Site site = Site::Open(Folder(), ShippedSeed);
-        StoredValue number;
-        number.type = PARAM_INT;
-        site.storage().Apply({{Change::PutValue, SystemTicket, "System/InstallFolder", 1, number}});
+        site.storage().Apply(
+            {{Change::PutValue, SystemTicket, "System/InstallFolder", 1, Integer(PARAM_INT, 0)}});
     }
     Site site = Site::Open(Folder(), ShippedSeed);
     int values = 0;
@@ -277,10 +275,8 @@ TEST_F(SiteFolder, FolderKeysThatLeaveTheSite_MakeNoFolder)
 {
     {
         Site site = Site::Open(Folder(), ShippedSeed);
-        StoredValue value;
-        value.type = PARAM_STRING;
-        value.bytes = "$(INSTALL)/../outside";
-        site.storage().Apply({{Change::PutValue, SystemTicket, "System/Folders/Temp", 0, value}});
+        StoredValue const outside = Bytes(PARAM_STRING, "$(INSTALL)/../outside");
+        site.storage().Apply({{Change::PutValue, SystemTicket, "System/Folders/Temp", 0, outside}});
     }
     EXPECT_EQ(Said(), "");
     EXPECT_FALSE(std::filesystem::exists(folder / "outside"));
@@ -341,8 +337,7 @@ TEST_F(SiteFolder, SecondProcess_IsToldWhoHasTheSite)
             report(1);
             pause();
         });
-    std::int64_t told = 0;
-    ASSERT_TRUE(child.Next(told));
+    ASSERT_TRUE(child.Next());
     EXPECT_EQ(ReasonOfOpening(),
               Folder().string() + ": in use by process " + std::to_string(child.Id()) +
                   " (server_tests); end it first, or choose another site with COMGUI_SITE");
@@ -405,8 +400,7 @@ TEST_F(SiteFolder, DamagedDatabase_TakesItsJournalWithIt)
                 report(1);
                 pause();
             });
-        std::int64_t told = 0;
-        ASSERT_TRUE(child.Next(told));
+        ASSERT_TRUE(child.Next());
     }
     std::string const journal = ContentOf(File("site.db-wal"));
     ASSERT_FALSE(journal.empty());
@@ -551,7 +545,7 @@ TEST_F(SiteFolder, KilledAtTheFirstStart_TheNextOneFindsNoHalfSite)
     MakeSite();
     auto const whole =
         std::chrono::duration_cast<std::chrono::microseconds>(std::chrono::steady_clock::now() - start);
-    std::mt19937_64 random = RandomFrom(1234);
+    std::mt19937_64 random(1234);
     int killed = 0;
     for (int round = 0; killed < (IsSanitized ? 10 : 50); ++round)
     {
