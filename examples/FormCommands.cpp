@@ -1,10 +1,8 @@
 #include "examples/FormCommands.h"
 
 #include <algorithm>
-#include <cerrno>
 #include <cstdio>
 #include <cstdlib>
-#include <cstring>
 #include <poll.h>
 #include <unistd.h>
 #include <utility>
@@ -26,11 +24,9 @@ std::string Dim(std::string const& text) { return Styled("2", text); }
 // Output that has nowhere to go ends the program.
 void Print(std::string const& line)
 {
-    if (std::puts(line.c_str()) >= 0 && std::fflush(stdout) == 0)
-        return;
-    if (errno != EPIPE)  // whoever closed a pipe knows
-        std::fprintf(stderr, "%s: cannot write: %s\n", ProgramName, std::strerror(errno));
-    std::quick_exit(Trouble);
+    std::puts(line.c_str());
+    if (!FlushOutput())
+        std::quick_exit(Trouble);
 }
 
 std::string Raw(Json const& value) { return value.is_string() ? value.get<std::string>() : Line(value); }
@@ -319,8 +315,6 @@ void Watch(SESSION const& session, OPTIONS const& options, EndSignals const& end
         if (options.edit)
             WriteLines(session, options);
         end.Wait();
-        // The receiver says farewell on standard output, which is not for those who read our lines.
-        dup2(STDERR_FILENO, STDOUT_FILENO);
     }
     session.manager.DisableNotifications(session.login, options.type);
 }
