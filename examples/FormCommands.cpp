@@ -81,10 +81,10 @@ void PrintFields(Json const& fields)
 {
     std::size_t widest = 0;
     for (Json const& field : fields)
-        widest = std::max(widest, Raw(field["key"]).size());
+        widest = std::max(widest, Shown(Raw(field["key"])).size());
     for (Json const& field : fields)
     {
-        std::string key = Raw(field["key"]);
+        std::string key = Shown(Raw(field["key"]));
         std::string type = field.contains("of") ? Raw(field["of"]) + " list" : Raw(field["type"]);
         key.resize(widest, ' ');
         type.resize(std::max<std::size_t>(type.size(), 15), ' ');
@@ -238,8 +238,8 @@ void PrintEvent(NotifData const& data, bool json)
                            {"event", WhatHappened(data)},
                            {"key", key},
                            {"value", value}}));
-    Print(std::to_string(data.NotifCode) + " " + std::to_string(data.NotifArgA) + "  " + Bold(key) + "  " +
-          Dim(WhatHappened(data)) + (value.is_null() ? "" : "  " + Line(value)));
+    Print(std::to_string(data.NotifCode) + " " + std::to_string(data.NotifArgA) + "  " + Bold(Shown(key)) +
+          "  " + Dim(WhatHappened(data)) + (value.is_null() ? "" : "  " + Line(value)));
 }
 
 // Prints events on the receiver's thread, quickly, since the plug-in waits meanwhile.
@@ -272,7 +272,7 @@ try
 }
 catch (Refusal const& refusal)
 {
-    std::fprintf(stderr, "%s: %s\n", ProgramName, refusal.what());
+    Fail(refusal.what());
 }
 
 // Writes what comes on standard input, line by line, until that ends or the program shall.

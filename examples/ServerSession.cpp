@@ -104,9 +104,16 @@ bool SERVER::TakeOptions(wxCmdLineParser const& parser)
     return (port >= 1 && port <= 65535) || Fail("a port is a number from 1 to 65535");
 }
 
+std::string Shown(std::string text)
+{
+    std::replace_if(
+        text.begin(), text.end(), [](unsigned char c) { return c < ' ' || c == 0x7F; }, '?');
+    return text;
+}
+
 bool Fail(std::string const& what)
 {
-    std::fprintf(stderr, "%s: %s\n", ProgramName, what.c_str());
+    std::fprintf(stderr, "%s: %s\n", ProgramName, Shown(what).c_str());
     return false;
 }
 

@@ -36,6 +36,9 @@ struct SERVER
     long port = 50000;
 };
 
+// A text as it can stand within a line and on a terminal.
+std::string Shown(std::string text);
+
 // Says on stderr what went wrong, with the plug-in's code where it was the plug-in; always false.
 bool Fail(std::string const& what);
 bool Fail(std::string const& what, int code);

@@ -74,19 +74,7 @@ std::optional<int> Parse(int argc, char** argv, OPTIONS& options)
     return std::nullopt;
 }
 
-// A name as it can stand within a line.
-std::string Shown(std::string name)
-{
-    std::replace_if(
-        name.begin(), name.end(), [](unsigned char c) { return c < ' ' || c == 0x7F; }, '?');
-    return name;
-}
-
-bool Refuse(std::string const& file, std::string const& why)
-{
-    std::fprintf(stderr, "%s: %s: %s\n", ProgramName, Shown(file).c_str(), why.c_str());
-    return false;
-}
+bool Refuse(std::string const& file, std::string const& why) { return Fail(file + ": " + why); }
 
 // What a file lacks to be a job, or nothing. The server looks for itself; but to ask here first spares it a
 // ticket that is made in vain.

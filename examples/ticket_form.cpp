@@ -201,7 +201,7 @@ int Run(CommandLine const& commandLine)
     }
     catch (std::exception const& e)
     {
-        std::fprintf(stderr, "%s: %s\n", ProgramName, e.what());
+        Fail(e.what());
         status = dynamic_cast<Refusal const*>(&e) ? Refused : Trouble;
     }
     manager->Logout();  // and no Uninitialize, which waits: the process ends here anyway
