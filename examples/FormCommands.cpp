@@ -1,10 +1,8 @@
 #include "examples/FormCommands.h"
 
 #include <algorithm>
-#include <cerrno>
 #include <cstdio>
 #include <cstdlib>
-#include <cstring>
 #include <poll.h>
 #include <unistd.h>
 #include <utility>
@@ -26,11 +24,9 @@ std::string Dim(std::string const& text) { return Styled("2", text); }
 // Output that has nowhere to go ends the program.
 void Print(std::string const& line)
 {
-    if (std::puts(line.c_str()) >= 0 && std::fflush(stdout) == 0)
-        return;
-    if (errno != EPIPE)  // whoever closed a pipe knows
-        std::fprintf(stderr, "%s: cannot write: %s\n", ProgramName, std::strerror(errno));
-    std::quick_exit(Trouble);
+    std::puts(line.c_str());
+    if (!FlushOutput())
+        std::quick_exit(Trouble);
 }
 
 std::string Raw(Json const& value) { return value.is_string() ? value.get<std::string>() : Line(value); }
@@ -85,10 +81,10 @@ void PrintFields(Json const& fields)
 {
     std::size_t widest = 0;
     for (Json const& field : fields)
-        widest = std::max(widest, Raw(field["key"]).size());
+        widest = std::max(widest, Shown(Raw(field["key"])).size());
     for (Json const& field : fields)
     {
-        std::string key = Raw(field["key"]);
+        std::string key = Shown(Raw(field["key"]));
         std::string type = field.contains("of") ? Raw(field["of"]) + " list" : Raw(field["type"]);
         key.resize(widest, ' ');
         type.resize(std::max<std::size_t>(type.size(), 15), ' ');
@@ -242,8 +238,8 @@ void PrintEvent(NotifData const& data, bool json)
                            {"event", WhatHappened(data)},
                            {"key", key},
                            {"value", value}}));
-    Print(std::to_string(data.NotifCode) + " " + std::to_string(data.NotifArgA) + "  " + Bold(key) + "  " +
-          Dim(WhatHappened(data)) + (value.is_null() ? "" : "  " + Line(value)));
+    Print(std::to_string(data.NotifCode) + " " + std::to_string(data.NotifArgA) + "  " + Bold(Shown(key)) +
+          "  " + Dim(WhatHappened(data)) + (value.is_null() ? "" : "  " + Line(value)));
 }
 
 // Prints events on the receiver's thread, quickly, since the plug-in waits meanwhile.
@@ -276,7 +272,7 @@ try
 }
 catch (Refusal const& refusal)
 {
-    std::fprintf(stderr, "%s: %s\n", ProgramName, refusal.what());
+    Fail(refusal.what());
 }
 
 // Writes what comes on standard input, line by line, until that ends or the program shall.
@@ -319,8 +315,6 @@ void Watch(SESSION const& session, OPTIONS const& options, EndSignals const& end
         if (options.edit)
             WriteLines(session, options);
         end.Wait();
-        // The receiver says farewell on standard output, which is not for those who read our lines.
-        dup2(STDERR_FILENO, STDOUT_FILENO);
     }
     session.manager.DisableNotifications(session.login, options.type);
 }

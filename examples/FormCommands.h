@@ -11,13 +11,6 @@ constexpr int EveryType = -1;
 constexpr int EveryTicket = -1;
 constexpr int TicketTypes = 100;
 
-enum STATUS
-{
-    Good = 0,
-    Refused = 1,  // no such ticket or key, or the value or the server says no
-    Trouble = 2,  // wrong command line, no server, no login
-};
-
 struct OPTIONS
 {
     std::string user = "admin";

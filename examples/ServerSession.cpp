@@ -1,28 +1,91 @@
 #include "examples/ServerSession.h"
 
 #include <algorithm>
+#include <atomic>
+#include <cerrno>
 #include <cstdio>
 #include <cstdlib>
+#include <cstring>
+#include <fcntl.h>
 #include <iterator>
 #include <memory>
 #include <unistd.h>
 #include <utility>
+#include <wx/msgout.h>
 
 namespace
 {
 constexpr int Ends[] = {SIGINT, SIGTERM, SIGHUP};
 
-// The library's receiver deletes itself at its end; this one tells when.
+// The library's receiver deletes itself at its end; this one tells when its thread is over, which is later:
+// wxWidgets must not go before that.
 class Receiver : public ReceiverThread
 {
 public:
     explicit Receiver(std::promise<void>& ended) : m_ended(ended) {}
-    ~Receiver() override { m_ended.set_value(); }
+
+    void* Entry() override
+    {
+        m_ended.set_value_at_thread_exit();
+        return ReceiverThread::Entry();
+    }
 
 private:
     std::promise<void>& m_ended;
 };
+
+// The receiver says farewell on standard output, which is not for those who read our lines.
+class QuietOutput
+{
+public:
+    QuietOutput() : m_output(dup(STDOUT_FILENO))
+    {
+        std::fflush(stdout);
+        int const nowhere = open("/dev/null", O_WRONLY | O_CLOEXEC);
+        dup2(nowhere, STDOUT_FILENO);
+        close(nowhere);
+    }
+    QuietOutput(QuietOutput const&) = delete;
+    QuietOutput& operator=(QuietOutput const&) = delete;
+    ~QuietOutput()
+    {
+        std::fflush(stdout);
+        dup2(m_output, STDOUT_FILENO);
+        close(m_output);
+    }
+
+private:
+    int m_output;
+};
+
+// Where wxCmdLineParser tells what is wrong.
+class Complaints : public wxMessageOutput
+{
+public:
+    void Output(wxString const& text) override
+    {
+        wxString line = text.Strip(wxString::both);
+        line.Replace("\n", "; ");
+        Fail(line.utf8_string() + "; " + ProgramName + " --help tells how");
+    }
+};
+
+constexpr int WrongUserOrPassword = 107;  // a code of ComGUI.Bundle, the plug-in of this package
 }  // namespace
+
+std::optional<int> ParseCommandLine(wxCmdLineParser& parser)
+{
+    Complaints complaints;
+    wxMessageOutput* const before = wxMessageOutput::Set(&complaints);
+    int const result = parser.Parse(false);
+    wxMessageOutput::Set(before);
+    if (result > 0)
+        return Trouble;
+    if (result == 0)
+        return std::nullopt;
+    std::fputs(parser.GetUsageString().utf8_str(), stdout);
+    return FlushOutput() ? Good : Trouble;
+}
 
 void SERVER::AddOptions(wxCmdLineParser& parser)
 {
@@ -41,15 +104,35 @@ bool SERVER::TakeOptions(wxCmdLineParser const& parser)
     return (port >= 1 && port <= 65535) || Fail("a port is a number from 1 to 65535");
 }
 
+std::string Shown(std::string text)
+{
+    std::replace_if(
+        text.begin(), text.end(), [](unsigned char c) { return c < ' ' || c == 0x7F; }, '?');
+    return text;
+}
+
 bool Fail(std::string const& what)
 {
-    std::fprintf(stderr, "%s: %s\n", ProgramName, what.c_str());
+    std::fprintf(stderr, "%s: %s\n", ProgramName, Shown(what).c_str());
     return false;
 }
 
 bool Fail(std::string const& what, int code)
 {
     return Fail(what + " (the plug-in's code: " + std::to_string(code) + ")");
+}
+
+bool FlushOutput()
+{
+    static std::atomic<bool> isGood = true;
+    errno = EIO;  // where it is an earlier write that failed
+    if (!isGood || (std::fflush(stdout) == 0 && std::ferror(stdout) == 0))
+        return isGood;
+    isGood = false;
+    if (errno != EPIPE)
+        Fail(std::string("the output cannot be written: ") + std::strerror(errno) +
+             "; make room there, or send it elsewhere");
+    return false;
 }
 
 bool IsPlugInThere()
@@ -86,7 +169,9 @@ bool LogIn(ComGUIManager& manager, TLogin* login)
     if (int const result = manager.Initialize(login, Stamp); result != 0)
         return Fail("cannot prepare a session", result);
     if (int const result = manager.Login(record.release()); result != 0)
-        return Fail("the server refuses the login", result);
+        return Fail(result == WrongUserOrPassword ? "the server refuses the login: wrong user or password"
+                                                  : "the server refuses the login",
+                    result);
     return manager.GetClientContainer() || Fail("the session has no tickets");
 }
 
@@ -102,6 +187,7 @@ void EndSignals::Wait() const
 {
     int signal = 0;
     sigwait(&m_signals, &signal);
+    pthread_sigmask(SIG_UNBLOCK, &m_signals, nullptr);  // somebody may be in a hurry
 }
 
 bool EndSignals::ArePending()
@@ -131,6 +217,7 @@ EventReceiver::EventReceiver(std::function<void(ServerNotificationEvent const&)>
 
 EventReceiver::~EventReceiver()
 {
+    QuietOutput const quiet;
     m_thread->ShutDown();  // and no use of it from here on: it deletes itself
     m_ended.get_future().wait();
     CEventManager::GetInstance()->Unsubscribe(m_subscription);

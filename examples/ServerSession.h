@@ -6,10 +6,23 @@
 #include <csignal>
 #include <functional>
 #include <future>
+#include <optional>
 #include <string>
 #include <wx/cmdline.h>
 
 extern char const ProgramName[];  // each program's own, for its messages
+
+// How the examples end.
+enum STATUS
+{
+    Good = 0,
+    Refused = 1,  // the answer is no: what was asked for is not there, or was refused
+    Trouble = 2,  // wrong command line, no server, no login, output that cannot be written
+};
+
+// Parses the command line: --help goes to standard output, what is wrong to stderr, on a line with the
+// program's name. Nothing if the program shall go on, or the status with which to end at once.
+std::optional<int> ParseCommandLine(wxCmdLineParser& parser);
 
 // Where the server is, and as whom to log in.
 struct SERVER
@@ -23,9 +36,16 @@ struct SERVER
     long port = 50000;
 };
 
+// A text as it can stand within a line and on a terminal.
+std::string Shown(std::string text);
+
 // Says on stderr what went wrong, with the plug-in's code where it was the plug-in; always false.
 bool Fail(std::string const& what);
 bool Fail(std::string const& what, int code);
+
+// Sends what was printed on its way. False if it cannot be written; says so the first time, unless it goes to
+// a pipe that was closed: whoever closed it knows. Needs SIGPIPE ignored.
+bool FlushOutput();
 
 // Whether the library found its plug-in; says so if not.
 bool IsPlugInThere();
@@ -45,7 +65,7 @@ class EndSignals
 {
 public:
     EndSignals();
-    void Wait() const;         // until one comes, or has come
+    void Wait() const;         // until one comes, or has come; the next one ends the program at once
     static bool ArePending();  // has one come that nobody has waited for?
     static void Raise();       // as if somebody had ended the program from outside
 

@@ -256,12 +256,18 @@ void ShareJobTicket(Tour& tour, ComGUIManager& manager, SecondSession& second)
     tour.Expect("  and its list holds so many values", second.Ints("Tour/Pages").size(), std::size_t{0});
 }
 
-// The library's receiver deletes itself at its end; this one tells when.
+// The library's receiver deletes itself at its end; this one tells when its thread is over, which is later:
+// wxWidgets must not go before that.
 class Receiver : public ReceiverThread
 {
 public:
     explicit Receiver(std::promise<void>& ended) : m_ended(ended) {}
-    ~Receiver() override { m_ended.set_value(); }
+
+    void* Entry() override
+    {
+        m_ended.set_value_at_thread_exit();
+        return ReceiverThread::Entry();
+    }
 
 private:
     std::promise<void>& m_ended;
@@ -380,8 +386,19 @@ void LogOut(Tour& tour, ComGUIManager& manager, SecondSession& second)
 }
 }  // namespace
 
-int main()
+int main(int argc, char** argv)
 {
+    if (argc > 1)
+    {
+        bool const isHelp = std::string(argv[1]) == "--help";
+        char const* const help = "Runs a whole session and tells each step. It takes no arguments.\n"
+                                 "Exit status: 0 every step gave what it should; 1 one did not; 2 a wrong "
+                                 "command line.\n";
+        char const* const refusal =
+            "session_tour: takes no arguments; session_tour --help tells what it does\n";
+        (isHelp ? std::cout << help : std::cerr << refusal).flush();
+        return isHelp ? 0 : 2;
+    }
     wxInitializer const wx;  // the receiver is a thread of wxWidgets
     Tour tour;
     tour.Chapter("Opening the communication plug-in");

@@ -7,6 +7,7 @@
 #include <chrono>
 #include <climits>
 #include <condition_variable>
+#include <csignal>
 #include <cstdio>
 #include <cstring>
 #include <mutex>
@@ -49,41 +50,31 @@ std::optional<int> Parse(int argc, char** argv, OPTIONS& options)
     }
 
     wxCmdLineParser parser(argc, arguments.data());
-    parser.SetLogo("Sends files to a server as print jobs. The status is 0 if all of them are there.");
+    parser.SetLogo("Sends files to a server as print jobs.\n"
+                   "Exit status: 0 all of them are there; 1 one is not; 2 a wrong command line, no server, "
+                   "no login,\nor the output cannot be written.");
     parser.AddSwitch("h", "help", "show this text", wxCMD_LINE_OPTION_HELP);
     SERVER::AddOptions(parser);
     parser.AddOption("c", "copies", "print so many copies", wxCMD_LINE_VAL_NUMBER);
     parser.AddOption("q", "queue", "put the jobs into the queue of that number", wxCMD_LINE_VAL_NUMBER);
     parser.AddParam("FILE", wxCMD_LINE_VAL_STRING, wxCMD_LINE_PARAM_MULTIPLE);
-    if (int const result = parser.Parse(); result != 0)
-        return result < 0 ? 0 : 1;  // negative: that was --help
+    if (auto const status = ParseCommandLine(parser))
+        return status;
     if (!options.server.TakeOptions(parser))
-        return 1;
+        return Trouble;
     parser.Found("copies", &options.copies);
     parser.Found("queue", &options.queue);
     if (std::min(options.copies, options.queue) < 0 || std::max(options.copies, options.queue) > INT_MAX)
     {
-        std::fprintf(stderr, "%s: the numbers of copies and of the queue are 0 or more\n", ProgramName);
-        return 1;
+        Fail("the numbers of copies and of the queue are 0 or more");
+        return Trouble;
     }
     for (std::size_t i = 0; i < parser.GetParamCount(); ++i)
         options.files.push_back(parser.GetParam(i).utf8_string());
     return std::nullopt;
 }
 
-// A name as it can stand within a line.
-std::string Shown(std::string name)
-{
-    std::replace_if(
-        name.begin(), name.end(), [](unsigned char c) { return c < ' ' || c == 0x7F; }, '?');
-    return name;
-}
-
-bool Refuse(std::string const& file, std::string const& why)
-{
-    std::fprintf(stderr, "%s: %s: %s\n", ProgramName, Shown(file).c_str(), why.c_str());
-    return false;
-}
+bool Refuse(std::string const& file, std::string const& why) { return Fail(file + ": " + why); }
 
 // What a file lacks to be a job, or nothing. The server looks for itself; but to ask here first spares it a
 // ticket that is made in vain.
@@ -253,17 +244,17 @@ bool Submit(ComGUIManager& manager, OPTIONS const& options, std::string const& f
     std::printf("%s: job %d, %lld bytes%s\n", Shown(file).c_str(), job, size,
                 isIn ? "" : " (sent, but there is no word of it yet)");
     PrintTicket(manager.GetClientContainer(), job);
-    std::fflush(stdout);
+    FlushOutput();
     return true;
 }
 
-// All files are tried, whatever becomes of one.
+// All files are tried, whatever becomes of one, or of the output.
 int SubmitAll(ComGUIManager& manager, TLogin* login, OPTIONS const& options)
 {
     if (int const result = manager.SetCallback(login, nullptr); result != 0)
     {
         Fail("the plug-in takes no callback", result);
-        return 1;
+        return Trouble;
     }
     manager.EnableNotifications(login, JobType, EveryKey);
     Progress progress;
@@ -274,31 +265,33 @@ int SubmitAll(ComGUIManager& manager, TLogin* login, OPTIONS const& options)
             sent += Submit(manager, options, file, progress) ? 1 : 0;
     }
     manager.DisableNotifications(login, JobType);
-    return sent == options.files.size() ? 0 : 1;
+    if (!FlushOutput())
+        return Trouble;
+    return sent == options.files.size() ? Good : Refused;
 }
 }  // namespace
 
 int main(int argc, char** argv)
 {
-    wxInitializer const wx(argc, argv);
+    std::signal(SIGPIPE, SIG_IGN);
+    wxInitializer const wx;  // without the arguments, of which it would warn where they are no UTF-8
     OPTIONS options;
     if (!wx.IsOk())
     {
         std::fputs("submit_job: wxWidgets cannot be started\n", stderr);
-        return 1;
+        return Trouble;
     }
     if (auto const status = Parse(argc, argv, options))
         return *status;
 
     ComGUIManager* const manager = ComGUIManager::GetInstance();
     if (!IsPlugInThere())
-        return 1;
+        return Trouble;
     SERVER const& server = options.server;
     TLogin* const login = NewRecord(server.user.utf8_str(), server.password.utf8_str(), server);
     if (!LogIn(*manager, login))
-        return 1;
+        return Trouble;
     int const status = SubmitAll(*manager, login, options);
-    manager->Logout();
-    manager->Uninitialize();
+    manager->Logout();  // and no Uninitialize, which waits: the process ends here anyway
     return status;
 }

@@ -22,7 +22,7 @@ class CommandLine
 public:
     using COMMAND = std::function<void(SESSION const&)>;
 
-    explicit CommandLine(EndSignals const& end)
+    CommandLine()
     {
         m_app.require_subcommand(0, 1);  // none is told below, once unknown words were
         m_app.fallthrough();
@@ -40,10 +40,10 @@ public:
             "  ticket_form set 3 1 Job/Copies=25 'Job/Identification/Name=Spring, second run'\n"
             "  ticket_form set-list 3 1 --type text 'Job/Notes=red,\"blue, then green\"'\n\n"
             "Exit status: 0 all is well; 1 the answer is no: no such ticket or key, or a value that was "
-            "refused;\n2 a wrong command line, no server, no login.");
+            "refused;\n2 a wrong command line, no server, no login, or the output cannot be written.");
         AddReading();
         AddWriting();
-        AddWatch(end);
+        AddWatch();
     }
 
     // Nothing, or the status with which to end at once.
@@ -62,7 +62,10 @@ public:
     catch (CLI::ParseError const& e)
     {
         if (e.get_exit_code() == 0)  // help
-            return m_app.exit(e);
+        {
+            m_app.exit(e);
+            return FlushOutput() ? Good : Trouble;
+        }
         std::string text = e.what();
         std::replace(text.begin(), text.end(), '\n', ' ');
         std::fprintf(stderr, "%s: %s; ticket_form --help tells how\n", ProgramName, text.c_str());
@@ -153,15 +156,18 @@ private:
         AddPosition(remove, "Only the value at this position, from 0 up");
     }
 
-    void AddWatch(EndSignals const& end)
+    void AddWatch()
     {
         CLI::App* const watch = AddCommand(
             "watch", "Print what changes in a ticket, or in all of a type, until Ctrl-C",
             "A line is type, id, key, what happened and the value. With --json each line is an object.",
             nullptr);
         watch->callback(
-            [this, &end]
-            { m_run = [this, &end](SESSION const& session) { Watch(session, m_options, end); }; });
+            [this]
+            {
+                m_end.emplace();  // here, before any thread; the other commands end by Ctrl-C at once
+                m_run = [this](SESSION const& session) { Watch(session, m_options, *m_end); };
+            });
         AddType(watch)->required();
         CLI::Option* const id = AddId(watch);
         watch->add_option("-n,--events", m_options.events, "End after so many; 0 is no limit")
@@ -173,6 +179,7 @@ private:
     OPTIONS m_options;
     CLI::App m_app{"Shows and edits the tickets of a server, as a form does.", ProgramName};
     COMMAND m_run;
+    std::optional<EndSignals> m_end;  // of watch
 };
 
 int Run(CommandLine const& commandLine)
@@ -194,7 +201,7 @@ int Run(CommandLine const& commandLine)
     }
     catch (std::exception const& e)
     {
-        std::fprintf(stderr, "%s: %s\n", ProgramName, e.what());
+        Fail(e.what());
         status = dynamic_cast<Refusal const*>(&e) ? Refused : Trouble;
     }
     manager->Logout();  // and no Uninitialize, which waits: the process ends here anyway
@@ -206,14 +213,13 @@ int main(int argc, char** argv)
 try
 {
     std::signal(SIGPIPE, SIG_IGN);
-    EndSignals const end;
     wxInitializer const wx;  // without the arguments, of which it would warn where they are no UTF-8
     if (!wx.IsOk())
     {
         std::fputs("ticket_form: wxWidgets cannot be started\n", stderr);
         return Trouble;
     }
-    CommandLine commandLine(end);
+    CommandLine commandLine;
     if (auto const status = commandLine.Parse(argc, argv))
         return *status;
     return Run(commandLine);

@@ -35,21 +35,23 @@ struct OPTIONS
 std::optional<int> Parse(int argc, char** argv, OPTIONS& options)
 {
     wxCmdLineParser parser(argc, argv);
-    parser.SetLogo("Prints what changes in the tickets of a server, until Ctrl-C.");
+    parser.SetLogo("Prints what changes in the tickets of a server, until Ctrl-C.\n"
+                   "Exit status: 0 all is well; 2 a wrong command line, no server, no login, or the output "
+                   "cannot be written.");
     parser.AddSwitch("h", "help", "show this text", wxCMD_LINE_OPTION_HELP);
     parser.AddSwitch("b", "busy", "change tickets meanwhile, in a second session (as operator)");
     SERVER::AddOptions(parser);
     parser.AddOption("n", "events", "leave after so many events", wxCMD_LINE_VAL_NUMBER);
-    if (int const result = parser.Parse(); result != 0)
-        return result < 0 ? 0 : 1;  // negative: that was --help
+    if (auto const status = ParseCommandLine(parser))
+        return status;
     if (!options.server.TakeOptions(parser))
-        return 1;
+        return Trouble;
     parser.Found("events", &options.events);
     options.busy = parser.Found("busy");
     if (options.events < 0)
     {
-        std::fputs("watch_tickets: the number of events is 0 (no limit) or more\n", stderr);
-        return 1;
+        Fail("the number of events is 0 (no limit) or more");
+        return Trouble;
     }
     return std::nullopt;
 }
@@ -81,21 +83,23 @@ public:
 
     void Print(ServerNotificationEvent const& event)
     {
-        if (m_limit != 0 && m_printed == m_limit)
+        if (m_isOver)
             return;  // what still comes while the program is leaving
         NotifData const& data = event.GetNotifData();
         std::printf("%s  event %d  ticket %d/%d  %s %s\n",
                     wxDateTime::UNow().Format("%H:%M:%S.%l").utf8_string().c_str(), event.GetId(),
                     data.NotifCode, data.NotifArgA, data.NotifKey.utf8_string().c_str(),
                     ValueOf(data).c_str());
-        std::fflush(stdout);
-        if (++m_printed == m_limit)
+        bool const isWritten = FlushOutput();
+        m_isOver = ++m_printed == m_limit || !isWritten;
+        if (m_isOver)
             EndSignals::Raise();
     }
 
 private:
     long const m_limit;
     long m_printed = 0;
+    bool m_isOver = false;
 };
 
 // A second session of this program, which works on tickets. It uses the slots of its container alone, since
@@ -188,7 +192,7 @@ bool Subscribe(ComGUIManager& manager, TLogin* login)
 int Watch(ComGUIManager& manager, TLogin* login, OPTIONS const& options, EndSignals const& end)
 {
     if (!Subscribe(manager, login))
-        return 1;
+        return Trouble;
     Printer printer(options.events);
     auto receiver =
         std::make_unique<EventReceiver>([&](ServerNotificationEvent const& event) { printer.Print(event); });
@@ -199,8 +203,8 @@ int Watch(ComGUIManager& manager, TLogin* login, OPTIONS const& options, EndSign
     {
         std::printf("Watching %s as %s; Ctrl-C ends it.\n", options.server.host.utf8_string().c_str(),
                     manager.GetCurrentlyLoggedUser().utf8_string().c_str());
-        std::fflush(stdout);
-        end.Wait();
+        if (FlushOutput())
+            end.Wait();
     }
     std::puts("\nLeaving.");
     busy.Stop();
@@ -209,32 +213,32 @@ int Watch(ComGUIManager& manager, TLogin* login, OPTIONS const& options, EndSign
     receiver.reset();
     for (int const type : WatchedTypes)
         manager.DisableNotifications(login, type);
-    return started ? 0 : 1;
+    return started && FlushOutput() ? Good : Trouble;
 }
 }  // namespace
 
 int main(int argc, char** argv)
 {
+    std::signal(SIGPIPE, SIG_IGN);
     EndSignals const end;
-    wxInitializer const wx(argc, argv);
+    wxInitializer const wx;  // without the arguments, of which it would warn where they are no UTF-8
     OPTIONS options;
     if (!wx.IsOk())
     {
         std::fputs("watch_tickets: wxWidgets cannot be started\n", stderr);
-        return 1;
+        return Trouble;
     }
     if (auto const status = Parse(argc, argv, options))
         return *status;
 
     ComGUIManager* const manager = ComGUIManager::GetInstance();
     if (!IsPlugInThere())
-        return 1;
+        return Trouble;
     TLogin* const login =
         NewRecord(options.server.user.utf8_str(), options.server.password.utf8_str(), options.server);
     if (!LogIn(*manager, login))
-        return 1;
+        return Trouble;
     int const status = Watch(*manager, login, options, end);
-    manager->Logout();
-    manager->Uninitialize();
+    manager->Logout();  // and no Uninitialize, which waits: the process ends here anyway
     return status;
 }

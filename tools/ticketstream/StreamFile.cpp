@@ -5,8 +5,12 @@
 #include "tools/ticketstream/text.h"
 #include <algorithm>
 #include <cerrno>
+#include <csignal>
 #include <cstring>
+#include <filesystem>
 #include <memory>
+#include <sys/stat.h>
+#include <unistd.h>
 
 namespace ticketstream
 {
@@ -21,6 +25,61 @@ using OpenFile = std::unique_ptr<std::FILE, Close>;
 [[noreturn]] void TellFailure(std::string const& name, char const* what, char const* remedy)
 {
     throw Trouble(ShownName(name) + ": cannot be " + what + ": " + std::strerror(errno) + "; " + remedy);
+}
+
+void Overwrite(std::string const& file, std::string const& name, std::string_view bytes)
+{
+    OpenFile out(std::fopen(file.c_str(), "wb"));
+    if (!out)
+        TellFailure(name, "written", "check the folder and the permissions");
+    bool const isWritten = std::fwrite(bytes.data(), 1, bytes.size(), out.get()) == bytes.size();
+    if (std::fclose(out.release()) != 0 || !isWritten)
+        TellFailure(name, "written", "make room and try again");
+}
+
+// Lets nobody end the program while there is a file that it would leave behind.
+class HeldSignals
+{
+public:
+    HeldSignals()
+    {
+        sigset_t ends;
+        sigemptyset(&ends);
+        for (int const end : {SIGINT, SIGTERM, SIGHUP, SIGQUIT})
+            sigaddset(&ends, end);
+        sigprocmask(SIG_BLOCK, &ends, &m_before);
+    }
+    HeldSignals(HeldSignals const&) = delete;
+    HeldSignals& operator=(HeldSignals const&) = delete;
+    ~HeldSignals() { sigprocmask(SIG_SETMASK, &m_before, nullptr); }
+
+private:
+    sigset_t m_before;
+};
+
+// status: of the file that is there, or null.
+void Replace(std::string const& name, std::string_view bytes, struct stat const* status)
+{
+    std::error_code error;
+    std::string const target =
+        status ? std::filesystem::canonical(name, error).string() : name;  // links stay
+    if (error || (status && access(target.c_str(), W_OK) != 0))
+        TellFailure(name, "written", "check the folder and the permissions");
+    std::string const part =
+        std::filesystem::path(target).replace_filename(".ticketstream." + std::to_string(getpid()) + ".tmp");
+    HeldSignals const held;
+    try
+    {
+        Overwrite(part, name, bytes);
+        if ((status && chmod(part.c_str(), status->st_mode & 07777) != 0) ||
+            std::rename(part.c_str(), target.c_str()) != 0)
+            TellFailure(name, "written", "check the folder and the permissions");
+    }
+    catch (Trouble const&)
+    {
+        std::remove(part.c_str());
+        throw;
+    }
 }
 
 std::string ReadAll(std::FILE* file, std::string const& name, unsigned long limit)
@@ -59,11 +118,12 @@ void WriteFile(std::string const& name, std::string_view bytes)
         out.Add(bytes);
         return out.Flush();
     }
-    OpenFile file(std::fopen(name.c_str(), "wb"));
-    if (!file)
-        TellFailure(name, "written", "check the folder and the permissions");
-    bool const isWritten = std::fwrite(bytes.data(), 1, bytes.size(), file.get()) == bytes.size();
-    if (std::fclose(file.release()) != 0 || !isWritten)
-        TellFailure(name, "written", "what is there now is not the whole stream; make room and try again");
+    // What stands there, or nothing, until all of it is written; but what is no regular file is written as it
+    // is.
+    struct stat status = {};
+    bool const isThere = stat(name.c_str(), &status) == 0;
+    bool const isNew = !isThere && lstat(name.c_str(), &status) != 0 && !name.empty() && name.back() != '/';
+    bool const isReplaced = isNew || (isThere && S_ISREG(status.st_mode));
+    isReplaced ? Replace(name, bytes, isThere ? &status : nullptr) : Overwrite(name, name, bytes);
 }
 }  // namespace ticketstream
