@@ -26,11 +26,18 @@ public:
 
     void* Entry() override
     {
-        m_ended.set_value_at_thread_exit();
+        thread_local LastAct last;  // dies with the thread
+        last.ended = &m_ended;
         return ReceiverThread::Entry();
     }
 
 private:
+    struct LastAct
+    {
+        ~LastAct() { ended->set_value(); }
+        std::promise<void>* ended = nullptr;
+    };
+
     std::promise<void>& m_ended;
 };
 
