@@ -6,12 +6,12 @@
 #include "comgui/ticket/TICKET_OP.h"
 #include "tests/support/ContainerContract.h"
 #include "tests/support/Files.h"
+#include "tests/support/FullDisk.h"
 #include <climits>
 #include <cmath>
 #include <csignal>
 #include <gmock/gmock.h>
 #include <limits>
-#include <sys/resource.h>
 #include <sys/stat.h>
 #include <thread>
 
@@ -627,16 +627,11 @@ TEST_F(TicketFile, ThatCannotBeWritten_IsOneLineAndStaysAsItWas)
     std::string const text(10000, 'x');
     ASSERT_TRUE(ticket->SSETPARAMETER(ticket->Instance, "K", PARAM_STRING, text.c_str(), -1));
 
-    // A full disk: no file may grow past this size.
-    rlimit unlimited = {};
-    ASSERT_EQ(getrlimit(RLIMIT_FSIZE, &unlimited), 0);
-    rlimit tight = unlimited;
-    tight.rlim_cur = 4096;
-    signal(SIGXFSZ, SIG_IGN);
     testing::internal::CaptureStderr();
-    ASSERT_EQ(setrlimit(RLIMIT_FSIZE, &tight), 0);
-    factory.Destroy(ticket);
-    ASSERT_EQ(setrlimit(RLIMIT_FSIZE, &unlimited), 0);
+    {
+        FullDisk const full(4096);
+        factory.Destroy(ticket);
+    }
     EXPECT_THAT(testing::internal::GetCapturedStderr(),
                 AllOf(IsOneLine(), HasSubstr(path + ": cannot be written"), HasSubstr("; free some space")));
     EXPECT_EQ(ticket, nullptr);

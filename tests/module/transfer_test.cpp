@@ -6,10 +6,9 @@
 #include "comgui/session/TJobIdentification.h"
 #include "standin/module/ModuleCodes.h"
 #include "tests/support/Files.h"
-#include <csignal>
+#include "tests/support/FullDisk.h"
 #include <cstring>
 #include <gmock/gmock.h>
-#include <sys/resource.h>
 
 using namespace standin;
 namespace fs = std::filesystem;
@@ -287,14 +286,11 @@ TEST_F(SendingJobs, FullDisk_LeavesNeitherFileNorTicket)
 {
     std::string const big = folder.Write("big", std::string(300000, 'x')).string();
     int const id = Prepare("big");
-    auto const before = signal(SIGXFSZ, SIG_IGN);
-    rlimit limit{};
-    getrlimit(RLIMIT_FSIZE, &limit);
-    rlimit const small{200000, limit.rlim_max};
-    setrlimit(RLIMIT_FSIZE, &small);
-    int const code = Send(big, "big");
-    setrlimit(RLIMIT_FSIZE, &limit);
-    signal(SIGXFSZ, before);
+    int const code = [&]
+    {
+        FullDisk const full(200000);
+        return Send(big, "big");
+    }();
     EXPECT_EQ(code, MODULE_TARGET_UNWRITABLE);
     EXPECT_EQ(std::count(stderrText.begin(), stderrText.end(), '\n'), 1) << stderrText;
     EXPECT_EQ(admin.Read(3, id, "Job/State"), -1);

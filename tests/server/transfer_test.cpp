@@ -6,13 +6,12 @@
 #include "tests/server/MemoryFolder.h"
 #include "tests/server/ServerTest.h"
 #include "tests/support/Files.h"
-#include <csignal>
+#include "tests/support/FullDisk.h"
 #include <fcntl.h>
 #include <fstream>
 #include <gmock/gmock.h>
 #include <random>
 #include <sys/fsuid.h>
-#include <sys/resource.h>
 #include <sys/stat.h>
 #include <thread>
 
@@ -295,14 +294,11 @@ TEST_F(PutFile, FullDisk_LeavesTheOldFileAndNothingElse)
 {
     WriteFile(Temp("a"), "old");
     std::string const file = Write("a", Bytes(300000));
-    auto const before = signal(SIGXFSZ, SIG_IGN);
-    rlimit limit{};
-    getrlimit(RLIMIT_FSIZE, &limit);
-    rlimit const small{100000, limit.rlim_max};
-    setrlimit(RLIMIT_FSIZE, &small);
-    TransferResult const result = Put(file, "$(TEMP)/a");
-    setrlimit(RLIMIT_FSIZE, &limit);
-    signal(SIGXFSZ, before);
+    TransferResult const result = [&]
+    {
+        FullDisk const full(100000);
+        return Put(file, "$(TEMP)/a");
+    }();
     EXPECT_EQ(result, TargetUnwritable);
     EXPECT_THAT(said, HasSubstr("free some space"));
     EXPECT_THAT(NamesIn(Temp()), ElementsAre("a"));
