@@ -2,8 +2,8 @@
 // whatever the number, so what grows is the look-up and not the traffic to main memory; ScalarReadOfAnyTicket
 // reads all of them at random, and shows that traffic. The storage makes up its tickets, so no disk is in the
 // way.
-#include "standin/server/Password.h"
-#include "standin/server/TicketServer.h"
+#include "standin/server/sessions/Password.h"
+#include "standin/server/site/TicketServer.h"
 #include <benchmark/benchmark.h>
 #include <map>
 #include <random>

@@ -2,9 +2,9 @@
 
 #include "comgui/session/TCommandRecord.h"
 #include "standin/module/ModuleCodes.h"
-#include "standin/server/JobIntake.h"
-#include "standin/server/PartFile.h"
-#include "standin/server/SiteFiles.h"
+#include "standin/server/files/SiteFiles.h"
+#include "standin/server/jobs/JobIntake.h"
+#include "standin/server/transfer/PartFile.h"
 #include <algorithm>
 #include <cstring>
 

@@ -5,7 +5,7 @@
 
 #include "comgui/ticket/MTICKET_ACCESS.h"
 #include "standin/module/OpenTickets.h"
-#include "standin/server/TicketServer.h"
+#include "standin/server/site/TicketServer.h"
 
 namespace standin
 {

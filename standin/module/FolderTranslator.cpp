@@ -2,7 +2,7 @@
 
 #include "comgui/folders/FolderVariables.h"
 #include "standin/module/Guard.h"
-#include "standin/server/FolderTable.h"
+#include "standin/server/tickets/FolderTable.h"
 #include <new>
 
 namespace standin

@@ -6,7 +6,7 @@
 #include "comgui/folders/clFOLDER_VARIABLES.h"
 #include "comgui/ticket/MTICKET_ACCESS.h"
 #include "standin/module/LocalTicket.h"
-#include "standin/server/TicketServer.h"
+#include "standin/server/site/TicketServer.h"
 
 namespace standin
 {

@@ -1,7 +1,7 @@
 #include "standin/module/LocalTicket.h"
 
 #include "comgui/ticket/TICKET_OP.h"
-#include "standin/server/Storage.h"
+#include "standin/server/store/Storage.h"
 #include <algorithm>
 #include <utility>
 

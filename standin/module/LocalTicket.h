@@ -3,7 +3,7 @@
 #pragma once
 
 #include "standin/module/TicketTable.h"
-#include "standin/server/OwnedTicket.h"
+#include "standin/server/tickets/OwnedTicket.h"
 #include <filesystem>
 
 namespace standin

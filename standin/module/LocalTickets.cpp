@@ -1,6 +1,6 @@
 #include "standin/module/LocalTickets.h"
 
-#include "standin/server/Storage.h"
+#include "standin/server/store/Storage.h"
 #include <cstdio>
 
 namespace standin

@@ -2,7 +2,7 @@
 // they keep clear of the codes that the library itself gives: 1, -1, -2005 and -9999.
 #pragma once
 
-#include "standin/server/TransferError.h"
+#include "standin/server/transfer/TransferError.h"
 
 namespace standin
 {

@@ -5,7 +5,7 @@
 
 #include "standin/module/FolderTranslator.h"
 #include "standin/module/TicketTable.h"
-#include "standin/server/TicketServer.h"
+#include "standin/server/site/TicketServer.h"
 #include <unordered_set>
 
 namespace standin

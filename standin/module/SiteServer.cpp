@@ -1,8 +1,8 @@
 #include "standin/module/SiteServer.h"
 
 #include "standin/module/Guard.h"
-#include "standin/server/Site.h"
-#include "standin/server/TransferService.h"
+#include "standin/server/site/Site.h"
+#include "standin/server/transfer/TransferService.h"
 #include <dlfcn.h>
 #include <filesystem>
 #include <map>

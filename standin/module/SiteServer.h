@@ -2,7 +2,7 @@
 // the process, since containers that clients hold lead there. For any thread.
 #pragma once
 
-#include "standin/server/TicketServer.h"
+#include "standin/server/site/TicketServer.h"
 
 namespace standin
 {

@@ -1,7 +1,7 @@
 #include "standin/module/TicketData.h"
 
 #include "standin/module/ModuleCodes.h"
-#include "standin/server/TicketXml.h"
+#include "standin/server/tickets/TicketXml.h"
 #include <cstring>
 #include <limits>
 

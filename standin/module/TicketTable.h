@@ -3,7 +3,7 @@
 #pragma once
 
 #include "comgui/ticket/STICKET_ACCESS.h"
-#include "standin/server/TicketAddress.h"
+#include "standin/server/tickets/TicketAddress.h"
 #include <optional>
 
 namespace standin

@@ -1,9 +1,9 @@
 #include "standin/module/Transfers.h"
 
 #include "standin/module/ModuleCodes.h"
-#include "standin/server/JobIntake.h"
-#include "standin/server/SiteFiles.h"
-#include "standin/server/TransferService.h"
+#include "standin/server/files/SiteFiles.h"
+#include "standin/server/jobs/JobIntake.h"
+#include "standin/server/transfer/TransferService.h"
 #include <cstring>
 
 namespace standin

@@ -3,8 +3,8 @@
 // sanitizer watches that.
 #pragma once
 
-#include "standin/server/Password.h"
-#include "standin/server/Storage.h"
+#include "standin/server/sessions/Password.h"
+#include "standin/server/store/Storage.h"
 #include <algorithm>
 #include <map>
 

@@ -1,7 +1,7 @@
 // A server over a storage in memory, with an administrator and two operators logged in.
 #pragma once
 
-#include "standin/server/TicketServer.h"
+#include "standin/server/site/TicketServer.h"
 #include "tests/server/MemoryStorage.h"
 #include <gtest/gtest.h>
 

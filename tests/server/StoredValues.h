@@ -1,7 +1,7 @@
 // Values as the server moves them, made and compared by tests.
 #pragma once
 
-#include "standin/server/StoredValue.h"
+#include "standin/server/tickets/StoredValue.h"
 #include <bit>
 #include <cstdint>
 #include <string_view>

@@ -1,7 +1,7 @@
 // The folders by variable, and how the server keeps them such that clients come to an end with them.
-#include "standin/server/FolderTable.h"
+#include "standin/server/tickets/FolderTable.h"
 
-#include "standin/server/Site.h"
+#include "standin/server/site/Site.h"
 #include "tests/server/MemoryFolder.h"
 #include "tests/server/ServerTest.h"
 #include "tests/server/StoredValues.h"

@@ -1,8 +1,8 @@
 // How jobs come in, and what is left of those that do not.
-#include "standin/server/JobIntake.h"
+#include "standin/server/jobs/JobIntake.h"
 
-#include "standin/server/Site.h"
-#include "standin/server/TransferService.h"
+#include "standin/server/site/Site.h"
+#include "standin/server/transfer/TransferService.h"
 #include "tests/server/MemoryFolder.h"
 #include "tests/server/ServerTest.h"
 #include "tests/server/StoredValues.h"

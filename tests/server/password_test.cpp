@@ -1,4 +1,4 @@
-#include "standin/server/Password.h"
+#include "standin/server/sessions/Password.h"
 
 #include <gtest/gtest.h>
 #include <stdexcept>

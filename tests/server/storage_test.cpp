@@ -1,4 +1,4 @@
-#include "standin/server/SqliteStorage.h"
+#include "standin/server/store/SqliteStorage.h"
 
 #include "tests/server/MemoryFolder.h"
 #include "tests/server/StoredValues.h"

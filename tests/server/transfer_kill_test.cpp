@@ -1,7 +1,7 @@
 // A process that is killed at any instant while files and jobs come in.
-#include "standin/server/JobIntake.h"
-#include "standin/server/Site.h"
-#include "standin/server/TransferService.h"
+#include "standin/server/jobs/JobIntake.h"
+#include "standin/server/site/Site.h"
+#include "standin/server/transfer/TransferService.h"
 #include "tests/server/MemoryFolder.h"
 #include "tests/support/ChildProcess.h"
 #include "tests/support/Files.h"

@@ -1,8 +1,8 @@
 // Files and jobs on their way: where they may go, what becomes of them when something fails, and who is told.
-#include "standin/server/TransferService.h"
+#include "standin/server/transfer/TransferService.h"
 
-#include "standin/server/JobIntake.h"
-#include "standin/server/Site.h"
+#include "standin/server/jobs/JobIntake.h"
+#include "standin/server/site/Site.h"
 #include "tests/server/MemoryFolder.h"
 #include "tests/server/ServerTest.h"
 #include "tests/support/Files.h"

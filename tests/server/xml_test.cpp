@@ -1,7 +1,7 @@
-#include "standin/server/TicketXml.h"
+#include "standin/server/tickets/TicketXml.h"
 
-#include "standin/server/AtomicFile.h"
-#include "standin/server/TicketXmlText.h"
+#include "standin/server/files/AtomicFile.h"
+#include "standin/server/tickets/TicketXmlText.h"
 #include "tests/server/MemoryFolder.h"
 #include "tests/server/StoredValues.h"
 #include "tests/support/ChildProcess.h"

@@ -1,0 +1,36 @@
+// Files that are read and replaced as a whole. Whoever opens a file that ReplaceFile writes finds the old
+// content or the new one, also after a kill or a power cut. Safe from any thread; of two that replace one
+// file at the same time the later one wins.
+#pragma once
+
+#include "standin/server/store/Storage.h"
+#include <cstddef>
+#include <filesystem>
+#include <optional>
+#include <string>
+#include <string_view>
+#include <sys/types.h>
+
+namespace standin
+{
+// One line that names the file, what failed, the reason of that errno and the remedy.
+StorageError FileError(std::filesystem::path const& file, std::string const& failed, int error);
+
+// The content, or its first limit bytes if it is larger.
+std::string ReadFile(std::filesystem::path const& file, std::size_t limit);
+
+// Writes a new file beside the old one, flushes it to the disk and puts it in the old one's place, whose
+// permissions it takes over. A link stays, and what it points at is replaced. On failure the old content is
+// there as it was and nothing else is left. A process killed in between leaves NAME.PID-N.tmp behind.
+void ReplaceFile(std::filesystem::path const& file, std::string_view content);
+
+// The process that a temporary name tells of, by what stands in it behind its beginning: ".PID-N.tmp".
+// Nothing for another text.
+std::optional<pid_t> ProcessOfTemporary(std::string_view ending);
+
+bool IsAlive(pid_t process);
+
+// Removes what killed processes have left behind beside the file. What belongs to a process that lives, this
+// one included, stays, and so does what cannot be removed.
+void RemoveLeftovers(std::filesystem::path const& file);
+}  // namespace standin

@@ -1,0 +1,25 @@
+// The folder of a job: $(JOB)/ID, which comes and goes with the job's ticket. The administrator may have
+// given $(JOB) a place where other programs have folders, too. So the server marks each that it makes by an
+// empty file in it, whose name only the job's ticket tells, and takes no other away.
+#pragma once
+
+#include "standin/server/files/Descriptor.h"
+#include "standin/server/tickets/FolderTable.h"
+#include <filesystem>
+
+namespace standin
+{
+inline constexpr char JobMarkKey[] = "Job/FolderMark";
+
+std::string NewJobMark();  // none comes twice
+
+// Makes it and opens it. Throws TransferError, also if there is one of that number with something in it:
+// whose that is nobody here knows.
+Descriptor MakeJobFolder(FolderTable const& table, int id, std::string_view mark);
+
+// With all that is in it, if it has that mark. What cannot be removed stays, and is told on stderr.
+void RemoveJobFolder(FolderTable const& table, int id, std::string_view mark);
+
+// The same for a folder of which no ticket tells: if it has any mark, or nothing in it.
+void RemoveStrayJobFolder(std::filesystem::path const& folder);
+}  // namespace standin

@@ -1,0 +1,67 @@
+// How jobs come to the server. A job is a ticket of type 3 and a file in a folder of its own, $(JOB)/ID. It
+// may be announced first, which makes the ticket with "Job/State" 0; the file turns it into 1, in the very
+// transaction that tells where the file is. So a job in state 1 has its whole file, whenever the process
+// ends. Until then the ticket has "Job/Prepared"; one with that mark and without the session that made it
+// goes, when the session ends or when the site is opened next. For any thread.
+#pragma once
+
+#include "standin/server/site/TicketServer.h"
+#include "standin/server/transfer/TransferError.h"
+
+namespace standin
+{
+class RunningTransfer;
+class SourceFile;
+
+inline constexpr char JobPreparedKey[] = "Job/Prepared";
+inline constexpr char JobFileKey[] = "Job/File";  // once it is there
+
+class JobIntake
+{
+public:
+    explicit JobIntake(TicketServer& server) : m_server(server) {}
+    JobIntake(JobIntake const&) = delete;
+    JobIntake& operator=(JobIntake const&) = delete;
+
+    struct Announcement
+    {
+        std::string name;    // of the file that will come
+        bool isCut = false;  // the name had no room: the file's begins with it
+        int queue = 0;       // the id of a ticket of type 7; none if there is no such ticket
+        int copies = 0;      // none below 1
+    };
+
+    // Makes the job's ticket; id gets its id.
+    TransferResult Prepare(Session const& session, Announcement const& announcement, int& id);
+
+    // Copies a file of the client's into the newest job of the session that was announced with that name and
+    // has not come yet, or into one made now. On failure the job's ticket is gone, and its folder too.
+    TransferResult Send(Session const& session, std::string const& clientPath, std::string const& name);
+
+    void End(Session const& session);  // an ended one: what it has announced and not sent goes
+
+private:
+    struct Job
+    {
+        TicketServer::MadeTicket ticket;
+        std::string mark;                      // of its folder
+        std::optional<FolderTable> folders{};  // as they were when its folder was made
+    };
+    struct Prepared
+    {
+        unsigned long long session;
+        Announcement announcement;
+        Job job;
+    };
+
+    Job Make(Session const& session, Announcement const& announcement);
+    std::optional<Job> Claim(Session const& session, std::string const& name);
+    void Receive(Session const& session, Job& job, SourceFile const& source, std::string const& name,
+                 RunningTransfer const& running);
+    void Drop(Job const& job);
+
+    TicketServer& m_server;
+    std::mutex m_lock;
+    std::vector<Prepared> m_prepared;  // in the order of their making
+};
+}  // namespace standin

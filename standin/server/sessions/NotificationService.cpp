@@ -1,0 +1,330 @@
+#include "standin/server/sessions/NotificationService.h"
+
+#include "comgui/ticket/TICKET_ID.h"
+#include <algorithm>
+#include <cstdio>
+
+namespace standin
+{
+namespace
+{
+bool IsTypeAsAWhole(TicketAddress tickets)
+{
+    return tickets.id == TICKET_ID_ALL && IsValid(TicketAddress{tickets.type, 0});
+}
+
+bool Covers(TicketAddress tickets, TicketAddress subscription)
+{
+    return tickets == AllTickets || tickets == subscription ||
+           (tickets.id == TICKET_ID_ALL && tickets.type == subscription.type);
+}
+
+std::size_t WeightOf(ChangedParameters const& changes)
+{
+    std::size_t weight = changes.empty() ? 1 : 0;
+    for (ChangedParameter const& change : changes)
+        weight += 1 + (change.value.text ? change.value.text->bytes.size() / 1024 : 0);
+    return weight;
+}
+
+// Records of one key come in the order of their writes, keys in the order of their first.
+void GroupByKey(ChangedParameters& changes)
+{
+    std::unordered_map<Key, std::size_t> first;
+    for (ChangedParameter const& change : changes)
+        first.try_emplace(change.key, first.size());
+    std::stable_sort(changes.begin(), changes.end(),
+                     [&](auto const& left, auto const& right)
+                     { return first.find(left.key)->second < first.find(right.key)->second; });
+}
+
+ChangedParameter Copy(ChangedParameter const& change)
+{
+    return {change.key, change.pos, TicketValue::FromStored(change.value.ToStored())};
+}
+}  // namespace
+
+bool NotificationService::Listener::Wants(TicketAddress ticket) const
+{
+    return subscriptions.contains(ticket) || subscriptions.contains({ticket.type, TICKET_ID_ALL});
+}
+
+bool NotificationService::Listener::Wants(TicketAddress ticket, std::string_view key) const
+{
+    auto const selects = [&](TicketAddress tickets)
+    {
+        auto const subscription = subscriptions.find(tickets);
+        return subscription != subscriptions.end() && subscription->second.Selects(key);
+    };
+    return selects(ticket) || selects({ticket.type, TICKET_ID_ALL});
+}
+
+NotificationService::~NotificationService()
+{
+    {
+        std::lock_guard const lock(m_lock);
+        m_stopped = true;
+    }
+    m_work.notify_all();
+    if (m_thread.joinable())
+        m_thread.join();
+}
+
+void NotificationService::Stop(std::chrono::milliseconds patience)
+{
+    Lock lock(m_lock);
+    m_stopped = true;
+    m_work.notify_all();
+    if (std::this_thread::get_id() != m_thread.get_id())
+        m_done.wait_for(lock, patience, [this] { return m_running == 0; });
+}
+
+NotificationService::Listener* NotificationService::Find(Session const& session, int id) const
+{
+    auto const found = std::find_if(m_listeners.begin(), m_listeners.end(),
+                                    [&](auto const& listener)
+                                    { return listener->id == id && listener->session == session.Number(); });
+    return found == m_listeners.end() ? nullptr : found->get();
+}
+
+bool NotificationService::Register(Session const& session, int id, Callback callback)
+{
+    auto listener =
+        std::make_shared<Listener>(Listener{session.Number(), session.Who().name, id, std::move(callback)});
+    Lock lock(m_lock);
+    if (!m_thread.joinable())
+        m_thread = std::thread([this] { Run(); });
+    while (RemoveOne(session, lock))
+        ;
+    // Whoever ends a session does so before removing it, so it cannot slip in behind.
+    if (session.Ended())
+        return false;
+    m_listeners.push_back(std::move(listener));
+    return true;
+}
+
+void NotificationService::Remove(Session const& session)
+{
+    Lock lock(m_lock);
+    while (RemoveOne(session, lock))
+        ;
+}
+
+// Lets go of the lock where it waits for a callback.
+bool NotificationService::RemoveOne(Session const& session, Lock& lock)
+{
+    auto const found =
+        std::find_if(m_listeners.begin(), m_listeners.end(),
+                     [&](auto const& listener) { return listener->session == session.Number(); });
+    if (found == m_listeners.end())
+        return false;
+    auto const listener = *found;
+    m_listeners.erase(found);
+    listener->gone = true;
+    m_subscriptions -= listener->subscriptions.size();
+    listener->subscriptions.clear();
+    Withdraw(*listener);
+    WaitFor(listener->id, lock);
+    return true;
+}
+
+bool NotificationService::Enable(Session const& session, int id, TicketAddress tickets, KeyFilter keys)
+{
+    if (!IsValid(tickets) && !IsTypeAsAWhole(tickets))
+        return false;
+    std::lock_guard const lock(m_lock);
+    Listener* const listener = Find(session, id);
+    if (!listener)
+        return false;
+    if (listener->subscriptions.insert_or_assign(tickets, std::move(keys)).second)
+        ++m_subscriptions;
+    return true;
+}
+
+bool NotificationService::Disable(Session const& session, int id, TicketAddress tickets)
+{
+    if (tickets != AllTickets && !IsValid(tickets) && !IsTypeAsAWhole(tickets))
+        return false;
+    Lock lock(m_lock);
+    Listener* const listener = Find(session, id);
+    if (!listener)
+        return false;
+    m_subscriptions -= std::erase_if(listener->subscriptions, [&](auto const& subscription)
+                                     { return Covers(tickets, subscription.first); });
+    Withdraw(*listener);
+    WaitFor(id, lock);
+    return true;
+}
+
+// Takes back what waits for a listener and is wanted no longer.
+void NotificationService::Withdraw(Listener& listener)
+{
+    std::erase_if(m_waiting,
+                  [&](Message& message)
+                  {
+                      bool const isSwitched = listener.gone || message.kind != TransferEnded;
+                      if (message.listener.get() != &listener || !isSwitched)
+                          return false;
+                      Unqueue(message);
+                      auto const isUnwanted = [&](ChangedParameter const& change)
+                      { return !listener.Wants(message.ticket, *change.key); };
+                      bool const hadChanges = !message.changes.empty();
+                      std::erase_if(message.changes, isUnwanted);
+                      if (!listener.Wants(message.ticket) || (hadChanges && message.changes.empty()))
+                          return true;
+                      message.weight = WeightOf(message.changes);
+                      listener.pending += message.weight;
+                      return false;
+                  });
+}
+
+void NotificationService::Unqueue(Message& message)
+{
+    Listener& listener = *message.listener;
+    listener.pending -= message.weight;
+    if (listener.pending == 0)
+        listener.dropping = false;
+}
+
+void NotificationService::WaitFor(int id, Lock& lock)
+{
+    if (std::this_thread::get_id() == m_thread.get_id())
+        return;  // from the callback itself, which cannot wait for its own end
+    m_done.wait(lock, [this, id, run = m_run] { return m_running != id || m_run != run; });
+}
+
+bool NotificationService::AreWanted(TicketAddress ticket) const
+{
+    if (m_subscriptions.load(std::memory_order_relaxed) == 0)
+        return false;
+    std::lock_guard const lock(m_lock);
+    return std::any_of(m_listeners.begin(), m_listeners.end(),
+                       [&](auto const& listener) { return listener->Wants(ticket); });
+}
+
+void NotificationService::Post(NotificationKind kind, TicketAddress ticket,
+                               ChangedParameters changes) noexcept
+{
+    if (m_subscriptions.load(std::memory_order_relaxed) == 0)
+        return;
+    try
+    {
+        std::erase_if(changes, [](ChangedParameter const& change) { return !change.key; });
+        if (kind == ParametersChanged && changes.empty())
+            return;
+        GroupByKey(changes);
+        std::lock_guard const lock(m_lock);
+        for (auto const& listener : m_listeners)
+            Queue(listener, kind, ticket, changes);
+        m_work.notify_one();
+    }
+    catch (std::exception const& error)
+    {
+        std::fprintf(stderr, "a notification of ticket %d/%d is lost: %s; clients should read it anew\n",
+                     ticket.type, ticket.id, error.what());
+    }
+}
+
+void NotificationService::Tell(unsigned long long session, NotificationKind kind, TicketAddress ticket,
+                               ChangedParameters changes) noexcept
+{
+    try
+    {
+        std::lock_guard const lock(m_lock);
+        auto const found = std::find_if(m_listeners.begin(), m_listeners.end(),
+                                        [&](auto const& listener) { return listener->session == session; });
+        if (found == m_listeners.end() || m_stopped)
+            return;
+        Append({*found, kind, ticket, std::move(changes), 0});
+        m_work.notify_one();
+    }
+    catch (std::exception const& error)
+    {
+        std::fprintf(stderr, "a notification is lost: %s\n", error.what());
+    }
+}
+
+void NotificationService::Queue(std::shared_ptr<Listener> const& listener, NotificationKind kind,
+                                TicketAddress ticket, ChangedParameters const& changes)
+{
+    if (m_stopped || !listener->Wants(ticket))
+        return;
+    Message message{listener, kind, ticket, {}, 0};
+    for (ChangedParameter const& change : changes)
+        if (listener->Wants(ticket, *change.key))
+            message.changes.push_back(Copy(change));
+    if (message.changes.empty() && !changes.empty())
+        return;
+    Append(std::move(message));
+}
+
+void NotificationService::Append(Message message)
+{
+    auto const listener = message.listener;
+    message.weight = WeightOf(message.changes);
+    if (listener->pending == 0 || listener->pending + message.weight <= PendingLimit)
+    {
+        listener->pending += message.weight;
+        m_waiting.push_back(std::move(message));
+        return;
+    }
+    if (!listener->dropping)
+        std::fprintf(stderr,
+                     "notification id %d of user %s: the client is too slow, changes are dropped while %zu "
+                     "wait for it; it should read its tickets anew\n",
+                     listener->id, listener->user.c_str(), listener->pending);
+    listener->dropping = true;
+}
+
+void NotificationService::Run()
+{
+    Lock lock(m_lock);
+    for (;;)
+    {
+        m_work.wait(lock, [this] { return m_stopped || !m_waiting.empty(); });
+        if (m_stopped)
+            return;
+        {
+            Message message = std::move(m_waiting.front());
+            m_waiting.pop_front();
+            Unqueue(message);
+            m_running = message.listener->id;
+            ++m_run;
+            lock.unlock();
+            Deliver(message);
+        }
+        lock.lock();
+        m_running = 0;
+        m_done.notify_all();
+    }
+}
+
+void NotificationService::Deliver(Message& message) noexcept
+{
+    try
+    {
+        std::vector<SETMULTIPAR> records(message.changes.size() + 1);
+        std::vector<BIN_STRING> binaries(message.changes.size());
+        for (std::size_t i = 0; i < message.changes.size(); ++i)
+        {
+            ChangedParameter const& change = message.changes[i];
+            records[i].key = change.key->c_str();
+            records[i].type = change.value.type;
+            records[i].value = change.value.type == PARAM_NONE ? nullptr : change.value.Word(binaries[i]);
+            records[i].pos = change.pos;
+            records[i].ok = true;
+        }
+        message.listener->callback({message.kind, message.ticket, message.listener->id,
+                                    message.changes.empty() ? nullptr : records.data()});
+    }
+    catch (std::exception const& error)
+    {
+        std::fprintf(stderr, "notification id %d: the callback failed: %s\n", message.listener->id,
+                     error.what());
+    }
+    catch (...)
+    {
+        std::fprintf(stderr, "notification id %d: the callback failed\n", message.listener->id);
+    }
+}
+}  // namespace standin

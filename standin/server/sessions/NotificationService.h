@@ -1,0 +1,146 @@
+// Tells sessions what changes in the tickets of a server. Whoever changes a ticket leaves word here, in the
+// order of the changes; one thread of the service's own passes it on, one callback at a time. No lock is
+// held during a callback, which may use the server and this service as it likes.
+//
+// For any thread. A session that is slow to take its notifications loses the newest ones; it never keeps
+// anybody from writing.
+#pragma once
+
+#include "comgui/ticket/SETMULTIPAR.h"
+#include "standin/server/sessions/Session.h"
+#include "standin/server/tickets/KeyFilter.h"
+#include "standin/server/tickets/KeyPool.h"
+#include "standin/server/tickets/TicketAddress.h"
+#include "standin/server/tickets/TicketValue.h"
+#include <chrono>
+#include <condition_variable>
+#include <deque>
+#include <thread>
+
+namespace standin
+{
+// The numbers are those that clients know.
+enum NotificationKind : int
+{
+    ParametersChanged = 1,
+    TicketCreated = 4,
+    TicketDeleted = 5,
+    TransferEnded = 6,
+};
+
+// What a callback is told; all of it dies when the callback returns.
+struct Notification
+{
+    NotificationKind kind;
+    TicketAddress ticket;  // of a transfer: type 0, and its result in the place of the id
+    int id;                // under which it was asked for
+    SETMULTIPAR* records;  // of changed parameters, ended by a null key; null for tickets as a whole
+};
+
+// A value as one change left it; PARAM_NONE: deleted. pos is -1 for a key that was written anew or deleted.
+struct ChangedParameter
+{
+    Key key = nullptr;
+    int pos = 0;
+    TicketValue value;
+};
+using ChangedParameters = std::vector<ChangedParameter>;
+
+class NotificationService
+{
+public:
+    // Records that wait for one session at most; a text counts as one for every KiB of it. A change that is
+    // larger still waits if nothing else does.
+    static constexpr std::size_t PendingLimit = 65536;
+
+    using Callback = std::function<void(Notification const&)>;
+
+    NotificationService() = default;
+    ~NotificationService();  // not from a callback
+    NotificationService(NotificationService const&) = delete;
+    NotificationService& operator=(NotificationService const&) = delete;
+
+    int NewId() { return ++m_newestId; }
+
+    // From now on the session is told under that id, and under no earlier one. False for an ended session.
+    // Throws std::system_error if there can be no thread.
+    bool Register(Session const& session, int id, Callback callback);
+
+    // One ticket, or with TICKET_ID_ALL every ticket of the type. Enabling again replaces the keys. Tickets
+    // need not exist. False for an id that is not the session's, and for no such address.
+    bool Enable(Session const& session, int id, TicketAddress tickets, KeyFilter keys);
+
+    // The same the other way round; a whole type takes its single tickets along, and AllTickets everything.
+    // When it returns no callback about them runs or will come, unless it is called from a callback itself.
+    bool Disable(Session const& session, int id, TicketAddress tickets);
+
+    // No callback of the session runs or will come when it returns, with the same exception.
+    void Remove(Session const& session);
+
+    // Does anybody want to hear of the ticket? Costs next to nothing while nobody wants anything.
+    bool AreWanted(TicketAddress ticket) const;
+
+    // Leaves word of one change. Parameters are put in such an order that those of one key are neighbours.
+    void Post(NotificationKind kind, TicketAddress ticket, ChangedParameters changes = {}) noexcept;
+
+    // Leaves word for one session, whatever it has switched on; nothing if it has not registered. The keys
+    // outlive the service.
+    void Tell(unsigned long long session, NotificationKind kind, TicketAddress ticket,
+              ChangedParameters changes) noexcept;
+
+    // Begins no further callback, for good, and waits for a running one, but no longer than told.
+    void Stop(std::chrono::milliseconds patience);
+
+private:
+    struct Listener
+    {
+        unsigned long long session;
+        std::string user;
+        int id;
+        Callback callback;
+        std::map<TicketAddress, KeyFilter> subscriptions{};
+        std::size_t pending = 0;
+        bool dropping = false;
+        bool gone = false;
+
+        bool Wants(TicketAddress ticket) const;
+        bool Wants(TicketAddress ticket, std::string_view key) const;
+    };
+    struct Message
+    {
+        std::shared_ptr<Listener> listener;
+        NotificationKind kind;
+        TicketAddress ticket;
+        ChangedParameters changes;
+        std::size_t weight;
+    };
+    using Lock = std::unique_lock<std::mutex>;
+
+    Listener* Find(Session const& session, int id) const;
+    bool RemoveOne(Session const& session, Lock& lock);
+    void Withdraw(Listener& listener);
+    void Append(Message message);
+    void Unqueue(Message& message);
+    void WaitFor(int id, Lock& lock);
+    void Queue(std::shared_ptr<Listener> const& listener, NotificationKind kind, TicketAddress ticket,
+               ChangedParameters const& changes);
+    void Run();
+    static void Deliver(Message& message) noexcept;
+
+    std::atomic<int> m_newestId{0};
+    std::atomic<std::size_t> m_subscriptions{0};  // of all listeners
+
+    mutable std::mutex m_lock;  // the members below; taken last
+    std::vector<std::shared_ptr<Listener>> m_listeners;
+    std::deque<Message> m_waiting;
+    std::condition_variable m_work;
+    std::condition_variable m_done;
+    int m_running = 0;             // the id whose callback runs, 0 for none
+    unsigned long long m_run = 0;  // counts callbacks: a wait for one must not become one for the next
+    bool m_stopped = false;
+    std::thread m_thread;  // begun at the first registration
+};
+
+// Every ticket of every type, for Disable.
+inline constexpr TicketAddress AllTickets{-3, -3};
+}  // namespace standin

@@ -1,0 +1,97 @@
+// The folders of the site by variable: what $(JOB) and its kind stand for. The system ticket has a key for
+// each, whose value may itself begin with the variable of a folder farther up in the list, never of one
+// below. A value that keeps a variable which cannot be resolved would hold up clients for good: they go on
+// replacing as long as a value begins with one. So such a value is kept out of the ticket.
+#pragma once
+
+#include "standin/server/tickets/StoredValue.h"
+#include <array>
+#include <optional>
+#include <string>
+#include <string_view>
+#include <vector>
+
+namespace standin
+{
+struct FolderRow
+{
+    char const* key;
+    char const* variable;
+};
+
+// In the order in which clients read them.
+inline constexpr std::array<FolderRow, 28> FolderRows = {{
+    {"System/InstallFolder", "INSTALL"},
+    {"System/Folders/Temp", "TEMP"},
+    {"System/Folders/Thumbnail", "THUMBNAIL"},
+    {"System/Folders/Print", "PRINT"},
+    {"System/Folders/RemoteIn", "REMOTE_IN"},
+    {"System/Folders/RemoteWCC", "REMOTE_WCC"},
+    {"System/Folders/RemoteOut", "REMOTE_OUT"},
+    {"System/Folders/Log", "LOG"},
+    {"System/Folders/Embedded", "EMBEDDED"},
+    {"System/Folders/Export", "EXPORT"},
+    {"System/Folders/Preview", "PREVIEW"},
+    {"System/Folders/Job", "JOB"},
+    {"System/Folders/PaperProfiles", "PAPER"},
+    {"System/Folders/ReferenceProfiles", "REFERENCE"},
+    {"System/Folders/Linearisation/Visual", "LIN_VISUAL"},
+    {"System/Folders/Linearisation/Measured", "LIN_MEASURED"},
+    {"System/Folders/Linearisation/Plate", "LIN_PLATE"},
+    {"System/Folders/Linearisation/SpotColor", "LIN_SPOTCOLOR"},
+    {"System/Folders/SpotcolorTable", "SPOTCOLORTAB"},
+    {"System/Folders/ControlStrip", "CONTROLSTRIP"},
+    {"System/Folders/Update", "UPDATES"},
+    {"System/Folders/Backup", "BACKUP"},
+    {"System/Folders/SPT", "SPT"},
+    {"System/Linearisation/LAB", "LABCORRECTION"},
+    {"System/Folders/Environments", "ENVIRONMENTS"},
+    {"System/Folders/Logo", "LOGO"},
+    {"System/Folders/HotFolder", "HOT"},
+    {"System/Folders/Analytics", "ANALYTICS"},
+}};
+
+inline constexpr char UseFolderVariablesKey[] = "System/UseFolderVariables";
+
+// The folders, resolved: variables are compared byte by byte.
+class FolderTable
+{
+public:
+    // values: row by row as the ticket has them; empty: no such folder.
+    explicit FolderTable(std::array<std::string, FolderRows.size()> const& values);
+
+    // With slashes and without one at the end; nothing for a variable that is unknown, has no value, or
+    // cannot be resolved.
+    std::optional<std::string> FolderOf(std::string_view variable) const;
+
+    // The rows that cannot be resolved, ascending; a row that leans on one of them is one of them.
+    std::vector<std::size_t> Unresolved() const { return m_unresolved; }
+
+private:
+    std::array<std::string, FolderRows.size()> m_folders;
+    std::array<bool, FolderRows.size()> m_known{};
+    std::vector<std::size_t> m_unresolved;
+};
+
+// What of the system ticket has to do with folders.
+struct FolderSettings
+{
+    int use = 0;  // "System/UseFolderVariables" as it stands: of its two lowest bits, 1 lets clients resolve
+    std::array<std::string, FolderRows.size()> values;
+
+    static bool Concern(std::string_view key, int pos);  // position 0 is what clients read
+
+    // Takes over the value at position 0 of a key that concerns folders. What has another type than the one
+    // due counts as none, and so does PARAM_NONE.
+    void Put(std::string_view key, StoredValue const& value);
+
+    // Do clients come to an end when they read this?
+    bool CanBeRead() const;
+
+    // With bit 1 clear and bit 2 set clients take the values as they are, so none may have a variable.
+    bool MustBePlain() const { return (use & 3) == 2; }
+};
+
+// Does a value begin with a variable, as far as clients look before they replace it?
+bool BeginsWithVariable(std::string_view value);
+}  // namespace standin

@@ -1,0 +1,214 @@
+#include "standin/server/transfer/PartFile.h"
+
+#include "standin/server/files/AtomicFile.h"
+#include "standin/server/transfer/TransferError.h"
+#include <algorithm>
+#include <atomic>
+#include <cerrno>
+#include <fcntl.h>
+#include <sys/stat.h>
+
+namespace standin
+{
+namespace
+{
+constexpr std::string_view PartNameBeginning = ".transfer";
+
+// The process that made the part file of that name; nothing for other names.
+std::optional<pid_t> ProcessOf(std::string_view name)
+{
+    return name.starts_with(PartNameBeginning) ? ProcessOfTemporary(name.substr(PartNameBeginning.size()))
+                                               : std::nullopt;
+}
+
+std::string NewPartName()
+{
+    static std::atomic<unsigned> counter{0};
+    return std::string(PartNameBeginning) + "." + std::to_string(getpid()) + "-" + std::to_string(counter++) +
+           ".tmp";
+}
+
+// A name that is taken stays: another machine or container that shares the folder may have a process of the
+// same number, and what that is writing must not come under our file's name.
+Descriptor MakePartFile(int folder, std::string& name)
+{
+    for (;;)
+    {
+        name = NewPartName();
+        Descriptor file(openat(folder, name.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_CLOEXEC, 0666));
+        if (file.Number() >= 0 || errno != EEXIST)
+            return file;
+    }
+}
+
+// A terminal that is opened must not become the process's own, and a pipe not keep it waiting for a writer.
+constexpr int ToRead = O_RDONLY | O_NONBLOCK | O_NOCTTY | O_CLOEXEC;
+}  // namespace
+
+std::string ForMessages(std::string_view text)
+{
+    std::string shown(text);
+    std::replace_if(
+        shown.begin(), shown.end(), [](unsigned char byte) { return byte < 0x20 || byte == 0x7F; }, '?');
+    return shown;
+}
+
+bool IsPartFileName(std::string_view name) { return ProcessOf(name).has_value(); }
+
+void RemovePartFiles(std::filesystem::path const& folder, bool all)
+{
+    std::error_code error;
+    std::filesystem::directory_iterator entry(folder, error);
+    for (; !error && entry != std::filesystem::directory_iterator(); entry.increment(error))
+    {
+        auto const process = ProcessOf(entry->path().filename().string());
+        if (process && (all || !IsAlive(*process)))
+            unlink(entry->path().c_str());
+    }
+}
+
+SourceFile::SourceFile(int folder, std::string const& name)
+    : m_file(openat(folder, name.c_str(), ToRead | O_NOFOLLOW))
+{
+    int const reason = errno;
+    if (m_file.Number() < 0 && reason == ELOOP)
+        throw TransferError(PathRefused, name + ": a symbolic link; name the file that it points at");
+    Check(name, reason);
+}
+
+SourceFile::SourceFile(std::filesystem::path const& file) : m_file(open(file.c_str(), ToRead))
+{
+    int const reason = errno;
+    Check(file.string(), reason);
+}
+
+void SourceFile::Check(std::string const& shown, int reason)
+{
+    std::string const name = ForMessages(shown);
+    if (m_file.Number() < 0)
+        throw TransferError(reason == ENAMETOOLONG ? PathRefused
+                            : reason == ENXIO      ? NotAFile
+                                                   : SourceUnreadable,
+                            FileError(name, "cannot be read", reason).what());
+    struct stat found = {};
+    if (fstat(m_file.Number(), &found) != 0)
+        throw TransferError(SourceUnreadable, FileError(name, "cannot be read", errno).what());
+    if (!S_ISREG(found.st_mode))
+        throw TransferError(NotAFile, name + ": no regular file; name a file");
+    m_size = found.st_size;
+}
+
+PartFile::PartFile(int folder, std::string name) : m_folder(folder), m_name(std::move(name))
+{
+    struct stat old = {};
+    bool const isThere = fstatat(folder, m_name.c_str(), &old, AT_SYMLINK_NOFOLLOW) == 0;
+    if (!isThere && errno == ENAMETOOLONG)
+        Fail(errno);
+    if (isThere && S_ISLNK(old.st_mode))
+        throw TransferError(PathRefused, Shown() + ": a symbolic link; name the file that it points at");
+    if (isThere && !S_ISREG(old.st_mode))
+        throw TransferError(NotAFile, Shown() + ": something else than a file has that name; choose another");
+    std::string partName;
+    m_file = MakePartFile(folder, partName);
+    if (m_file.Number() < 0)
+        Fail(errno);
+    m_partName = std::move(partName);
+    if (isThere)
+        fchmod(m_file.Number(), old.st_mode & 07777);
+}
+
+PartFile::~PartFile()
+{
+    if (!m_partName.empty())
+        unlinkat(m_folder, m_partName.c_str(), 0);
+}
+
+void PartFile::Fail(int reason) const
+{
+    throw TransferError(reason == ENAMETOOLONG ? PathRefused : TargetUnwritable,
+                        FileError(Shown(), "cannot be written", reason).what());
+}
+
+void PartFile::FailAsCut() const
+{
+    throw TransferError(SourceUnreadable, Shown() + ": the source was cut while it was read; try again");
+}
+
+void PartFile::CopyFrom(SourceFile const& source, std::size_t piece,
+                        std::function<void(off_t done)> const& after)
+{
+    off_t const size = source.Size();
+    for (off_t at = 0; at < size;)
+    {
+        off_t begin = lseek(source.Number(), at, SEEK_DATA);
+        if (begin < 0)
+            begin = errno == ENXIO ? size : at;  // nothing but a hole is left, or nobody knows of holes
+        off_t const hole = begin < size ? lseek(source.Number(), begin, SEEK_HOLE) : size;
+        off_t const end = hole < 0 ? size : std::min(hole, size);
+        CopyRange(source, std::min(begin, size), end, piece, after);
+        at = end;
+    }
+    if (ftruncate(m_file.Number(), size) != 0)  // for a hole at the end
+        Fail(errno);
+    struct stat now = {};
+    if (fstat(source.Number(), &now) != 0 || now.st_size < size)
+        FailAsCut();
+    after(size);
+}
+
+void PartFile::CopyRange(SourceFile const& source, off_t begin, off_t end, std::size_t piece,
+                         std::function<void(off_t done)> const& after)
+{
+    while (begin < end)
+    {
+        ssize_t const count =
+            CopyPiece(source, begin, std::min(piece, static_cast<std::size_t>(end - begin)));
+        if (count == 0)
+            FailAsCut();  // now: by the end it may be as long as it was, with something else in it
+        begin += count;
+        after(begin);
+    }
+}
+
+ssize_t PartFile::CopyPiece(SourceFile const& source, off_t at, std::size_t size)
+{
+#ifdef __linux__
+    if (m_copiesDirectly)
+    {
+        off_t from = at;
+        off_t to = at;
+        ssize_t const count = copy_file_range(source.Number(), &from, m_file.Number(), &to, size, 0);
+        if (count > 0)
+            return count;
+        m_copiesDirectly = false;  // reading and writing tells which of the two fails, if any
+    }
+#endif
+    m_buffer.resize(std::max(m_buffer.size(), size));
+    ssize_t count = -1;
+    do
+        count = pread(source.Number(), m_buffer.data(), size, at);
+    while (count < 0 && errno == EINTR);
+    int const reason = errno;
+    if (count < 0)
+        throw TransferError(SourceUnreadable, FileError(Shown(), "the source cannot be read", reason).what());
+    for (ssize_t done = 0; done < count;)
+    {
+        ssize_t const written = pwrite(m_file.Number(), m_buffer.data() + done,
+                                       static_cast<std::size_t>(count - done), at + done);
+        if (written < 0 && errno != EINTR)
+            Fail(errno);
+        done += std::max<ssize_t>(written, 0);
+    }
+    return count;
+}
+
+// Not flushed to the disk: as with tickets, what is acknowledged outlives the process and not a power cut.
+void PartFile::Finish()
+{
+    if (!m_file.Close())
+        Fail(errno);
+    if (renameat(m_folder, m_partName.c_str(), m_folder, m_name.c_str()) != 0)
+        Fail(errno);
+    m_partName.clear();
+}
+}  // namespace standin

@@ -1,0 +1,244 @@
+#include "standin/server/transfer/TransferService.h"
+
+#include "standin/server/files/AtomicFile.h"
+#include "standin/server/files/SiteFiles.h"
+#include "standin/server/site/TicketServer.h"
+#include <algorithm>
+#include <cerrno>
+#include <fcntl.h>
+
+namespace standin
+{
+namespace
+{
+ChangedParameter Record(Key key, PARAM_TYPE type, long long integer, std::string_view text)
+{
+    StoredValue value;
+    value.type = type;
+    value.integer = integer;
+    value.bytes = text;
+    return {key, -1, TicketValue::FromStored(value)};
+}
+
+// A link stays a link, and what it points at is replaced.
+std::filesystem::path Followed(std::filesystem::path const& file)
+{
+    std::error_code noLink;
+    auto const target = std::filesystem::canonical(file, noLink);
+    return noLink ? file : target;
+}
+
+Descriptor OpenClientFolder(std::filesystem::path const& folder)
+{
+    Descriptor opened(open(folder.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
+    if (opened.Number() < 0)
+        throw TransferError(TargetUnwritable,
+                            FileError(ForMessages(folder.string()), "cannot be opened", errno).what());
+    return opened;
+}
+
+std::string LeafOf(std::string const& path) { return path.substr(path.find_last_of("/\\") + 1); }
+}  // namespace
+
+void RunningTransfer::Check() const
+{
+    if (m_cut.load(std::memory_order_relaxed))
+        throw TransferError(TransferCut, "");
+}
+
+TransferService::~TransferService()
+{
+    Stop(std::chrono::hours(1));
+    if (m_thread.joinable())
+        m_thread.join();
+}
+
+std::filesystem::path TransferService::ClientPath(std::string text)
+{
+    if (text.empty())
+        throw TransferError(PathRefused, "the path of the local file is empty");
+    std::replace(text.begin(), text.end(), '\\', '/');
+    return std::filesystem::absolute(text);
+}
+
+void TransferService::Copy(PartFile& target, SourceFile const& source, RunningTransfer const& running,
+                           std::function<void(off_t done)> const& told) const
+{
+    target.CopyFrom(source, m_pace.piece,
+                    [&](off_t done)
+                    {
+                        if (m_pace.after)
+                            m_pace.after();
+                        running.Check();
+                        if (told)
+                            told(done);
+                    });
+}
+
+// Gives the size of what it has carried.
+off_t TransferService::CarryNow(Request const& request, RunningTransfer const& running)
+{
+    running.Check();
+    if (request.direction == Request::ToServer)
+    {
+        ServerPath const to = ServerPath::Parse(request.target, LeafOf(request.source));
+        SourceFile const source(ClientPath(request.source));
+        Descriptor const folder = OpenFolderOf(to, m_server.Folders(), Purpose::Write, m_site);
+        PartFile target(folder.Number(), to.name);
+        Copy(target, source, running);
+        target.Finish();
+        return source.Size();
+    }
+    ServerPath const from = ServerPath::Parse(request.source, "");
+    Descriptor const folder = OpenFolderOf(from, m_server.Folders(), Purpose::Read, m_site);
+    SourceFile const source(folder.Number(), from.name);
+    std::filesystem::path file = ClientPath(request.target);
+    file = Followed(file.has_filename() ? file : file / from.name);
+    Descriptor const clientFolder = OpenClientFolder(file.parent_path());
+    PartFile target(clientFolder.Number(), file.filename().string());
+    Copy(target, source, running);
+    target.Finish();
+    return source.Size();
+}
+
+TransferResult TransferService::Carry(Session const& session, Request const& request)
+{
+    return Run(session, [&](RunningTransfer const& running) { CarryNow(request, running); });
+}
+
+TransferResult TransferService::Run(Session const& session,
+                                    std::function<void(RunningTransfer& running)> const& work)
+{
+    Place place;
+    {
+        std::lock_guard const lock(m_lock);
+        // Whoever ends a session does so before ending its transfers, so none can slip in behind.
+        if (session.Ended() || m_stopped)
+            return TransferCut;
+        place = m_running.emplace(m_running.end(), session.Number());
+    }
+    return Finish(place, work);
+}
+
+TransferResult TransferService::Finish(Place running,
+                                       std::function<void(RunningTransfer& running)> const& work)
+{
+    TransferResult result = Transferred;
+    try
+    {
+        work(*running);
+    }
+    catch (TransferError const& error)
+    {
+        result = error.Result();
+        if (*error.what())
+            Report(error.what());
+    }
+    catch (std::exception const& error)
+    {
+        result = TransferFailed;
+        Report(std::string("a transfer failed: ") + error.what());
+    }
+    std::lock_guard const lock(m_lock);
+    m_running.erase(running);
+    m_done.notify_all();
+    return result;
+}
+
+TransferResult TransferService::CarryLater(Session const& session, Request request)
+{
+    Request const asked = request;
+    bool const toServer = request.direction == Request::ToServer;
+    TransferResult const result =
+        Run(session,
+            [&](RunningTransfer const&)
+            {
+                // The current folder may be another by then.
+                std::string& local = toServer ? request.source : request.target;
+                local = ClientPath(local).string();
+                ServerPath const path = ServerPath::Parse(toServer ? request.target : request.source,
+                                                          toServer ? LeafOf(request.source) : "");
+                OpenFolderOf(path, m_server.Folders(), toServer ? Purpose::Write : Purpose::Read, m_site);
+            });
+    if (result != Transferred)
+        return result;
+    std::lock_guard const lock(m_lock);
+    if (session.Ended() || m_stopped)
+        return TransferCut;
+    if (!m_thread.joinable())
+        m_thread = std::thread([this] { Work(); });
+    m_waiting.push_back({session.Number(), asked, std::move(request)});
+    m_work.notify_one();
+    return Transferred;
+}
+
+void TransferService::Work()
+{
+    Lock lock(m_lock);
+    for (;;)
+    {
+        m_work.wait(lock, [this] { return m_stopped || !m_waiting.empty(); });
+        if (m_stopped)
+            return;
+        Waiting const waiting = std::move(m_waiting.front());
+        m_waiting.pop_front();
+        Place const place = m_running.emplace(m_running.end(), waiting.session);
+        lock.unlock();
+        off_t size = 0;
+        TransferResult const result =
+            Finish(place, [&](RunningTransfer const& running) { size = CarryNow(waiting.request, running); });
+        if (result != TransferCut)  // then nobody is there to be told
+            Tell(waiting, result, size);
+        lock.lock();
+    }
+}
+
+void TransferService::Tell(Waiting const& done, TransferResult result, off_t size)
+{
+    static auto const& source = *new std::string("Transfer/Source");
+    static auto const& target = *new std::string("Transfer/Target");
+    static auto const& code = *new std::string("Transfer/Code");
+    static auto const& bytes = *new std::string("Transfer/Size");
+    try
+    {
+        ChangedParameters records;
+        records.push_back(Record(&source, PARAM_STRING, 0, done.asked.source));
+        records.push_back(Record(&target, PARAM_STRING, 0, done.asked.target));
+        records.push_back(Record(&code, PARAM_INT, result, {}));
+        records.push_back(Record(&bytes, PARAM_INT64, size, {}));
+        m_server.Notifications().Tell(done.session, TransferEnded, {SystemTicket.type, result},
+                                      std::move(records));
+    }
+    catch (std::exception const& error)
+    {
+        Report(std::string("word of a transfer is lost: ") + error.what());
+    }
+}
+
+bool TransferService::Runs(unsigned long long session) const
+{
+    return std::any_of(m_running.begin(), m_running.end(),
+                       [session](RunningTransfer const& running) { return running.Session() == session; });
+}
+
+void TransferService::End(Session const& session)
+{
+    Lock lock(m_lock);
+    std::erase_if(m_waiting, [&](Waiting const& waiting) { return waiting.session == session.Number(); });
+    for (RunningTransfer& running : m_running)
+        if (running.Session() == session.Number())
+            running.Cut();
+    m_done.wait(lock, [&] { return !Runs(session.Number()); });
+}
+
+void TransferService::Stop(std::chrono::milliseconds patience)
+{
+    Lock lock(m_lock);
+    m_stopped = true;
+    m_waiting.clear();
+    m_work.notify_all();
+    for (RunningTransfer& running : m_running)
+        running.Cut();
+    m_done.wait_for(lock, patience, [this] { return m_running.empty(); });
+}
+}  // namespace standin

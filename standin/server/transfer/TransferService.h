@@ -1,0 +1,121 @@
+// Brings files to the server and fetches them. Each call works on the thread of its caller; those that are
+// left for later come one after another on one thread of the service's own. For any thread; no lock is held
+// while a file is copied. Failures are told in one line on stderr.
+//
+// A path of the client's side is UTF-8; backslashes in it are separators, as in the paths of ticket files.
+#pragma once
+
+#include "standin/server/sessions/Session.h"
+#include "standin/server/transfer/PartFile.h"
+#include "standin/server/transfer/ServerPath.h"
+#include "standin/server/transfer/TransferError.h"
+#include <chrono>
+#include <condition_variable>
+#include <deque>
+#include <list>
+#include <thread>
+
+namespace standin
+{
+class TicketServer;
+
+// A transfer on its way, which may be cut from outside.
+class RunningTransfer
+{
+public:
+    explicit RunningTransfer(unsigned long long session) : m_session(session) {}
+
+    unsigned long long Session() const { return m_session; }
+    void Cut() { m_cut.store(true, std::memory_order_relaxed); }
+    void Check() const;  // throws TransferError once it has been cut
+
+private:
+    unsigned long long const m_session;
+    std::atomic<bool> m_cut{false};
+};
+
+class TransferService
+{
+public:
+    explicit TransferService(TicketServer& server) : m_server(server) {}
+    ~TransferService();  // cuts what runs
+    TransferService(TransferService const&) = delete;
+    TransferService& operator=(TransferService const&) = delete;
+
+    struct Request
+    {
+        enum Direction
+        {
+            ToServer,
+            ToClient,
+        };
+        Direction direction;
+        std::string source;
+        std::string target;
+    };
+
+    // A target that ends in a separator, or is a variable alone, is a folder, and the source gives the name.
+    TransferResult Carry(Session const& session, Request const& request);
+
+    // The same later, and told to the session as TransferEnded with the strings "Transfer/Source" and
+    // "Transfer/Target" as they came, the int "Transfer/Code" and the int64 "Transfer/Size" in bytes. What is
+    // wrong with the paths themselves, and an ended session, is told at once.
+    TransferResult CarryLater(Session const& session, Request request);
+
+    // Runs a transfer of any kind in such a way that it can be cut, and answers how it ended.
+    TransferResult Run(Session const& session, std::function<void(RunningTransfer& running)> const& work);
+
+    // For an ended session: takes back what waits, cuts what runs and waits for its end.
+    void End(Session const& session);
+
+    // The same for all sessions, and for good, but waits no longer than told.
+    void Stop(std::chrono::milliseconds patience);
+
+    // How much is copied at a time, and what is called after each piece: tests hold transfers up there. Not
+    // while one runs.
+    struct Pace
+    {
+        std::size_t piece = std::size_t{1024} * 1024;
+        std::function<void()> after{};
+    };
+    void Set(Pace pace) { m_pace = std::move(pace); }
+
+    // The folder of the site: nothing is put there or fetched from there, whatever the system ticket has for
+    // $(INSTALL). To be told before the first transfer.
+    void KeepOut(std::filesystem::path const& site) { m_site = site; }
+
+    // What the transfer calls after a piece: checks for a cut, then told.
+    void Copy(PartFile& target, SourceFile const& source, RunningTransfer const& running,
+              std::function<void(off_t done)> const& told = {}) const;
+
+    static std::filesystem::path ClientPath(std::string text);  // absolute. Throws TransferError
+
+private:
+    struct Waiting
+    {
+        unsigned long long session;
+        Request asked;
+        Request request;  // with the client's path as it was meant when it was asked for
+    };
+    using Lock = std::unique_lock<std::mutex>;
+    using Place = std::list<RunningTransfer>::iterator;
+
+    off_t CarryNow(Request const& request, RunningTransfer const& running);
+    TransferResult Finish(Place running, std::function<void(RunningTransfer& running)> const& work);
+    bool Runs(unsigned long long session) const;
+    void Work();
+    void Tell(Waiting const& done, TransferResult result, off_t size);
+
+    TicketServer& m_server;
+    std::string m_site;
+    Pace m_pace;
+
+    std::mutex m_lock;  // the members below
+    std::list<RunningTransfer> m_running;
+    std::deque<Waiting> m_waiting;
+    std::condition_variable m_work;
+    std::condition_variable m_done;
+    bool m_stopped = false;
+    std::thread m_thread;  // begun when something first waits
+};
+}  // namespace standin
