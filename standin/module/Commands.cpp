@@ -2,9 +2,8 @@
 
 #include "comgui/session/TCommandRecord.h"
 #include "standin/module/ModuleCodes.h"
-#include "standin/server/files/SiteFiles.h"
-#include "standin/server/jobs/JobIntake.h"
-#include "standin/server/transfer/PartFile.h"
+#include "standin/module/ValueWords.h"
+#include "standin/server/files/Report.h"
 #include <algorithm>
 #include <cstring>
 
@@ -14,6 +13,25 @@ namespace
 {
 // What the client gives; argA is the ticket's id, argB the notification id, code the ticket's type.
 using ClientCallback = void (*)(void* user, int kind, int argA, int argB, int code, void* data);
+
+void Notify(ClientCallback callback, void* user, Notification const& notification)
+{
+    std::vector<SETMULTIPAR> records(notification.parameters.size() + 1);
+    std::vector<BIN_STRING> binaries(notification.parameters.size());
+    for (std::size_t i = 0; i < notification.parameters.size(); ++i)
+    {
+        ChangedParameter const& change = notification.parameters[i];
+        records[i].key = change.key->CStr();
+        records[i].type = change.value.type;
+        records[i].value = change.value.type == PARAM_NONE ? nullptr : WordOf(change.value, binaries[i]);
+        records[i].pos = change.pos;
+        records[i].ok = true;
+    }
+    bool const isTransfer = notification.kind == TransferEnded;
+    callback(user, notification.kind, isTransfer ? notification.code : notification.ticket.id,
+             notification.id, notification.ticket.type,
+             notification.parameters.empty() ? nullptr : records.data());
+}
 
 void* PointerIn(STICKET_ACCESS const& ticket, char const* key)
 {
@@ -36,13 +54,9 @@ int SetCallback(Container const& container, STICKET_ACCESS const* ticket)
     // The answer first: nobody could ever switch off what came under an id that did not arrive.
     if (!ticket->SSETPARAMETER(ticket->Instance, "iGUINotificationID", PARAM_INT, &id, -1))
         return MODULE_INVALID_ARGUMENT;
-    bool const registered =
-        service.Register(container.Session(), id,
-                         [callback, user](Notification const& notification)
-                         {
-                             callback(user, notification.kind, notification.ticket.id, notification.id,
-                                      notification.ticket.type, notification.records);
-                         });
+    bool const registered = service.Register(container.Session(), id,
+                                             [callback, user](Notification const& notification)
+                                             { Notify(callback, user, notification); });
     return registered ? MODULE_DONE : MODULE_UNKNOWN_SESSION;
 }
 

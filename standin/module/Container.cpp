@@ -18,8 +18,10 @@ int Slot(void* instance, Work const& work) noexcept
 int OnGet(void* instance, int type, int id, char const* key, PARAM_TYPE ptype, void* value, int pos)
 {
     return Slot(instance,
-                [&](Container& container) {
-                    return container.Server().Get(container.Session(), {type, id}, key, ptype, value, pos);
+                [&](Container& container)
+                {
+                    return ReadTicket(container.Server().Tickets(), container.Session(), {type, id}, 0, key,
+                                      ptype, value, pos);
                 });
 }
 
@@ -27,29 +29,32 @@ int OnGetTable(void* instance, int type, int id, GETMULTIPAR* table)
 {
     return Slot(instance,
                 [&](Container& container) {
-                    return container.Server().GetTable(container.Session(), {type, id}, table);
+                    return ReadTable(container.Server().Tickets(), container.Session(), {type, id}, 0, table);
                 });
 }
 
 int OnSet(void* instance, int type, int id, char const* key, PARAM_TYPE ptype, void const* value, int pos)
 {
     return Slot(instance,
-                [&](Container& container) {
-                    return container.Server().Set(container.Session(), {type, id}, key, ptype, value, pos);
+                [&](Container& container)
+                {
+                    return WriteTicket(container.Server().Tickets(), container.Session(), {type, id}, 0, key,
+                                       ptype, value, pos);
                 });
 }
 
 int OnSetTable(void* instance, int type, int id, SETMULTIPAR* table)
 {
-    return Slot(instance,
-                [&](Container& container) {
-                    return container.Server().SetTable(container.Session(), {type, id}, table);
-                });
+    return Slot(
+        instance,
+        [&](Container& container) {
+            return WriteTable(container.Server().Tickets(), container.Session(), {type, id}, 0, table);
+        });
 }
 
 bool Open(Container& container, TicketAddress address, void* arg)
 {
-    STICKET_ACCESS const* const access = arg ? container.Tickets().Open(address) : nullptr;
+    STICKET_ACCESS const* const access = arg ? container.Opened().Open(address) : nullptr;
     if (!access)
         return false;
     *static_cast<STICKET_ACCESS const**>(arg) = access;
@@ -60,7 +65,7 @@ bool CreateNext(Container& container, TicketAddress address, void* arg)
 {
     if (address.id != TICKET_ID_NEXT || !arg)
         return false;
-    int const id = container.Server().CreateNext(container.Session(), address.type);
+    int const id = container.Server().Tickets().CreateNext(container.Session(), address.type);
     if (id < 0)
         return false;
     container.Session().Limit({address.type, id},
@@ -71,7 +76,7 @@ bool CreateNext(Container& container, TicketAddress address, void* arg)
 
 bool SetPartial(Container& container, TicketAddress address, void* arg)
 {
-    if (container.Session().Ended() || !container.Server().Exists(address))
+    if (container.Session().Ended() || container.Server().Tickets().IncarnationOf(address) == 0)
         return false;
     container.Session().Limit(address, KeyFilter(static_cast<char const* const*>(arg)));
     return true;
@@ -97,9 +102,9 @@ int OnOperation(void* instance, int type, int id, TICKET_OP op, void* arg)
                     case MTICKET_OP_CREATE_NEXT:
                         return CreateNext(container, {type, id}, arg);
                     case MTICKET_OP_DELETE:
-                        return container.Server().Delete(container.Session(), {type, id});
+                        return container.Server().Tickets().Delete(container.Session(), {type, id});
                     case MTICKET_OP_CLOSE:  // whatever the flag says: there is one way of closing
-                        return container.Tickets().Close({type, id});
+                        return container.Opened().Close({type, id});
                     case MTICKET_OP_FOLDER_VARIABLES:
                         return HandOutFolders(container, {type, id}, arg);
                     default:
@@ -111,20 +116,20 @@ int OnOperation(void* instance, int type, int id, TICKET_OP op, void* arg)
 // Over the tickets that there are at the beginning, so that a walk that makes tickets comes to an end.
 bool Walk(Container& container, MWALKTICKETS_ACTION action, void* context, int type)
 {
-    TicketServer& server = container.Server();
+    TicketService& tickets = container.Server().Tickets();
     if (!action || container.Session().Ended() || !IsValid({type, 0}))
         return false;
     std::vector<int> ids;
-    for (int id = server.NextTicket(type, -1); id >= 0; id = server.NextTicket(type, id))
+    for (int id = tickets.NextTicket(type, -1); id >= 0; id = tickets.NextTicket(type, id))
         ids.push_back(id);
     for (int const id : ids)
     {
-        Birth const birth = server.BirthOf({type, id});
+        Incarnation const incarnation = tickets.IncarnationOf({type, id});
         if (container.Session().Ended())
             break;
-        if (birth == NoBirth)
+        if (incarnation == 0)
             continue;
-        OpenTicket ticket(server, container.Session(), container.Folders(), {type, id}, birth);
+        OpenTicket ticket(tickets, container.Session(), container.Folders(), {type, id}, incarnation);
         if (!action(context, type, id, ticket.Access()))
             break;
     }
@@ -145,6 +150,7 @@ int OnSwitch(void* instance, int type, int id, int notification, bool enable, ch
             NotificationService& service = container.Server().Notifications();
             if (!enable)
                 return service.Disable(container.Session(), notification, {type, id});
+            container.Server().Tickets().CatchUp();  // what came before is not for this subscription
             return keys && service.Enable(container.Session(), notification, {type, id}, KeyFilter(keys));
         });
 }
@@ -155,19 +161,19 @@ STICKET_ACCESS const* OnCreate(void* instance, int type, int id, char const* con
     Slot(instance,
          [&](Container& container)
          {
-             if (!container.Server().Create(container.Session(), {type, id}))
+             if (!container.Server().Tickets().Create(container.Session(), {type, id}))
                  return false;
              container.Session().Limit({type, id}, KeyFilter(keys));
-             access = container.Tickets().Open({type, id});
+             access = container.Opened().Open({type, id});
              return access != nullptr;
          });
     return access;
 }
 }  // namespace
 
-Container::Container(TicketServer& server, std::shared_ptr<standin::Session> session)
-    : m_server(server), m_session(std::move(session)), m_folders(server),
-      m_tickets(server, *m_session, m_folders)
+Container::Container(standin::Server& server, std::shared_ptr<standin::Session> session)
+    : m_server(server), m_session(std::move(session)), m_folders(server.Tickets()),
+      m_opened(server.Tickets(), *m_session, m_folders)
 {
     m_access.Instance = this;
     m_access.MGETPARAMETER = OnGet;

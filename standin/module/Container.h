@@ -5,28 +5,28 @@
 
 #include "comgui/ticket/MTICKET_ACCESS.h"
 #include "standin/module/OpenTickets.h"
-#include "standin/server/site/TicketServer.h"
+#include "standin/server/site/Server.h"
 
 namespace standin
 {
 class Container
 {
 public:
-    Container(TicketServer& server, std::shared_ptr<Session> session);
+    Container(standin::Server& server, std::shared_ptr<Session> session);
     Container(Container const&) = delete;
     Container& operator=(Container const&) = delete;
 
     MTICKET_ACCESS const* Access() const { return &m_access; }
-    TicketServer& Server() const { return m_server; }
+    standin::Server& Server() const { return m_server; }
     standin::Session& Session() const { return *m_session; }
     FolderTranslator& Folders() { return m_folders; }
-    OpenTickets& Tickets() { return m_tickets; }
+    OpenTickets& Opened() { return m_opened; }
 
 private:
-    TicketServer& m_server;
+    standin::Server& m_server;
     std::shared_ptr<standin::Session> const m_session;
     FolderTranslator m_folders;
-    OpenTickets m_tickets;
+    OpenTickets m_opened;
     MTICKET_ACCESS m_access{};
 };
 }  // namespace standin

@@ -53,14 +53,15 @@ bool IsThisHost(char const* host)
 }
 
 // The server behind host and port, or a code that says why there is none.
-int FindServer(char const* host, int port, TicketServer*& server)
+int FindServer(char const* host, int port, OpenSite*& site)
 {
     if (!IsThisHost(host))
         return MODULE_NO_SERVER_THERE;
-    server = ServerOfThisSite();
-    if (!server)
+    site = SiteOfThisProcess();
+    if (!site)
         return MODULE_SITE_UNAVAILABLE;
-    return server->Int(SystemTicket, "System/MasterSOAPPort") == port ? MODULE_DONE : MODULE_NO_SERVER_THERE;
+    return site->server.Tickets().Int(SystemTicket, "System/MasterSOAPPort") == port ? MODULE_DONE
+                                                                                     : MODULE_NO_SERVER_THERE;
 }
 
 int Open(void** hInstance)
@@ -82,7 +83,7 @@ int Initialize(void* hInstance, TLogin* login, int)
                  {
                      if (!IsValid(login))
                          return MODULE_INVALID_ARGUMENT;
-                     if (!ServerOfThisSite())
+                     if (!SiteOfThisProcess())
                          return MODULE_SITE_UNAVAILABLE;
                      Handles::Get().Initialize(hInstance, login);
                      return MODULE_DONE;
@@ -103,8 +104,8 @@ int IsAlive(void* hInstance, char const* host, int port)
     return Entry(hInstance,
                  [&]() -> int
                  {
-                     TicketServer* server = nullptr;
-                     return host ? FindServer(host, port, server) : MODULE_INVALID_ARGUMENT;
+                     OpenSite* site = nullptr;
+                     return host ? FindServer(host, port, site) : MODULE_INVALID_ARGUMENT;
                  });
 }
 
@@ -120,20 +121,20 @@ void FillIn(TLogin& login, User const& user, void* hSession)
 
 int LogIn(TLogin& login)
 {
-    TicketServer* server = nullptr;
-    int const found = FindServer(TextOf(login.szServerHost).c_str(), login.iServerPort, server);
+    OpenSite* site = nullptr;
+    int const found = FindServer(TextOf(login.szServerHost).c_str(), login.iServerPort, site);
     if (found != MODULE_DONE)
         return found;
     try
     {
-        auto const session = server->Login(TextOf(login.szUser), TextOf(login.szPassword));
+        auto const session = site->server.Login(TextOf(login.szUser), TextOf(login.szPassword));
         if (!session)
             return MODULE_LOGIN_REFUSED;
-        FillIn(login, session->Who(), Handles::Get().NewSession(*server, session));
+        FillIn(login, session->Who(), Handles::Get().NewSession(*site, session));
         session->SetEndPoint(login.szLocalEndPoint);
         return MODULE_DONE;
     }
-    catch (StorageError const& error)
+    catch (StoreError const& error)
     {
         std::fprintf(stderr, "%s\n", error.what());
         return MODULE_SITE_UNAVAILABLE;

@@ -1,22 +1,67 @@
 #include "standin/module/FolderTranslator.h"
 
 #include "comgui/folders/FolderVariables.h"
-#include "standin/module/Guard.h"
-#include "standin/server/tickets/FolderTable.h"
+#include "comgui/ticket/MTICKET_ACCESS.h"
+#include "comgui/ticket/TICKET_OP.h"
+#include "standin/module/LocalTicket.h"
+#include "standin/module/ValueWords.h"
 #include <new>
 
 namespace standin
 {
-namespace
+// The library's translator, with the folders of one version of the system ticket. The library loads from a
+// container; this one has a single ticket, 0/0, with nothing in it but the folders: all of them, whatever the
+// session limits itself to, and of one moment.
+class FolderTranslator::Loaded
 {
-constexpr unsigned long long Never = ~0ULL;
-}
+public:
+    explicit Loaded(TicketService& tickets)
+    {
+        tickets.LookAt(SystemTicket, 0,
+                       [this](TicketSnapshot const& ticket)
+                       {
+                           m_revision = ticket.Which().revision;
+                           Take(ticket, UseFolderVariablesKey);
+                           for (FolderRow const row : FolderRows)
+                               Take(ticket, row.key);
+                           return true;
+                       });
+        m_container.Instance = this;
+        m_container.MOPERATION = OnOperation;  // to load takes no other slot
+        m_translator.reset(CreateFolderVariables(&m_container));
+    }
+    Loaded(Loaded const&) = delete;
+    Loaded& operator=(Loaded const&) = delete;
 
-FolderTranslator::FolderTranslator(TicketServer& server) : m_server(server), m_loadedAt(Never)
-{
-    m_access.Instance = this;
-    m_access.MOPERATION = OnOperation;  // to load takes no other slot
-}
+    Sequence Revision() const { return m_revision; }
+    clFOLDER_VARIABLES& Translator() const { return *m_translator; }
+
+private:
+    void Take(TicketSnapshot const& system, char const* key)
+    {
+        KeyValues const* const values = system.Find(std::string_view(key));
+        TicketElement const* const element = values ? values->At(0) : nullptr;
+        BIN_STRING binary;
+        STICKET_ACCESS const& copy = *m_folders.Access();
+        if (element && !copy.SSETPARAMETER(copy.Instance, key, element->type, WordOf(*element, binary), -1))
+            throw std::bad_alloc();  // it refuses nothing that a ticket holds
+    }
+
+    static int OnOperation(void* instance, int type, int id, TICKET_OP op, void* arg)
+    {
+        if (TicketAddress{type, id} != SystemTicket || op.GetInt() != MTICKET_OP_OPEN)
+            return 0;
+        *static_cast<STICKET_ACCESS const**>(arg) = static_cast<Loaded const*>(instance)->m_folders.Access();
+        return 1;
+    }
+
+    Sequence m_revision = 0;
+    LocalTicket m_folders;
+    MTICKET_ACCESS m_container{};
+    std::unique_ptr<clFOLDER_VARIABLES> m_translator;
+};
+
+FolderTranslator::FolderTranslator(TicketService& tickets) : m_tickets(tickets) {}
 
 FolderTranslator::~FolderTranslator() = default;
 
@@ -28,99 +73,61 @@ bool FolderTranslator::HandOut(void* out)
     return true;
 }
 
-bool FolderTranslator::IsEnabled() const { return UpToDate().IsEnabled(); }
+std::shared_ptr<FolderTranslator::Loaded> FolderTranslator::UpToDate() const
+{
+    Sequence const revision = m_tickets.SystemTicketRevision();
+    {
+        std::lock_guard const lock(m_lock);
+        if (m_loaded && m_loaded->Revision() >= revision)
+            return m_loaded;
+    }
+    auto const loaded = std::make_shared<Loaded>(m_tickets);
+    std::lock_guard const lock(m_lock);
+    if (!m_loaded || m_loaded->Revision() < loaded->Revision())
+        m_loaded = loaded;
+    return m_loaded;
+}
 
 void FolderTranslator::Load()
 {
-    std::lock_guard const lock(m_reload);
-    Reload();
+    {
+        std::lock_guard const lock(m_lock);
+        m_loaded.reset();
+    }
+    UpToDate();
 }
 
-std::string FolderTranslator::Encode(std::string const& path) const { return UpToDate().Encode(path); }
+bool FolderTranslator::IsEnabled() const { return UpToDate()->Translator().IsEnabled(); }
+
+std::string FolderTranslator::Encode(std::string const& path) const
+{
+    return UpToDate()->Translator().Encode(path);
+}
 
 std::string FolderTranslator::Encode(char const* key, std::string relative) const
 {
-    return UpToDate().Encode(key, std::move(relative));
+    return UpToDate()->Translator().Encode(key, std::move(relative));
 }
 
 std::string FolderTranslator::EncodeV(char const* variable, std::string relative) const
 {
-    return UpToDate().EncodeV(variable, std::move(relative));
+    return UpToDate()->Translator().EncodeV(variable, std::move(relative));
 }
 
 std::string FolderTranslator::Decode(std::string const& path, bool backslashes) const
 {
-    return UpToDate().Decode(path, backslashes);
+    return UpToDate()->Translator().Decode(path, backslashes);
 }
 
 void FolderTranslator::SetFolderVariable(char const* variable, char const* folder)
 {
-    UpToDate().SetFolderVariable(variable, folder);
+    UpToDate()->Translator().SetFolderVariable(variable, folder);
 }
 
 clSETMULTIPAR_FOLDER_VARIABLES*
 FolderTranslator::New_clSETMULTIPAR_FOLDER_VARIABLES(clFOLDER_VARIABLES* folders, SETMULTIPAR* table,
                                                      bool encode)
 {
-    return UpToDate().New_clSETMULTIPAR_FOLDER_VARIABLES(folders, table, encode);
-}
-
-clFOLDER_VARIABLES& FolderTranslator::UpToDate() const
-{
-    if (m_loadedAt.load(std::memory_order_acquire) != m_server.SystemTicketChanges())
-    {
-        std::lock_guard const lock(m_reload);
-        if (m_loadedAt.load(std::memory_order_relaxed) != m_server.SystemTicketChanges())
-            Reload();
-    }
-    return *m_translator;
-}
-
-void FolderTranslator::Reload() const
-{
-    // Counted before anything is read: a change that comes meanwhile is one more reason to load.
-    unsigned long long const changes = m_server.SystemTicketChanges();
-    m_loadedAt.store(Never, std::memory_order_relaxed);  // what ends halfway is begun again
-    m_copy.reset();
-    if (m_translator)
-        m_translator->Load();
-    else
-        m_translator.reset(CreateFolderVariables(&m_access));
-    if (m_copy)  // else nothing is known
-        m_loadedAt.store(changes, std::memory_order_release);
-}
-
-// Called while m_translator loads.
-int FolderTranslator::OnOperation(void* instance, int type, int id, TICKET_OP op, void* arg)
-{
-    if (TicketAddress{type, id} != SystemTicket || op.GetInt() != MTICKET_OP_OPEN)
-        return 0;
-    return Guarded<int>(0,
-                        [&]
-                        {
-                            auto const& self = *static_cast<FolderTranslator const*>(instance);
-                            self.m_copy = self.CopyOfTheFolders();
-                            *static_cast<STICKET_ACCESS const**>(arg) = self.m_copy->Access();
-                            return 1;
-                        });
-}
-
-std::unique_ptr<LocalTicket> FolderTranslator::CopyOfTheFolders() const
-{
-    auto copy = std::make_unique<LocalTicket>();
-    STICKET_ACCESS const& ticket = *copy->Access();
-    Session const nobody(0, User());  // with no limit to what it sees
-    m_server.Visit(nobody, SystemTicket,
-                   [&](std::string_view key, int pos, StoredValue const& stored)
-                   {
-                       if (!FolderSettings::Concern(key, pos))
-                           return;
-                       TicketValue const value = TicketValue::FromStored(stored);
-                       BIN_STRING binary;
-                       if (!ticket.SSETPARAMETER(ticket.Instance, std::string(key).c_str(), value.type,
-                                                 value.Word(binary), pos))
-                           throw std::bad_alloc();  // it refuses nothing that a ticket holds
-                   });
-    return copy;
+    return UpToDate()->Translator().New_clSETMULTIPAR_FOLDER_VARIABLES(folders, table, encode);
 }
 }  // namespace standin

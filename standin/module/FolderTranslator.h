@@ -4,17 +4,15 @@
 #pragma once
 
 #include "comgui/folders/clFOLDER_VARIABLES.h"
-#include "comgui/ticket/MTICKET_ACCESS.h"
-#include "standin/module/LocalTicket.h"
-#include "standin/server/site/TicketServer.h"
+#include "standin/server/sessions/TicketService.h"
 
 namespace standin
 {
 class FolderTranslator : public clFOLDER_VARIABLES
 {
 public:
-    // The server outlives it. Nothing is read before the first operation.
-    explicit FolderTranslator(TicketServer& server);
+    // The service outlives it. Nothing is read before the first operation.
+    explicit FolderTranslator(TicketService& tickets);
     ~FolderTranslator() override;
 
     // Puts its address to where a clFOLDER_VARIABLES* is wanted; false for null.
@@ -31,21 +29,11 @@ public:
     New_clSETMULTIPAR_FOLDER_VARIABLES(clFOLDER_VARIABLES* folders, SETMULTIPAR* table, bool encode) override;
 
 private:
-    clFOLDER_VARIABLES& UpToDate() const;  // the library's translator
-    void Reload() const;                   // with m_reload locked
+    class Loaded;
+    std::shared_ptr<Loaded> UpToDate() const;
 
-    // What the library's translator loads from is no client's view of the system ticket but a copy of what it
-    // says of folders: of one moment, all of them whatever the session limits itself to, and not counted
-    // among its open tickets. And no text of it goes away if the session ends meanwhile.
-    static int OnOperation(void* instance, int type, int id, TICKET_OP op, void* arg);
-    std::unique_ptr<LocalTicket> CopyOfTheFolders() const;
-
-    TicketServer& m_server;
-    MTICKET_ACCESS m_access{};
-
-    mutable std::mutex m_reload;
-    mutable std::unique_ptr<LocalTicket> m_copy;  // of the last load; null if it could not be made
-    mutable std::unique_ptr<clFOLDER_VARIABLES> m_translator;
-    mutable std::atomic<unsigned long long> m_loadedAt;  // after so many changes of the system ticket
+    TicketService& m_tickets;
+    mutable std::mutex m_lock;
+    mutable std::shared_ptr<Loaded> m_loaded;  // null before the first operation, and for Load
 };
 }  // namespace standin

@@ -1,7 +1,8 @@
 #include "standin/module/LocalTicket.h"
 
 #include "comgui/ticket/TICKET_OP.h"
-#include "standin/server/store/Storage.h"
+#include "standin/module/ValueWords.h"
+#include "standin/server/files/FileError.h"
 #include <algorithm>
 #include <utility>
 
@@ -15,7 +16,7 @@ TicketXml ContentOf(std::filesystem::path const& file)
     std::error_code error;
     auto const status = std::filesystem::status(file, error);
     if (exists(status) && !is_regular_file(status))
-        throw StorageError(file.string() + ": cannot be read: no regular file; correct the path");
+        throw FileError(file.string() + ": cannot be read: no regular file; correct the path");
     return TicketXml::Read(file);
 }
 }  // namespace
@@ -43,23 +44,65 @@ void LocalTicket::Save() const
 
 bool LocalTicket::Get(char const* key, PARAM_TYPE type, void* value, int pos)
 {
-    return m_ticket.Get(key, type, value, pos);
+    KeyValues const* const values = key ? m_ticket.Now().Find(std::string_view(key)) : nullptr;
+    return values && ReadValue(*values, type, value, pos);
 }
 
-bool LocalTicket::GetTable(GETMULTIPAR* table) { return m_ticket.GetTable(table); }
+bool LocalTicket::GetTable(GETMULTIPAR* table)
+{
+    if (!table)
+        return false;
+    for (GETMULTIPAR* record = table; record->key; ++record)
+        record->ok = Get(record->key, record->type, record->value, record->pos);
+    return true;
+}
 
 bool LocalTicket::Set(char const* key, PARAM_TYPE type, void const* value, int pos)
 {
-    return m_ticket.Set(key, type, value, pos);
+    SETMULTIPAR table[2] = {};
+    table[0].key = key;
+    table[0].type = type;
+    table[0].value = value;
+    table[0].pos = pos;
+    return SetTable(table) && table[0].ok;  // a null key ends the table: ok stays false
 }
 
-bool LocalTicket::SetTable(SETMULTIPAR* table) { return m_ticket.SetTable(table); }
+bool LocalTicket::SetTable(SETMULTIPAR* table)
+{
+    if (!table)
+        return false;
+    auto writes = WritesOf(table);
+    m_ticket.Write(writes);
+    Answer(writes, table);
+    return true;
+}
 
-// The limit goes by: whatever it was meant to bound, a walk that left out values would lose them for good
-// where a ticket is copied by walking over it.
+// The keys of the beginning, and the values behind each that it has when its turn comes, since the action may
+// write. The limit goes by: whatever it was meant to bound, a walk that left out values would lose them for
+// good where a ticket is copied by walking over it.
 bool LocalTicket::Walk(SWALKPARAMETERS_ACTION action, void* context, char const* prefix, int)
 {
-    return m_ticket.Walk(action, context, prefix);
+    if (!action)
+        return false;
+    std::vector<Key> keys;
+    for (KeyValues const* const values : m_ticket.Now().Sorted(prefix ? prefix : ""))
+        keys.push_back(values->Name());
+    for (Key const key : keys)
+        for (int pos = 0;;)
+        {
+            KeyValues const* const values = m_ticket.Now().Find(key);
+            TicketElement const* const found = values ? values->From(pos) : nullptr;
+            if (!found)
+                break;
+            TicketElement const element = *found;  // the action may write to the key
+            pos = element.pos + 1;
+            BIN_STRING binary;
+            bool const isNumber = SizeOfNumber(element.type) && element.type != PARAM_POINTER;
+            void const* const word = isNumber ? m_numbers.AddressOf(element.word) : WordOf(element, binary);
+            if (!action(context, key->CStr(), element.type, word, element.pos))
+                return true;
+        }
+    return true;
 }
 
 bool LocalTicket::Option(int code, void* out)

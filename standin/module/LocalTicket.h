@@ -3,6 +3,7 @@
 #pragma once
 
 #include "standin/module/TicketTable.h"
+#include "standin/module/WalkedNumbers.h"
 #include "standin/server/tickets/OwnedTicket.h"
 #include <filesystem>
 
@@ -13,7 +14,7 @@ class LocalTicket : private TicketSubject
 public:
     LocalTicket() = default;  // in memory
 
-    // Throws XmlError and StorageError. A file that is not there is told by FileToOpen, and not here.
+    // Throws XmlError and FileError. A file that is not there is told by FileToOpen, and not here.
     explicit LocalTicket(std::filesystem::path file);
 
     // The file that a client means by a path: absolute, so that the ticket is saved to where it came from
@@ -21,7 +22,7 @@ public:
     // written for other systems send. Nothing if no such file is there.
     static std::optional<std::filesystem::path> FileToOpen(std::string path);
 
-    // Puts the changes into the file, if there are any and if there is a file; throws StorageError, with the
+    // Puts the changes into the file, if there are any and if there is a file; throws FileError, with the
     // old file as it was.
     void Save() const;
 
@@ -37,6 +38,7 @@ private:
 
     std::filesystem::path const m_file;  // empty in memory
     OwnedTicket m_ticket;
+    WalkedNumbers m_numbers;
     TicketTable const m_table{*this};
 };
 }  // namespace standin

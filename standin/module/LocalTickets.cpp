@@ -1,6 +1,6 @@
 #include "standin/module/LocalTickets.h"
 
-#include "standin/server/store/Storage.h"
+#include "standin/server/files/FileError.h"
 #include <cstdio>
 
 namespace standin
@@ -34,7 +34,7 @@ STICKET_ACCESS const* LocalTickets::Create(char const* path)
     {
         std::fprintf(stderr, "%s; correct the file, or put a sound copy in its place\n", error.what());
     }
-    catch (StorageError const& error)
+    catch (FileError const& error)
     {
         std::fprintf(stderr, "%s\n", error.what());
     }
@@ -62,7 +62,7 @@ void LocalTickets::Destroy(STICKET_ACCESS const** ticket)
     {
         node.mapped()->Save();
     }
-    catch (StorageError const& error)
+    catch (FileError const& error)
     {
         std::fprintf(stderr, "%s\n", error.what());
     }

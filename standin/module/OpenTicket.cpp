@@ -1,28 +1,83 @@
 #include "standin/module/OpenTicket.h"
 
 #include "comgui/ticket/TICKET_OP.h"
-#include <bit>
+#include "standin/module/ValueWords.h"
 
 namespace standin
 {
+bool ReadTicket(TicketService& tickets, Session const& session, TicketAddress address,
+                Incarnation incarnation, char const* key, PARAM_TYPE type, void* value, int pos)
+{
+    return key &&
+           tickets.LookAtKey(session, address, incarnation, key,
+                             [&](KeyValues const& values) { return ReadValue(values, type, value, pos); });
+}
+
+// All of it from the ticket of one moment.
+bool ReadTable(TicketService& tickets, Session const& session, TicketAddress address, Incarnation incarnation,
+               GETMULTIPAR* table)
+{
+    if (!table)
+        return false;
+    auto const answer = [&](TicketSnapshot const& ticket, KeyFilter const* limit)
+    {
+        for (GETMULTIPAR* record = table; record->key; ++record)
+        {
+            std::string_view const key = record->key;
+            KeyValues const* const values = !limit || limit->Selects(key) ? ticket.Find(key) : nullptr;
+            record->ok = values && ReadValue(*values, record->type, record->value, record->pos);
+        }
+        return true;
+    };
+    if (!tickets.Look(session, address, incarnation, answer))
+        for (GETMULTIPAR* record = table; record->key; ++record)
+            record->ok = false;
+    return !session.Ended();
+}
+
+bool WriteTicket(TicketService& tickets, Session const& session, TicketAddress address,
+                 Incarnation incarnation, char const* key, PARAM_TYPE type, void const* value, int pos)
+{
+    SETMULTIPAR record{};
+    record.key = key;
+    record.type = type;
+    record.value = value;
+    record.pos = pos;
+    if (!key)
+        return false;
+    TicketWrite write = WriteOf(record);
+    return tickets.Write(session, address, incarnation, {&write, 1}) && write.ok;
+}
+
+bool WriteTable(TicketService& tickets, Session const& session, TicketAddress address,
+                Incarnation incarnation, SETMULTIPAR* table)
+{
+    if (!table)
+        return false;
+    auto writes = WritesOf(table);
+    bool const isDone = tickets.Write(session, address, incarnation, writes);
+    Answer(writes, table);
+    return isDone;
+}
+
 bool OpenTicket::Get(char const* key, PARAM_TYPE type, void* value, int pos)
 {
-    return m_server.Get(m_session, m_address, key, type, value, pos, Which());
+    return ReadTicket(m_tickets, m_session, m_address, Which(), key, type, value, pos);
 }
 
 bool OpenTicket::GetTable(GETMULTIPAR* table)
 {
-    return m_server.GetTable(m_session, m_address, table, Which());
+    return ReadTable(m_tickets, m_session, m_address, Which(), table);
 }
 
 bool OpenTicket::Set(char const* key, PARAM_TYPE type, void const* value, int pos)
 {
-    return m_server.Set(m_session, m_address, key, type, value, pos, Which());
+    return WriteTicket(m_tickets, m_session, m_address, Which(), key, type, value, pos);
 }
 
 bool OpenTicket::SetTable(SETMULTIPAR* table)
 {
-    return m_server.SetTable(m_session, m_address, table, Which());
+    return WriteTable(m_tickets, m_session, m_address, Which(), table);
 }
 
 // Over the ticket as it is at the beginning, with nothing locked while the action runs. The limit goes by: a
@@ -31,38 +86,26 @@ bool OpenTicket::Walk(SWALKPARAMETERS_ACTION action, void* context, char const* 
 {
     if (!action)
         return false;
-    auto const values = m_server.Values(m_session, m_address, prefix ? prefix : "", Which());
+    auto const values = m_tickets.Values(m_session, m_address, Which(), prefix ? prefix : "");
     if (!values)
         return false;
     for (WalkedValue const& value : *values)
     {
         BIN_STRING binary;
+        bool const isNumber = SizeOfNumber(value.element.type) && value.element.type != PARAM_POINTER;
+        void const* const word =
+            isNumber ? m_numbers.AddressOf(value.element.word) : WordOf(value.element, binary);
         // The action may have ended the session, and the texts with it.
         if (m_session.Ended() ||
-            !action(context, value.key->c_str(), value.type, WordOf(value, binary), value.pos))
+            !action(context, value.key->CStr(), value.element.type, word, value.element.pos))
             break;
     }
     return true;
 }
 
-void const* OpenTicket::WordOf(WalkedValue const& value, BIN_STRING& binary)
-{
-    if (value.type == PARAM_POINTER)
-        return std::bit_cast<void const*>(value.word);
-    if (value.type == PARAM_STRING)
-        return value.text->bytes.c_str();
-    if (value.type == PARAM_BINSTRING)
-    {
-        binary = {value.text->bytes.data(), value.text->bytes.size()};
-        return &binary;
-    }
-    std::lock_guard const lock(m_lock);
-    return &*m_numbers.insert(value.word).first;  // little-endian: a short number's bytes come first
-}
-
 bool OpenTicket::Option(int code, void* out)
 {
-    bool const isThere = !m_session.Ended() && m_server.BirthOf(m_address) == Which() && Which() != NoBirth;
+    bool const isThere = !m_session.Ended() && m_tickets.IncarnationOf(m_address) == Which();
     if (!isThere)
         return false;
     if (code == STICKET_OP_FOLDER_VARIABLES)

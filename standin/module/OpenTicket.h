@@ -5,26 +5,39 @@
 
 #include "standin/module/FolderTranslator.h"
 #include "standin/module/TicketTable.h"
-#include "standin/server/site/TicketServer.h"
-#include <unordered_set>
+#include "standin/module/WalkedNumbers.h"
+#include "standin/server/sessions/TicketService.h"
 
 namespace standin
 {
+inline constexpr Incarnation NoTicket = ~Incarnation{0};  // the incarnation of none
+
+// The slots of a ticket, as a session sees it; incarnation 0: whichever has the address.
+bool ReadTicket(TicketService& tickets, Session const& session, TicketAddress address,
+                Incarnation incarnation, char const* key, PARAM_TYPE type, void* value, int pos);
+bool ReadTable(TicketService& tickets, Session const& session, TicketAddress address, Incarnation incarnation,
+               GETMULTIPAR* table);
+bool WriteTicket(TicketService& tickets, Session const& session, TicketAddress address,
+                 Incarnation incarnation, char const* key, PARAM_TYPE type, void const* value, int pos);
+bool WriteTable(TicketService& tickets, Session const& session, TicketAddress address,
+                Incarnation incarnation, SETMULTIPAR* table);
+
 class OpenTicket : private TicketSubject
 {
 public:
-    // Server, session and the session's translator outlive it.
-    OpenTicket(TicketServer& server, Session const& session, FolderTranslator& folders, TicketAddress address,
-               Birth birth)
-        : m_server(server), m_session(session), m_folders(folders), m_address(address), m_birth(birth)
+    // The services, the session and its translator outlive it.
+    OpenTicket(TicketService& tickets, Session const& session, FolderTranslator& folders,
+               TicketAddress address, Incarnation incarnation)
+        : m_tickets(tickets), m_session(session), m_folders(folders), m_address(address),
+          m_incarnation(incarnation)
     {
     }
 
     STICKET_ACCESS const* Access() const { return m_table.Access(); }
 
-    // Which of the tickets that have or had the address it stands for; NoBirth: for none.
-    Birth Which() const { return m_birth.load(std::memory_order_acquire); }
-    void StandFor(Birth birth) { m_birth.store(birth, std::memory_order_release); }
+    // Which of the tickets that have or had the address it stands for; NoTicket: for none.
+    Incarnation Which() const { return m_incarnation.load(std::memory_order_acquire); }
+    void StandFor(Incarnation incarnation) { m_incarnation.store(incarnation, std::memory_order_release); }
 
 private:
     bool Get(char const* key, PARAM_TYPE type, void* value, int pos) override;
@@ -34,19 +47,12 @@ private:
     bool Walk(SWALKPARAMETERS_ACTION action, void* context, char const* prefix, int limit) override;
     bool Option(int code, void* out) override;
 
-    void const* WordOf(WalkedValue const& value, BIN_STRING& binary);
-
-    TicketServer& m_server;
+    TicketService& m_tickets;
     Session const& m_session;
     FolderTranslator& m_folders;
     TicketAddress const m_address;
-    std::atomic<Birth> m_birth;
-
-    // Numbers that walks handed out. They stay where they are, each once, as the texts do: a client may
-    // gather a ticket by its values' addresses.
-    std::mutex m_lock;
-    std::unordered_set<unsigned long long> m_numbers;
-
+    std::atomic<Incarnation> m_incarnation;
+    WalkedNumbers m_numbers;
     TicketTable const m_table{*this};
 };
 }  // namespace standin

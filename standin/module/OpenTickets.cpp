@@ -4,20 +4,20 @@ namespace standin
 {
 STICKET_ACCESS const* OpenTickets::Open(TicketAddress address)
 {
-    Birth const birth = m_server.BirthOf(address);
-    if (birth == NoBirth || m_session.Ended())
+    Incarnation const incarnation = m_tickets.IncarnationOf(address);
+    if (incarnation == 0 || m_session.Ended())
         return nullptr;
     std::lock_guard const lock(m_lock);
     Entry& entry = m_open[address];
-    bool const isAnother = entry.ticket && entry.openings && entry.ticket->Which() != birth;
+    bool const isAnother = entry.ticket && entry.openings && entry.ticket->Which() != incarnation;
     if (isAnother)
     {
         m_outlived.push_back(std::move(entry.ticket));
         entry.openings = 0;
     }
     if (!entry.ticket)
-        entry.ticket = std::make_unique<OpenTicket>(m_server, m_session, m_folders, address, birth);
-    entry.ticket->StandFor(birth);
+        entry.ticket = std::make_unique<OpenTicket>(m_tickets, m_session, m_folders, address, incarnation);
+    entry.ticket->StandFor(incarnation);
     ++entry.openings;
     return entry.ticket->Access();
 }
@@ -29,7 +29,7 @@ bool OpenTickets::Close(TicketAddress address)
     if (m_session.Ended() || entry == m_open.end() || !entry->second.openings)
         return false;
     if (--entry->second.openings == 0)
-        entry->second.ticket->StandFor(NoBirth);
+        entry->second.ticket->StandFor(NoTicket);
     return true;
 }
 }  // namespace standin

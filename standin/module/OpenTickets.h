@@ -11,8 +11,8 @@ namespace standin
 class OpenTickets
 {
 public:
-    OpenTickets(TicketServer& server, Session const& session, FolderTranslator& folders)
-        : m_server(server), m_session(session), m_folders(folders)
+    OpenTickets(TicketService& tickets, Session const& session, FolderTranslator& folders)
+        : m_tickets(tickets), m_session(session), m_folders(folders)
     {
     }
 
@@ -29,7 +29,7 @@ private:
         unsigned openings = 0;
     };
 
-    TicketServer& m_server;
+    TicketService& m_tickets;
     Session const& m_session;
     FolderTranslator& m_folders;
     std::mutex m_lock;

@@ -1,23 +1,16 @@
 #include "standin/module/SiteServer.h"
 
 #include "standin/module/Guard.h"
-#include "standin/server/site/Site.h"
-#include "standin/server/transfer/TransferService.h"
+#include "standin/server/files/FileError.h"
+#include "standin/server/files/Report.h"
 #include <dlfcn.h>
-#include <filesystem>
 #include <map>
 
 namespace standin
 {
 namespace
 {
-struct OpenSite
-{
-    explicit OpenSite(std::filesystem::path const& folder);
-
-    Site site;
-    TicketServer server;
-};
+constexpr std::chrono::seconds PatienceAtTheEnd(1);
 
 // The seed that the bundle brings, found from where the bundle's executable lies.
 std::filesystem::path ShippedSeed()
@@ -29,32 +22,26 @@ std::filesystem::path ShippedSeed()
     return executable.parent_path().parent_path() / "Resources" / "seed.xml";
 }
 
-OpenSite::OpenSite(std::filesystem::path const& folder)
-    : site(Site::Open(folder, ShippedSeed())), server(site.storage(), [this] { site.MirrorSystemTicket(); })
-{
-    server.Transfers().KeepOut(site.folder());
-}
-
 using Sites = std::map<std::filesystem::path, std::unique_ptr<OpenSite>>;
 
 // At the end of the process the clients' callbacks go before this module does; no thread of ours may call
 // them then. A callback that hangs holds up the end for a moment only. Transfers are cut, so that they take
-// their beginnings of files away.
+// their beginnings of files away. The site is left in order, for the programs that stay and the next to come.
 struct EndOfWork
 {
     Sites const& sites;
 
     ~EndOfWork()
     {
-        for (auto const& [folder, site] : sites)
+        for (auto const& [folder, open] : sites)
         {
-            site->server.Transfers().Stop(std::chrono::seconds(1));
-            site->server.Notifications().Stop(std::chrono::seconds(1));
+            open->server.Stop(PatienceAtTheEnd);
+            open->site.Leave();
         }
     }
 };
 
-TicketServer& ServerOf(std::filesystem::path const& folder)
+OpenSite& Opened(std::filesystem::path const& folder)
 {
     // Never destroyed: containers may be used while the process comes to its end.
     static auto& lock = *new std::mutex;
@@ -63,25 +50,35 @@ TicketServer& ServerOf(std::filesystem::path const& folder)
     std::lock_guard const guard(lock);
     auto const known = sites.find(folder);
     if (known != sites.end())
-        return known->second->server;
-    return sites.emplace(folder, std::make_unique<OpenSite>(folder)).first->second->server;
+        return *known->second;
+    return *sites.emplace(folder, std::make_unique<OpenSite>(folder)).first->second;
 }
 }  // namespace
 
-TicketServer* ServerOfThisSite() noexcept
+OpenSite::OpenSite(std::filesystem::path const& folder)
+    : site(folder, ShippedSeed()), server(site.store(), texts, site.folder())
 {
-    return Guarded<TicketServer*>(nullptr,
-                                  []() -> TicketServer*
+    site.PutInOrder(server);
+}
+
+OpenSite* SiteOfThisProcess() noexcept
+{
+    return Guarded<OpenSite*>(nullptr,
+                              []() -> OpenSite*
+                              {
+                                  try
                                   {
-                                      try
-                                      {
-                                          return &ServerOf(Site::Folder());
-                                      }
-                                      catch (StorageError const& error)
-                                      {
-                                          std::fprintf(stderr, "%s\n", error.what());
-                                          return nullptr;
-                                      }
-                                  });
+                                      return &Opened(Site::Folder());
+                                  }
+                                  catch (StoreError const& error)
+                                  {
+                                      Report(error.what());
+                                  }
+                                  catch (FileError const& error)
+                                  {
+                                      Report(error.what());
+                                  }
+                                  return nullptr;
+                              });
 }
 }  // namespace standin

@@ -13,14 +13,16 @@ int CopyTicketData(Container const& container, TicketAddress address, int format
         return MODULE_INVALID_ARGUMENT;
     if (format != TicketDataXml)
         return MODULE_UNKNOWN_FORMAT;
-    TicketXml xml;
-    xml.address = address;
-    bool const exists = container.Server().Visit(
-        container.Session(), address,
-        [&xml](std::string_view key, int pos, StoredValue const& value) { xml.Put(key, pos, value); });
+    std::string text;
+    bool const exists =
+        container.Server().Tickets().Look(container.Session(), address, 0,
+                                          [&](TicketSnapshot const& ticket, KeyFilter const* limit)
+                                          {
+                                              text = TicketXml::Of(address, ticket, limit).Text();
+                                              return true;
+                                          });
     if (!exists)
         return MODULE_UNKNOWN_TICKET;
-    std::string const text = xml.Text();
     if (text.size() > static_cast<std::size_t>(std::numeric_limits<int>::max()))
         return MODULE_FAILED;  // the size has no room in an int
     int const room = buffer ? *size : 0;

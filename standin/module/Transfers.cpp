@@ -1,9 +1,7 @@
 #include "standin/module/Transfers.h"
 
 #include "standin/module/ModuleCodes.h"
-#include "standin/server/files/SiteFiles.h"
-#include "standin/server/jobs/JobIntake.h"
-#include "standin/server/transfer/TransferService.h"
+#include "standin/server/files/Report.h"
 #include <cstring>
 
 namespace standin

@@ -82,21 +82,6 @@ TEST_F(SiteOfAHost, TableWriteThatWasKilled_IsThereWholeOrNotAtAll)
         ASSERT_EQ(ReadInt(("Test/Table/" + std::to_string(i)).c_str()), round);
 }
 
-TEST_F(SiteOfAHost, SecondProcess_IsToldWhoHasTheSite)
-{
-    ChildProcess child(
-        [](auto const& tell)
-        {
-            tell(LogIn());
-            pause();
-        });
-    ASSERT_EQ(child.Next(), 0);
-    EXPECT_THAT(LineOfFailedIsAlive(),
-                testing::AllOf(HasSubstr(std::to_string(child.Id())), HasSubstr("integration")));
-    child.Kill();
-    EXPECT_EQ(LogIn(), 0);  // the site is free again
-}
-
 TEST_F(SiteOfAHost, FolderThatCannotBeMade_IsNamed)
 {
     std::filesystem::path const site = folder.Write("file", "no folder") / "site";

@@ -3,6 +3,7 @@
 #include "comgui/foundation/stracpy.h"
 #include <CoreFoundation/CoreFoundation.h>
 #include <cstdlib>
+#include <deque>
 #include <dlfcn.h>
 #include <stdexcept>
 
@@ -17,6 +18,12 @@ FACTORY Factory()
     if (!factory)
         throw std::runtime_error(dlerror());
     return reinterpret_cast<FACTORY>(factory);
+}
+// Made before the module first opens a site, and so removed after it has left them all.
+TemporaryFolder const& NewFolder()
+{
+    static std::deque<TemporaryFolder> folders;
+    return folders.emplace_back();
 }
 }  // namespace
 
@@ -50,7 +57,7 @@ RECORD::RECORD(char const* user, char const* password, char const* host, int por
     iGUINotificationID = -1;
 }
 
-MODULE_AT_SITE::MODULE_AT_SITE() { UseSite(folder.Path() / "site"); }
+MODULE_AT_SITE::MODULE_AT_SITE() : folder(NewFolder()) { UseSite(folder.Path() / "site"); }
 
 void MODULE_AT_SITE::UseSite(std::string const& site) { setenv("COMGUI_SITE", site.c_str(), 1); }
 

@@ -48,7 +48,7 @@ public:
     // Points the module at another site from now on.
     static void UseSite(std::string const& folder);
 
-    TemporaryFolder folder;
+    TemporaryFolder const& folder;  // stays to the end of the process, as the site is open so long
     MODULE module;
 };
 

@@ -1,17 +1,11 @@
 // The folders by variable, and how the server keeps them such that clients come to an end with them.
 #include "standin/server/tickets/FolderTable.h"
 
-#include "standin/server/site/Site.h"
-#include "tests/server/MemoryFolder.h"
 #include "tests/server/ServerTest.h"
-#include "tests/server/StoredValues.h"
-#include "tests/support/Files.h"
 #include <gmock/gmock.h>
 #include <random>
 
 using namespace standin;
-using testing::AllOf;
-using testing::HasSubstr;
 
 namespace
 {
@@ -164,6 +158,8 @@ protected:
         Set(SystemTicket, "System/InstallFolder", "/site");
         Set(SystemTicket, "System/Folders/Temp", "$(INSTALL)/temp");
     }
+
+    FolderTable Folders() { return FolderTable(Tickets().Folders().values); }
 };
 
 TEST_F(FolderWrites, WriteThatClientsCannotResolve_IsRefused)
@@ -174,15 +170,16 @@ TEST_F(FolderWrites, WriteThatClientsCannotResolve_IsRefused)
     EXPECT_FALSE(Set(SystemTicket, "System/Folders/Thumbnail", "$(oops/x", -2));  // appended: its first value
     EXPECT_STREQ(Text(SystemTicket, "System/Folders/Temp"), "$(INSTALL)/temp");
     EXPECT_EQ(Text(SystemTicket, "System/Folders/Thumbnail"), nullptr);
-    EXPECT_EQ(storage.tickets[SystemTicket].count({"System/Folders/Thumbnail", 0}), 0u);
+    EXPECT_THAT(PlacesInStore(SystemTicket),
+                testing::Not(testing::Contains(std::pair("System/Folders/Thumbnail", 0))));
 }
 
 TEST_F(FolderWrites, WriteThatResolves_IsDone)
 {
     EXPECT_TRUE(Set(SystemTicket, "System/Folders/Job", "$(TEMP)/job"));
-    EXPECT_EQ(Server().Folders().FolderOf("JOB"), "/site/temp/job");
+    EXPECT_EQ(Folders().FolderOf("JOB"), "/site/temp/job");
     EXPECT_TRUE(Set(SystemTicket, "System/Folders/Temp", "/elsewhere"));
-    EXPECT_EQ(Server().Folders().FolderOf("JOB"), "/elsewhere/job");
+    EXPECT_EQ(Folders().FolderOf("JOB"), "/elsewhere/job");
 }
 
 TEST_F(FolderWrites, LaterPositions_AreNotRead_AndMayHoldAnything)
@@ -192,13 +189,13 @@ TEST_F(FolderWrites, LaterPositions_AreNotRead_AndMayHoldAnything)
 
 TEST_F(FolderWrites, FolderThatOthersLeanOn_CannotBeTakenAway)
 {
-    EXPECT_FALSE(Server().Set(As("admin"), SystemTicket, "System/InstallFolder", PARAM_NONE, nullptr, -1));
-    EXPECT_FALSE(Server().Set(As("admin"), SystemTicket, "System/InstallFolder", PARAM_NONE, nullptr, 0));
+    EXPECT_FALSE(Set(As("admin"), SystemTicket, "System/InstallFolder", PARAM_NONE, nullptr, -1));
+    EXPECT_FALSE(Set(As("admin"), SystemTicket, "System/InstallFolder", PARAM_NONE, nullptr, 0));
     EXPECT_FALSE(Set(SystemTicket, "System/InstallFolder", ""));
     EXPECT_FALSE(Set(SystemTicket, "System/InstallFolder", 7));  // no text: clients read nothing
     EXPECT_STREQ(Text(SystemTicket, "System/InstallFolder"), "/site");
-    EXPECT_TRUE(Server().Set(As("admin"), SystemTicket, "System/Folders/Temp", PARAM_NONE, nullptr, -1));
-    EXPECT_TRUE(Server().Set(As("admin"), SystemTicket, "System/InstallFolder", PARAM_NONE, nullptr, -1));
+    EXPECT_TRUE(Set(As("admin"), SystemTicket, "System/Folders/Temp", PARAM_NONE, nullptr, -1));
+    EXPECT_TRUE(Set(As("admin"), SystemTicket, "System/InstallFolder", PARAM_NONE, nullptr, -1));
 }
 
 TEST_F(FolderWrites, UseWithoutResolving_IsRefusedWhileAFolderHasAVariable)
@@ -226,109 +223,16 @@ TEST_F(FolderWrites, Table_IsJudgedRecordByRecord)
     put(1, "System/Folders/Thumbnail", "/thumbnail");
     put(2, "System/Folders/RemoteIn", "$(THUMBNAIL)/in");  // now it is there
     put(3, "System/Folders/Thumbnail", "$(NOPE)");
-    EXPECT_TRUE(Server().SetTable(As("admin"), SystemTicket, table));
+    EXPECT_TRUE(SetTable(As("admin"), SystemTicket, table));
     EXPECT_FALSE(table[0].ok);
     EXPECT_TRUE(table[1].ok);
     EXPECT_TRUE(table[2].ok);
     EXPECT_FALSE(table[3].ok);
-    EXPECT_EQ(Server().Folders().FolderOf("REMOTE_IN"), "/thumbnail/in");
-    EXPECT_EQ(Server().Folders().FolderOf("PRINT"), std::nullopt);
+    EXPECT_EQ(Folders().FolderOf("REMOTE_IN"), "/thumbnail/in");
+    EXPECT_EQ(Folders().FolderOf("PRINT"), std::nullopt);
 }
 
 TEST_F(FolderWrites, OtherTickets_MayHoldSuchKeys)
 {
     EXPECT_TRUE(Set(Job, "System/Folders/Temp", "$(NOPE)"));
-}
-
-class FoldersOfASite : public testing::Test
-{
-protected:
-    std::filesystem::path Folder() const { return folder / "site"; }
-
-    // Writes past the server, as a seed or an older program may have done.
-    void Apply(std::vector<Change> const& changes)
-    {
-        Site::Open(Folder(), COMGUI_TEST_SEED).storage().Apply(changes);
-    }
-    static Change Text(std::string_view key, std::string_view text, int pos = 0)
-    {
-        return {Change::PutValue, SystemTicket, key, pos, Bytes(PARAM_STRING, text)};
-    }
-    void Put(std::string_view key, std::string_view text, int pos = 0) { Apply({Text(key, text, pos)}); }
-    void Put(std::string_view key, int number)
-    {
-        Apply({{Change::PutValue, SystemTicket, key, 0, Integer(PARAM_INT, number)}});
-    }
-
-    // Opens the site, keeps what it says, and gives the folders as they are then.
-    FolderSettings Opened()
-    {
-        testing::internal::CaptureStderr();
-        Site site = Site::Open(Folder(), COMGUI_TEST_SEED);
-        said = testing::internal::GetCapturedStderr();
-        FolderSettings settings;
-        site.storage().Load(SystemTicket,
-                            [&](std::string_view key, int pos, StoredValue const& value)
-                            {
-                                if (FolderSettings::Concern(key, pos))
-                                    settings.Put(key, value);
-                            });
-        return settings;
-    }
-
-    MemoryFolder folder;
-    std::string said;
-};
-
-TEST_F(FoldersOfASite, ShippedOnes_CanBeRead)
-{
-    FolderSettings const settings = Opened();
-    EXPECT_EQ(said, "");
-    EXPECT_TRUE(settings.CanBeRead());
-    for (FolderRow const row : FolderRows)
-        EXPECT_TRUE(FolderTable(settings.values).FolderOf(row.variable)) << row.variable;
-}
-
-TEST_F(FoldersOfASite, UnresolvableOne_IsToldAndSwitchedOff)
-{
-    Put("System/Folders/Temp", "$(JOB)/temp");
-    FolderSettings const settings = Opened();
-    EXPECT_THAT(said,
-                AllOf(HasSubstr("System/Folders/Temp"), HasSubstr("$(JOB)/temp"), HasSubstr("give it")));
-    EXPECT_EQ(std::count(said.begin(), said.end(), '\n'), 1);
-    EXPECT_EQ(settings.values[Temp], "");
-    EXPECT_TRUE(settings.CanBeRead());
-    Opened();
-    EXPECT_EQ(said, "");  // once is enough
-}
-
-TEST_F(FoldersOfASite, WhatLeansOnAnUnresolvableOne_GoesWithIt)
-{
-    Apply({Text("System/Folders/Temp", "$(NOPE)"), Text("System/Folders/Print", "$(TEMP)/print")});
-    FolderSettings const settings = Opened();
-    EXPECT_EQ(std::count(said.begin(), said.end(), '\n'), 2) << said;
-    EXPECT_TRUE(settings.CanBeRead());
-    EXPECT_EQ(settings.values[3], "");
-}
-
-TEST_F(FoldersOfASite, UseWithoutResolving_IsToldAndSwitchedOff)
-{
-    Put("System/UseFolderVariables", 2);
-    FolderSettings const settings = Opened();
-    EXPECT_THAT(said, AllOf(HasSubstr("System/UseFolderVariables is 2"), HasSubstr("set it to 3")));
-    EXPECT_EQ(settings.use, 0);
-    EXPECT_EQ(settings.values[Temp], "$(INSTALL)/temp");  // the folders stay
-}
-
-TEST_F(FoldersOfASite, Seed_KeepsTheOriginal)
-{
-    Opened();
-    std::string seed = ContentOf(Folder() / "seed.xml");
-    std::string const before = "$(INSTALL)/temp";
-    seed.replace(seed.find(before), before.size(), "$(JOB)/temp");
-    WriteFile(Folder() / "seed.xml", seed);
-    std::filesystem::remove(Folder() / "site.db");
-    EXPECT_EQ(Opened().values[Temp], "");
-    EXPECT_THAT(said, HasSubstr("System/Folders/Temp"));
-    EXPECT_EQ(ContentOf(Folder() / "seed.xml"), seed);
 }

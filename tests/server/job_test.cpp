@@ -1,12 +1,9 @@
 // How jobs come in, and what is left of those that do not.
 #include "standin/server/jobs/JobIntake.h"
 
-#include "standin/server/site/Site.h"
 #include "standin/server/transfer/TransferService.h"
-#include "tests/server/MemoryFolder.h"
 #include "tests/server/ServerTest.h"
 #include "tests/server/StoredValues.h"
-#include "tests/support/ChildProcess.h"
 #include "tests/support/Files.h"
 #include <gmock/gmock.h>
 #include <thread>
@@ -24,11 +21,11 @@ protected:
     {
         fs::create_directory(folder / "job");
         std::string const jobs = folder / "job";
-        storage.Put(SystemTicket, "System/Folders/Job", 0, Bytes(PARAM_STRING, jobs));
-        storage.tickets[{7, 2}];
+        site->Put(SystemTicket, "System/Folders/Job", 0, Bytes(PARAM_STRING, jobs));
+        site->AddTicket({7, 2});
         As("operator").SetEndPoint("127.0.0.1:50106");
     }
-    ~Jobs() override { server.reset(); }
+    ~Jobs() override { Restart(); }  // ends the threads that use the members below
 
     JobIntake& Intake() { return Server().Jobs(); }
 
@@ -61,7 +58,7 @@ protected:
     std::vector<int> Ids()
     {
         std::vector<int> ids;
-        for (int id = Server().NextTicket(3, -1); id >= 0; id = Server().NextTicket(3, id))
+        for (int id = Tickets().NextTicket(3, -1); id >= 0; id = Tickets().NextTicket(3, id))
             ids.push_back(id);
         return ids;
     }
@@ -81,8 +78,8 @@ protected:
                          {
                              std::string text =
                                  std::to_string(told.kind) + " 3/" + std::to_string(told.ticket.id);
-                             for (SETMULTIPAR const* record = told.records; record && record->key; ++record)
-                                 text += std::string(" ") + record->key;
+                             for (ChangedParameter const& change : told.parameters)
+                                 text += std::string(" ") + change.key->CStr();
                              std::lock_guard const guard(lock);
                              calls.push_back(text);
                              changed.notify_all();
@@ -96,7 +93,6 @@ protected:
         return calls;
     }
 
-    MemoryFolder folder;
     std::string const file = Write("file.pdf", "content");
     std::string said;
     std::mutex lock;
@@ -132,9 +128,9 @@ TEST_F(PreparedJob, WithoutSuchAQueueOrCopies_HasNeither)
 TEST_F(PreparedJob, IsMadeInOneTransaction)
 {
     Server();
-    int const before = storage.transactions;
+    int const before = site->Commits();
     Prepare({"file.pdf"});
-    EXPECT_EQ(storage.transactions, before + 1);
+    EXPECT_EQ(site->Commits(), before + 1);
 }
 
 TEST_F(PreparedJob, NamesThatNoFileCanHave_AreRefusedWithoutATicket)
@@ -149,14 +145,14 @@ TEST_F(PreparedJob, NamesThatNoFileCanHave_AreRefusedWithoutATicket)
     EXPECT_THAT(Ids(), ElementsAre(1));
 }
 
-TEST_F(PreparedJob, StorageThatFails_IsToldAndLeavesNoTicket)
+TEST_F(PreparedJob, StoreThatFails_IsToldAndLeavesNoTicket)
 {
     As("operator");
-    storage.fail = true;
+    site->FailAll(true);
     int id = -1;
     testing::internal::CaptureStderr();
     EXPECT_EQ(Intake().Prepare(As("operator"), {"file.pdf"}, id), TargetUnwritable);
-    EXPECT_THAT(testing::internal::GetCapturedStderr(), HasSubstr("site.db"));
+    EXPECT_THAT(testing::internal::GetCapturedStderr(), HasSubstr("told to fail"));
     EXPECT_EQ(id, -1);
     EXPECT_THAT(Ids(), ElementsAre(1));
 }
@@ -178,9 +174,9 @@ TEST_F(PreparedJob, GoesWithItsSessionsLogout_AndNoOther)
 TEST_F(SentJob, FillsItsTicketInOneTransaction)
 {
     int const id = Prepare({"file.pdf", false, 2, 3});
-    int const before = storage.transactions;
+    int const before = site->Commits();
     EXPECT_EQ(Send(file, "file.pdf"), Transferred);
-    EXPECT_EQ(storage.transactions, before + 1);
+    EXPECT_EQ(site->Commits(), before + 1);
     EXPECT_EQ(Int({3, id}, "Job/State"), 1);
     EXPECT_EQ(Int({3, id}, "Job/Progress"), 100);
     EXPECT_EQ(Int({3, id}, "Job/Prepared"), std::nullopt);
@@ -189,7 +185,7 @@ TEST_F(SentJob, FillsItsTicketInOneTransaction)
     EXPECT_EQ(TextOf(id, "Job/Folder"), "$(JOB)/2");
     EXPECT_EQ(TextOf(id, "Job/Identification/Name"), "file.pdf");
     long long size = 0;
-    EXPECT_TRUE(Server().Get(As("admin"), {3, id}, "Job/Size", PARAM_INT64, &size, -1));
+    EXPECT_TRUE(Get(As("admin"), {3, id}, "Job/Size", PARAM_INT64, &size, -1));
     EXPECT_EQ(size, 7);
     EXPECT_EQ(ContentOf(InJob(id, "file.pdf")), "content");
     EXPECT_THAT(NamesIn(InJob(id)), ElementsAre(".job-" + TextOf(id, "Job/FolderMark"), "file.pdf"));
@@ -240,12 +236,12 @@ TEST_F(SentJob, Progress_IsWrittenTenTimesASecondAtMost)
 {
     Server().Transfers().Set({10, [] { std::this_thread::sleep_for(std::chrono::milliseconds(1)); }});
     Prepare({"file.pdf"});
-    int const before = storage.transactions;
+    int const before = site->Commits();
     auto const begin = std::chrono::steady_clock::now();
     EXPECT_EQ(Send(Write("long", std::string(4000, 'x')), "file.pdf"), Transferred);
     auto const tenths = (std::chrono::steady_clock::now() - begin) / std::chrono::milliseconds(100);
-    EXPECT_GE(storage.transactions - before, 2);  // 400 ms at the least, so some progress and the end
-    EXPECT_LE(storage.transactions - before, tenths + 1);  // and the end
+    EXPECT_GE(site->Commits() - before, 2);           // 400 ms at the least, so some progress and the end
+    EXPECT_LE(site->Commits() - before, tenths + 1);  // and the end
 }
 
 TEST_F(SentJob, Progress_IsThePercentageOfTheBytes)
@@ -272,21 +268,33 @@ TEST_F(SentJob, EmptyFolderOfItsNumber_IsTaken)
 TEST_F(SentJob, WhenItsTicketIsDeleted_ItsFolderGoesToo)
 {
     EXPECT_EQ(Send(file, "file.pdf"), Transferred);
-    EXPECT_TRUE(Server().Delete(As("guest"), {3, 2}));
+    EXPECT_TRUE(Tickets().Delete(As("guest"), {3, 2}));
     EXPECT_THAT(NamesIn(folder / "job"), IsEmpty());
 }
 
-TEST_F(SentJob, WhenItsTicketIsDeleted_FolderThatIsNoJobsStays)
+TEST_F(SentJob, FolderThatIsNoJobs_IsPassedOverAndStays)
 {
     Server();
     fs::create_directory(InJob(2));
     WriteFile(InJob(2, "another program's"), "content");
-    EXPECT_EQ(Send(file, "file.pdf"), TargetUnwritable);  // nor is anything added to it
-    EXPECT_THAT(said, HasSubstr(InJob(2).parent_path().string()));
-    EXPECT_THAT(Ids(), ElementsAre(1));
-    EXPECT_TRUE(Server().Create(As("guest"), {3, 2}));
-    EXPECT_TRUE(Server().Delete(As("guest"), {3, 2}));
+    WriteFile(InJob(3).parent_path(), "no folder at all");
+    EXPECT_EQ(Send(file, "file.pdf"), Transferred);  // under the next id that has its folder's name free
+    EXPECT_THAT(Ids(), ElementsAre(1, 4));
+    EXPECT_EQ(ContentOf(InJob(4, "file.pdf")), "content");
+    EXPECT_TRUE(Tickets().Create(As("guest"), {3, 2}));
+    EXPECT_TRUE(Tickets().Delete(As("guest"), {3, 2}));
     EXPECT_THAT(NamesIn(InJob(2)), ElementsAre("another program's"));
+}
+
+TEST_F(FailedJob, FolderOfItsNumberThatCameMeanwhile_IsToldAndNotTouched)
+{
+    int const id = Prepare({"file.pdf"});
+    fs::create_directory(InJob(id));
+    WriteFile(InJob(id, "another program's"), "content");
+    EXPECT_EQ(Send(file, "file.pdf"), TargetUnwritable);
+    EXPECT_THAT(said, HasSubstr(InJob(id).parent_path().string()));
+    EXPECT_THAT(Ids(), ElementsAre(1));
+    EXPECT_THAT(NamesIn(InJob(id)), ElementsAre("another program's"));
 }
 
 TEST_F(SentJob, WhenItsTicketIsDeleted_FolderOfItsNumberInANewPlaceStays)
@@ -296,7 +304,7 @@ TEST_F(SentJob, WhenItsTicketIsDeleted_FolderOfItsNumberInANewPlaceStays)
     WriteFile(folder / "new/2/another program's", "content");
     std::string const place = folder / "new";
     EXPECT_TRUE(Set(SystemTicket, "System/Folders/Job", place.c_str()));
-    EXPECT_TRUE(Server().Delete(As("guest"), {3, 2}));
+    EXPECT_TRUE(Tickets().Delete(As("guest"), {3, 2}));
     EXPECT_THAT(NamesIn(folder / "new/2"), ElementsAre("another program's"));
 }
 
@@ -308,9 +316,9 @@ TEST_F(SentJob, MarkThatAClientHasChanged_OpensNoFolder)
     for (char const* const mark : {"", "/../another program's", "."})
     {
         Set({3, 1}, "Job/FolderMark", mark);
-        EXPECT_TRUE(Server().Delete(As("admin"), {3, 1}));
+        EXPECT_TRUE(Tickets().Delete(As("admin"), {3, 1}));
         EXPECT_THAT(NamesIn(InJob(1)), ElementsAre(".job-", "another program's")) << mark;
-        EXPECT_TRUE(Server().Create(As("admin"), {3, 1}));
+        EXPECT_TRUE(Tickets().Create(As("admin"), {3, 1}));
     }
 }
 
@@ -328,9 +336,22 @@ TEST_F(FailedJob, FolderForJobsChangedMeanwhile_IsToldAndLeavesNothing)
     EXPECT_THAT(NamesIn(folder / "new"), IsEmpty());
 }
 
-TEST_F(SentJob, WithoutSystemTicket_IsRefused)
+TEST_F(FailedJob, FolderForJobsChangedJustBeforeTheJobArrives_IsToldAndLeavesNothing)
 {
-    storage.tickets[SystemTicket].clear();
+    fs::create_directory(folder / "new");
+    std::string const place = folder / "new";
+    As("admin");
+    Prepare({"file.pdf"});
+    site->Interject([&] { EXPECT_TRUE(Set(SystemTicket, "System/Folders/Job", place.c_str())); });
+    EXPECT_EQ(Send(file, "file.pdf"), TargetUnwritable);
+    EXPECT_THAT(said, HasSubstr("send the job anew"));
+    EXPECT_THAT(Ids(), ElementsAre(1));
+    EXPECT_THAT(NamesIn(folder / "job"), IsEmpty());
+}
+
+TEST_F(SentJob, WithoutAFolderForJobs_IsRefused)
+{
+    site->Put(SystemTicket, "System/Folders/Job", -1, {});
     EXPECT_EQ(Send(file, "file.pdf"), TargetUnwritable);
     EXPECT_THAT(said, HasSubstr("System/Folders/Job"));
     EXPECT_THAT(Ids(), ElementsAre(1));
@@ -417,7 +438,7 @@ TEST_F(FailedJob, TicketDeletedMeanwhile_IsToldAndTheNextJobOfThatIdIsSafe)
                               {
                                   if (!std::exchange(isFirst, false))
                                       return;
-                                  EXPECT_TRUE(Server().Delete(As("admin"), {3, 2}));
+                                  EXPECT_TRUE(Tickets().Delete(As("admin"), {3, 2}));
                                   int id = -1;
                                   EXPECT_EQ(Intake().Prepare(As("guest"), {"guest.pdf"}, id), Transferred);
                                   EXPECT_EQ(id, 2);
@@ -431,182 +452,19 @@ TEST_F(FailedJob, TicketDeletedMeanwhile_IsToldAndTheNextJobOfThatIdIsSafe)
     EXPECT_EQ(Int({3, 2}, "Job/State"), 1);
 }
 
-TEST_F(FailedJob, DatabaseThatFailsAtTheEnd_LeavesTheTicketUnsent)
+TEST_F(FailedJob, StoreThatFailsAtTheEnd_LeavesTheTicketUnsentAndForOthersToClear)
 {
     Prepare({"file.pdf"});
-    Server().Transfers().Set({1, [this] { storage.fail = true; }});
+    Server().Transfers().Set({1, [this] { site->FailAll(true); }});
     As("operator");
+    As("admin");
     testing::internal::CaptureStderr();
     EXPECT_EQ(Intake().Send(As("operator"), file, "file.pdf"), TargetUnwritable);
-    testing::internal::GetCapturedStderr();
-    storage.fail = false;
-    Restart();
+    site->FailAll(false);
     EXPECT_EQ(Int({3, 2}, "Job/State"), 0);
-    EXPECT_EQ(Int({3, 2}, "Job/Prepared"), 1);  // so it goes when the site is opened
-}
-
-// What processes that were killed have left, when the next one opens the site.
-class LeftByTheDead : public testing::Test
-{
-protected:
-    LeftByTheDead() { Site::Open(Folder(), COMGUI_TEST_SEED); }
-
-    fs::path Folder() const { return folder / "site"; }
-    void Make(std::string const& name) const
-    {
-        fs::create_directories((Folder() / name).parent_path());
-        WriteFile(Folder() / name, "content");
-    }
-    bool Has(std::string const& name) const { return fs::exists(Folder() / name); }
-    std::string Open() const
-    {
-        testing::internal::CaptureStderr();
-        Site::Open(Folder(), COMGUI_TEST_SEED);
-        return testing::internal::GetCapturedStderr();
-    }
-    void PutText(TicketAddress ticket, std::string_view key, std::string const& text) const
-    {
-        Site::Open(Folder(), COMGUI_TEST_SEED)
-            .storage()
-            .Apply({{Change::PutValue, ticket, key, 0, Bytes(PARAM_STRING, text)}});
-    }
-    void MakePreparedJob(std::string_view file = {}) const
-    {
-        StoredValue const mark = Bytes(PARAM_STRING, std::string_view(Mark).substr(5));
-        std::vector<Change> changes{{Change::CreateTicket, {3, 9}},
-                                    {Change::PutValue, {3, 9}, "Job/Prepared", 0, Integer(PARAM_INT, 1)},
-                                    {Change::PutValue, {3, 9}, "Job/FolderMark", 0, mark}};
-        if (!file.empty())
-            changes.push_back({Change::PutValue, {3, 9}, "Job/File", 0, Bytes(PARAM_STRING, file)});
-        Site::Open(Folder(), COMGUI_TEST_SEED).storage().Apply(changes);
-    }
-    std::vector<int> Jobs() const
-    {
-        Site site = Site::Open(Folder(), COMGUI_TEST_SEED);
-        std::vector<int> ids;
-        for (TicketAddress const ticket : site.storage().Tickets())
-            if (ticket.type == 3)
-                ids.push_back(ticket.id);
-        return ids;
-    }
-
-    std::string const Mark = ".job-0123456789abcdef";
-    MemoryFolder folder;
-};
-
-TEST_F(LeftByTheDead, PreparedJob_GoesWithItsFolder)
-{
-    MakePreparedJob();
-    Make("job/9/" + Mark);
-    Make("job/9/whole.pdf");
-    EXPECT_EQ(Open(), "");
-    EXPECT_THAT(Jobs(), ElementsAre(1, 2));  // 3/2 has state 0, and nobody has prepared it
-    EXPECT_FALSE(Has("job/9"));
-}
-
-TEST_F(LeftByTheDead, PreparedJob_FolderThatIsNotItsOwnStays)
-{
-    fs::create_directories(folder / "elsewhere/9");
-    WriteFile(folder / "elsewhere/9/another program's", "content");
-    PutText(SystemTicket, "System/Folders/Job", folder / "elsewhere");
-    MakePreparedJob();
-    EXPECT_EQ(Open(), "");
-    EXPECT_THAT(Jobs(), ElementsAre(1, 2));
-    EXPECT_TRUE(fs::exists(folder / "elsewhere/9/another program's"));
-}
-
-TEST_F(LeftByTheDead, JobThatHasItsFile_StaysWhateverAClientHasWrittenIntoIt)
-{
-    MakePreparedJob("$(JOB)/9/whole.pdf");
-    Make("job/9/" + Mark);
-    Make("job/9/whole.pdf");
-    EXPECT_EQ(Open(), "");
-    EXPECT_THAT(Jobs(), ElementsAre(1, 2, 9));
-    EXPECT_TRUE(Has("job/9/whole.pdf"));
-}
-
-TEST_F(LeftByTheDead, JobFolderWithoutATicket_Goes_AndOthersStay)
-{
-    for (std::string const name :
-         {"job/2/", "job/77/", "job/077/", "job/78x/", "job/notes/", "job/16777216/", "temp/77/"})
-    {
-        Make(name + Mark);
-        Make(name + "a");
-    }
-    Make("job/81/no job's");
-    Make("job/79");  // a file
-    fs::create_directory(Folder() / "job/82");
-    fs::create_directory_symlink(Folder() / "temp", Folder() / "job/80");
-    EXPECT_EQ(Open(), "");
-    EXPECT_FALSE(Has("job/77"));
-    EXPECT_FALSE(Has("job/82"));  // empty: killed before it was marked
-    for (char const* const name : {"job/2/a", "job/077/a", "job/78x/a", "job/notes/a", "job/16777216/a",
-                                   "temp/77/a", "job/79", "job/80", "job/81/no job's"})
-        EXPECT_TRUE(Has(name)) << name;
-}
-
-TEST_F(LeftByTheDead, JobFolderElsewhere_IsNotTouched)
-{
-    fs::create_directories(folder / "elsewhere/77");
-    PutText(SystemTicket, "System/Folders/Job", folder / "elsewhere");
-    Open();
-    EXPECT_TRUE(fs::exists(folder / "elsewhere/77"));
-}
-
-TEST_F(LeftByTheDead, BeginningsOfFiles_Go)
-{
-    std::string const dead = ".transfer." + NumberOfADeadProcess() + "-3.tmp";
-    std::string const alive = ".transfer." + std::to_string(getpid()) + "-99.tmp";
-    for (std::string const name : {"temp/", "job/2/", "profiles/paper/deep/er/"})
-    {
-        Make(name + dead);
-        Make(name + alive);  // the number may have been given again, but the site is ours
-    }
-    for (char const* const name : {"temp/.transfer.x-1.tmp", "temp/.transfer.1-1", "temp/transfer.1-1.tmp"})
-        Make(name);
-    EXPECT_EQ(Open(), "");
-    for (std::string const name : {"temp/", "job/2/", "profiles/paper/deep/er/"})
-    {
-        EXPECT_FALSE(Has(name + dead)) << name;
-        EXPECT_FALSE(Has(name + alive)) << name;
-    }
-    EXPECT_THAT(NamesIn(Folder() / "temp"),
-                ElementsAre(".transfer.1-1", ".transfer.x-1.tmp", "transfer.1-1.tmp"));
-}
-
-TEST_F(LeftByTheDead, BeginningsOfFiles_ElsewhereGoIfTheirProcessIsDead)
-{
-    std::string const dead = ".transfer." + NumberOfADeadProcess() + "-3.tmp";
-    std::string const alive = ".transfer." + std::to_string(getpid()) + "-99.tmp";
-    fs::create_directory(folder / "elsewhere");
-    WriteFile(folder / ("elsewhere/" + dead), "content");
-    WriteFile(folder / ("elsewhere/" + alive), "content");
-    PutText(SystemTicket, "System/Folders/Temp", folder / "elsewhere");
-    Open();
-    EXPECT_THAT(NamesIn(folder / "elsewhere"), ElementsAre(alive));
-}
-
-TEST_F(LeftByTheDead, BeginningsOfFiles_BehindALinkOutOfTheSiteGoIfTheirProcessIsDead)
-{
-    std::string const dead = ".transfer." + NumberOfADeadProcess() + "-3.tmp";
-    std::string const alive = ".transfer." + std::to_string(getpid()) + "-99.tmp";
-    fs::create_directories(folder / "elsewhere/below");
-    for (std::string const& name : {dead, alive, "below/" + dead})
-        WriteFile(folder / ("elsewhere/" + name), "content");
-    fs::remove(Folder() / "temp");
-    fs::create_directory_symlink(folder / "elsewhere", Folder() / "temp");
-    Open();
-    EXPECT_THAT(NamesIn(folder / "elsewhere"), ElementsAre(alive, "below"));
-    EXPECT_THAT(NamesIn(folder / "elsewhere/below"), ElementsAre(dead));
-}
-
-TEST_F(LeftByTheDead, JobsOfADatabaseThatIsMadeAnew_AreSetAside)
-{
-    Make("job/1/precious.pdf");
-    fs::remove(Folder() / "site.db");
-    EXPECT_THAT(Open(), HasSubstr("set aside as 1.damaged-"));
-    Open();
-    auto const names = NamesIn(Folder() / "job");
-    ASSERT_EQ(names.size(), 1u);
-    EXPECT_EQ(ContentOf(Folder() / "job" / names[0] / "precious.pdf"), "content");
+    EXPECT_EQ(Int({3, 2}, "Job/Prepared"), 1);
+    Restart();
+    EXPECT_TRUE(TidiesUntil([this] { return Ids() == std::vector{1}; }));
+    EXPECT_TRUE(TidiesUntil([this] { return NamesIn(folder / "job").empty(); }));
+    testing::internal::GetCapturedStderr();
 }

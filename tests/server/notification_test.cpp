@@ -2,6 +2,8 @@
 #include "tests/server/ServerTest.h"
 
 #include "comgui/ticket/TICKET_ID.h"
+#include <condition_variable>
+#include <set>
 
 using standin::KeyFilter;
 using standin::Notification;
@@ -33,8 +35,8 @@ protected:
         std::unique_lock guard(lock);
         changed.wait(guard, [this] { return !held; });
         ++calls;
-        for (SETMULTIPAR const* record = told.records; record && record->key; ++record)
-            keys.insert(record->key);
+        for (standin::ChangedParameter const& change : told.parameters)
+            keys.insert(change.key->CStr());
         changed.notify_all();
         if (throws)
             throw std::runtime_error("told to fail");
@@ -104,13 +106,13 @@ TEST(KeyFilter, BeginningsOfBeginnings_AreFoundInAnyOrder)
     }
 }
 
-TEST_F(Told, AWriteThatTheStorageRefused_IsNot)
+TEST_F(Told, AWriteThatTheStoreRefused_IsNot)
 {
     Listen("admin", Job.type);
-    storage.fail = true;
+    site->FailAll(true);
     EXPECT_FALSE(Set(Job, "Refused", 1));
-    EXPECT_FALSE(Server().Create(As("admin"), {Job.type, 77}));
-    storage.fail = false;
+    EXPECT_FALSE(Tickets().Create(As("admin"), {Job.type, 77}));
+    site->FailAll(false);
     EXPECT_TRUE(Set(Job, "Done", 1));
     EXPECT_EQ(CallsUpTo(1), 1);
     EXPECT_EQ(keys, std::set<std::string>{"Done"});
@@ -168,9 +170,9 @@ TEST_F(Told, EnablingManyTimes_IsForgottenByOneDisable)
     auto& service = Server().Notifications();
     for (int id = 0; id < 100; ++id)
         EXPECT_TRUE(service.Enable(As("admin"), 1, {Job.type, id}, KeyFilter(nullptr)));
-    EXPECT_TRUE(service.AreWanted(Job));
+    EXPECT_TRUE(service.Wants(Job));
     EXPECT_TRUE(service.Disable(As("admin"), 1, standin::AllTickets));
-    EXPECT_FALSE(service.AreWanted(Job));
+    EXPECT_FALSE(service.Wants(Job));
 }
 
 TEST_F(Told, AnEndedSession_CannotRegister)

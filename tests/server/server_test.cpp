@@ -2,7 +2,7 @@
 #include "tests/server/ServerTest.h"
 
 #include <atomic>
-#include <chrono>
+#include <set>
 #include <thread>
 
 using standin::SystemTicket;
@@ -44,17 +44,18 @@ TEST_F(Sessions, Login_WithAWrongPasswordOrUser_GivesNothing)
     EXPECT_FALSE(Server().Login("", ""));
 }
 
-TEST_F(Sessions, Login_WithAFailingStorage_Throws)
+TEST_F(Sessions, Login_WithAFailingStore_Throws)
 {
     Server();
-    storage.fail = true;
-    EXPECT_THROW(Server().Login("operator", "secret"), standin::StorageError);
+    site->FailAll(true);
+    EXPECT_THROW(Server().Login("operator", "secret"), standin::StoreError);
 }
 
-TEST_F(Sessions, Opening_WithAFailingStorage_Throws)
+TEST_F(Sessions, Opening_WithAFailingStore_Throws)
 {
-    storage.fail = true;
-    EXPECT_THROW(Server(), standin::StorageError);
+    store = std::make_unique<standin::MemoryStore>(site);
+    site->FailAll(true);
+    EXPECT_THROW(Server(), standin::StoreError);
 }
 
 TEST_F(Sessions, Numbers_AreNeverGivenTwice)
@@ -73,15 +74,15 @@ TEST_F(Sessions, AfterLogout_EverythingIsRefused)
     int value = 1;
     SETMULTIPAR table[] = {{"K", PARAM_INT, 0, &value, -1, true, {}}, {}};
     GETMULTIPAR reads[] = {{"K", PARAM_INT, 0, &value, -1, true, {}}, {}};
-    EXPECT_FALSE(Server().Get(session, Job, "K", PARAM_INT, &value, -1));
-    EXPECT_FALSE(Server().Set(session, Job, "K", PARAM_INT, &value, -1));
-    EXPECT_FALSE(Server().SetTable(session, Job, table));
+    EXPECT_FALSE(Get(session, Job, "K", PARAM_INT, &value, -1));
+    EXPECT_FALSE(Set(session, Job, "K", PARAM_INT, &value, -1));
+    EXPECT_FALSE(SetTable(session, Job, table));
     EXPECT_FALSE(table[0].ok);
-    Server().GetTable(session, Job, reads);
+    EXPECT_FALSE(GetTable(session, Job, reads));
     EXPECT_FALSE(reads[0].ok);
-    EXPECT_FALSE(Server().Create(session, {3, 50}));
-    EXPECT_FALSE(Server().Delete(session, Job));
-    EXPECT_FALSE(Server().Visit(session, Job, [](auto, auto, auto const&) {}));
+    EXPECT_FALSE(Tickets().Create(session, {3, 50}));
+    EXPECT_FALSE(Tickets().Delete(session, Job));
+    EXPECT_FALSE(Tickets().Values(session, Job, 0, ""));
     EXPECT_FALSE(Server().Logout(session));
     EXPECT_EQ(value, 1);
 }
@@ -115,27 +116,28 @@ TEST_F(Sessions, ReadersWritersAndLogins_AtOnce_SeeWholeValuesOnly)
                    for (int round = 0; round < 20; ++round)
                    {
                        auto const session = Server().Login("operator", "secret");
+                       texts.Open(session->Number());
                        for (int step = 0; step < 40; ++step)
                        {
                            std::string const text(static_cast<std::size_t>(20 + step),
                                                   static_cast<char>('a' + step % 26));
-                           if (i % 2 &&
-                               !Server().Set(*session, Job, "T", PARAM_STRING, text.c_str(), step % 3))
+                           if (i % 2 && !Set(*session, Job, "T", PARAM_STRING, text.c_str(), step % 3))
                                ++failed;
                            char const* read = nullptr;
-                           if (Server().Get(*session, Job, "T", PARAM_STRING, &read, step % 3) &&
+                           if (Get(*session, Job, "T", PARAM_STRING, &read, step % 3) &&
                                std::string(read) != std::string(std::string(read).size(), read[0]))
                                ++broken;
                        }
                        Server().Logout(*session);
+                       texts.Close(session->Number());
                    }
                });
     EXPECT_EQ(broken, 0);
     EXPECT_EQ(failed, 0);
-    EXPECT_EQ(Server().RetiredTexts(), 0u);
+    EXPECT_EQ(RetiredTexts(), 0u);
 }
 
-TEST_F(Sessions, CountersWrittenByOneThreadEach_AllArriveInMemoryAndStorage)
+TEST_F(Sessions, CountersWrittenByOneThreadEach_AllArriveInMemoryAndStore)
 {
     auto& session = As("operator");
     InParallel(4,
@@ -143,7 +145,7 @@ TEST_F(Sessions, CountersWrittenByOneThreadEach_AllArriveInMemoryAndStorage)
                {
                    std::string const key = "Counter" + std::to_string(i);
                    for (int count = 1; count <= 100; ++count)
-                       Server().Set(session, Job, key.c_str(), PARAM_INT, &count, -2);
+                       Set(session, Job, key.c_str(), PARAM_INT, &count, -2);
                });
     for (int restart = 0; restart < 2; ++restart)
     {
@@ -165,45 +167,18 @@ TEST_F(Sessions, TicketsMadeAndDeletedWhileOthersRead_NeverMixUp)
                    int const seven = 7;
                    for (int round = 0; i == 0 && round < 300; ++round)
                    {
-                       Server().Create(session, address);
-                       Server().Set(session, address, "K", PARAM_INT, &seven, -1);
-                       Server().Delete(session, address);
+                       Tickets().Create(session, address);
+                       Set(session, address, "K", PARAM_INT, &seven, -1);
+                       Tickets().Delete(session, address);
                    }
                    if (i == 0)
                        done = true;
                    for (int value = 7; i != 0 && !done;)
-                       if (Server().Get(session, address, "K", PARAM_INT, &value, -1) && value != 7)
+                       if (Get(session, address, "K", PARAM_INT, &value, -1) && value != 7)
                            ++wrong;
                });
     EXPECT_EQ(wrong, 0);
-    EXPECT_FALSE(Server().Exists({3, 1000}));
-}
-
-TEST(ReadWriteLock, AWriterThatWaits_GoesBeforeReadersThatComeLater)
-{
-    standin::ReadWriteLock lock;
-    lock.lock_shared();
-    std::thread writer(
-        [&]
-        {
-            lock.lock();
-            lock.unlock();
-        });
-    // Once the writer waits, nobody else gets in, though only a reader has the lock.
-    auto const end = std::chrono::steady_clock::now() + std::chrono::seconds(30);
-    bool keptOut = false;
-    while (!keptOut && std::chrono::steady_clock::now() < end)
-    {
-        keptOut = !lock.try_lock_shared();
-        if (!keptOut)
-            lock.unlock_shared();
-        std::this_thread::yield();
-    }
-    lock.unlock_shared();
-    writer.join();
-    EXPECT_TRUE(keptOut);
-    EXPECT_TRUE(lock.try_lock_shared());
-    lock.unlock_shared();
+    EXPECT_FALSE(Exists({3, 1000}));
 }
 
 TEST_F(ServerTest, Session_RemembersWhereItsClientIs)

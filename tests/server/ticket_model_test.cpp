@@ -84,7 +84,7 @@ protected:
     {
         WORD ours;
         WORD models;
-        bool const found = Server().Get(As("admin"), Job, key, type, &ours, pos);
+        bool const found = Get(As("admin"), Job, key, type, &ours, pos);
         bool const expected = model.Read(Job.type, Job.id, key, type, &models, pos);
         ASSERT_EQ(Shown(found, type, ours), Shown(expected, type, models))
             << key << ' ' << type << ' ' << pos;
@@ -101,7 +101,7 @@ protected:
         table.emplace_back();
         auto expected = table;
         auto const* const access = model.Access();
-        EXPECT_EQ(Server().SetTable(As("admin"), Job, table.data()),
+        EXPECT_EQ(SetTable(As("admin"), Job, table.data()),
                   access->MSETMULTIPAR(access->Instance, Job.type, Job.id, expected.data()) != 0);
         for (std::size_t i = 0; i < writes.size(); ++i)
             ASSERT_EQ(table[i].ok, expected[i].ok) << "type " << table[i].type << " pos " << table[i].pos;

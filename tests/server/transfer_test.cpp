@@ -2,8 +2,6 @@
 #include "standin/server/transfer/TransferService.h"
 
 #include "standin/server/jobs/JobIntake.h"
-#include "standin/server/site/Site.h"
-#include "tests/server/MemoryFolder.h"
 #include "tests/server/ServerTest.h"
 #include "tests/support/Files.h"
 #include "tests/support/FullDisk.h"
@@ -100,27 +98,29 @@ INSTANTIATE_TEST_SUITE_P(
         PATH_FACT{"NameOfAPartFile", "$(TEMP)/.transfer.12-3.tmp", ""}),
     [](auto const& fact) { return std::string(fact.param.name); });
 
-// A server over storage in memory, with its folders in a folder of the test's own.
+// A server over a store in memory, with its folders in a folder of the test's own.
 class Transfers : public ServerTest
 {
 protected:
     Transfers()
     {
-        for (char const* const name : {"site", "site/temp", "site/job", "site/print", "client"})
+        siteFolder = Site();
+        for (char const* const name :
+             {"site", "site/temp", "site/job", "site/print", "site/tickets", "client"})
             fs::create_directory(folder / name);
         SetText("System/InstallFolder", Site());
         SetText("System/Folders/Temp", "$(INSTALL)/temp");
         SetText("System/Folders/Print", "$(INSTALL)/print");
         SetText("System/Folders/Job", "$(INSTALL)/job");
     }
-    ~Transfers() override { server.reset(); }
+    ~Transfers() override { Restart(); }  // ends the threads that use the members below
 
     void SetText(char const* key, std::string const& text)
     {
         StoredValue value;
         value.type = PARAM_STRING;
         value.bytes = text;
-        storage.Put(SystemTicket, key, 0, value);
+        site->Put(SystemTicket, key, 0, value);
     }
     std::string Site() const { return folder / "site"; }
     fs::path Temp(std::string const& name = {}) const { return folder / ("site/temp/" + name); }
@@ -160,7 +160,6 @@ protected:
         EXPECT_THAT(NamesIn(folder / "site/job"), IsEmpty());
     }
 
-    MemoryFolder folder;
     std::string said;
 };
 
@@ -527,7 +526,6 @@ TEST_F(Places, SitesOwnFolder_IsRefusedByWhateverWay)
 
 TEST_F(Places, SitesOwnFolder_IsRefusedWhateverTheSystemTicketSaysOfIt)
 {
-    Server().Transfers().KeepOut(folder / "site");
     WriteFile(folder / "site/site.db", "secret");
     SetText("System/InstallFolder", folder / "client");
     SetText("System/Folders/Log", folder / "site");
@@ -555,7 +553,7 @@ protected:
     ~LaterTransfers() override
     {
         Open();
-        server.reset();
+        Restart();
     }
 
     void Listen(std::string const& user)
@@ -566,11 +564,11 @@ protected:
                          [this](Notification const& told)
                          {
                              std::lock_guard const guard(lock);
-                             std::string text = std::to_string(told.kind) + " " +
-                                                std::to_string(told.ticket.type) + "/" +
-                                                std::to_string(told.ticket.id);
-                             for (SETMULTIPAR const* record = told.records; record && record->key; ++record)
-                                 text += " " + std::string(record->key);
+                             std::string text =
+                                 std::to_string(told.kind) + " " + std::to_string(told.ticket.type) + "/" +
+                                 std::to_string(told.ticket.id) + " code " + std::to_string(told.code);
+                             for (ChangedParameter const& change : told.parameters)
+                                 text += std::string(" ") + change.key->CStr();
                              calls.push_back(text);
                              changed.notify_all();
                          });
@@ -635,7 +633,7 @@ TEST_F(LaterTransfers, End_IsToldInOrderToWhoAskedAndNobodyElse)
     EXPECT_EQ(PutLater("guest", file, "$(TEMP)/guest"), Transferred);
     EXPECT_EQ(PutLater("operator", file, "$(TEMP)/a"), Transferred);
     EXPECT_EQ(PutLater("operator", Client("missing"), "$(TEMP)/b"), Transferred);
-    EXPECT_THAT(Calls(2), ElementsAre("6 0/0" + ended, "6 0/113" + ended));
+    EXPECT_THAT(Calls(2), ElementsAre("6 0/0 code 0" + ended, "6 0/0 code 113" + ended));
     EXPECT_THAT(testing::internal::GetCapturedStderr(), HasSubstr("missing"));
     EXPECT_THAT(NamesIn(Temp()), ElementsAre("a", "guest"));
 }
@@ -674,7 +672,7 @@ TEST_F(LaterTransfers, SwitchingOff_DoesNotTouchThem)
     auto& service = Server().Notifications();
     EXPECT_TRUE(service.Disable(As("operator"), 1, AllTickets));
     PutLater("operator", Write("a", "content"), "$(TEMP)/a");
-    EXPECT_THAT(Calls(1), ElementsAre("6 0/0" + ended));
+    EXPECT_THAT(Calls(1), ElementsAre("6 0/0 code 0" + ended));
 }
 
 TEST_F(LaterTransfers, Logout_CutsWhatRunsAndTakesBackWhatWaits)
@@ -688,7 +686,7 @@ TEST_F(LaterTransfers, Logout_CutsWhatRunsAndTakesBackWhatWaits)
     PutLater("guest", Write("small", "content"), "$(TEMP)/guest");
     AwaitHeld();
     LogOutAndOpen();
-    EXPECT_THAT(Calls(1), ElementsAre("6 0/0" + ended));  // the guest's
+    EXPECT_THAT(Calls(1), ElementsAre("6 0/0 code 0" + ended));  // the guest's
     EXPECT_THAT(NamesIn(Temp()), ElementsAre("guest"));
     EXPECT_EQ(PutLater("operator", file, "$(TEMP)/c"), TransferCut);
 }

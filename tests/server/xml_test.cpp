@@ -447,7 +447,7 @@ TEST(TicketXmlFile, Read_OfAMissingFile_NamesItAndTheReason)
         TicketXml::Read(folder / "ticket.xml");
         FAIL() << "accepted";
     }
-    catch (StorageError const& error)
+    catch (FileError const& error)
     {
         EXPECT_THAT(error.what(), AllOf(HasSubstr((folder / "ticket.xml").string()),
                                         HasSubstr("No such file or directory")));
@@ -531,7 +531,7 @@ TEST(ReplaceFile, WithoutItsFolder_NamesFileReasonAndRemedy)
         ReplaceFile(folder / "none" / "file", "new");
         FAIL() << "written";
     }
-    catch (StorageError const& error)
+    catch (FileError const& error)
     {
         EXPECT_EQ(error.what(),
                   (folder / "none" / "file").string() +
@@ -544,7 +544,7 @@ TEST(ReplaceFile, OfAFolder_FailsAndLeavesIt)
 {
     MemoryFolder folder;
     std::filesystem::create_directories(folder / "file" / "sub");
-    EXPECT_THROW(ReplaceFile(folder / "file", "new"), StorageError);
+    EXPECT_THROW(ReplaceFile(folder / "file", "new"), FileError);
     EXPECT_THAT(NamesIn(folder.Path()), ElementsAre("file"));
     EXPECT_TRUE(std::filesystem::is_directory(folder / "file" / "sub"));
 }
@@ -563,7 +563,7 @@ TEST(ReplaceFile, DiskFull_KeepsTheOldContentAndLeavesNothingElse)
             {
                 ReplaceFile(folder / "file", std::string(128ul * 1024, 'x'));
             }
-            catch (StorageError const& error)
+            catch (FileError const& error)
             {
                 report(std::string(error.what()).find("; free some space") != std::string::npos);
             }

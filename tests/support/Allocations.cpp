@@ -10,22 +10,27 @@ std::atomic<long> live = 0;
 std::atomic<int> failIn = -1;
 std::atomic<bool> hasFailed = false;
 
-void* Allocated(std::size_t size) noexcept
+constexpr std::size_t Usual = __STDCPP_DEFAULT_NEW_ALIGNMENT__;
+
+void* Allocated(std::size_t size, std::size_t alignment = Usual) noexcept
 {
     if (failIn >= 0 && failIn-- == 0)
     {
         hasFailed = true;
         return nullptr;
     }
-    void* const block = std::malloc(size != 0 ? size : 1);
+    std::size_t const room = size != 0 ? size : 1;
+    void* const block = alignment == Usual
+                            ? std::malloc(room)
+                            : std::aligned_alloc(alignment, (room + alignment - 1) / alignment * alignment);
     if (block)
         ++live;
     return block;
 }
 
-void* AllocatedOrThrown(std::size_t size)
+void* AllocatedOrThrown(std::size_t size, std::size_t alignment = Usual)
 {
-    void* const block = Allocated(size);
+    void* const block = Allocated(size, alignment);
     if (block == nullptr)
         throw std::bad_alloc();
     return block;
@@ -50,6 +55,28 @@ void operator delete(void* block, std::size_t) noexcept { Freed(block); }
 void operator delete[](void* block, std::size_t) noexcept { Freed(block); }
 void operator delete(void* block, std::nothrow_t const&) noexcept { Freed(block); }
 void operator delete[](void* block, std::nothrow_t const&) noexcept { Freed(block); }
+void* operator new(std::size_t size, std::align_val_t alignment)
+{
+    return AllocatedOrThrown(size, static_cast<std::size_t>(alignment));
+}
+void* operator new[](std::size_t size, std::align_val_t alignment)
+{
+    return AllocatedOrThrown(size, static_cast<std::size_t>(alignment));
+}
+void* operator new(std::size_t size, std::align_val_t alignment, std::nothrow_t const&) noexcept
+{
+    return Allocated(size, static_cast<std::size_t>(alignment));
+}
+void* operator new[](std::size_t size, std::align_val_t alignment, std::nothrow_t const&) noexcept
+{
+    return Allocated(size, static_cast<std::size_t>(alignment));
+}
+void operator delete(void* block, std::align_val_t) noexcept { Freed(block); }
+void operator delete[](void* block, std::align_val_t) noexcept { Freed(block); }
+void operator delete(void* block, std::size_t, std::align_val_t) noexcept { Freed(block); }
+void operator delete[](void* block, std::size_t, std::align_val_t) noexcept { Freed(block); }
+void operator delete(void* block, std::align_val_t, std::nothrow_t const&) noexcept { Freed(block); }
+void operator delete[](void* block, std::align_val_t, std::nothrow_t const&) noexcept { Freed(block); }
 
 long LiveAllocations() { return live; }
 

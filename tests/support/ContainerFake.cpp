@@ -29,8 +29,9 @@ std::size_t SizeOf(PARAM_TYPE type)
 
 char const* NameOf(SLOT slot)
 {
-    static char const* const names[] = {"MGETPARAMETER", "MGETMULTIPAR", "MWALKTICKETS", "MSETPARAMETER",
-                                        "MSETMULTIPAR",  "MOPERATION",   "MENDISNOTIF",  "MCREATETICKET"};
+    static char const* const names[] = {"MGETPARAMETER", "MGETMULTIPAR",  "MWALKTICKETS",
+                                        "MSETPARAMETER", "MSETMULTIPAR",  "MOPERATION",
+                                        "MENDISNOTIF",   "MCREATETICKET", "SWALKPARAMETERS"};
     return names[static_cast<int>(slot)];
 }
 
@@ -211,6 +212,32 @@ bool ContainerFake::Write(int type, int id, char const* key, PARAM_TYPE ptype, v
         return false;
     values.insert_or_assign(pos == -1 ? 0 : pos, *made);
     return true;
+}
+
+int ContainerFake::WalkValues(int type, int id, SWALKPARAMETERS_ACTION action, void* context,
+                              char const* prefix)
+{
+    std::string const beginning = prefix ? prefix : "";
+    calls.push_back({SLOT::WALKVALUES, type, id, beginning});
+    if (Fails({}) || !action || !HasTicket(type, id))
+        return 0;
+    TICKET const ticket = m_tickets.at({type, id});  // the action may write to it
+    for (auto const& [key, values] : ticket)
+        for (auto const& [pos, value] : values)
+        {
+            BIN_STRING binary;
+            void const* word =
+                &m_numbers.emplace_back(value.number);  // little-endian: a short number's bytes come first
+            if (value.type == PARAM_POINTER)
+                word = reinterpret_cast<void const*>(value.number);
+            else if (value.type == PARAM_STRING)
+                word = value.bytes->c_str();
+            else if (value.type == PARAM_BINSTRING)
+                word = &(binary = {value.bytes->data(), value.bytes->size()});
+            if (key.starts_with(beginning) && !action(context, key.c_str(), value.type, word, pos))
+                return success;
+        }
+    return success;
 }
 
 bool ContainerFake::Get(CALL call, char const* key, void* value)

@@ -18,14 +18,15 @@ class clFOLDER_VARIABLES;
 
 enum class SLOT
 {
-    GET,        // MGETPARAMETER
-    GETTABLE,   // MGETMULTIPAR
-    WALK,       // MWALKTICKETS
-    SET,        // MSETPARAMETER
-    SETTABLE,   // MSETMULTIPAR
-    OPERATION,  // MOPERATION
-    SWITCH,     // MENDISNOTIF
-    CREATE,     // MCREATETICKET
+    GET,         // MGETPARAMETER
+    GETTABLE,    // MGETMULTIPAR
+    WALK,        // MWALKTICKETS
+    SET,         // MSETPARAMETER
+    SETTABLE,    // MSETMULTIPAR
+    OPERATION,   // MOPERATION
+    SWITCH,      // MENDISNOTIF
+    CREATE,      // MCREATETICKET
+    WALKVALUES,  // SWALKPARAMETERS of a TicketFake, with its prefix as the key
 };
 
 // One call as it came in. What a slot has no argument for keeps its default, so a test names what it means:
@@ -80,6 +81,9 @@ public:
     // Reads of texts succeed and give null.
     bool nullTexts = false;
 
+    // The walk of a TicketFake over the values that the ticket has when it begins.
+    int WalkValues(int type, int id, SWALKPARAMETERS_ACTION action, void* context, char const* prefix);
+
     // Prepare a ticket without a trace in calls. A ticket that was never added refuses every write; Put adds
     // it. pos as in a slot.
     void AddTicket(int type, int id);
@@ -128,6 +132,7 @@ private:
     STICKET_ACCESS m_ticket{};  // handed out where a ticket's table is asked for; its slots are null
     std::map<std::pair<int, int>, TICKET> m_tickets;
     std::deque<std::string> m_texts;
+    std::deque<unsigned long long> m_numbers;  // that walks handed out
     int m_failIn = -1;
     std::optional<int> m_failPosition;
 };

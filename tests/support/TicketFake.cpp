@@ -25,6 +25,9 @@ TicketFake::TicketFake()
         MTICKET_ACCESS const* const access = Of(instance).container.Access();
         return access->MGETMULTIPAR(access->Instance, 0, 0, table);
     };
+    m_access.SWALKPARAMETERS =
+        [](void* instance, SWALKPARAMETERS_ACTION action, void* context, char const* prefix, int)
+    { return Of(instance).container.WalkValues(0, 0, action, context, prefix); };
     m_access.SSETPARAMETER = [](void* instance, char const* key, PARAM_TYPE type, void const* value, int pos)
     {
         MTICKET_ACCESS const* const access = Of(instance).container.Access();
@@ -42,9 +45,13 @@ int TicketFake::OnOption(void* instance, int code, void* out)
 {
     TicketFake& fake = Of(instance);
     fake.options.push_back(code);
-    if (code == STICKET_OP_FOLDER_VARIABLES && fake.optionResult)
-        *static_cast<clFOLDER_VARIABLES**>(out) = fake.container.folders;
+    bool const isKnown = code == STICKET_OP_FOLDER_VARIABLES || code == STICKET_OP_WHOAMI;
+    bool const lacksTranslator = code == STICKET_OP_FOLDER_VARIABLES && !fake.container.folders;
+    if (!out || !isKnown || lacksTranslator)
+        return 0;
     if (code == STICKET_OP_WHOAMI)
         *static_cast<STICKET_OPTION_WHOAMI*>(out) = {7, 8};
+    else if (fake.optionResult)
+        *static_cast<clFOLDER_VARIABLES**>(out) = fake.container.folders;
     return fake.optionResult;
 }

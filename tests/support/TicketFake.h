@@ -23,7 +23,8 @@ public:
     // Holds the ticket, type 0 and id 0, with its calls and settings.
     ContainerFake container;
 
-    // What SOPTION answers by code, and the codes that it was asked for. folders: of the container fake.
+    // What SOPTION answers to the two codes that it knows, and all codes that it was asked for. The
+    // translator is that of the container fake; without one, asking for it fails.
     int optionResult = 1;
     std::vector<int> options;
 

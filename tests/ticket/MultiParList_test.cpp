@@ -2,6 +2,7 @@
 
 #include "comgui/ticket/BIN_STRING.h"
 #include "comgui/ticket/SETMULTIPAR_LIST.h"
+#include <cstdlib>
 #include <gtest/gtest.h>
 
 namespace
@@ -38,7 +39,11 @@ TEST_F(MultiParList, Destroy_SetsThePointerToNull)
     EXPECT_EQ(list, nullptr);
 }
 
-TEST(MultiParListDestroy, NullAddress_IsPutUpWith) { MultiParListDestroy(nullptr); }
+// The exit code of the child process proves that the call returned.
+TEST(MultiParListDestroy, NullAddress_IsPutUpWith)
+{
+    EXPECT_EXIT((MultiParListDestroy(nullptr), std::_Exit(7)), testing::ExitedWithCode(7), "");
+}
 
 TEST(MultiParListOfNull, Everything_IsNothing)
 {

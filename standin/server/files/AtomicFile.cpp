@@ -15,31 +15,6 @@ namespace standin
 {
 namespace
 {
-char const* RemedyOf(int error)
-{
-    switch (error)
-    {
-    case ENOSPC:
-    case EDQUOT:
-    case EFBIG:
-        return "free some space, then try again";
-    case EACCES:
-    case EPERM:
-        return "give this user the right to it and to its folder";
-    case EROFS:
-        return "choose a folder that can be written to";
-    case ENOTDIR:
-        return "move away the file that stands where a folder is needed, or choose another folder";
-    case ENOENT:
-        return "make the file or folder, or correct its path";
-    case EMFILE:
-    case ENFILE:
-        return "close other files, then try again";
-    default:
-        return "check the path and the disk, then try again";
-    }
-}
-
 // The new file until it has taken the old one's place.
 class Temporary
 {
@@ -49,7 +24,7 @@ public:
           m_descriptor(open(m_path.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_CLOEXEC, 0666))
     {
         if (m_descriptor.Number() < 0)
-            throw FileError(file, "cannot be written", errno);
+            throw FileError(FileFault(file, "cannot be written", errno));
         TakePermissionsOf(file);
     }
     ~Temporary()
@@ -66,17 +41,17 @@ public:
         {
             ssize_t const count = write(m_descriptor.Number(), content.data(), content.size());
             if (count < 0 && errno != EINTR)
-                throw FileError(file, "cannot be written", errno);
+                throw FileError(FileFault(file, "cannot be written", errno));
             content.remove_prefix(count < 0 ? 0 : static_cast<std::size_t>(count));
         }
         if (fsync(m_descriptor.Number()) != 0)
-            throw FileError(file, "cannot be flushed to the disk", errno);
+            throw FileError(FileFault(file, "cannot be flushed to the disk", errno));
     }
 
     void TakeThePlaceOf(std::filesystem::path const& file)
     {
         if (rename(m_path.c_str(), file.c_str()) != 0)
-            throw FileError(file, "cannot be replaced", errno);
+            throw FileError(FileFault(file, "cannot be replaced", errno));
         m_path.clear();
     }
 
@@ -106,27 +81,22 @@ std::filesystem::path FolderOf(std::filesystem::path const& file)
     return file.has_parent_path() ? file.parent_path() : ".";
 }
 
-// Without this a power cut may bring the old name back. Some file systems cannot flush a folder.
 void FlushFolderOf(std::filesystem::path const& file)
 {
     std::filesystem::path const folder = FolderOf(file);
     Descriptor const descriptor(open(folder.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
-    if (descriptor.Number() >= 0 && fsync(descriptor.Number()) != 0 && errno != EINVAL)
-        throw FileError(folder, "cannot be flushed to the disk", errno);
+    if (descriptor.Number() >= 0 && !FlushFolder(descriptor.Number()))
+        throw FileError(FileFault(folder, "cannot be flushed to the disk", errno));
 }
 }  // namespace
 
-StorageError FileError(std::filesystem::path const& file, std::string const& failed, int error)
-{
-    return StorageError(file.string() + ": " + failed + ": " + std::generic_category().message(error) + "; " +
-                        RemedyOf(error));
-}
+bool FlushFolder(int folder) { return fsync(folder) == 0 || errno == EINVAL; }
 
 std::string ReadFile(std::filesystem::path const& file, std::size_t limit)
 {
     Descriptor const descriptor(open(file.c_str(), O_RDONLY | O_CLOEXEC));
     if (descriptor.Number() < 0)
-        throw FileError(file, "cannot be read", errno);
+        throw FileError(FileFault(file, "cannot be read", errno));
     std::string content;
     char block[16 * 1024];
     while (content.size() < limit)
@@ -134,7 +104,7 @@ std::string ReadFile(std::filesystem::path const& file, std::size_t limit)
         std::size_t const wanted = std::min(sizeof(block), limit - content.size());
         ssize_t const count = read(descriptor.Number(), block, wanted);
         if (count < 0 && errno != EINTR)
-            throw FileError(file, "cannot be read", errno);
+            throw FileError(FileFault(file, "cannot be read", errno));
         if (count == 0)
             break;
         content.append(block, count < 0 ? 0 : static_cast<std::size_t>(count));

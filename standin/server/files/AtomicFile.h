@@ -3,7 +3,7 @@
 // file at the same time the later one wins.
 #pragma once
 
-#include "standin/server/store/Storage.h"
+#include "standin/server/files/FileError.h"
 #include <cstddef>
 #include <filesystem>
 #include <optional>
@@ -13,11 +13,12 @@
 
 namespace standin
 {
-// One line that names the file, what failed, the reason of that errno and the remedy.
-StorageError FileError(std::filesystem::path const& file, std::string const& failed, int error);
-
 // The content, or its first limit bytes if it is larger.
 std::string ReadFile(std::filesystem::path const& file, std::size_t limit);
+
+// Flushes the entries of an open folder to the disk: without this a power cut may bring an old name back.
+// True also where the file system cannot flush a folder; false, with errno, for a failure.
+bool FlushFolder(int folder);
 
 // Writes a new file beside the old one, flushes it to the disk and puts it in the old one's place, whose
 // permissions it takes over. A link stays, and what it points at is replaced. On failure the old content is

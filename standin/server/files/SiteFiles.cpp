@@ -1,10 +1,13 @@
 #include "standin/server/files/SiteFiles.h"
 
 #include "standin/server/files/AtomicFile.h"
+#include "standin/server/files/Descriptor.h"
+#include "standin/server/files/Report.h"
 #include <algorithm>
 #include <cerrno>
-#include <cstdio>
 #include <ctime>
+#include <fcntl.h>
+#include <set>
 #include <sys/stat.h>
 #include <system_error>
 
@@ -42,23 +45,59 @@ std::filesystem::path FreeName(std::filesystem::path const& file, std::vector<st
         name = Suffixed(stamped, "-" + std::to_string(n));
     return name;
 }
-}  // namespace
 
-void Report(std::string const& line) noexcept { std::fprintf(stderr, "%s\n", line.c_str()); }
+using Folders = std::set<std::filesystem::path>;
 
-void MakePrivateFolder(std::filesystem::path const& folder)
+// changed gets the folders in which a name is new.
+void MakeAbove(std::filesystem::path const& folder, Folders& changed)
 {
+    std::filesystem::path const above = folder.parent_path();
     std::error_code error;
-    std::filesystem::create_directories(folder.parent_path(), error);
-    if (error)
-        throw FileError(folder, "the folder cannot be made", error.value());
-    if (mkdir(folder.c_str(), 0700) == 0)
+    if (above.empty() || std::filesystem::exists(above, error))
         return;
+    MakeAbove(above, changed);
+    if (std::filesystem::create_directory(above, error))
+        changed.insert(above.parent_path());
+    if (error)
+        throw FileError(FileFault(folder, "the folder cannot be made", error.value()));
+}
+
+void MakePrivateFolder(std::filesystem::path const& folder, Folders& changed)
+{
+    MakeAbove(folder, changed);
+    if (mkdir(folder.c_str(), 0700) == 0)
+    {
+        changed.insert(folder.parent_path());
+        return;
+    }
     int const reason = errno;
     if (reason != EEXIST)
-        throw FileError(folder, "the folder cannot be made", reason);
+        throw FileError(FileFault(folder, "the folder cannot be made", reason));
+    std::error_code error;
     if (!std::filesystem::is_directory(folder, error))
-        throw FileError(folder, "the folder cannot be made", ENOTDIR);
+        throw FileError(FileFault(folder, "the folder cannot be made", ENOTDIR));
+}
+
+// One that this user may write to but not read cannot be flushed by him.
+void Flush(std::filesystem::path const& folder)
+{
+    Descriptor const opened(open(folder.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
+    if (opened.Number() >= 0 && !FlushFolder(opened.Number()))
+        throw FileError(FileFault(folder, "cannot be flushed to the disk", errno));
+}
+}  // namespace
+
+void MakePrivateFolders(std::vector<std::filesystem::path> const& folders, bool flushesAll)
+{
+    Folders changed;
+    for (std::filesystem::path const& folder : folders)
+    {
+        MakePrivateFolder(folder, changed);
+        if (flushesAll)
+            changed.insert(folder.parent_path());
+    }
+    for (std::filesystem::path const& folder : changed)
+        Flush(folder);
 }
 
 void SetAside(std::filesystem::path const& file, std::vector<std::string> const& suffixes)
@@ -69,7 +108,8 @@ void SetAside(std::filesystem::path const& file, std::vector<std::string> const&
         std::error_code error;
         std::filesystem::rename(Suffixed(file, suffix), Suffixed(name, suffix), error);
         if (error && error != std::errc::no_such_file_or_directory)
-            throw FileError(Suffixed(file, suffix), "damaged, and cannot be set aside", error.value());
+            throw FileError(
+                FileFault(Suffixed(file, suffix), "damaged, and cannot be set aside", error.value()));
     }
     Report(file.string() + ": set aside as " + name.filename().string());
 }

@@ -7,15 +7,14 @@
 
 namespace standin
 {
-// One line on stderr, for the person who runs the program.
-void Report(std::string const& line) noexcept;
-
-// Makes the folder with those above it if it is missing; nobody but this user may look into it. Throws
-// StorageError.
-void MakePrivateFolder(std::filesystem::path const& folder);
+// Makes those of the folders that are missing, with those above them; nobody but this user may look into
+// them. When this returns the names of those that it made are on the disk, so that no power cut takes what is
+// in them away. With flushesAll, so are the names of those that were there: a process that was killed may
+// have made them and got no further. Throws FileError.
+void MakePrivateFolders(std::vector<std::filesystem::path> const& folders, bool flushesAll = false);
 
 // Renames the file and those that belong to it, each its name and one of the suffixes, in the given order,
 // to names that are free: NAME.damaged-YYYYmmdd-HHMMSS[-n] and the suffix. Reports the new name. Throws
-// StorageError.
+// FileError.
 void SetAside(std::filesystem::path const& file, std::vector<std::string> const& suffixes);
 }  // namespace standin

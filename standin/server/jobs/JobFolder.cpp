@@ -1,11 +1,12 @@
 #include "standin/server/jobs/JobFolder.h"
 
 #include "standin/server/files/AtomicFile.h"
-#include "standin/server/files/SiteFiles.h"
+#include "standin/server/files/Report.h"
 #include "standin/server/transfer/TransferError.h"
 #include <algorithm>
 #include <cerrno>
 #include <fcntl.h>
+#include <functional>
 #include <random>
 #include <sys/stat.h>
 
@@ -17,6 +18,7 @@ using std::filesystem::path;
 
 constexpr std::string_view MarkBeginning = ".job-";
 constexpr std::size_t MarkSize = 16;
+constexpr std::string_view RemovalBeginning = ".removed-";
 
 // A client may have written anything into the ticket.
 bool IsMark(std::string_view mark)
@@ -49,10 +51,21 @@ std::vector<path> EntriesOf(path const& folder, std::error_code& error)
     return entries;
 }
 
-// The mark goes last, so that a folder can still be told when this is broken off.
-void RemoveMarked(path const& folder)
+// Under a name that no job has any more: whoever makes the next job of that id is in nobody's way. If this is
+// broken off, the name shows what the folder was. isIt: looks once more, at what has now that name and no
+// other, since another program may have removed the folder, and a third made the next one, since the last
+// look.
+void RemoveUnder(path const& named, std::function<bool(path const& folder)> const& isIt)
 {
+    path const folder = named.parent_path() / (std::string(RemovalBeginning) + NewJobMark());
     std::error_code error;
+    std::filesystem::rename(named, folder, error);
+    if (error == std::errc::no_such_file_or_directory)
+        return;  // somebody else was faster
+    if (error)
+        return Report(FileFault(named, "the job's folder cannot be removed", error.value()));
+    if (!isIt(folder))
+        return std::filesystem::rename(folder, named, error);
     std::vector<path> entries = EntriesOf(folder, error);
     std::stable_partition(entries.begin(), entries.end(),
                           [](path const& entry) { return !IsMarkFile(entry); });
@@ -61,7 +74,7 @@ void RemoveMarked(path const& folder)
         if (!error)
             std::filesystem::remove_all(entry, error);
     if (error)
-        Report(FileError(folder, "the job's folder cannot be removed", error.value()).what());
+        Report(FileFault(folder, "the job's folder cannot be removed", error.value()));
 }
 
 // An empty one is what a process leaves that is killed before it can mark it.
@@ -112,23 +125,58 @@ Descriptor MakeJobFolder(FolderTable const& table, int id, std::string_view mark
     int const reason = errno;
     if (isMade)
         rmdir(folder->c_str());
-    throw TransferError(TargetUnwritable,
-                        FileError(*folder, "the job's folder cannot be made", reason).what());
+    throw TransferError(TargetUnwritable, FileFault(*folder, "the job's folder cannot be made", reason));
+}
+
+bool IsJobFolderFree(FolderTable const& table, int id)
+{
+    auto const folder = PathOf(table, id);
+    std::error_code error;
+    if (!folder || !exists(symlink_status(*folder, error)))
+        return true;
+    return is_directory(symlink_status(*folder, error)) && std::filesystem::is_empty(*folder, error) &&
+           !error;
+}
+
+void FlushJobFolder(FolderTable const& table)
+{
+    auto const jobs = table.FolderOf("JOB");
+    if (!jobs)
+        return;
+    Descriptor const folder(open(jobs->c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
+    if (folder.Number() < 0 || !FlushFolder(folder.Number()))
+        throw TransferError(TargetUnwritable, FileFault(*jobs, "cannot be flushed to the disk", errno));
 }
 
 void RemoveJobFolder(FolderTable const& table, int id, std::string_view mark)
 {
     auto const folder = PathOf(table, id);
-    struct stat found = {};
-    if (folder && IsMark(mark) && lstat((*folder / FileOf(mark)).c_str(), &found) == 0)
-        RemoveMarked(*folder);
+    auto const hasMark = [&](path const& found)
+    {
+        struct stat file = {};
+        return lstat((found / FileOf(mark)).c_str(), &file) == 0;
+    };
+    if (folder && IsMark(mark) && hasMark(*folder))
+        RemoveUnder(*folder, hasMark);
+}
+
+bool IsJobFolderOnItsWayOut(path const& folder)
+{
+    std::string const name = folder.filename().string();
+    return name.starts_with(RemovalBeginning) &&
+           IsMark(std::string_view(name).substr(RemovalBeginning.size()));
 }
 
 void RemoveStrayJobFolder(path const& folder)
 {
-    std::error_code error;
-    auto const entries = EntriesOf(folder, error);
-    if (!error && (entries.empty() || std::any_of(entries.begin(), entries.end(), IsMarkFile)))
-        RemoveMarked(folder);
+    auto const isStray = [](path const& found)
+    {
+        std::error_code error;
+        auto const entries = EntriesOf(found, error);
+        return !error && (entries.empty() || std::any_of(entries.begin(), entries.end(), IsMarkFile));
+    };
+    bool const isOnItsWayOut = IsJobFolderOnItsWayOut(folder);
+    if (isOnItsWayOut || isStray(folder))
+        RemoveUnder(folder, [&](path const& found) { return isOnItsWayOut || isStray(found); });
 }
 }  // namespace standin

@@ -13,13 +13,24 @@ inline constexpr char JobMarkKey[] = "Job/FolderMark";
 
 std::string NewJobMark();  // none comes twice
 
+// Whether MakeJobFolder would find nothing in its way.
+bool IsJobFolderFree(FolderTable const& table, int id);
+
 // Makes it and opens it. Throws TransferError, also if there is one of that number with something in it:
 // whose that is nobody here knows.
 Descriptor MakeJobFolder(FolderTable const& table, int id, std::string_view mark);
 
-// With all that is in it, if it has that mark. What cannot be removed stays, and is told on stderr.
+// The folder's name is on the disk when this returns. Throws TransferError.
+void FlushJobFolder(FolderTable const& table);
+
+// With all that is in it, if it has that mark. It loses its name first, so that another job may have it at
+// once. What cannot be removed stays, and is reported on stderr.
 void RemoveJobFolder(FolderTable const& table, int id, std::string_view mark);
 
-// The same for a folder of which no ticket tells: if it has any mark, or nothing in it.
+// By its name, what RemoveJobFolder has left when it was broken off.
+bool IsJobFolderOnItsWayOut(std::filesystem::path const& folder);
+
+// The same for a folder that belongs to no ticket: if it has any mark, or nothing in it, or is on its way
+// out.
 void RemoveStrayJobFolder(std::filesystem::path const& folder);
 }  // namespace standin

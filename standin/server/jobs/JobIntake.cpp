@@ -1,7 +1,7 @@
 #include "standin/server/jobs/JobIntake.h"
 
+#include "standin/server/files/Report.h"
 #include "standin/server/jobs/JobFolder.h"
-#include "standin/server/transfer/TransferService.h"
 #include <algorithm>
 
 namespace standin
@@ -14,29 +14,22 @@ constexpr char EndPointKey[] = "Job/Identification/RemoteEndpoint";
 constexpr char StateKey[] = "Job/State";
 constexpr char ProgressKey[] = "Job/Progress";
 constexpr int QueueTicketType = 7;
+constexpr int Announced = 0;
+constexpr int Arrived = 1;
 constexpr std::chrono::milliseconds ProgressPause(100);
 
-// A table of writes. What it is given stays where it is until the table has been used.
-class Table
-{
-public:
-    Table& Put(char const* key, std::string const& text) { return Put(key, PARAM_STRING, text.c_str()); }
-    Table& Put(char const* key, int const& number) { return Put(key, PARAM_INT, &number); }
-    Table& Put(char const* key, PARAM_TYPE type, void const* value)
-    {
-        SETMULTIPAR& record = m_records.back();
-        record.key = key;
-        record.type = type;
-        record.value = value;
-        record.pos = -1;
-        m_records.push_back({});
-        return *this;
-    }
-    SETMULTIPAR* Records() { return m_records.data(); }
+TicketWrite Put(char const* key, std::string const& text) { return {key, -1, TicketValue::String(text)}; }
+TicketWrite Put(char const* key, int number) { return {key, -1, TicketValue::Int(number)}; }
 
-private:
-    std::vector<SETMULTIPAR> m_records{SETMULTIPAR{}};
-};
+// A list of writes that cannot be copied, as an initialiser would do.
+template <typename... Writes>
+std::vector<TicketWrite> ListOf(Writes... writes)
+{
+    std::vector<TicketWrite> list;
+    list.reserve(sizeof...(writes));
+    (list.push_back(std::move(writes)), ...);
+    return list;
+}
 
 void CheckName(std::string const& name)
 {
@@ -60,24 +53,12 @@ SourceFile SourceOf(std::string const& clientPath)
                         "the job's ticket has been deleted while the job came in; send the job anew");
 }
 
-// Of a ticket that is there and cannot be written the storage has told on stderr.
-void WriteOrFail(TicketServer& server, TicketServer::MadeTicket const& ticket, Table& table)
-{
-    if (server.Write(ticket, table.Records()))
-        return;
-    if (server.BirthOf(ticket.address) == ticket.birth)
-        throw TransferError(TargetUnwritable, "");
-    FailAsGone();
-}
-
-// Writes how far a job is, every now and then.
+// Says every now and then how far a job is.
 class ProgressReport
 {
 public:
-    ProgressReport(TicketServer& server, TicketServer::MadeTicket const& ticket, off_t size)
-        : m_server(server), m_ticket(ticket), m_size(size)
-    {
-    }
+    using Write = std::function<void(int percent)>;
+    ProgressReport(off_t size, Write write) : m_size(size), m_write(std::move(write)) {}
 
     void operator()(off_t done)
     {
@@ -87,33 +68,59 @@ public:
             return;
         m_last = now;
         m_percent = percent;
-        WriteOrFail(m_server, m_ticket, Table().Put(ProgressKey, percent));
+        m_write(percent);
     }
 
 private:
-    TicketServer& m_server;
-    TicketServer::MadeTicket const& m_ticket;
     off_t m_size;
+    Write m_write;
     std::chrono::steady_clock::time_point m_last = std::chrono::steady_clock::now();
     int m_percent = 0;
 };
 }  // namespace
 
+bool JobIntake::IsGone(TicketWriter::Ticket const& ticket) const
+{
+    return m_tickets.IncarnationOf(ticket.address) != ticket.incarnation;
+}
+
+// Of a ticket that is there and cannot be written the store has reported why.
+void JobIntake::WriteOrFail(TicketWriter::Ticket const& ticket, std::vector<TicketWrite> writes,
+                            TicketWriter::Conditions const& conditions)
+{
+    bool const isDone = m_writer.Write(ticket, writes, conditions) &&
+                        std::all_of(writes.begin(), writes.end(), [](auto const& write) { return write.ok; });
+    if (isDone)
+        return;
+    if (IsGone(ticket))
+        FailAsGone();
+    throw TransferError(TargetUnwritable, "");
+}
+
+// What somebody left in $(JOB) blocks only the id whose name it has: the next job takes one above it. The
+// result is the largest id that would be given and is blocked, 0 if none is.
+int JobIntake::FirstFreeFolder() const
+{
+    FolderTable const folders = Folders();
+    int const newest = m_tickets.LargestId(JobTicketType);
+    int above = 0;
+    for (int id = newest + 1; id <= LargestId && !IsJobFolderFree(folders, id); ++id)
+        above = id;
+    return above;
+}
+
 JobIntake::Job JobIntake::Make(Session const& session, Announcement const& announcement)
 {
-    std::string const endPoint = session.EndPoint();
     std::string const mark = NewJobMark();
-    int const yes = 1;
-    int const announced = 0;
-    Table table;
-    table.Put(JobPreparedKey, yes).Put(StateKey, announced).Put(NameKey, announcement.name);
-    table.Put(UserKey, session.Who().name).Put(EndPointKey, endPoint);
-    table.Put(JobMarkKey, mark);
-    if (m_server.Exists({QueueTicketType, announcement.queue}))
-        table.Put("Job/Queue", announcement.queue);
+    auto writes =
+        ListOf(Put(JobPreparedKey, 1), Put(StateKey, Announced), Put(NameKey, announcement.name),
+               Put(UserKey, session.Who().name), Put(EndPointKey, session.EndPoint()), Put(JobMarkKey, mark));
+    if (m_tickets.IncarnationOf({QueueTicketType, announcement.queue}) != 0)
+        writes.push_back(Put("Job/Queue", announcement.queue));
     if (announcement.copies > 0)
-        table.Put("Job/Copies", announcement.copies);
-    auto const ticket = m_server.Make(JobTicketType, table.Records());
+        writes.push_back(Put("Job/Copies", announcement.copies));
+    auto const ticket = m_writer.Create(
+        {{JobTicketType, TicketChange::NextId}, FirstFreeFolder(), TicketChange::Owner::ThisProgram}, writes);
     if (!ticket)
         throw TransferError(TargetUnwritable, "no ticket can be made for a job; see the line before");
     return {*ticket, mark};
@@ -121,27 +128,21 @@ JobIntake::Job JobIntake::Make(Session const& session, Announcement const& annou
 
 TransferResult JobIntake::Prepare(Session const& session, Announcement const& announcement, int& id)
 {
-    return m_server.Transfers().Run(session,
-                                    [&](RunningTransfer const&)
-                                    {
-                                        CheckName(announcement.name);
-                                        std::lock_guard const lock(m_lock);
-                                        m_prepared.reserve(m_prepared.size() + 1);
-                                        Job const job = Make(session, announcement);
-                                        m_prepared.push_back({session.Number(), announcement, job});
-                                        id = job.ticket.address.id;
-                                    });
+    return m_transfers.Run(session,
+                           [&](RunningTransfer const&)
+                           {
+                               CheckName(announcement.name);
+                               Job const job = Make(session, announcement);
+                               id = job.ticket.address.id;
+                               std::lock_guard const lock(m_lock);
+                               m_prepared.push_back({session.Number(), announcement, job});
+                           });
 }
 
 std::optional<JobIntake::Job> JobIntake::Claim(Session const& session, std::string const& name)
 {
     std::lock_guard const lock(m_lock);
-    std::erase_if(m_prepared,
-                  [&](Prepared const& prepared)
-                  {
-                      TicketServer::MadeTicket const& ticket = prepared.job.ticket;
-                      return m_server.BirthOf(ticket.address) != ticket.birth;
-                  });
+    std::erase_if(m_prepared, [&](Prepared const& prepared) { return IsGone(prepared.job.ticket); });
     auto const found = std::find_if(m_prepared.rbegin(), m_prepared.rend(),
                                     [&](Prepared const& prepared)
                                     {
@@ -158,32 +159,31 @@ std::optional<JobIntake::Job> JobIntake::Claim(Session const& session, std::stri
 
 TransferResult JobIntake::Send(Session const& session, std::string const& clientPath, std::string const& name)
 {
-    return m_server.Transfers().Run(session,
-                                    [&](RunningTransfer const& running)
-                                    {
-                                        auto job = Claim(session, name);
-                                        try
-                                        {
-                                            CheckName(name);
-                                            SourceFile const source = SourceOf(clientPath);
-                                            if (!job)
-                                                job = Make(session, {name});
-                                            Receive(session, *job, source, name, running);
-                                        }
-                                        catch (...)
-                                        {
-                                            if (job)
-                                                Drop(*job);
-                                            throw;
-                                        }
-                                    });
+    return m_transfers.Run(session,
+                           [&](RunningTransfer const& running)
+                           {
+                               auto job = Claim(session, name);
+                               try
+                               {
+                                   CheckName(name);
+                                   SourceFile const source = SourceOf(clientPath);
+                                   if (!job)
+                                       job = Make(session, {name});
+                                   Receive(session, *job, source, name, running);
+                               }
+                               catch (...)
+                               {
+                                   if (job)
+                                       Drop(*job);
+                                   throw;
+                               }
+                           });
 }
 
-// The ticket first: it must not tell of a file that is gone.
+// The ticket first: it must not speak of a file that is gone.
 void JobIntake::Drop(Job const& job)
 {
-    bool const isGone =
-        m_server.Remove(job.ticket) || m_server.BirthOf(job.ticket.address) != job.ticket.birth;
+    bool const isGone = m_writer.Delete(job.ticket) || IsGone(job.ticket);
     if (isGone && job.folders)  // where $(JOB) was then: it may have been moved
         RemoveJobFolder(*job.folders, job.ticket.address.id, job.mark);
 }
@@ -191,48 +191,61 @@ void JobIntake::Drop(Job const& job)
 void JobIntake::Receive(Session const& session, Job& job, SourceFile const& source, std::string const& name,
                         RunningTransfer const& running)
 {
-    TicketServer::MadeTicket const& ticket = job.ticket;
-    int const id = ticket.address.id;
-    Descriptor folder;
-    auto const begin = [&](FolderTable const& folders)
-    {
-        folder = MakeJobFolder(folders, id, job.mark);
-        job.folders = folders;
-    };
-    // Together, since whoever deletes the ticket takes the folder away with it.
-    if (!m_server.WhileItLasts(ticket, begin))
+    job.folders = Folders();
+    Descriptor const folder = MakeJobFolder(*job.folders, job.ticket.address.id, job.mark);
+    // Whoever deletes the ticket takes the folder away with it, but not one that comes only then. Of a folder
+    // that comes before, this look tells; of one that goes later, the write at the end.
+    if (IsGone(job.ticket))
         FailAsGone();
-    PartFile file(folder.Number(), name);
-    m_server.Transfers().Copy(file, source, running, ProgressReport(m_server, ticket, source.Size()));
-    auto const finish = [&](FolderTable const& folders)
+    PartFile file(m_store, folder.Number(), name);
+    auto const write = [&](int percent) { WriteOrFail(job.ticket, ListOf(Put(ProgressKey, percent))); };
+    m_transfers.Copy(file, source, running, ProgressReport(source.Size(), write));
+    try
     {
+        file.Finish(PartFile::Survives::PowerCut);
+        FlushJobFolder(*job.folders);
+    }
+    catch (TransferError const&)
+    {
+        if (IsGone(job.ticket))
+            FailAsGone();  // in a folder that was removed nothing gets a name
+        throw;
+    }
+    Arrive(session, job, name, source.Size());
+    m_store.Sync();
+}
+
+void JobIntake::Arrive(Session const& session, Job const& job, std::string const& name, long long size)
+{
+    auto const whereTheFolderIs = [&]
+    {
+        TicketSnapshot::Version version;
+        FolderTable const folders(m_tickets.Folders(&version).values);
         if (folders.FolderOf("JOB") != job.folders->FolderOf("JOB"))
             throw TransferError(TargetUnwritable, "$(JOB) was moved while a job came in; send the job anew");
-        file.Finish();
+        return std::vector{TicketChange::Basis{SystemTicket, version.incarnation, version.revision}};
     };
-    // Under the lock too: in a folder that was deleted there is nothing to give a name.
-    if (!m_server.WhileItLasts(ticket, finish))
-        FailAsGone();
-
-    std::string const jobFolder = "$(JOB)/" + std::to_string(id);
-    std::string const jobFile = jobFolder + "/" + name;
-    std::string const endPoint = session.EndPoint();
-    long long const size = source.Size();
-    int const arrived = 1;
-    int const percent = 100;
-    Table table;
-    table.Put(NameKey, name).Put(UserKey, session.Who().name).Put(EndPointKey, endPoint);
-    table.Put(JobFileKey, jobFile).Put("Job/Folder", jobFolder).Put("Job/Size", PARAM_INT64, &size);
-    table.Put(StateKey, arrived).Put(ProgressKey, percent).Put(JobPreparedKey, PARAM_NONE, nullptr);
-    WriteOrFail(m_server, ticket, table);
+    std::string const folder = "$(JOB)/" + std::to_string(job.ticket.address.id);
+    WriteOrFail(job.ticket,
+                ListOf(Put(NameKey, name), Put(UserKey, session.Who().name),
+                       Put(EndPointKey, session.EndPoint()), Put(JobFileKey, folder + "/" + name),
+                       Put("Job/Folder", folder), TicketWrite{"Job/Size", -1, TicketValue::Int64(size)},
+                       Put(StateKey, Arrived), Put(ProgressKey, 100),
+                       TicketWrite{JobPreparedKey, -1, TicketValue()}),
+                {nullptr, TicketChange::Owner::Nobody, whereTheFolderIs});
 }
 
 void JobIntake::End(Session const& session)
 {
-    std::lock_guard const lock(m_lock);
-    for (Prepared const& prepared : m_prepared)
-        if (prepared.session == session.Number())
-            m_server.Remove(prepared.job.ticket);
-    std::erase_if(m_prepared, [&](Prepared const& prepared) { return prepared.session == session.Number(); });
+    std::vector<Prepared> ended;
+    {
+        std::lock_guard const lock(m_lock);
+        auto const isOthers = [&](Prepared const& prepared) { return prepared.session != session.Number(); };
+        auto const first = std::stable_partition(m_prepared.begin(), m_prepared.end(), isOthers);
+        ended.assign(std::move_iterator(first), std::move_iterator(m_prepared.end()));
+        m_prepared.erase(first, m_prepared.end());
+    }
+    for (Prepared const& prepared : ended)
+        m_writer.Delete(prepared.job.ticket);
 }
 }  // namespace standin

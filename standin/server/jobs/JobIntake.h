@@ -1,25 +1,25 @@
 // How jobs come to the server. A job is a ticket of type 3 and a file in a folder of its own, $(JOB)/ID. It
 // may be announced first, which makes the ticket with "Job/State" 0; the file turns it into 1, in the very
-// transaction that tells where the file is. So a job in state 1 has its whole file, whenever the process
-// ends. Until then the ticket has "Job/Prepared"; one with that mark and without the session that made it
-// goes, when the session ends or when the site is opened next. For any thread.
+// transaction that says where the file is. So a job in state 1 has its whole file, whenever the process ends,
+// and when Send has returned also when the power does. Until then the ticket belongs to this program: it
+// goes when its session ends, or with the program. For any thread.
 #pragma once
 
-#include "standin/server/site/TicketServer.h"
 #include "standin/server/transfer/TransferError.h"
+#include "standin/server/transfer/TransferService.h"
 
 namespace standin
 {
-class RunningTransfer;
-class SourceFile;
-
 inline constexpr char JobPreparedKey[] = "Job/Prepared";
 inline constexpr char JobFileKey[] = "Job/File";  // once it is there
 
 class JobIntake
 {
 public:
-    explicit JobIntake(TicketServer& server) : m_server(server) {}
+    JobIntake(Store& store, TicketService& tickets, TicketWriter& writer, TransferService& transfers)
+        : m_store(store), m_tickets(tickets), m_writer(writer), m_transfers(transfers)
+    {
+    }
     JobIntake(JobIntake const&) = delete;
     JobIntake& operator=(JobIntake const&) = delete;
 
@@ -43,7 +43,7 @@ public:
 private:
     struct Job
     {
-        TicketServer::MadeTicket ticket;
+        TicketWriter::Ticket ticket;
         std::string mark;                      // of its folder
         std::optional<FolderTable> folders{};  // as they were when its folder was made
     };
@@ -55,12 +55,21 @@ private:
     };
 
     Job Make(Session const& session, Announcement const& announcement);
+    int FirstFreeFolder() const;
     std::optional<Job> Claim(Session const& session, std::string const& name);
     void Receive(Session const& session, Job& job, SourceFile const& source, std::string const& name,
                  RunningTransfer const& running);
+    void Arrive(Session const& session, Job const& job, std::string const& name, long long size);
     void Drop(Job const& job);
+    bool IsGone(TicketWriter::Ticket const& ticket) const;
+    void WriteOrFail(TicketWriter::Ticket const& ticket, std::vector<TicketWrite> writes,
+                     TicketWriter::Conditions const& conditions = {});
+    FolderTable Folders() const { return FolderTable(m_tickets.Folders().values); }
 
-    TicketServer& m_server;
+    Store& m_store;
+    TicketService& m_tickets;
+    TicketWriter& m_writer;
+    TransferService& m_transfers;
     std::mutex m_lock;
     std::vector<Prepared> m_prepared;  // in the order of their making
 };

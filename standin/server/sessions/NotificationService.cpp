@@ -40,7 +40,7 @@ void GroupByKey(ChangedParameters& changes)
 
 ChangedParameter Copy(ChangedParameter const& change)
 {
-    return {change.key, change.pos, TicketValue::FromStored(change.value.ToStored())};
+    return {change.key, change.pos, change.value.Copy()};
 }
 }  // namespace
 
@@ -167,7 +167,7 @@ void NotificationService::Withdraw(Listener& listener)
                           return false;
                       Unqueue(message);
                       auto const isUnwanted = [&](ChangedParameter const& change)
-                      { return !listener.Wants(message.ticket, *change.key); };
+                      { return !listener.Wants(message.ticket, change.key->Text()); };
                       bool const hadChanges = !message.changes.empty();
                       std::erase_if(message.changes, isUnwanted);
                       if (!listener.Wants(message.ticket) || (hadChanges && message.changes.empty()))
@@ -193,7 +193,7 @@ void NotificationService::WaitFor(int id, Lock& lock)
     m_done.wait(lock, [this, id, run = m_run] { return m_running != id || m_run != run; });
 }
 
-bool NotificationService::AreWanted(TicketAddress ticket) const
+bool NotificationService::Wants(TicketAddress ticket) const
 {
     if (m_subscriptions.load(std::memory_order_relaxed) == 0)
         return false;
@@ -209,9 +209,6 @@ void NotificationService::Post(NotificationKind kind, TicketAddress ticket,
         return;
     try
     {
-        std::erase_if(changes, [](ChangedParameter const& change) { return !change.key; });
-        if (kind == ParametersChanged && changes.empty())
-            return;
         GroupByKey(changes);
         std::lock_guard const lock(m_lock);
         for (auto const& listener : m_listeners)
@@ -225,8 +222,8 @@ void NotificationService::Post(NotificationKind kind, TicketAddress ticket,
     }
 }
 
-void NotificationService::Tell(unsigned long long session, NotificationKind kind, TicketAddress ticket,
-                               ChangedParameters changes) noexcept
+void NotificationService::TransferHasEnded(unsigned long long session, int code,
+                                           ChangedParameters parameters) noexcept
 {
     try
     {
@@ -235,7 +232,7 @@ void NotificationService::Tell(unsigned long long session, NotificationKind kind
                                         [&](auto const& listener) { return listener->session == session; });
         if (found == m_listeners.end() || m_stopped)
             return;
-        Append({*found, kind, ticket, std::move(changes), 0});
+        Append({*found, TransferEnded, {}, code, std::move(parameters), 0});
         m_work.notify_one();
     }
     catch (std::exception const& error)
@@ -249,9 +246,9 @@ void NotificationService::Queue(std::shared_ptr<Listener> const& listener, Notif
 {
     if (m_stopped || !listener->Wants(ticket))
         return;
-    Message message{listener, kind, ticket, {}, 0};
+    Message message{listener, kind, ticket, 0, {}, 0};
     for (ChangedParameter const& change : changes)
-        if (listener->Wants(ticket, *change.key))
+        if (listener->Wants(ticket, change.key->Text()))
             message.changes.push_back(Copy(change));
     if (message.changes.empty() && !changes.empty())
         return;
@@ -303,19 +300,8 @@ void NotificationService::Deliver(Message& message) noexcept
 {
     try
     {
-        std::vector<SETMULTIPAR> records(message.changes.size() + 1);
-        std::vector<BIN_STRING> binaries(message.changes.size());
-        for (std::size_t i = 0; i < message.changes.size(); ++i)
-        {
-            ChangedParameter const& change = message.changes[i];
-            records[i].key = change.key->c_str();
-            records[i].type = change.value.type;
-            records[i].value = change.value.type == PARAM_NONE ? nullptr : change.value.Word(binaries[i]);
-            records[i].pos = change.pos;
-            records[i].ok = true;
-        }
-        message.listener->callback({message.kind, message.ticket, message.listener->id,
-                                    message.changes.empty() ? nullptr : records.data()});
+        message.listener->callback(
+            {message.kind, message.ticket, message.code, message.listener->id, message.changes});
     }
     catch (std::exception const& error)
     {

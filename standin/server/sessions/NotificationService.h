@@ -1,17 +1,13 @@
-// Tells sessions what changes in the tickets of a server. Whoever changes a ticket leaves word here, in the
-// order of the changes; one thread of the service's own passes it on, one callback at a time. No lock is
-// held during a callback, which may use the server and this service as it likes.
+// Notifies sessions of what changes in the tickets of a site. The feed posts the changes here, in their
+// order; one thread of the service's own passes them on, one callback at a time. No lock is held during a
+// callback, which may use the server and this service as it likes.
 //
 // For any thread. A session that is slow to take its notifications loses the newest ones; it never keeps
 // anybody from writing.
 #pragma once
 
-#include "comgui/ticket/SETMULTIPAR.h"
+#include "standin/server/feed/ChangeListener.h"
 #include "standin/server/sessions/Session.h"
-#include "standin/server/tickets/KeyFilter.h"
-#include "standin/server/tickets/KeyPool.h"
-#include "standin/server/tickets/TicketAddress.h"
-#include "standin/server/tickets/TicketValue.h"
 #include <chrono>
 #include <condition_variable>
 #include <deque>
@@ -32,21 +28,13 @@ enum NotificationKind : int
 struct Notification
 {
     NotificationKind kind;
-    TicketAddress ticket;  // of a transfer: type 0, and its result in the place of the id
-    int id;                // under which it was asked for
-    SETMULTIPAR* records;  // of changed parameters, ended by a null key; null for tickets as a whole
+    TicketAddress ticket;                 // type 0 and id 0 of a transfer
+    int code;                             // how a transfer ended; else 0
+    int id;                               // under which it was asked for
+    ChangedParameters const& parameters;  // of a change, or of a transfer; those of one key are neighbours
 };
 
-// A value as one change left it; PARAM_NONE: deleted. pos is -1 for a key that was written anew or deleted.
-struct ChangedParameter
-{
-    Key key = nullptr;
-    int pos = 0;
-    TicketValue value;
-};
-using ChangedParameters = std::vector<ChangedParameter>;
-
-class NotificationService
+class NotificationService final : public ChangeListener
 {
 public:
     // Records that wait for one session at most; a text counts as one for every KiB of it. A change that is
@@ -56,7 +44,7 @@ public:
     using Callback = std::function<void(Notification const&)>;
 
     NotificationService() = default;
-    ~NotificationService();  // not from a callback
+    ~NotificationService() override;  // not from a callback
     NotificationService(NotificationService const&) = delete;
     NotificationService& operator=(NotificationService const&) = delete;
 
@@ -77,16 +65,18 @@ public:
     // No callback of the session runs or will come when it returns, with the same exception.
     void Remove(Session const& session);
 
-    // Does anybody want to hear of the ticket? Costs next to nothing while nobody wants anything.
-    bool AreWanted(TicketAddress ticket) const;
+    // From the feed. Costs next to nothing while nobody wants anything.
+    bool Wants(TicketAddress ticket) const override;
+    void Created(TicketAddress ticket) noexcept override { Post(TicketCreated, ticket, {}); }
+    void Written(TicketAddress ticket, ChangedParameters&& parameters) noexcept override
+    {
+        Post(ParametersChanged, ticket, std::move(parameters));
+    }
+    void Deleted(TicketAddress ticket) noexcept override { Post(TicketDeleted, ticket, {}); }
 
-    // Leaves word of one change. Parameters are put in such an order that those of one key are neighbours.
-    void Post(NotificationKind kind, TicketAddress ticket, ChangedParameters changes = {}) noexcept;
-
-    // Leaves word for one session, whatever it has switched on; nothing if it has not registered. The keys
-    // outlive the service.
-    void Tell(unsigned long long session, NotificationKind kind, TicketAddress ticket,
-              ChangedParameters changes) noexcept;
+    // Notifies one session of the end of a transfer, whatever it has switched on or off; nothing if it has
+    // not registered. The keys outlive the service.
+    void TransferHasEnded(unsigned long long session, int code, ChangedParameters parameters) noexcept;
 
     // Begins no further callback, for good, and waits for a running one, but no longer than told.
     void Stop(std::chrono::milliseconds patience);
@@ -111,6 +101,7 @@ private:
         std::shared_ptr<Listener> listener;
         NotificationKind kind;
         TicketAddress ticket;
+        int code;
         ChangedParameters changes;
         std::size_t weight;
     };
@@ -119,6 +110,7 @@ private:
     Listener* Find(Session const& session, int id) const;
     bool RemoveOne(Session const& session, Lock& lock);
     void Withdraw(Listener& listener);
+    void Post(NotificationKind kind, TicketAddress ticket, ChangedParameters changes) noexcept;
     void Append(Message message);
     void Unqueue(Message& message);
     void WaitFor(int id, Lock& lock);

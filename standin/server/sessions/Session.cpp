@@ -39,7 +39,7 @@ std::filesystem::path Session::Folder(ClientFolder which) const
 
 std::shared_ptr<KeyFilter const> Session::LimitOf(TicketAddress address) const
 {
-    if (!m_limited.load(std::memory_order_acquire))
+    if (!IsLimited())
         return nullptr;
     std::lock_guard const lock(m_lock);
     auto const limit = m_limits.find(address);

@@ -2,7 +2,7 @@
 // Several threads may use one.
 #pragma once
 
-#include "standin/server/store/Storage.h"
+#include "standin/server/store/Store.h"
 #include "standin/server/tickets/KeyFilter.h"
 #include <atomic>
 #include <filesystem>
@@ -20,7 +20,7 @@ class Session
 public:
     Session(unsigned long long number, User user) : m_number(number), m_user(std::move(user)) {}
 
-    unsigned long long Number() const { return m_number; }  // 1 and up, none twice in a server's life
+    unsigned long long Number() const { return m_number; }  // 1 and up, none twice in the life of a site
     User const& Who() const { return m_user; }
     bool IsAdministrator() const { return m_user.role == AdministratorRole; }
 
@@ -43,6 +43,8 @@ public:
     // Limits what the session reads, walks over and writes of whatever ticket has that address. A filter that
     // selects every key lifts the limit.
     void Limit(TicketAddress address, KeyFilter keys);
+
+    bool IsLimited() const { return m_limited.load(std::memory_order_acquire); }  // of any ticket
 
     // Null if the session sees the ticket whole.
     std::shared_ptr<KeyFilter const> LimitOf(TicketAddress address) const;

@@ -85,16 +85,18 @@ Seed Seed::Parse(std::string_view text, std::string const& name)
     return seed;
 }
 
-StorageContent Seed::Content() const
+StoreContent Seed::Content() const
 {
-    StorageContent content;
+    StoreContent content;
     content.users = users;
     for (TicketXml const& ticket : tickets)
     {
-        content.changes.push_back({Change::CreateTicket, *ticket.address});
+        TicketChange& made = content.tickets.emplace_back();
+        made.kind = TicketChange::Create;
+        made.address = *ticket.address;
         ticket.Walk(
-            [&content, &ticket](std::string_view key, int pos, StoredValue const& value) {
-                content.changes.push_back({Change::PutValue, *ticket.address, key, pos, value});
+            [&made](std::string_view key, int pos, StoredValue const& value) {
+                made.parameters.push_back({std::string(key), pos, TicketValue::FromStored(value), false});
             });
     }
     return content;

@@ -2,8 +2,7 @@
 // the id of the user's own ticket of type 17 and a password hash, and with <ticket>s as in ticket files.
 #pragma once
 
-#include "standin/server/store/SqliteStorage.h"
-#include "standin/server/store/Storage.h"
+#include "standin/server/store/StoreContent.h"
 #include "standin/server/tickets/TicketXml.h"
 #include <filesystem>
 #include <string>
@@ -17,10 +16,10 @@ struct Seed
     std::vector<User> users;
     std::vector<TicketXml> tickets;  // each with an address
 
-    // Throws StorageError for a file that cannot be read, XmlError for what stands in it.
+    // Throws FileError for a file that cannot be read, XmlError for what stands in it.
     static Seed Read(std::filesystem::path const& file);
     static Seed Parse(std::string_view text, std::string const& name);
 
-    StorageContent Content() const;  // borrows keys and bytes from the seed
+    StoreContent Content() const;
 };
 }  // namespace standin

@@ -1,10 +1,10 @@
 #include "standin/server/site/Site.h"
 
 #include "standin/server/files/AtomicFile.h"
+#include "standin/server/files/Report.h"
 #include "standin/server/files/SiteFiles.h"
 #include "standin/server/site/Seed.h"
 #include "standin/server/site/SiteFolders.h"
-#include "standin/server/tickets/TicketXml.h"
 #include <cstdlib>
 #include <string>
 #include <string_view>
@@ -58,39 +58,105 @@ Seed SeedOfSite(std::filesystem::path const& folder, std::filesystem::path const
     }
     catch (XmlError const& error)
     {
-        throw StorageError(std::string(error.what()) +
-                           "; install the program again, or put a sound seed.xml into " + folder.string());
+        throw StoreError(std::string(error.what()) +
+                         "; install the program again, or put a sound seed.xml into " + folder.string());
     }
 }
 
-SqliteStorage OpenStorage(std::filesystem::path const& folder, std::filesystem::path const& shippedSeed)
+// COMGUI_DURABILITY=full: every write survives a power cut.
+Durability DurabilityFromEnvironment()
 {
-    std::filesystem::path const file = folder / "site.db";
-    Seed seed;  // lives until the database is filled
-    auto const first = [&seed, &folder, &shippedSeed]
+    std::string const wanted = FromEnvironment("COMGUI_DURABILITY").string();
+    if (wanted == "full")
+        return Durability::Full;
+    if (wanted.empty() || wanted == "normal")
+        return Durability::Process;
+    throw StoreError("COMGUI_DURABILITY is \"" + ForMessages(wanted) +
+                     "\"; it can be normal, which is the default, or full");
+}
+
+std::unique_ptr<SqliteStore> OpenStore(std::filesystem::path const& folder,
+                                       std::filesystem::path const& shippedSeed)
+{
+    auto const first = [&folder, &shippedSeed]
     {
-        seed = SeedOfSite(folder, shippedSeed);
+        Seed const seed = SeedOfSite(folder, shippedSeed);
         SetJobFoldersAside(folder / "job");  // the jobs that they belong to are gone
         return seed.Content();
     };
-    try
+    SqliteOptions options;
+    options.durability = DurabilityFromEnvironment();
+    options.keepOpening = true;
+    options.setAside = [&folder](DamagedStore const& damage)
     {
-        return SqliteStorage(file, first);
-    }
-    catch (DamagedStorage const& error)
-    {
-        Report(error.what());
-    }
-    SetAside(file, {"-wal", "-shm", "-journal", ""});
-    return SqliteStorage(file, first);
+        Report(damage.what());
+        SetAside(folder / "site.db", {"-wal", "-shm", "-journal", ""});
+    };
+    return std::make_unique<SqliteStore>(folder, first, std::move(options));
 }
 
 std::filesystem::path Prepared(std::filesystem::path const& folder)
 {
     std::filesystem::path absolute = MadeAbsolute(folder);
-    MakePrivateFolder(absolute);
+    MakePrivateFolders({absolute});
     return absolute;
 }
+
+bool Put(Server& server, std::string_view key, TicketValue value)
+{
+    TicketWrite write{key, -1, std::move(value)};
+    return server.Write(SystemTicket, {&write, 1}) && write.ok;
+}
+
+std::string TextOf(TicketSnapshot const& ticket, std::string_view key)
+{
+    KeyValues const* const values = ticket.Find(key);
+    TicketElement const* const element = values && values->Count() == 1 ? values->At(0) : nullptr;
+    return element && element->type == PARAM_STRING ? element->text->bytes : std::string();
+}
+
+// The site may have been moved, or copied from another machine.
+void KeepInstallFolder(Server& server, std::filesystem::path const& folder)
+{
+    std::string known;
+    bool const isThere = server.Tickets().LookAt(SystemTicket, 0,
+                                                 [&](TicketSnapshot const& ticket)
+                                                 {
+                                                     known = TextOf(ticket, InstallFolderKey);
+                                                     return true;
+                                                 });
+    if (!isThere)
+        server.Create(SystemTicket);
+    if (known != folder.string())
+        Put(server, InstallFolderKey, TicketValue::String(folder.string()));
+}
+
+void KeepFoldersReadable(Server& server, std::filesystem::path const& site)
+{
+    for (FolderFault& fault : FaultsOf(server.Tickets().Folders()))
+    {
+        Report(site.string() + ": " + fault.line);
+        Put(server, fault.key, std::move(fault.value));
+    }
+}
+
+// The folders that the system ticket places below the site. Those elsewhere are the owner's to make.
+std::vector<std::filesystem::path> FoldersOf(Server& server, std::filesystem::path const& site)
+{
+    constexpr std::string_view Below = "$(INSTALL)/";
+    std::vector<std::filesystem::path> folders;
+    for (std::string const& folder : server.Tickets().Folders().values)
+    {
+        if (!folder.starts_with(Below))
+            continue;
+        std::filesystem::path const below =
+            std::filesystem::path(folder.substr(Below.size())).lexically_normal();
+        if (below.is_relative() && !below.empty() && *below.begin() != "..")
+            folders.push_back(MadeAbsolute(site / below));
+    }
+    return folders;
+}
+
 }  // namespace
 
 std::filesystem::path Site::Folder()
@@ -101,94 +167,50 @@ std::filesystem::path Site::Folder()
         return MadeAbsolute(data / "comgui" / "site");
     if (std::filesystem::path const home = FromEnvironment("HOME"); !home.empty())
         return MadeAbsolute(home / ".local" / "share" / "comgui" / "site");
-    throw StorageError(
+    throw StoreError(
         "no folder for the site: neither COMGUI_SITE nor HOME is set; set COMGUI_SITE to a folder");
 }
 
-Site Site::Open(std::filesystem::path const& folder, std::filesystem::path const& seedFile)
-{
-    return {folder, seedFile};
-}
-
 Site::Site(std::filesystem::path const& folder, std::filesystem::path const& seedFile)
-    : m_folder(Prepared(folder)), m_lock(m_folder), m_storage(OpenStorage(m_folder, seedFile))
+    : m_folder(Prepared(folder)), m_store(OpenStore(m_folder, seedFile))
 {
-    for (char const* const file : {SeedFile, SystemTicketFile})
-        RemoveLeftovers(m_folder / file);
-    KeepInstallFolder();
-    KeepFoldersReadable();
-    MakeFolders();
-    SweepTransfers(m_storage, m_folder);
-    MirrorSystemTicket();
-}
-
-// The site may have been moved, or copied from another machine.
-void Site::KeepInstallFolder()
-{
-    std::string const folder = m_folder.string();
-    bool isTold = false;
-    m_storage.Load(SystemTicket,
-                   [&](std::string_view key, int pos, StoredValue const& value)
-                   {
-                       if (key == InstallFolderKey)
-                           isTold = pos == 0 && value.type == PARAM_STRING && value.bytes == folder;
-                   });
-    if (isTold)
-        return;
-    StoredValue value;
-    value.type = PARAM_STRING;
-    value.bytes = folder;
-    m_storage.Apply({{Change::CreateTicket, SystemTicket},
-                     {Change::DeleteKey, SystemTicket, InstallFolderKey},
-                     {Change::PutValue, SystemTicket, InstallFolderKey, 0, value}});
-}
-
-void Site::KeepFoldersReadable()
-{
-    FolderSettings const settings = FoldersIn(m_storage);
-    for (FolderFault const& fault : FaultsOf(settings))
-    {
-        Report(m_folder.string() + ": " + fault.line);
-        m_storage.Apply({{Change::DeleteKey, SystemTicket, fault.key},
-                         {Change::PutValue, SystemTicket, fault.key, 0, fault.value}});
-    }
-}
-
-// The server's own folders, and those that the system ticket places below the site. Folders elsewhere are
-// the owner's to make.
-void Site::MakeFolders()
-{
+    std::vector<std::filesystem::path> own;
     for (std::string_view const name : OwnFolders)
-        MakePrivateFolder(m_folder / name);
-    std::vector<std::filesystem::path> folders;
-    m_storage.Load(SystemTicket,
-                   [&folders](std::string_view key, int, StoredValue const& value)
-                   {
-                       constexpr std::string_view Below = "$(INSTALL)/";
-                       bool const isFolder =
-                           key.starts_with("System/Folders/") || key == "System/Linearisation/LAB";
-                       if (isFolder && value.type == PARAM_STRING && value.bytes.starts_with(Below))
-                           folders.emplace_back(value.bytes.substr(Below.size()));
-                   });
-    for (std::filesystem::path const& folder : folders)
-    {
-        std::filesystem::path const below = folder.lexically_normal();
-        if (below.is_relative() && !below.empty() && *below.begin() != "..")
-            MakePrivateFolder(m_folder / below);
-    }
+        own.push_back(m_folder / name);
+    MakePrivateFolders(own, MayBeUnflushed());
 }
 
-void Site::MirrorSystemTicket() noexcept
+void Site::PutInOrder(Server& server)
+{
+    if (m_store->WasFirst())
+    {
+        for (char const* const file : {SeedFile, SystemTicketFile})
+            RemoveLeftovers(m_folder / file);
+        KeepInstallFolder(server, m_folder);
+        KeepFoldersReadable(server, m_folder);
+    }
+    MakePrivateFolders(FoldersOf(server, m_folder), MayBeUnflushed());
+    if (m_store->WasFirst())
+    {
+        server.Tidy();
+        if (!m_store->EndedInOrder())
+            SweepJobFolders(server.Tickets(),
+                            m_folder);  // the rounds before may have had another install folder
+        server.Mirror().Write();
+    }
+    m_store->EndOpening();
+}
+
+// Whether a program that is gone may have made folders whose names a power cut takes away.
+bool Site::MayBeUnflushed() const { return m_store->WasFirst() && !m_store->EndedInOrder(); }
+
+void Site::Leave() noexcept
 {
     try
     {
-        TicketXml ticket;
-        ticket.address = SystemTicket;
-        m_storage.Load(SystemTicket, [&ticket](std::string_view key, int pos, StoredValue const& value)
-                       { ticket.Put(key, pos, value); });
-        ticket.Write(m_folder / SystemTicketFile);
+        m_store->Leave();
     }
-    catch (std::exception const& error)
+    catch (StoreError const& error)
     {
         Report(error.what());
     }

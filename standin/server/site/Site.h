@@ -1,21 +1,17 @@
-// The folder in which the embedded server keeps all that lasts, and the right to it:
+// The folder in which the embedded server keeps all that lasts:
 //
-//   site.db        tickets and users
+//   site.db        tickets, users and the journal of changes, with site.db-wal and site.db-shm while it is
+//   open site.lock      which programs have the site open, and the word by which they wake one another
 //   seed.xml       what a new site.db is filled with. The owner may edit it; after that, deleting site.db
-//                  while no server runs starts the site anew
-//   site.lock      who has the site
+//                  while no program has the site open starts the site anew
 //   tickets/       SYS_0000.xml, the system ticket for programs that read a local ticket file
 //   temp/ job/ upload/ preview/ log/ ...   the folders that the system ticket names
 //
-// A folder of the system ticket that would hold up its readers for good is switched off, and told too. What
-// processes that were killed have left of files and jobs on their way goes when the site is opened.
-//
-// What turns out damaged is told on stderr and set aside under NAME.damaged-DATE-TIME, never deleted.
-// For one thread at a time, as its storage is.
+// What turns out damaged is reported on stderr and set aside under NAME.damaged-DATE-TIME, never deleted.
 #pragma once
 
-#include "standin/server/site/SiteLock.h"
-#include "standin/server/store/SqliteStorage.h"
+#include "standin/server/site/Server.h"
+#include "standin/server/store/sqlite/SqliteStore.h"
 #include <filesystem>
 
 namespace standin
@@ -24,31 +20,32 @@ class Site
 {
 public:
     // The site of this user: $COMGUI_SITE, or else comgui/site in the folder for data of programs. Throws
-    // StorageError if the environment names no folder at all.
+    // StoreError if the environment names no folder at all.
     static std::filesystem::path Folder();
 
-    // Makes the folder, for this user alone, and what is missing in it; seedFile is the seed that comes with
-    // the program. Throws StorageError, with nothing lost, if the site is in use or cannot be written, if its
-    // database is of a newer version, or if a seed is needed and the program's own is missing or damaged.
-    static Site Open(std::filesystem::path const& folder, std::filesystem::path const& seedFile);
+    // Makes the folder, for this user alone, and the database if it is missing; seedFile is the seed that
+    // comes with the program. Throws StoreError or FileError, with nothing lost, if the site cannot be
+    // written, if its database is of a newer version, or if a seed is needed and the program's own is missing
+    // or damaged.
+    Site(std::filesystem::path const& folder, std::filesystem::path const& seedFile);
     Site(Site const&) = delete;
     Site& operator=(Site const&) = delete;
 
-    // Writes tickets/SYS_0000.xml from the storage: to be called after every change of the system ticket. The
-    // file is a copy, so a failure is told on stderr and stops nobody.
-    void MirrorSystemTicket() noexcept;
+    // Once the server is there: makes missing folders. The first program of several also clears up after
+    // those that died, notes where the site is, switches off a folder of the system ticket that would hold up
+    // its readers for good, and writes tickets/SYS_0000.xml.
+    void PutInOrder(Server& server);
+
+    // An orderly end; nothing of the site may be used any more. A failure is reported on stderr.
+    void Leave() noexcept;
 
     std::filesystem::path const& folder() const { return m_folder; }
-    Storage& storage() { return m_storage; }
+    Store& store() { return *m_store; }
 
 private:
-    Site(std::filesystem::path const& folder, std::filesystem::path const& seedFile);
-    void KeepInstallFolder();
-    void KeepFoldersReadable();
-    void MakeFolders();
+    bool MayBeUnflushed() const;
 
-    std::filesystem::path m_folder;  // absolute
-    SiteLock m_lock;                 // taken before and let go after the storage is touched
-    SqliteStorage m_storage;
+    std::filesystem::path const m_folder;  // absolute
+    std::unique_ptr<SqliteStore> m_store;
 };
 }  // namespace standin

@@ -60,11 +60,11 @@ struct TicketState
 struct ProgramInfo
 {
     ProgramId id = 0;
-    long process = 0;          // the operating system's number, on its machine
+    long process = 0;  // the operating system's number, on its machine
     std::string machine;
-    std::string name;          // of the executable
-    long long since = 0;       // when it opened the site, in seconds since 1970
-    Sequence heard = 0;        // up to which change it is known to have heard, see Maintain
+    std::string name;     // of the executable
+    long long since = 0;  // when it opened the site, in seconds since 1970
+    Sequence heard = 0;   // up to which change it is known to have heard, see Maintain
     bool isAlive = false;
 };
 
@@ -120,8 +120,8 @@ public:
     // that was acknowledged to anybody. One load, for any thread, at any time.
     virtual std::atomic<Sequence> const& Committed() const noexcept = 0;
 
-    // Every ticket, in ascending order of addresses. Returns the number of the last change that the listing
-    // has seen.
+    // Every ticket, in ascending order of addresses; take must not use the store. Returns the number of the
+    // last change that the listing has seen.
     virtual Sequence Tickets(std::function<void(TicketAddress, TicketState const&)> const& take) = 0;
 
     struct Loaded
@@ -140,12 +140,14 @@ public:
     // --- the feed
 
     // Hands out the changes behind that one, in order and without gaps, as many as are there but not more
-    // than a few thousand. False, with nothing handed out, if the journal begins later than that.
+    // than a few thousand, or some megabytes. take may use the store. False, with nothing handed out, if the
+    // journal begins later than that.
     virtual bool ChangesSince(Sequence after, std::function<void(CommittedChange&&)> const& take) = 0;
 
-    // Returns when Committed() is above that number, when the time is over, after Interrupt, or for no reason
-    // at all. It looks into the store itself before it returns at the end of the time, in case a program
-    // died between its commit and its ring.
+    // Returns when another handle has committed a change above that number, when the time is over, after
+    // Interrupt, or for no reason at all; for a change of this handle's own it need not. It looks into the
+    // store itself before it returns at the end of the time, in case a program died between its commit and
+    // its ring.
     virtual void WaitForChanges(Sequence heard, std::chrono::milliseconds time) = 0;
 
     // Lets a call of WaitForChanges that runs, or else the next one, return at once.
@@ -183,8 +185,8 @@ public:
     // --- users
 
     virtual std::optional<User> FindUser(std::string_view name) = 0;
-    virtual std::vector<User> Users() = 0;             // by name
-    virtual void PutUser(User const& user) = 0;        // makes or replaces
+    virtual std::vector<User> Users() = 0;               // by name
+    virtual void PutUser(User const& user) = 0;          // makes or replaces
     virtual bool RemoveUser(std::string_view name) = 0;  // false if there is no such user
 };
 }  // namespace standin

@@ -3,10 +3,9 @@
 // deletion of what is not there is no part of it, and an appended value has the position that it got.
 #pragma once
 
+#include "standin/server/tickets/ParameterChange.h"
 #include "standin/server/tickets/TicketAddress.h"
-#include "standin/server/tickets/TicketValue.h"
 #include <cstdint>
-#include <string>
 #include <vector>
 
 namespace standin
@@ -20,14 +19,6 @@ using Incarnation = Sequence;
 
 // Numbers the programs that have had the site open, from 1 up; none is given twice. 0: none.
 using ProgramId = std::int64_t;
-
-struct ParameterChange
-{
-    std::string key;
-    int pos = -1;           // -1: the whole key, which then has this value at 0 and no other; 0 and up: one value
-    TicketValue value{};    // PARAM_NONE: deleted
-    bool hadOthers = true;  // of pos -1: the key had values at other positions, which go
-};
 
 struct TicketChange
 {
@@ -43,7 +34,7 @@ struct TicketChange
         ThisProgram,  // the ticket goes when the program that commits this dies
         Nobody,
     };
-    static constexpr int NextId = -1;         // in the place of an id
+    static constexpr int NextId = -1;  // in the place of an id
     static constexpr Sequence AnyRevision = 0;
 
     Kind kind = Write;
@@ -57,6 +48,15 @@ struct TicketChange
     // had seen. Of a creation both are ignored, and filled in when it is read from the journal.
     Incarnation incarnation = 0;
     Sequence revision = AnyRevision;
+
+    // Other tickets that it was planned on, and that must be as they were then. Not kept in the journal.
+    struct Basis
+    {
+        TicketAddress address;
+        Incarnation incarnation;
+        Sequence revision;
+    };
+    std::vector<Basis> others;
 
     std::vector<ParameterChange> parameters;  // in order; of a creation what the ticket begins with
     Owner owner = Owner::Unchanged;           // not kept in the journal

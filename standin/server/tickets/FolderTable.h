@@ -4,52 +4,22 @@
 // replacing as long as a value begins with one. So such a value is kept out of the ticket.
 #pragma once
 
+#include "comgui/folders/Variables.h"
 #include "standin/server/tickets/StoredValue.h"
 #include <array>
+#include <iterator>
 #include <optional>
+#include <span>
 #include <string>
 #include <string_view>
 #include <vector>
 
 namespace standin
 {
-struct FolderRow
-{
-    char const* key;
-    char const* variable;
-};
-
-// In the order in which clients read them.
-inline constexpr std::array<FolderRow, 28> FolderRows = {{
-    {"System/InstallFolder", "INSTALL"},
-    {"System/Folders/Temp", "TEMP"},
-    {"System/Folders/Thumbnail", "THUMBNAIL"},
-    {"System/Folders/Print", "PRINT"},
-    {"System/Folders/RemoteIn", "REMOTE_IN"},
-    {"System/Folders/RemoteWCC", "REMOTE_WCC"},
-    {"System/Folders/RemoteOut", "REMOTE_OUT"},
-    {"System/Folders/Log", "LOG"},
-    {"System/Folders/Embedded", "EMBEDDED"},
-    {"System/Folders/Export", "EXPORT"},
-    {"System/Folders/Preview", "PREVIEW"},
-    {"System/Folders/Job", "JOB"},
-    {"System/Folders/PaperProfiles", "PAPER"},
-    {"System/Folders/ReferenceProfiles", "REFERENCE"},
-    {"System/Folders/Linearisation/Visual", "LIN_VISUAL"},
-    {"System/Folders/Linearisation/Measured", "LIN_MEASURED"},
-    {"System/Folders/Linearisation/Plate", "LIN_PLATE"},
-    {"System/Folders/Linearisation/SpotColor", "LIN_SPOTCOLOR"},
-    {"System/Folders/SpotcolorTable", "SPOTCOLORTAB"},
-    {"System/Folders/ControlStrip", "CONTROLSTRIP"},
-    {"System/Folders/Update", "UPDATES"},
-    {"System/Folders/Backup", "BACKUP"},
-    {"System/Folders/SPT", "SPT"},
-    {"System/Linearisation/LAB", "LABCORRECTION"},
-    {"System/Folders/Environments", "ENVIRONMENTS"},
-    {"System/Folders/Logo", "LOGO"},
-    {"System/Folders/HotFolder", "HOT"},
-    {"System/Folders/Analytics", "ANALYTICS"},
-}};
+// The library's, without the end mark, in the order in which clients read them.
+inline constexpr std::span<comgui::detail::FOLDER_VARIABLE const, std::size(comgui::detail::Variables) - 1>
+    FolderRows{comgui::detail::Variables, std::size(comgui::detail::Variables) - 1};
+using FolderRow = comgui::detail::FOLDER_VARIABLE;
 
 inline constexpr char UseFolderVariablesKey[] = "System/UseFolderVariables";
 

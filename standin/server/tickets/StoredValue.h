@@ -3,6 +3,8 @@
 #pragma once
 
 #include "comgui/ticket/PARAM_TYPE.h"
+#include <bit>
+#include <cstdint>
 #include <string_view>
 
 namespace standin
@@ -15,4 +17,12 @@ struct StoredValue
     void* pointer = nullptr;       // POINTER; lives in memory only, is never stored
     std::string_view bytes;        // STRING (no zero byte inside), BINSTRING
 };
+
+// Equal as bits, so that -0.0 differs from 0.0 and a NaN equals itself.
+inline bool IsSame(StoredValue const& left, StoredValue const& right)
+{
+    return left.type == right.type && left.integer == right.integer &&
+           std::bit_cast<std::uint64_t>(left.number) == std::bit_cast<std::uint64_t>(right.number) &&
+           left.pointer == right.pointer && left.bytes == right.bytes;
+}
 }  // namespace standin

@@ -1,13 +1,10 @@
-// One value as a ticket holds it in memory. Numbers and pointers stand bit by bit in one word, so that a
-// read is a copy; texts are kept apart, since a client may still hold the address of one that is gone from
-// the ticket.
+// One value of a ticket. Numbers and pointers are kept bit by bit in one word, so that a read is a copy;
+// texts are kept apart, since a client may still hold the address of one that is gone from its ticket.
 #pragma once
 
-#include "comgui/ticket/BIN_STRING.h"
 #include "standin/server/tickets/StoredValue.h"
 #include <atomic>
 #include <memory>
-#include <optional>
 #include <string>
 #include <utility>
 #include <vector>
@@ -18,33 +15,57 @@ struct TicketText
 {
     explicit TicketText(std::string_view text) : bytes(text) {}
 
+    // Notes that somebody outside has the address. Readers of a text that is already out write nothing.
+    void HandOut()
+    {
+        if (!handedOut.load(std::memory_order_relaxed))
+            handedOut.store(true, std::memory_order_relaxed);
+    }
+
     std::string const bytes;
-    std::atomic<bool> handedOut{false};  // some session has its address: set by readers, under a shared lock
+    std::atomic<bool> handedOut{false};
 };
 
 // Texts that a change took out of their ticket.
 using TicketTexts = std::vector<std::unique_ptr<TicketText>>;
 
+// Bytes behind the address of a number; 0 for a type that is none. A pointer counts as a number here.
+constexpr std::size_t SizeOfNumber(PARAM_TYPE type)
+{
+    switch (type)
+    {
+    case PARAM_INT:
+    case PARAM_UNSIGNED:
+        return 4;
+    case PARAM_DOUBLE:
+    case PARAM_INT64:
+    case PARAM_UNSIGNED64:
+    case PARAM_POINTER:
+        return 8;
+    default:
+        return 0;
+    }
+}
+
+// A value with its owner.
 struct TicketValue
 {
     PARAM_TYPE type = PARAM_NONE;
-    unsigned long long word = 0;       // every type but the two below
-    std::unique_ptr<TicketText> text;  // STRING, BINSTRING
+    unsigned long long word = 0;         // every type but the two below; the low bytes of a short number
+    std::unique_ptr<TicketText> text{};  // STRING, BINSTRING
 
-    // From the value word of a write. Nothing for what cannot be written: an unknown type, PARAM_COUNT,
-    // PARAM_NONE, a null word where an address is due, a BIN_STRING without bytes.
-    static std::optional<TicketValue> FromWrite(PARAM_TYPE type, void const* value);
+    // bytes: as many as the type has.
+    static TicketValue Number(PARAM_TYPE type, void const* bytes);
+    static TicketValue Text(PARAM_TYPE type, std::string_view bytes);
+    static TicketValue Int(int number) { return Number(PARAM_INT, &number); }
+    static TicketValue Int64(long long number) { return Number(PARAM_INT64, &number); }
+    static TicketValue String(std::string_view text) { return Text(PARAM_STRING, text); }
 
     static TicketValue FromStored(StoredValue const& stored);
-
-    // bytes points into this value.
-    StoredValue ToStored() const;
-
-    // Puts the value to where a read of its type wants it.
-    void CopyTo(void* out) const;
-
-    // The value word of a write of this value. It points into this value, for a BINSTRING at binary, which
-    // is filled in.
-    void const* Word(BIN_STRING& binary) const;
+    StoredValue ToStored() const;  // bytes points into this value
+    TicketValue Copy() const { return FromStored(ToStored()); }
 };
+
+// The same from the parts of a value that has no owner here.
+StoredValue ToStored(PARAM_TYPE type, unsigned long long word, TicketText const* text);
 }  // namespace standin

@@ -81,9 +81,25 @@ void TicketXml::Write(std::filesystem::path const& file) const
 {
     std::string const text = Text();
     if (text.size() > SizeLimit)
-        throw StorageError(file.string() + ": cannot be written: the ticket takes more than " +
-                           std::to_string(SizeLimit >> 20) + " MiB; delete values, then try again");
+        throw FileError(file.string() + ": cannot be written: the ticket takes more than " +
+                        std::to_string(SizeLimit >> 20) + " MiB; delete values, then try again");
     ReplaceFile(file, text);
+}
+
+TicketXml TicketXml::Of(std::optional<TicketAddress> address, TicketSnapshot const& ticket,
+                        KeyFilter const* limit)
+{
+    TicketXml xml;
+    xml.address = address;
+    ticket.ForEachKey(
+        [&](KeyValues const& values)
+        {
+            if (limit && !limit->Selects(values.Name()->Text()))
+                return;
+            for (TicketElement const& element : values.Elements())
+                xml.Put(values.Name()->Text(), element.pos, element.ToStored());
+        });
+    return xml;
 }
 
 std::string TicketXml::Text() const

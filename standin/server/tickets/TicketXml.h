@@ -19,8 +19,9 @@
 // Holds its values itself; no thread rule beyond that of any plain object.
 #pragma once
 
-#include "standin/server/tickets/StoredValue.h"
+#include "standin/server/tickets/KeyFilter.h"
 #include "standin/server/tickets/TicketAddress.h"
+#include "standin/server/tickets/TicketSnapshot.h"
 #include <cstddef>
 #include <filesystem>
 #include <functional>
@@ -44,13 +45,17 @@ class TicketXml
 public:
     static constexpr std::size_t SizeLimit = std::size_t{64} << 20;  // bytes of a file: 64 MiB
 
-    // Read throws StorageError for a file that cannot be read, both throw XmlError for what stands in it.
+    // Read throws FileError for a file that cannot be read, both throw XmlError for what stands in it.
     static TicketXml Read(std::filesystem::path const& file);
     static TicketXml Parse(std::string_view text, std::string const& name);
 
-    // Replaces the file as a whole; throws StorageError, also for more than Read would take.
+    // Replaces the file as a whole; throws FileError, also for more than Read would take.
     void Write(std::filesystem::path const& file) const;
     std::string Text() const;
+
+    // What a ticket holds, without its pointers, of the keys that the limit selects.
+    static TicketXml Of(std::optional<TicketAddress> address, TicketSnapshot const& ticket,
+                        KeyFilter const* limit = nullptr);
 
     // Takes the place of what stood there. PARAM_NONE and PARAM_POINTER leave nothing there.
     void Put(std::string_view key, int pos, StoredValue const& value);

@@ -1,6 +1,6 @@
 #include "standin/server/tickets/TicketXmlReader.h"
 
-#include "standin/server/tickets/KeyValues.h"
+#include "standin/server/tickets/TicketSnapshot.h"
 #include "standin/server/tickets/TicketXmlText.h"
 #include <algorithm>
 #include <charconv>

@@ -1,10 +1,12 @@
 #include "standin/server/transfer/PartFile.h"
 
 #include "standin/server/files/AtomicFile.h"
+#include "standin/server/files/Report.h"
 #include "standin/server/transfer/TransferError.h"
 #include <algorithm>
 #include <atomic>
 #include <cerrno>
+#include <climits>
 #include <fcntl.h>
 #include <sys/stat.h>
 
@@ -28,43 +30,28 @@ std::string NewPartName()
            ".tmp";
 }
 
-// A name that is taken stays: another machine or container that shares the folder may have a process of the
-// same number, and what that is writing must not come under our file's name.
-Descriptor MakePartFile(int folder, std::string& name)
+// The absolute path of an open folder.
+std::string PathOf(int folder)
 {
-    for (;;)
-    {
-        name = NewPartName();
-        Descriptor file(openat(folder, name.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_CLOEXEC, 0666));
-        if (file.Number() >= 0 || errno != EEXIST)
-            return file;
-    }
+#ifdef __APPLE__
+    char path[PATH_MAX];
+    return fcntl(folder, F_GETPATH, path) == 0 ? path : "";
+#else
+    std::error_code error;
+    return std::filesystem::read_symlink("/proc/self/fd/" + std::to_string(folder), error).string();
+#endif
 }
 
 // A terminal that is opened must not become the process's own, and a pipe not keep it waiting for a writer.
 constexpr int ToRead = O_RDONLY | O_NONBLOCK | O_NOCTTY | O_CLOEXEC;
 }  // namespace
 
-std::string ForMessages(std::string_view text)
-{
-    std::string shown(text);
-    std::replace_if(
-        shown.begin(), shown.end(), [](unsigned char byte) { return byte < 0x20 || byte == 0x7F; }, '?');
-    return shown;
-}
-
 bool IsPartFileName(std::string_view name) { return ProcessOf(name).has_value(); }
 
-void RemovePartFiles(std::filesystem::path const& folder, bool all)
+void RemovePartFile(std::filesystem::path const& file)
 {
-    std::error_code error;
-    std::filesystem::directory_iterator entry(folder, error);
-    for (; !error && entry != std::filesystem::directory_iterator(); entry.increment(error))
-    {
-        auto const process = ProcessOf(entry->path().filename().string());
-        if (process && (all || !IsAlive(*process)))
-            unlink(entry->path().c_str());
-    }
+    if (IsPartFileName(file.filename().string()))
+        unlink(file.c_str());
 }
 
 SourceFile::SourceFile(int folder, std::string const& name)
@@ -89,16 +76,17 @@ void SourceFile::Check(std::string const& shown, int reason)
         throw TransferError(reason == ENAMETOOLONG ? PathRefused
                             : reason == ENXIO      ? NotAFile
                                                    : SourceUnreadable,
-                            FileError(name, "cannot be read", reason).what());
+                            FileFault(name, "cannot be read", reason));
     struct stat found = {};
     if (fstat(m_file.Number(), &found) != 0)
-        throw TransferError(SourceUnreadable, FileError(name, "cannot be read", errno).what());
+        throw TransferError(SourceUnreadable, FileFault(name, "cannot be read", errno));
     if (!S_ISREG(found.st_mode))
         throw TransferError(NotAFile, name + ": no regular file; name a file");
     m_size = found.st_size;
 }
 
-PartFile::PartFile(int folder, std::string name) : m_folder(folder), m_name(std::move(name))
+PartFile::PartFile(Store& store, int folder, std::string name)
+    : m_store(store), m_folder(folder), m_name(std::move(name))
 {
     struct stat old = {};
     bool const isThere = fstatat(folder, m_name.c_str(), &old, AT_SYMLINK_NOFOLLOW) == 0;
@@ -108,25 +96,58 @@ PartFile::PartFile(int folder, std::string name) : m_folder(folder), m_name(std:
         throw TransferError(PathRefused, Shown() + ": a symbolic link; name the file that it points at");
     if (isThere && !S_ISREG(old.st_mode))
         throw TransferError(NotAFile, Shown() + ": something else than a file has that name; choose another");
-    std::string partName;
-    m_file = MakePartFile(folder, partName);
-    if (m_file.Number() < 0)
-        Fail(errno);
-    m_partName = std::move(partName);
+    MakeFile();
     if (isThere)
         fchmod(m_file.Number(), old.st_mode & 07777);
 }
 
+// A name that is taken stays: another machine or container that shares the folder may have a process of the
+// same number, and what that is writing must not come under our file's name.
+void PartFile::MakeFile()
+{
+    for (;;)
+    {
+        std::string name = NewPartName();
+        m_partPath = PathOf(m_folder) + "/" + name;
+        m_store.AddPartFile(m_partPath);
+        m_file = Descriptor(openat(m_folder, name.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_CLOEXEC, 0666));
+        int const reason = errno;
+        if (m_file.Number() >= 0)
+        {
+            m_partName = std::move(name);
+            return;
+        }
+        Forget();
+        if (reason != EEXIST)
+            Fail(reason);
+    }
+}
+
+// A note too many does no harm: it goes with the program.
+void PartFile::Forget() noexcept
+{
+    try
+    {
+        m_store.RemovePartFile(m_partPath);
+    }
+    catch (std::exception const& error)
+    {
+        Report(error.what());
+    }
+}
+
 PartFile::~PartFile()
 {
-    if (!m_partName.empty())
-        unlinkat(m_folder, m_partName.c_str(), 0);
+    if (m_partName.empty())
+        return;
+    unlinkat(m_folder, m_partName.c_str(), 0);
+    Forget();
 }
 
 void PartFile::Fail(int reason) const
 {
     throw TransferError(reason == ENAMETOOLONG ? PathRefused : TargetUnwritable,
-                        FileError(Shown(), "cannot be written", reason).what());
+                        FileFault(Shown(), "cannot be written", reason));
 }
 
 void PartFile::FailAsCut() const
@@ -190,7 +211,7 @@ ssize_t PartFile::CopyPiece(SourceFile const& source, off_t at, std::size_t size
     while (count < 0 && errno == EINTR);
     int const reason = errno;
     if (count < 0)
-        throw TransferError(SourceUnreadable, FileError(Shown(), "the source cannot be read", reason).what());
+        throw TransferError(SourceUnreadable, FileFault(Shown(), "the source cannot be read", reason));
     for (ssize_t done = 0; done < count;)
     {
         ssize_t const written = pwrite(m_file.Number(), m_buffer.data() + done,
@@ -202,13 +223,18 @@ ssize_t PartFile::CopyPiece(SourceFile const& source, off_t at, std::size_t size
     return count;
 }
 
-// Not flushed to the disk: as with tickets, what is acknowledged outlives the process and not a power cut.
-void PartFile::Finish()
+void PartFile::Finish(Survives what)
 {
+    // Always: else a power cut could leave the name with half of the file, and the old one gone.
+    if (fsync(m_file.Number()) != 0)
+        Fail(errno);
     if (!m_file.Close())
         Fail(errno);
     if (renameat(m_folder, m_partName.c_str(), m_folder, m_name.c_str()) != 0)
         Fail(errno);
     m_partName.clear();
+    Forget();
+    if (what == Survives::PowerCut && !FlushFolder(m_folder))
+        Fail(errno);
 }
 }  // namespace standin

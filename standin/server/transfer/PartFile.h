@@ -1,9 +1,11 @@
 // A file while it is being transferred. It has another name until it is whole, in the folder where it will
-// lie, so that whoever finds the real name finds the whole file: the old one or the new one. A process that
-// is killed leaves the other name behind, and RemovePartFiles takes it away.
+// lie, so that whoever finds the real name finds the whole file: the old one or the new one. The store has
+// note of the other name, so that it goes when the program dies meanwhile.
 #pragma once
 
 #include "standin/server/files/Descriptor.h"
+#include "standin/server/files/Report.h"
+#include "standin/server/store/Store.h"
 #include <filesystem>
 #include <functional>
 #include <string>
@@ -12,14 +14,10 @@
 
 namespace standin
 {
-// A text with its control characters replaced, for a message of one line.
-std::string ForMessages(std::string_view text);
-
 bool IsPartFileName(std::string_view name);
 
-// Removes the part files in a folder. Those of a process that lives are left alone, unless all is set:
-// whoever has the site knows that no other process works in its folders.
-void RemovePartFiles(std::filesystem::path const& folder, bool all);
+// Removes what a program that died has left; nothing if the path is not one of a part file.
+void RemovePartFile(std::filesystem::path const& file);
 
 // A regular file that is read. Throws TransferError.
 class SourceFile
@@ -42,9 +40,9 @@ private:
 class PartFile
 {
 public:
-    // folder stays open as long as this lives. A file of that name that is there already gives its
-    // permissions; anything else of that name is refused. Throws TransferError.
-    PartFile(int folder, std::string name);
+    // folder and store stay as long as this lives. A file of that name that is there already gives its
+    // permissions; anything else of that name is refused. Throws TransferError and StoreError.
+    PartFile(Store& store, int folder, std::string name);
     ~PartFile();
     PartFile(PartFile const&) = delete;
     PartFile& operator=(PartFile const&) = delete;
@@ -53,8 +51,14 @@ public:
     // throws passes through. Throws TransferError.
     void CopyFrom(SourceFile const& source, std::size_t piece, std::function<void(off_t done)> const& after);
 
-    // Gives it its name, in the place of a file that had it. Throws TransferError.
-    void Finish();
+    // Gives it its name, in the place of a file that had it. Throws TransferError. What has the name after a
+    // power cut is the old file or the whole new one; with Survives::PowerCut it is the new one.
+    enum class Survives
+    {
+        EndOfProcess,
+        PowerCut,
+    };
+    void Finish(Survives what);
 
 private:
     void CopyRange(SourceFile const& source, off_t begin, off_t end, std::size_t piece,
@@ -64,9 +68,14 @@ private:
     [[noreturn]] void FailAsCut() const;
     std::string Shown() const { return ForMessages(m_name); }
 
+    void MakeFile();
+    void Forget() noexcept;
+
+    Store& m_store;
     int m_folder;
     std::string m_name;
     std::string m_partName;
+    std::string m_partPath;        // as the store has it
     bool m_copiesDirectly = true;  // the system copies from file to file, until it turns out that it cannot
     std::string m_buffer;
     Descriptor m_file;

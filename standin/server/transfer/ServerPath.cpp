@@ -1,6 +1,6 @@
 #include "standin/server/transfer/ServerPath.h"
 
-#include "standin/server/files/AtomicFile.h"
+#include "standin/server/files/FileError.h"
 #include "standin/server/transfer/PartFile.h"
 #include "standin/server/transfer/TransferError.h"
 #include <algorithm>
@@ -49,7 +49,7 @@ public:
         m_folder = Descriptor(open(folder.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
         int const reason = errno;
         if (m_folder.Number() < 0 && (reason == ENOENT || reason == ENOTDIR))
-            Refuse(m_shown, FileError(folder, "the folder of the variable is not there", reason).what());
+            Refuse(m_shown, FileFault(folder, "the folder of the variable is not there", reason));
         if (m_folder.Number() < 0)
             FailAtFolder(folder, reason);
         Check();
@@ -74,7 +74,7 @@ private:
     [[noreturn]] void FailAtFolder(std::string const& folder, int reason) const
     {
         throw TransferError(m_purpose == Purpose::Read ? SourceUnreadable : TargetUnwritable,
-                            FileError(m_shown, "the folder " + folder + " cannot be opened", reason).what());
+                            FileFault(m_shown, "the folder " + folder + " cannot be opened", reason));
     }
 
     bool IsLink(std::string const& name) const
@@ -89,7 +89,7 @@ private:
     {
         struct stat found = {};
         if (fstat(m_folder.Number(), &found) != 0)
-            Refuse(m_shown, FileError("a folder on the way", "cannot be looked at", errno).what());
+            Refuse(m_shown, FileFault("a folder on the way", "cannot be looked at", errno));
         Identity const identity{found.st_dev, found.st_ino};
         if (m_site == identity || m_install == identity)
             Refuse(m_shown, "the server keeps its own files there; choose another folder");

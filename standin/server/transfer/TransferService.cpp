@@ -1,8 +1,7 @@
 #include "standin/server/transfer/TransferService.h"
 
 #include "standin/server/files/AtomicFile.h"
-#include "standin/server/files/SiteFiles.h"
-#include "standin/server/site/TicketServer.h"
+#include "standin/server/files/Report.h"
 #include <algorithm>
 #include <cerrno>
 #include <fcntl.h>
@@ -11,15 +10,6 @@ namespace standin
 {
 namespace
 {
-ChangedParameter Record(Key key, PARAM_TYPE type, long long integer, std::string_view text)
-{
-    StoredValue value;
-    value.type = type;
-    value.integer = integer;
-    value.bytes = text;
-    return {key, -1, TicketValue::FromStored(value)};
-}
-
 // A link stays a link, and what it points at is replaced.
 std::filesystem::path Followed(std::filesystem::path const& file)
 {
@@ -33,7 +23,7 @@ Descriptor OpenClientFolder(std::filesystem::path const& folder)
     Descriptor opened(open(folder.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
     if (opened.Number() < 0)
         throw TransferError(TargetUnwritable,
-                            FileError(ForMessages(folder.string()), "cannot be opened", errno).what());
+                            FileFault(ForMessages(folder.string()), "cannot be opened", errno));
     return opened;
 }
 
@@ -83,21 +73,21 @@ off_t TransferService::CarryNow(Request const& request, RunningTransfer const& r
     {
         ServerPath const to = ServerPath::Parse(request.target, LeafOf(request.source));
         SourceFile const source(ClientPath(request.source));
-        Descriptor const folder = OpenFolderOf(to, m_server.Folders(), Purpose::Write, m_site);
-        PartFile target(folder.Number(), to.name);
+        Descriptor const folder = OpenFolderOf(to, Folders(), Purpose::Write, m_site);
+        PartFile target(m_store, folder.Number(), to.name);
         Copy(target, source, running);
-        target.Finish();
+        target.Finish(PartFile::Survives::EndOfProcess);
         return source.Size();
     }
     ServerPath const from = ServerPath::Parse(request.source, "");
-    Descriptor const folder = OpenFolderOf(from, m_server.Folders(), Purpose::Read, m_site);
+    Descriptor const folder = OpenFolderOf(from, Folders(), Purpose::Read, m_site);
     SourceFile const source(folder.Number(), from.name);
     std::filesystem::path file = ClientPath(request.target);
     file = Followed(file.has_filename() ? file : file / from.name);
     Descriptor const clientFolder = OpenClientFolder(file.parent_path());
-    PartFile target(clientFolder.Number(), file.filename().string());
+    PartFile target(m_store, clientFolder.Number(), file.filename().string());
     Copy(target, source, running);
-    target.Finish();
+    target.Finish(PartFile::Survives::EndOfProcess);
     return source.Size();
 }
 
@@ -158,7 +148,7 @@ TransferResult TransferService::CarryLater(Session const& session, Request reque
                 local = ClientPath(local).string();
                 ServerPath const path = ServerPath::Parse(toServer ? request.target : request.source,
                                                           toServer ? LeafOf(request.source) : "");
-                OpenFolderOf(path, m_server.Folders(), toServer ? Purpose::Write : Purpose::Read, m_site);
+                OpenFolderOf(path, Folders(), toServer ? Purpose::Write : Purpose::Read, m_site);
             });
     if (result != Transferred)
         return result;
@@ -195,19 +185,19 @@ void TransferService::Work()
 
 void TransferService::Tell(Waiting const& done, TransferResult result, off_t size)
 {
-    static auto const& source = *new std::string("Transfer/Source");
-    static auto const& target = *new std::string("Transfer/Target");
-    static auto const& code = *new std::string("Transfer/Code");
-    static auto const& bytes = *new std::string("Transfer/Size");
+    static KeyPool& keys = *new KeyPool;
+    static Key const source = keys.Intern("Transfer/Source");
+    static Key const target = keys.Intern("Transfer/Target");
+    static Key const code = keys.Intern("Transfer/Code");
+    static Key const bytes = keys.Intern("Transfer/Size");
     try
     {
         ChangedParameters records;
-        records.push_back(Record(&source, PARAM_STRING, 0, done.asked.source));
-        records.push_back(Record(&target, PARAM_STRING, 0, done.asked.target));
-        records.push_back(Record(&code, PARAM_INT, result, {}));
-        records.push_back(Record(&bytes, PARAM_INT64, size, {}));
-        m_server.Notifications().Tell(done.session, TransferEnded, {SystemTicket.type, result},
-                                      std::move(records));
+        records.push_back({source, -1, TicketValue::String(done.asked.source)});
+        records.push_back({target, -1, TicketValue::String(done.asked.target)});
+        records.push_back({code, -1, TicketValue::Int(result)});
+        records.push_back({bytes, -1, TicketValue::Int64(size)});
+        m_notifications.TransferHasEnded(done.session, result, std::move(records));
     }
     catch (std::exception const& error)
     {

@@ -5,7 +5,8 @@
 // A path of the client's side is UTF-8; backslashes in it are separators, as in the paths of ticket files.
 #pragma once
 
-#include "standin/server/sessions/Session.h"
+#include "standin/server/sessions/NotificationService.h"
+#include "standin/server/sessions/TicketService.h"
 #include "standin/server/transfer/PartFile.h"
 #include "standin/server/transfer/ServerPath.h"
 #include "standin/server/transfer/TransferError.h"
@@ -17,8 +18,6 @@
 
 namespace standin
 {
-class TicketServer;
-
 // A transfer on its way, which may be cut from outside.
 class RunningTransfer
 {
@@ -37,7 +36,12 @@ private:
 class TransferService
 {
 public:
-    explicit TransferService(TicketServer& server) : m_server(server) {}
+    // site: its folder, where nothing is put nor fetched, whatever the system ticket has for $(INSTALL).
+    TransferService(Store& store, TicketService& tickets, NotificationService& notifications,
+                    std::filesystem::path const& site)
+        : m_store(store), m_tickets(tickets), m_notifications(notifications), m_site(site)
+    {
+    }
     ~TransferService();  // cuts what runs
     TransferService(TransferService const&) = delete;
     TransferService& operator=(TransferService const&) = delete;
@@ -80,10 +84,6 @@ public:
     };
     void Set(Pace pace) { m_pace = std::move(pace); }
 
-    // The folder of the site: nothing is put there or fetched from there, whatever the system ticket has for
-    // $(INSTALL). To be told before the first transfer.
-    void KeepOut(std::filesystem::path const& site) { m_site = site; }
-
     // What the transfer calls after a piece: checks for a cut, then told.
     void Copy(PartFile& target, SourceFile const& source, RunningTransfer const& running,
               std::function<void(off_t done)> const& told = {}) const;
@@ -106,8 +106,12 @@ private:
     void Work();
     void Tell(Waiting const& done, TransferResult result, off_t size);
 
-    TicketServer& m_server;
-    std::string m_site;
+    FolderTable Folders() { return FolderTable(m_tickets.Folders().values); }
+
+    Store& m_store;
+    TicketService& m_tickets;
+    NotificationService& m_notifications;
+    std::string const m_site;
     Pace m_pace;
 
     std::mutex m_lock;  // the members below

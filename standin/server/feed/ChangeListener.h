@@ -1,0 +1,32 @@
+// Who hears of the changes of a site, from whichever program they come.
+#pragma once
+
+#include "standin/server/store/TicketChange.h"
+#include "standin/server/tickets/KeyPool.h"
+
+namespace standin
+{
+// A value as one change left it; PARAM_NONE: deleted. pos is -1 for a key that was written anew or deleted.
+struct ChangedParameter
+{
+    Key key = nullptr;
+    int pos = 0;
+    TicketValue value{};
+};
+using ChangedParameters = std::vector<ChangedParameter>;
+
+class ChangeListener
+{
+public:
+    virtual ~ChangeListener() = default;
+
+    // Whether changes of that ticket are to be heard of. The feed spares itself work for others.
+    virtual bool Wants(TicketAddress ticket) const = 0;
+
+    // Called for one change after the other, in the order of the commits, under the feed's lock: neither may
+    // wait for anything, nor use the feed. Of a creation the parameters come apart, as a write behind it.
+    virtual void Created(TicketAddress ticket) noexcept = 0;
+    virtual void Written(TicketAddress ticket, ChangedParameters&& parameters) noexcept = 0;
+    virtual void Deleted(TicketAddress ticket) noexcept = 0;
+};
+}  // namespace standin

@@ -1,0 +1,99 @@
+#include "standin/server/sessions/TicketService.h"
+
+namespace standin
+{
+bool TicketService::MayWrite(Session const& session, TicketAddress address)
+{
+    if (session.Ended())
+        return false;
+    if (address.type == SystemTicket.type)
+        return session.IsAdministrator();
+    if (address.type == UserTicketType)
+        return session.IsAdministrator() || address.id == session.Who().ticketId;
+    return true;
+}
+
+std::optional<std::vector<WalkedValue>> TicketService::Values(Session const& session, TicketAddress address,
+                                                              Incarnation incarnation,
+                                                              std::string_view prefix)
+{
+    std::vector<WalkedValue> found;
+    bool const isThere = Look(session, address, incarnation,
+                              [&](TicketSnapshot const& ticket, KeyFilter const* limit)
+                              {
+                                  for (KeyValues const* const values : ticket.Sorted(prefix))
+                                      for (TicketElement const& element : values->Elements())
+                                      {
+                                          if (limit && !limit->Selects(values->Name()->Text()))
+                                              continue;
+                                          if (element.IsText())
+                                              element.text->HandOut();
+                                          found.push_back({values->Name(), element});
+                                      }
+                                  return true;
+                              });
+    return isThere ? std::optional(std::move(found)) : std::nullopt;
+}
+
+bool TicketService::Write(Session const& session, TicketAddress address, Incarnation incarnation,
+                          std::span<TicketWrite> writes)
+{
+    if (MayWrite(session, address))
+        return m_writer.Write({address, incarnation}, writes, {session.LimitOf(address).get()});
+    for (TicketWrite& write : writes)
+        write.ok = false;
+    return false;
+}
+
+bool TicketService::Create(Session const& session, TicketAddress address)
+{
+    return IsValid(address) && MayWrite(session, address) && m_writer.Create({address});
+}
+
+int TicketService::CreateNext(Session const& session, int type)
+{
+    // Of users' tickets nobody's own is a new one, so the id does not matter to the right.
+    if (!IsValid({type, 0}) || !MayWrite(session, {type, TicketChange::NextId}))
+        return -1;
+    auto const made = m_writer.Create({{type, TicketChange::NextId}});
+    return made ? made->address.id : -1;
+}
+
+bool TicketService::Delete(Session const& session, TicketAddress address)
+{
+    if (address.type == SystemTicket.type || !MayWrite(session, address))
+        return false;
+    if (address.type == UserTicketType && !session.IsAdministrator())
+        return false;  // a user's ticket goes with the user, and that is not the user's to decide
+    return m_writer.Delete({address, 0});
+}
+
+std::optional<int> TicketService::Int(TicketAddress address, std::string_view key)
+{
+    std::optional<int> number;
+    LookAt(address, 0,
+           [&](TicketSnapshot const& ticket)
+           {
+               KeyValues const* const values = ticket.Find(key);
+               TicketElement const* const element = values ? values->At(0) : nullptr;
+               if (element && element->type == PARAM_INT)
+                   number = static_cast<int>(element->word);
+               return true;
+           });
+    return number;
+}
+
+FolderSettings TicketService::Folders(TicketSnapshot::Version* which)
+{
+    FolderSettings folders;
+    LookAt(SystemTicket, 0,
+           [&](TicketSnapshot const& ticket)
+           {
+               folders = FoldersOf(&ticket);
+               if (which)
+                   *which = ticket.Which();
+               return true;
+           });
+    return folders;
+}
+}  // namespace standin

@@ -1,0 +1,77 @@
+#include "standin/server/site/Caretaker.h"
+
+#include "standin/server/files/Report.h"
+#include "standin/server/site/SiteFolders.h"
+#include "standin/server/transfer/PartFile.h"
+
+namespace standin
+{
+namespace
+{
+constexpr std::chrono::milliseconds Pause(700);  // what a dead program has left goes within two seconds
+}
+
+Caretaker::Caretaker(Store& store, Feed& feed, TicketService& tickets, TicketWriter& writer,
+                     SystemTicketMirror& mirror, std::filesystem::path site)
+    : m_store(store), m_feed(feed), m_tickets(tickets), m_writer(writer), m_mirror(mirror),
+      m_site(std::move(site))
+{
+    m_thread = std::thread([this] { Run(); });
+}
+
+void Caretaker::Stop()
+{
+    {
+        std::lock_guard const lock(m_lock);
+        m_isStopped = true;
+    }
+    m_end.notify_all();
+    if (m_thread.joinable())
+        m_thread.join();
+}
+
+void Caretaker::Run()
+{
+    for (std::unique_lock lock(m_lock); !m_isStopped;)
+    {
+        lock.unlock();
+        Tidy();
+        lock.lock();
+        m_end.wait_for(lock, Pause, [this] { return m_isStopped; });
+    }
+}
+
+void Caretaker::Tidy() noexcept
+{
+    std::lock_guard const round(m_round);
+    try
+    {
+        m_store.Maintain(m_feed.Heard());
+        if (m_store.Bury([this](Estate const& estate) { Clear(estate); }) > 0)
+        {
+            SweepJobFolders(m_tickets, m_site);
+            m_mirror.Write();  // it may have died between a change and the copy of it
+        }
+        m_hasReported = false;
+    }
+    catch (std::exception const& error)
+    {
+        if (!m_hasReported)
+            Report(error.what());
+        m_hasReported = true;
+    }
+}
+
+void Caretaker::Clear(Estate const& estate)
+{
+    for (std::string const& file : estate.partFiles)
+        RemovePartFile(file);
+    for (Estate::Ticket const& ticket : estate.tickets)
+    {
+        bool const isGone = m_writer.Delete({ticket.address, ticket.incarnation}) ||
+                            m_tickets.IncarnationOf(ticket.address) != ticket.incarnation;
+        if (!isGone)
+            throw StoreError("a job of a program that has died cannot be deleted; see the line before");
+    }
+}
+}  // namespace standin

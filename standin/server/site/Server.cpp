@@ -1,0 +1,72 @@
+#include "standin/server/site/Server.h"
+
+#include "standin/server/files/Report.h"
+#include "standin/server/jobs/JobFolder.h"
+#include "standin/server/sessions/Password.h"
+
+namespace standin
+{
+Server::Server(Store& store, TextKeeper& texts, std::filesystem::path const& site)
+    : m_store(store), m_feed(store, m_notifications, texts), m_writer(store, m_feed, *this),
+      m_tickets(m_feed, m_writer), m_mirror(m_tickets, site),
+      m_transfers(store, m_tickets, m_notifications, site), m_jobs(store, m_tickets, m_writer, m_transfers),
+      m_caretaker(store, m_feed, m_tickets, m_writer, m_mirror, site)
+{
+}
+
+Server::~Server() = default;
+
+std::shared_ptr<Session> Server::Login(std::string const& user, std::string const& password)
+{
+    std::optional<User> known = m_store.FindUser(user);
+    // Slow by intent; and as slow for a user who does not exist.
+    if (!known)
+    {
+        Password::VerifyNobody(password);
+        return nullptr;
+    }
+    if (!Password::Verify(password, known->passwordHash))
+        return nullptr;
+    auto const number = static_cast<unsigned long long>(m_store.OpenSession(user));
+    return std::make_shared<Session>(number, std::move(*known));
+}
+
+bool Server::Logout(Session& session)
+{
+    if (!session.End())
+        return false;
+    m_transfers.End(session);
+    m_jobs.End(session);
+    m_notifications.Remove(session);
+    try
+    {
+        m_store.CloseSession(static_cast<long long>(session.Number()));
+    }
+    catch (StoreError const& error)
+    {
+        Report(error.what());  // the row goes with this program
+    }
+    return true;
+}
+
+void Server::Stop(std::chrono::milliseconds patience)
+{
+    m_transfers.Stop(patience);
+    m_notifications.Stop(patience);
+    m_caretaker.Stop();
+    m_feed.Stop();
+}
+
+// A job's folder goes with its ticket.
+std::function<void()> Server::WhenDeleted(TicketAddress ticket, TicketSnapshot const& last)
+{
+    if (ticket.type != JobTicketType)
+        return {};
+    KeyValues const* const values = last.Find(std::string_view(JobMarkKey));
+    TicketElement const* const mark = values ? values->At(0) : nullptr;
+    if (!mark || mark->type != PARAM_STRING)
+        return {};
+    return [this, id = ticket.id, text = mark->text->bytes]
+    { RemoveJobFolder(FolderTable(m_tickets.Folders().values), id, text); };
+}
+}  // namespace standin

@@ -1,0 +1,62 @@
+// The ticket server of one site, put together: what a client can ask for, over one store. Users log in here;
+// all else is done by the services. For any thread.
+#pragma once
+
+#include "standin/server/jobs/JobIntake.h"
+#include "standin/server/site/Caretaker.h"
+#include "standin/server/site/SystemTicketMirror.h"
+
+namespace standin
+{
+class Server final : private AfterChange
+{
+public:
+    // site: its folder. Store and texts outlive the server. Throws StoreError.
+    Server(Store& store, TextKeeper& texts, std::filesystem::path const& site);
+    ~Server() override;  // not while a call is on its way
+    Server(Server const&) = delete;
+    Server& operator=(Server const&) = delete;
+
+    // Null for a wrong user or password, which are not told apart. Throws StoreError.
+    std::shared_ptr<Session> Login(std::string const& user, std::string const& password);
+
+    // False if it had ended before. Waits for the end of a notification callback that runs for the session,
+    // and of its transfers, which are cut. Jobs that it has prepared and not sent go.
+    bool Logout(Session& session);
+
+    TicketService& Tickets() { return m_tickets; }
+    NotificationService& Notifications() { return m_notifications; }
+    TransferService& Transfers() { return m_transfers; }
+    JobIntake& Jobs() { return m_jobs; }
+    SystemTicketMirror& Mirror() { return m_mirror; }
+
+    // The site's own changes of a ticket, whoever may write it; false as those of TicketWriter.
+    bool Write(TicketAddress ticket, std::span<TicketWrite> writes)
+    {
+        return m_writer.Write({ticket, 0}, writes, {});
+    }
+    bool Create(TicketAddress ticket) { return m_writer.Create({ticket}).has_value(); }
+
+    // Clears up at once what programs that died have left; else that happens every now and then.
+    void Tidy() { m_caretaker.Tidy(); }
+
+    // For the end of the process: transfers are cut and no callback begins any more. What runs is waited for,
+    // but not longer than that.
+    void Stop(std::chrono::milliseconds patience);
+
+private:
+    void SystemTicketChanged() noexcept override { m_mirror.Write(); }
+    std::function<void()> WhenDeleted(TicketAddress ticket, TicketSnapshot const& last) override;
+
+    // In the order in which one leans on the other.
+    Store& m_store;
+    NotificationService m_notifications;
+    Feed m_feed;
+    TicketWriter m_writer;
+    TicketService m_tickets;
+    SystemTicketMirror m_mirror;
+    TransferService m_transfers;
+    JobIntake m_jobs;
+    Caretaker m_caretaker;
+};
+}  // namespace standin

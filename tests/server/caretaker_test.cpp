@@ -1,0 +1,251 @@
+// What programs that died have left on a site, and what of it those that live take away.
+#include "standin/server/site/Caretaker.h"
+
+#include "standin/server/jobs/JobFolder.h"
+#include "tests/server/MemoryFolder.h"
+#include "tests/server/Program.h"
+#include "tests/server/StoredValues.h"
+#include "tests/support/Files.h"
+#include <gmock/gmock.h>
+#include <thread>
+
+using namespace standin;
+using testing::ElementsAre;
+using testing::IsEmpty;
+namespace fs = std::filesystem;
+
+namespace
+{
+class LeftByTheDead : public testing::Test
+{
+protected:
+    LeftByTheDead()
+    {
+        for (char const* const name : {"tickets", "temp", "job"})
+            fs::create_directory(folder / name);
+        site->Put(SystemTicket, "System/Folders/Job", 0, Bytes(PARAM_STRING, (folder / "job").string()));
+        site->AddTicket({JobTicketType, 1});
+        living = std::make_unique<Program>(site, folder.Path());
+        dying = std::make_unique<Program>(site, folder.Path());
+    }
+
+    void Make(std::string const& name) const
+    {
+        fs::create_directories((folder / name).parent_path());
+        WriteFile(folder / name, "content");
+    }
+    bool Has(std::string const& name) const { return fs::exists(folder / name); }
+
+    int Prepare()
+    {
+        int id = -1;
+        EXPECT_EQ(dying->server.Jobs().Prepare(dying->session, {"job.pdf"}, id), Transferred);
+        return id;
+    }
+    // The name of the file by which the folder of a job is known.
+    std::string MarkOf(int id) { return ".job-" + living->Text({JobTicketType, id}, JobMarkKey); }
+
+    // Ends the one and has the other clear up after it, once, here and now: its threads rest.
+    void Kill()
+    {
+        living->server.Stop(std::chrono::minutes(1));
+        testing::internal::CaptureStderr();
+        dying->store.Die();
+        dying.reset();
+        testing::internal::GetCapturedStderr();  // its threads have noticed
+        living->server.Tidy();
+        EXPECT_EQ(living->store.Programs().size(), 1u);
+    }
+
+    std::vector<int> Jobs()
+    {
+        std::vector<int> ids;
+        for (int id = living->Tickets().NextTicket(JobTicketType, -1); id >= 0;
+             id = living->Tickets().NextTicket(JobTicketType, id))
+            ids.push_back(id);
+        return ids;
+    }
+
+    std::string const OtherMark = ".job-0123456789abcdef";
+    MemoryFolder folder;
+    std::shared_ptr<MemorySite> site = std::make_shared<MemorySite>();
+    std::unique_ptr<Program> living;
+    std::unique_ptr<Program> dying;
+};
+}  // namespace
+
+TEST_F(LeftByTheDead, PreparedJob_GoesWithItsFolder)
+{
+    int const id = Prepare();
+    std::string const jobs = "job/" + std::to_string(id) + "/";
+    Make(jobs + MarkOf(id));
+    Make(jobs + "whole.pdf");
+    Kill();
+    EXPECT_THAT(Jobs(), ElementsAre(1));
+    EXPECT_THAT(NamesIn(folder / "job"), IsEmpty());
+}
+
+TEST_F(LeftByTheDead, PreparedJob_FolderThatIsNotItsOwnStays)
+{
+    fs::create_directories(folder / "elsewhere/9");
+    WriteFile(folder / "elsewhere/9/another program's", "content");
+    int const id = Prepare();
+    EXPECT_TRUE(living->Set(SystemTicket, "System/Folders/Job", (folder / "elsewhere").string()));
+    fs::rename(folder / "elsewhere/9", folder / "elsewhere" / std::to_string(id));
+    Kill();
+    EXPECT_THAT(Jobs(), ElementsAre(1));
+    EXPECT_TRUE(Has("elsewhere/" + std::to_string(id) + "/another program's"));
+}
+
+TEST_F(LeftByTheDead, JobThatHasItsFile_StaysWhateverAClientHasWrittenIntoIt)
+{
+    int const id = Prepare();
+    Make("job.pdf");
+    EXPECT_EQ(dying->server.Jobs().Send(dying->session, folder / "job.pdf", "job.pdf"), Transferred);
+    EXPECT_TRUE(dying->Set({JobTicketType, id}, JobPreparedKey, 1));
+    EXPECT_TRUE(dying->Set({JobTicketType, id}, "Job/State", 0));
+    Kill();
+    EXPECT_THAT(Jobs(), ElementsAre(1, id));
+    EXPECT_TRUE(Has("job/" + std::to_string(id) + "/job.pdf"));
+}
+
+TEST_F(LeftByTheDead, PreparedJobOfALivingProgram_Stays)
+{
+    int id = -1;
+    EXPECT_EQ(living->server.Jobs().Prepare(living->session, {"job.pdf"}, id), Transferred);
+    Kill();
+    EXPECT_THAT(Jobs(), ElementsAre(1, id));
+}
+
+TEST_F(LeftByTheDead, JobFolderWithoutATicket_Goes_AndOthersStay)
+{
+    for (std::string const name :
+         {"job/1/", "job/77/", "job/077/", "job/78x/", "job/notes/", "job/16777216/", "temp/77/"})
+    {
+        Make(name + OtherMark);
+        Make(name + "a");
+    }
+    Make("job/81/no job's");
+    Make("job/79");  // a file
+    fs::create_directory(folder / "job/82");
+    fs::create_directory_symlink(folder / "temp", folder / "job/80");
+    Make("job/.removed-0123456789abcdef/a");  // a removal that was broken off
+    Make("job/.removed-x/a");
+    Kill();
+    EXPECT_FALSE(Has("job/77"));
+    EXPECT_FALSE(Has("job/82"));  // empty: killed before it was marked
+    EXPECT_FALSE(Has("job/.removed-0123456789abcdef"));
+    for (char const* const name : {"job/1/a", "job/077/a", "job/78x/a", "job/notes/a", "job/16777216/a",
+                                   "temp/77/a", "job/79", "job/80", "job/81/no job's", "job/.removed-x/a"})
+        EXPECT_TRUE(Has(name)) << name;
+}
+
+TEST_F(LeftByTheDead, JobFolderElsewhere_IsNotTouched)
+{
+    fs::create_directories(folder / "elsewhere/77");
+    EXPECT_TRUE(living->Set(SystemTicket, "System/Folders/Job", (folder / "elsewhere").string()));
+    Kill();
+    EXPECT_TRUE(Has("elsewhere/77"));
+}
+
+TEST_F(LeftByTheDead, BeginningsOfFilesThatItHadNotedGo_WhereverTheyAre)
+{
+    MemoryFolder client;
+    WriteFile(client / ".transfer.7-1.tmp", "half");
+    Make("temp/.transfer.7-2.tmp");
+    Make("temp/.transfer.7-3.tmp");
+    Make("temp/whole.pdf");
+    dying->store.AddPartFile((client / ".transfer.7-1.tmp").string());
+    dying->store.AddPartFile((folder / "temp/.transfer.7-2.tmp").string());
+    dying->store.AddPartFile((folder / "temp/whole.pdf").string());  // no name of a beginning
+    living->store.AddPartFile((folder / "temp/.transfer.7-3.tmp").string());
+    Kill();
+    EXPECT_THAT(NamesIn(client.Path()), IsEmpty());
+    EXPECT_THAT(NamesIn(folder / "temp"), ElementsAre(".transfer.7-3.tmp", "whole.pdf"));
+}
+
+TEST_F(LeftByTheDead, ATransferThatIsCarriedOut_IsNotedWhileItLastsAndForgotten)
+{
+    EXPECT_TRUE(living->Set(SystemTicket, "System/Folders/Temp", (folder / "temp").string()));
+    Make("a");
+    std::vector<std::string> during;
+    dying->server.Transfers().Set({1, [&] { during = NamesIn(folder / "temp"); }});
+    EXPECT_EQ(dying->server.Transfers().Carry(
+                  dying->session, {TransferService::Request::ToServer, folder / "a", "$(TEMP)/a"}),
+              Transferred);
+    ASSERT_EQ(during.size(), 1u);
+    Make("temp/" + during[0]);  // nobody's any more
+    Kill();
+    EXPECT_THAT(NamesIn(folder / "temp"), ElementsAre(during[0], "a"));
+}
+
+TEST_F(LeftByTheDead, TransferInTheMiddle_GoesWithItsProgram)
+{
+    EXPECT_TRUE(living->Set(SystemTicket, "System/Folders/Temp", (folder / "temp").string()));
+    Make("a");
+    std::string part;
+    dying->server.Transfers().Set({4, [&]
+                                   {
+                                       part = NamesIn(folder / "temp").at(0);
+                                       dying->store.Die();  // from here on it can clear up nothing itself
+                                   }});
+    testing::internal::CaptureStderr();
+    dying->server.Transfers().Carry(dying->session,
+                                    {TransferService::Request::ToServer, folder / "a", "$(TEMP)/a"});
+    testing::internal::GetCapturedStderr();
+    Make("temp/" + part);
+    Kill();
+    EXPECT_FALSE(Has("temp/" + part));
+}
+
+TEST_F(LeftByTheDead, CopyOfTheSystemTicket_IsWrittenAnew)
+{
+    EXPECT_TRUE(dying->Set(SystemTicket, "TheKey", 1));
+    fs::remove(folder / "tickets/SYS_0000.xml");
+    Kill();
+    EXPECT_THAT(ContentOf(folder / "tickets/SYS_0000.xml"), testing::HasSubstr("TheKey"));
+}
+
+TEST_F(LeftByTheDead, EverySingleFailureOnTheWay_IsMadeGoodByTheNextRound)
+{
+    living->server.Stop(std::chrono::minutes(1));
+    testing::internal::CaptureStderr();
+    bool hasFailed = true;
+    int which = 0;
+    while (hasFailed && which < 100)
+    {
+        int const id = Prepare();
+        std::string const part = ".transfer.7-" + std::to_string(which) + ".tmp";
+        Make("temp/" + part);
+        Make("job/" + std::to_string(id) + "/" + MarkOf(id));
+        dying->store.AddPartFile((folder / "temp" / part).string());
+        dying->store.Die();
+        dying->server.Stop(std::chrono::minutes(1));
+        site->FailOperation(++which);
+        living->server.Tidy();
+        hasFailed = site->HasFailed();
+        site->FailOperation(0);
+        living->server.Tidy();
+        EXPECT_THAT(Jobs(), ElementsAre(1)) << which;
+        EXPECT_THAT(NamesIn(folder / "job"), IsEmpty()) << which;
+        EXPECT_THAT(NamesIn(folder / "temp"), IsEmpty()) << which;
+        EXPECT_EQ(living->store.Programs().size(), 1u) << which;
+        dying = std::make_unique<Program>(site, folder.Path());
+    }
+    testing::internal::GetCapturedStderr();
+    EXPECT_GT(which, 4);
+    EXPECT_FALSE(hasFailed);
+}
+
+TEST_F(LeftByTheDead, IsClearedUpWithoutAnybodysAsking)
+{
+    int const id = Prepare();
+    testing::internal::CaptureStderr();
+    dying->store.Die();
+    auto const end = std::chrono::steady_clock::now() + std::chrono::minutes(1);
+    while (living->Exists({JobTicketType, id}) && std::chrono::steady_clock::now() < end)
+        std::this_thread::yield();
+    dying.reset();
+    testing::internal::GetCapturedStderr();
+    EXPECT_FALSE(living->Exists({JobTicketType, id}));
+}

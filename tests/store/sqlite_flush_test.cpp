@@ -1,0 +1,225 @@
+// How often the SQLite store waits for the disk, and what it answers when the disk fails. The system's
+// functions are replaced by ones that count, and fail when they are told to.
+#include "tests/store/SqliteSite.h"
+#include <atomic>
+#include <cerrno>
+#include <gmock/gmock.h>
+#include <mutex>
+#include <sys/syscall.h>
+#include <thread>
+#include <unistd.h>
+
+using namespace standin;
+using namespace std::chrono_literals;
+using testing::HasSubstr;
+
+namespace
+{
+std::atomic<int> begun{0};    // flushes
+std::atomic<int> flushes{0};  // that are over
+std::atomic<bool> fails{false};
+std::mutex gate;  // held: flushes wait
+
+int Flushed(long call, int file)
+{
+    ++begun;
+    std::lock_guard const lock(gate);
+    ++flushes;
+    if (fails)
+    {
+        errno = EIO;
+        return -1;
+    }
+    return static_cast<int>(syscall(call, file));
+}
+}  // namespace
+
+extern "C" __attribute__((visibility("default"))) int fdatasync(int file)
+{
+    return Flushed(SYS_fdatasync, file);
+}
+extern "C" __attribute__((visibility("default"))) int fsync(int file) { return Flushed(SYS_fsync, file); }
+
+namespace
+{
+class SqliteFlush : public SqliteSite
+{
+protected:
+    SqliteFlush()
+    {
+        full.durability = Durability::Full;
+        {
+            auto const first = Open();
+            Writer(*first).Make(Job);  // the journal's header is flushed with its first change
+        }
+    }
+    ~SqliteFlush() override { fails = false; }
+
+    static int FlushesOf(std::function<void()> const& action)
+    {
+        int const before = flushes;
+        action();
+        return flushes - before;
+    }
+
+    SqliteOptions full;
+};
+}  // namespace
+
+TEST_F(SqliteFlush, WithoutNeed_NothingWaitsForTheDisk)
+{
+    auto const store = Open();
+    Writer writer(*store);
+    writer.Put(Job, "A", 0, 1);
+    EXPECT_EQ(FlushesOf(
+                  [&]
+                  {
+                      for (int i = 0; i < 20; ++i)
+                          writer.Put(Job, "A", 0, i);
+                      store->PutUser({"admin", "", 0, 0});
+                  }),
+              0);
+}
+
+TEST_F(SqliteFlush, FullDurability_FlushesEveryCommitOfOneThread)
+{
+    auto const store = Open(full);
+    Writer writer(*store);
+    writer.Put(Job, "A", 0, 1);
+    EXPECT_EQ(FlushesOf(
+                  [&]
+                  {
+                      for (int i = 0; i < 20; ++i)
+                          writer.Put(Job, "A", 0, i);
+                  }),
+              20);
+    EXPECT_EQ(FlushesOf([&] { store->PutUser({"admin", "", 0, 0}); }), 1);
+    EXPECT_EQ(FlushesOf([&] { store->RemoveUser("admin"); }), 1);
+    EXPECT_EQ(FlushesOf([&] { store->RemoveUser("admin"); }), 0);
+    EXPECT_EQ(FlushesOf([&] { writer.Try(Creation(Job)); }), 0);
+}
+
+TEST_F(SqliteFlush, Sync_FlushesWhatWasCommittedWithout)
+{
+    auto const store = Open();
+    Writer writer(*store);
+    writer.Put(Job, "A", 0, 1);
+    EXPECT_GE(FlushesOf([&] { store->Sync(); }), 1);
+    writer.Put(Job, "A", 0, 2);
+    EXPECT_EQ(FlushesOf([&] { store->Sync(); }), 1);
+}
+
+// What comes while a flush runs is perhaps not among what that takes along: it needs the next one.
+TEST_F(SqliteFlush, ThatRunsAlready_DoesNotCount)
+{
+    auto const store = Open(full);
+    Writer(*store).Put(Job, "A", 0, 1);
+    auto const commit = [&store](std::uint64_t number)
+    { EXPECT_EQ(store->Commit(CreationOfNext(5), number).kind, CommitOutcome::Committed); };
+    int const needed = FlushesOf(
+        [&]
+        {
+            std::unique_lock closed(gate);
+            int const before = begun;
+            std::thread first(commit, 100);
+            while (begun == before)
+                std::this_thread::yield();
+            Sequence const flushing = store->Committed();
+            std::thread second(commit, 101);
+            while (store->Committed() == flushing)
+                std::this_thread::yield();
+            std::this_thread::sleep_for(20ms);  // who counts the first flush waits for it by then
+            closed.unlock();
+            first.join();
+            second.join();
+        });
+    EXPECT_EQ(needed, 2);
+}
+
+// While one flush runs, seven threads commit; they share the next one.
+TEST_F(SqliteFlush, ThreadsThatWaitAtTheSameTime_ShareAFlush)
+{
+    constexpr int Threads = 8;
+    auto const store = Open(full);
+    Writer(*store).Put(Job, "A", 0, 1);
+    std::vector<std::thread> threads;
+    int const shared = FlushesOf(
+        [&]
+        {
+            std::unique_lock closed(gate);
+            Sequence const before = store->Committed();
+            for (int i = 0; i < Threads; ++i)
+                threads.emplace_back(
+                    [&store, i]
+                    {
+                        EXPECT_EQ(store->Commit(Creation({5, i}), static_cast<std::uint64_t>(100 + i)).kind,
+                                  CommitOutcome::Committed);
+                    });
+            while (store->Committed() < before + Threads)
+                std::this_thread::yield();
+            std::this_thread::sleep_for(200ms);  // until all wait; who is later costs a flush more
+            closed.unlock();
+            for (std::thread& thread : threads)
+                thread.join();
+        });
+    EXPECT_GE(shared, 1);
+    EXPECT_LE(shared, Threads / 2);
+}
+
+// What one program could not flush another one has: nobody needs to do it again.
+TEST_F(SqliteFlush, OfAnotherProgram_CountsToo)
+{
+    auto const store = Open(full);
+    auto const other = Open(full);
+    Writer writer(*store);
+    writer.Put(Job, "A", 0, 1);
+    other->Sync();
+    fails = true;
+    EXPECT_EQ(writer.Try(Creation({5, 1})).kind, CommitOutcome::Unknown);
+    fails = false;
+    EXPECT_EQ(FlushesOf([&] { other->Sync(); }), 1);
+    EXPECT_EQ(FlushesOf([&] { EXPECT_TRUE(store->FindCommit(writer.LastNumber())); }), 0);
+}
+
+TEST_F(SqliteFlush, ThatFails_LeavesTheAnswerUnknown)
+{
+    auto const store = Open(full);
+    Writer writer(*store);
+    writer.Put(Job, "A", 0, 1);
+    fails = true;
+    EXPECT_EQ(writer.Try(Creation({5, 1})).kind, CommitOutcome::Unknown);
+    EXPECT_THAT(ReasonOf([&] { store->FindCommit(writer.LastNumber()); }), HasSubstr("cannot be flushed"));
+    EXPECT_THAT(ReasonOf([&] { store->Sync(); }), HasSubstr("cannot be flushed"));
+    fails = false;
+    auto const found = store->FindCommit(writer.LastNumber());
+    ASSERT_TRUE(found);
+    EXPECT_EQ(found->address, (TicketAddress{5, 1}));
+    EXPECT_EQ(writer.Make({5, 2}).sequence, found->sequence + 1);
+}
+
+// One flush that fails fails for all who waited for it.
+TEST_F(SqliteFlush, ThatFails_FailsForAllWhoWaited)
+{
+    auto const store = Open(full);
+    Writer(*store).Put(Job, "A", 0, 1);
+    std::atomic<int> unknown{0};
+    std::vector<std::thread> threads;
+    {
+        std::unique_lock const closed(gate);
+        fails = true;
+        Sequence const before = store->Committed();
+        for (int i = 0; i < 4; ++i)
+            threads.emplace_back(
+                [&, i]
+                {
+                    auto const kind =
+                        store->Commit(Creation({5, i}), static_cast<std::uint64_t>(100 + i)).kind;
+                    unknown += kind == CommitOutcome::Unknown ? 1 : 0;
+                });
+        while (store->Committed() < before + 4)
+            std::this_thread::yield();
+    }
+    for (std::thread& thread : threads)
+        thread.join();
+    EXPECT_EQ(unknown, 4);
+}
