@@ -27,7 +27,7 @@ int CopyTicketData(Container const& container, TicketAddress address, int format
         return MODULE_FAILED;  // the size has no room in an int
     int const room = buffer ? *size : 0;
     *size = static_cast<int>(text.size());
-    if (room < *size)
+    if (!buffer || room < *size)
         return MODULE_BUFFER_TOO_SMALL;
     std::memcpy(buffer, text.data(), text.size());
     return MODULE_DONE;
