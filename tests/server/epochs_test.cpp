@@ -85,6 +85,7 @@ private:
 class ReadingSections : public testing::Test
 {
 protected:
+    ReadingSections() { Epochs::Get(); }  // made at its first use, which takes memory of its own
     ~ReadingSections() override { Epochs::Get().Drain(); }
 
     void Retire() { Epochs::Get().Retire(OneText(), keeper); }
