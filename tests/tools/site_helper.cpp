@@ -16,6 +16,7 @@
 #include "standin/server/store/sqlite/SqliteStore.h"
 #include "tools/comgui_site/TicketCommits.h"
 #include <algorithm>
+#include <csignal>
 #include <cstdio>
 #include <cstdlib>
 #include <iostream>
@@ -100,6 +101,7 @@ public:
         m_program = forkpty(&m_terminal, nullptr, nullptr, nullptr);
         if (m_program == 0)
         {
+            std::signal(SIGINT, SIG_DFL);  // a shell ignores it for what it runs in the background
             execv(m_arguments[0], m_arguments.data());
             _exit(127);
         }
