@@ -101,7 +101,9 @@ public:
         m_program = forkpty(&m_terminal, nullptr, nullptr, nullptr);
         if (m_program == 0)
         {
-            std::signal(SIGINT, SIG_DFL);  // a shell ignores it for what it runs in the background
+            // A shell ignores some of them for what it runs in the background, and nohup one more.
+            for (int const signal : {SIGINT, SIGQUIT, SIGHUP, SIGTERM, SIGTSTP, SIGTTOU, SIGTTIN})
+                std::signal(signal, SIG_DFL);
             execv(m_arguments[0], m_arguments.data());
             _exit(127);
         }
@@ -127,11 +129,11 @@ public:
 
     int End()
     {
-        bool hasEcho = true;
-        while (hasEcho = HasEcho(), Read())
+        while (Read())
             ;
         int status = 0;
         waitpid(m_program, &status, 0);
+        bool const hasEcho = HasEcho();  // a terminal keeps its settings beyond the last program on it
         m_shown.erase(std::remove(m_shown.begin(), m_shown.end(), '\r'), m_shown.end());
         std::cout << m_shown << (hasEcho ? "echo on\n" : "echo off\n");
         return WIFEXITED(status) ? WEXITSTATUS(status) : 128 + WTERMSIG(status);
