@@ -25,7 +25,7 @@ bool IsWhole(std::string_view stream)
 std::optional<std::string> JsonOf(std::string_view stream)
 try
 {
-    Output out;
+    tools::Output out;
     PrintJson(stream, out);
     return out.Text();
 }
@@ -49,13 +49,13 @@ void AsStream(std::string_view bytes)
 {
     auto const json = JsonOf(bytes);
     COMGUI_MUST(json.has_value() == IsWhole(bytes));
-    Output dump;
+    tools::Output dump;
     COMGUI_MUST(Dump(bytes, dump).has_value() == !json || IsContainer(bytes));
     if (!json)
         return;
     auto const again = Made(*json);
     COMGUI_MUST(again);
-    Output difference;
+    tools::Output difference;
     COMGUI_MUST(Diff(bytes, *again, difference));
     COMGUI_MUST(JsonOf(*again) == json);
 }
@@ -66,7 +66,7 @@ void AsJson(std::string_view bytes)
     if (!stream)
         return;
     COMGUI_MUST(IsWhole(*stream));
-    Output difference;
+    tools::Output difference;
     COMGUI_MUST(Diff(*stream, Made(*JsonOf(*stream)).value(), difference));
 }
 }  // namespace

@@ -19,6 +19,7 @@ using testing::AllOf;
 using testing::ElementsAre;
 using testing::HasSubstr;
 using testing::IsEmpty;
+using testing::SizeIs;
 
 namespace
 {
@@ -274,6 +275,37 @@ TEST_F(SqliteEnd, WithAJournalBesideIt_IsNotInOrder)
     EXPECT_EQ(KeyOf(*store, Job), 5);
 }
 
+TEST_F(SqliteEnd, TidySite_StaysSoUntilAnEndThatIsNotInOrder)
+{
+    {
+        auto const store = Open();
+        EXPECT_FALSE(store->IsTidy());  // nobody has said so
+        store->NoteTidy();
+        EXPECT_TRUE(Open()->IsTidy());
+        store->Leave();
+    }
+    Open()->Leave();
+    auto const later = Open();
+    EXPECT_TRUE(later->IsTidy());
+    later->Leave();
+    Open();  // dies
+    EXPECT_FALSE(Open()->IsTidy());
+}
+
+// One that only looks in takes the site over from who died, and leaves it in order.
+TEST_F(SqliteEnd, UntidySite_StaysSoThroughProgramsThatDoNotCare)
+{
+    MakeWithOneTicket();
+    Open();  // dies
+    Open()->Leave();
+    auto const store = Open();
+    EXPECT_TRUE(store->EndedInOrder());
+    EXPECT_FALSE(store->IsTidy());
+    store->NoteTidy();
+    store->Leave();
+    EXPECT_TRUE(Open()->IsTidy());
+}
+
 TEST_F(SqliteEnd, OfTheHandle_EndsWhatItDoes)
 {
     auto const store = Open();
@@ -506,8 +538,11 @@ TEST_F(SqliteOpening, WithKeepOpening_OthersWaitUntilItEnds)
     store->EndOpening();
     EXPECT_FALSE(waiting.get());
     store->EndOpening();
-    EXPECT_FALSE(Open(keeping)->WasFirst());
-    EXPECT_FALSE(Open(keeping)->WasFirst());  // who is not the first keeps nobody waiting
+    auto const second = Open(keeping);
+    EXPECT_FALSE(second->WasFirst());
+    EXPECT_THAT(ReasonOf([&] { Open(impatient); }), HasSubstr("has been opening it"));
+    second->EndOpening();
+    EXPECT_FALSE(Open(impatient)->WasFirst());
 }
 
 TEST_F(SqliteOpening, ByWhoDiesMeanwhile_IsNobodysAnyMore)
@@ -1018,14 +1053,48 @@ TEST_F(SqliteCare, Backup_IsAWholeSiteOfOneMoment)
 
     SqliteStore copy(place.Path(), NoContent);
     EXPECT_EQ(copy.Committed(), 301u);
-    EXPECT_EQ(AddressesIn(copy).size(), 301u);
+    EXPECT_THAT(AddressesIn(copy), SizeIs(300));  // without the one that a program was about to finish
     EXPECT_THAT(copy.Check({}), IsEmpty());
-    EXPECT_EQ(FeedOf(copy, 0).size(), 301u);
-    int owned = 0;
-    EXPECT_EQ(copy.Bury([&owned](Estate const& estate) { owned += static_cast<int>(estate.tickets.size()); }),
-              2);
-    EXPECT_EQ(owned, 1);
-    EXPECT_EQ(store->Programs().size(), 2u);
+    EXPECT_FALSE(copy.ChangesSince(300, [](CommittedChange&&) {}));  // nobody has heard of the copy before
+    EXPECT_THAT(FeedOf(copy, 301), IsEmpty());
+}
+
+// A copy that is opened elsewhere must not clear up after programs that work on.
+TEST_F(SqliteCare, Backup_KnowsNoProgramOfTheSite)
+{
+    auto const store = Open();
+    Writer writer(*store);
+    writer.Do(Creation({4, 1}).Own(CHANGE::Owner::ThisProgram).Put("Key", 0, Bytes(PARAM_STRING, "x")));
+    writer.Make(Job);
+    store->OpenSession("admin");
+    store->AddPartFile("/upload/a");
+    MemoryFolder const place;
+    store->BackupTo(place / "site.db", {});
+
+    SqliteStore copy(place.Path(), NoContent);
+    EXPECT_THAT(AddressesIn(copy), ElementsAre(Job));
+    EXPECT_THAT(copy.Sessions(), IsEmpty());
+    EXPECT_EQ(copy.Programs().size(), 1u);  // itself
+    EXPECT_EQ(copy.Bury([](Estate const&) { ADD_FAILURE(); }), 0);
+    EXPECT_EQ(store->Programs().size(), 1u);
+    EXPECT_EQ(store->Sessions().size(), 1u);
+}
+
+TEST_F(SqliteCare, BackupWhoseProgressThrows_LeavesNoFileAndAStoreThatGoesOn)
+{
+    auto const store = Open();
+    Writer writer(*store);
+    writer.Do(Creation({3, 1}).Put("Key", 0, Bytes(PARAM_STRING, std::string(3'000'000, 'x'))));
+    int steps = 0;
+    auto const giveUp = [&steps](long long, long long)
+    {
+        if (++steps == 2)
+            throw StoreError("enough");
+    };
+    EXPECT_EQ(ReasonOf([&] { store->BackupTo(folder / "copy", giveUp); }), "enough");
+    EXPECT_FALSE(std::filesystem::exists(folder / "copy"));
+    writer.Make({3, 2});
+    store->BackupTo(folder / "copy", {});
 }
 
 TEST_F(SqliteCare, BackupThatFails_LeavesNoFile)

@@ -13,7 +13,7 @@ namespace
 // What is printed; checks that the answer says the same.
 std::string DiffOf(std::string const& left, std::string const& right)
 {
-    Output out;
+    tools::Output out;
     bool const isSame = Diff(left, right, out);
     EXPECT_EQ(isSame, out.Text().empty());
     return out.Text();
@@ -121,7 +121,7 @@ TEST(Diff, OfTwoKinds_SaysSo)
 
 TEST(Diff, OfABrokenStream_Throws)
 {
-    Output out;
+    tools::Output out;
     EXPECT_THROW(Diff(Streams::Job(), Streams::Job().substr(0, 30), out), BrokenStream);
     EXPECT_THROW(Diff(Streams::Container().substr(0, 30), Streams::Job(), out), BrokenStream);
 }

@@ -101,7 +101,7 @@ TEST(StreamFormats, Json_IsTakenByMakeAndPrintedAlike)
     std::string const ticket = samples.substr(0, second);
     std::string const container = samples.substr(second, samples.find("```") - second);
 
-    Output out;
+    tools::Output out;
     PrintJson(MakeStream(ticket), out);
     EXPECT_EQ(out.Text(), ticket);
 

@@ -10,7 +10,7 @@ namespace
 {
 std::string DumpOf(std::string const& stream)
 {
-    Output out;
+    tools::Output out;
     Dump(stream, out);
     return out.Text();
 }
@@ -54,14 +54,14 @@ TEST(Dump, OfAContainer_ShowsWhatThePayloadsHold)
 
 TEST(Dump, OfNoBytes_IsEmptyAndGood)
 {
-    Output out;
+    tools::Output out;
     EXPECT_FALSE(Dump("", out));
     EXPECT_EQ(out.Text(), "");
 }
 
 TEST(Dump, OfACutStream_ShowsTheRecordsBeforeAndTheBreak)
 {
-    Output out;
+    tools::Output out;
     auto const broken = Dump(Streams::Job().substr(0, 43), out);
     ASSERT_TRUE(broken);
     EXPECT_EQ(broken->Offset(), 39u);
@@ -73,7 +73,7 @@ TEST(Dump, OfABrokenPayload_GoesOnWithTheNextOperation)
 {
     std::string stream = Streams::Container();
     stream[46] = '\x43';  // a number of a size that does not exist
-    Output out;
+    tools::Output out;
     auto const broken = Dump(stream, out);
     ASSERT_TRUE(broken);
     EXPECT_EQ(broken->Offset(), 46u);

@@ -10,7 +10,7 @@ namespace
 {
 std::string JsonOf(std::string const& stream)
 {
-    Output out;
+    tools::Output out;
     PrintJson(stream, out);
     return out.Text();
 }
@@ -97,7 +97,7 @@ TEST(Json, OfAFirstValueWithoutAKey_TellsThatThereWasNone)
 
 TEST(Json, OfBrokenStreams_ThrowsAndPrintsNothing)
 {
-    Output out;
+    tools::Output out;
     EXPECT_THROW(PrintJson(Streams::Job().substr(0, 50), out), BrokenStream);
     EXPECT_THROW(PrintJson(Streams::Container().substr(0, 50), out), BrokenStream);
     EXPECT_THROW(PrintJson("hello", out), BrokenStream);

@@ -37,7 +37,7 @@ std::string WrongOperation(std::string const& members)
 
 std::string Again(std::string const& stream)
 {
-    Output out;
+    tools::Output out;
     PrintJson(stream, out);
     return MakeStream(out.Text());
 }

@@ -111,7 +111,7 @@ private:
 
 std::string JsonOf(std::string const& stream)
 {
-    Output out;
+    tools::Output out;
     PrintJson(stream, out);
     return out.Text();
 }
@@ -172,7 +172,7 @@ TEST(SpoiltStreams, ThatCanBeRead_MeanTheSameAfterJson)
         }
         ++good;
         std::string const again = MakeStream(json);
-        Output out;
+        tools::Output out;
         ASSERT_TRUE(Diff(stream, again, out)) << "seed " << seed << '\n' << out.Text();
         ASSERT_EQ(JsonOf(again), json) << "seed " << seed;
     }

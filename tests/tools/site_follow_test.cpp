@@ -87,7 +87,7 @@ TEST_F(SiteFollow, ProgramNames_OfTheLivingAndTheUnknown)
 
 TEST_F(SiteFollow, Follow_SinceWhatIsNotThereYet_IsTrouble)
 {
-    ticketstream::Output out;
+    tools::Output out;
     EXPECT_EQ(TroubleOf([&] { Follow(store, store.Committed() + 1, false, out); }),
               "there is no change " + std::to_string(store.Committed() + 1) + " yet; the newest is " +
                   std::to_string(store.Committed()));

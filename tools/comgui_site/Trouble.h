@@ -2,13 +2,13 @@
 // are cleaned before they are shown.
 #pragma once
 
-#include "tools/ticketstream/Trouble.h"
+#include "tools/shared/Trouble.h"
 #include <stdexcept>
 
 namespace comgui_site
 {
-using ticketstream::ClosedPipe;
-using ticketstream::Trouble;  // the command cannot do what it was asked for
+using tools::ClosedPipe;
+using tools::Trouble;
 
 // The command line asks for what does not exist.
 class WrongUse : public std::runtime_error

@@ -11,12 +11,12 @@
 #include "tools/comgui_site/follow.h"
 #include "tools/comgui_site/import.h"
 #include "tools/comgui_site/info.h"
-#include "tools/ticketstream/Output.h"
+#include "tools/shared/Output.h"
 #include <algorithm>
 
 namespace comgui_site
 {
-using ticketstream::Output;
+using tools::Output;
 
 namespace
 {
@@ -83,7 +83,7 @@ try
 }
 catch (standin::DamagedStore const& damage)
 {
-    return {std::string(damage.what()) + " (restore brings a backup back)"};
+    return {damage.what()};
 }
 
 std::string LinesOf(std::vector<std::string> const& lines, char const* before)

@@ -48,7 +48,7 @@ bool IsClosed(int output)
     return poll(&looked, 1, 0) > 0 && (looked.revents & (POLLERR | POLLHUP)) != 0;
 }
 
-void TellLost(Sequence from, Sequence to, bool isJson, ticketstream::Output& out)
+void TellLost(Sequence from, Sequence to, bool isJson, tools::Output& out)
 {
     if (isJson)
         return out.Add(LineOf(Json{{"lost", {{"from", from}, {"to", to}}}}));
@@ -61,7 +61,7 @@ void TellLost(Sequence from, Sequence to, bool isJson, ticketstream::Output& out
 class Follower
 {
 public:
-    Follower(Store& store, Sequence since, bool isJson, ticketstream::Output& out)
+    Follower(Store& store, Sequence since, bool isJson, tools::Output& out)
         : m_store(store), m_names(store), m_isJson(isJson), m_out(out), m_heard(since)
     {
     }
@@ -103,7 +103,7 @@ private:
     Store& m_store;
     ProgramNames m_names;
     bool const m_isJson;
-    ticketstream::Output& m_out;
+    tools::Output& m_out;
     Sequence m_heard;
 };
 }  // namespace
@@ -148,7 +148,7 @@ Json JsonOf(CommittedChange const& change, std::string const& program)
     return json;
 }
 
-void Follow(Store& store, std::optional<Sequence> since, bool isJson, ticketstream::Output& out)
+void Follow(Store& store, std::optional<Sequence> since, bool isJson, tools::Output& out)
 {
     Sequence const newest = store.Committed();
     if (since.value_or(0) > newest)

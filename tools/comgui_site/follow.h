@@ -3,7 +3,7 @@
 
 #include "standin/server/store/Store.h"
 #include "tools/comgui_site/words.h"
-#include "tools/ticketstream/Output.h"
+#include "tools/shared/Output.h"
 #include <map>
 #include <optional>
 #include <string>
@@ -29,6 +29,5 @@ Json JsonOf(standin::CommittedChange const& change, std::string const& program);
 // Writes the changes behind that one, or those from now on, until somebody wants the program to end or the
 // output is closed. Where the journal begins later, a line on stderr, or in JSON an object with "lost", says
 // so. Throws Trouble if there is no such change yet.
-void Follow(standin::Store& store, std::optional<standin::Sequence> since, bool isJson,
-            ticketstream::Output& out);
+void Follow(standin::Store& store, std::optional<standin::Sequence> since, bool isJson, tools::Output& out);
 }  // namespace comgui_site

@@ -4,7 +4,7 @@
 #include "tools/comgui_site/Interrupts.h"
 #include "tools/comgui_site/Trouble.h"
 #include "tools/comgui_site/commands.h"
-#include "tools/ticketstream/Output.h"
+#include "tools/shared/Output.h"
 #include <CLI/CLI.hpp>
 #include <algorithm>
 #include <charconv>
@@ -261,7 +261,7 @@ private:
     {
         std::ostringstream text;
         m_app.exit(asked, text, text);
-        ticketstream::Output out(stdout);
+        tools::Output out(stdout);
         out.Add(text.str());
         out.Flush();
         return Good;

@@ -193,9 +193,7 @@ try
 }
 catch (standin::DamagedStore const& damage)
 {
-    // The remedy of an ordinary damage, behind the semicolon, is none here.
-    std::string const what = WithNameOf(file, workplace, damage.what());
-    throw Trouble(what.substr(0, what.find(';')) + "; restore another file");
+    throw Trouble(WithNameOf(file, workplace, damage.Damage()) + "; restore another file");
 }
 catch (standin::StoreError const& error)
 {

@@ -2,7 +2,7 @@
 
 #include "standin/server/tickets/TicketXmlReader.h"
 #include "standin/server/tickets/TicketXmlText.h"
-#include "tools/ticketstream/text.h"
+#include "tools/shared/text.h"
 #include <array>
 #include <charconv>
 #include <cmath>
@@ -64,7 +64,7 @@ std::string Cleaned(std::string_view text)
     {
         std::size_t const forbidden = ForbiddenAtTheBeginning(text);
         for (std::size_t i = 0; i < forbidden; ++i)
-            cleaned += "\\x" + ticketstream::Hex(text.substr(i, 1));
+            cleaned += "\\x" + tools::Hex(text.substr(i, 1));
         std::size_t const taken = forbidden > 0 ? forbidden : SizeOfCharacter(text[0]);
         if (forbidden == 0)
             cleaned += text.substr(0, taken);
@@ -143,7 +143,7 @@ std::string ShownKey(std::string_view key)
 {
     bool const isClear =
         IsPlain(key) && !key.empty() && key.find_first_of(" \"=,[]") == std::string_view::npos;
-    return isClear ? std::string(key) : ticketstream::Shown(key);
+    return isClear ? std::string(key) : tools::Shown(key);
 }
 
 std::string ShownValue(StoredValue const& value, std::size_t limit)
@@ -157,12 +157,11 @@ std::string ShownValue(StoredValue const& value, std::size_t limit)
     case PARAM_UNSIGNED64:
         return std::to_string(static_cast<unsigned long long>(value.integer));
     case PARAM_DOUBLE:
-        return std::isfinite(value.number) ? ticketstream::NumberText(value.number)
-                                           : std::to_string(value.number);
+        return std::isfinite(value.number) ? tools::NumberText(value.number) : std::to_string(value.number);
     case PARAM_STRING:
-        return ticketstream::Shown(value.bytes, limit);
+        return tools::Shown(value.bytes, limit);
     case PARAM_BINSTRING:
-        return ticketstream::ShownBytes(value.bytes, limit);
+        return tools::ShownBytes(value.bytes, limit);
     default:
         return "none";
     }
@@ -186,20 +185,20 @@ void AddValue(Json& object, StoredValue const& value)
         object["value"] = std::isfinite(value.number) ? Json(value.number) : Json(ShownValue(value));
         break;
     case PARAM_STRING:
-        if (ticketstream::Quoted(value.bytes))
+        if (tools::Quoted(value.bytes))
             object["value"] = value.bytes;
         else
-            object["hex"] = ticketstream::Hex(value.bytes);
+            object["hex"] = tools::Hex(value.bytes);
         break;
     case PARAM_BINSTRING:
-        object["hex"] = ticketstream::Hex(value.bytes);
+        object["hex"] = tools::Hex(value.bytes);
         break;
     default:
         break;
     }
 }
 
-Json JsonOf(std::string_view text) { return ticketstream::Quoted(text) ? Json(text) : Json(Cleaned(text)); }
+Json JsonOf(std::string_view text) { return tools::Quoted(text) ? Json(text) : Json(Cleaned(text)); }
 
 std::string LineOf(Json const& json) { return json.dump(-1, ' ', true) + '\n'; }
 

@@ -1,6 +1,6 @@
 #include "tools/ticketstream/StreamFile.h"
 
-#include "tools/ticketstream/Output.h"
+#include "tools/shared/Output.h"
 #include "tools/ticketstream/Trouble.h"
 #include "tools/ticketstream/text.h"
 #include <algorithm>
@@ -14,6 +14,8 @@
 
 namespace ticketstream
 {
+using tools::Output;
+
 namespace
 {
 struct Close

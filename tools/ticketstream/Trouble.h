@@ -1,25 +1,15 @@
 // What stops a command. The texts are one line each and made to be shown.
 #pragma once
 
+#include "tools/shared/Trouble.h"
 #include <cstddef>
 #include <stdexcept>
 #include <string>
 
 namespace ticketstream
 {
-// A file or the command line.
-class Trouble : public std::runtime_error
-{
-public:
-    using std::runtime_error::runtime_error;
-};
-
-// Nobody reads the output any more: the command ends and has nothing to say.
-class ClosedPipe : public std::runtime_error
-{
-public:
-    ClosedPipe() : std::runtime_error("closed pipe") {}
-};
+using tools::ClosedPipe;
+using tools::Trouble;
 
 // A stream that cannot be read any further.
 class BrokenStream : public std::runtime_error

@@ -14,6 +14,9 @@
 
 namespace ticketstream
 {
+using tools::Colour;
+using tools::Output;
+
 namespace
 {
 using Records = std::span<SETMULTIPAR const>;

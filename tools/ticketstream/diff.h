@@ -1,7 +1,7 @@
 // Two streams compared by what they mean.
 #pragma once
 
-#include "tools/ticketstream/Output.h"
+#include "tools/shared/Output.h"
 #include <string_view>
 
 namespace ticketstream
@@ -10,5 +10,5 @@ namespace ticketstream
 // same values under each key, in the same order, whatever the order of the keys, as the library's reader
 // gives them; of containers, the same operations in the same order. An empty stream is the same as any that
 // tells nothing. Throws BrokenStream.
-bool Diff(std::string_view left, std::string_view right, Output& out);
+bool Diff(std::string_view left, std::string_view right, tools::Output& out);
 }  // namespace ticketstream

@@ -11,6 +11,9 @@
 
 namespace ticketstream
 {
+using tools::Colour;
+using tools::Output;
+
 namespace
 {
 constexpr unsigned long TextLimit = 200;  // bytes of a value or a key that are shown

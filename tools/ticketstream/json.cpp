@@ -11,6 +11,8 @@
 
 namespace ticketstream
 {
+using tools::Output;
+
 namespace
 {
 std::string JsonHex(std::string_view bytes) { return "{\"hex\": \"" + Hex(bytes) + "\"}"; }

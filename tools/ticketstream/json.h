@@ -1,11 +1,11 @@
 // Streams as JSON; docs/stream-formats.md tells its shape.
 #pragma once
 
-#include "tools/ticketstream/Output.h"
+#include "tools/shared/Output.h"
 #include <string_view>
 
 namespace ticketstream
 {
 // Prints the stream, a line a record. Throws BrokenStream before anything is printed.
-void PrintJson(std::string_view stream, Output& out);
+void PrintJson(std::string_view stream, tools::Output& out);
 }  // namespace ticketstream

@@ -1,6 +1,6 @@
 // ticketstream: a look into ticket streams, and streams out of JSON. The command line; the commands stand in
 // files of their own.
-#include "tools/ticketstream/Output.h"
+#include "tools/shared/Output.h"
 #include "tools/ticketstream/StreamFile.h"
 #include "tools/ticketstream/Trouble.h"
 #include "tools/ticketstream/detect.h"
@@ -32,7 +32,7 @@ template <typename F>
 int ForEach(std::vector<std::string> const& files, F command)
 {
     int status = Good;
-    Output out(stdout);
+    tools::Output out(stdout);
     for (std::string const& file : files)
         try
         {
@@ -47,14 +47,14 @@ int ForEach(std::vector<std::string> const& files, F command)
     return status;
 }
 
-int DetectFile(std::string const& file, Output& out)
+int DetectFile(std::string const& file, tools::Output& out)
 {
     Kind const kind = Detect(ReadFile(file, BytesToDetect));
     out.Add(ShownName(file) + ": " + kind.name + '\n');
     return kind.isStream ? Good : Negative;
 }
 
-int DumpFile(std::string const& file, bool isOneOfMany, Output& out)
+int DumpFile(std::string const& file, bool isOneOfMany, tools::Output& out)
 {
     std::string const stream = ReadFile(file);
     if (isOneOfMany)
@@ -70,7 +70,7 @@ int DumpFile(std::string const& file, bool isOneOfMany, Output& out)
 int Json(std::string const& file)
 try
 {
-    Output out(stdout);
+    tools::Output out(stdout);
     PrintJson(ReadFile(file), out);
     out.Flush();
     return Good;
@@ -111,7 +111,7 @@ int DiffFiles(std::string const& left, std::string const& right)
 {
     if (left == "-" && right == "-")
         throw Trouble("standard input can be read only once; name a file for one of the two");
-    Output out(stdout);
+    tools::Output out(stdout);
     bool const isSame = Diff(WholeStream(left), WholeStream(right), out);
     out.Flush();
     return isSame ? Good : Negative;
@@ -195,7 +195,7 @@ private:
                        "Long values are cut. Exit status: 1 if a stream is broken; it is shown up to there.",
                        [this]
                        {
-                           return ForEach(m_files, [this](std::string const& file, Output& out)
+                           return ForEach(m_files, [this](std::string const& file, tools::Output& out)
                                           { return DumpFile(file, m_files.size() > 1, out); });
                        }));
     }

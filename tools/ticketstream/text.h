@@ -1,6 +1,7 @@
-// Values as texts, for people and for JSON.
+// Values of tickets as texts.
 #pragma once
 
+#include "tools/shared/text.h"
 #include "tools/ticketstream/Record.h"
 #include <optional>
 #include <string>
@@ -8,25 +9,18 @@
 
 namespace ticketstream
 {
-// In quotes, as JSON has it and with all that a terminal might obey escaped; none if it is not UTF-8.
-std::optional<std::string> Quoted(std::string_view text);
-
-std::string Hex(std::string_view bytes);
-std::optional<std::string> BytesOfHex(std::string_view hex);
-
-// The shortest decimal text that gives the number back, with a point or an exponent; "NaN" for none.
-std::string NumberText(double number);
+using tools::BytesOfHex;
+using tools::Hex;
+using tools::NumberText;
+using tools::Quoted;
+using tools::Shown;
+using tools::ShownBytes;
+using tools::ShownName;
 
 // "int", "double", "string", "binstring", "int64", "unsigned64", "none".
 char const* TypeName(PARAM_TYPE type);
 std::optional<PARAM_TYPE> TypeOfName(std::string_view name);
 
-// For people: in quotes, or as hex where that is impossible. Longer ones than the limit are cut, and say how
-// long they are.
-std::string Shown(std::string_view text, unsigned long limit = std::string_view::npos);
-std::string ShownBytes(std::string_view bytes, unsigned long limit = std::string_view::npos);
+// For people. Longer ones than the limit are cut, and say how long they are.
 std::string Shown(Value const& value, unsigned long limit = std::string_view::npos);
-
-// The name of a file in a message: as it is, or in quotes if it would break the line; "standard input" for -.
-std::string ShownName(std::string const& name);
 }  // namespace ticketstream

@@ -157,6 +157,8 @@ std::vector<std::filesystem::path> FoldersOf(Server& server, std::filesystem::pa
     return folders;
 }
 
+// Whether a program that is gone may have made folders whose names a power cut takes away.
+bool MayBeUnflushed(SqliteStore const& store) { return !store.IsTidy(); }
 }  // namespace
 
 std::filesystem::path Site::Folder()
@@ -177,32 +179,25 @@ Site::Site(std::filesystem::path const& folder, std::filesystem::path const& see
     std::vector<std::filesystem::path> own;
     for (std::string_view const name : OwnFolders)
         own.push_back(m_folder / name);
-    MakePrivateFolders(own, MayBeUnflushed());
+    MakePrivateFolders(own, MayBeUnflushed(*m_store));
 }
 
 void Site::PutInOrder(Server& server)
 {
-    if (m_store->WasFirst())
+    for (char const* const file : {SeedFile, SystemTicketFile})
+        RemoveLeftovers(m_folder / file);
+    KeepInstallFolder(server, m_folder);
+    KeepFoldersReadable(server, m_folder);
+    MakePrivateFolders(FoldersOf(server, m_folder), MayBeUnflushed(*m_store));
+    server.Tidy();
+    if (!m_store->IsTidy())
     {
-        for (char const* const file : {SeedFile, SystemTicketFile})
-            RemoveLeftovers(m_folder / file);
-        KeepInstallFolder(server, m_folder);
-        KeepFoldersReadable(server, m_folder);
+        SweepJobFolders(server.Tickets(), m_folder);  // the rounds before may have had another install folder
+        m_store->NoteTidy();
     }
-    MakePrivateFolders(FoldersOf(server, m_folder), MayBeUnflushed());
-    if (m_store->WasFirst())
-    {
-        server.Tidy();
-        if (!m_store->EndedInOrder())
-            SweepJobFolders(server.Tickets(),
-                            m_folder);  // the rounds before may have had another install folder
-        server.Mirror().Write();
-    }
+    server.Mirror().Write();
     m_store->EndOpening();
 }
-
-// Whether a program that is gone may have made folders whose names a power cut takes away.
-bool Site::MayBeUnflushed() const { return m_store->WasFirst() && !m_store->EndedInOrder(); }
 
 void Site::Leave() noexcept
 {

@@ -31,9 +31,9 @@ public:
     Site(Site const&) = delete;
     Site& operator=(Site const&) = delete;
 
-    // Once the server is there: makes missing folders. The first program of several also clears up after
-    // those that died, notes where the site is, switches off a folder of the system ticket that would hold up
-    // its readers for good, and writes tickets/SYS_0000.xml.
+    // Once the server is there: notes where the site is, switches off a folder of the system ticket that would
+    // hold up its readers for good, makes missing folders, clears up after programs that died, and writes
+    // tickets/SYS_0000.xml. Others who open the site wait until then.
     void PutInOrder(Server& server);
 
     // An orderly end; nothing of the site may be used any more. A failure is reported on stderr.
@@ -43,8 +43,6 @@ public:
     Store& store() { return *m_store; }
 
 private:
-    bool MayBeUnflushed() const;
-
     std::filesystem::path const m_folder;  // absolute
     std::unique_ptr<SqliteStore> m_store;
 };

@@ -25,7 +25,8 @@ char const* RemedyOf(int code)
         return "make its folder one that this user may write to";
     case SQLITE_CORRUPT:
     case SQLITE_NOTADB:
-        return "end all programs of the site and start one again: it sets the file aside and makes a new one";
+        return "bring a backup back with comgui_site restore, or end all programs of the site and start one "
+               "again: it sets the file aside and makes a new one";
     case SQLITE_NOMEM:
         return "end other programs, then try again";
     case SQLITE_TOOBIG:
@@ -115,11 +116,11 @@ void Database::Fail() const
 
 void Database::FailAsDamaged(std::string const& reason) const
 {
-    std::string const line = m_file.string() + ": damaged: " + reason + "; " + RemedyOf(SQLITE_CORRUPT);
+    DamagedStore const damage(m_file.string() + ": damaged: " + reason, RemedyOf(SQLITE_CORRUPT));
     if (!m_report)
-        throw DamagedStore(line);
+        throw damage;
     m_report();
-    throw StoreError(line);
+    throw StoreError(damage.what());
 }
 
 Database::Run::~Run()

@@ -18,7 +18,16 @@ namespace standin
 class DamagedStore : public StoreError
 {
 public:
-    using StoreError::StoreError;
+    DamagedStore(std::string const& damage, std::string const& remedy)
+        : StoreError(damage + "; " + remedy), m_damage(damage)
+    {
+    }
+
+    // File and reason without the remedy, for who has a better one.
+    std::string const& Damage() const { return m_damage; }
+
+private:
+    std::string const m_damage;
 };
 
 class Database

@@ -27,7 +27,7 @@ constexpr std::size_t PageSize = 4096;
 
 // Begins like a line of text, since the version that knew only one owner shows it as the owner's name.
 constexpr char Mark[32] = "several programs (comgui site)\n";
-constexpr std::uint32_t Version = 1;
+constexpr std::uint32_t Version = 2;
 
 using namespace std::chrono_literals;
 using std::chrono::steady_clock;
@@ -56,6 +56,7 @@ struct SharedPage::Page
     std::atomic<std::uint32_t> bell;
     std::atomic<std::uint32_t> waiting;  // for the bell, in all programs; of those that died some may be left
     std::atomic<std::uint32_t> hasDamage;
+    std::atomic<std::uint32_t> isTidy;
     alignas(64) std::atomic<std::uint32_t> turns;  // counts them
     std::atomic<std::uint32_t> isTurnOpen;         // begun and not yet ended
     pthread_mutex_t turn;
@@ -179,7 +180,7 @@ std::optional<SharedPage::ClosingNote> SharedPage::TakeNote()
     return m_page->note;
 }
 
-void SharedPage::Reset(Sequence committed)
+void SharedPage::Reset(Sequence committed, bool isTidy)
 {
     std::memset(static_cast<void*>(m_page), 0, PageSize);
     m_page = new (m_page) Page{};
@@ -188,6 +189,7 @@ void SharedPage::Reset(Sequence committed)
     m_page->turnSize = sizeof(pthread_mutex_t);
     m_page->committed = committed;
     m_page->flushed = committed;
+    m_page->isTidy = isTidy ? 1 : 0;
     MakeTurn(m_page->turn);
     std::memcpy(m_page->mark, Mark, sizeof Mark);
 }
@@ -239,6 +241,9 @@ void SharedPage::Turn::End() noexcept
     m_page.PassTurnOn();
     m_isOurs = false;
 }
+
+bool SharedPage::IsTidy() const noexcept { return m_page->isTidy != 0; }
+void SharedPage::NoteTidy() noexcept { m_page->isTidy = 1; }
 
 void SharedPage::NoteDamage() noexcept { m_page->hasDamage = 1; }
 

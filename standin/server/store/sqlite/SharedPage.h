@@ -36,7 +36,7 @@ public:
 
     // The note, which is gone from the disk when this returns: from now on the database may change.
     std::optional<ClosingNote> TakeNote();
-    void Reset(Sequence committed);
+    void Reset(Sequence committed, bool isTidy);
 
     // --- for who opens it beside others
 
@@ -86,6 +86,10 @@ public:
         bool m_isAfterFailure = false;
         bool m_isOurs = true;
     };
+
+    // Whether a program has cleared up since one ended in another way than in order. Lasts as the note does.
+    bool IsTidy() const noexcept;
+    void NoteTidy() noexcept;
 
     // Somebody has found the database damaged: its next opening has to look closely.
     void NoteDamage() noexcept;

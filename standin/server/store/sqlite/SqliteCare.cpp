@@ -142,24 +142,50 @@ private:
     std::vector<std::string> m_problems;
 };
 
+struct FinishBackup
+{
+    void operator()(sqlite3_backup* backup) const noexcept { sqlite3_backup_finish(backup); }
+};
+
 // Copies within one read transaction: a copy in several would begin anew with each change of the site.
 void Copy(Database& from, Database& to, SqliteStore::Progress const& progress)
 {
     Database::Transaction const moment(from, Database::Transaction::Read);
     from.Number("SELECT count(*) FROM site");
-    sqlite3_backup* const backup = sqlite3_backup_init(to.Handle(), "main", from.Handle(), "main");
-    if (backup == nullptr)
+    std::unique_ptr<sqlite3_backup, FinishBackup> backup(
+        sqlite3_backup_init(to.Handle(), "main", from.Handle(), "main"));
+    if (!backup)
         to.Fail();
     int code = SQLITE_OK;
     while (code == SQLITE_OK)
     {
-        code = sqlite3_backup_step(backup, CopiedAtOnce);
-        int const total = sqlite3_backup_pagecount(backup);
+        code = sqlite3_backup_step(backup.get(), CopiedAtOnce);
+        int const total = sqlite3_backup_pagecount(backup.get());
         if (progress)
-            progress(total - sqlite3_backup_remaining(backup), total);
+            progress(total - sqlite3_backup_remaining(backup.get()), total);
     }
-    if (sqlite3_backup_finish(backup) != SQLITE_OK)
+    if (sqlite3_backup_finish(backup.release()) != SQLITE_OK)
         to.Fail();
+}
+
+// The programs of that moment are not those of the copy: who opens it would take them for dead and clear up
+// after them, in folders that may be in use elsewhere. What they had begun was acknowledged to nobody. Nobody
+// has heard of the copy either, so its journal begins behind it.
+void ForgetPrograms(Database& copy)
+{
+    Database::Transaction transaction(copy, Database::Transaction::Write);
+    for (char const* const sql :
+         {"DELETE FROM parameter WHERE (ticket_type, ticket_id) IN "
+          "(SELECT type, id FROM ticket WHERE owner <> 0)",
+          "DELETE FROM ticket WHERE owner <> 0", "DELETE FROM session", "DELETE FROM part_file",
+          "DELETE FROM program",
+          "UPDATE site SET value = max(value, coalesce((SELECT max(sequence) FROM journal), 0)) "
+          "WHERE name = 'pruned'",
+          "DELETE FROM journal"})
+        copy.Execute(sql);
+    transaction.Commit();
+    copy.Execute("PRAGMA wal_checkpoint(TRUNCATE)");
+    copy.TrustJournal();
 }
 }  // namespace
 
@@ -185,11 +211,13 @@ void SqliteStore::BackupTo(std::filesystem::path const& file, Progress const& pr
         from.ReportDamageTo([this] { m_page->NoteDamage(); });
         Database to(file, true);
         Copy(from, to, progress);
+        ForgetPrograms(to);
     }
     catch (...)
     {
         std::error_code ignored;
-        std::filesystem::remove(file, ignored);
+        for (char const* const suffix : {"", "-wal", "-shm"})
+            std::filesystem::remove(file.string() + suffix, ignored);
         throw;
     }
 }

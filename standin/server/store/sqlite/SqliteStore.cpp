@@ -196,7 +196,7 @@ SqliteStore::SqliteStore(std::filesystem::path const& folder, std::function<Stor
     if (m_wasFirst && !m_lock->TryLock(LockFile::Site, LockFile::Hold::Shared))
         throw StoreError(m_lock->Path().string() +
                          ": somebody else locks it; end that program, then try again");
-    if (!m_wasFirst || !m_options.keepOpening)
+    if (!m_options.keepOpening)
         EndOpening();
 }
 
@@ -283,7 +283,7 @@ void SqliteStore::OpenAlone(std::function<StoreContent()> const& first)
     schema::CheckTables(database);
     m_writer->Prepare();
     database.TrustJournal();
-    m_page->Reset(LastSequence(database, m_writer->lastSequence));
+    m_page->Reset(LastSequence(database, m_writer->lastSequence), m_endedInOrder && m_page->IsTidy());
 }
 
 void SqliteStore::OpenBesideOthers()

@@ -37,8 +37,8 @@ struct SqliteOptions
 {
     Durability durability = Durability::Process;
 
-    // Who opens the site alone keeps others waiting until EndOpening, so that it can tidy up what belongs to
-    // the site and not to the store.
+    // Keeps others who open the site waiting until EndOpening, so that what belongs to the site and not to the
+    // store can be put in order meanwhile.
     bool keepOpening = false;
 
     // Called for a damaged database, alone with the site, to set the files away that begin with site.db. The
@@ -71,6 +71,12 @@ public:
 
     // Whether the last that had it open before has left in order. Of use to the first only.
     bool EndedInOrder() const { return m_endedInOrder; }
+
+    // Whether what belongs to the site and not to the store is in order: everybody has left in order since
+    // somebody said so. It may not have been, and not be now, while the first program is one that does not
+    // care.
+    bool IsTidy() const noexcept { return m_page->IsTidy(); }
+    void NoteTidy() noexcept { m_page->NoteTidy(); }
 
     // With keepOpening: lets others open the site. May be called always.
     void EndOpening();

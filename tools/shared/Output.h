@@ -5,7 +5,7 @@
 #include <string>
 #include <string_view>
 
-namespace ticketstream
+namespace tools
 {
 enum class Colour
 {
@@ -35,4 +35,4 @@ private:
     bool m_hasColours = false;
     std::string m_text;
 };
-}  // namespace ticketstream
+}  // namespace tools

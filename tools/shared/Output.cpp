@@ -1,12 +1,12 @@
-#include "tools/ticketstream/Output.h"
+#include "tools/shared/Output.h"
 
-#include "tools/ticketstream/Trouble.h"
+#include "tools/shared/Trouble.h"
 #include <cerrno>
 #include <cstdlib>
 #include <cstring>
 #include <unistd.h>
 
-namespace ticketstream
+namespace tools
 {
 namespace
 {
@@ -70,4 +70,4 @@ std::string Output::Painted(Colour colour, std::string_view text) const
 {
     return m_hasColours ? CodeOf(colour) + std::string(text) + "\x1B[0m" : std::string(text);
 }
-}  // namespace ticketstream
+}  // namespace tools
