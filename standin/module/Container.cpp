@@ -161,10 +161,11 @@ STICKET_ACCESS const* OnCreate(void* instance, int type, int id, char const* con
     Slot(instance,
          [&](Container& container)
          {
-             if (!container.Server().Tickets().Create(container.Session(), {type, id}))
+             auto const made = container.Server().Tickets().Create(container.Session(), {type, id});
+             if (!made)
                  return false;
              container.Session().Limit({type, id}, KeyFilter(keys));
-             access = container.Opened().Open({type, id});
+             access = container.Opened().Open({type, id}, *made);  // whatever others make of the address now
              return access != nullptr;
          });
     return access;

@@ -4,7 +4,11 @@ namespace standin
 {
 STICKET_ACCESS const* OpenTickets::Open(TicketAddress address)
 {
-    Incarnation const incarnation = m_tickets.IncarnationOf(address);
+    return Open(address, m_tickets.IncarnationOf(address));
+}
+
+STICKET_ACCESS const* OpenTickets::Open(TicketAddress address, Incarnation incarnation)
+{
     if (incarnation == 0 || m_session.Ended())
         return nullptr;
     std::lock_guard const lock(m_lock);

@@ -19,6 +19,9 @@ public:
     // Null if there is no such ticket, or no session any more.
     STICKET_ACCESS const* Open(TicketAddress address);
 
+    // That one of the tickets that have or had the address; null for 0, and without a session.
+    STICKET_ACCESS const* Open(TicketAddress address, Incarnation incarnation);
+
     // Undoes one Open; false if the ticket is not open. Works for a ticket that has been deleted, too.
     bool Close(TicketAddress address);
 

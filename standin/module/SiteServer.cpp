@@ -5,6 +5,7 @@
 #include "standin/server/files/Report.h"
 #include <dlfcn.h>
 #include <map>
+#include <unistd.h>
 
 namespace standin
 {
@@ -30,9 +31,12 @@ using Sites = std::map<std::filesystem::path, std::unique_ptr<OpenSite>>;
 struct EndOfWork
 {
     Sites const& sites;
+    pid_t const process = getpid();
 
     ~EndOfWork()
     {
+        if (getpid() != process)
+            return;  // a child made by fork: the threads are the parent's, and some lock may be held for ever
         for (auto const& [folder, open] : sites)
         {
             open->server.Stop(PatienceAtTheEnd);

@@ -65,7 +65,7 @@ public:
         return Get(address, key, PARAM_COUNT, &count) ? static_cast<int>(count) : 0;
     }
     bool Exists(standin::TicketAddress address) { return Tickets().IncarnationOf(address) != 0; }
-    bool Create(standin::TicketAddress address) { return Tickets().Create(session, address); }
+    bool Create(standin::TicketAddress address) { return Tickets().Create(session, address).has_value(); }
     bool Delete(standin::TicketAddress address) { return Tickets().Delete(session, address); }
 
     standin::KeptTexts texts;

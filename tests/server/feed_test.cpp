@@ -331,6 +331,33 @@ TEST_P(UnknownOutcome, APointer_IsThereAfterwards)
     EXPECT_EQ(two.Int(Job, "K"), 7);
 }
 
+// However much happens before the answer, and however eagerly the journal is pruned.
+TEST(UnknownOutcomeInAShortJournal, AWrite_IsMadeExactlyOnce)
+{
+    MemoryFolder const folder;
+    std::filesystem::create_directories(folder / "tickets");
+    auto const site =
+        std::make_shared<MemorySite>(StoreLimits{.journalKept = 4, .journalLargest = 1000, .feedLargest = 7});
+    site->AddTicket(SystemTicket);
+    site->AddTicket(Job);
+    Program one(site, folder.Path());
+    Program two(site, folder.Path());
+    site->AnswerUnknownOnce(true);
+    site->InterjectBehind(
+        [&]
+        {
+            for (int i = 0; i < 50; ++i)
+                two.Set(Job, "K", i);
+            one.Tickets().CatchUp();
+            for (Program* const program : {&one, &two, &one, &two})
+                program->server.Tidy();
+        });
+    EXPECT_TRUE(one.Set(Job, "V", 7, -2));
+    EXPECT_TRUE(site->HasFailed());
+    EXPECT_EQ(one.Count(Job, "V"), 1);
+    EXPECT_EQ(two.Count(Job, "V"), 1);
+}
+
 INSTANTIATE_TEST_SUITE_P(Commits, UnknownOutcome, testing::Bool(),
                          [](auto const& happened) { return happened.param ? "Made" : "NotMade"; });
 
@@ -478,6 +505,207 @@ TEST_F(TwoPrograms, AfterAnySingleFailure_BothAgree)
     testing::internal::GetCapturedStderr();
 }
 
+// A journal that cannot be read is no reason to ask for it without a pause.
+TEST_F(TwoPrograms, WhileTheJournalCannotBeRead_ItIsAskedForNowAndThen)
+{
+    testing::internal::CaptureStderr();
+    one.Int(Job, "K");
+    two.Int(Job, "K");
+    site->FailJournal(true);
+    EXPECT_TRUE(two.Set(Job, "K", 1));
+    int const before = site->Looks();
+    std::this_thread::sleep_for(std::chrono::milliseconds(300));
+    EXPECT_LE(site->Looks() - before, 4);
+    site->FailJournal(false);
+    EXPECT_EQ(one.Int(Job, "K"), 1);
+    EXPECT_THAT(testing::internal::GetCapturedStderr(), HasSubstr("its journal was told to fail"));
+}
+
+// What a broken record hides is found in the tickets.
+TEST_F(TwoPrograms, ARecordThatCannotBeRead_IsPassedAndItsChangeTold)
+{
+    testing::internal::CaptureStderr();
+    EARS ears(two);
+    one.Int(Job, "K");
+    two.Int(Job, "K");
+    site->InterjectBehind([this] { site->BreakJournal(); });  // before anybody can have heard of it
+    site->FailJournal(true);
+    EXPECT_TRUE(one.Set(Job, "K", 1));
+    site->FailJournal(false);
+    EXPECT_EQ(two.Int(Job, "K"), 1);
+    EXPECT_THAT(ears.Heard(1), ElementsAre("1 3/1 K@0=1"));
+    EXPECT_TRUE(two.Set(Job, "K", 2));
+    EXPECT_EQ(one.Int(Job, "K"), 2);
+    EXPECT_THAT(ears.Heard(2), ElementsAre("1 3/1 K@0=1", "1 3/1 K=2"));
+    testing::internal::GetCapturedStderr();
+}
+
+// --- a listener that has no room
+
+namespace
+{
+// Hears of large texts: how they end. Stands still while it is held.
+class SLOW_EARS
+{
+public:
+    explicit SLOW_EARS(Program& program) : m_program(program)
+    {
+        auto& service = program.server.Notifications();
+        int const id = service.NewId();
+        program.Tickets().CatchUp();
+        EXPECT_TRUE(service.Register(program.session, id, [this](Notification const& told) { Hear(told); }));
+        EXPECT_TRUE(service.Enable(program.session, id, {Job.type, TICKET_ID_ALL}, KeyFilter(nullptr)));
+    }
+    ~SLOW_EARS()
+    {
+        Hold(false);
+        m_program.server.Notifications().Remove(m_program.session);
+    }
+    SLOW_EARS(SLOW_EARS const&) = delete;
+    SLOW_EARS& operator=(SLOW_EARS const&) = delete;
+
+    void Hold(bool isHeld)
+    {
+        std::lock_guard const lock(m_lock);
+        m_isHeld = isHeld;
+        m_changed.notify_all();
+    }
+    std::vector<std::string> Heard(std::size_t count)
+    {
+        std::unique_lock lock(m_lock);
+        m_changed.wait_for(lock, std::chrono::minutes(1), [&] { return m_heard.size() >= count; });
+        return m_heard;
+    }
+
+private:
+    void Hear(Notification const& told)
+    {
+        std::unique_lock lock(m_lock);
+        m_changed.wait(lock, [this] { return !m_isHeld; });
+        std::string const text =
+            told.parameters.empty() ? std::to_string(told.kind) : Shown(told.parameters.back());
+        m_heard.push_back(text.substr(text.find_last_of('x') + 1));
+        m_changed.notify_all();
+    }
+
+    Program& m_program;
+    std::mutex m_lock;
+    std::condition_variable m_changed;
+    bool m_isHeld = false;
+    std::vector<std::string> m_heard;
+};
+
+// Gives what SLOW_EARS says of it.
+std::string SetLargeText(Program& program, int value)
+{
+    EXPECT_TRUE(program.Set(Job, "T", std::string(2u << 20, 'x') + std::to_string(value)));
+    return std::to_string(value);
+}
+
+class NoRoom : public testing::Test
+{
+protected:
+    NoRoom()
+    {
+        std::filesystem::create_directories(folder / "tickets");
+        site->AddTicket(SystemTicket);
+        site->AddTicket(Job);
+    }
+
+    // So many texts that the rest of them finds no room, while the ears stand still.
+    std::vector<std::string> Overwhelm(Program& program, int& value)
+    {
+        std::vector<std::string> told;
+        while (one.server.Notifications().HasRoom())
+        {
+            told.push_back(SetLargeText(program, ++value));
+            one.Tickets().CatchUp();
+        }
+        for (int i = 0; i < 20; ++i)
+            told.push_back(SetLargeText(program, ++value));
+        return told;
+    }
+
+    MemoryFolder folder;
+    std::shared_ptr<MemorySite> site =
+        std::make_shared<MemorySite>(StoreLimits{.journalKept = 4, .journalLargest = 200, .feedLargest = 7});
+    Program one{site, folder.Path()};
+    Program two{site, folder.Path()};
+};
+}  // namespace
+
+TEST_F(NoRoom, WhatComesMeanwhile_IsToldWhenThereIsRoom)
+{
+    SLOW_EARS ears(one);
+    int value = 0;
+    std::vector<std::string> told;
+    for (int round = 0; round < 3; ++round)
+    {
+        ears.Hold(true);
+        for (Program* const writer : {&two, &one})
+        {
+            auto const more = Overwhelm(*writer, value);
+            told.insert(told.end(), more.begin(), more.end());
+        }
+        one.server.Tidy();  // what is not told yet is not pruned
+        two.server.Tidy();
+        one.server.Tidy();
+        ears.Hold(false);
+        EXPECT_EQ(ears.Heard(told.size()), told);
+    }
+    EXPECT_TRUE(one.server.Notifications().HasRoom());
+    told.push_back(SetLargeText(two, ++value));
+    EXPECT_EQ(ears.Heard(told.size()), told);
+}
+
+TEST_F(NoRoom, CreationsAndDeletions_ComeInTheirPlaces)
+{
+    SLOW_EARS ears(one);
+    ears.Hold(true);
+    int value = 0;
+    auto told = Overwhelm(two, value);
+    two.Create(OtherJob);
+    two.Delete(OtherJob);
+    one.Create(OtherJob);
+    one.Set(OtherJob, "K", 7);
+    for (char const* const more : {"4", "5", "4", "K=7"})
+        told.push_back(more);
+    ears.Hold(false);
+    EXPECT_EQ(ears.Heard(told.size()), told);
+}
+
+TEST_F(NoRoom, APointer_IsToldAsOne)
+{
+    SLOW_EARS ears(one);
+    ears.Hold(true);
+    int value = 0;
+    auto told = Overwhelm(two, value);
+    EXPECT_TRUE(one.Set(Job, "P", PARAM_POINTER, &value));
+    told.push_back("P:" + std::to_string(PARAM_POINTER));
+    ears.Hold(false);
+    EXPECT_EQ(ears.Heard(told.size()), told);
+}
+
+TEST_F(NoRoom, ForLongerThanTheJournalGoesBack_IsToldOnStderr)
+{
+    SLOW_EARS ears(one);
+    ears.Hold(true);
+    int value = 0;
+    Overwhelm(two, value);
+    for (int i = 0; i < 250; ++i)
+        two.Set(Job, "K", i);
+    two.server.Tidy();
+    testing::internal::CaptureStderr();
+    ears.Hold(false);
+    while (!one.server.Notifications().HasRoom())
+        std::this_thread::yield();
+    std::this_thread::sleep_for(std::chrono::milliseconds(100));
+    EXPECT_THAT(testing::internal::GetCapturedStderr(), HasSubstr("too slow"));
+    std::size_t const before = ears.Heard(0).size();
+    two.Set(Job, "Last", 1);
+    EXPECT_EQ(ears.Heard(before + 1).back(), "Last=1");
+}
+
 // --- a feed that the journal was pruned past
 
 namespace
@@ -487,6 +715,7 @@ class REMEMBERING_LISTENER : public ChangeListener
 {
 public:
     bool Wants(TicketAddress ticket) const override { return ticket.type == Job.type; }
+    bool HasRoom() const override { return true; }
     void Created(TicketAddress ticket) noexcept override
     {
         needless += tickets.contains(ticket) ? 1 : 0;

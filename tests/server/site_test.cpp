@@ -1,6 +1,7 @@
 #include "standin/server/site/Site.h"
 
 #include "standin/server/files/AtomicFile.h"
+#include "standin/server/files/Descriptor.h"
 #include "standin/server/sessions/Password.h"
 #include "standin/server/site/Seed.h"
 #include "standin/server/tickets/TicketXml.h"
@@ -20,6 +21,7 @@
 #include <random>
 #include <set>
 #include <sqlite3.h>
+#include <sys/file.h>
 #include <sys/resource.h>
 #include <sys/stat.h>
 #include <sys/wait.h>
@@ -310,6 +312,54 @@ TEST_F(SiteFolder, SystemTicketFile_ThatCannotBeWritten_IsOneLineOnStderr)
     EXPECT_EQ(testing::internal::GetCapturedStderr(),
               File("tickets").string() + ": cannot be locked: No such file or directory; make the file or "
                                          "folder, or correct its path\n");
+}
+
+// Whoever keeps the turn, a program that was stopped for instance, holds up nobody for long.
+TEST_F(SiteFolder, SystemTicketFile_WhoseTurnSomebodyKeeps_IsWrittenWhenItIsFree)
+{
+    OpenedSite site(Folder(), ShippedSeed);
+    std::string const before = ContentOf(File("tickets/SYS_0000.xml"));
+    testing::internal::CaptureStderr();
+    {
+        Descriptor const turn(open(File("tickets").c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
+        ASSERT_EQ(flock(turn.Number(), LOCK_EX), 0);
+        auto const begun = std::chrono::steady_clock::now();
+        for (int i = 0; i < 20; ++i)
+            EXPECT_TRUE(site.Put("System/Name", "Name " + std::to_string(i)));
+        EXPECT_LT(std::chrono::steady_clock::now() - begun, std::chrono::seconds(15));
+        EXPECT_EQ(ContentOf(File("tickets/SYS_0000.xml")), before);
+    }
+    EXPECT_THAT(testing::internal::GetCapturedStderr(), ContainsRegex("^[^\n]*cannot be locked[^\n]*\n$"));
+    site.Server().Tidy();
+    EXPECT_THAT(ContentOf(File("tickets/SYS_0000.xml")), HasSubstr("Name 19"));
+}
+
+// Somebody edits the database with tools of his own, past the journal.
+TEST_F(SiteFolder, DatabaseEditedByHand_IsReadAndWrittenAllTheSame)
+{
+    OpenedSite site(Folder(), ShippedSeed);
+    auto const edit = [this](char const* sql)
+    {
+        sqlite3* database = nullptr;
+        ASSERT_EQ(sqlite3_open(File("site.db").c_str(), &database), SQLITE_OK);
+        EXPECT_EQ(sqlite3_exec(database, sql, nullptr, nullptr, nullptr), SQLITE_OK);
+        sqlite3_close(database);
+    };
+    auto const pages = [&] { return site.Server().Tickets().Int({3, 1}, "Job/Pages"); };
+
+    edit("UPDATE ticket SET revision = revision + 1000 WHERE type = 3");  // nobody has read it yet
+    EXPECT_EQ(pages(), 48);
+    edit("UPDATE ticket SET revision = 1 WHERE type = 3");
+    EXPECT_TRUE(site.Put({3, 1}, "Job/Pages", TicketValue::Int(50)));
+    EXPECT_EQ(pages(), 50);
+    edit("UPDATE ticket SET incarnation = incarnation + 1, revision = revision + 1 WHERE type = 3");
+    EXPECT_TRUE(site.Put({3, 1}, "Job/Pages", TicketValue::Int(51)));
+    edit("DELETE FROM ticket WHERE type = 3 AND id = 1");
+    EXPECT_FALSE(site.Put({3, 1}, "Job/Pages", TicketValue::Int(52)));
+    EXPECT_EQ(pages(), std::nullopt);
+    edit("INSERT INTO ticket VALUES (3, 1, 1, 1, 0)");
+    EXPECT_FALSE(site.Server().Create({3, 1}));
+    EXPECT_EQ(pages(), 51);  // its values were left behind
 }
 
 TEST_F(SiteFolder, SecondProgram_SharesTheSite)

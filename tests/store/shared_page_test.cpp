@@ -239,6 +239,45 @@ TEST_F(SharedPageTest, Wait_BehindARing_DoesNotSleep)
     EXPECT_LT(std::chrono::steady_clock::now() - start, 50s);
 }
 
+// A waiter of the ringer's own that comes and goes must not be taken for the other one, nor hide it.
+TEST_F(SharedPageTest, RingForOthers_WakesThemWhateverTheOwnOnesDo)
+{
+    std::atomic<bool> isOver{false};
+    std::atomic<std::uint32_t> heard{0};
+    std::vector<std::thread> threads;
+    for (int i = 0; i < 3; ++i)
+        threads.emplace_back(
+            [&]
+            {
+                while (!isOver)
+                    page.Wait(page.Bell(), 1ns);
+            });
+    threads.emplace_back(
+        [&]
+        {
+            while (!isOver)
+            {
+                std::uint32_t const bell = other.Bell();
+                heard = bell;
+                other.Wait(bell, 10s);
+            }
+        });
+    bool isHeard = true;
+    for (int i = 0; i < 2000 && isHeard; ++i)
+    {
+        std::this_thread::sleep_for(20us);  // until the other one is asleep
+        page.Ring(SharedPage::For::Others);
+        auto const limit = std::chrono::steady_clock::now() + 3s;
+        while (heard != page.Bell() && isHeard)
+            isHeard = std::chrono::steady_clock::now() < limit;
+    }
+    EXPECT_TRUE(isHeard);
+    isOver = true;
+    page.Ring(SharedPage::For::All);
+    for (std::thread& thread : threads)
+        thread.join();
+}
+
 TEST_F(SharedPageTest, Turn_IsOnesAlone)
 {
     auto turn = std::make_unique<SharedPage::Turn>(page, 1s);

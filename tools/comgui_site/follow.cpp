@@ -54,7 +54,7 @@ void TellLost(Sequence from, Sequence to, bool isJson, tools::Output& out)
         return out.Add(LineOf(Json{{"lost", {{"from", from}, {"to", to}}}}));
     std::fprintf(stderr,
                  "comgui_site: the journal begins with change %llu; those from %llu to %llu are gone\n",
-                 static_cast<unsigned long long>(to + 1), static_cast<unsigned long long>(from),
+                 static_cast<unsigned long long>(to) + 1, static_cast<unsigned long long>(from),
                  static_cast<unsigned long long>(to));
 }
 

@@ -60,6 +60,7 @@ std::vector<TicketXml> ReadTicketsOf(std::string const& file)
 class Nobody final : public standin::ChangeListener, public standin::TextKeeper, public standin::AfterChange
 {
     bool Wants(TicketAddress) const override { return false; }
+    bool HasRoom() const override { return true; }
     void Created(TicketAddress) noexcept override {}
     void Written(TicketAddress, standin::ChangedParameters&&) noexcept override {}
     void Deleted(TicketAddress) noexcept override {}

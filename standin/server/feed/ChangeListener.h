@@ -23,6 +23,10 @@ public:
     // Whether changes of that ticket are to be heard of. The feed spares itself work for others.
     virtual bool Wants(TicketAddress ticket) const = 0;
 
+    // Whether it can take a change now. If not, the feed goes on without it, and tells it later what is in
+    // the journal until then.
+    virtual bool HasRoom() const = 0;
+
     // Called for one change after the other, in the order of the commits, under the feed's lock: neither may
     // wait for anything, nor use the feed. Of a creation the parameters come apart, as a write behind it.
     virtual void Created(TicketAddress ticket) noexcept = 0;

@@ -105,10 +105,12 @@ void Epochs::Retire(Garbage&& garbage, TextKeeper& texts) noexcept
     if (garbage.IsEmpty())
         return;
     std::size_t waiting = 0;
-    std::uint64_t const now = s_now.load(std::memory_order_relaxed);
+    std::uint64_t now = 0;
     try
     {
         std::lock_guard const lock(m_lock);
+        // Not a plain load: what took the garbage's place must be seen by whoever enters in a later epoch.
+        now = s_now.fetch_add(0, std::memory_order_acq_rel);
         m_retired.push_back({now, {}, &texts});
         m_retired.back().garbage = std::move(garbage);
         waiting = m_retired.size();

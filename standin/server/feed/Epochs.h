@@ -45,7 +45,8 @@ public:
         {
             if (m_reader.depth++ != 0)
                 return;
-            std::uint64_t const now = s_now.load(std::memory_order_relaxed);
+            // Who finds this epoch finds all that was published before it began.
+            std::uint64_t const now = s_now.load(std::memory_order_acquire);
             if (s_systemBarrier.load(std::memory_order_relaxed)) [[likely]]
             {
                 m_reader.epoch.store(now, std::memory_order_release);
@@ -66,7 +67,7 @@ public:
         Reader& m_reader;
     };
 
-    // Takes over what no new reader can find any more.
+    // Takes over what no new reader can find any more. Not inside a section.
     void Retire(Garbage&& garbage, TextKeeper& texts) noexcept;
 
     // Frees what can be freed. Drain waits until all is that was retired before: not inside a section.

@@ -11,6 +11,9 @@ namespace
 // A program that dies between its commit and its ring is noticed after that time at the latest.
 constexpr std::chrono::milliseconds SlowPoll(500);
 
+// To a listener that has no room.
+constexpr std::chrono::milliseconds QuickPoll(5);
+
 using Values = std::vector<TicketCache::LoadedValue>;
 
 std::optional<Store::Loaded> LoadFrom(Store& store, TicketAddress address, Values& values)
@@ -57,7 +60,7 @@ void Feed::Report(std::string const& line) noexcept
         standin::Report(line);
 }
 
-void Feed::CatchUp() noexcept { CatchUp(m_committed.load(std::memory_order_acquire)); }
+bool Feed::CatchUp() noexcept { return CatchUp(m_committed.load(std::memory_order_acquire)); }
 
 bool Feed::CatchUp(Sequence sequence) noexcept
 {
@@ -106,11 +109,25 @@ void Feed::Fetch(Lock& lock)
     Fetching const fetching{*this, lock};
     lock.unlock();
     std::vector<CommittedChange> fetched;
-    bool const isThere =
-        m_store.ChangesSince(after, [&](CommittedChange&& change) { fetched.push_back(std::move(change)); });
+    bool isThere = false;
+    try
+    {
+        isThere = m_store.ChangesSince(after, [&](CommittedChange&& change)
+                                       { fetched.push_back(std::move(change)); });
+    }
+    catch (BrokenJournal const& broken)
+    {
+        standin::Report(broken.what());
+    }
     if (!isThere)
         return Rebuild(lock);
     lock.lock();
+    TakeFromJournal(fetched);
+    MakeReady();
+}
+
+void Feed::TakeFromJournal(std::vector<CommittedChange>& fetched)
+{
     for (CommittedChange& change : fetched)
     {
         if (change.program == m_store.Self() && m_onlyHere.contains(change.number))
@@ -118,7 +135,6 @@ void Feed::Fetch(Lock& lock)
         else
             m_ready.try_emplace(change.sequence, std::move(change));
     }
-    MakeReady();
 }
 
 // Makes what is there without a gap.
@@ -148,19 +164,96 @@ void Feed::Make(CommittedChange& committed)
     if (committed.sequence <= m_cache.RevisionOf(ticket))
         return;  // a rebuilding has seen more of this ticket than of others, and told of it
     bool const isWanted = m_listener.Wants(ticket);
-    ChangedParameters news = isWanted ? NewsOf(change) : ChangedParameters();
+    if (isWanted && !m_told && !m_listener.HasRoom())
+        m_told = committed.sequence - 1;
+    bool const isNewsOnlyHere = m_told && HasPointers(change);
+    ChangedParameters news = isWanted && (!m_told || isNewsOnlyHere) ? NewsOf(change) : ChangedParameters();
     bool const isLoaded = change.kind != TicketChange::Write || m_cache.Find(ticket);
     if (isWanted && !isLoaded)
         m_wanted.insert(ticket);
     m_cache.Make(change, committed.sequence);
-    if (!isWanted)
-        return;
-    if (change.kind == TicketChange::Create)
+    if (isWanted && !m_told)
+        Tell(change.kind, ticket, std::move(news));
+    else if (isWanted && isNewsOnlyHere)
+        m_pointersToTell.emplace(committed.sequence, std::move(news));
+}
+
+void Feed::Tell(TicketChange::Kind kind, TicketAddress ticket, ChangedParameters&& news)
+{
+    if (kind == TicketChange::Create)
         m_listener.Created(ticket);
-    if (change.kind == TicketChange::Delete)
+    if (kind == TicketChange::Delete)
         m_listener.Deleted(ticket);
     else if (!news.empty())
         m_listener.Written(ticket, std::move(news));
+}
+
+// Tells a listener that had no room what has come meanwhile, as far as it has room now. True if there is
+// more.
+bool Feed::TellMore()
+{
+    for (;;)
+    {
+        std::optional<Sequence> told;
+        {
+            std::lock_guard const lock(m_lock);
+            told = m_told;
+        }
+        if (!told || !m_listener.HasRoom())
+            return told.has_value();
+        std::vector<CommittedChange> fetched;
+        bool const isThere = m_store.ChangesSince(*told, [&](CommittedChange&& change)
+                                                  { fetched.push_back(std::move(change)); });
+        std::lock_guard const lock(m_lock);
+        if (m_told != told)
+            continue;  // a rebuilding has told the rest
+        if (!isThere)
+            GiveUpTelling("the journal no longer has what they were not told yet");
+        for (auto change = fetched.begin(); change != fetched.end() && m_listener.HasRoom(); ++change)
+        {
+            if (change->sequence > m_heard.load(std::memory_order_relaxed))
+                break;
+            TellFromJournal(*change);
+            m_told = change->sequence;
+        }
+        if (m_told == m_heard.load(std::memory_order_relaxed))
+        {
+            m_told.reset();
+            m_pointersToTell.clear();
+        }
+        if (fetched.empty())
+            return m_told.has_value();
+    }
+}
+
+void Feed::TellFromJournal(CommittedChange const& committed)
+{
+    TicketAddress const ticket = committed.change.address;
+    auto const ahead = m_toldAhead.find(ticket);
+    bool const isTold = ahead != m_toldAhead.end() && committed.sequence <= ahead->second;
+    if (isTold || !m_listener.Wants(ticket))
+        return;
+    auto const pointers = m_pointersToTell.find(committed.sequence);
+    Tell(committed.change.kind, ticket,
+         pointers != m_pointersToTell.end() ? std::move(pointers->second) : NewsOf(committed.change));
+}
+
+void Feed::GiveUpTelling(std::string const& reason) noexcept
+{
+    if (m_told)
+        standin::Report("clients of this program are too slow, and " + reason +
+                        "; they should read their tickets anew");
+    m_told.reset();
+    m_pointersToTell.clear();
+}
+
+Sequence Feed::Settled()
+{
+    std::lock_guard const lock(m_lock);
+    Sequence settled = m_heard.load(std::memory_order_relaxed);
+    if (m_told)
+        settled = std::min(settled, *m_told);
+    return m_begunAt.empty() ? settled : std::min(settled, *m_begunAt.begin());
 }
 
 ChangedParameters Feed::NewsOf(TicketChange const& change)
@@ -183,9 +276,16 @@ bool Feed::Load(TicketAddress address)
             // What is published is never ahead of what was heard.
             if (!loaded || !CatchUp(loaded->sequence))
                 return false;
-            std::lock_guard const lock(m_lock);
-            if (m_cache.Publish(address, loaded->state, values))
-                return true;
+            {
+                std::lock_guard const lock(m_lock);
+                if (m_cache.Publish(address, loaded->state, values))
+                    return true;
+                bool const hasChanged = m_cache.RevisionOf(address) > loaded->sequence;
+                if (hasChanged)
+                    continue;
+            }
+            Reload(address);  // no change explains it, or the ticket is gone
+            return m_cache.IncarnationOf(address) != 0;
         }
     }
     catch (StoreError const& error)
@@ -197,19 +297,24 @@ bool Feed::Load(TicketAddress address)
 
 void Feed::Reload(TicketAddress address)
 {
-    Values values;
-    auto const loaded = LoadFrom(m_store, address, values);
-    if (loaded)
-        CatchUp(loaded->sequence);
-    std::lock_guard const lock(m_lock);
-    bool const isOvertaken = loaded && m_cache.RevisionOf(address) > loaded->state.revision;
-    if (isOvertaken)
+    for (;;)
+    {
+        Sequence const before = m_committed.load(std::memory_order_acquire);
+        Values values;
+        auto const loaded = LoadFrom(m_store, address, values);
+        Sequence const seen = loaded ? loaded->sequence : before;
+        bool const isHeard = CatchUp(seen);
+        std::lock_guard const lock(m_lock);
+        bool const isOvertaken = m_heard.load(std::memory_order_relaxed) > seen;
+        if (isOvertaken)
+            continue;
+        m_cache.Forget(address);
+        if (!loaded || !isHeard)
+            return;
+        m_cache.Note(address, loaded->state);
+        m_cache.Publish(address, loaded->state, values);
         return;
-    m_cache.Forget(address);
-    if (!loaded)
-        return;
-    m_cache.Note(address, loaded->state);
-    m_cache.Publish(address, loaded->state, values);
+    }
 }
 
 void Feed::LoadWanted()
@@ -225,20 +330,21 @@ void Feed::LoadWanted()
 
 void Feed::Listen()
 {
+    bool hasMore = false;
     for (Lock lock(m_lock); !m_isStopped;)
     {
         lock.unlock();
-        bool works = true;
+        bool works = false;
         try
         {
-            m_store.WaitForChanges(Heard(), SlowPoll);
-            CatchUp();
+            m_store.WaitForChanges(Heard(), hasMore ? QuickPoll : SlowPoll);
+            works = CatchUp();
+            hasMore = TellMore();
             LoadWanted();
             Epochs::Get().Collect();
         }
         catch (std::exception const& error)
         {
-            works = false;
             Report(error.what());
         }
         lock.lock();
@@ -251,19 +357,20 @@ Feed::OwnChange::OwnChange(Feed& feed, TicketChange change)
     : m_feed(feed), m_change(std::move(change)), m_number(++feed.m_newestNumber),
       m_isOnlyHere(HasPointers(m_change))
 {
-    if (!m_isOnlyHere)
-        return;
     std::lock_guard const lock(m_feed.m_lock);
-    m_feed.m_onlyHere.insert(m_number);
+    if (m_isOnlyHere)
+        m_feed.m_onlyHere.insert(m_number);
+    m_begun = m_feed.m_begunAt.insert(m_feed.m_heard.load(std::memory_order_relaxed));
 }
 
 Feed::OwnChange::~OwnChange()
 {
+    std::lock_guard const lock(m_feed.m_lock);
+    m_feed.m_begunAt.erase(m_begun);
     if (!m_isOnlyHere)
         return;
-    std::lock_guard const lock(m_feed.m_lock);
-    if (m_feed.m_onlyHere.erase(m_number))
-        m_feed.m_awaited = 0;  // then it comes from the journal
+    m_feed.m_onlyHere.erase(m_number);
+    m_feed.m_awaited = 0;  // if it was not delivered it comes from the journal
     m_feed.m_progress.notify_all();
 }
 
@@ -275,11 +382,11 @@ void Feed::OwnChange::Deliver(CommitOutcome const& outcome) noexcept
     try
     {
         std::lock_guard const lock(m_feed.m_lock);
+        m_feed.m_onlyHere.erase(m_number);  // first: if there is no memory for it, it comes from the journal
         if (outcome.sequence > m_feed.m_heard.load(std::memory_order_relaxed))
             m_feed.m_ready.insert_or_assign(
                 outcome.sequence,
                 CommittedChange{outcome.sequence, m_feed.m_store.Self(), m_number, std::move(m_change)});
-        m_feed.m_onlyHere.erase(m_number);
         m_feed.MakeReady();
     }
     catch (std::exception const& error)

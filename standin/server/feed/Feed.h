@@ -11,6 +11,7 @@
 #include "standin/server/feed/TicketCache.h"
 #include <condition_variable>
 #include <map>
+#include <optional>
 #include <set>
 #include <thread>
 
@@ -51,8 +52,12 @@ public:
 
     Sequence Heard() const { return m_heard.load(std::memory_order_acquire); }
 
-    // A change that this program commits. Made before the commit; if it is neither delivered nor dropped by
-    // its end it counts as dropped.
+    // Up to which change nothing of the journal will be needed again here: neither for the cache, nor for a
+    // listener that has no room yet, nor for a change of this program whose outcome is being asked for.
+    Sequence Settled();
+
+    // A change that this program commits. Made before the commit; if it is not delivered by its end it comes
+    // from the journal, if it was committed at all.
     class OwnChange
     {
     public:
@@ -72,16 +77,22 @@ public:
         TicketChange m_change;
         std::uint64_t const m_number;
         bool const m_isOnlyHere;  // it has pointers, which no journal keeps
+        std::multiset<Sequence>::iterator m_begun;
     };
 
 private:
     using Lock = std::unique_lock<std::mutex>;
 
-    void CatchUp() noexcept;
+    bool CatchUp() noexcept;
     void Fetch(Lock& lock);
+    void TakeFromJournal(std::vector<CommittedChange>& fetched);
     void MakeReady();
     void Make(CommittedChange& committed);
     ChangedParameters NewsOf(TicketChange const& change);
+    void Tell(TicketChange::Kind kind, TicketAddress ticket, ChangedParameters&& news);
+    bool TellMore();
+    void TellFromJournal(CommittedChange const& committed);
+    void GiveUpTelling(std::string const& reason) noexcept;
     void Listen();
     void LoadWanted();
     void Report(std::string const& line) noexcept;
@@ -106,7 +117,11 @@ private:
     std::map<Sequence, CommittedChange> m_ready;  // behind what was heard, perhaps with gaps
     std::set<std::uint64_t> m_onlyHere;           // numbers of own changes that only their writers can bring
     Sequence m_awaited = 0;                       // of such a one, which is next; 0: none
-    std::set<TicketAddress> m_wanted;             // have changed, and the listener was told; not loaded yet
+    std::multiset<Sequence> m_begunAt;            // what was heard when own changes on their way began
+    std::optional<Sequence> m_told;  // the listener has no room: up to where it was told; the rest waits
+    std::map<Sequence, ChangedParameters> m_pointersToTell;  // which no journal keeps
+    std::map<TicketAddress, Sequence> m_toldAhead;  // by the last rebuilding: up to where it told of a ticket
+    std::set<TicketAddress> m_wanted;               // have changed, and the listener was told; not loaded yet
     bool m_isFetching = false;
     std::condition_variable m_progress;
     bool m_isStopped = false;

@@ -46,6 +46,11 @@ void Feed::Rebuild(Lock& lock)
 {
     Listing listing = List();
     lock.lock();
+    GiveUpTelling("the journal no longer has what they were not told yet");
+    m_toldAhead.clear();
+    for (auto const& [address, ticket] : listing.tickets)
+        if (ticket.state.revision > listing.sequence)
+            m_toldAhead.emplace(address, ticket.state.revision);
     TakeOver(listing);
     m_heard.store(listing.sequence, std::memory_order_release);
     MakeReady();
@@ -74,10 +79,10 @@ void Feed::TakeOver(Listing& listing)
             continue;
         bool const isNew = m_cache.IncarnationOf(address) == 0;
         bool const isWanted = m_listener.Wants(address);
-        Epochs::Guard const guard;
         ChangedParameters news;
         if (isWanted && ticket.isLoaded)
-            news = Difference(m_cache.Find(address), ticket.values);
+            news =
+                Difference(m_cache.Find(address), ticket.values);  // nobody else replaces it under the lock
         m_cache.Note(address, ticket.state);
         if (ticket.isLoaded)
             m_cache.Publish(address, ticket.state, ticket.values);

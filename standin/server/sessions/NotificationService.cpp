@@ -90,7 +90,7 @@ NotificationService::Listener* NotificationService::Find(Session const& session,
 bool NotificationService::Register(Session const& session, int id, Callback callback)
 {
     auto listener =
-        std::make_shared<Listener>(Listener{session.Number(), session.Who().name, id, std::move(callback)});
+        std::make_shared<Listener>(Listener{session.Number(), id, std::move(callback)});
     Lock lock(m_lock);
     if (!m_thread.joinable())
         m_thread = std::thread([this] { Run(); });
@@ -178,13 +178,7 @@ void NotificationService::Withdraw(Listener& listener)
                   });
 }
 
-void NotificationService::Unqueue(Message& message)
-{
-    Listener& listener = *message.listener;
-    listener.pending -= message.weight;
-    if (listener.pending == 0)
-        listener.dropping = false;
-}
+void NotificationService::Unqueue(Message& message) { message.listener->pending -= message.weight; }
 
 void NotificationService::WaitFor(int id, Lock& lock)
 {
@@ -200,6 +194,13 @@ bool NotificationService::Wants(TicketAddress ticket) const
     std::lock_guard const lock(m_lock);
     return std::any_of(m_listeners.begin(), m_listeners.end(),
                        [&](auto const& listener) { return listener->Wants(ticket); });
+}
+
+bool NotificationService::HasRoom() const
+{
+    std::lock_guard const lock(m_lock);
+    return std::all_of(m_listeners.begin(), m_listeners.end(),
+                       [](auto const& listener) { return listener->pending < PendingLimit; });
 }
 
 void NotificationService::Post(NotificationKind kind, TicketAddress ticket,
@@ -257,20 +258,9 @@ void NotificationService::Queue(std::shared_ptr<Listener> const& listener, Notif
 
 void NotificationService::Append(Message message)
 {
-    auto const listener = message.listener;
     message.weight = WeightOf(message.changes);
-    if (listener->pending == 0 || listener->pending + message.weight <= PendingLimit)
-    {
-        listener->pending += message.weight;
-        m_waiting.push_back(std::move(message));
-        return;
-    }
-    if (!listener->dropping)
-        std::fprintf(stderr,
-                     "notification id %d of user %s: the client is too slow, changes are dropped while %zu "
-                     "wait for it; it should read its tickets anew\n",
-                     listener->id, listener->user.c_str(), listener->pending);
-    listener->dropping = true;
+    message.listener->pending += message.weight;
+    m_waiting.push_back(std::move(message));
 }
 
 void NotificationService::Run()

@@ -2,8 +2,8 @@
 // order; one thread of the service's own passes them on, one callback at a time. No lock is held during a
 // callback, which may use the server and this service as it likes.
 //
-// For any thread. A session that is slow to take its notifications loses the newest ones; it never keeps
-// anybody from writing.
+// For any thread. A session that is slow to take its notifications never keeps anybody from writing: while
+// too many wait for it there is no room for more, and the feed brings them when there is.
 #pragma once
 
 #include "standin/server/feed/ChangeListener.h"
@@ -37,8 +37,8 @@ struct Notification
 class NotificationService final : public ChangeListener
 {
 public:
-    // Records that wait for one session at most; a text counts as one for every KiB of it. A change that is
-    // larger still waits if nothing else does.
+    // With so many records waiting for one session there is no room for another change; a text counts as one
+    // for every KiB of it.
     static constexpr std::size_t PendingLimit = 65536;
 
     using Callback = std::function<void(Notification const&)>;
@@ -67,6 +67,7 @@ public:
 
     // From the feed. Costs next to nothing while nobody wants anything.
     bool Wants(TicketAddress ticket) const override;
+    bool HasRoom() const override;
     void Created(TicketAddress ticket) noexcept override { Post(TicketCreated, ticket, {}); }
     void Written(TicketAddress ticket, ChangedParameters&& parameters) noexcept override
     {
@@ -85,12 +86,10 @@ private:
     struct Listener
     {
         unsigned long long session;
-        std::string user;
         int id;
         Callback callback;
         std::map<TicketAddress, KeyFilter> subscriptions{};
         std::size_t pending = 0;
-        bool dropping = false;
         bool gone = false;
 
         bool Wants(TicketAddress ticket) const;

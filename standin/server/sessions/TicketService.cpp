@@ -45,9 +45,12 @@ bool TicketService::Write(Session const& session, TicketAddress address, Incarna
     return false;
 }
 
-bool TicketService::Create(Session const& session, TicketAddress address)
+std::optional<Incarnation> TicketService::Create(Session const& session, TicketAddress address)
 {
-    return IsValid(address) && MayWrite(session, address) && m_writer.Create({address});
+    if (!IsValid(address) || !MayWrite(session, address))
+        return std::nullopt;
+    auto const made = m_writer.Create({address});
+    return made ? std::optional(made->incarnation) : std::nullopt;
 }
 
 int TicketService::CreateNext(Session const& session, int type)

@@ -63,8 +63,8 @@ public:
     bool Write(Session const& session, TicketAddress address, Incarnation incarnation,
                std::span<TicketWrite> writes);
 
-    // False for a ticket that is there already, for an address out of range, and without the right.
-    bool Create(Session const& session, TicketAddress address);
+    // Nothing for a ticket that is there already, for an address out of range, and without the right.
+    std::optional<Incarnation> Create(Session const& session, TicketAddress address);
 
     // Makes a ticket of a type and gives its id, as Store::Commit chooses it; -1 where Create would refuse.
     int CreateNext(Session const& session, int type);

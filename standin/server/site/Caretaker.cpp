@@ -46,12 +46,13 @@ void Caretaker::Tidy() noexcept
     std::lock_guard const round(m_round);
     try
     {
-        m_store.Maintain(m_feed.Heard());
+        m_store.Maintain(m_feed.Settled());
         if (m_store.Bury([this](Estate const& estate) { Clear(estate); }) > 0)
         {
             SweepJobFolders(m_tickets, m_site);
             m_mirror.Write();  // it may have died between a change and the copy of it
         }
+        m_mirror.CatchUp();
         m_hasReported = false;
     }
     catch (std::exception const& error)

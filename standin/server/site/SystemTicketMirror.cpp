@@ -5,33 +5,64 @@
 #include "standin/server/files/Report.h"
 #include "standin/server/tickets/TicketXml.h"
 #include <cerrno>
+#include <chrono>
 #include <fcntl.h>
 #include <sys/file.h>
+#include <thread>
 
 namespace standin
 {
+namespace
+{
+constexpr std::chrono::milliseconds TurnLimit(2000);
+constexpr std::chrono::milliseconds Pause(1);
+}  // namespace
+
 SystemTicketMirror::SystemTicketMirror(TicketService& tickets, std::filesystem::path const& site)
     : m_tickets(tickets), m_file(site / "tickets" / "SYS_0000.xml")
 {
 }
 
+// Behind somebody who keeps the turn only the first waits.
 void SystemTicketMirror::Write() noexcept
 {
+    bool const wasBehind = m_isBehind.exchange(false);  // before the ticket is read
     try
     {
-        std::lock_guard const turn(m_turn);
-        auto const folder = m_file.parent_path();
-        Descriptor const lock(open(folder.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
-        if (lock.Number() < 0 || flock(lock.Number(), LOCK_EX) != 0)
-            throw FileError(FileFault(folder, "cannot be locked", errno));
-        TicketXml copy;
-        auto const take = [&](TicketSnapshot const& ticket) { copy = TicketXml::Of(SystemTicket, ticket); };
-        if (m_tickets.LookAt(SystemTicket, 0, [&](auto const& ticket) { return take(ticket), true; }))
-            copy.Write(m_file);
+        WriteInTurn(wasBehind ? std::chrono::milliseconds(0) : TurnLimit);
+        m_hasReported = false;
     }
     catch (std::exception const& error)
     {
-        Report(error.what());
+        m_isBehind = true;
+        if (!m_hasReported.exchange(true))
+            Report(error.what());
     }
+}
+
+void SystemTicketMirror::CatchUp() noexcept
+{
+    if (m_isBehind)
+        Write();
+}
+
+void SystemTicketMirror::WriteInTurn(std::chrono::milliseconds limit)
+{
+    auto const end = std::chrono::steady_clock::now() + limit;
+    auto const folder = m_file.parent_path();
+    std::unique_lock const turn(m_turn, end);
+    Descriptor const lock(open(folder.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
+    if (!turn || lock.Number() < 0)
+        throw FileError(FileFault(folder, "cannot be locked", turn ? errno : EBUSY));
+    while (flock(lock.Number(), LOCK_EX | LOCK_NB) != 0)
+    {
+        if (errno != EWOULDBLOCK || std::chrono::steady_clock::now() > end)
+            throw FileError(FileFault(folder, "cannot be locked", errno));
+        std::this_thread::sleep_for(Pause);
+    }
+    TicketXml copy;
+    auto const take = [&](TicketSnapshot const& ticket) { copy = TicketXml::Of(SystemTicket, ticket); };
+    if (m_tickets.LookAt(SystemTicket, 0, [&](auto const& ticket) { return take(ticket), true; }))
+        copy.Write(m_file);
 }
 }  // namespace standin

@@ -2,7 +2,10 @@
 #pragma once
 
 #include "standin/server/sessions/TicketService.h"
+#include <atomic>
+#include <chrono>
 #include <filesystem>
+#include <mutex>
 
 namespace standin
 {
@@ -14,12 +17,19 @@ public:
 
     // Writes the file from the newest system ticket. Programs take turns, and each reads in its turn, so what
     // the last of them leaves is no older than any change before. The file is a copy: a failure is reported
-    // on stderr and stops nobody.
+    // on stderr and stops nobody, and neither does a program that keeps its turn.
     void Write() noexcept;
 
+    // Writes it if the last attempt failed. To be called now and then.
+    void CatchUp() noexcept;
+
 private:
+    void WriteInTurn(std::chrono::milliseconds limit);
+
     TicketService& m_tickets;
     std::filesystem::path const m_file;
-    std::mutex m_turn;  // of this program's threads
+    std::timed_mutex m_turn;  // of this program's threads
+    std::atomic<bool> m_isBehind{false};
+    std::atomic<bool> m_hasReported{false};  // since it worked
 };
 }  // namespace standin

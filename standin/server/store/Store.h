@@ -6,7 +6,8 @@
 // call but Committed() may wait for the disk, for another program, or for a network.
 //
 // Every operation throws StoreError when the store fails (disk full, damaged, connection lost ...). Nothing
-// of the failed operation has taken effect then; only Commit has an answer of its own for "nobody knows".
+// of the failed operation has taken effect then, but for what Sync says; only Commit has an answer of its own
+// for "nobody knows".
 #pragma once
 
 #include "standin/server/store/TicketChange.h"
@@ -26,6 +27,13 @@ class StoreError : public std::runtime_error
 {
 public:
     using std::runtime_error::runtime_error;
+};
+
+// A record of the journal cannot be read. The tickets may be sound all the same.
+class BrokenJournal : public StoreError
+{
+public:
+    using StoreError::StoreError;
 };
 
 struct User
@@ -111,7 +119,9 @@ public:
     virtual std::optional<CommitOutcome> FindCommit(std::uint64_t number) = 0;
 
     // What was committed through this handle is on the disk when this returns, so that a power cut cannot
-    // take it back. Callers that wait at the same time share one flush.
+    // take it back. Callers that wait at the same time share one flush. If it throws, what was committed
+    // holds, but a power cut may take it back; so it is with a change of the users that throws for this
+    // reason.
     virtual void Sync() = 0;
 
     // --- what holds
@@ -141,7 +151,7 @@ public:
 
     // Hands out the changes behind that one, in order and without gaps, as many as are there but not more
     // than a few thousand, or some megabytes. take may use the store. False, with nothing handed out, if the
-    // journal begins later than that.
+    // journal begins later than that. Throws BrokenJournal for a record that nobody can read.
     virtual bool ChangesSince(Sequence after, std::function<void(CommittedChange&&)> const& take) = 0;
 
     // Returns when another handle has committed a change above that number, when the time is over, after

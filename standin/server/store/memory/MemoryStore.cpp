@@ -72,6 +72,18 @@ void MemorySite::FailOperation(int which)
     m_hasFailed = false;
 }
 
+void MemorySite::FailJournal(bool fail)
+{
+    std::lock_guard const lock(m_mutex);
+    m_failJournal = fail;
+}
+
+void MemorySite::BreakJournal()
+{
+    std::lock_guard const lock(m_mutex);
+    m_journal.back().bytes = "no record";
+}
+
 void MemorySite::AnswerUnknownOnce(bool andCommit)
 {
     std::lock_guard const lock(m_mutex);
@@ -95,6 +107,12 @@ void MemorySite::InterjectBehind(std::function<void()> action)
 {
     std::lock_guard const lock(m_mutex);
     m_interjectionBehind = std::move(action);
+}
+
+int MemorySite::Looks() const
+{
+    std::lock_guard const lock(m_mutex);
+    return m_looks;
 }
 
 int MemorySite::Loads() const
@@ -330,6 +348,9 @@ bool MemoryStore::ChangesSince(Sequence after, std::function<void(CommittedChang
 {
     std::vector<CommittedChange> changes;
     auto lock = Begin("ChangesSince");
+    ++m_site->m_looks;
+    if (m_site->m_failJournal)
+        throw StoreError("the site in memory: its journal was told to fail; tell it not to");
     if (after < m_site->m_pruned)
         return false;
     Sequence const end = std::min(m_site->m_committed.load(), after + m_site->m_limits.feedLargest);
@@ -337,8 +358,15 @@ bool MemoryStore::ChangesSince(Sequence after, std::function<void(CommittedChang
     {
         MemorySite::Record const& record =
             m_site->m_journal[static_cast<std::size_t>(sequence - m_site->m_pruned - 1)];
-        CommittedChange change{sequence, record.program, record.number,
-                               ReadChangeRecord(record.kind, record.address, record.bytes)};
+        CommittedChange change{sequence, record.program, record.number, {}};
+        try
+        {
+            change.change = ReadChangeRecord(record.kind, record.address, record.bytes);
+        }
+        catch (StoreError const& error)
+        {
+            throw BrokenJournal(std::string("the site in memory: ") + error.what());
+        }
         if (record.kind == TicketChange::Create)
             change.change.incarnation = change.change.revision = sequence;
         changes.push_back(std::move(change));

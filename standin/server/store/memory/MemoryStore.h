@@ -28,12 +28,15 @@ public:
     // Faults. All of them hold for every handle.
     void FailAll(bool fail);                       // every operation throws StoreError
     void FailOperation(int which);                 // that operation from now on throws, 1 for the next; once
+    void FailJournal(bool fail);                   // reading it throws StoreError
+    void BreakJournal();                           // its newest record cannot be read any more
     void AnswerUnknownOnce(bool andCommit);        // the next Commit, which happens or does not
     bool HasFailed() const;                        // the fault that was ordered last has shown
     void Interject(std::function<void()> action);  // runs once, when the next Commit begins; may use handles
     void InterjectBehind(std::function<void()> action);  // the same when one was made and is not answered yet
 
     int Loads() const;    // calls of Load that were answered
+    int Looks() const;    // calls of ChangesSince
     int Commits() const;  // changes that were committed by programs
 
 private:
@@ -95,6 +98,8 @@ private:
         AndCommitted,
     } m_unknown = Unknown::No;
     bool m_hasFailed = false;
+    bool m_failJournal = false;
+    int m_looks = 0;
     std::function<void()> m_interjection;
     std::function<void()> m_interjectionBehind;
     int m_loads = 0;

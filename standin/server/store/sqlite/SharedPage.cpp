@@ -32,9 +32,10 @@ constexpr std::uint32_t Version = 2;
 using namespace std::chrono_literals;
 using std::chrono::steady_clock;
 
-void Raise(std::atomic<Sequence>& number, Sequence to) noexcept
+template <typename T>
+void Raise(std::atomic<T>& number, T to) noexcept
 {
-    Sequence now = number.load();
+    T now = number.load();
     while (now < to && !number.compare_exchange_weak(now, to))
     {
     }
@@ -57,6 +58,8 @@ struct SharedPage::Page
     std::atomic<std::uint32_t> waiting;  // for the bell, in all programs; of those that died some may be left
     std::atomic<std::uint32_t> hasDamage;
     std::atomic<std::uint32_t> isTidy;
+    std::atomic<std::uint32_t> failedFlushes;
+    std::atomic<std::uint32_t> mendedFlushes;
     alignas(64) std::atomic<std::uint32_t> turns;  // counts them
     std::atomic<std::uint32_t> isTurnOpen;         // begun and not yet ended
     pthread_mutex_t turn;
@@ -104,16 +107,25 @@ void SharedPage::Ring(For whom) noexcept
     static_assert(sizeof m_page->bell == sizeof(std::uint32_t));
     ++m_page->bell;
     // Who waits has counted himself before he looked at the bell, so nobody is overlooked.
-    if (whom == For::All || m_page->waiting > m_waitingHere)
+    bool const isDue = [&]
+    {
+        std::lock_guard const lock(m_counting);
+        return whom == For::All || m_page->waiting > m_waitingHere;
+    }();
+    if (isDue)
         syscall(SYS_futex, &m_page->bell, FUTEX_WAKE, INT_MAX, nullptr, nullptr, 0);
 }
 
 void SharedPage::Wait(std::uint32_t bell, std::chrono::nanoseconds time) noexcept
 {
     timespec const limit{static_cast<std::time_t>(time / 1s), static_cast<long>((time % 1s).count())};
-    ++m_page->waiting;
-    ++m_waitingHere;
+    {
+        std::lock_guard const lock(m_counting);
+        ++m_waitingHere;
+        ++m_page->waiting;
+    }
     syscall(SYS_futex, &m_page->bell, FUTEX_WAIT, bell, &limit, nullptr, 0);
+    std::lock_guard const lock(m_counting);
     --m_waitingHere;
     --m_page->waiting;
 }
@@ -208,6 +220,11 @@ void SharedPage::RaiseCommitted(Sequence committed) noexcept { Raise(m_page->com
 
 Sequence SharedPage::Flushed() const noexcept { return m_page->flushed; }
 void SharedPage::RaiseFlushed(Sequence flushed) noexcept { Raise(m_page->flushed, flushed); }
+
+std::uint32_t SharedPage::FailedFlushes() const noexcept { return m_page->failedFlushes; }
+std::uint32_t SharedPage::MendedFlushes() const noexcept { return m_page->mendedFlushes; }
+void SharedPage::NoteFailedFlush() noexcept { ++m_page->failedFlushes; }
+void SharedPage::NoteMendedFlushes(std::uint32_t failed) noexcept { Raise(m_page->mendedFlushes, failed); }
 
 std::uint32_t SharedPage::Bell() const noexcept { return m_page->bell; }
 

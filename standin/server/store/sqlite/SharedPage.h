@@ -9,6 +9,7 @@
 #include <atomic>
 #include <chrono>
 #include <cstdint>
+#include <mutex>
 #include <optional>
 
 namespace standin
@@ -51,6 +52,12 @@ public:
     // Up to which change all is known to be on the disk.
     Sequence Flushed() const noexcept;
     void RaiseFlushed(Sequence flushed) noexcept;
+
+    // How many flushes have failed, in all programs, and how many of them no longer matter.
+    std::uint32_t FailedFlushes() const noexcept;
+    std::uint32_t MendedFlushes() const noexcept;
+    void NoteFailedFlush() noexcept;
+    void NoteMendedFlushes(std::uint32_t failed) noexcept;
 
     // The bell: a number that each ring changes. Wait returns when it is no longer that one, when the time is
     // over, or for no reason. A ring for others may leave those asleep who wait here, in this mapping of the
@@ -106,6 +113,7 @@ private:
 
     LockFile& m_file;
     Page* m_page;
-    std::atomic<std::uint32_t> m_waitingHere{0};
+    std::mutex m_counting;            // keeps the number of those who wait here and the page's in step
+    std::uint32_t m_waitingHere = 0;  // of those on the page
 };
 }  // namespace standin

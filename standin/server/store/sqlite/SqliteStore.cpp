@@ -45,6 +45,18 @@ std::string MachineName()
     return gethostname(name, sizeof name - 1) == 0 && name[0] != '\0' ? name : "localhost";
 }
 
+[[noreturn]] void FailAsBrokenJournal(Database const& database, std::string const& reason)
+{
+    try
+    {
+        database.FailAsDamaged(reason);
+    }
+    catch (StoreError const& error)
+    {
+        throw BrokenJournal(error.what());
+    }
+}
+
 bool IsDeletion(ParameterChange const& parameter)
 {
     return parameter.value.type == PARAM_NONE || parameter.value.type == PARAM_POINTER;
@@ -155,27 +167,6 @@ private:
     Database::Transaction m_transaction;
 };
 
-// Brings the journal of the database to the disk by the database's own descriptor: any other that is opened
-// and closed would take the process's locks along. A connection of its own, so that it meets nobody.
-struct SqliteStore::Flusher
-{
-    explicit Flusher(std::filesystem::path const& file) : database(file, false)
-    {
-        database.Number("SELECT count(*) FROM site");  // opens the journal
-        sqlite3_file_control(database.Handle(), "main", SQLITE_FCNTL_JOURNAL_POINTER, &journal);
-    }
-
-    bool Flush() { return journal->pMethods->xSync(journal, SQLITE_SYNC_NORMAL) == SQLITE_OK; }
-
-    Database database;
-    sqlite3_file* journal = nullptr;
-    std::condition_variable changed;
-    bool isRunning = false;
-    std::uint64_t begun = 0;   // flushes
-    std::uint64_t ended = 0;   // the last of them that is over
-    std::uint64_t failed = 0;  // the last of them that has failed
-};
-
 // --- opening
 
 SqliteStore::SqliteStore(std::filesystem::path const& folder, std::function<StoreContent()> const& first,
@@ -183,6 +174,7 @@ SqliteStore::SqliteStore(std::filesystem::path const& folder, std::function<Stor
     : m_folder(folder), m_file(folder / "site.db"), m_options(std::move(options))
 {
     Enter();
+    m_flusher = std::make_unique<Flusher>(m_file, *m_page);
     OpenDatabase(first);
     auto const noteDamage = [this] { m_page->NoteDamage(); };
     m_writer->database.ReportDamageTo(noteDamage);
@@ -207,7 +199,7 @@ SqliteStore::~SqliteStore()
     // The parent's connections: closing them here would work on its database.
     std::ignore = m_writer.release();
     std::ignore = m_reader.release();
-    std::ignore = m_flusher.release();
+    m_flusher->Abandon();
 }
 
 // Takes the right to open, and a share of the site.
@@ -597,43 +589,10 @@ std::optional<CommitOutcome> SqliteStore::FindCommit(std::uint64_t number)
 
 void SqliteStore::Sync() { Flush(0); }
 
-// Up to that change, 0 for everything. One thread flushes for all who have come before it began; who comes
-// later waits for the next one, since nobody knows what the running one still takes along.
 void SqliteStore::Flush(Sequence sequence)
 {
-    auto lock = Lock(m_flushing);
-    if (!m_flusher)
-        m_flusher = std::make_unique<Flusher>(m_file);
-    Flusher& flusher = *m_flusher;
-    std::uint64_t const ours = flusher.begun + 1;
-    while (flusher.ended < ours)
-    {
-        if (sequence != 0 && m_page->Flushed() >= sequence)
-            return;  // another program has
-        if (flusher.isRunning)
-        {
-            flusher.changed.wait(lock);
-            continue;
-        }
-        flusher.isRunning = true;
-        ++flusher.begun;
-        Sequence const committed = Committed();
-        lock.unlock();
-        bool const isDone = flusher.Flush();
-        lock.lock();
-        flusher.isRunning = false;
-        flusher.ended = flusher.begun;
-        if (isDone)
-            m_page->RaiseFlushed(committed);
-        else
-            flusher.failed = flusher.begun;
-        flusher.changed.notify_all();
-    }
-    // A later one that succeeds proves nothing: the system reports only once what it could not write.
-    if (flusher.failed >= ours)
-        throw StoreError(
-            m_file.string() +
-            "-wal: cannot be flushed to the disk; check the disk and its free space, then try again");
+    CheckUsable();
+    m_flusher->Flush(sequence);
 }
 
 // --- what holds
@@ -688,7 +647,7 @@ bool SqliteStore::ChangesSince(Sequence after, std::function<void(CommittedChang
         while (bytes < LargestFeedBytes && run.Step())
         {
             if (run.Number(0) != ++last)
-                database.FailAsDamaged("the journal has no record " + std::to_string(last));
+                FailAsBrokenJournal(database, "the journal has no record " + std::to_string(last));
             try
             {
                 bytes += run.Bytes(6).size();
@@ -697,7 +656,7 @@ bool SqliteStore::ChangesSince(Sequence after, std::function<void(CommittedChang
             }
             catch (StoreError const& error)
             {
-                database.FailAsDamaged(error.what());
+                FailAsBrokenJournal(database, error.what());
             }
             TicketChange& change = changes.back().change;
             if (change.kind == TicketChange::Create)
@@ -938,11 +897,8 @@ void SqliteStore::Leave()
         return m_isOpening || m_lock->LockWithin(LockFile::Opening, LockFile::Hold::Exclusive, LeavingLimit);
     }();
     std::lock_guard const reading(m_reading);
-    std::unique_lock flushing(m_flushing);
     m_hasLeft = true;
-    if (m_flusher)
-        m_flusher->changed.wait(flushing, [this] { return !m_flusher->isRunning; });
-    m_flusher.reset();
+    m_flusher->Close();
     m_reader.reset();
     bool const isLast = mayOpen && m_lock->TryLock(LockFile::Site, LockFile::Hold::Exclusive);
     if (isLast)

@@ -13,9 +13,9 @@
 #include "standin/server/store/StoreContent.h"
 #include "standin/server/store/StoreLimits.h"
 #include "standin/server/store/sqlite/Database.h"
+#include "standin/server/store/sqlite/Flusher.h"
 #include "standin/server/store/sqlite/LockFile.h"
 #include "standin/server/store/sqlite/SharedPage.h"
-#include <condition_variable>
 #include <filesystem>
 #include <functional>
 #include <memory>
@@ -37,8 +37,8 @@ struct SqliteOptions
 {
     Durability durability = Durability::Process;
 
-    // Keeps others who open the site waiting until EndOpening, so that what belongs to the site and not to the
-    // store can be put in order meanwhile.
+    // Keeps others who open the site waiting until EndOpening, so that what belongs to the site and not to
+    // the store can be put in order meanwhile.
     bool keepOpening = false;
 
     // Called for a damaged database, alone with the site, to set the files away that begin with site.db. The
@@ -135,7 +135,6 @@ private:
     struct Reader;  // the connection for everything else
     class Writing;  // a transaction of the writer, in its turn
     class Reading;  // a transaction of the reader
-    struct Flusher;
 
     void Enter();
     void OpenDatabase(std::function<StoreContent()> const& first);
@@ -181,7 +180,6 @@ private:
     std::unique_ptr<Writer> m_writer;
     std::mutex m_reading;
     std::unique_ptr<Reader> m_reader;
-    std::mutex m_flushing;
     std::unique_ptr<Flusher> m_flusher;
 
     std::mutex m_opening;
