@@ -129,12 +129,13 @@ TEST_F(LeftByTheDead, JobFolderWithoutATicket_Goes_AndOthersStay)
     Make("job/79");  // a file
     fs::create_directory(folder / "job/82");
     fs::create_directory_symlink(folder / "temp", folder / "job/80");
-    Make("job/.removed-0123456789abcdef/a");  // a removal that was broken off
+    Make("job/.removed-77-0123456789abcdef/" + OtherMark);  // a removal that was broken off
+    Make("job/.removed-77-0123456789abcdef/a");
     Make("job/.removed-x/a");
     Kill();
     EXPECT_FALSE(Has("job/77"));
     EXPECT_FALSE(Has("job/82"));  // empty: killed before it was marked
-    EXPECT_FALSE(Has("job/.removed-0123456789abcdef"));
+    EXPECT_FALSE(Has("job/.removed-77-0123456789abcdef"));
     for (char const* const name : {"job/1/a", "job/077/a", "job/78x/a", "job/notes/a", "job/16777216/a",
                                    "temp/77/a", "job/79", "job/80", "job/81/no job's", "job/.removed-x/a"})
         EXPECT_TRUE(Has(name)) << name;

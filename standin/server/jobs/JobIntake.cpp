@@ -203,7 +203,7 @@ void JobIntake::Receive(Session const& session, Job& job, SourceFile const& sour
     try
     {
         file.Finish(PartFile::Survives::PowerCut);
-        FlushJobFolder(*job.folders);
+        FlushFolderForJobs(*job.folders);
     }
     catch (TransferError const&)
     {

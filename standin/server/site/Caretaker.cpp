@@ -49,7 +49,7 @@ void Caretaker::Tidy() noexcept
         m_store.Maintain(m_feed.Heard());
         if (m_store.Bury([this](Estate const& estate) { Clear(estate); }) > 0)
         {
-            SweepJobFolders(m_tickets, m_site);
+            SweepJobFolders(m_store, m_tickets, m_site);
             m_mirror.Write();  // it may have died between a change and the copy of it
         }
         m_hasReported = false;

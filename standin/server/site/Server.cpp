@@ -57,16 +57,26 @@ void Server::Stop(std::chrono::milliseconds patience)
     m_feed.Stop();
 }
 
-// A job's folder goes with its ticket.
+// A job's folder goes with its ticket. If a power cut brings back a ticket that tells of a file, that has to
+// be there; so the end of the ticket comes to the disk first, or the folder stays until it is swept.
 std::function<void()> Server::WhenDeleted(TicketAddress ticket, TicketSnapshot const& last)
 {
-    if (ticket.type != JobTicketType)
+    std::string mark = ticket.type == JobTicketType ? TextOf(last, JobMarkKey) : "";
+    if (mark.empty())
         return {};
-    KeyValues const* const values = last.Find(std::string_view(JobMarkKey));
-    TicketElement const* const mark = values ? values->At(0) : nullptr;
-    if (!mark || mark->type != PARAM_STRING)
-        return {};
-    return [this, id = ticket.id, text = mark->text->bytes]
-    { RemoveJobFolder(FolderTable(m_tickets.Folders().values), id, text); };
+    bool const hasFile = last.Find(std::string_view(JobFileKey)) != nullptr;
+    return [this, id = ticket.id, mark = std::move(mark), hasFile]
+    {
+        try
+        {
+            if (hasFile)
+                m_store.Sync();
+            RemoveJobFolder(FolderTable(m_tickets.Folders().values), id, mark);
+        }
+        catch (StoreError const& error)
+        {
+            Report(error.what());
+        }
+    };
 }
 }  // namespace standin

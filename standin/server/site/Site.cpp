@@ -108,13 +108,6 @@ bool Put(Server& server, std::string_view key, TicketValue value)
     return server.Write(SystemTicket, {&write, 1}) && write.ok;
 }
 
-std::string TextOf(TicketSnapshot const& ticket, std::string_view key)
-{
-    KeyValues const* const values = ticket.Find(key);
-    TicketElement const* const element = values && values->Count() == 1 ? values->At(0) : nullptr;
-    return element && element->type == PARAM_STRING ? element->text->bytes : std::string();
-}
-
 // The site may have been moved, or copied from another machine.
 void KeepInstallFolder(Server& server, std::filesystem::path const& folder)
 {
@@ -192,7 +185,8 @@ void Site::PutInOrder(Server& server)
     server.Tidy();
     if (!m_store->IsTidy())
     {
-        SweepJobFolders(server.Tickets(), m_folder);  // the rounds before may have had another install folder
+        SweepJobFolders(*m_store, server.Tickets(),
+                        m_folder);  // the rounds before may have had another install folder
         m_store->NoteTidy();
     }
     server.Mirror().Write();

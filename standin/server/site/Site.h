@@ -31,9 +31,9 @@ public:
     Site(Site const&) = delete;
     Site& operator=(Site const&) = delete;
 
-    // Once the server is there: notes where the site is, switches off a folder of the system ticket that would
-    // hold up its readers for good, makes missing folders, clears up after programs that died, and writes
-    // tickets/SYS_0000.xml. Others who open the site wait until then.
+    // Once the server is there: notes where the site is, switches off a folder of the system ticket that
+    // would hold up its readers for good, makes missing folders, clears up after programs that died, and
+    // writes tickets/SYS_0000.xml. Others who open the site wait until then.
     void PutInOrder(Server& server);
 
     // An orderly end; nothing of the site may be used any more. A failure is reported on stderr.
