@@ -10,7 +10,7 @@ Server::Server(Store& store, TextKeeper& texts, std::filesystem::path const& sit
     : m_store(store), m_feed(store, m_notifications, texts), m_writer(store, m_feed, *this),
       m_tickets(m_feed, m_writer), m_mirror(m_tickets, site),
       m_transfers(store, m_tickets, m_notifications, site), m_jobs(store, m_tickets, m_writer, m_transfers),
-      m_caretaker(store, m_feed, m_tickets, m_writer, m_mirror, site)
+      m_caretaker(store, m_feed, m_tickets, m_writer, m_jobs, m_mirror, site)
 {
 }
 

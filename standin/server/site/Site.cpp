@@ -102,10 +102,14 @@ std::filesystem::path Prepared(std::filesystem::path const& folder)
     return absolute;
 }
 
-bool Put(Server& server, std::string_view key, TicketValue value)
+// What cannot be put in order keeps the site from being opened: in a copy of another site $(JOB) would be
+// that one's.
+void Put(Server& server, std::string_view key, TicketValue value)
 {
     TicketWrite write{key, -1, std::move(value)};
-    return server.Write(SystemTicket, {&write, 1}) && write.ok;
+    if (!server.Write(SystemTicket, {&write, 1}) || !write.ok)
+        throw StoreError("the site cannot be opened: " + std::string(key) +
+                         " cannot be corrected; see the line before, and try again");
 }
 
 // The site may have been moved, or copied from another machine.
@@ -118,8 +122,10 @@ void KeepInstallFolder(Server& server, std::filesystem::path const& folder)
                                                      known = TextOf(ticket, InstallFolderKey);
                                                      return true;
                                                  });
-    if (!isThere)
-        server.Create(SystemTicket);
+    if (!isThere && !server.Create(SystemTicket))
+        throw StoreError(
+            "the site cannot be opened: its system ticket is missing and cannot be made; see the "
+            "line before, and try again");
     if (known != folder.string())
         Put(server, InstallFolderKey, TicketValue::String(folder.string()));
 }
@@ -191,6 +197,7 @@ void Site::PutInOrder(Server& server)
     }
     server.Mirror().Write();
     m_store->EndOpening();
+    server.StartCare();
 }
 
 void Site::Leave() noexcept

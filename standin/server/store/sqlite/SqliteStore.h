@@ -37,8 +37,8 @@ struct SqliteOptions
 {
     Durability durability = Durability::Process;
 
-    // Keeps others who open the site waiting until EndOpening, so that what belongs to the site and not to the
-    // store can be put in order meanwhile.
+    // Keeps others who open the site waiting until EndOpening, so that what belongs to the site and not to
+    // the store can be put in order meanwhile.
     bool keepOpening = false;
 
     // Called for a damaged database, alone with the site, to set the files away that begin with site.db. The
@@ -100,7 +100,7 @@ public:
     long long OpenSession(std::string_view user) override;
     void CloseSession(long long session) override;
     std::vector<SessionInfo> Sessions() override;
-    void AddPartFile(std::string_view path) override;
+    bool AddPartFile(std::string_view path) override;
     void RemovePartFile(std::string_view path) override;
     std::optional<User> FindUser(std::string_view name) override;
     std::vector<User> Users() override;
