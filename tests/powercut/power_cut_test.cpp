@@ -287,6 +287,14 @@ protected:
 
     void ExpectJobs() const
     {
+        auto const whole = WholeJobs();
+        for (int i = 0; i < Acknowledged(); ++i)
+            EXPECT_TRUE(whole.contains("job-" + std::to_string(i))) << "job " << i << " is lost";
+    }
+
+    // The jobs that there are; each of them must have its file.
+    std::set<std::string> WholeJobs() const
+    {
         Found const found = Inspect();
         std::set<std::string> whole;
         for (Found::Job const& job : found.jobs)
@@ -294,14 +302,14 @@ protected:
             if (!job.name.starts_with("job-"))
                 continue;  // the seed has some, without files
             EXPECT_EQ(job.state, 1) << job.name;
-            ASSERT_TRUE(job.file.starts_with("$(JOB)/")) << job.name << " " << job.file;
+            EXPECT_TRUE(job.file.starts_with("$(JOB)/")) << job.name << " " << job.file;
             fs::path const file = after / fs::relative(site, disk) / "job" / job.file.substr(7);
-            ASSERT_TRUE(fs::exists(file)) << job.name << " has lost its file";
-            EXPECT_TRUE(ContentOf(file) == Source(std::stoi(job.name.substr(4)))) << file << " is not whole";
+            EXPECT_TRUE(fs::exists(file)) << job.name << " has lost its file";
+            EXPECT_TRUE(fs::exists(file) && ContentOf(file) == Source(std::stoi(job.name.substr(4))))
+                << file << " is not whole";
             whole.insert(job.name);
         }
-        for (int i = 0; i < Acknowledged(); ++i)
-            EXPECT_TRUE(whole.contains("job-" + std::to_string(i))) << "job " << i << " is lost";
+        return whole;
     }
 
     // --- the history
@@ -443,6 +451,18 @@ TEST_F(PowerCut, JobThatWasAcknowledged_IsThereWithItsWholeFile)
     MakeSources(Jobs);
     Record({{{"jobs", std::to_string(Jobs), folder / "sources"}}});
     ForEach(Cuts(3 * cutsAtEach), [this] { ExpectJobs(); });
+    EXPECT_EQ(AllAcknowledged(), Jobs);
+}
+
+TEST_F(PowerCut, JobThatWasDeleted_ComesBackWithItsFileOrNotAtAll)
+{
+    constexpr int Jobs = 8;
+    SiteClient::MakeSite(site);
+    MakeSources(Jobs);
+    Record({{{"deletions", std::to_string(Jobs), folder / "sources"}}});
+    std::size_t back = 0;
+    ForEach(Cuts(3 * cutsAtEach), [&] { back += WholeJobs().size(); });
+    EXPECT_GT(back, 0u) << "no cut has found a job";
     EXPECT_EQ(AllAcknowledged(), Jobs);
 }
 

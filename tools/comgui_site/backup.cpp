@@ -58,23 +58,12 @@ private:
     mode_t const m_before;
 };
 
-// With a name by which it may be replaced: absolute, and of the file behind a link.
-path TargetOf(path const& file)
-{
-    std::error_code error;
-    path const there = std::filesystem::canonical(file, error);
-    return error ? std::filesystem::absolute(file).lexically_normal() : there;
-}
-
 void CheckTarget(path const& site, path const& file, bool mayReplace)
 {
     if (!file.has_filename())
         throw Trouble(file.string() + ": is no name of a file; name one");
     auto const status = std::filesystem::symlink_status(file);
-    std::error_code error;
-    bool const isInSite = std::filesystem::equivalent(file.parent_path(), site, error);
-    if (isInSite && (file.filename().string().starts_with("site.") || file.filename() == "seed.xml"))
-        throw Trouble(file.string() + ": is a file of the site itself; choose another name");
+    CheckIsNotOfSite(file, site);
     if (!exists(status))
         return;
     if (!is_regular_file(status))
