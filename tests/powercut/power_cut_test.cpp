@@ -590,7 +590,26 @@ TEST_F(PowerCut, CopyOfTheSystemTicket_IsTheOldOneOrTheNewOne)
     EXPECT_GT(now->ContentsOf("site/tickets/SYS_0000.xml").size(), 1u);
 }
 
-// Carried files are not acknowledged for good; but what has their name is one of them, and not a half.
+TEST_F(PowerCut, FullDurability_KeepsCarriedFiles)
+{
+    constexpr int Carried = 6;
+    SiteClient::MakeSite(site);
+    fs::create_directory(site / "temp");
+    MakeSources(Carried);
+    {
+        Variable const full("COMGUI_DURABILITY", "full");
+        Record({{{"carry", std::to_string(Carried), folder / "sources", disk / "fetched"}}});
+    }
+    ForEach(CutsAtAcknowledgements(Carried),
+            [this]
+            {
+                for (char const* const name : {"site/temp/file", "fetched"})
+                    EXPECT_EQ(ExpectWholeFile(name), Source(Acknowledged() - 1)) << name;
+            });
+    EXPECT_EQ(AllAcknowledged(), Carried);
+}
+
+// Without that they are not acknowledged for good; but what has their name is one of them, and not a half.
 TEST_F(PowerCut, CarriedFile_IsTheOldOneOrTheNewOne)
 {
     constexpr int Carried = 6;

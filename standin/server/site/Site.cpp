@@ -183,6 +183,8 @@ Site::Site(std::filesystem::path const& folder, std::filesystem::path const& see
 
 void Site::PutInOrder(Server& server)
 {
+    if (DurabilityFromEnvironment() == Durability::Full)
+        server.Transfers().Set(PartFile::Survives::PowerCut);
     for (char const* const file : {SeedFile, SystemTicketFile})
         RemoveLeftovers(m_folder / file);
     KeepInstallFolder(server, m_folder);
