@@ -89,7 +89,7 @@ public:
     long long OpenSession(std::string_view) override { return 1; }
     void CloseSession(long long) override {}
     std::vector<standin::SessionInfo> Sessions() override { return {}; }
-    void AddPartFile(std::string_view) override {}
+    bool AddPartFile(std::string_view) override { return true; }
     void RemovePartFile(std::string_view) override {}
     std::optional<standin::User> FindUser(std::string_view name) override
     {

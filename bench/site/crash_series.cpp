@@ -11,6 +11,7 @@
 #include <memory>
 #include <poll.h>
 #include <random>
+#include <set>
 #include <sstream>
 
 namespace
@@ -20,7 +21,7 @@ using Clock = Program::Clock;
 enum Status
 {
     Good = 0,
-    Negative = 1,  // something was lost, torn, misheard or refused
+    Negative = 1,  // something was lost, torn, misheard or refused, or a writer has paused for too long
     Failed = 2,
 };
 
@@ -37,7 +38,8 @@ struct Options
 {
     int kills = 1000;
     int writers = 4;
-    double interval = 60;  // ms between two kills, on average
+    double interval = 60;       // ms between two kills, on average
+    double longestPause = 100;  // ms of a living writer; 0: not judged
     unsigned seed = std::random_device()();
     std::string site;
 };
@@ -82,7 +84,10 @@ public:
         else if (kind == "create" && words >> number)
             m_tickets.push_back(static_cast<int>(number));
         else if (kind == "delete" && words >> number)
+        {
             std::erase(m_tickets, static_cast<int>(number));
+            m_deleted.insert(static_cast<int>(number));
+        }
         else
             return m_wrongs.Take(m_number, kind, line);
         ++m_changes;
@@ -114,19 +119,27 @@ private:
         acknowledged = number;
     }
 
-    // One ticket more may be there, or where a deletion was due the oldest may be gone.
+    // One ticket more may be there, or where a deletion was due the oldest may be gone. What is gone never
+    // comes back: only the oldest ticket of a lane is deleted, so no id is given anew.
     void CompareTickets(std::vector<int> const& found)
     {
         std::vector<int> expected = m_tickets;
         auto const isThere = [&](int id) { return std::find(found.begin(), found.end(), id) != found.end(); };
         if (expected.size() == MostTickets && !isThere(expected.front()))
+        {
+            m_deleted.insert(expected.front());
             expected.erase(expected.begin());
+        }
         for (int const id : expected)
             if (!isThere(id))
                 m_wrongs.Take(m_number, "lost", "ticket " + std::to_string(id) + " was created, but is gone");
         std::size_t const most = m_tickets.size() < MostTickets ? expected.size() + 1 : expected.size();
         if (found.size() > most)
-            m_wrongs.Take(m_number, "lost", "a ticket was deleted, but is there");
+            m_wrongs.Take(m_number, "lost", "more tickets are there than were created");
+        for (int const id : found)
+            if (m_deleted.contains(id))
+                m_wrongs.Take(m_number, "lost",
+                              "ticket " + std::to_string(id) + " was deleted, but is there");
         m_tickets = found;
     }
 
@@ -137,6 +150,7 @@ private:
     std::int64_t m_appended = 0;
     int m_block = 1;
     std::vector<int> m_tickets;
+    std::set<int> m_deleted;
     std::int64_t m_changes = 0;
     std::int64_t m_finds = 0;
 };
@@ -283,7 +297,11 @@ private:
                   << " torn\n";
         if (Sum(&Lane::Changes) == 0)
             throw Trouble("no writer came to write anything: --interval is too short for this machine");
-        return m_wrongs.IsGood() ? Good : Negative;
+        double const pause = std::chrono::duration<double, std::milli>(m_longestPause).count();
+        bool const isTooLong = m_options.longestPause > 0 && pause > m_options.longestPause;
+        if (isTooLong)
+            std::cerr << "a living writer has paused for more than " << m_options.longestPause << " ms\n";
+        return m_wrongs.IsGood() && !isTooLong ? Good : Negative;
     }
 
     Options const& m_options;
@@ -316,11 +334,17 @@ int Run(int argc, char** argv)
         "Kills programs that write to one site, one after the other, and checks that every acknowledged "
         "change is there.",
         "crash_series"};
-    app.footer("Exit status: 0 all is well; 1 something was lost, torn, misheard or refused; 2 trouble.");
+    app.footer("Exit status: 0 all is well; 1 something was lost, torn, misheard or refused, or a writer has "
+               "paused for too long; 2 trouble.");
     app.add_option("KILLS", options.kills, "How many to kill (1000)")->check(CLI::Range(1, 10000000));
     app.add_option("--writers", options.writers, "How many write at a time (4)")->check(CLI::Range(1, 32));
     app.add_option("--interval", options.interval, "Time from one kill to the next, in ms on average (60)")
         ->check(CLI::Range(1.0, 60000.0));
+    app.add_option(
+           "--longest-pause", options.longestPause,
+           "Between two changes of a writer that lives, in ms (100); 0: not judged. It counts what the "
+           "machine itself holds up, so give a busy one, or a slow disk, a second or more")
+        ->check(CLI::Range(0.0, 600000.0));
     app.add_option("--seed", options.seed, "For the instants of the kills, and what is written");
     app.add_option("--site", options.site,
                    "A new folder for the site, which stays; otherwise a temporary one");

@@ -15,6 +15,8 @@ namespace
 {
 constexpr char Help[] = R"(Works on the site that COMGUI_SITE names:
   jobs COUNT FOLDER    sends the files FOLDER/job-0, FOLDER/job-1 ...
+  deletions COUNT FOLDER
+                       the same, and deletes each job when it is in
   history FIRST COUNT  makes so many steps of the history, from that one on
   crowd NAME COUNT     two threads count up to COUNT, under the keys NAME0 and NAME1 of ticket 60/1
   carry COUNT FOLDER TARGET
@@ -90,6 +92,19 @@ void Jobs(int count, std::string const& folder)
     {
         std::string const name = "job-" + std::to_string(i);
         Mark(std::to_string(i), [&] { return SendJob(folder + "/" + name, name); });
+    }
+}
+
+// Sends each and deletes it again.
+void Deletions(SiteClient const& client, int count, std::string const& folder)
+{
+    for (int i = 0; i < count; ++i)
+    {
+        std::string const name = "job-" + std::to_string(i);
+        Mark(std::to_string(i),
+             [&] {
+                 return SendJob(folder + "/" + name, name) && client.Delete({3, client.Ids(3).back()});
+             });
     }
 }
 
@@ -198,6 +213,8 @@ void Run(std::vector<std::string> const& words)
     Mark("ready");
     if (command == "jobs")
         Jobs(std::stoi(words.at(1)), words.at(2));
+    else if (command == "deletions")
+        Deletions(client, std::stoi(words.at(1)), words.at(2));
     else if (command == "history")
         History(client, std::stoi(words.at(1)), std::stoi(words.at(2)));
     else if (command == "carry")

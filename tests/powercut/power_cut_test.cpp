@@ -14,6 +14,8 @@
 #include <algorithm>
 #include <gtest/gtest.h>
 #include <sstream>
+#include <sys/wait.h>
+#include <unistd.h>
 
 namespace fs = std::filesystem;
 using namespace std::chrono_literals;
@@ -79,7 +81,15 @@ protected:
 
     // Takes what is on the disk as being there for good, and records what the clients do: those of a stage
     // all at once, one stage after the other.
-    void Record(std::vector<std::vector<Command>> const& stages)
+    void Record(std::vector<std::vector<Command>> stages)
+    {
+        for (auto& clients : stages)
+            for (Command& command : clients)
+                command.insert(command.begin(), COMGUI_POWER_CUT_CLIENT);
+        RecordPrograms(stages);
+    }
+
+    void RecordPrograms(std::vector<std::vector<Command>> const& stages)
     {
         before.emplace(disk);
         {
@@ -90,11 +100,8 @@ protected:
             for (auto const& clients : stages)
             {
                 std::vector<std::unique_ptr<Program>> programs;
-                for (Command command : clients)
-                {
-                    command.insert(command.begin(), COMGUI_POWER_CUT_CLIENT);
+                for (Command const& command : clients)
                     programs.push_back(std::make_unique<Program>(command));
-                }
                 for (auto const& program : programs)
                     ASSERT_EQ(program->Wait(), 0);
             }
@@ -127,6 +134,15 @@ protected:
             files[name] = entry.is_directory() || isMapped ? "" : ContentOf(entry.path());
         }
         return files;
+    }
+
+    // At every moment. With everything surviving, a cut is the end of the process alone.
+    std::vector<Cut> CutsBehindEachRecord(Survivors survivors) const
+    {
+        std::vector<Cut> cuts;
+        for (std::size_t record = 0; record <= log.size(); ++record)
+            cuts.push_back({record, survivors, record});
+        return cuts;
     }
 
     // Behind acknowledgements, where the strictest disk loses most.
@@ -271,6 +287,14 @@ protected:
 
     void ExpectJobs() const
     {
+        auto const whole = WholeJobs();
+        for (int i = 0; i < Acknowledged(); ++i)
+            EXPECT_TRUE(whole.contains("job-" + std::to_string(i))) << "job " << i << " is lost";
+    }
+
+    // The jobs that there are; each of them must have its file.
+    std::set<std::string> WholeJobs() const
+    {
         Found const found = Inspect();
         std::set<std::string> whole;
         for (Found::Job const& job : found.jobs)
@@ -278,14 +302,14 @@ protected:
             if (!job.name.starts_with("job-"))
                 continue;  // the seed has some, without files
             EXPECT_EQ(job.state, 1) << job.name;
-            ASSERT_TRUE(job.file.starts_with("$(JOB)/")) << job.name << " " << job.file;
+            EXPECT_TRUE(job.file.starts_with("$(JOB)/")) << job.name << " " << job.file;
             fs::path const file = after / fs::relative(site, disk) / "job" / job.file.substr(7);
-            ASSERT_TRUE(fs::exists(file)) << job.name << " has lost its file";
-            EXPECT_TRUE(ContentOf(file) == Source(std::stoi(job.name.substr(4)))) << file << " is not whole";
+            EXPECT_TRUE(fs::exists(file)) << job.name << " has lost its file";
+            EXPECT_TRUE(fs::exists(file) && ContentOf(file) == Source(std::stoi(job.name.substr(4))))
+                << file << " is not whole";
             whole.insert(job.name);
         }
-        for (int i = 0; i < Acknowledged(); ++i)
-            EXPECT_TRUE(whole.contains("job-" + std::to_string(i))) << "job " << i << " is lost";
+        return whole;
     }
 
     // --- the history
@@ -299,6 +323,85 @@ protected:
             if (contents[static_cast<std::size_t>(step)] == tickets)
                 return step;
         return std::nullopt;
+    }
+
+    // --- the exchange of a database
+
+    static void Commit(standin::SqliteStore& store, standin::TicketAddress address, std::string const& file)
+    {
+        standin::TicketChange change;
+        change.kind = standin::TicketChange::Create;
+        change.address = address;
+        change.parameters.push_back({"Job/File", -1, standin::TicketValue::String(file), false});
+        ASSERT_EQ(store.Commit(change, ++commits).kind, standin::CommitOutcome::Committed);
+    }
+
+    // A site whose newest changes are in its journal, as a program leaves it that is killed; with a job that
+    // the backup has and one that it does not know.
+    void MakeKilledSiteWithBackup(fs::path const& backup) const
+    {
+        for (char const* const job : {"1", "2"})
+        {
+            fs::create_directories(site / "job" / job);
+            WriteFile(site / "job" / job / "a", "content");
+        }
+        pid_t const child = fork();
+        if (child == 0)
+        {
+            auto const content = []
+            {
+                standin::StoreContent first;
+                first.tickets.emplace_back().kind = standin::TicketChange::Create;
+                return first;
+            };
+            standin::SqliteStore store(site, content);
+            Commit(store, {3, 1}, "$(JOB)/1/a");
+            store.BackupTo(backup, {});
+            Commit(store, {3, 2}, "$(JOB)/2/a");
+            _exit(HasFailure() ? 1 : 0);
+        }
+        int status = -1;
+        ASSERT_EQ(waitpid(child, &status, 0), child);
+        ASSERT_EQ(status, 0);
+    }
+
+    static std::vector<standin::TicketAddress> TicketsOf(fs::path const& place)
+    {
+        standin::SqliteStore store(
+            place, []() -> standin::StoreContent { throw std::runtime_error("there is no database"); });
+        std::vector<standin::TicketAddress> tickets;
+        store.Tickets([&](standin::TicketAddress address, auto const&) { tickets.push_back(address); });
+        return tickets;
+    }
+
+    // The old site as it was, or the new one and the old one's database beside it. Nobody's files are gone.
+    void ExpectOldOrNew(int& seen)
+    {
+        fs::path const place = after / fs::relative(site, disk);
+        std::map<std::string, fs::path> jobs;  // where the folders are
+        std::optional<fs::path> aside;
+        for (auto const& entry : fs::recursive_directory_iterator(place))
+        {
+            if (entry.is_regular_file() && entry.path().filename() == "a")
+                jobs[entry.path().parent_path().filename()] = entry.path().parent_path().parent_path();
+            if (entry.path().filename().string().starts_with("site.db.replaced-"))
+                aside = entry.path();
+        }
+        ASSERT_EQ(jobs.size(), 2u);
+        EXPECT_EQ(jobs["1"], place / "job");
+        std::vector<standin::TicketAddress> const oldOnes{{0, 0}, {3, 1}, {3, 2}};
+        auto const tickets = TicketsOf(place);
+        if (tickets == oldOnes)
+            return;
+        ++seen;
+        EXPECT_EQ(tickets, (std::vector<standin::TicketAddress>{{0, 0}, {3, 1}}));
+        EXPECT_NE(jobs["2"], place / "job") << "the server would sweep it";
+        ASSERT_TRUE(aside);
+        fs::path const other = folder / "other";
+        fs::remove_all(other);
+        fs::create_directory(other);
+        fs::copy_file(*aside, other / "site.db");
+        EXPECT_EQ(TicketsOf(other), oldOnes);
     }
 
     // --- files
@@ -323,6 +426,7 @@ protected:
         return key == xml.npos ? 0 : std::stoi(xml.substr(xml.find('>', key) + 1));
     }
 
+    static inline std::uint64_t commits = 0;
     std::size_t const seed = NumberFrom("COMGUI_POWER_CUT_SEED", 1);
     std::size_t const cutsAtEach = NumberFrom("COMGUI_POWER_CUTS", 30);
     ForgetfulDisk::Random random{seed};
@@ -347,6 +451,18 @@ TEST_F(PowerCut, JobThatWasAcknowledged_IsThereWithItsWholeFile)
     MakeSources(Jobs);
     Record({{{"jobs", std::to_string(Jobs), folder / "sources"}}});
     ForEach(Cuts(3 * cutsAtEach), [this] { ExpectJobs(); });
+    EXPECT_EQ(AllAcknowledged(), Jobs);
+}
+
+TEST_F(PowerCut, JobThatWasDeleted_ComesBackWithItsFileOrNotAtAll)
+{
+    constexpr int Jobs = 8;
+    SiteClient::MakeSite(site);
+    MakeSources(Jobs);
+    Record({{{"deletions", std::to_string(Jobs), folder / "sources"}}});
+    std::size_t back = 0;
+    ForEach(Cuts(3 * cutsAtEach), [&] { back += WholeJobs().size(); });
+    EXPECT_GT(back, 0u) << "no cut has found a job";
     EXPECT_EQ(AllAcknowledged(), Jobs);
 }
 
@@ -428,6 +544,21 @@ TEST_F(PowerCut, PlainDurability_KeepsAPrefixOfTheHistory)
     EXPECT_GT(lost, 0) << "no cut has taken anything back";
 }
 
+// --- a database that is exchanged
+
+TEST_F(PowerCut, Restore_LeavesTheOldSiteOrTheNewOneAtEveryInstant)
+{
+    fs::create_directory(site);
+    fs::path const backup = folder / "backup.db";
+    MakeKilledSiteWithBackup(backup);
+    RecordPrograms({{{COMGUI_SITE_PROGRAM, site, "restore", backup}}});
+    int seen = 0;
+    ForEach(CutsBehindEachRecord(Survivors::Everything), [&] { ExpectOldOrNew(seen); });
+    for (Survivors const survivors : {Survivors::Nothing, Survivors::AnySubset, Survivors::NamesAlone})
+        ForEach(CutsBehindEachRecord(survivors), [&] { ExpectOldOrNew(seen); });
+    EXPECT_GT(seen, 0);
+}
+
 // --- files that are replaced as a whole
 
 TEST_F(PowerCut, TicketFile_IsTheOldOneOrTheNewOneAndLastsOnceItIsSaved)
@@ -459,7 +590,26 @@ TEST_F(PowerCut, CopyOfTheSystemTicket_IsTheOldOneOrTheNewOne)
     EXPECT_GT(now->ContentsOf("site/tickets/SYS_0000.xml").size(), 1u);
 }
 
-// Carried files are not acknowledged for good; but what has their name is one of them, and not a half.
+TEST_F(PowerCut, FullDurability_KeepsCarriedFiles)
+{
+    constexpr int Carried = 6;
+    SiteClient::MakeSite(site);
+    fs::create_directory(site / "temp");
+    MakeSources(Carried);
+    {
+        Variable const full("COMGUI_DURABILITY", "full");
+        Record({{{"carry", std::to_string(Carried), folder / "sources", disk / "fetched"}}});
+    }
+    ForEach(CutsAtAcknowledgements(Carried),
+            [this]
+            {
+                for (char const* const name : {"site/temp/file", "fetched"})
+                    EXPECT_EQ(ExpectWholeFile(name), Source(Acknowledged() - 1)) << name;
+            });
+    EXPECT_EQ(AllAcknowledged(), Carried);
+}
+
+// Without that they are not acknowledged for good; but what has their name is one of them, and not a half.
 TEST_F(PowerCut, CarriedFile_IsTheOldOneOrTheNewOne)
 {
     constexpr int Carried = 6;

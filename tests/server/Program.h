@@ -19,6 +19,7 @@ public:
                   {"admin", "", standin::AdministratorRole, 1})
     {
         texts.Open(session.Number());
+        server.StartCare();
     }
 
     standin::TicketService& Tickets() { return server.Tickets(); }

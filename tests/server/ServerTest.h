@@ -35,7 +35,10 @@ protected:
         if (!store)
             store = std::make_unique<standin::MemoryStore>(site);
         if (!server)
+        {
             server = std::make_unique<standin::Server>(*store, texts, siteFolder);
+            server->StartCare();
+        }
         return *server;
     }
     standin::TicketService& Tickets() { return Server().Tickets(); }

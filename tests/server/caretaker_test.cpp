@@ -6,6 +6,7 @@
 #include "tests/server/Program.h"
 #include "tests/server/StoredValues.h"
 #include "tests/support/Files.h"
+#include <atomic>
 #include <gmock/gmock.h>
 #include <thread>
 
@@ -129,12 +130,13 @@ TEST_F(LeftByTheDead, JobFolderWithoutATicket_Goes_AndOthersStay)
     Make("job/79");  // a file
     fs::create_directory(folder / "job/82");
     fs::create_directory_symlink(folder / "temp", folder / "job/80");
-    Make("job/.removed-0123456789abcdef/a");  // a removal that was broken off
+    Make("job/.removed-77-0123456789abcdef/" + OtherMark);  // a removal that was broken off
+    Make("job/.removed-77-0123456789abcdef/a");
     Make("job/.removed-x/a");
     Kill();
     EXPECT_FALSE(Has("job/77"));
     EXPECT_FALSE(Has("job/82"));  // empty: killed before it was marked
-    EXPECT_FALSE(Has("job/.removed-0123456789abcdef"));
+    EXPECT_FALSE(Has("job/.removed-77-0123456789abcdef"));
     for (char const* const name : {"job/1/a", "job/077/a", "job/78x/a", "job/notes/a", "job/16777216/a",
                                    "temp/77/a", "job/79", "job/80", "job/81/no job's", "job/.removed-x/a"})
         EXPECT_TRUE(Has(name)) << name;
@@ -196,6 +198,83 @@ TEST_F(LeftByTheDead, TransferInTheMiddle_GoesWithItsProgram)
     Make("temp/" + part);
     Kill();
     EXPECT_FALSE(Has("temp/" + part));
+}
+
+// The disk may be full by what is to be cleared up.
+TEST_F(LeftByTheDead, GoesInTheSameRoundInWhichMaintenanceFails)
+{
+    int const id = Prepare();
+    Make("job/" + std::to_string(id) + "/" + MarkOf(id));
+    Make("temp/.transfer.7-1.tmp");
+    dying->store.AddPartFile((folder / "temp/.transfer.7-1.tmp").string());
+    living->server.Stop(std::chrono::minutes(1));
+    testing::internal::CaptureStderr();
+    dying->store.Die();
+    dying.reset();
+    site->FailOperation(1);
+    living->server.Tidy();
+    EXPECT_TRUE(site->HasFailed());
+    testing::internal::GetCapturedStderr();
+    EXPECT_THAT(Jobs(), ElementsAre(1));
+    EXPECT_THAT(NamesIn(folder / "job"), IsEmpty());
+    EXPECT_THAT(NamesIn(folder / "temp"), IsEmpty());
+}
+
+// The end of the process does not wait for long.
+TEST_F(LeftByTheDead, TransferThatGoesOnWhileItsProgramLeavesInOrder_GoesWithIt)
+{
+    EXPECT_TRUE(living->Set(SystemTicket, "System/Folders/Temp", (folder / "temp").string()));
+    Make("a");
+    std::atomic<bool> isHeld{false};
+    std::atomic<bool> goOn{false};
+    dying->server.Transfers().Set({4, [&]
+                                   {
+                                       isHeld = true;
+                                       while (!goOn)
+                                           std::this_thread::yield();
+                                   }});
+    std::thread transfer(
+        [&]
+        {
+            dying->server.Transfers().Carry(dying->session,
+                                            {TransferService::Request::ToServer, folder / "a", "$(TEMP)/a"});
+        });
+    while (!isHeld)
+        std::this_thread::yield();
+    testing::internal::CaptureStderr();
+    living->server.Stop(std::chrono::minutes(1));
+    dying->server.Stop(std::chrono::milliseconds(1));
+    dying->store.Leave();
+    EXPECT_EQ(NamesIn(folder / "temp").size(), 1u);
+    living->server.Tidy();
+    EXPECT_THAT(NamesIn(folder / "temp"), IsEmpty());
+    EXPECT_EQ(living->store.Programs().size(), 1u);
+    goOn = true;
+    transfer.join();
+    testing::internal::GetCapturedStderr();
+}
+
+// Its process had the number that another one has now.
+TEST_F(LeftByTheDead, BeginningWhoseNameALivingProgramWouldTake_StaysNoted)
+{
+    EXPECT_TRUE(living->Set(SystemTicket, "System/Folders/Temp", (folder / "temp").string()));
+    Make("a");
+    std::vector<std::string> during;
+    auto& transfers = living->server.Transfers();
+    transfers.Set({4000, [&] { during.push_back(NamesIn(folder / "temp").at(0)); }});
+    TransferService::Request const request{TransferService::Request::ToServer, folder / "a", "$(TEMP)/a"};
+    EXPECT_EQ(transfers.Carry(living->session, request), Transferred);
+    fs::remove(folder / "temp/a");
+    ASSERT_FALSE(during.empty());
+    std::size_t const dash = during[0].find('-');
+    std::string const next =
+        during[0].substr(0, dash + 1) + std::to_string(std::stoi(during[0].substr(dash + 1)) + 1) + ".tmp";
+    dying->store.AddPartFile((folder / "temp" / next).string());
+    EXPECT_EQ(transfers.Carry(living->session, request), Transferred);
+    EXPECT_NE(during.back(), next);
+    Make("temp/" + next);
+    Kill();
+    EXPECT_THAT(NamesIn(folder / "temp"), ElementsAre("a"));
 }
 
 TEST_F(LeftByTheDead, CopyOfTheSystemTicket_IsWrittenAnew)

@@ -452,6 +452,21 @@ TEST_F(FailedJob, TicketDeletedMeanwhile_IsToldAndTheNextJobOfThatIdIsSafe)
     EXPECT_EQ(Int({3, 2}, "Job/State"), 1);
 }
 
+// Such as a full disk, which the job's own file may be what fills.
+TEST_F(FailedJob, StoreThatFailsAtTheEnd_LeavesNoFile_AndTheTicketGoesWhenItWorksAgain)
+{
+    Prepare({"file.pdf"});
+    Server().Transfers().Set({1, [this] { site->FailAll(true); }});
+    As("operator");
+    As("admin");
+    testing::internal::CaptureStderr();
+    EXPECT_EQ(Intake().Send(As("operator"), file, "file.pdf"), TargetUnwritable);
+    EXPECT_THAT(NamesIn(folder / "job"), IsEmpty());
+    site->FailAll(false);
+    EXPECT_TRUE(TidiesUntil([this] { return Ids() == std::vector{1}; }));
+    testing::internal::GetCapturedStderr();
+}
+
 TEST_F(FailedJob, StoreThatFailsAtTheEnd_LeavesTheTicketUnsentAndForOthersToClear)
 {
     Prepare({"file.pdf"});
@@ -460,11 +475,42 @@ TEST_F(FailedJob, StoreThatFailsAtTheEnd_LeavesTheTicketUnsentAndForOthersToClea
     As("admin");
     testing::internal::CaptureStderr();
     EXPECT_EQ(Intake().Send(As("operator"), file, "file.pdf"), TargetUnwritable);
+    Restart();  // it dies before it can
     site->FailAll(false);
-    EXPECT_EQ(Int({3, 2}, "Job/State"), 0);
-    EXPECT_EQ(Int({3, 2}, "Job/Prepared"), 1);
-    Restart();
     EXPECT_TRUE(TidiesUntil([this] { return Ids() == std::vector{1}; }));
-    EXPECT_TRUE(TidiesUntil([this] { return NamesIn(folder / "job").empty(); }));
+    EXPECT_THAT(NamesIn(folder / "job"), IsEmpty());
     testing::internal::GetCapturedStderr();
+}
+
+TEST_F(PreparedJob, OfASessionThatEndsWhileTheStoreFails_GoesWhenItWorksAgain)
+{
+    Prepare({"file.pdf"});
+    site->FailAll(true);
+    testing::internal::CaptureStderr();
+    Server().Logout(As("operator"));
+    site->FailAll(false);
+    EXPECT_TRUE(TidiesUntil([this] { return Ids() == std::vector{1}; }));
+    testing::internal::GetCapturedStderr();
+}
+
+TEST_F(SentJob, WhenTheIdsHaveComeToTheirEnd_PassesOverFoldersThatAreNoJobsToo)
+{
+    site->AddTicket({3, LargestId});
+    for (int const id : {0, 2})
+    {
+        fs::create_directory(InJob(id));
+        WriteFile(InJob(id, "another program's"), "content");
+    }
+    EXPECT_EQ(Send(file, "file.pdf"), Transferred);
+    EXPECT_THAT(Ids(), ElementsAre(1, 3, LargestId));
+}
+
+TEST_F(SentJob, WhenAnotherProgramTakesItsId_PassesOverFoldersThatAreNoJobsToo)
+{
+    fs::create_directory(InJob(3));
+    WriteFile(InJob(3, "another program's"), "content");
+    As("guest");
+    site->Interject([this] { EXPECT_TRUE(Tickets().Create(As("guest"), {3, 2})); });
+    EXPECT_EQ(Send(file, "file.pdf"), Transferred);
+    EXPECT_THAT(Ids(), ElementsAre(1, 2, 4));
 }

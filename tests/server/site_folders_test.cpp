@@ -2,12 +2,15 @@
 // that is gone.
 #include "standin/server/site/SiteFolders.h"
 
+#include "standin/server/jobs/JobFolder.h"
 #include "tests/server/MemoryFolder.h"
 #include "tests/server/OpenedSite.h"
+#include "tests/support/ChildProcess.h"
 #include "tests/support/Files.h"
 #include <algorithm>
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
+#include <thread>
 
 using namespace standin;
 using testing::AllOf;
@@ -100,6 +103,46 @@ TEST_F(FoldersOfASite, Seed_KeepsTheOriginal)
     EXPECT_EQ(Opened().values[Temp], "");
     EXPECT_THAT(said, HasSubstr("System/Folders/Temp"));
     EXPECT_EQ(ContentOf(Folder() / "seed.xml"), seed);
+}
+
+// The copy knows of a job of a dead program, and of the place where the original has its folder.
+TEST_F(FoldersOfASite, OfTheOriginal_StayWhenItsCopyIsOpened)
+{
+    ChildProcess child(
+        [this](ChildProcess::Report const& report)
+        {
+            OpenedSite site(Folder(), COMGUI_TEST_SEED);
+            auto const session = site.Server().Login("operator", "operator");
+            int id = -1;
+            site.Server().Jobs().Prepare(*session, {"job.pdf"}, id);
+            std::filesystem::create_directories(Folder() / "job" / std::to_string(id));
+            WriteFile(Folder() / "job" / std::to_string(id) /
+                          (".job-" + site.Text({standin::JobTicketType, id}, JobMarkKey)),
+                      "");
+            report(id);
+            for (;;)
+                pause();
+        });
+    auto const id = child.Next();
+    child.Kill();
+    ASSERT_TRUE(id);
+    std::string const job = std::to_string(*id);
+    ASSERT_TRUE(std::filesystem::exists(Folder() / "job" / job));
+    std::filesystem::path const copy = folder / "copy";
+    std::filesystem::copy(Folder(), copy, std::filesystem::copy_options::recursive);
+    testing::internal::CaptureStderr();
+    Site site(copy, COMGUI_TEST_SEED);
+    KeptTexts texts;
+    {
+        Server server(site.store(), texts, copy);
+        std::this_thread::sleep_for(
+            std::chrono::milliseconds(300));  // for a caretaker that must not work yet
+        site.PutInOrder(server);
+    }
+    site.Leave();
+    testing::internal::GetCapturedStderr();
+    EXPECT_FALSE(std::filesystem::exists(copy / "job" / job)) << "the dead program's";
+    EXPECT_TRUE(std::filesystem::exists(Folder() / "job" / job));
 }
 
 TEST_F(FoldersOfASite, JobsOfADatabaseThatIsMadeAnew_AreSetAside)

@@ -1265,10 +1265,29 @@ TEST_P(StoreContract, Bury_ByAllAtOnce_HappensOnceForEachDead)
     EXPECT_EQ(ProgramsOf(*store).size(), 2u);
 }
 
-TEST_P(StoreContract, Leave_ForgetsTheProgramWithItsSessionsAndPartFiles)
+TEST_P(StoreContract, Bury_ThatThrowsForOne_BuriesTheOthers)
+{
+    auto const third = site->Open();
+    store->AddPartFile("/tmp/a");
+    other->AddPartFile("/tmp/b");
+    ProgramId const first = store->Self();
+    store.reset();
+    other.reset();
+    EXPECT_THROW(third->Bury(
+                     [&](Estate const& estate)
+                     {
+                         if (estate.program == first)
+                             throw 1;
+                     }),
+                 int);
+    EXPECT_THAT(ProgramsOf(*third), ElementsAre(first, third->Self()));
+}
+
+TEST_P(StoreContract, Leave_ForgetsTheProgramWithItsSessions)
 {
     store->OpenSession("admin");
     store->AddPartFile("/tmp/a");
+    store->RemovePartFile("/tmp/a");
     other->OpenSession("operator");
     store->Leave();
     EXPECT_EQ(other->Sessions().size(), 1u);
@@ -1278,10 +1297,22 @@ TEST_P(StoreContract, Leave_ForgetsTheProgramWithItsSessionsAndPartFiles)
     EXPECT_EQ(other->Bury([](Estate const&) { ADD_FAILURE(); }), 0);
 }
 
+// The process may end before what writes to it has.
+TEST_P(StoreContract, Leave_WithPartFiles_LeavesThemToBeBuried)
+{
+    store->AddPartFile("/tmp/a");
+    ProgramId const gone = store->Self();
+    store->Leave();
+    EXPECT_FALSE(IsAlive(*other, gone));
+    Estate estate;
+    EXPECT_EQ(other->Bury([&estate](Estate const& left) { estate = left; }), 1);
+    EXPECT_THAT(estate.partFiles, ElementsAre("/tmp/a"));
+    EXPECT_THAT(ProgramsOf(*other), ElementsAre(other->Self()));
+}
+
 TEST_P(StoreContract, Leave_WithTicketsOfItsOwn_LeavesThemToBeBuried)
 {
     writer->Do(Creation(Job).Own(CHANGE::Owner::ThisProgram));
-    store->AddPartFile("/tmp/a");
     ProgramId const gone = store->Self();
     store->Leave();
     EXPECT_FALSE(IsAlive(*other, gone));
@@ -1363,17 +1394,20 @@ TEST_P(StoreContract, SessionIds_AreNeverGivenTwice)
     EXPECT_GT(store->OpenSession("admin"), first);
 }
 
-TEST_P(StoreContract, PartFile_OfAPathThatIsNotedAlready_IsThenThisPrograms)
+// Two processes may have had the same number, one after the other, and name their files by it.
+TEST_P(StoreContract, PartFile_OfAPathThatAnotherProgramHasNoted_StaysThatPrograms)
 {
-    store->AddPartFile("/tmp/a");
-    other->AddPartFile("/tmp/a");
-    other->AddPartFile("/tmp/a");
+    EXPECT_TRUE(store->AddPartFile("/tmp/a"));
+    EXPECT_TRUE(store->AddPartFile("/tmp/a"));
+    EXPECT_FALSE(other->AddPartFile("/tmp/a"));
+    other->RemovePartFile("/tmp/a");
+    other->RemovePartFile("/tmp/never");
     auto const third = site->Open();
-    store.reset();
-    third->Bury([](Estate const& estate) { EXPECT_THAT(estate.partFiles, IsEmpty()); });
     other.reset();
+    third->Bury([](Estate const& estate) { EXPECT_THAT(estate.partFiles, IsEmpty()); });
+    store.reset();
     third->Bury([](Estate const& estate) { EXPECT_THAT(estate.partFiles, ElementsAre("/tmp/a")); });
-    third->RemovePartFile("/tmp/never");
+    EXPECT_TRUE(third->AddPartFile("/tmp/a"));
 }
 
 // --- users

@@ -42,6 +42,23 @@ std::filesystem::path FolderOfSite(std::string const& given)
     return folder.has_filename() ? folder : folder.parent_path();
 }
 
+std::filesystem::path TargetOf(std::filesystem::path const& file)
+{
+    std::error_code error;
+    std::filesystem::path const there = std::filesystem::canonical(file, error);
+    return error ? std::filesystem::absolute(file).lexically_normal() : there;
+}
+
+void CheckIsNotOfSite(std::filesystem::path const& file, std::filesystem::path const& site)
+{
+    std::filesystem::path const target = TargetOf(file);
+    std::string const name = target.filename().string();
+    std::error_code error;
+    if (std::filesystem::equivalent(target.parent_path(), site, error) &&
+        (name.starts_with("site.") || name == "seed.xml"))
+        throw Trouble(file.string() + ": is a file of the site itself; choose another name");
+}
+
 OpenedSite::OpenedSite(std::filesystem::path folder) : m_folder(MustBeThere(std::move(folder)))
 {
     auto const first = [this]() -> standin::StoreContent { FailAsMissing(m_folder); };

@@ -12,6 +12,12 @@ namespace comgui_site
 // does.
 std::filesystem::path FolderOfSite(std::string const& given);
 
+// With a name by which it may be replaced: absolute, and of the file behind a link.
+std::filesystem::path TargetOf(std::filesystem::path const& file);
+
+// Throws Trouble if a file that is to be written, or what it is a link to, is one of the site's own.
+void CheckIsNotOfSite(std::filesystem::path const& file, std::filesystem::path const& site);
+
 class OpenedSite
 {
 public:

@@ -1,13 +1,11 @@
 #include "tools/comgui_site/backup.h"
 
 #include "standin/server/files/AtomicFile.h"
-#include "standin/server/files/Descriptor.h"
 #include "tools/comgui_site/OpenedSite.h"
 #include "tools/comgui_site/Progress.h"
 #include "tools/comgui_site/Trouble.h"
 #include <cerrno>
 #include <cstring>
-#include <fcntl.h>
 #include <sys/stat.h>
 #include <unistd.h>
 
@@ -32,13 +30,6 @@ public:
 
     path const& Path() const { return m_path; }
 
-    void Flush() const
-    {
-        standin::Descriptor const file(open(m_path.c_str(), O_RDONLY | O_CLOEXEC));
-        if (file.Number() < 0 || fsync(file.Number()) != 0)
-            throw standin::FileError(standin::FileFault(m_path, "cannot be flushed to the disk", errno));
-    }
-
     // A link fails where a file is by now, a renaming would replace it. Some file systems have no links.
     void Name(path const& file, bool mayReplace) const
     {
@@ -47,10 +38,7 @@ public:
             throw Trouble(file.string() + ": is there already; choose another name, or say --force");
         if (!isLinked && rename(m_path.c_str(), file.c_str()) != 0)
             throw standin::FileError(standin::FileFault(file, "cannot be written", errno));
-        path const folder = file.parent_path();
-        standin::Descriptor const opened(open(folder.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
-        if (opened.Number() >= 0)
-            standin::FlushFolder(opened.Number());
+        standin::FlushFolder(file.parent_path());
     }
 
 private:
@@ -70,23 +58,12 @@ private:
     mode_t const m_before;
 };
 
-// With a name by which it may be replaced: absolute, and of the file behind a link.
-path TargetOf(path const& file)
-{
-    std::error_code error;
-    path const there = std::filesystem::canonical(file, error);
-    return error ? std::filesystem::absolute(file).lexically_normal() : there;
-}
-
 void CheckTarget(path const& site, path const& file, bool mayReplace)
 {
     if (!file.has_filename())
         throw Trouble(file.string() + ": is no name of a file; name one");
     auto const status = std::filesystem::symlink_status(file);
-    std::error_code error;
-    bool const isInSite = std::filesystem::equivalent(file.parent_path(), site, error);
-    if (isInSite && (file.filename().string().starts_with("site.") || file.filename() == "seed.xml"))
-        throw Trouble(file.string() + ": is a file of the site itself; choose another name");
+    CheckIsNotOfSite(file, site);
     if (!exists(status))
         return;
     if (!is_regular_file(status))
@@ -108,7 +85,7 @@ void BackUp(OpenedSite& site, path const& file, bool mayReplace)
         { progress(static_cast<unsigned long long>(done), static_cast<unsigned long long>(total)); };
         site.Store().BackupTo(temporary.Path(), tell);
     }
-    temporary.Flush();
+    standin::FlushFile(temporary.Path());
     temporary.Name(target, mayReplace);
 }
 }  // namespace comgui_site

@@ -266,6 +266,7 @@ int RunExport(Request const& request)
         Print(document.text);
         return 0;
     }
+    CheckIsNotOfSite(request.output, site.Folder());
     WriteNewFile(request.output, document.text, request.force);
     Print(Counted(document.tickets, "ticket") + " in " + Cleaned(request.output) + '\n');
     return 0;

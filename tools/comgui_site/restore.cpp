@@ -1,7 +1,8 @@
 #include "standin/server/files/AtomicFile.h"
 #include "standin/server/files/Descriptor.h"
 #include "standin/server/files/SiteFiles.h"
-#include "standin/server/sessions/TicketService.h"
+#include "standin/server/jobs/JobIntake.h"
+#include "standin/server/store/sqlite/Database.h"
 #include "standin/server/store/sqlite/LockFile.h"
 #include "tools/comgui_site/OpenedSite.h"
 #include "tools/comgui_site/Progress.h"
@@ -10,7 +11,6 @@
 #include "tools/comgui_site/check.h"
 #include "tools/comgui_site/words.h"
 #include <cerrno>
-#include <ctime>
 #include <fcntl.h>
 #include <set>
 #include <sys/stat.h>
@@ -105,18 +105,7 @@ private:
     path const m_folder;
 };
 
-void WriteAll(int file, path const& name, std::string_view bytes)
-{
-    while (!bytes.empty())
-    {
-        ssize_t const count = write(file, bytes.data(), bytes.size());
-        if (count < 0 && errno != EINTR)
-            throw standin::FileError(standin::FileFault(name, "cannot be written", errno));
-        bytes.remove_prefix(count < 0 ? 0 : static_cast<std::size_t>(count));
-    }
-}
-
-void Copy(path const& from, path const& to)
+void Copy(path const& from, path const& to, char const* what)
 {
     std::error_code error;
     auto const total = std::filesystem::file_size(from, error);
@@ -126,7 +115,7 @@ void Copy(path const& from, path const& to)
     standin::Descriptor target(open(to.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_CLOEXEC, 0600));
     if (target.Number() < 0)
         throw standin::FileError(standin::FileFault(to, "cannot be written", errno));
-    Progress progress("copying the backup");
+    Progress progress(what);
     std::string block(1 << 20, '\0');
     for (unsigned long long done = 0;;)
     {
@@ -136,11 +125,12 @@ void Copy(path const& from, path const& to)
         if (count == 0)
             break;
         std::size_t const got = count < 0 ? 0 : static_cast<std::size_t>(count);
-        WriteAll(target.Number(), to, std::string_view(block).substr(0, got));
+        standin::WriteAll(target.Number(), std::string_view(block).substr(0, got), to);
         progress(done += got, total);
     }
     if (!target.Close())
         throw standin::FileError(standin::FileFault(to, "cannot be written", errno));
+    standin::FlushFile(to);
 }
 
 // The jobs that have arrived, by the names of their folders.
@@ -158,7 +148,7 @@ std::set<std::string> ArrivedJobs(standin::Store& store)
         store.Load(address,
                    [&](std::string_view key, int, auto const&)
                    {
-                       if (key == "Job/File")
+                       if (key == standin::JobFileKey)
                            arrived.insert(std::to_string(address.id));
                    });
     return arrived;
@@ -200,67 +190,99 @@ catch (standin::StoreError const& error)
     throw Trouble(WithNameOf(file, workplace, error.what()));
 }
 
-std::string Now()
+void Rename(path const& from, path const& to)
 {
-    std::time_t const seconds = std::time(nullptr);
-    std::tm local = {};
-    localtime_r(&seconds, &local);
-    char text[32];
-    return {text, std::strftime(text, sizeof text, "%Y%m%d-%H%M%S", &local)};
-}
-
-// NAME.replaced-DATE-TIME, with a number behind it if that is taken.
-path FreeName(path const& file)
-{
-    std::string const stamped = file.string() + ".replaced-" + Now();
-    path name = stamped;
-    auto const isTaken = [](path const& taken)
-    { return std::filesystem::exists(std::filesystem::symlink_status(taken)); };
-    for (int n = 2; isTaken(name) || isTaken(name.string() + "-wal"); ++n)
-        name = stamped + "-" + std::to_string(n);
-    return name;
-}
-
-// Gives the file a second name; where the file system has none, another one.
-void LinkOrRename(path const& from, path const& to)
-{
-    if (link(from.c_str(), to.c_str()) == 0 || errno == ENOENT)
-        return;
     if (rename(from.c_str(), to.c_str()) != 0)
-        throw standin::FileError(standin::FileFault(from, "cannot be set aside", errno));
+        throw standin::FileError(standin::FileFault(from, "cannot be renamed", errno));
 }
 
-// At every instant there is a database under the name, since a program that finds none begins the site anew.
-// The old one's journal has to be out of the way before the new one comes, which it does not belong to.
-std::string Exchange(path const& folder, Workplace const& workplace)
+// The exchange of the database. At every instant there is a database under the name, since a program that
+// finds none begins the site anew, and it is the old one with all its changes or the new one. So what is
+// still in the old one's journal is worked in first: the journal has to be gone before the new one comes. And
+// the old one is copied: of two names for one file, a program that comes behind our death would write to
+// both.
+class Exchange
 {
-    path const database = folder / "site.db";
-    std::string const wal = database.string() + "-wal";
-    bool const isThere = std::filesystem::exists(std::filesystem::symlink_status(database));
-    path const aside = FreeName(database);
-    if (isThere)
+public:
+    // Does what takes time, and what may be done in vain. Throws, with nothing lost.
+    Exchange(path const& folder, Workplace const& workplace)
+        : m_database(folder / "site.db"), m_new(workplace.Database()), m_copy(workplace.Folder() / "old.db")
     {
-        if (struct stat old = {}; stat(database.c_str(), &old) == 0)
-            chmod(workplace.Database().c_str(), old.st_mode & 07777);
-        LinkOrRename(database, aside);
-        LinkOrRename(wal, aside.string() + "-wal");
+        struct stat old = {};
+        m_isThere = stat(m_database.c_str(), &old) == 0;
+        if (!m_isThere)
+            return;
+        m_aside = standin::FreeName(m_database, "replaced", {"", "-wal"});
+        m_isSound = old.st_size > 0 && WorkJournalIn();
+        if (m_isSound)
+            Copy(m_database, m_copy, "setting the old database aside");
+        for (path const& file : {m_new, m_copy})
+            chmod(file.c_str(), old.st_mode & 07777);
     }
-    unlink(wal.c_str());
-    unlink((database.string() + "-shm").c_str());
-    if (rename(workplace.Database().c_str(), database.c_str()) != 0)
-        throw standin::FileError(standin::FileFault(database, "cannot be replaced", errno));
-    standin::Descriptor const opened(open(folder.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
-    if (opened.Number() >= 0)
-        standin::FlushFolder(opened.Number());
-    return isThere ? aside.filename().string() : "";
-}
 
-void Flush(path const& file)
-{
-    standin::Descriptor const opened(open(file.c_str(), O_RDONLY | O_CLOEXEC));
-    if (opened.Number() < 0 || fsync(opened.Number()) != 0)
-        throw standin::FileError(standin::FileFault(file, "cannot be flushed to the disk", errno));
-}
+    // The old one's new name; empty if there was none.
+    std::string Do()
+    {
+        if (m_isSound)
+            Rename(m_copy, m_aside);
+        else if (m_isThere)
+            SetDamagedAside();
+        try
+        {
+            standin::FlushFolder(m_database.parent_path());  // a power cut must not take the name back
+            unlink(WithSuffix(m_database, "-wal").c_str());
+            unlink(WithSuffix(m_database, "-shm").c_str());
+            Rename(m_new, m_database);
+        }
+        catch (standin::FileError const&)
+        {
+            if (m_isSound)
+                unlink(m_aside.c_str());
+            throw;
+        }
+        standin::FlushFolder(m_database.parent_path());
+        return m_aside.filename().string();
+    }
+
+private:
+    static path WithSuffix(path const& file, char const* suffix) { return file.string() + suffix; }
+
+    // False for a damaged one, which stays as it is.
+    bool WorkJournalIn() const
+    try
+    {
+        standin::Database old(m_database, false);
+        if (old.Number("PRAGMA wal_checkpoint(TRUNCATE)") != 0)
+            throw Trouble(m_database.string() + ": in use by another program; end it, then try again");
+        return true;
+    }
+    catch (standin::DamagedStore const&)
+    {
+        return false;
+    }
+
+    // Its journal is part of what can still be saved. Nobody writes to a damaged database, so it may well
+    // have two names for a moment.
+    void SetDamagedAside() const
+    {
+        LinkOrRename(m_database, m_aside);
+        LinkOrRename(WithSuffix(m_database, "-wal"), WithSuffix(m_aside, "-wal"));
+    }
+
+    // Where the file system has no links, only a renaming is left.
+    static void LinkOrRename(path const& from, path const& to)
+    {
+        if (link(from.c_str(), to.c_str()) != 0 && errno != ENOENT)
+            Rename(from, to);
+    }
+
+    path const m_database;
+    path const m_new;
+    path const m_copy;  // of the old one
+    path m_aside;
+    bool m_isThere = false;
+    bool m_isSound = false;
+};
 
 // The folders in job/ that have a number for a name and are not those of the jobs.
 std::set<std::string> OtherJobFolders(path const& folder, std::set<std::string> const& jobs)
@@ -277,21 +299,63 @@ std::set<std::string> OtherJobFolders(path const& folder, std::set<std::string> 
     return others;
 }
 
-// The server would take them for what dead jobs have left.
-std::vector<std::string> SetJobFoldersAside(path const& folder, std::set<std::string> const& jobs)
+// Moves aside the folders of jobs that the backup does not know, since the server would take them for what
+// dead jobs have left; and back, unless they are to stay there.
+class StrayJobFolders
 {
-    std::vector<std::string> moved;
-    path const place = FreeName(folder / "job");
-    for (std::string const& name : OtherJobFolders(folder, jobs))
+public:
+    StrayJobFolders(path const& folder, std::set<std::string> const& jobs)
+        : m_jobs(folder / "job"), m_place(standin::FreeName(m_jobs, "replaced", {""}))
     {
-        standin::MakePrivateFolders({place});
-        path const from = folder / "job" / name;
-        if (rename(from.c_str(), (place / name).c_str()) != 0)
-            throw standin::FileError(standin::FileFault(from, "cannot be set aside", errno));
-        moved.push_back(place.filename().string() + "/" + name);
+        try
+        {
+            for (std::string const& name : OtherJobFolders(folder, jobs))
+            {
+                standin::MakePrivateFolders({m_place});
+                Rename(m_jobs / name, m_place / name);
+                m_moved.push_back(name);
+            }
+            if (!m_moved.empty())
+                for (path const& changed : {m_place, m_jobs})
+                    standin::FlushFolder(changed);
+        }
+        catch (...)
+        {
+            MoveBack();
+            throw;
+        }
     }
-    return moved;
-}
+    ~StrayJobFolders()
+    {
+        if (!m_stay)
+            MoveBack();
+    }
+    StrayJobFolders(StrayJobFolders const&) = delete;
+    StrayJobFolders& operator=(StrayJobFolders const&) = delete;
+
+    // Their names from now on.
+    std::vector<std::string> Keep()
+    {
+        m_stay = true;
+        std::vector<std::string> names;
+        for (std::string const& name : m_moved)
+            names.push_back(m_place.filename().string() + "/" + name);
+        return names;
+    }
+
+private:
+    void MoveBack() noexcept
+    {
+        for (std::string const& name : m_moved)
+            rename((m_place / name).c_str(), (m_jobs / name).c_str());
+        rmdir(m_place.c_str());
+    }
+
+    path const m_jobs;
+    path const m_place;
+    std::vector<std::string> m_moved;
+    bool m_stay = false;
+};
 
 void CheckFile(path const& file)
 {
@@ -319,14 +383,16 @@ Restored Restore(path const& folder, path const& file)
         Alone const beforeTheLongWork(folder);
     }
     Workplace const workplace(folder);
-    Copy(file, workplace.Database());
+    Copy(file, workplace.Database(), "copying the backup");
     auto const jobs = CheckCopy(file, workplace);
-    Flush(workplace.Database());
+    standin::FlushFile(workplace.Database());
     Restored restored;
     {
         Alone const alone(folder);
-        restored.jobFolders = SetJobFoldersAside(folder, jobs);
-        restored.setAside = Exchange(folder, workplace);
+        Exchange exchange(folder, workplace);
+        StrayJobFolders strays(folder, jobs);
+        restored.setAside = exchange.Do();
+        restored.jobFolders = strays.Keep();
     }
     OpenedSite site(folder);
     restored.problems = ProblemsOf(site.Store(), folder, [](long long, long long) {});

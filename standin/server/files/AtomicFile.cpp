@@ -37,13 +37,7 @@ public:
 
     void Write(std::string_view content, std::filesystem::path const& file)
     {
-        while (!content.empty())
-        {
-            ssize_t const count = write(m_descriptor.Number(), content.data(), content.size());
-            if (count < 0 && errno != EINTR)
-                throw FileError(FileFault(file, "cannot be written", errno));
-            content.remove_prefix(count < 0 ? 0 : static_cast<std::size_t>(count));
-        }
+        WriteAll(m_descriptor.Number(), content, file);
         if (fsync(m_descriptor.Number()) != 0)
             throw FileError(FileFault(file, "cannot be flushed to the disk", errno));
     }
@@ -80,17 +74,34 @@ std::filesystem::path FolderOf(std::filesystem::path const& file)
 {
     return file.has_parent_path() ? file.parent_path() : ".";
 }
-
-void FlushFolderOf(std::filesystem::path const& file)
-{
-    std::filesystem::path const folder = FolderOf(file);
-    Descriptor const descriptor(open(folder.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
-    if (descriptor.Number() >= 0 && !FlushFolder(descriptor.Number()))
-        throw FileError(FileFault(folder, "cannot be flushed to the disk", errno));
-}
 }  // namespace
 
 bool FlushFolder(int folder) { return fsync(folder) == 0 || errno == EINVAL; }
+
+void FlushFolder(std::filesystem::path const& folder)
+{
+    Descriptor const opened(open(folder.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
+    if (opened.Number() >= 0 && !FlushFolder(opened.Number()))
+        throw FileError(FileFault(folder, "cannot be flushed to the disk", errno));
+}
+
+void FlushFile(std::filesystem::path const& file)
+{
+    Descriptor const opened(open(file.c_str(), O_RDONLY | O_CLOEXEC));
+    if (opened.Number() < 0 || fsync(opened.Number()) != 0)
+        throw FileError(FileFault(file, "cannot be flushed to the disk", errno));
+}
+
+void WriteAll(int descriptor, std::string_view content, std::filesystem::path const& file)
+{
+    while (!content.empty())
+    {
+        ssize_t const count = write(descriptor, content.data(), content.size());
+        if (count < 0 && errno != EINTR)
+            throw FileError(FileFault(file, "cannot be written", errno));
+        content.remove_prefix(count < 0 ? 0 : static_cast<std::size_t>(count));
+    }
+}
 
 std::string ReadFile(std::filesystem::path const& file, std::size_t limit)
 {
@@ -120,7 +131,7 @@ void ReplaceFile(std::filesystem::path const& file, std::string_view content)
     Temporary temporary(name);
     temporary.Write(content, name);
     temporary.TakeThePlaceOf(name);
-    FlushFolderOf(name);
+    FlushFolder(FolderOf(name));
 }
 
 std::optional<pid_t> ProcessOfTemporary(std::string_view ending)

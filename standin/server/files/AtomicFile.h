@@ -20,6 +20,16 @@ std::string ReadFile(std::filesystem::path const& file, std::size_t limit);
 // True also where the file system cannot flush a folder; false, with errno, for a failure.
 bool FlushFolder(int folder);
 
+// The same by the folder's path; one that this user may write to but not read cannot be flushed by him.
+// Throws FileError.
+void FlushFolder(std::filesystem::path const& folder);
+
+// Flushes a file's content. Throws FileError.
+void FlushFile(std::filesystem::path const& file);
+
+// Writes all of it to an open file, whose name is for messages. Throws FileError.
+void WriteAll(int descriptor, std::string_view content, std::filesystem::path const& file);
+
 // Writes a new file beside the old one, flushes it to the disk and puts it in the old one's place, whose
 // permissions it takes over. A link stays, and what it points at is replaced. On failure the old content is
 // there as it was and nothing else is left. A process killed in between leaves NAME.PID-N.tmp behind.

@@ -1,12 +1,10 @@
 #include "standin/server/files/SiteFiles.h"
 
 #include "standin/server/files/AtomicFile.h"
-#include "standin/server/files/Descriptor.h"
 #include "standin/server/files/Report.h"
 #include <algorithm>
 #include <cerrno>
 #include <ctime>
-#include <fcntl.h>
 #include <set>
 #include <sys/stat.h>
 #include <system_error>
@@ -28,22 +26,6 @@ std::filesystem::path Suffixed(std::filesystem::path path, std::string const& su
 {
     path += suffix;
     return path;
-}
-
-std::filesystem::path FreeName(std::filesystem::path const& file, std::vector<std::string> const& suffixes)
-{
-    std::filesystem::path const stamped = Suffixed(file, ".damaged-" + Now());
-    auto const isTaken = [&suffixes](std::filesystem::path const& name)
-    {
-        return std::any_of(
-            suffixes.begin(), suffixes.end(),
-            [&name](std::string const& suffix)
-            { return std::filesystem::exists(std::filesystem::symlink_status(Suffixed(name, suffix))); });
-    };
-    std::filesystem::path name = stamped;
-    for (int n = 2; isTaken(name); ++n)
-        name = Suffixed(stamped, "-" + std::to_string(n));
-    return name;
 }
 
 using Folders = std::set<std::filesystem::path>;
@@ -77,14 +59,6 @@ void MakePrivateFolder(std::filesystem::path const& folder, Folders& changed)
     if (!std::filesystem::is_directory(folder, error))
         throw FileError(FileFault(folder, "the folder cannot be made", ENOTDIR));
 }
-
-// One that this user may write to but not read cannot be flushed by him.
-void Flush(std::filesystem::path const& folder)
-{
-    Descriptor const opened(open(folder.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
-    if (opened.Number() >= 0 && !FlushFolder(opened.Number()))
-        throw FileError(FileFault(folder, "cannot be flushed to the disk", errno));
-}
 }  // namespace
 
 void MakePrivateFolders(std::vector<std::filesystem::path> const& folders, bool flushesAll)
@@ -97,12 +71,29 @@ void MakePrivateFolders(std::vector<std::filesystem::path> const& folders, bool 
             changed.insert(folder.parent_path());
     }
     for (std::filesystem::path const& folder : changed)
-        Flush(folder);
+        FlushFolder(folder);
+}
+
+std::filesystem::path FreeName(std::filesystem::path const& file, std::string const& word,
+                               std::vector<std::string> const& suffixes)
+{
+    std::filesystem::path const stamped = Suffixed(file, "." + word + "-" + Now());
+    auto const isTaken = [&suffixes](std::filesystem::path const& name)
+    {
+        return std::any_of(
+            suffixes.begin(), suffixes.end(),
+            [&name](std::string const& suffix)
+            { return std::filesystem::exists(std::filesystem::symlink_status(Suffixed(name, suffix))); });
+    };
+    std::filesystem::path name = stamped;
+    for (int n = 2; isTaken(name); ++n)
+        name = Suffixed(stamped, "-" + std::to_string(n));
+    return name;
 }
 
 void SetAside(std::filesystem::path const& file, std::vector<std::string> const& suffixes)
 {
-    std::filesystem::path const name = FreeName(file, suffixes);
+    std::filesystem::path const name = FreeName(file, "damaged", suffixes);
     for (std::string const& suffix : suffixes)
     {
         std::error_code error;

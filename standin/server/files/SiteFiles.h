@@ -13,6 +13,10 @@ namespace standin
 // have made them and got no further. Throws FileError.
 void MakePrivateFolders(std::vector<std::filesystem::path> const& folders, bool flushesAll = false);
 
+// NAME.WORD-YYYYmmdd-HHMMSS, with a number behind it as long as that with one of the suffixes is taken.
+std::filesystem::path FreeName(std::filesystem::path const& file, std::string const& word,
+                               std::vector<std::string> const& suffixes);
+
 // Renames the file and those that belong to it, each its name and one of the suffixes, in the given order,
 // to names that are free: NAME.damaged-YYYYmmdd-HHMMSS[-n] and the suffix. Reports the new name. Throws
 // FileError.

@@ -2,11 +2,11 @@
 
 #include "standin/server/files/AtomicFile.h"
 #include "standin/server/files/Report.h"
+#include "standin/server/tickets/TicketAddress.h"
 #include "standin/server/transfer/TransferError.h"
 #include <algorithm>
 #include <cerrno>
 #include <fcntl.h>
-#include <functional>
 #include <random>
 #include <sys/stat.h>
 
@@ -19,6 +19,9 @@ using std::filesystem::path;
 constexpr std::string_view MarkBeginning = ".job-";
 constexpr std::size_t MarkSize = 16;
 constexpr std::string_view RemovalBeginning = ".removed-";
+
+// An empty folder may be swept before it is marked, hardly so often.
+constexpr int Attempts = 10;
 
 // A client may have written anything into the ticket.
 bool IsMark(std::string_view mark)
@@ -51,21 +54,34 @@ std::vector<path> EntriesOf(path const& folder, std::error_code& error)
     return entries;
 }
 
-// Under a name that no job has any more: whoever makes the next job of that id is in nobody's way. If this is
-// broken off, the name shows what the folder was. isIt: looks once more, at what has now that name and no
-// other, since another program may have removed the folder, and a third made the next one, since the last
-// look.
-void RemoveUnder(path const& named, std::function<bool(path const& folder)> const& isIt)
+bool HasMark(path const& folder, std::string_view mark)
 {
-    path const folder = named.parent_path() / (std::string(RemovalBeginning) + NewJobMark());
+    struct stat file = {};
+    return lstat((folder / FileOf(mark)).c_str(), &file) == 0;
+}
+
+// The mark of a folder, and whether there is anything in it. Nothing if nobody can tell.
+struct FolderContent
+{
+    std::string mark;
+    bool isEmpty = true;
+};
+std::optional<FolderContent> ContentOf(path const& folder)
+{
     std::error_code error;
-    std::filesystem::rename(named, folder, error);
-    if (error == std::errc::no_such_file_or_directory)
-        return;  // somebody else was faster
+    auto const entries = EntriesOf(folder, error);
     if (error)
-        return Report(FileFault(named, "the job's folder cannot be removed", error.value()));
-    if (!isIt(folder))
-        return std::filesystem::rename(folder, named, error);
+        return std::nullopt;
+    auto const mark = std::find_if(entries.begin(), entries.end(), IsMarkFile);
+    return FolderContent{mark == entries.end() ? std::string()
+                                               : mark->filename().string().substr(MarkBeginning.size()),
+                         entries.empty()};
+}
+
+// The mark goes last: as long as anything is left, it tells whose that was.
+void RemoveWithMarkLast(path const& folder)
+{
+    std::error_code error;
     std::vector<path> entries = EntriesOf(folder, error);
     std::stable_partition(entries.begin(), entries.end(),
                           [](path const& entry) { return !IsMarkFile(entry); });
@@ -73,8 +89,89 @@ void RemoveUnder(path const& named, std::function<bool(path const& folder)> cons
     for (path const& entry : entries)
         if (!error)
             std::filesystem::remove_all(entry, error);
-    if (error)
+    if (error && error != std::errc::no_such_file_or_directory)
         Report(FileFault(folder, "the job's folder cannot be removed", error.value()));
+}
+
+// First it gets a name that no job has, so that whoever makes the next job of that id is in nobody's way.
+// Then it is looked at once more: since the last look another program may have removed the folder, and a
+// third one made the next one. The name tells where such a one belongs, should this process die before it is
+// back.
+void RemoveMarkedFolder(path const& folder, int id, std::string_view mark)
+{
+    path const apart =
+        folder.parent_path() / (std::string(RemovalBeginning) + std::to_string(id) + "-" + NewJobMark());
+    std::error_code error;
+    std::filesystem::rename(folder, apart, error);
+    if (error == std::errc::no_such_file_or_directory)
+        return;  // somebody else was faster
+    if (error)
+        return Report(FileFault(folder, "the job's folder cannot be removed", error.value()));
+    if (HasMark(apart, mark))
+        RemoveWithMarkLast(apart);
+    else
+        std::filesystem::rename(apart, folder, error);
+}
+
+std::optional<int> IdIn(std::string_view text)
+{
+    bool const isNumber =
+        !text.empty() && text.size() <= 8 && text.find_first_not_of("0123456789") == text.npos;
+    if (!isNumber || (text.size() > 1 && text[0] == '0') || std::stoi(std::string(text)) > LargestId)
+        return std::nullopt;
+    return std::stoi(std::string(text));
+}
+
+// The job whose folder was being removed under that name; nothing for other names.
+std::optional<int> JobOnItsWayOut(std::string_view name)
+{
+    std::size_t const dash = name.rfind('-');
+    if (!name.starts_with(RemovalBeginning) || dash < RemovalBeginning.size() ||
+        !IsMark(name.substr(dash + 1)))
+        return std::nullopt;
+    return IdIn(name.substr(RemovalBeginning.size(), dash - RemovalBeginning.size()));
+}
+
+// The names in a folder of what is a folder itself, links not followed. None if it cannot be read.
+std::vector<path> FoldersBelow(path const& folder)
+{
+    std::error_code error;
+    std::vector<path> found = EntriesOf(folder, error);
+    std::erase_if(found,
+                  [](path const& entry)
+                  {
+                      std::error_code unknown;
+                      return !is_directory(symlink_status(entry, unknown));
+                  });
+    return found;
+}
+
+// The look comes before the question: a mark that is seen before its ticket is missing is a dead job's, as no
+// mark comes twice. Whoever makes a job of that id meanwhile has another one.
+void SweepNumbered(path const& folder, int id, KnownJobs const& known)
+{
+    auto const content = ContentOf(folder);
+    if (!content || known.exists(id))
+        return;
+    if (content->isEmpty)
+        rmdir(folder.c_str());  // and not if something has come into it
+    else if (!content->mark.empty())
+        RemoveMarkedFolder(folder, id, content->mark);
+}
+
+// What was taken away by mistake goes back to its place.
+void SweepOnItsWayOut(path const& folder, int id, KnownJobs const& known)
+{
+    auto const content = ContentOf(folder);
+    if (!content)
+        return;
+    std::error_code error;
+    if (content->isEmpty)
+        rmdir(folder.c_str());
+    else if (content->mark.empty() || known.hasMark(id, content->mark))
+        std::filesystem::rename(folder, folder.parent_path() / std::to_string(id), error);
+    else
+        RemoveWithMarkLast(folder);
 }
 
 // An empty one is what a process leaves that is killed before it can mark it.
@@ -113,18 +210,22 @@ Descriptor MakeJobFolder(FolderTable const& table, int id, std::string_view mark
     if (!folder)
         throw TransferError(TargetUnwritable,
                             "$(JOB): no folder for jobs; give System/Folders/Job an absolute path");
-    bool const isMade = MakeFolder(*folder);
-    if (!isMade && (errno == EEXIST || errno == ENOTEMPTY || errno == ENOTDIR))
-        throw TransferError(TargetUnwritable,
-                            folder->string() +
-                                ": something else has the name of the job's folder; move it away, "
-                                "or give System/Folders/Job a folder of its own");
-    Descriptor opened = isMade ? OpenFolder(*folder) : Descriptor();
-    if (opened.Number() >= 0 && Mark(opened, mark))
-        return opened;
-    int const reason = errno;
-    if (isMade)
-        rmdir(folder->c_str());
+    int reason = ENOENT;
+    for (int attempt = 0; attempt < Attempts && reason == ENOENT; ++attempt)
+    {
+        bool const isMade = MakeFolder(*folder);
+        if (!isMade && (errno == EEXIST || errno == ENOTEMPTY || errno == ENOTDIR))
+            throw TransferError(TargetUnwritable,
+                                folder->string() +
+                                    ": something else has the name of the job's folder; move it away, "
+                                    "or give System/Folders/Job a folder of its own");
+        Descriptor opened = isMade ? OpenFolder(*folder) : Descriptor();
+        if (opened.Number() >= 0 && Mark(opened, mark))
+            return opened;
+        reason = errno;
+        if (isMade)
+            rmdir(folder->c_str());
+    }
     throw TransferError(TargetUnwritable, FileFault(*folder, "the job's folder cannot be made", reason));
 }
 
@@ -138,7 +239,7 @@ bool IsJobFolderFree(FolderTable const& table, int id)
            !error;
 }
 
-void FlushJobFolder(FolderTable const& table)
+void FlushFolderForJobs(FolderTable const& table)
 {
     auto const jobs = table.FolderOf("JOB");
     if (!jobs)
@@ -151,32 +252,25 @@ void FlushJobFolder(FolderTable const& table)
 void RemoveJobFolder(FolderTable const& table, int id, std::string_view mark)
 {
     auto const folder = PathOf(table, id);
-    auto const hasMark = [&](path const& found)
-    {
-        struct stat file = {};
-        return lstat((found / FileOf(mark)).c_str(), &file) == 0;
-    };
-    if (folder && IsMark(mark) && hasMark(*folder))
-        RemoveUnder(*folder, hasMark);
+    if (folder && IsMark(mark) && HasMark(*folder, mark))
+        RemoveMarkedFolder(*folder, id, mark);
 }
 
-bool IsJobFolderOnItsWayOut(path const& folder)
+std::map<int, path> NumberedFolders(path const& jobs)
 {
-    std::string const name = folder.filename().string();
-    return name.starts_with(RemovalBeginning) &&
-           IsMark(std::string_view(name).substr(RemovalBeginning.size()));
+    std::map<int, path> found;
+    for (path const& folder : FoldersBelow(jobs))
+        if (auto const id = IdIn(folder.filename().string()))
+            found[*id] = folder;
+    return found;
 }
 
-void RemoveStrayJobFolder(path const& folder)
+void SweepJobFolders(path const& jobs, KnownJobs const& known)
 {
-    auto const isStray = [](path const& found)
-    {
-        std::error_code error;
-        auto const entries = EntriesOf(found, error);
-        return !error && (entries.empty() || std::any_of(entries.begin(), entries.end(), IsMarkFile));
-    };
-    bool const isOnItsWayOut = IsJobFolderOnItsWayOut(folder);
-    if (isOnItsWayOut || isStray(folder))
-        RemoveUnder(folder, [&](path const& found) { return isOnItsWayOut || isStray(found); });
+    for (auto const& [id, folder] : NumberedFolders(jobs))
+        SweepNumbered(folder, id, known);
+    for (path const& folder : FoldersBelow(jobs))
+        if (auto const id = JobOnItsWayOut(folder.filename().string()))
+            SweepOnItsWayOut(folder, *id, known);
 }
 }  // namespace standin

@@ -6,6 +6,10 @@
 #include "standin/server/files/Descriptor.h"
 #include "standin/server/tickets/FolderTable.h"
 #include <filesystem>
+#include <functional>
+#include <map>
+#include <string>
+#include <string_view>
 
 namespace standin
 {
@@ -20,17 +24,25 @@ bool IsJobFolderFree(FolderTable const& table, int id);
 // whose that is nobody here knows.
 Descriptor MakeJobFolder(FolderTable const& table, int id, std::string_view mark);
 
-// The folder's name is on the disk when this returns. Throws TransferError.
-void FlushJobFolder(FolderTable const& table);
+// The names of the folders in $(JOB) are on the disk when this returns. Throws TransferError.
+void FlushFolderForJobs(FolderTable const& table);
 
 // With all that is in it, if it has that mark. It loses its name first, so that another job may have it at
 // once. What cannot be removed stays, and is reported on stderr.
 void RemoveJobFolder(FolderTable const& table, int id, std::string_view mark);
 
-// By its name, what RemoveJobFolder has left when it was broken off.
-bool IsJobFolderOnItsWayOut(std::filesystem::path const& folder);
+// Those in a folder for jobs that have a job's number for a name, by that; links not followed.
+std::map<int, std::filesystem::path> NumberedFolders(std::filesystem::path const& jobs);
 
-// The same for a folder that belongs to no ticket: if it has any mark, or nothing in it, or is on its way
-// out.
-void RemoveStrayJobFolder(std::filesystem::path const& folder);
+// What is known of the jobs at the moment of the question. What they throw passes through.
+struct KnownJobs
+{
+    std::function<bool(int id)> exists;
+    std::function<bool(int id, std::string_view mark)> hasMark;  // there is such a job, with that mark
+};
+
+// Removes from a folder for jobs what those have left that are gone: numbered folders with a mark or nothing
+// in them, and what RemoveJobFolder was removing when it was broken off. If that was about to be given back,
+// it is now. A job's ticket has to be there before its folder.
+void SweepJobFolders(std::filesystem::path const& jobs, KnownJobs const& known);
 }  // namespace standin

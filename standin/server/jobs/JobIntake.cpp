@@ -17,6 +17,8 @@ constexpr int QueueTicketType = 7;
 constexpr int Announced = 0;
 constexpr int Arrived = 1;
 constexpr std::chrono::milliseconds ProgressPause(100);
+constexpr std::chrono::seconds ShortestPause(1);  // between two attempts to delete what has failed
+constexpr std::chrono::seconds LongestPause(60);
 
 TicketWrite Put(char const* key, std::string const& text) { return {key, -1, TicketValue::String(text)}; }
 TicketWrite Put(char const* key, int number) { return {key, -1, TicketValue::Int(number)}; }
@@ -97,16 +99,33 @@ void JobIntake::WriteOrFail(TicketWriter::Ticket const& ticket, std::vector<Tick
     throw TransferError(TargetUnwritable, "");
 }
 
-// What somebody left in $(JOB) blocks only the id whose name it has: the next job takes one above it. The
-// result is the largest id that would be given and is blocked, 0 if none is.
-int JobIntake::FirstFreeFolder() const
+// What somebody left in $(JOB) blocks only the id whose name it has. The id above the largest in use, or if
+// the ids have come to their end the smallest free one, as far as its folder's name is free, too. -1: none.
+int JobIntake::FreeId() const
 {
     FolderTable const folders = Folders();
     int const newest = m_tickets.LargestId(JobTicketType);
-    int above = 0;
-    for (int id = newest + 1; id <= LargestId && !IsJobFolderFree(folders, id); ++id)
-        above = id;
-    return above;
+    for (int id = newest + 1; id <= LargestId; ++id)
+        if (IsJobFolderFree(folders, id))
+            return id;
+    for (int id = 0; id < newest; ++id)
+        if (m_tickets.IncarnationOf({JobTicketType, id}) == 0 && IsJobFolderFree(folders, id))
+            return id;
+    return -1;
+}
+
+// Another thread or program may be faster; then the next id is due.
+std::optional<TicketWriter::Ticket> JobIntake::MakeTicket(std::vector<TicketWrite>& writes)
+{
+    for (;;)
+    {
+        TicketAddress const address{JobTicketType, FreeId()};
+        if (address.id < 0)
+            return std::nullopt;
+        auto const made = m_writer.Create({address, 0, TicketChange::Owner::ThisProgram}, writes);
+        if (made || m_tickets.IncarnationOf(address) == 0)
+            return made;
+    }
 }
 
 JobIntake::Job JobIntake::Make(Session const& session, Announcement const& announcement)
@@ -119,10 +138,9 @@ JobIntake::Job JobIntake::Make(Session const& session, Announcement const& annou
         writes.push_back(Put("Job/Queue", announcement.queue));
     if (announcement.copies > 0)
         writes.push_back(Put("Job/Copies", announcement.copies));
-    auto const ticket = m_writer.Create(
-        {{JobTicketType, TicketChange::NextId}, FirstFreeFolder(), TicketChange::Owner::ThisProgram}, writes);
+    auto const ticket = MakeTicket(writes);
     if (!ticket)
-        throw TransferError(TargetUnwritable, "no ticket can be made for a job; see the line before");
+        throw TransferError(TargetUnwritable, "no ticket can be made for a job; try again");
     return {*ticket, mark};
 }
 
@@ -174,18 +192,52 @@ TransferResult JobIntake::Send(Session const& session, std::string const& client
                                catch (...)
                                {
                                    if (job)
-                                       Drop(*job);
+                                       Drop(std::move(*job));
                                    throw;
                                }
                            });
 }
 
-// The ticket first: it must not speak of a file that is gone.
-void JobIntake::Drop(Job const& job)
+// Of a ticket that cannot be read nobody knows.
+bool JobIntake::MayTellOfFile(TicketWriter::Ticket const& ticket)
 {
-    bool const isGone = m_writer.Delete(job.ticket) || IsGone(job.ticket);
-    if (isGone && job.folders)  // where $(JOB) was then: it may have been moved
+    bool tells = false;
+    bool const isRead = m_tickets.LookAt(ticket.address, ticket.incarnation,
+                                         [&](TicketSnapshot const& job)
+                                         {
+                                             tells = job.Find(std::string_view(JobFileKey)) != nullptr;
+                                             return true;
+                                         });
+    return isRead ? tells : !IsGone(ticket);
+}
+
+// A ticket must not speak of a file that is gone; then the folder goes behind the ticket. Else it goes first:
+// the file may be what fills the disk, and on a full one no ticket can be deleted.
+void JobIntake::Drop(Job job)
+{
+    if (job.folders && !MayTellOfFile(job.ticket))  // where $(JOB) was then: it may have been moved
         RemoveJobFolder(*job.folders, job.ticket.address.id, job.mark);
+    if (m_writer.Delete(job.ticket) || IsGone(job.ticket))
+        return;
+    std::lock_guard const lock(m_lock);
+    m_failed.push_back(std::move(job));
+}
+
+void JobIntake::DropAgain()
+{
+    std::vector<Job> failed;
+    {
+        std::lock_guard const lock(m_lock);
+        if (m_failed.empty() || std::chrono::steady_clock::now() < m_nextAttempt)
+            return;
+        failed.swap(m_failed);
+    }
+    for (Job& job : failed)
+        Drop(std::move(job));
+    std::lock_guard const lock(m_lock);
+    m_pause =
+        m_failed.empty() ? std::chrono::seconds(0) : std::clamp(2 * m_pause, ShortestPause, LongestPause);
+    m_nextAttempt = std::chrono::steady_clock::now() + m_pause;
 }
 
 void JobIntake::Receive(Session const& session, Job& job, SourceFile const& source, std::string const& name,
@@ -203,7 +255,7 @@ void JobIntake::Receive(Session const& session, Job& job, SourceFile const& sour
     try
     {
         file.Finish(PartFile::Survives::PowerCut);
-        FlushJobFolder(*job.folders);
+        FlushFolderForJobs(*job.folders);
     }
     catch (TransferError const&)
     {
@@ -245,7 +297,7 @@ void JobIntake::End(Session const& session)
         ended.assign(std::move_iterator(first), std::move_iterator(m_prepared.end()));
         m_prepared.erase(first, m_prepared.end());
     }
-    for (Prepared const& prepared : ended)
-        m_writer.Delete(prepared.job.ticket);
+    for (Prepared& prepared : ended)
+        Drop(std::move(prepared.job));
 }
 }  // namespace standin

@@ -40,6 +40,10 @@ public:
 
     void End(Session const& session);  // an ended one: what it has announced and not sent goes
 
+    // Deletes what has failed and could not be deleted then. To be called every now and then; what goes on
+    // failing is tried ever more rarely.
+    void DropAgain();
+
 private:
     struct Job
     {
@@ -55,12 +59,14 @@ private:
     };
 
     Job Make(Session const& session, Announcement const& announcement);
-    int FirstFreeFolder() const;
+    int FreeId() const;
+    std::optional<TicketWriter::Ticket> MakeTicket(std::vector<TicketWrite>& writes);
     std::optional<Job> Claim(Session const& session, std::string const& name);
     void Receive(Session const& session, Job& job, SourceFile const& source, std::string const& name,
                  RunningTransfer const& running);
     void Arrive(Session const& session, Job const& job, std::string const& name, long long size);
-    void Drop(Job const& job);
+    bool MayTellOfFile(TicketWriter::Ticket const& ticket);
+    void Drop(Job job);
     bool IsGone(TicketWriter::Ticket const& ticket) const;
     void WriteOrFail(TicketWriter::Ticket const& ticket, std::vector<TicketWrite> writes,
                      TicketWriter::Conditions const& conditions = {});
@@ -72,5 +78,8 @@ private:
     TransferService& m_transfers;
     std::mutex m_lock;
     std::vector<Prepared> m_prepared;  // in the order of their making
+    std::vector<Job> m_failed;         // whose tickets are still there
+    std::chrono::steady_clock::time_point m_nextAttempt{};
+    std::chrono::seconds m_pause{0};  // behind that attempt
 };
 }  // namespace standin

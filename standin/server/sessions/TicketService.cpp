@@ -99,4 +99,11 @@ FolderSettings TicketService::Folders(TicketSnapshot::Version* which)
            });
     return folders;
 }
+
+std::string TextOf(TicketSnapshot const& ticket, std::string_view key)
+{
+    KeyValues const* const values = ticket.Find(key);
+    TicketElement const* const element = values && values->Count() == 1 ? values->At(0) : nullptr;
+    return element && element->type == PARAM_STRING ? element->text->bytes : std::string();
+}
 }  // namespace standin

@@ -113,4 +113,7 @@ private:
     Feed& m_feed;
     TicketWriter& m_writer;
 };
+
+// The text of a key that has one value; empty for everything else.
+std::string TextOf(TicketSnapshot const& ticket, std::string_view key);
 }  // namespace standin

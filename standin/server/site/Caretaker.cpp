@@ -3,6 +3,7 @@
 #include "standin/server/files/Report.h"
 #include "standin/server/site/SiteFolders.h"
 #include "standin/server/transfer/PartFile.h"
+#include <utility>
 
 namespace standin
 {
@@ -11,12 +12,18 @@ namespace
 constexpr std::chrono::milliseconds Pause(700);  // what a dead program has left goes within two seconds
 }
 
-Caretaker::Caretaker(Store& store, Feed& feed, TicketService& tickets, TicketWriter& writer,
+Caretaker::Caretaker(Store& store, Feed& feed, TicketService& tickets, TicketWriter& writer, JobIntake& jobs,
                      SystemTicketMirror& mirror, std::filesystem::path site)
-    : m_store(store), m_feed(feed), m_tickets(tickets), m_writer(writer), m_mirror(mirror),
+    : m_store(store), m_feed(feed), m_tickets(tickets), m_writer(writer), m_jobs(jobs), m_mirror(mirror),
       m_site(std::move(site))
 {
-    m_thread = std::thread([this] { Run(); });
+}
+
+void Caretaker::Start()
+{
+    std::lock_guard const lock(m_lock);
+    if (!m_thread.joinable() && !m_isStopped)
+        m_thread = std::thread([this] { Run(); });
 }
 
 void Caretaker::Stop()
@@ -41,30 +48,43 @@ void Caretaker::Run()
     }
 }
 
+// Each duty by itself: what makes one fail may be what another one clears away, such as a file that fills the
+// disk.
 void Caretaker::Tidy() noexcept
 {
     std::lock_guard const round(m_round);
-    try
+    bool const hadReported = std::exchange(m_hasReported, false);
+    auto const attempt = [&](auto const& duty)
     {
-        m_store.Maintain(m_feed.Settled());
-        if (m_store.Bury([this](Estate const& estate) { Clear(estate); }) > 0)
+        try
         {
-            SweepJobFolders(m_tickets, m_site);
-            m_mirror.Write();  // it may have died between a change and the copy of it
+            duty();
         }
-        m_mirror.CatchUp();
-        m_hasReported = false;
-    }
-    catch (std::exception const& error)
-    {
-        if (!m_hasReported)
-            Report(error.what());
-        m_hasReported = true;
-    }
+        catch (std::exception const& error)
+        {
+            if (!hadReported && !m_hasReported)
+                Report(error.what());
+            m_hasReported = true;
+        }
+    };
+    attempt([this] { m_store.Maintain(m_feed.Settled()); });
+    attempt([this] { m_store.Bury([this](Estate const& estate) { Clear(estate); }); });
+    attempt([this] { m_jobs.DropAgain(); });
+    m_mirror.CatchUp();
+    if (!m_hasBuried)
+        return;
+    attempt(
+        [this]
+        {
+            SweepJobFolders(m_store, m_tickets, m_site);
+            m_mirror.Write();  // it may have died between a change and the copy of it
+            m_hasBuried = false;
+        });
 }
 
 void Caretaker::Clear(Estate const& estate)
 {
+    m_hasBuried = true;
     for (std::string const& file : estate.partFiles)
         RemovePartFile(file);
     for (Estate::Ticket const& ticket : estate.tickets)

@@ -3,6 +3,7 @@
 #pragma once
 
 #include "standin/server/feed/TicketWriter.h"
+#include "standin/server/jobs/JobIntake.h"
 #include "standin/server/sessions/TicketService.h"
 #include "standin/server/site/SystemTicketMirror.h"
 #include <condition_variable>
@@ -16,12 +17,13 @@ class Caretaker
 {
 public:
     // Everything outlives it. site: the folder.
-    Caretaker(Store& store, Feed& feed, TicketService& tickets, TicketWriter& writer,
+    Caretaker(Store& store, Feed& feed, TicketService& tickets, TicketWriter& writer, JobIntake& jobs,
               SystemTicketMirror& mirror, std::filesystem::path site);
     ~Caretaker() { Stop(); }
     Caretaker(Caretaker const&) = delete;
     Caretaker& operator=(Caretaker const&) = delete;
 
+    void Start();
     void Stop();
 
     // One round, as the thread makes it every now and then; waits for one that it makes. Failures are
@@ -36,11 +38,13 @@ private:
     Feed& m_feed;
     TicketService& m_tickets;
     TicketWriter& m_writer;
+    JobIntake& m_jobs;
     SystemTicketMirror& m_mirror;
     std::filesystem::path const m_site;
 
     std::mutex m_round;
     bool m_hasReported = false;  // for who has the round
+    bool m_hasBuried = false;    // and has yet to look after the folders; the same
 
     std::mutex m_lock;  // the members below
     std::condition_variable m_end;

@@ -10,7 +10,7 @@ Server::Server(Store& store, TextKeeper& texts, std::filesystem::path const& sit
     : m_store(store), m_feed(store, m_notifications, texts), m_writer(store, m_feed, *this),
       m_tickets(m_feed, m_writer), m_mirror(m_tickets, site),
       m_transfers(store, m_tickets, m_notifications, site), m_jobs(store, m_tickets, m_writer, m_transfers),
-      m_caretaker(store, m_feed, m_tickets, m_writer, m_mirror, site)
+      m_caretaker(store, m_feed, m_tickets, m_writer, m_jobs, m_mirror, site)
 {
 }
 
@@ -57,16 +57,26 @@ void Server::Stop(std::chrono::milliseconds patience)
     m_feed.Stop();
 }
 
-// A job's folder goes with its ticket.
+// A job's folder goes with its ticket. If a power cut brings back a ticket that tells of a file, that has to
+// be there; so the end of the ticket comes to the disk first, or the folder stays until it is swept.
 std::function<void()> Server::WhenDeleted(TicketAddress ticket, TicketSnapshot const& last)
 {
-    if (ticket.type != JobTicketType)
+    std::string mark = ticket.type == JobTicketType ? TextOf(last, JobMarkKey) : "";
+    if (mark.empty())
         return {};
-    KeyValues const* const values = last.Find(std::string_view(JobMarkKey));
-    TicketElement const* const mark = values ? values->At(0) : nullptr;
-    if (!mark || mark->type != PARAM_STRING)
-        return {};
-    return [this, id = ticket.id, text = mark->text->bytes]
-    { RemoveJobFolder(FolderTable(m_tickets.Folders().values), id, text); };
+    bool const hasFile = last.Find(std::string_view(JobFileKey)) != nullptr;
+    return [this, id = ticket.id, mark = std::move(mark), hasFile]
+    {
+        try
+        {
+            if (hasFile)
+                m_store.Sync();
+            RemoveJobFolder(FolderTable(m_tickets.Folders().values), id, mark);
+        }
+        catch (StoreError const& error)
+        {
+            Report(error.what());
+        }
+    };
 }
 }  // namespace standin

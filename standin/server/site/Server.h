@@ -37,8 +37,12 @@ public:
     }
     bool Create(TicketAddress ticket) { return m_writer.Create({ticket}).has_value(); }
 
-    // Clears up at once what programs that died have left; else that happens every now and then.
+    // Clears up at once what programs that died have left.
     void Tidy() { m_caretaker.Tidy(); }
+
+    // From now on that happens every now and then. Not before the system ticket tells where this site is: in
+    // a copy of another one it may still name that one's folders.
+    void StartCare() { m_caretaker.Start(); }
 
     // For the end of the process: transfers are cut and no callback begins any more. What runs is waited for,
     // but not longer than that.

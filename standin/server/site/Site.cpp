@@ -102,17 +102,14 @@ std::filesystem::path Prepared(std::filesystem::path const& folder)
     return absolute;
 }
 
-bool Put(Server& server, std::string_view key, TicketValue value)
+// What cannot be put in order keeps the site from being opened: in a copy of another site $(JOB) would be
+// that one's.
+void Put(Server& server, std::string_view key, TicketValue value)
 {
     TicketWrite write{key, -1, std::move(value)};
-    return server.Write(SystemTicket, {&write, 1}) && write.ok;
-}
-
-std::string TextOf(TicketSnapshot const& ticket, std::string_view key)
-{
-    KeyValues const* const values = ticket.Find(key);
-    TicketElement const* const element = values && values->Count() == 1 ? values->At(0) : nullptr;
-    return element && element->type == PARAM_STRING ? element->text->bytes : std::string();
+    if (!server.Write(SystemTicket, {&write, 1}) || !write.ok)
+        throw StoreError("the site cannot be opened: " + std::string(key) +
+                         " cannot be corrected; see the line before, and try again");
 }
 
 // The site may have been moved, or copied from another machine.
@@ -125,8 +122,10 @@ void KeepInstallFolder(Server& server, std::filesystem::path const& folder)
                                                      known = TextOf(ticket, InstallFolderKey);
                                                      return true;
                                                  });
-    if (!isThere)
-        server.Create(SystemTicket);
+    if (!isThere && !server.Create(SystemTicket))
+        throw StoreError(
+            "the site cannot be opened: its system ticket is missing and cannot be made; see the "
+            "line before, and try again");
     if (known != folder.string())
         Put(server, InstallFolderKey, TicketValue::String(folder.string()));
 }
@@ -184,6 +183,8 @@ Site::Site(std::filesystem::path const& folder, std::filesystem::path const& see
 
 void Site::PutInOrder(Server& server)
 {
+    if (DurabilityFromEnvironment() == Durability::Full)
+        server.Transfers().Set(PartFile::Survives::PowerCut);
     for (char const* const file : {SeedFile, SystemTicketFile})
         RemoveLeftovers(m_folder / file);
     KeepInstallFolder(server, m_folder);
@@ -192,11 +193,13 @@ void Site::PutInOrder(Server& server)
     server.Tidy();
     if (!m_store->IsTidy())
     {
-        SweepJobFolders(server.Tickets(), m_folder);  // the rounds before may have had another install folder
+        SweepJobFolders(*m_store, server.Tickets(),
+                        m_folder);  // the rounds before may have had another install folder
         m_store->NoteTidy();
     }
     server.Mirror().Write();
     m_store->EndOpening();
+    server.StartCare();
 }
 
 void Site::Leave() noexcept

@@ -1,7 +1,7 @@
 // The folder in which the embedded server keeps all that lasts:
 //
-//   site.db        tickets, users and the journal of changes, with site.db-wal and site.db-shm while it is
-//   open site.lock      which programs have the site open, and the word by which they wake one another
+//   site.db        tickets, users and the journal of changes; with site.db-wal, site.db-shm while it is open
+//   site.lock      which programs have the site open, and the word by which they wake one another
 //   seed.xml       what a new site.db is filled with. The owner may edit it; after that, deleting site.db
 //                  while no program has the site open starts the site anew
 //   tickets/       SYS_0000.xml, the system ticket for programs that read a local ticket file

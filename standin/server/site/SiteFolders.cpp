@@ -3,7 +3,6 @@
 #include "standin/server/files/Report.h"
 #include "standin/server/files/SiteFiles.h"
 #include "standin/server/jobs/JobFolder.h"
-#include <optional>
 
 namespace standin
 {
@@ -11,28 +10,21 @@ namespace
 {
 using std::filesystem::path;
 
-// The names in a folder, and of what is a folder itself, links not followed. None if it cannot be read.
-std::vector<path> FoldersBelow(path const& folder)
+// Of a ticket that cannot be read nobody knows.
+bool MayHaveMark(TicketService& tickets, int id, std::string_view mark)
 {
-    std::vector<path> found;
-    std::error_code error;
-    std::filesystem::directory_iterator entry(folder, error);
-    for (; !error && entry != std::filesystem::directory_iterator(); entry.increment(error))
-        if (std::error_code unknown; is_directory(entry->symlink_status(unknown)))
-            found.push_back(entry->path());
-    return found;
+    TicketAddress const job{JobTicketType, id};
+    if (tickets.IncarnationOf(job) == 0)
+        return false;
+    bool hasMark = false;
+    bool const isRead = tickets.LookAt(job, 0,
+                                       [&](TicketSnapshot const& ticket)
+                                       {
+                                           hasMark = TextOf(ticket, JobMarkKey) == mark;
+                                           return true;
+                                       });
+    return hasMark || !isRead;
 }
-
-// The job that a folder of that name belongs to; nothing for other names.
-std::optional<int> JobOf(std::string const& name)
-{
-    bool const isNumber =
-        !name.empty() && name.size() <= 8 && name.find_first_not_of("0123456789") == name.npos;
-    if (!isNumber || (name.size() > 1 && name[0] == '0') || std::stoi(name) > LargestId)
-        return std::nullopt;
-    return std::stoi(name);
-}
-
 }  // namespace
 
 std::vector<FolderFault> FaultsOf(FolderSettings const& settings)
@@ -65,26 +57,28 @@ std::vector<FolderFault> FaultsOf(FolderSettings const& settings)
     return faults;
 }
 
-void SweepJobFolders(TicketService& tickets, path const& site)
+void SweepJobFolders(Store& store, TicketService& tickets, path const& site)
 {
     auto const jobs = FolderTable(tickets.Folders().values).FolderOf("JOB");
     if (!jobs || path(*jobs) != site / "job")
         return;
-    // A job's ticket is there before its folder, so a folder that is seen here and has no ticket then has
-    // lost it.
-    for (path const& folder : FoldersBelow(*jobs))
+    // A ticket that a power cut brings back must find its folder.
+    auto const orIsGoneForGood = [&store](bool isThere)
     {
-        std::string const name = folder.filename().string();
-        auto const id = JobOf(name);
-        if (IsJobFolderOnItsWayOut(folder) || (id && tickets.IncarnationOf({JobTicketType, *id}) == 0))
-            RemoveStrayJobFolder(folder);
-    }
+        if (!isThere)
+            store.Sync();
+        return isThere;
+    };
+    SweepJobFolders(*jobs, {[&](int id) {
+                                return orIsGoneForGood(tickets.IncarnationOf({JobTicketType, id}) != 0);
+                            },
+                            [&](int id, std::string_view mark)
+                            { return orIsGoneForGood(MayHaveMark(tickets, id, mark)); }});
 }
 
 void SetJobFoldersAside(path const& jobs)
 {
-    for (path const& folder : FoldersBelow(jobs))
-        if (JobOf(folder.filename().string()))
-            SetAside(folder, {""});
+    for (auto const& [id, folder] : NumberedFolders(jobs))
+        SetAside(folder, {""});
 }
 }  // namespace standin

@@ -1,5 +1,5 @@
 // The folders of a site when it is opened: what the system ticket says of them, and what processes that were
-// killed have left there. Whoever calls these has the site.
+// killed have left there.
 #pragma once
 
 #include "standin/server/sessions/TicketService.h"
@@ -17,9 +17,11 @@ struct FolderFault
 };
 std::vector<FolderFault> FaultsOf(FolderSettings const& settings);
 
-// Removes job folders without a job in the site's own folder for jobs, if that is where jobs are.
-void SweepJobFolders(TicketService& tickets, std::filesystem::path const& site);
+// Removes job folders without a job in the site's own folder for jobs, if that is where jobs are; other
+// programs may make and delete jobs meanwhile. Throws StoreError.
+void SweepJobFolders(Store& store, TicketService& tickets, std::filesystem::path const& site);
 
-// For a site that begins anew: its old jobs are not lost, nor taken for those of the new tickets.
+// For a site that begins anew, alone with it: its old jobs are not lost, nor taken for those of the new
+// tickets.
 void SetJobFoldersAside(std::filesystem::path const& jobs);
 }  // namespace standin

@@ -175,12 +175,13 @@ public:
 
     // Calls clear for every program that has died without Leave and that nobody else is burying, and forgets
     // the program with its sessions and part files when clear has returned. clear may use the store. If it
-    // throws, or this process dies, somebody buries that program anew. Returns how many were buried.
+    // throws, or this process dies, somebody buries that program anew; the others are buried all the same,
+    // and what was thrown first passes through at the end. Returns how many were buried.
     virtual int Bury(std::function<void(Estate const&)> const& clear) = 0;
 
-    // An orderly end: this program's sessions and part files are forgotten, and so is the program unless it
-    // still owns tickets, which are then for others to bury. The handle is of no more use. The last to leave
-    // brings everything into one file where the engine has files.
+    // An orderly end: this program's sessions are forgotten, and so is the program unless it still has part
+    // files or owns tickets, which are then for others to bury. The handle is of no more use. The last to
+    // leave brings everything into one file where the engine has files.
     virtual void Leave() = 0;
 
     virtual long long OpenSession(std::string_view user) = 0;
@@ -188,8 +189,9 @@ public:
     virtual std::vector<SessionInfo> Sessions() = 0;
 
     // A file on this machine that has not got its name yet: noted before it is made, forgotten once it has
-    // its name or is gone. path is absolute.
-    virtual void AddPartFile(std::string_view path) = 0;
+    // its name or is gone. path is absolute. Each program has notes of its own: a path that another one has
+    // noted is refused, by false, and a note of another one's stays.
+    virtual bool AddPartFile(std::string_view path) = 0;
     virtual void RemovePartFile(std::string_view path) = 0;
 
     // --- users

@@ -101,15 +101,17 @@ PartFile::PartFile(Store& store, int folder, std::string name)
         fchmod(m_file.Number(), old.st_mode & 07777);
 }
 
-// A name that is taken stays: another machine or container that shares the folder may have a process of the
-// same number, and what that is writing must not come under our file's name.
+// A name that is noted by a program that has died is for others to clear. One that is taken stays: another
+// machine or container that shares the folder may have a process of the same number, and what that is writing
+// must not come under our file's name.
 void PartFile::MakeFile()
 {
     for (;;)
     {
         std::string name = NewPartName();
         m_partPath = PathOf(m_folder) + "/" + name;
-        m_store.AddPartFile(m_partPath);
+        if (!m_store.AddPartFile(m_partPath))
+            continue;
         m_file = Descriptor(openat(m_folder, name.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_CLOEXEC, 0666));
         int const reason = errno;
         if (m_file.Number() >= 0)
@@ -123,7 +125,7 @@ void PartFile::MakeFile()
     }
 }
 
-// A note too many does no harm: it goes with the program.
+// A note too many stays until the program has ended, and whoever buries it then finds no such file.
 void PartFile::Forget() noexcept
 {
     try

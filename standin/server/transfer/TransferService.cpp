@@ -76,7 +76,7 @@ off_t TransferService::CarryNow(Request const& request, RunningTransfer const& r
         Descriptor const folder = OpenFolderOf(to, Folders(), Purpose::Write, m_site);
         PartFile target(m_store, folder.Number(), to.name);
         Copy(target, source, running);
-        target.Finish(PartFile::Survives::EndOfProcess);
+        target.Finish(m_survives);
         return source.Size();
     }
     ServerPath const from = ServerPath::Parse(request.source, "");
@@ -87,7 +87,7 @@ off_t TransferService::CarryNow(Request const& request, RunningTransfer const& r
     Descriptor const clientFolder = OpenClientFolder(file.parent_path());
     PartFile target(m_store, clientFolder.Number(), file.filename().string());
     Copy(target, source, running);
-    target.Finish(PartFile::Survives::EndOfProcess);
+    target.Finish(m_survives);
     return source.Size();
 }
 

@@ -84,6 +84,9 @@ public:
     };
     void Set(Pace pace) { m_pace = std::move(pace); }
 
+    // What carried files outlast; the end of the process unless told otherwise. Not while one runs.
+    void Set(PartFile::Survives what) { m_survives = what; }
+
     // What the transfer calls after a piece: checks for a cut, then told.
     void Copy(PartFile& target, SourceFile const& source, RunningTransfer const& running,
               std::function<void(off_t done)> const& told = {}) const;
@@ -113,6 +116,7 @@ private:
     NotificationService& m_notifications;
     std::string const m_site;
     Pace m_pace;
+    PartFile::Survives m_survives = PartFile::Survives::EndOfProcess;
 
     std::mutex m_lock;  // the members below
     std::list<RunningTransfer> m_running;

@@ -421,23 +421,27 @@ std::vector<ProgramInfo> MemoryStore::Programs()
 int MemoryStore::Bury(std::function<void(Estate const&)> const& clear)
 {
     int buried = 0;
+    std::exception_ptr failure;
     Estate estate;
-    for (ProgramId program = 0; (program = NextToBury(program, estate)) != 0; ++buried)
+    for (ProgramId program = 0; (program = NextToBury(program, estate)) != 0;)
     {
         try
         {
             clear(estate);
             Forget(program);
+            ++buried;
         }
         catch (...)
         {
+            failure = failure ? failure : std::current_exception();
             std::lock_guard const lock(m_site->m_mutex);
             auto const left = m_site->m_programs.find(program);
             if (left != m_site->m_programs.end())
                 left->second.buriedBy = 0;
-            throw;
         }
     }
+    if (failure)
+        std::rethrow_exception(failure);
     return buried;
 }
 
@@ -479,10 +483,11 @@ void MemoryStore::Leave()
 {
     auto const lock = Begin("Leave");
     std::erase_if(m_site->m_sessions, [this](auto const& entry) { return entry.second.program == m_self; });
-    std::erase_if(m_site->m_partFiles, [this](auto const& entry) { return entry.second == m_self; });
+    bool const hasPartFiles = std::any_of(m_site->m_partFiles.begin(), m_site->m_partFiles.end(),
+                                          [this](auto const& entry) { return entry.second == m_self; });
     bool const ownsTickets = std::any_of(m_site->m_tickets.begin(), m_site->m_tickets.end(),
                                          [this](auto const& entry) { return entry.second.owner == m_self; });
-    if (ownsTickets)
+    if (ownsTickets || hasPartFiles)
         m_site->m_programs.at(m_self).info.isAlive = false;
     else
         m_site->m_programs.erase(m_self);
@@ -512,17 +517,17 @@ std::vector<SessionInfo> MemoryStore::Sessions()
     return sessions;
 }
 
-void MemoryStore::AddPartFile(std::string_view path)
+bool MemoryStore::AddPartFile(std::string_view path)
 {
     auto const lock = Begin("AddPartFile");
-    m_site->m_partFiles[std::string(path)] = m_self;
+    return m_site->m_partFiles.try_emplace(std::string(path), m_self).first->second == m_self;
 }
 
 void MemoryStore::RemovePartFile(std::string_view path)
 {
     auto const lock = Begin("RemovePartFile");
     auto const found = m_site->m_partFiles.find(path);
-    if (found != m_site->m_partFiles.end())
+    if (found != m_site->m_partFiles.end() && found->second == m_self)
         m_site->m_partFiles.erase(found);
 }
 

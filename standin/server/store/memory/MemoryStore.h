@@ -137,7 +137,7 @@ public:
     long long OpenSession(std::string_view user) override;
     void CloseSession(long long session) override;
     std::vector<SessionInfo> Sessions() override;
-    void AddPartFile(std::string_view path) override;
+    bool AddPartFile(std::string_view path) override;
     void RemovePartFile(std::string_view path) override;
     std::optional<User> FindUser(std::string_view name) override;
     std::vector<User> Users() override;

@@ -787,9 +787,21 @@ std::vector<ProgramInfo> SqliteStore::Programs()
 int SqliteStore::Bury(std::function<void(Estate const&)> const& clear)
 {
     int buried = 0;
+    std::exception_ptr failure;
     for (ProgramInfo const& program : Programs())
-        if (!program.isAlive)
-            buried += BuryOne(program.id, clear) ? 1 : 0;
+    {
+        try
+        {
+            if (!program.isAlive)
+                buried += BuryOne(program.id, clear) ? 1 : 0;
+        }
+        catch (...)
+        {
+            failure = failure ? failure : std::current_exception();
+        }
+    }
+    if (failure)
+        std::rethrow_exception(failure);
     return buried;
 }
 
@@ -884,10 +896,10 @@ void SqliteStore::Leave()
     auto const writing = Lock(m_writing);
     {
         Writing leaving(*this);
-        for (char const* const sql :
-             {"DELETE FROM session WHERE program = ?", "DELETE FROM part_file WHERE program = ?",
-              "DELETE FROM program WHERE id = ?1 AND NOT EXISTS "
-              "(SELECT 1 FROM ticket WHERE owner = ?1 AND owner <> 0)"})
+        for (char const* const sql : {"DELETE FROM session WHERE program = ?",
+                                      "DELETE FROM program WHERE id = ?1 "
+                                      "AND NOT EXISTS (SELECT 1 FROM ticket WHERE owner = ?1 AND owner <> 0) "
+                                      "AND NOT EXISTS (SELECT 1 FROM part_file WHERE program = ?1)"})
             Change(sql, m_self);
         leaving.Commit();
     }
@@ -949,23 +961,28 @@ std::vector<SessionInfo> SqliteStore::Sessions()
     return sessions;
 }
 
-void SqliteStore::AddPartFile(std::string_view path)
+bool SqliteStore::AddPartFile(std::string_view path)
 {
     auto const lock = Lock(m_writing);
     Database& database = m_writer->database;
-    Database::Statement const add = database.Prepare("REPLACE INTO part_file VALUES (?, ?)");
+    // Touches a row of this program's, too, so that the changes tell whether the note stands.
+    Database::Statement const add =
+        database.Prepare("INSERT INTO part_file VALUES (?1, ?2) "
+                         "ON CONFLICT (path) DO UPDATE SET program = ?2 WHERE program = ?2");
     Writing writing(*this);
     (Database::Run(database, add) << path << static_cast<long long>(m_self)).Do();
+    bool const isNoted = database.Changes() == 1;
     writing.Commit();
+    return isNoted;
 }
 
 void SqliteStore::RemovePartFile(std::string_view path)
 {
     auto const lock = Lock(m_writing);
     Database& database = m_writer->database;
-    Database::Statement const drop = database.Prepare("DELETE FROM part_file WHERE path = ?");
+    Database::Statement const drop = database.Prepare("DELETE FROM part_file WHERE path = ? AND program = ?");
     Writing writing(*this);
-    (Database::Run(database, drop) << path).Do();
+    (Database::Run(database, drop) << path << static_cast<long long>(m_self)).Do();
     writing.Commit();
 }
 
