@@ -128,7 +128,7 @@ int main(int argc, char** argv)
 try
 {
     constexpr std::size_t MiB = 1024;
-    static PLACE const place;  // goes when the plug-in has left its site
+    static PLACE const place;        // goes when the plug-in has left its site
     WriteFile(place.Source(), MiB);  // which brings it into memory, too
     LogIn();
     auto const add = [](char const* name, COPY copy)
