@@ -2,9 +2,9 @@
 // writes: a counter, a table, numbers that it appends to a list of all lanes, and tickets that it creates and
 // deletes, the oldest as soon as there are MostTickets. It reports a change when the call has returned, by a
 // line:
-//     found COUNTER TABLE APPENDED [ID...]    first of all: what it finds of its lane; the ids are its
-//     tickets' counter N | table N | append N BLOCK | create ID | delete ID    what was done torn WHAT |
-//     misheard WHAT | refused WHAT                        what must not be
+//     found COUNTER TABLE APPENDED [ID...]    first of all: what it finds of its lane, with its tickets' ids
+//     counter N | table N | append N BLOCK | create ID | delete ID    what was done
+//     torn WHAT | misheard WHAT | refused WHAT                        what must not be
 // It dies between any two instructions; so of its last change, and of no other, the report may be missing.
 #pragma once
 

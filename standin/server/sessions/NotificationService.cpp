@@ -89,8 +89,7 @@ NotificationService::Listener* NotificationService::Find(Session const& session,
 
 bool NotificationService::Register(Session const& session, int id, Callback callback)
 {
-    auto listener =
-        std::make_shared<Listener>(Listener{session.Number(), id, std::move(callback)});
+    auto listener = std::make_shared<Listener>(Listener{session.Number(), id, std::move(callback)});
     Lock lock(m_lock);
     if (!m_thread.joinable())
         m_thread = std::thread([this] { Run(); });

@@ -1,8 +1,8 @@
 // The tickets of a site in a folder of one machine, in one SQLite database that any number of programs have
 // open at the same time:
 //
-//     site.db        tickets, users, journal, programs; beside it site.db-wal and site.db-shm while it is
-//     open site.lock      who is there, whose turn it is to write, the bell; see LockFile and SharedPage
+//     site.db    tickets, users, journal, programs; with site.db-wal and site.db-shm while it is open
+//     site.lock  who is there, whose turn it is to write, the bell; see LockFile and SharedPage
 //
 // What was committed outlives the end of the process at any instant. A power cut may take back the newest
 // changes, each as a whole, unless Durability::Full is asked for or Sync has returned.
