@@ -115,22 +115,20 @@ TEST_F(SqliteFlush, Sync_FlushesWhatWasCommittedWithout)
 // What comes while a flush runs is perhaps not among what that takes along: it needs the next one.
 TEST_F(SqliteFlush, ThatRunsAlready_DoesNotCount)
 {
-    auto const store = Open(full);
-    Writer(*store).Put(Job, "A", 0, 1);
-    auto const commit = [&store](std::uint64_t number)
-    { EXPECT_EQ(store->Commit(CreationOfNext(5), number).kind, CommitOutcome::Committed); };
+    auto const store = Open();
+    Writer writer(*store);
+    writer.Put(Job, "A", 0, 1);
+    store->Sync();
     int const needed = FlushesOf(
         [&]
         {
             std::unique_lock closed(gate);
             int const before = begun;
-            std::thread first(commit, 100);
+            std::thread first([&] { store->Sync(); });
             while (begun == before)
                 std::this_thread::yield();
-            Sequence const flushing = store->Committed();
-            std::thread second(commit, 101);
-            while (store->Committed() == flushing)
-                std::this_thread::yield();
+            writer.Put(Job, "A", 0, 2);
+            std::thread second([&] { store->Sync(); });
             std::this_thread::sleep_for(20ms);  // who counts the first flush waits for it by then
             closed.unlock();
             first.join();
@@ -150,7 +148,7 @@ TEST_F(SqliteFlush, ThreadsThatWaitAtTheSameTime_ShareAFlush)
         [&]
         {
             std::unique_lock closed(gate);
-            Sequence const before = store->Committed();
+            int const before = begun;
             for (int i = 0; i < Threads; ++i)
                 threads.emplace_back(
                     [&store, i]
@@ -158,7 +156,7 @@ TEST_F(SqliteFlush, ThreadsThatWaitAtTheSameTime_ShareAFlush)
                         EXPECT_EQ(store->Commit(Creation({5, i}), static_cast<std::uint64_t>(100 + i)).kind,
                                   CommitOutcome::Committed);
                     });
-            while (store->Committed() < before + Threads)
+            while (begun == before)
                 std::this_thread::yield();
             std::this_thread::sleep_for(200ms);  // until all wait; who is later costs a flush more
             closed.unlock();
@@ -277,7 +275,6 @@ TEST_F(SqliteFlush, ThatFails_FailsForAllWhoWaited)
     {
         std::unique_lock const closed(gate);
         fails = true;
-        Sequence const before = store->Committed();
         for (int i = 0; i < 4; ++i)
             threads.emplace_back(
                 [&, i]
@@ -286,10 +283,59 @@ TEST_F(SqliteFlush, ThatFails_FailsForAllWhoWaited)
                         store->Commit(Creation({5, i}), static_cast<std::uint64_t>(100 + i)).kind;
                     unknown += kind == CommitOutcome::Unknown ? 1 : 0;
                 });
-        while (store->Committed() < before + 4)
-            std::this_thread::yield();
+        std::this_thread::sleep_for(20ms);  // until most of them wait for the same
     }
     for (std::thread& thread : threads)
         thread.join();
     EXPECT_EQ(unknown, 4);
+    fails = false;
+    for (std::uint64_t number = 100; number < 104; ++number)
+        EXPECT_TRUE(store->FindCommit(number)) << number;
+}
+
+// Changes that go together are as if one came after the other.
+TEST_F(SqliteFlush, OfAGroup_LeavesEachChangeItsOwnAnswer)
+{
+    auto const store = Open(full);
+    Writer writer(*store);
+    auto const state = store->Load(Job, [](auto, int, auto const&) {})->state;
+    std::vector<std::future<CommitOutcome>> outcomes;
+    {
+        std::unique_lock const closed(gate);
+        int const before = begun;
+        auto const commit = [&](TicketChange change)
+        {
+            std::uint64_t const number = 100 + outcomes.size();
+            outcomes.push_back(std::async(std::launch::async, [&store, change = std::move(change), number]
+                                          { return store->Commit(change, number); }));
+        };
+        commit(CreationOfNext(5));
+        while (begun == before)
+            std::this_thread::yield();
+        for (int value = 0; value < 4; ++value)  // all of them planned on the same revision
+        {
+            TicketChange change;
+            change.address = Job;
+            change.incarnation = state.incarnation;
+            change.revision = state.revision;
+            change.parameters.push_back({"A", 0, TicketValue::Int(value)});
+            commit(std::move(change));
+        }
+        TicketChange wrong = CreationOfNext(5);
+        wrong.address.type = -1;
+        commit(std::move(wrong));
+        std::this_thread::sleep_for(100ms);  // until they wait for the same
+    }
+    EXPECT_EQ(outcomes[0].get().kind, CommitOutcome::Committed);
+    int made = 0;
+    for (std::size_t i = 1; i <= 4; ++i)
+    {
+        auto const outcome = outcomes[i].get();
+        made += outcome.kind == CommitOutcome::Committed ? 1 : 0;
+        EXPECT_TRUE(outcome.kind == CommitOutcome::Committed || outcome.kind == CommitOutcome::Conflict);
+        EXPECT_EQ(store->FindCommit(100 + i).has_value(), outcome.kind == CommitOutcome::Committed);
+    }
+    EXPECT_EQ(made, 1);
+    EXPECT_THROW(outcomes[5].get(), StoreError);
+    EXPECT_EQ(FeedOf(*store, state.revision).size(), 2u);
 }

@@ -26,7 +26,11 @@ namespace
 class SiteInAFolder : public StoreSite
 {
 public:
-    explicit SiteInAFolder(StoreLimits const& limits) { m_options.limits = limits; }
+    SiteInAFolder(StoreLimits const& limits, Durability durability)
+    {
+        m_options.limits = limits;
+        m_options.durability = durability;
+    }
     std::unique_ptr<Store> Open() override
     {
         return std::make_unique<SqliteStore>(m_folder.Path(), NoContent, m_options);
@@ -37,9 +41,14 @@ private:
     SqliteOptions m_options;
 };
 
-STORE_ENGINE const Sqlite{"Sqlite", [](StoreLimits const& limits) -> std::unique_ptr<StoreSite> {
-                              return std::make_unique<SiteInAFolder>(limits);
-                          }};
+template <Durability durability>
+std::unique_ptr<StoreSite> MakeSite(StoreLimits const& limits)
+{
+    return std::make_unique<SiteInAFolder>(limits, durability);
+}
+
+STORE_ENGINE const Sqlite{"Process", MakeSite<Durability::Process>};
+STORE_ENGINE const FlushedSqlite{"Full", MakeSite<Durability::Full>};
 
 int KeyOf(Store& store, TicketAddress address, char const* key = "Key")
 {
@@ -58,7 +67,7 @@ using SqliteCare = SqliteSite;
 using SqliteJournal = SqliteSite;
 }  // namespace
 
-INSTANTIATE_TEST_SUITE_P(Sqlite, StoreContract, testing::Values(Sqlite),
+INSTANTIATE_TEST_SUITE_P(Sqlite, StoreContract, testing::Values(Sqlite, FlushedSqlite),
                          [](auto const& engine) { return std::string(engine.param.name); });
 
 // --- a new site

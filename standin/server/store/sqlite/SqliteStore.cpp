@@ -175,6 +175,8 @@ SqliteStore::SqliteStore(std::filesystem::path const& folder, std::function<Stor
 {
     Enter();
     m_flusher = std::make_unique<Flusher>(m_file, *m_page);
+    m_group = std::make_unique<GroupCommit>([this](GroupCommit::Group group) { CommitTogether(group); },
+                                            [this](Sequence sequence) { Flush(sequence); });
     OpenDatabase(first);
     auto const noteDamage = [this] { m_page->NoteDamage(); };
     m_writer->database.ReportDamageTo(noteDamage);
@@ -436,36 +438,42 @@ void SqliteStore::RecordOf(TicketChange const& change)
 
 CommitOutcome SqliteStore::Commit(TicketChange const& change, std::uint64_t number)
 {
-    CommitOutcome outcome;
+    CheckUsable();
+    if (m_options.durability == Durability::Full)
+        return m_group->Commit(change, number);
+    PendingChange pending{change, number};
+    PendingChange* const alone[] = {&pending};
+    CommitTogether(alone);
+    return pending.outcome;
+}
+
+// In one transaction, in which each finds what those before it have made.
+void SqliteStore::CommitTogether(GroupCommit::Group group)
+{
+    auto const lock = Lock(m_writing);
+    Writing writing(*this);
+    Sequence const before = Committed();
+    Sequence last = before;
+    for (PendingChange* const pending : group)
     {
-        auto const lock = Lock(m_writing);
-        RecordOf(change);
-        Writing writing(*this);
-        Sequence const last = Committed();
-        outcome = Make(change, last + 1);
+        RecordOf(pending->change);
+        CommitOutcome& outcome = pending->outcome;
+        outcome = Make(pending->change, last + 1);
         if (outcome.kind != CommitOutcome::Committed)
         {
-            writing.Cancel();
             outcome.sequence = last;
-            return outcome;
+            continue;
         }
+        ++last;
         (Database::Run(m_writer->database, m_writer->addRecord)
-         << outcome.sequence << static_cast<long long>(m_self) << number << static_cast<int>(change.kind)
-         << outcome.address << std::string_view(m_writer->record))
+         << outcome.sequence << static_cast<long long>(m_self) << pending->number
+         << static_cast<int>(pending->change.kind) << outcome.address << std::string_view(m_writer->record))
             .Do();
-        writing.Commit(outcome.sequence);
     }
-    if (m_options.durability == Durability::Process)
-        return outcome;
-    try
-    {
-        Flush(outcome.sequence);
-    }
-    catch (StoreError const&)
-    {
-        outcome.kind = CommitOutcome::Unknown;  // it is made, but nobody knows whether it will last
-    }
-    return outcome;
+    if (last == before)
+        writing.Cancel();
+    else
+        writing.Commit(last);
 }
 
 // Changes the rows, in a transaction of the caller's.

@@ -14,6 +14,7 @@
 #include "standin/server/store/StoreLimits.h"
 #include "standin/server/store/sqlite/Database.h"
 #include "standin/server/store/sqlite/Flusher.h"
+#include "standin/server/store/sqlite/GroupCommit.h"
 #include "standin/server/store/sqlite/LockFile.h"
 #include "standin/server/store/sqlite/SharedPage.h"
 #include <filesystem>
@@ -30,7 +31,7 @@ namespace standin
 enum class Durability
 {
     Process,  // a commit does not wait for the disk
-    Full,     // it does, together with those of other threads
+    Full,     // it does, in one transaction and with one flush for those of all threads that wait
 };
 
 struct SqliteOptions
@@ -147,6 +148,7 @@ private:
     void CheckUsable() const;
     void CheckInPlace();
     std::unique_lock<std::mutex> Lock(std::mutex& mutex) const;
+    void CommitTogether(GroupCommit::Group group);
     void RecordOf(TicketChange const& change);
     CommitOutcome Make(TicketChange const& change, Sequence next);
     void PutParameters(TicketAddress address, TicketChange const& change);
@@ -181,6 +183,7 @@ private:
     std::mutex m_reading;
     std::unique_ptr<Reader> m_reader;
     std::unique_ptr<Flusher> m_flusher;
+    std::unique_ptr<GroupCommit> m_group;
 
     std::mutex m_opening;
     bool m_isOpening = false;
