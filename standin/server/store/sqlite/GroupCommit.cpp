@@ -9,10 +9,11 @@ CommitOutcome GroupCommit::Commit(TicketChange const& change, std::uint64_t numb
     Member mine{{change, number}};
     std::unique_lock lock(m_lock);
     m_waiting.push_back(&mine);
-    m_arrival.notify_one();
+    if (m_waiting.size() >= m_expected)
+        m_arrival.notify_one();
     while (!mine.isDone)
         if (m_isLed)
-            m_end.wait(lock);
+            mine.changed.wait(lock);
         else
             Lead(lock);
     if (mine.error)
@@ -33,10 +34,14 @@ void GroupCommit::Lead(std::unique_lock<std::mutex>& lock)
     lock.lock();
     m_lastTime = Clock::now() - begin;
     m_expected = members.size() + m_waiting.size();
-    for (Member* const member : members)
-        member->isDone = true;
     m_isLed = false;
-    m_end.notify_all();
+    for (Member* const member : members)
+    {
+        member->isDone = true;
+        member->changed.notify_one();  // under the lock, since behind it the member is gone
+    }
+    if (!m_waiting.empty())
+        m_waiting.front()->changed.notify_one();
 }
 
 // Those of the last group may come again at once. Waiting for them pays as long as it costs less than a group

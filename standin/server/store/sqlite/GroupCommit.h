@@ -46,6 +46,7 @@ private:
         PendingChange pending;
         std::exception_ptr error{};
         bool isDone = false;
+        std::condition_variable changed{};  // it is done, or somebody is to lead
     };
     using Clock = std::chrono::steady_clock;
 
@@ -57,9 +58,8 @@ private:
     std::function<void(Group)> const m_make;
     std::function<void(Sequence)> const m_flush;
 
-    std::mutex m_lock;  // the members below
-    std::condition_variable m_arrival;
-    std::condition_variable m_end;
+    std::mutex m_lock;                  // the members below
+    std::condition_variable m_arrival;  // of all who are expected
     std::vector<Member*> m_waiting;
     bool m_isLed = false;
     std::size_t m_expected = 1;     // as many as took part in the last group or waited at its end
