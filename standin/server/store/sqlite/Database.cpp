@@ -116,11 +116,11 @@ void Database::Fail() const
 
 void Database::FailAsDamaged(std::string const& reason) const
 {
-    DamagedStore const damage(m_file.string() + ": damaged: " + reason, RemedyOf(SQLITE_CORRUPT));
+    std::string const damage = m_file.string() + ": damaged: " + reason;
     if (!m_report)
-        throw damage;
+        throw DamagedStore(damage, RemedyOf(SQLITE_CORRUPT));
     m_report();
-    throw StoreError(damage.what());
+    throw StoreError(damage + "; " + RemedyOf(SQLITE_CORRUPT));
 }
 
 Database::Run::~Run()

@@ -19,15 +19,15 @@ class DamagedStore : public StoreError
 {
 public:
     DamagedStore(std::string const& damage, std::string const& remedy)
-        : StoreError(damage + "; " + remedy), m_damage(damage)
+        : StoreError(damage + "; " + remedy), m_damageSize(damage.size())
     {
     }
 
     // File and reason without the remedy, for who has a better one.
-    std::string const& Damage() const { return m_damage; }
+    std::string Damage() const { return std::string(what(), m_damageSize); }
 
 private:
-    std::string const m_damage;
+    std::size_t m_damageSize;  // a text of its own would make copies of the exception fail
 };
 
 class Database

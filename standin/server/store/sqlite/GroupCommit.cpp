@@ -55,6 +55,7 @@ void GroupCommit::Gather(std::unique_lock<std::mutex>& lock)
 void GroupCommit::Make(std::vector<Member*> const& members)
 {
     std::vector<PendingChange*> group;
+    group.reserve(members.size());
     for (Member* const member : members)
         group.push_back(&member->pending);
     try
