@@ -250,9 +250,10 @@ private:
         if (!m_since)
             return;
         std::uint64_t since = 0;
-        auto const [end, error] = std::from_chars(m_since->data(), m_since->data() + m_since->size(), since);
-        if (error != std::errc() || end != m_since->data() + m_since->size())
-            throw WrongUse("--since: \"" + *m_since + "\" is no number of a change");
+        std::string const& text = *m_since;
+        auto const [end, error] = std::from_chars(text.data(), text.data() + text.size(), since);
+        if (error != std::errc() || end != text.data() + text.size())
+            throw WrongUse("--since: \"" + text + "\" is no number of a change");
         m_request.since = since;
     }
 
