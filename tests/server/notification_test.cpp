@@ -159,6 +159,23 @@ TEST_F(Told, AfterStop_NobodyIs)
     EXPECT_EQ(calls, 1);
 }
 
+TEST_F(Told, Stop_EndsTheThread)
+{
+    auto const threads = []
+    {
+        auto const all = std::filesystem::directory_iterator("/proc/self/task");
+        return std::distance(begin(all), end(all));
+    };
+    auto& service = Server().Notifications();  // with the threads of the server
+    auto const before = threads();
+    Listen("admin", Job.type);
+    EXPECT_EQ(threads(), before + 1);
+    service.Stop(std::chrono::minutes(1));
+    EXPECT_EQ(threads(), before);
+    EXPECT_FALSE(service.Register(As("admin"), 7, [](Notification const&) {}));
+    EXPECT_EQ(threads(), before);
+}
+
 TEST_F(Told, Stop_DoesNotWaitLongerThanTold)
 {
     Listen("admin", Job.type);

@@ -75,8 +75,16 @@ void NotificationService::Stop(std::chrono::milliseconds patience)
     Lock lock(m_lock);
     m_stopped = true;
     m_work.notify_all();
-    if (std::this_thread::get_id() != m_thread.get_id())
-        m_done.wait_for(lock, patience, [this] { return m_running == 0; });
+    if (std::this_thread::get_id() == m_thread.get_id())
+        return;
+    if (!m_done.wait_for(lock, patience, [this] { return m_running == 0; }))
+        return;
+    // What the client's code keeps for the thread goes with the thread, not in the middle of the process's
+    // end.
+    std::thread ending = std::exchange(m_thread, {});
+    lock.unlock();
+    if (ending.joinable())
+        ending.join();
 }
 
 NotificationService::Listener* NotificationService::Find(Session const& session, int id) const
@@ -91,6 +99,8 @@ bool NotificationService::Register(Session const& session, int id, Callback call
 {
     auto listener = std::make_shared<Listener>(Listener{session.Number(), id, std::move(callback)});
     Lock lock(m_lock);
+    if (m_stopped)
+        return false;
     if (!m_thread.joinable())
         m_thread = std::thread([this] { Run(); });
     while (RemoveOne(session, lock))

@@ -50,8 +50,8 @@ public:
 
     int NewId() { return ++m_newestId; }
 
-    // From now on the session is told under that id, and under no earlier one. False for an ended session.
-    // Throws std::system_error if there can be no thread.
+    // From now on the session is told under that id, and under no earlier one. False for an ended session,
+    // and after Stop. Throws std::system_error if there can be no thread.
     bool Register(Session const& session, int id, Callback callback);
 
     // One ticket, or with TICKET_ID_ALL every ticket of the type. Enabling again replaces the keys. Tickets
@@ -79,7 +79,8 @@ public:
     // not registered. The keys outlive the service.
     void TransferHasEnded(unsigned long long session, int code, ChangedParameters parameters) noexcept;
 
-    // Begins no further callback, for good, and waits for a running one, but no longer than told.
+    // Begins no further callback, for good, and waits for a running one, but no longer than told. Unless that
+    // goes on, the thread is gone when this returns.
     void Stop(std::chrono::milliseconds patience);
 
 private:
