@@ -9,6 +9,7 @@
 #include <fcntl.h>
 #include <iterator>
 #include <memory>
+#include <pthread.h>
 #include <unistd.h>
 #include <utility>
 #include <wx/msgout.h>
@@ -18,7 +19,7 @@ namespace
 constexpr int Ends[] = {SIGINT, SIGTERM, SIGHUP};
 
 // The library's receiver deletes itself at its end; this one tells when its thread is over, which is later:
-// wxWidgets must not go before that.
+// wxWidgets must not go before that, nor what it keeps for the thread be left behind.
 class Receiver : public ReceiverThread
 {
 public:
@@ -26,17 +27,38 @@ public:
 
     void* Entry() override
     {
-        thread_local LastAct last;  // dies with the thread
-        last.ended = &m_ended;
+        pthread_setspecific(Key(), new LastAct{&m_ended});
         return ReceiverThread::Entry();
     }
 
 private:
     struct LastAct
     {
-        ~LastAct() { ended->set_value(); }
-        std::promise<void>* ended = nullptr;
+        std::promise<void>* ended;
+        bool isLastRound = false;
     };
+
+    // What others have for a thread goes in the first round of such ends, so this waits for the second.
+    static void End(void* data)
+    {
+        auto* const act = static_cast<LastAct*>(data);
+        if (!std::exchange(act->isLastRound, true) && pthread_setspecific(Key(), act) == 0)
+            return;
+        std::promise<void>& ended = *act->ended;
+        delete act;
+        ended.set_value();
+    }
+
+    static pthread_key_t Key()
+    {
+        static pthread_key_t const key = []
+        {
+            pthread_key_t made{};
+            pthread_key_create(&made, &End);
+            return made;
+        }();
+        return key;
+    }
 
     std::promise<void>& m_ended;
 };

@@ -50,15 +50,17 @@ void SystemTicketMirror::WriteInTurn(std::chrono::milliseconds limit)
 {
     auto const end = std::chrono::steady_clock::now() + limit;
     auto const folder = m_file.parent_path();
-    std::unique_lock const turn(m_turn, end);
+    std::unique_lock turn(m_turn, std::defer_lock);
     Descriptor const lock(open(folder.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
-    if (!turn || lock.Number() < 0)
-        throw FileError(FileFault(folder, "cannot be locked", turn ? errno : EBUSY));
-    while (flock(lock.Number(), LOCK_EX | LOCK_NB) != 0)
+    if (lock.Number() < 0)
+        throw FileError(FileFault(folder, "cannot be locked", errno));
+    errno = EWOULDBLOCK;
+    while (!(turn.owns_lock() || turn.try_lock()) || flock(lock.Number(), LOCK_EX | LOCK_NB) != 0)
     {
         if (errno != EWOULDBLOCK || std::chrono::steady_clock::now() > end)
             throw FileError(FileFault(folder, "cannot be locked", errno));
         std::this_thread::sleep_for(Pause);
+        errno = EWOULDBLOCK;
     }
     TicketXml copy;
     auto const take = [&](TicketSnapshot const& ticket) { copy = TicketXml::Of(SystemTicket, ticket); };

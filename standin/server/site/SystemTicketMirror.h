@@ -28,7 +28,7 @@ private:
 
     TicketService& m_tickets;
     std::filesystem::path const m_file;
-    std::timed_mutex m_turn;  // of this program's threads
+    std::mutex m_turn;  // of this program's threads
     std::atomic<bool> m_isBehind{false};
     std::atomic<bool> m_hasReported{false};  // since it worked
 };
