@@ -141,6 +141,22 @@ std::list<Epochs::Retired> Epochs::Collectable()
 
 void Epochs::Collect()
 {
+    struct Collecting
+    {
+        Epochs& epochs;
+
+        explicit Collecting(Epochs& all) : epochs(all)
+        {
+            std::lock_guard const lock(epochs.m_lock);
+            ++epochs.m_collecting;
+        }
+        ~Collecting()
+        {
+            std::lock_guard const lock(epochs.m_lock);
+            --epochs.m_collecting;
+        }
+    };
+    Collecting const collecting(*this);
     for (Retired& retired : Collectable())
         Dispose(std::move(retired.garbage), *retired.texts);
 }
@@ -152,7 +168,7 @@ void Epochs::Drain()
         Collect();
         {
             std::lock_guard const lock(m_lock);
-            if (m_retired.empty())
+            if (m_retired.empty() && m_collecting == 0)  // another thread may still use its keeper
                 return;
         }
         std::this_thread::yield();  // reading sections are short

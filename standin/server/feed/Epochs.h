@@ -105,5 +105,6 @@ private:
 
     std::mutex m_lock;
     std::list<Retired> m_retired;  // in the order of their epochs; to take some out needs no memory
+    int m_collecting = 0;          // threads that free what they have taken out
 };
 }  // namespace standin
