@@ -4,6 +4,7 @@
 
 #include "tests/support/Allocations.h"
 #include <condition_variable>
+#include <future>
 #include <gtest/gtest.h>
 #include <thread>
 
@@ -221,6 +222,27 @@ TEST_F(ReadingSections, TextsThatNobodyOutsideHas_AreNotKept)
     garbage.texts.push_back(std::make_unique<TicketText>("never handed out"));
     Epochs::Get().Retire(std::move(garbage), keeper);
     EXPECT_EQ(Collected(), 0u);
+}
+
+// The keeper may go when Drain has returned, also if another thread has taken its texts out to free them.
+TEST_F(ReadingSections, Drain_WaitsForWhoCollects)
+{
+    struct SlowKeeper : TextKeeper
+    {
+        void Keep(TicketTexts) override
+        {
+            begun.set_value();
+            gate.get_future().wait();
+        }
+        std::promise<void> begun, gate;
+    } slow;
+    Epochs::Get().Retire(OneText(), slow);
+    auto const collecting = std::async(std::launch::async, [] { Epochs::Get().Collect(); });
+    slow.begun.get_future().wait();
+    auto const draining = std::async(std::launch::async, [] { Epochs::Get().Drain(); });
+    EXPECT_EQ(draining.wait_for(std::chrono::milliseconds(50)), std::future_status::timeout);
+    slow.gate.set_value();
+    EXPECT_EQ(draining.wait_for(std::chrono::minutes(1)), std::future_status::ready);
 }
 
 // What was retired on the way is freed without anybody's asking for it: memory does not grow without bound.
