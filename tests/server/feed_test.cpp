@@ -626,6 +626,23 @@ protected:
         return told;
     }
 
+    // Once there is room what is lost is told to the owner, and what comes from then on to the ears.
+    void ExpectLossAndNewsAfterwards(SLOW_EARS& ears)
+    {
+        testing::internal::CaptureStderr();
+        ears.Hold(false);
+        std::string heard;
+        for (int i = 0; i < 3000 && !heard.starts_with("Last"); ++i)
+        {
+            two.Set(Job, "Last", i);
+            std::this_thread::sleep_for(std::chrono::milliseconds(20));
+            auto const all = ears.Heard(0);
+            heard = all.empty() ? "" : all.back();
+        }
+        EXPECT_THAT(heard, testing::StartsWith("Last"));
+        EXPECT_THAT(testing::internal::GetCapturedStderr(), HasSubstr("too slow"));
+    }
+
     MemoryFolder folder;
     std::shared_ptr<MemorySite> site =
         std::make_shared<MemorySite>(StoreLimits{.journalKept = 4, .journalLargest = 200, .feedLargest = 7});
@@ -695,18 +712,18 @@ TEST_F(NoRoom, ForLongerThanTheJournalGoesBack_IsToldOnStderr)
     for (int i = 0; i < 250; ++i)
         two.Set(Job, "K", i);
     two.server.Tidy();
-    testing::internal::CaptureStderr();
-    ears.Hold(false);
-    std::string heard;
-    for (int i = 0; i < 3000 && !heard.starts_with("Last"); ++i)  // what comes from now on is told again
-    {
-        two.Set(Job, "Last", i);
-        std::this_thread::sleep_for(std::chrono::milliseconds(20));
-        auto const all = ears.Heard(0);
-        heard = all.empty() ? "" : all.back();
-    }
-    EXPECT_THAT(heard, testing::StartsWith("Last"));
-    EXPECT_THAT(testing::internal::GetCapturedStderr(), HasSubstr("too slow"));
+    ExpectLossAndNewsAfterwards(ears);
+}
+
+TEST_F(NoRoom, BeforeARecordThatCannotBeRead_IsToldOnStderr)
+{
+    SLOW_EARS ears(one);
+    ears.Hold(true);
+    int value = 0;
+    Overwhelm(two, value);
+    one.Tickets().CatchUp();
+    site->BreakJournal();
+    ExpectLossAndNewsAfterwards(ears);
 }
 
 // --- a feed that the journal was pruned past

@@ -109,21 +109,26 @@ void Feed::Fetch(Lock& lock)
     Fetching const fetching{*this, lock};
     lock.unlock();
     std::vector<CommittedChange> fetched;
-    bool isThere = false;
-    try
-    {
-        isThere = m_store.ChangesSince(after, [&](CommittedChange&& change)
-                                       { fetched.push_back(std::move(change)); });
-    }
-    catch (BrokenJournal const& broken)
-    {
-        standin::Report(broken.what());
-    }
-    if (!isThere)
+    if (!ReadJournal(after, fetched))
         return Rebuild(lock);
     lock.lock();
     TakeFromJournal(fetched);
     MakeReady();
+}
+
+// False if the journal cannot tell what is behind that change, and never will.
+bool Feed::ReadJournal(Sequence after, std::vector<CommittedChange>& fetched)
+{
+    try
+    {
+        return m_store.ChangesSince(after,
+                                    [&](CommittedChange&& change) { fetched.push_back(std::move(change)); });
+    }
+    catch (BrokenJournal const& broken)
+    {
+        standin::Report(broken.what());
+        return false;
+    }
 }
 
 void Feed::TakeFromJournal(std::vector<CommittedChange>& fetched)
@@ -202,13 +207,12 @@ bool Feed::TellMore()
         if (!told || !m_listener.HasRoom())
             return told.has_value();
         std::vector<CommittedChange> fetched;
-        bool const isThere = m_store.ChangesSince(*told, [&](CommittedChange&& change)
-                                                  { fetched.push_back(std::move(change)); });
+        bool const isThere = ReadJournal(*told, fetched);
         std::lock_guard const lock(m_lock);
         if (m_told != told)
             continue;  // a rebuilding has told the rest
         if (!isThere)
-            GiveUpTelling("the journal no longer has what they were not told yet");
+            GiveUpTelling();
         for (auto change = fetched.begin(); change != fetched.end() && m_listener.HasRoom(); ++change)
         {
             if (change->sequence > m_heard.load(std::memory_order_relaxed))
@@ -238,11 +242,11 @@ void Feed::TellFromJournal(CommittedChange const& committed)
          pointers != m_pointersToTell.end() ? std::move(pointers->second) : NewsOf(committed.change));
 }
 
-void Feed::GiveUpTelling(std::string const& reason) noexcept
+void Feed::GiveUpTelling() noexcept
 {
     if (m_told)
-        standin::Report("clients of this program are too slow, and " + reason +
-                        "; they should read their tickets anew");
+        standin::Report("clients of this program are too slow, and the journal no longer has what they were "
+                        "not told yet; they should read their tickets anew");
     m_told.reset();
     m_pointersToTell.clear();
 }

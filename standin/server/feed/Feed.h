@@ -85,6 +85,7 @@ private:
 
     bool CatchUp() noexcept;
     void Fetch(Lock& lock);
+    bool ReadJournal(Sequence after, std::vector<CommittedChange>& fetched);
     void TakeFromJournal(std::vector<CommittedChange>& fetched);
     void MakeReady();
     void Make(CommittedChange& committed);
@@ -92,7 +93,7 @@ private:
     void Tell(TicketChange::Kind kind, TicketAddress ticket, ChangedParameters&& news);
     bool TellMore();
     void TellFromJournal(CommittedChange const& committed);
-    void GiveUpTelling(std::string const& reason) noexcept;
+    void GiveUpTelling() noexcept;
     void Listen();
     void LoadWanted();
     void Report(std::string const& line) noexcept;

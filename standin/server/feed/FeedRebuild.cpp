@@ -46,7 +46,7 @@ void Feed::Rebuild(Lock& lock)
 {
     Listing listing = List();
     lock.lock();
-    GiveUpTelling("the journal no longer has what they were not told yet");
+    GiveUpTelling();
     m_toldAhead.clear();
     for (auto const& [address, ticket] : listing.tickets)
         if (ticket.state.revision > listing.sequence)
