@@ -5,7 +5,6 @@
 #include "tests/server/MemoryFolder.h"
 #include "tests/support/Files.h"
 #include <array>
-#include <atomic>
 #include <chrono>
 #include <gmock/gmock.h>
 #include <mutex>
@@ -42,23 +41,29 @@ protected:
     }
     std::vector<std::string> NamesOf(std::string const& name) const { return NamesIn(folder / name); }
 
-    // meanwhile: what another program does when it turns out that there is no such job.
-    void Sweep(std::function<void()> const& meanwhile = [] {}) const
+    // meanwhile: what another program does when it turns out that there is no such job. It tells the mark of
+    // the job that it makes, if any.
+    void Sweep(std::function<std::string()> const& meanwhile = [] { return ""; }) const
     {
+        std::string living;
         SweepJobFolders(folder.Path(), {[&](int)
                                         {
-                                            meanwhile();
+                                            living = meanwhile();
                                             return false;
                                         },
-                                        [](int, std::string_view) { return false; }});
+                                        [&](int, std::string_view mark) { return mark == living; }});
     }
 
     static bool Comes(std::function<bool()> const& what)
     {
         auto const end = std::chrono::steady_clock::now() + std::chrono::seconds(20);
-        while (!what() && std::chrono::steady_clock::now() < end)
+        while (std::chrono::steady_clock::now() < end)
+        {
+            if (what())  // for a moment, perhaps
+                return true;
             std::this_thread::yield();
-        return what();
+        }
+        return false;
     }
 
     MemoryFolder folder;
@@ -84,18 +89,43 @@ TEST_F(SweptJobFolder, OfTheNextJobOfThatId_StaysWheneverThatIsMade)
         [&]
         {
             fs::remove_all(folder / "9");  // as by the program that has deleted the old job
-            mark = MakeJob(9);
+            return mark = MakeJob(9);
         });
     EXPECT_THAT(NamesIn(folder.Path()), ElementsAre("9"));
     EXPECT_THAT(NamesOf("9"), ElementsAre(".job-" + mark, "job.pdf"));
+}
+
+// Its program looked for the folder while that was away.
+TEST_F(SweptJobFolder, OfTheNextJobOfThatId_GoesIfThatIsDeletedMeanwhile)
+{
+    MakeJob(9);
+    Sweep(
+        [&]
+        {
+            fs::remove_all(folder / "9");
+            MakeJob(9);
+            return "";
+        });
+    EXPECT_THAT(NamesIn(folder.Path()), IsEmpty());
 }
 
 TEST_F(SweptJobFolder, OfAJobThatFindsAnEmptyOne_Stays)
 {
     fs::create_directory(folder / "9");
     std::string mark;
-    Sweep([&] { mark = MakeJob(9); });
+    Sweep([&] { return mark = MakeJob(9); });
     EXPECT_THAT(NamesOf("9"), ElementsAre(".job-" + mark, "job.pdf"));
+}
+
+TEST_F(SweptJobFolder, ThatIsGivenBack_TakesNoOthersPlace)
+{
+    std::string const mark = MakeJob(9);
+    fs::rename(folder / "9", folder / Apart);
+    fs::create_directory(folder / "9");  // another program is about to mark it
+    SweepJobFolders(folder.Path(),
+                    {[](int) { return true; }, [&](int, std::string_view asked) { return asked == mark; }});
+    EXPECT_THAT(NamesIn(folder.Path()), ElementsAre(Apart, "9"));
+    EXPECT_THAT(NamesOf("9"), IsEmpty());
 }
 
 // Its remover was killed after it had seen that it was the wrong one.
@@ -142,11 +172,10 @@ TEST_F(SweptJobFolder, OfALivingJob_IsNeverTakenForADeadOnes)
         std::lock_guard const guard(lock);
         living = mark;
     };
-    std::atomic<bool> isOver{false};
-    std::thread sweeper(
-        [&]
+    std::jthread sweeper(
+        [&](std::stop_token const& end)
         {
-            while (!isOver)
+            while (!end.stop_requested())
                 SweepJobFolders(folder.Path(), {[&](int) { return has(""); },
                                                 [&](int, std::string_view mark) { return has(mark); }});
         });
@@ -163,7 +192,7 @@ TEST_F(SweptJobFolder, OfALivingJob_IsNeverTakenForADeadOnes)
             RemoveJobFolder(table, 9, mark);
         ASSERT_TRUE(Comes([&] { return !fs::exists(folder / "9"); }));
     }
-    isOver = true;
+    sweeper.request_stop();
     sweeper.join();
     EXPECT_EQ(lost, 0);
     Sweep();

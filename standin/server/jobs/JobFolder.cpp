@@ -6,9 +6,12 @@
 #include "standin/server/transfer/TransferError.h"
 #include <algorithm>
 #include <cerrno>
+#include <chrono>
+#include <cstdio>
 #include <fcntl.h>
 #include <random>
 #include <sys/stat.h>
+#include <thread>
 
 namespace standin
 {
@@ -20,8 +23,10 @@ constexpr std::string_view MarkBeginning = ".job-";
 constexpr std::size_t MarkSize = 16;
 constexpr std::string_view RemovalBeginning = ".removed-";
 
-// An empty folder may be swept before it is marked, hardly so often.
+// An empty folder may be swept before it is marked, and a dead job's may come back to its name for a moment;
+// hardly so often.
 constexpr int Attempts = 10;
+constexpr std::chrono::milliseconds Pause(5);
 
 // A client may have written anything into the ticket.
 bool IsMark(std::string_view mark)
@@ -93,24 +98,33 @@ void RemoveWithMarkLast(path const& folder)
         Report(FileFault(folder, "the job's folder cannot be removed", error.value()));
 }
 
+// Not in the place of another; where the file system has no such rename, a plain one has to do.
+bool GiveBack(path const& apart, path const& folder)
+{
+    if (renameat2(AT_FDCWD, apart.c_str(), AT_FDCWD, folder.c_str(), RENAME_NOREPLACE) == 0)
+        return true;
+    return errno == EINVAL && rename(apart.c_str(), folder.c_str()) == 0;
+}
+
 // First it gets a name that no job has, so that whoever makes the next job of that id is in nobody's way.
 // Then it is looked at once more: since the last look another program may have removed the folder, and a
 // third one made the next one. The name tells where such a one belongs, should this process die before it is
-// back.
-void RemoveMarkedFolder(path const& folder, int id, std::string_view mark)
+// back. True if it was another one, which is back.
+bool RemoveMarkedFolder(path const& folder, int id, std::string_view mark)
 {
     path const apart =
         folder.parent_path() / (std::string(RemovalBeginning) + std::to_string(id) + "-" + NewJobMark());
     std::error_code error;
     std::filesystem::rename(folder, apart, error);
     if (error == std::errc::no_such_file_or_directory)
-        return;  // somebody else was faster
+        return false;  // somebody else was faster
     if (error)
-        return Report(FileFault(folder, "the job's folder cannot be removed", error.value()));
-    if (HasMark(apart, mark))
-        RemoveWithMarkLast(apart);
+        Report(FileFault(folder, "the job's folder cannot be removed", error.value()));
+    else if (!HasMark(apart, mark))
+        return GiveBack(apart, folder);
     else
-        std::filesystem::rename(apart, folder, error);
+        RemoveWithMarkLast(apart);
+    return false;
 }
 
 std::optional<int> IdIn(std::string_view text)
@@ -146,6 +160,18 @@ std::vector<path> FoldersBelow(path const& folder)
     return found;
 }
 
+// Whoever deleted the job of a folder that was away for a moment did not find it, and left it to us.
+void RemoveTheDead(path const& folder, int id, std::string mark, KnownJobs const& known)
+{
+    while (RemoveMarkedFolder(folder, id, mark))
+    {
+        auto const back = ContentOf(folder);
+        if (!back || back->mark.empty() || known.hasMark(id, back->mark))
+            return;
+        mark = back->mark;
+    }
+}
+
 // The look comes before the question: a mark that is seen before its ticket is missing is a dead job's, as no
 // mark comes twice. Whoever makes a job of that id meanwhile has another one.
 void SweepNumbered(path const& folder, int id, KnownJobs const& known)
@@ -156,7 +182,7 @@ void SweepNumbered(path const& folder, int id, KnownJobs const& known)
     if (content->isEmpty)
         rmdir(folder.c_str());  // and not if something has come into it
     else if (!content->mark.empty())
-        RemoveMarkedFolder(folder, id, content->mark);
+        RemoveTheDead(folder, id, content->mark, known);
 }
 
 // What was taken away by mistake goes back to its place.
@@ -165,11 +191,10 @@ void SweepOnItsWayOut(path const& folder, int id, KnownJobs const& known)
     auto const content = ContentOf(folder);
     if (!content)
         return;
-    std::error_code error;
     if (content->isEmpty)
         rmdir(folder.c_str());
     else if (content->mark.empty() || known.hasMark(id, content->mark))
-        std::filesystem::rename(folder, folder.parent_path() / std::to_string(id), error);
+        GiveBack(folder, folder.parent_path() / std::to_string(id));
     else
         RemoveWithMarkLast(folder);
 }
@@ -181,6 +206,8 @@ bool MakeFolder(path const& folder)
         return true;
     return errno == EEXIST && rmdir(folder.c_str()) == 0 && mkdir(folder.c_str(), 0700) == 0;
 }
+
+bool IsOccupied(int reason) { return reason == EEXIST || reason == ENOTEMPTY || reason == ENOTDIR; }
 
 Descriptor OpenFolder(path const& folder)
 {
@@ -211,14 +238,11 @@ Descriptor MakeJobFolder(FolderTable const& table, int id, std::string_view mark
         throw TransferError(TargetUnwritable,
                             "$(JOB): no folder for jobs; give System/Folders/Job an absolute path");
     int reason = ENOENT;
-    for (int attempt = 0; attempt < Attempts && reason == ENOENT; ++attempt)
+    for (int attempt = 0; attempt < Attempts && (reason == ENOENT || IsOccupied(reason)); ++attempt)
     {
+        if (IsOccupied(reason))
+            std::this_thread::sleep_for(Pause);
         bool const isMade = MakeFolder(*folder);
-        if (!isMade && (errno == EEXIST || errno == ENOTEMPTY || errno == ENOTDIR))
-            throw TransferError(TargetUnwritable,
-                                folder->string() +
-                                    ": something else has the name of the job's folder; move it away, "
-                                    "or give System/Folders/Job a folder of its own");
         Descriptor opened = isMade ? OpenFolder(*folder) : Descriptor();
         if (opened.Number() >= 0 && Mark(opened, mark))
             return opened;
@@ -226,6 +250,11 @@ Descriptor MakeJobFolder(FolderTable const& table, int id, std::string_view mark
         if (isMade)
             rmdir(folder->c_str());
     }
+    if (IsOccupied(reason))
+        throw TransferError(TargetUnwritable,
+                            folder->string() +
+                                ": something else has the name of the job's folder; move it away, or "
+                                "give System/Folders/Job a folder of its own");
     throw TransferError(TargetUnwritable, FileFault(*folder, "the job's folder cannot be made", reason));
 }
 
