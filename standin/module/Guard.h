@@ -1,15 +1,25 @@
-// Keeps exceptions inside the module: whoever calls one of its functions was compiled elsewhere.
+// Keeps exceptions inside the module: whoever calls one of its functions was compiled elsewhere. And keeps
+// callers out of it that would wait for threads which are not there.
 #pragma once
 
+#include "standin/server/files/ForkedChild.h"
 #include <cstdio>
 #include <exception>
 
 namespace standin
 {
-// What work returns, or failure if it throws; stderr then tells why.
+// What work returns, or failure if it throws or if this is a child made by fork; stderr then tells why.
 template <typename Result, typename Work>
 Result Guarded(Result failure, Work const& work) noexcept
 {
+    if (IsForkedChild())
+    {
+        std::fputs(
+            "ComGUI.Bundle: a call failed: this process is a copy of one that has a site open; start a "
+            "program anew instead\n",
+            stderr);
+        return failure;
+    }
     try
     {
         return work();

@@ -2,10 +2,10 @@
 
 #include "standin/module/Guard.h"
 #include "standin/server/files/FileError.h"
+#include "standin/server/files/ForkedChild.h"
 #include "standin/server/files/Report.h"
 #include <dlfcn.h>
 #include <map>
-#include <unistd.h>
 
 namespace standin
 {
@@ -31,12 +31,11 @@ using Sites = std::map<std::filesystem::path, std::unique_ptr<OpenSite>>;
 struct EndOfWork
 {
     Sites const& sites;
-    pid_t const process = getpid();
 
     ~EndOfWork()
     {
-        if (getpid() != process)
-            return;  // a child made by fork: the threads are the parent's, and some lock may be held for ever
+        if (IsForkedChild())
+            return;
         for (auto const& [folder, open] : sites)
         {
             open->server.Stop(PatienceAtTheEnd);

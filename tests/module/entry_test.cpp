@@ -2,12 +2,12 @@
 #include "tests/module/ModuleUnderTest.h"
 
 #include "standin/module/ModuleCodes.h"
+#include "tests/support/ChildProcess.h"
 #include <algorithm>
-#include <csignal>
 #include <cstring>
 #include <filesystem>
+#include <functional>
 #include <set>
-#include <sys/wait.h>
 #include <thread>
 #include <unistd.h>
 #include <vector>
@@ -311,27 +311,44 @@ TEST_F(Entries, GetTicketData_UnknownTicketOrFormatOrNoSize_IsRefused)
     EXPECT_EQ(size, 42);
 }
 
-TEST_F(Entries, AnAcknowledgedWrite_OutlivesAKilledProcess)
+// It has the parent's handles and none of its threads.
+TEST_F(Entries, InAChildMadeByFork_EveryCallFailsAtOnce)
 {
-    // The child is the first to open the site, so that it owns it until it is killed.
-    pid_t const child = fork();
-    ASSERT_GE(child, 0);
-    if (child == 0)
-    {
-        auto const* const access = Container(LogIn());
-        int const value = 4711;
-        bool const done =
-            access && access->MSETPARAMETER(access->Instance, 3, 1, "Test/Kept", PARAM_INT, &value, -1);
-        if (!done)
-            _exit(1);
-        kill(getpid(), SIGKILL);
-    }
-    int status = 0;
-    ASSERT_EQ(waitpid(child, &status, 0), child);
-    ASSERT_TRUE(WIFSIGNALED(status)) << "the child could not write";
-    auto const* const access = Container(LogIn());
+    void* const hSession = LogIn();
+    auto const* const access = Container(hSession);
     ASSERT_TRUE(access);
     int value = 0;
-    EXPECT_TRUE(access->MGETPARAMETER(access->Instance, 3, 1, "Test/Kept", PARAM_INT, &value, -1));
-    EXPECT_EQ(value, 4711);
+    ASSERT_TRUE(
+        access->MGETPARAMETER(access->Instance, 0, 0, "System/MasterSOAPPort", PARAM_INT, &value, -1));
+    STICKET_ACCESS const* const file = module->STicketFactory->CreateTicket(nullptr);
+    ASSERT_TRUE(file);
+    std::function<bool()> const refused[] = {
+        [&] { return IsAlive("localhost", 50000) == MODULE_FAILED; },
+        [&] { return !LogIn(); },
+        [&] { return module->LogoutEntry(module.Instance(), hSession) == MODULE_FAILED; },
+        [&] { return !Container(hSession); },
+        [&] {
+            return !access->MGETPARAMETER(access->Instance, 0, 0, "System/MasterSOAPPort", PARAM_INT, &value,
+                                          -1);
+        },
+        [&] { return !access->MSETPARAMETER(access->Instance, 3, 1, "K", PARAM_INT, &value, -1); },
+        [&] { return !file->SSETPARAMETER(file->Instance, "K", PARAM_INT, &value, -1); },
+        [&] { return !module->STicketFactory->CreateTicket(nullptr); },
+        [&]
+        {
+            UseSite((folder.Path() / "another").string());
+            return !LogIn();
+        },
+    };
+    ChildProcess child(
+        [&](ChildProcess::Report const& report)
+        {
+            for (auto const& isRefused : refused)
+                report(isRefused() ? 1 : 0);
+        });
+    for (std::size_t call = 0; call < std::size(refused); ++call)
+        EXPECT_EQ(child.Next(), 1) << "call " << call;
+    EXPECT_EQ(child.Wait(), 0);
+    EXPECT_EQ(IsAlive("localhost", 50000), MODULE_DONE) << "the parent is as it was";
+    module->STicketFactory->DestroyTicket(const_cast<STICKET_ACCESS const**>(&file));
 }

@@ -1,6 +1,7 @@
 #include "standin/server/store/sqlite/LockFile.h"
 
 #include "standin/server/files/FileError.h"
+#include "standin/server/files/ForkedChild.h"
 #include "standin/server/store/Store.h"
 #include <algorithm>
 #include <cerrno>
@@ -58,16 +59,6 @@ public:
             }
     }
 
-    // Whether this process is a child of one that had that folder open when it forked.
-    static bool IsInherited(std::int64_t const (&folderId)[2])
-    {
-        std::lock_guard const lock(mutex);
-        for (LockFile const* file = first; file != nullptr; file = file->m_next)
-            if (file->IsForeign() && std::equal(folderId, folderId + 2, file->m_folderId))
-                return true;
-        return false;
-    }
-
 private:
     static void Lock() { mutex.lock(); }
     static void Unlock() { mutex.unlock(); }
@@ -75,6 +66,8 @@ private:
     {
         for (LockFile* file = first; file != nullptr; file = file->m_next)
         {
+            if (file->m_file.Number() >= 0)
+                NoteForkedChild();
             file->m_file.Close();
             file->m_folder.Close();
             file->m_isForeign = true;
@@ -88,20 +81,19 @@ private:
 constinit std::mutex LockFile::Registry::mutex;
 constinit LockFile* LockFile::Registry::first = nullptr;
 
-LockFile::LockFile(std::filesystem::path const& folder)
-    : m_path(folder / "site.lock"), m_folder(open(folder.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC))
+LockFile::LockFile(std::filesystem::path const& folder) : m_path(folder / "site.lock")
 {
-    struct stat found = {};
-    if (m_folder.Number() < 0 || fstat(m_folder.Number(), &found) != 0)
-        throw StoreError(FileFault(folder, "cannot be opened", errno));
-    m_folderId[0] = static_cast<std::int64_t>(found.st_dev);
-    m_folderId[1] = static_cast<std::int64_t>(found.st_ino);
-    // SQLite's own notes of the parent's locks would lead it astray.
-    if (Registry::IsInherited(m_folderId))
+    // SQLite's own notes of the parent's locks would lead it astray, and its mutexes, which it has for all
+    // databases together, may be those of threads that are not here.
+    if (IsForkedChild())
         throw StoreError(folder.string() +
-                         ": this process is a copy of one that has the site open; open it in a "
+                         ": this process is a copy of one that has a site open; open it in a "
                          "program that was started anew");
+    m_folder = Descriptor(open(folder.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
+    if (m_folder.Number() < 0)
+        throw StoreError(FileFault(folder, "cannot be opened", errno));
     m_file = Descriptor(open(m_path.c_str(), O_RDWR | O_CREAT | O_CLOEXEC, 0600));
+    struct stat found = {};
     if (m_file.Number() < 0 || fstat(m_file.Number(), &found) != 0)
         Fail("cannot be opened", errno);
     m_inode = static_cast<std::int64_t>(found.st_ino);
@@ -124,7 +116,6 @@ void LockFile::Close()
 {
     m_file = Descriptor();
     m_folder = Descriptor();
-    m_folderId[0] = m_folderId[1] = 0;  // nothing of it is left to inherit
 }
 
 bool LockFile::Set(short type, off_t byte)

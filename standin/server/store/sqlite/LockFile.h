@@ -35,7 +35,7 @@ public:
     }  // exclusive for who clears up
 
     // Opens the file, and makes it if it is missing. Throws StoreError, also when a program of the version
-    // that knew only one owner has the site open, or when the parent of this process has it open.
+    // that knew only one owner has the site open, or when the parent of this process had any site open.
     explicit LockFile(std::filesystem::path const& folder);
     ~LockFile();
     LockFile(LockFile const&) = delete;
@@ -75,7 +75,6 @@ private:
     Descriptor m_file;
     std::int64_t m_inode = 0;
     std::atomic<bool> m_isForeign{false};
-    std::int64_t m_folderId[2] = {};  // device and inode
-    LockFile* m_next = nullptr;       // in the registry
+    LockFile* m_next = nullptr;  // in the registry
 };
 }  // namespace standin

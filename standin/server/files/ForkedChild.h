@@ -1,0 +1,12 @@
+// A child that was made by fork has none of its parent's threads, and may have locks of theirs which nobody
+// releases any more.
+#pragma once
+
+namespace standin
+{
+// Whether this process is such a child, of one that had a site open.
+bool IsForkedChild() noexcept;
+
+// For who is told of the fork, in the child.
+void NoteForkedChild() noexcept;
+}  // namespace standin
