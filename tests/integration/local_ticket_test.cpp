@@ -1,11 +1,7 @@
-// The local family of ComGUIManager on real ticket files, with no session anywhere, and what a file is after
-// its writer was killed.
+// The local family of ComGUIManager on real ticket files, with no session anywhere.
 #include "tests/integration/Host.h"
-#include "tests/support/ChildProcess.h"
 #include "tests/support/Files.h"
 #include <gmock/gmock.h>
-#include <random>
-#include <thread>
 
 using testing::ElementsAre;
 using testing::IsEmpty;
@@ -32,18 +28,6 @@ protected:
 
     wxString const file = wxString::FromUTF8((folder.Path() / "ticket.xml").string());
 };
-
-// Two values of one round, and enough beside them that the kill may come in the middle of the writing.
-void SaveRound(wxString const& file, int round)
-{
-    STICKET_ACCESS const* ticket = CreateTicket(file.utf8_str());
-    if (!ticket)
-        _exit(1);
-    SETMULTIPAR table[] = {
-        {"Test/A", PARAM_INT, 0, &round, -1, false, {}}, {"Test/Z", PARAM_INT, 0, &round, -1, false, {}}, {}};
-    ticket->SSETMULTIPAR(ticket->Instance, table);
-    DestroyTicket(ticket);
-}
 }  // namespace
 
 TEST_F(LocalTicketFile, IntParameter_IsTheValueOrTheDefault)
@@ -176,39 +160,4 @@ TEST_F(LocalTicketFile, IsAliveBackward_WithoutASiteInTheCurrentFolder_AsksAtPor
     TLogin login = Record();
     EXPECT_EQ(Manager().IsAliveBackward(&login), -2005);
     EXPECT_EQ(login.iServerPort, -1);
-}
-
-TEST_F(LocalTicketFile, WhoseWriterIsKilledAtAnyInstant_IsWholeAndOldOrNew)
-{
-    std::string const filler(20'000, 'x');
-    Write("<parameter key='Test/Filler' type='string'>" + filler + "</parameter>");
-    std::mt19937 random(815);
-    int before = 0;
-    for (int kill = 0; kill < 200; ++kill)
-    {
-        std::int64_t acknowledged = before;
-        {
-            ChildProcess child(
-                [&](auto const& tell)
-                {
-                    Manager();  // brings the plug-in, and with it the factory
-                    for (int round = before + 1;; ++round)
-                    {
-                        SaveRound(file, round);
-                        tell(round);
-                    }
-                });
-            ASSERT_TRUE(child.Next());  // it has got going
-            ++acknowledged;
-            std::this_thread::sleep_for(
-                std::chrono::microseconds(std::uniform_int_distribution(0, 5000)(random)));
-            child.Kill();
-            acknowledged = child.Last(acknowledged);
-        }
-        int const round = Manager().GetIntParameterFromLocal(file, "Test/A", -2, -1);
-        ASSERT_TRUE(round == acknowledged || round == acknowledged + 1) << round << " " << acknowledged;
-        ASSERT_EQ(Manager().GetIntParameterFromLocal(file, "Test/Z", -2, -1), round);
-        ASSERT_EQ(Manager().GetStringParameterFromLocal(file, "Test/Filler", -1).size(), filler.size());
-        before = round;
-    }
 }

@@ -1,6 +1,5 @@
-// What becomes of a site when processes are killed, meet, or find it unusable.
+// What becomes of a site that cannot be used as it is, and what lies beside its database.
 #include "tests/integration/Host.h"
-#include "tests/support/ChildProcess.h"
 #include "tests/support/Files.h"
 #include <gmock/gmock.h>
 
@@ -23,64 +22,6 @@ protected:
     }
 };
 }  // namespace
-
-TEST_F(SiteOfAHost, WriteThatWasAcknowledged_SurvivesKill9)
-{
-    std::int64_t acknowledged = 0;
-    {
-        ChildProcess child(
-            [](auto const& tell)
-            {
-                if (LogIn() == 0)
-                    for (int i = 1; WriteInt("Test/Counter", i) == 1; ++i)
-                        tell(i);
-            });
-        while (acknowledged < 200)
-        {
-            std::optional<std::int64_t> const number = child.Next();
-            ASSERT_TRUE(number);
-            acknowledged = *number;
-        }
-        child.Kill();
-        acknowledged = child.Last(acknowledged);
-    }
-    ASSERT_EQ(LogIn(), 0);
-    EXPECT_GE(ReadInt("Test/Counter"), acknowledged);
-    EXPECT_LE(ReadInt("Test/Counter"), acknowledged + 1);  // one more may have been on its way
-}
-
-TEST_F(SiteOfAHost, TableWriteThatWasKilled_IsThereWholeOrNotAtAll)
-{
-    constexpr int Size = 500;
-    ChildProcess child(
-        [](auto const& tell)
-        {
-            if (LogIn() != 0)
-                return;
-            MTICKET_ACCESS const* const container = Manager().GetClientContainer();
-            std::vector<std::string> keys;
-            for (int i = 0; i < Size; ++i)
-                keys.push_back("Test/Table/" + std::to_string(i));
-            std::vector<SETMULTIPAR> table(Size + 1);
-            for (int round = 1;; ++round)
-            {
-                for (std::size_t i = 0; i < Size; ++i)
-                    table[i] = {keys[i].c_str(), PARAM_INT, 0, &round, -1, false, {}};
-                if (container->MSETMULTIPAR(container->Instance, 3, 1, table.data()) == 0)
-                    return;
-                tell(round);
-            }
-        });
-    for (int i = 0; i < 5; ++i)
-        ASSERT_TRUE(child.Next());
-    child.Kill();
-
-    ASSERT_EQ(LogIn(), 0);
-    int const round = ReadInt("Test/Table/0");
-    EXPECT_GE(round, 5);
-    for (int i = 1; i < Size; ++i)
-        ASSERT_EQ(ReadInt(("Test/Table/" + std::to_string(i)).c_str()), round);
-}
 
 TEST_F(SiteOfAHost, FolderThatCannotBeMade_IsNamed)
 {
