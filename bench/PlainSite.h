@@ -5,6 +5,7 @@
 #include "standin/server/store/ChangeRecord.h"
 #include "standin/server/store/sqlite/SqliteStore.h"
 #include "tests/support/TemporaryFolder.h"
+#include <benchmark/benchmark.h>
 #include <cstdlib>
 #include <filesystem>
 #include <sqlite3.h>
@@ -83,14 +84,14 @@ public:
         commit = Prepare("COMMIT");
         write = Prepare("UPDATE ticket SET revision = ?5 "
                         "WHERE type = ?1 AND id = ?2 AND incarnation = ?3 AND revision = ?4");
-        largestId = Prepare("SELECT max(id) FROM ticket WHERE type = ?");
+        m_largestId = Prepare("SELECT max(id) FROM ticket WHERE type = ?");
         create = Prepare("INSERT INTO ticket VALUES (?, ?, ?, ?, ?) ON CONFLICT DO NOTHING");
         put = Prepare("REPLACE INTO parameter VALUES (?, ?, ?, ?, ?, ?)");
         record = Prepare("INSERT INTO journal VALUES (?, ?, ?, ?, ?, ?, ?)");
     }
     ~PLAIN()
     {
-        for (sqlite3_stmt* const statement : {begin, commit, write, largestId, create, put, record})
+        for (sqlite3_stmt* const statement : {begin, commit, write, m_largestId, create, put, record})
             sqlite3_finalize(statement);
         sqlite3_close(m_database);
     }
@@ -109,6 +110,14 @@ public:
         Must(code == SQLITE_DONE || code == SQLITE_ROW);
         sqlite3_reset(statement);
     }
+    int NextId()
+    {
+        Integers(m_largestId, {JobType});
+        Must(sqlite3_step(m_largestId) == SQLITE_ROW);
+        int const id = sqlite3_column_int(m_largestId, 0) + 1;
+        sqlite3_reset(m_largestId);
+        return id;
+    }
     void Put(int id, ParameterChange const& parameter)
     {
         Integers(put, {JobType, id});
@@ -126,7 +135,7 @@ public:
         Run(record);
     }
 
-    sqlite3_stmt *begin, *commit, *write, *largestId, *create, *put, *record;
+    sqlite3_stmt *begin, *commit, *write, *create, *put, *record;
 
 private:
     sqlite3_stmt* Prepare(char const* sql)
@@ -139,6 +148,27 @@ private:
 
     TemporaryFolder m_folder;
     sqlite3* m_database = nullptr;
+    sqlite3_stmt* m_largestId = nullptr;
 };
+
+inline void OneValuePlain(benchmark::State& state)
+{
+    PLAIN plain;
+    TicketChange change;
+    change.parameters.push_back(IntParameter("Job/Parameter/27", 0));
+    std::string bytes;
+    AppendChangeRecord(bytes, change);
+    long long revision = 1;
+    for (auto _ : state)
+    {
+        ++change.parameters[0].value.word;
+        plain.Run(plain.begin);
+        plain.Integers(plain.write, {JobType, Job.id, 1, revision, revision + 1});
+        plain.Run(plain.write);
+        plain.Put(Job.id, change.parameters[0]);
+        plain.Record(++revision, TicketChange::Write, Job.id, bytes);
+        plain.Run(plain.commit);
+    }
+}
 
 }  // namespace bench

@@ -58,26 +58,6 @@ struct LOGGED_IN
     MTICKET_ACCESS const& access = *container.Access();
 };
 
-void OneValuePlain(benchmark::State& state)
-{
-    PLAIN plain;
-    TicketChange change;
-    change.parameters.push_back(IntParameter("Job/Parameter/27", 0));
-    std::string bytes;
-    AppendChangeRecord(bytes, change);
-    long long revision = 1;
-    for (auto _ : state)
-    {
-        ++change.parameters[0].value.word;
-        plain.Run(plain.begin);
-        plain.Integers(plain.write, {JobType, Job.id, 1, revision, revision + 1});
-        plain.Run(plain.write);
-        plain.Put(Job.id, change.parameters[0]);
-        plain.Record(++revision, TicketChange::Write, Job.id, bytes);
-        plain.Run(plain.commit);
-    }
-}
-
 void OneValue(benchmark::State& state)
 {
     LOGGED_IN client;
@@ -106,10 +86,7 @@ void NewTicketPlain(benchmark::State& state)
     for (auto _ : state)
     {
         plain.Run(plain.begin);
-        plain.Integers(plain.largestId, {JobType});
-        Must(sqlite3_step(plain.largestId) == SQLITE_ROW);
-        int const id = sqlite3_column_int(plain.largestId, 0) + 1;
-        sqlite3_reset(plain.largestId);
+        int const id = plain.NextId();
         ++sequence;
         plain.Integers(plain.create, {JobType, id, sequence, sequence, 0});
         plain.Run(plain.create);

@@ -8,6 +8,7 @@
 #include "standin/module/SiteServer.h"
 #include "standin/module/TicketData.h"
 #include "standin/module/Transfers.h"
+#include "standin/server/files/Report.h"
 #include <cstdio>
 #include <cstring>
 #include <strings.h>
@@ -136,7 +137,7 @@ int LogIn(TLogin& login)
     }
     catch (StoreError const& error)
     {
-        std::fprintf(stderr, "%s\n", error.what());
+        Report(error.what());
         return MODULE_SITE_UNAVAILABLE;
     }
 }

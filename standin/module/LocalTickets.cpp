@@ -1,7 +1,7 @@
 #include "standin/module/LocalTickets.h"
 
 #include "standin/server/files/FileError.h"
-#include <cstdio>
+#include "standin/server/files/Report.h"
 
 namespace standin
 {
@@ -32,11 +32,11 @@ STICKET_ACCESS const* LocalTickets::Create(char const* path)
     }
     catch (XmlError const& error)
     {
-        std::fprintf(stderr, "%s; correct the file, or put a sound copy in its place\n", error.what());
+        Report(std::string(error.what()) + "; correct the file, or put a sound copy in its place");
     }
     catch (FileError const& error)
     {
-        std::fprintf(stderr, "%s\n", error.what());
+        Report(error.what());
     }
     if (!ticket)
         return nullptr;
@@ -64,7 +64,7 @@ void LocalTickets::Destroy(STICKET_ACCESS const** ticket)
     }
     catch (FileError const& error)
     {
-        std::fprintf(stderr, "%s\n", error.what());
+        Report(error.what());
     }
 }
 }  // namespace standin

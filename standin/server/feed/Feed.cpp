@@ -14,16 +14,6 @@ constexpr std::chrono::milliseconds SlowPoll(500);
 // To a listener that has no room.
 constexpr std::chrono::milliseconds QuickPoll(5);
 
-using Values = std::vector<TicketCache::LoadedValue>;
-
-std::optional<Store::Loaded> LoadFrom(Store& store, TicketAddress address, Values& values)
-{
-    return store.Load(address,
-                      [&](std::string_view key, int pos, StoredValue const& value) {
-                          values.push_back({std::string(key), pos, TicketValue::FromStored(value)});
-                      });
-}
-
 bool HasPointers(TicketChange const& change)
 {
     return std::any_of(change.parameters.begin(), change.parameters.end(),
@@ -269,6 +259,14 @@ ChangedParameters Feed::NewsOf(TicketChange const& change)
     return news;
 }
 
+std::optional<Store::Loaded> Feed::Read(TicketAddress address, Values& values)
+{
+    return m_store.Load(address,
+                        [&](std::string_view key, int pos, StoredValue const& value) {
+                            values.push_back({std::string(key), pos, TicketValue::FromStored(value)});
+                        });
+}
+
 bool Feed::Load(TicketAddress address)
 {
     try
@@ -276,7 +274,7 @@ bool Feed::Load(TicketAddress address)
         for (;;)
         {
             Values values;
-            auto const loaded = LoadFrom(m_store, address, values);
+            auto const loaded = Read(address, values);
             // What is published is never ahead of what was heard.
             if (!loaded || !CatchUp(loaded->sequence))
                 return false;
@@ -305,7 +303,7 @@ void Feed::Reload(TicketAddress address)
     {
         Sequence const before = m_committed.load(std::memory_order_acquire);
         Values values;
-        auto const loaded = LoadFrom(m_store, address, values);
+        auto const loaded = Read(address, values);
         Sequence const seen = loaded ? loaded->sequence : before;
         bool const isHeard = CatchUp(seen);
         std::lock_guard const lock(m_lock);

@@ -89,6 +89,8 @@ private:
     void TakeFromJournal(std::vector<CommittedChange>& fetched);
     void MakeReady();
     void Make(CommittedChange& committed);
+    using Values = std::vector<TicketCache::LoadedValue>;
+    std::optional<Store::Loaded> Read(TicketAddress address, Values& values);
     ChangedParameters NewsOf(TicketChange const& change);
     void Tell(TicketChange::Kind kind, TicketAddress ticket, ChangedParameters&& news);
     bool TellMore();
@@ -103,8 +105,7 @@ private:
     void Rebuild(Lock& lock);
     Listing List();
     void TakeOver(Listing& listing);
-    ChangedParameters Difference(TicketSnapshot const* before,
-                                 std::vector<TicketCache::LoadedValue> const& after);
+    ChangedParameters Difference(TicketSnapshot const* before, Values const& after);
 
     Store& m_store;
     ChangeListener& m_listener;

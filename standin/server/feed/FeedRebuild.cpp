@@ -12,7 +12,7 @@ struct Feed::Listing
     {
         TicketState state;
         bool isLoaded = false;
-        std::vector<TicketCache::LoadedValue> values{};
+        Values values{};
     };
     Sequence sequence = 0;
     std::map<TicketAddress, Ticket> tickets;
@@ -30,11 +30,7 @@ Feed::Listing Feed::List()
                             m_cache.RevisionOf(address) != ticket.state.revision;
         if (!isNews || (!m_cache.Find(address) && !m_listener.Wants(address)))
             continue;
-        auto const loaded =
-            m_store.Load(address,
-                         [&values = ticket.values](std::string_view key, int pos, StoredValue const& value) {
-                             values.push_back({std::string(key), pos, TicketValue::FromStored(value)});
-                         });
+        auto const loaded = Read(address, ticket.values);
         ticket.isLoaded = loaded && loaded->state.incarnation == ticket.state.incarnation;
         if (ticket.isLoaded)
             ticket.state = loaded->state;  // perhaps of later than the listing; the feed then passes it over
@@ -94,8 +90,7 @@ void Feed::TakeOver(Listing& listing)
 }
 
 // What has to be told to whom knows before, null for nothing, so that he knows after.
-ChangedParameters Feed::Difference(TicketSnapshot const* before,
-                                   std::vector<TicketCache::LoadedValue> const& after)
+ChangedParameters Feed::Difference(TicketSnapshot const* before, Values const& after)
 {
     ChangedParameters news;
     std::set<std::pair<Key, int>> now;

@@ -13,7 +13,6 @@ constexpr char UserKey[] = "Job/Identification/User";
 constexpr char EndPointKey[] = "Job/Identification/RemoteEndpoint";
 constexpr char StateKey[] = "Job/State";
 constexpr char ProgressKey[] = "Job/Progress";
-constexpr int QueueTicketType = 7;
 constexpr int Announced = 0;
 constexpr int Arrived = 1;
 constexpr std::chrono::milliseconds ProgressPause(100);

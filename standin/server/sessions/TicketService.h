@@ -10,9 +10,6 @@
 
 namespace standin
 {
-inline constexpr int JobTicketType = 3;
-inline constexpr int UserTicketType = 17;
-
 // A value of a ticket at one moment. The text is the ticket's own, and counts as handed out.
 struct WalkedValue
 {

@@ -9,8 +9,6 @@ namespace standin
 {
 namespace
 {
-constexpr int UserTicketType = 17;
-
 User ReadUser(TicketXmlReader const& reader, pugi::xml_node node)
 {
     if (node.name() != std::string_view("user"))

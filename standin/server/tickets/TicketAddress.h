@@ -19,6 +19,9 @@ struct TicketAddress
 };
 
 inline constexpr TicketAddress SystemTicket{0, 0};
+inline constexpr int JobTicketType = 3;
+inline constexpr int QueueTicketType = 7;
+inline constexpr int UserTicketType = 17;
 inline constexpr int LargestId = 0xFFFFFF;
 
 // Can a ticket have it? The reserved ids are no tickets.

@@ -72,10 +72,13 @@ void MemorySite::FailOperation(int which)
     m_hasFailed = false;
 }
 
-void MemorySite::FailJournal(bool fail)
+void MemorySite::Fail(char const* operation, bool fail)
 {
     std::lock_guard const lock(m_mutex);
-    m_failJournal = fail;
+    if (fail)
+        m_failing.insert(operation);
+    else
+        m_failing.erase(operation);
 }
 
 void MemorySite::BreakJournal()
@@ -130,7 +133,7 @@ int MemorySite::Commits() const
 void MemorySite::MayFail(char const* operation)
 {
     bool const isDue = m_failIn > 0 && --m_failIn == 0;
-    if (!m_failAll && !isDue)
+    if (!m_failAll && !isDue && !m_failing.contains(operation))
         return;
     m_hasFailed = true;
     throw StoreError(std::string("the site in memory: ") + operation + " was told to fail; tell it not to");
@@ -347,10 +350,8 @@ MemoryStore::Load(TicketAddress address,
 bool MemoryStore::ChangesSince(Sequence after, std::function<void(CommittedChange&&)> const& take)
 {
     std::vector<CommittedChange> changes;
-    auto lock = Begin("ChangesSince");
     ++m_site->m_looks;
-    if (m_site->m_failJournal)
-        throw StoreError("the site in memory: its journal was told to fail; tell it not to");
+    auto lock = Begin("ChangesSince");
     if (after < m_site->m_pruned)
         return false;
     Sequence const end = std::min(m_site->m_committed.load(), after + m_site->m_limits.feedLargest);

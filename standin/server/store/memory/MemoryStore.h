@@ -4,11 +4,13 @@
 
 #include "standin/server/store/Store.h"
 #include "standin/server/store/StoreLimits.h"
+#include <atomic>
 #include <condition_variable>
 #include <deque>
 #include <map>
 #include <memory>
 #include <mutex>
+#include <set>
 #include <string>
 #include <utility>
 
@@ -28,7 +30,7 @@ public:
     // Faults. All of them hold for every handle.
     void FailAll(bool fail);                       // every operation throws StoreError
     void FailOperation(int which);                 // that operation from now on throws, 1 for the next; once
-    void FailJournal(bool fail);                   // reading it throws StoreError
+    void Fail(char const* operation, bool fail);   // that one throws StoreError, named as in Store
     void BreakJournal();                           // its newest record cannot be read any more
     void AnswerUnknownOnce(bool andCommit);        // the next Commit, which happens or does not
     bool HasFailed() const;                        // the fault that was ordered last has shown
@@ -98,8 +100,8 @@ private:
         AndCommitted,
     } m_unknown = Unknown::No;
     bool m_hasFailed = false;
-    bool m_failJournal = false;
-    int m_looks = 0;
+    std::set<std::string, std::less<>> m_failing;
+    std::atomic<int> m_looks = 0;
     std::function<void()> m_interjection;
     std::function<void()> m_interjectionBehind;
     int m_loads = 0;

@@ -77,9 +77,7 @@ private:
 
     void LookAtTickets()
     {
-        Sequence const last = static_cast<Sequence>(
-            m_database.Number("SELECT max(coalesce((SELECT max(sequence) FROM journal), 0), "
-                              "(SELECT value FROM site WHERE name = 'pruned'))"));
+        auto const last = static_cast<Sequence>(m_database.Number(schema::SelectLastSequence));
         ForEachRow("SELECT type, id, incarnation, revision, "
                    "owner = 0 OR EXISTS (SELECT 1 FROM program WHERE program.id = owner) FROM ticket",
                    [this, last](Database::Run const& row)
