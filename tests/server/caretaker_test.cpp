@@ -6,12 +6,14 @@
 #include "tests/server/Program.h"
 #include "tests/server/StoredValues.h"
 #include "tests/support/Files.h"
+#include <algorithm>
 #include <atomic>
 #include <gmock/gmock.h>
 #include <thread>
 
 using namespace standin;
 using testing::ElementsAre;
+using testing::HasSubstr;
 using testing::IsEmpty;
 namespace fs = std::filesystem;
 
@@ -314,6 +316,27 @@ TEST_F(LeftByTheDead, EverySingleFailureOnTheWay_IsMadeGoodByTheNextRound)
     testing::internal::GetCapturedStderr();
     EXPECT_GT(which, 4);
     EXPECT_FALSE(hasFailed);
+}
+
+TEST_F(LeftByTheDead, WhatCannotBeDeleted_IsToldOnce)
+{
+    int const id = Prepare();
+    living->server.Stop(std::chrono::minutes(1));
+    testing::internal::CaptureStderr();
+    dying->store.Die();
+    dying.reset();
+    testing::internal::GetCapturedStderr();
+    testing::internal::CaptureStderr();
+    site->Fail("Commit", true);
+    for (int round = 0; round < 5; ++round)
+        living->server.Tidy();
+    EXPECT_TRUE(living->Exists({JobTicketType, id}));
+    std::string const told = testing::internal::GetCapturedStderr();
+    EXPECT_EQ(std::count(told.begin(), told.end(), '\n'), 1) << told;
+    EXPECT_THAT(told, HasSubstr("Commit was told to fail"));
+    site->Fail("Commit", false);
+    living->server.Tidy();
+    EXPECT_FALSE(living->Exists({JobTicketType, id}));
 }
 
 TEST_F(LeftByTheDead, IsClearedUpWithoutAnybodysAsking)

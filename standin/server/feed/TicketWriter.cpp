@@ -19,16 +19,22 @@ void Refuse(std::span<TicketWrite> writes)
 
 // Calls attempt until it is done or has failed.
 template <typename Try>
+bool TicketWriter::UntilDoneOrThrow(Try const& attempt)
+{
+    for (;;)
+    {
+        Result const result = attempt();
+        if (result != Result::Again)
+            return result == Result::Done;
+    }
+}
+
+template <typename Try>
 bool TicketWriter::UntilDone(Try const& attempt)
 {
     try
     {
-        for (;;)
-        {
-            Result const result = attempt();
-            if (result != Result::Again)
-                return result == Result::Done;
-        }
+        return UntilDoneOrThrow(attempt);
     }
     catch (StoreError const& error)
     {
@@ -127,7 +133,12 @@ std::optional<TicketWriter::Ticket> TicketWriter::Create(Creation const& creatio
 
 bool TicketWriter::Delete(Ticket ticket)
 {
-    return UntilDone(
+    return UntilDone([&] { return DeleteOrThrow(ticket) ? Result::Done : Result::Failed; });
+}
+
+bool TicketWriter::DeleteOrThrow(Ticket ticket)
+{
+    return UntilDoneOrThrow(
         [&]
         {
             Sequence const plannedAt = m_feed.Heard();

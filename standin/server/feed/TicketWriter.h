@@ -61,6 +61,9 @@ public:
     // False for a ticket that is missing.
     bool Delete(Ticket ticket);
 
+    // The same for who tries again and again: what the store throws passes through.
+    bool DeleteOrThrow(Ticket ticket);
+
 private:
     enum class Result
     {
@@ -68,6 +71,8 @@ private:
         Again,
         Failed,
     };
+    template <typename Try>
+    bool UntilDoneOrThrow(Try const& attempt);
     template <typename Try>
     bool UntilDone(Try const& attempt);
     template <typename Plan>

@@ -89,10 +89,10 @@ void Caretaker::Clear(Estate const& estate)
         RemovePartFile(file);
     for (Estate::Ticket const& ticket : estate.tickets)
     {
-        bool const isGone = m_writer.Delete({ticket.address, ticket.incarnation}) ||
+        bool const isGone = m_writer.DeleteOrThrow({ticket.address, ticket.incarnation}) ||
                             m_tickets.IncarnationOf(ticket.address) != ticket.incarnation;
         if (!isGone)
-            throw StoreError("a job of a program that has died cannot be deleted; see the line before");
+            throw StoreError("a job of a program that has died cannot be deleted yet; see the line before");
     }
 }
 }  // namespace standin
