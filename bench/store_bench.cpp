@@ -4,7 +4,11 @@
 #include "bench/PlainSite.h"
 #include <atomic>
 #include <benchmark/benchmark.h>
+#include <chrono>
 #include <memory>
+#include <sys/syscall.h>
+#include <thread>
+#include <unistd.h>
 
 namespace
 {
@@ -116,15 +120,18 @@ void OpenAndLeave(benchmark::State& state)
 
 std::unique_ptr<SITE> flushedSite;
 std::atomic<std::uint64_t> flushedNumber{0};
+std::atomic<std::chrono::microseconds> flushTime{};
 
-// Every thread writes a ticket of its own, and every commit waits until it is on the disk.
+// Every thread writes a ticket of its own, and every commit waits until it is on the disk: the real one, or
+// one in memory that takes so many microseconds for a flush.
 void FlushedValue(benchmark::State& state)
 {
     if (state.thread_index() == 0)
     {
         SqliteOptions options;
         options.durability = Durability::Full;
-        flushedSite = std::make_unique<SITE>(Disk(), options);
+        flushedSite = std::make_unique<SITE>(state.range(0) == 0 ? Disk() : Memory(), options);
+        flushTime = std::chrono::microseconds(state.range(0));
         flushedNumber = 0;
     }
     TicketChange creation;
@@ -151,9 +158,21 @@ void FlushedValue(benchmark::State& state)
     }
     state.SetItemsProcessed(state.iterations());
     if (state.thread_index() == 0)
+    {
+        flushTime = {};
         flushedSite.reset();
+    }
 }
 }  // namespace
+
+// In the place of the system's: SQLite flushes its journal by this one.
+extern "C" int fdatasync(int file)
+{
+    auto const begin = std::chrono::steady_clock::now();
+    int const result = static_cast<int>(syscall(SYS_fdatasync, file));
+    std::this_thread::sleep_until(begin + flushTime.load());
+    return result;
+}
 
 BENCHMARK(OneValuePlain);
 BENCHMARK(OneValue);
@@ -161,6 +180,6 @@ BENCHMARK(NewTicketPlain);
 BENCHMARK(NewTicket);
 BENCHMARK(Load);
 BENCHMARK(OpenAndLeave)->Arg(1)->Arg(20000);
-BENCHMARK(FlushedValue)->Threads(1)->Threads(8)->UseRealTime();
+BENCHMARK(FlushedValue)->Arg(0)->Arg(1000)->Arg(4000)->Threads(1)->Threads(8)->UseRealTime();
 
 BENCHMARK_MAIN();
