@@ -5,9 +5,11 @@
 #include "comgui/session/TCommandRecord.h"
 #include "comgui/session/TJobIdentification.h"
 #include "standin/module/ModuleCodes.h"
+#include "tests/support/ChildProcess.h"
 #include "tests/support/Files.h"
 #include "tests/support/FullDisk.h"
 #include <cstring>
+#include <fcntl.h>
 #include <gmock/gmock.h>
 
 using namespace standin;
@@ -422,4 +424,110 @@ TEST_F(SendingJobs, Changes_ReachWhoHasSwitchedThemOn)
             "changed " + job + " Job/State@-1=0 Job/Identification/RemoteEndpoint@-1='127.0.0.1:50106'",
             "changed " + job + " Job/Identification/RemoteEndpoint@-1='127.0.0.1:50106' Job/State@-1=1"));
     admin.Logout();
+}
+
+// --- the site's own files
+
+namespace
+{
+// Whether this process has locks on both of a database's files, as another one sees it.
+bool HasLocks(fs::path const& database)
+{
+    ChildProcess other(
+        [&](ChildProcess::Report const& report)
+        {
+            for (char const* const suffix : {"", "-shm"})
+            {
+                int const file = open((database.string() + suffix).c_str(), O_RDWR | O_CLOEXEC);
+                struct flock lock = {};
+                lock.l_type = F_WRLCK;
+                lock.l_whence = SEEK_SET;  // the whole file
+                report(file >= 0 && fcntl(file, F_GETLK, &lock) == 0 && lock.l_type != F_UNLCK ? 1 : 0);
+            }
+        });
+    bool const hasFirst = other.Next() == 1;
+    return other.Next() == 1 && hasFirst;
+}
+}  // namespace
+
+class SitesOwnFiles : public TransferTest
+{
+protected:
+    // By their names, and by others that a client may give them.
+    std::vector<fs::path> Names() const
+    {
+        std::vector<fs::path> names;
+        for (char const* const name : {"site.db", "site.db-wal", "site.db-shm", "site.lock"})
+        {
+            names.push_back(Site() / name);
+            fs::path const link = folder.Path() / (std::string("link to ") + name);
+            fs::path const twin = folder.Path() / (std::string("twin of ") + name);
+            fs::create_symlink(Site() / name, link);
+            fs::create_hard_link(Site() / name, twin);
+            names.insert(names.end(), {link, twin});
+        }
+        return names;
+    }
+
+    void ExpectUntouched() const
+    {
+        EXPECT_TRUE(HasLocks(Site() / "site.db"));
+        int const value = 7;
+        EXPECT_TRUE(
+            admin.Access()->MSETPARAMETER(admin.Access()->Instance, 3, 1, "K", PARAM_INT, &value, -1));
+    }
+};
+
+TEST_F(SitesOwnFiles, HaveLocksThatAnyDescriptorTakesAlong)
+{
+    ExpectUntouched();
+    close(open((Site() / "site.db").c_str(), O_RDONLY | O_CLOEXEC));
+    EXPECT_FALSE(HasLocks(Site() / "site.db")) << "or the tests below show nothing";
+}
+
+TEST_F(SitesOwnFiles, AreNoSource)
+{
+    for (fs::path const& name : Names())
+    {
+        EXPECT_EQ(Put(name.string(), "$(TEMP)/stolen"), MODULE_PATH_REFUSED) << name;
+        EXPECT_THAT(stderrText, HasSubstr("belongs to the database"));
+        EXPECT_EQ(Send(name.string(), "job.pdf"), MODULE_PATH_REFUSED) << name;
+    }
+    ExpectUntouched();
+}
+
+TEST_F(SitesOwnFiles, AreNoTarget)
+{
+    fs::path const source = folder.Write("a", "content");
+    ASSERT_EQ(Put(source.string(), "$(TEMP)/a"), MODULE_DONE);
+    for (fs::path const& name : Names())
+    {
+        EXPECT_EQ(Get("$(TEMP)/a", name.string()), MODULE_PATH_REFUSED) << name;
+        EXPECT_THAT(stderrText, HasSubstr("belongs to the database"));
+    }
+    ExpectUntouched();
+}
+
+// The same from the server's side: an administrator may have made a link in a folder of a variable.
+TEST_F(SitesOwnFiles, AreNoFilesOfTheServersFolders)
+{
+    fs::path const source = folder.Write("a", "content");
+    ASSERT_EQ(Put(source.string(), "$(TEMP)/a"), MODULE_DONE);
+    fs::path const temp = Site() / "temp";
+    ASSERT_TRUE(fs::exists(temp / "a"));
+    fs::create_hard_link(Site() / "site.db", temp / "b");
+    EXPECT_EQ(Get("$(TEMP)/b", (folder.Path() / "c").string()), MODULE_PATH_REFUSED);
+    EXPECT_EQ(Put(source.string(), "$(TEMP)/b"), MODULE_PATH_REFUSED);
+    ExpectUntouched();
+}
+
+TEST_F(SitesOwnFiles, AreNoTickets)
+{
+    for (fs::path const& name : Names())
+    {
+        testing::internal::CaptureStderr();
+        EXPECT_FALSE(module->STicketFactory->CreateTicket(name.c_str())) << name;
+        EXPECT_THAT(testing::internal::GetCapturedStderr(), HasSubstr("belongs to the database"));
+    }
+    ExpectUntouched();
 }

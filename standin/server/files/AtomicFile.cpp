@@ -1,5 +1,6 @@
 #include "standin/server/files/AtomicFile.h"
 
+#include "standin/server/files/DatabaseFiles.h"
 #include "standin/server/files/Descriptor.h"
 #include <algorithm>
 #include <atomic>
@@ -105,7 +106,7 @@ void WriteAll(int descriptor, std::string_view content, std::filesystem::path co
 
 std::string ReadFile(std::filesystem::path const& file, std::size_t limit)
 {
-    Descriptor const descriptor(open(file.c_str(), O_RDONLY | O_CLOEXEC));
+    Descriptor const descriptor = OpenToRead(AT_FDCWD, file, O_RDONLY | O_CLOEXEC);
     if (descriptor.Number() < 0)
         throw FileError(FileFault(file, "cannot be read", errno));
     std::string content;
@@ -128,6 +129,9 @@ void ReplaceFile(std::filesystem::path const& file, std::string_view content)
     std::error_code noLink;
     std::filesystem::path const target = std::filesystem::canonical(file, noLink);
     std::filesystem::path const& name = noLink ? file : target;
+    struct stat old = {};
+    if (stat(name.c_str(), &old) == 0)
+        DatabaseFiles::Refuse(old, file.string());
     Temporary temporary(name);
     temporary.Write(content, name);
     temporary.TakeThePlaceOf(name);

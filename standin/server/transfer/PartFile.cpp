@@ -1,6 +1,7 @@
 #include "standin/server/transfer/PartFile.h"
 
 #include "standin/server/files/AtomicFile.h"
+#include "standin/server/files/DatabaseFiles.h"
 #include "standin/server/files/Report.h"
 #include "standin/server/transfer/TransferError.h"
 #include <algorithm>
@@ -44,6 +45,24 @@ std::string PathOf(int folder)
 
 // A terminal that is opened must not become the process's own, and a pipe not keep it waiting for a writer.
 constexpr int ToRead = O_RDONLY | O_NONBLOCK | O_NOCTTY | O_CLOEXEC;
+
+template <typename Work>
+auto RefusingDatabases(Work const& work)
+{
+    try
+    {
+        return work();
+    }
+    catch (FileError const& error)
+    {
+        throw TransferError(PathRefused, ForMessages(error.what()));
+    }
+}
+
+Descriptor Opened(int folder, std::string const& name, int flags)
+{
+    return RefusingDatabases([&] { return OpenToRead(folder, name, flags); });
+}
 }  // namespace
 
 bool IsPartFileName(std::string_view name) { return ProcessOf(name).has_value(); }
@@ -55,7 +74,7 @@ void RemovePartFile(std::filesystem::path const& file)
 }
 
 SourceFile::SourceFile(int folder, std::string const& name)
-    : m_file(openat(folder, name.c_str(), ToRead | O_NOFOLLOW))
+    : m_file(Opened(folder, name, ToRead | O_NOFOLLOW))
 {
     int const reason = errno;
     if (m_file.Number() < 0 && reason == ELOOP)
@@ -63,7 +82,7 @@ SourceFile::SourceFile(int folder, std::string const& name)
     Check(name, reason);
 }
 
-SourceFile::SourceFile(std::filesystem::path const& file) : m_file(open(file.c_str(), ToRead))
+SourceFile::SourceFile(std::filesystem::path const& file) : m_file(Opened(AT_FDCWD, file.string(), ToRead))
 {
     int const reason = errno;
     Check(file.string(), reason);
@@ -94,6 +113,8 @@ PartFile::PartFile(Store& store, int folder, std::string name)
         Fail(errno);
     if (isThere && S_ISLNK(old.st_mode))
         throw TransferError(PathRefused, Shown() + ": a symbolic link; name the file that it points at");
+    if (isThere)
+        RefusingDatabases([&] { DatabaseFiles::Refuse(old, m_name); });
     if (isThere && !S_ISREG(old.st_mode))
         throw TransferError(NotAFile, Shown() + ": something else than a file has that name; choose another");
     MakeFile();

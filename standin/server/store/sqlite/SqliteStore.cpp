@@ -23,6 +23,12 @@ std::string ProgramName()
 #endif
 }
 
+std::vector<std::filesystem::path> FilesOf(std::filesystem::path const& database)
+{
+    return {database, database.string() + "-wal", database.string() + "-shm",
+            database.parent_path() / "site.lock"};
+}
+
 std::string MachineName()
 {
     char name[256] = {};
@@ -34,7 +40,7 @@ std::string MachineName()
 
 SqliteStore::SqliteStore(std::filesystem::path const& folder, std::function<StoreContent()> const& first,
                          SqliteOptions options)
-    : m_folder(folder), m_file(folder / "site.db"), m_options(std::move(options))
+    : m_folder(folder), m_file(folder / "site.db"), m_options(std::move(options)), m_files(FilesOf(m_file))
 {
     Enter();
     m_flusher = std::make_unique<Flusher>(m_file, *m_page);

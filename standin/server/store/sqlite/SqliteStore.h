@@ -10,6 +10,7 @@
 // In a child process that was made by fork every operation throws StoreError.
 #pragma once
 
+#include "standin/server/files/DatabaseFiles.h"
 #include "standin/server/store/StoreContent.h"
 #include "standin/server/store/StoreLimits.h"
 #include "standin/server/store/sqlite/Database.h"
@@ -170,6 +171,7 @@ private:
     bool m_endedInOrder = false;
     ProgramId m_self = 0;
 
+    DatabaseFiles const m_files;  // outlives the connections
     std::unique_ptr<LockFile> m_lock;
     std::unique_ptr<SharedPage> m_page;
     std::int64_t m_inode = 0;  // of the database
