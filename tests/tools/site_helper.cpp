@@ -19,6 +19,7 @@
 #include <csignal>
 #include <cstdio>
 #include <cstdlib>
+#include <fstream>
 #include <iostream>
 #include <poll.h>
 #include <pty.h>
@@ -109,10 +110,11 @@ public:
         }
     }
 
-    // False if the program has ended before it asked.
+    // Until the program waits for keys, as a person would; the thread sanitizer loses a signal that comes
+    // before. False if it has ended before it asked.
     bool WaitForQuestion()
     {
-        while (HasEcho() || !m_shown.ends_with(": "))
+        while (HasEcho() || !m_shown.ends_with(": ") || !IsAsleep())
             if (!Read())
                 return false;
         return true;
@@ -144,6 +146,13 @@ private:
     {
         termios settings = {};
         return tcgetattr(m_terminal, &settings) == 0 && (settings.c_lflag & ECHO) != 0;
+    }
+
+    bool IsAsleep() const
+    {
+        std::ifstream status("/proc/" + std::to_string(m_program) + "/stat");
+        std::string number, name, state;
+        return status >> number >> name >> state && state == "S";
     }
 
     // False when the program has closed the terminal.

@@ -47,14 +47,13 @@ private:
     termios m_before{};
 };
 
-// Waits for input. Throws Interrupted. Not for ever at a time: the thread sanitizer may hand a signal on only
-// when the call is over.
+// Waits for input. Throws Interrupted.
 void WaitFor(int input)
 {
     pollfd waiting[] = {{input, POLLIN, 0}, {Interrupts::Descriptor(), POLLIN, 0}};
     for (;;)
     {
-        int const ready = poll(waiting, 2, 1000);
+        int const ready = poll(waiting, 2, -1);
         Interrupts::Check();
         if (ready > 0)
             return;
