@@ -1,6 +1,7 @@
 // What programs that died have left on a site, and what of it those that live take away.
 #include "standin/server/site/Caretaker.h"
 
+#include "standin/server/files/AtomicFile.h"
 #include "standin/server/jobs/JobFolder.h"
 #include "tests/server/MemoryFolder.h"
 #include "tests/server/Program.h"
@@ -155,17 +156,17 @@ TEST_F(LeftByTheDead, JobFolderElsewhere_IsNotTouched)
 TEST_F(LeftByTheDead, BeginningsOfFilesThatItHadNotedGo_WhereverTheyAre)
 {
     MemoryFolder client;
-    WriteFile(client / ".transfer.7-1.tmp", "half");
-    Make("temp/.transfer.7-2.tmp");
-    Make("temp/.transfer.7-3.tmp");
+    WriteFile(client / ".transfer.0000000000000001.tmp", "half");
+    Make("temp/.transfer.0000000000000002.tmp");
+    Make("temp/.transfer.0000000000000003.tmp");
     Make("temp/whole.pdf");
-    dying->store.AddPartFile((client / ".transfer.7-1.tmp").string());
-    dying->store.AddPartFile((folder / "temp/.transfer.7-2.tmp").string());
+    dying->store.AddPartFile((client / ".transfer.0000000000000001.tmp").string());
+    dying->store.AddPartFile((folder / "temp/.transfer.0000000000000002.tmp").string());
     dying->store.AddPartFile((folder / "temp/whole.pdf").string());  // no name of a beginning
-    living->store.AddPartFile((folder / "temp/.transfer.7-3.tmp").string());
+    living->store.AddPartFile((folder / "temp/.transfer.0000000000000003.tmp").string());
     Kill();
     EXPECT_THAT(NamesIn(client.Path()), IsEmpty());
-    EXPECT_THAT(NamesIn(folder / "temp"), ElementsAre(".transfer.7-3.tmp", "whole.pdf"));
+    EXPECT_THAT(NamesIn(folder / "temp"), ElementsAre(".transfer.0000000000000003.tmp", "whole.pdf"));
 }
 
 TEST_F(LeftByTheDead, ATransferThatIsCarriedOut_IsNotedWhileItLastsAndForgotten)
@@ -207,8 +208,8 @@ TEST_F(LeftByTheDead, GoesInTheSameRoundInWhichMaintenanceFails)
 {
     int const id = Prepare();
     Make("job/" + std::to_string(id) + "/" + MarkOf(id));
-    Make("temp/.transfer.7-1.tmp");
-    dying->store.AddPartFile((folder / "temp/.transfer.7-1.tmp").string());
+    Make("temp/.transfer.0000000000000001.tmp");
+    dying->store.AddPartFile((folder / "temp/.transfer.0000000000000001.tmp").string());
     living->server.Stop(std::chrono::minutes(1));
     testing::internal::CaptureStderr();
     dying->store.Die();
@@ -256,29 +257,6 @@ TEST_F(LeftByTheDead, TransferThatGoesOnWhileItsProgramLeavesInOrder_GoesWithIt)
     testing::internal::GetCapturedStderr();
 }
 
-// Its process had the number that another one has now.
-TEST_F(LeftByTheDead, BeginningWhoseNameALivingProgramWouldTake_StaysNoted)
-{
-    EXPECT_TRUE(living->Set(SystemTicket, "System/Folders/Temp", (folder / "temp").string()));
-    Make("a");
-    std::vector<std::string> during;
-    auto& transfers = living->server.Transfers();
-    transfers.Set({4000, [&] { during.push_back(NamesIn(folder / "temp").at(0)); }});
-    TransferService::Request const request{TransferService::Request::ToServer, folder / "a", "$(TEMP)/a"};
-    EXPECT_EQ(transfers.Carry(living->session, request), Transferred);
-    fs::remove(folder / "temp/a");
-    ASSERT_FALSE(during.empty());
-    std::size_t const dash = during[0].find('-');
-    std::string const next =
-        during[0].substr(0, dash + 1) + std::to_string(std::stoi(during[0].substr(dash + 1)) + 1) + ".tmp";
-    dying->store.AddPartFile((folder / "temp" / next).string());
-    EXPECT_EQ(transfers.Carry(living->session, request), Transferred);
-    EXPECT_NE(during.back(), next);
-    Make("temp/" + next);
-    Kill();
-    EXPECT_THAT(NamesIn(folder / "temp"), ElementsAre("a"));
-}
-
 TEST_F(LeftByTheDead, CopyOfTheSystemTicket_IsWrittenAnew)
 {
     EXPECT_TRUE(dying->Set(SystemTicket, "TheKey", 1));
@@ -296,7 +274,7 @@ TEST_F(LeftByTheDead, EverySingleFailureOnTheWay_IsMadeGoodByTheNextRound)
     while (hasFailed && which < 100)
     {
         int const id = Prepare();
-        std::string const part = ".transfer.7-" + std::to_string(which) + ".tmp";
+        std::string const part = ".transfer." + RandomName() + ".tmp";
         Make("temp/" + part);
         Make("job/" + std::to_string(id) + "/" + MarkOf(id));
         dying->store.AddPartFile((folder / "temp" / part).string());

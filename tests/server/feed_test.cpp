@@ -887,7 +887,7 @@ TEST_F(PrunedJournal, OfATicketThatNobodyHasRead_OnlyItsBeingIsNoted)
 
 TEST_F(TwoPrograms, PreparedJobsAndPartFilesOfADeadProgram_GoWithItsBurial)
 {
-    std::filesystem::path const part = folder / ".transfer.1-1.tmp";
+    std::filesystem::path const part = folder / ".transfer.0123456789abcdef.tmp";
     std::ofstream(part) << "half";
     auto dead = std::make_unique<Program>(site, folder.Path());
     int id = 0;

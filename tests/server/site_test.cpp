@@ -285,7 +285,7 @@ TEST_F(SiteFolder, SystemTicketFile_IsWrittenAtEveryStartAndAfterEveryChange)
 TEST_F(SiteFolder, WhatKilledProcessesLeftOfItsFiles_GoesAtTheNextStart)
 {
     MakeSite();
-    std::string const suffix = "." + NumberOfADeadProcess() + "-3.tmp";
+    std::string const suffix = ".0123456789abcdef.tmp";
     for (char const* const name : {"seed.xml", "tickets/SYS_0000.xml", "tickets/own.xml"})
         WriteFile(File(name + suffix), "half");
     MakeSite();

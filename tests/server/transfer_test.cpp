@@ -9,6 +9,7 @@
 #include <fstream>
 #include <gmock/gmock.h>
 #include <random>
+#include <set>
 #include <sys/fsuid.h>
 #include <sys/stat.h>
 #include <thread>
@@ -95,7 +96,7 @@ INSTANTIATE_TEST_SUITE_P(
         PATH_FACT{"ZeroByte", std::string("$(TEMP)/a\0b", 11), ""}, PATH_FACT{"Delete", "$(TEMP)/a\x7F", ""},
         PATH_FACT{"Name256", "$(TEMP)/" + std::string(256, 'n'), ""},
         PATH_FACT{"Folder300", "$(TEMP)/" + std::string(300, 'n') + "/a", ""},
-        PATH_FACT{"NameOfAPartFile", "$(TEMP)/.transfer.12-3.tmp", ""}),
+        PATH_FACT{"NameOfAPartFile", "$(TEMP)/.transfer.0123456789abcdef.tmp", ""}),
     [](auto const& fact) { return std::string(fact.param.name); });
 
 // A server over a store in memory, with its folders in a folder of the test's own.
@@ -332,20 +333,25 @@ TEST_F(PutFile, OntoItself_ChangesNothing)
     EXPECT_THAT(NamesIn(Temp()), ElementsAre("a"));
 }
 
-// Processes on two machines, or in two containers, may have one number and one folder.
-TEST_F(PutFile, PartFileOfAProcessOfTheSameNumber_IsNotTouched)
+TEST_F(PutFile, WhileItComes_HasANameThatNobodyCanForesee_AndIsPrivateIfItsTargetIs)
 {
     std::string const file = Write("a", "content");
-    std::string part;
-    Server().Transfers().Set({4096, [&] { part = NamesIn(Temp())[0]; }});
-    ASSERT_EQ(Put(file, "$(TEMP)/a"), Transferred);
-    ASSERT_TRUE(IsPartFileName(part)) << part;
-    auto const dash = part.find('-');
-    std::string const next = std::to_string(std::stoi(part.substr(dash + 1)) + 1) + ".tmp";
-    WriteFile(Temp(part.substr(0, dash + 1) + next), "half of another file");
-    EXPECT_EQ(Put(file, "$(TEMP)/b"), Transferred);
-    EXPECT_EQ(ContentOf(Temp(part.substr(0, dash + 1) + next)), "half of another file");
-    EXPECT_EQ(ContentOf(Temp("b")), "content");
+    WriteFile(Temp("private"), "old");
+    fs::permissions(Temp("private"), fs::perms::owner_read | fs::perms::owner_write);
+    std::set<std::string> parts;
+    Server().Transfers().Set({4096, [&]
+                              {
+                                  for (std::string const& name : NamesIn(Temp()))
+                                      if (IsPartFileName(name))
+                                      {
+                                          parts.insert(name);
+                                          EXPECT_EQ(fs::status(Temp(name)).permissions(),
+                                                    fs::status(Temp("private")).permissions());
+                                      }
+                              }});
+    ASSERT_EQ(Put(file, "$(TEMP)/private"), Transferred);
+    ASSERT_EQ(Put(file, "$(TEMP)/private"), Transferred);
+    EXPECT_EQ(parts.size(), 2u);
 }
 
 TEST_F(PutFile, ManyToOneTarget_AreWholeAtAnyInstant)

@@ -7,6 +7,7 @@
 #include "tests/support/ChildProcess.h"
 #include "tests/support/Files.h"
 #include "tests/support/sanitizers.h"
+#include <atomic>
 #include <bit>
 #include <csignal>
 #include <cstdint>
@@ -18,6 +19,7 @@
 #include <random>
 #include <sys/resource.h>
 #include <sys/stat.h>
+#include <thread>
 #include <unistd.h>
 #include <utility>
 
@@ -513,6 +515,48 @@ TEST(ReplaceFile, KeepsThePermissions)
     EXPECT_EQ(found.st_mode & 07777, 0640u);
 }
 
+// Not even while it is written.
+TEST(ReplaceFile, OfAPrivateFile_ShowsItToNobody)
+{
+    MemoryFolder folder;
+    WriteFile(folder / "file", "old");
+    std::filesystem::permissions(folder / "file", std::filesystem::perms::owner_all);
+    std::atomic<bool> isOver{false};
+    std::atomic<int> seen{0};
+    std::atomic<int> open{0};
+    std::jthread looker(
+        [&]
+        {
+            while (!isOver)
+                for (std::string const& name : NamesIn(folder.Path()))
+                {
+                    struct stat found = {};
+                    if (name == "file" || stat((folder / name).c_str(), &found) != 0)
+                        continue;
+                    ++seen;
+                    open += (found.st_mode & 077) != 0 ? 1 : 0;
+                }
+        });
+    for (int round = 0; round < 10'000 && seen < 20; ++round)
+        ReplaceFile(folder / "file", std::string(1'000'000, 'x'));
+    isOver = true;
+    looker.join();
+    EXPECT_GT(seen, 0);
+    EXPECT_EQ(open, 0);
+}
+
+TEST(ReplaceFile, IsNotLedAwayByALinkOfAnOldName)
+{
+    MemoryFolder folder;
+    WriteFile(folder / "victim", "victim");
+    for (int number = 0; number < 20; ++number)
+        std::filesystem::create_symlink(folder / "victim", folder / ("file." + std::to_string(getpid()) +
+                                                                     "-" + std::to_string(number) + ".tmp"));
+    ReplaceFile(folder / "file", "new");
+    EXPECT_EQ(ContentOf(folder / "victim"), "victim");
+    EXPECT_EQ(ContentOf(folder / "file"), "new");
+}
+
 TEST(ReplaceFile, ThroughALink_ReplacesWhatItPointsAt)
 {
     MemoryFolder folder;
@@ -600,33 +644,58 @@ TEST(ReplaceFile, KilledAtAnyInstant_HasTheOldContentOrTheNew)
 TEST(RemoveLeftovers, OfProcessesThatAreGone_GoAndNothingElseDoes)
 {
     MemoryFolder folder;
-    std::string const gone = NumberOfADeadProcess();
-    std::string const own = std::to_string(getpid());
     std::vector<std::string> kept = {"file",
-                                     "file." + own + "-0.tmp",
-                                     "file." + std::to_string(getppid()) + "-0.tmp",
-                                     "file." + gone + ".tmp",
-                                     "file." + gone + "-.tmp",
-                                     "file." + gone + "-0.tmp.old",
-                                     "file.0-0.tmp",
-                                     "file.99999999999-0.tmp",
-                                     "file.xml." + gone + "-0.tmp",
                                      "file.tmp",
-                                     "other." + gone + "-0.tmp"};
+                                     "file.0123456789abcde.tmp",
+                                     "file.0123456789abcdef0.tmp",
+                                     "file.0123456789abcdeF.tmp",
+                                     "file.0123456789abcdef.tmp.old",
+                                     "file-0123456789abcdef.tmp",
+                                     "file.xml.0123456789abcdef.tmp",
+                                     "other.0123456789abcdef.tmp"};
     for (std::string const& name : kept)
         WriteFile(folder / name, "kept");
-    WriteFile(folder / ("file." + gone + "-0.tmp"), "half");
-    WriteFile(folder / ("file." + gone + "-12.tmp"), "half");
+    std::filesystem::create_directory(folder / "file.000000000000000f.tmp");
+    std::filesystem::create_symlink(folder / "file", folder / "file.000000000000001f.tmp");
+    kept.insert(kept.end(), {"file.000000000000000f.tmp", "file.000000000000001f.tmp"});
+    WriteFile(folder / "file.0123456789abcdef.tmp", "half");
+    WriteFile(folder / "file.fedcba9876543210.tmp", "half");
     RemoveLeftovers(folder / "file");
     EXPECT_THAT(NamesIn(folder.Path()), UnorderedElementsAreArray(kept));
 }
 
-TEST(RemoveLeftovers, AFolderOfSuchAName_Stays)
+// Whether a process lives is told by its lock, which is good on another machine and in another container.
+TEST(RemoveLeftovers, WhileFilesAreReplaced_DisturbNobody)
 {
     MemoryFolder folder;
-    std::string const name = "file." + NumberOfADeadProcess() + "-0.tmp";
-    std::filesystem::create_directory(folder / name);
-    RemoveLeftovers(folder / "file");
+    std::atomic<bool> isOver{false};
+    std::jthread const cleaner(
+        [&]
+        {
+            while (!isOver)
+                RemoveLeftovers(folder / "file");
+        });
+    std::vector<std::jthread> writers;
+    for (char const letter : {'a', 'b'})
+        writers.emplace_back(
+            [&folder, letter]
+            {
+                for (int round = 0; round < 300; ++round)
+                    EXPECT_NO_THROW(ReplaceFile(folder / "file", std::string(1000, letter)));
+            });
+    writers.clear();
+    isOver = true;
+    EXPECT_THAT(NamesIn(folder.Path()), ElementsAre("file"));
+}
+
+TEST(RemoveLeftovers, OfALongName_GoToo)
+{
+    MemoryFolder folder;
+    std::string const name(255, 'n');
+    ReplaceFile(folder / name, "content");
+    EXPECT_EQ(ContentOf(folder / name), "content");
+    WriteFile(folder / (name.substr(0, 255 - 21) + ".0123456789abcdef.tmp"), "half");
+    RemoveLeftovers(folder / name);
     EXPECT_THAT(NamesIn(folder.Path()), ElementsAre(name));
 }
 

@@ -70,11 +70,3 @@ std::int64_t ChildProcess::Last(std::int64_t otherwise)
         otherwise = *number;
     return otherwise;
 }
-
-std::string NumberOfADeadProcess()
-{
-    ChildProcess child([](ChildProcess::Report const&) {});
-    std::string const number = std::to_string(child.Id());
-    child.Wait();
-    return number;
-}

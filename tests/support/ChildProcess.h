@@ -5,7 +5,6 @@
 #include <cstdint>
 #include <functional>
 #include <optional>
-#include <string>
 #include <sys/types.h>
 
 class ChildProcess
@@ -30,6 +29,3 @@ private:
     pid_t m_id = -1;
     int m_reports = -1;
 };
-
-// As text, for the names of files that such a process may have left behind.
-std::string NumberOfADeadProcess();

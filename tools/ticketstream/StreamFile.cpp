@@ -1,5 +1,6 @@
 #include "tools/ticketstream/StreamFile.h"
 
+#include "standin/server/files/AtomicFile.h"
 #include "tools/shared/Output.h"
 #include "tools/ticketstream/Trouble.h"
 #include "tools/ticketstream/text.h"
@@ -7,7 +8,6 @@
 #include <cerrno>
 #include <csignal>
 #include <cstring>
-#include <filesystem>
 #include <memory>
 #include <sys/stat.h>
 #include <unistd.h>
@@ -59,28 +59,19 @@ private:
     sigset_t m_before;
 };
 
-// status: of the file that is there, or null.
-void Replace(std::string const& name, std::string_view bytes, struct stat const* status)
+// It has to be one that may be written to, although its folder would do.
+void Replace(std::string const& name, std::string_view bytes)
 {
-    std::error_code error;
-    std::string const target =
-        status ? std::filesystem::canonical(name, error).string() : name;  // links stay
-    if (error || (status && access(target.c_str(), W_OK) != 0))
+    if (access(name.c_str(), W_OK) != 0 && errno != ENOENT)
         TellFailure(name, "written", "check the folder and the permissions");
-    std::string const part =
-        std::filesystem::path(target).replace_filename(".ticketstream." + std::to_string(getpid()) + ".tmp");
     HeldSignals const held;
     try
     {
-        Overwrite(part, name, bytes);
-        if ((status && chmod(part.c_str(), status->st_mode & 07777) != 0) ||
-            std::rename(part.c_str(), target.c_str()) != 0)
-            TellFailure(name, "written", "check the folder and the permissions");
+        standin::ReplaceFile(name, bytes);
     }
-    catch (Trouble const&)
+    catch (standin::FileError const& error)
     {
-        std::remove(part.c_str());
-        throw;
+        throw Trouble(ShownName(error.what()));
     }
 }
 
@@ -126,6 +117,6 @@ void WriteFile(std::string const& name, std::string_view bytes)
     bool const isThere = stat(name.c_str(), &status) == 0;
     bool const isNew = !isThere && lstat(name.c_str(), &status) != 0 && !name.empty() && name.back() != '/';
     bool const isReplaced = isNew || (isThere && S_ISREG(status.st_mode));
-    isReplaced ? Replace(name, bytes, isThere ? &status : nullptr) : Overwrite(name, name, bytes);
+    isReplaced ? Replace(name, bytes) : Overwrite(name, name, bytes);
 }
 }  // namespace ticketstream

@@ -3,11 +3,12 @@
 #include "standin/server/files/DatabaseFiles.h"
 #include "standin/server/files/Descriptor.h"
 #include <algorithm>
-#include <atomic>
 #include <cerrno>
-#include <csignal>
 #include <cstdio>
+#include <cstring>
 #include <fcntl.h>
+#include <random>
+#include <sys/file.h>
 #include <sys/stat.h>
 #include <system_error>
 #include <unistd.h>
@@ -16,17 +17,33 @@ namespace standin
 {
 namespace
 {
-// The new file until it has taken the old one's place.
+constexpr std::size_t RandomSize = 16;
+constexpr std::string_view Tail = ".tmp";
+constexpr std::size_t LongestName = 255;
+
+// As much of a file's name as leaves room for what comes behind it.
+std::string BeginningFor(std::filesystem::path const& file)
+{
+    std::string const name = file.filename().string();
+    return name.substr(0, LongestName - std::strlen(".") - RandomSize - Tail.size());
+}
+
+bool Lock(int file) { return flock(file, LOCK_EX | LOCK_NB) == 0; }
+
+// The new file until it has taken the old one's place. It is locked as long as it is somebody's.
 class Temporary
 {
 public:
-    explicit Temporary(std::filesystem::path const& file)
-        : m_path(NameFor(file)),
-          m_descriptor(open(m_path.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_CLOEXEC, 0666))
+    // shown: its name for messages. old: the file that is there, or null; nobody who may not read that may
+    // read this.
+    Temporary(std::filesystem::path const& file, std::filesystem::path const& shown, struct stat const* old)
+        : m_shown(shown)
     {
-        if (m_descriptor.Number() < 0)
-            throw FileError(FileFault(file, "cannot be written", errno));
-        TakePermissionsOf(file);
+        while (!Make(file, old ? 0600 : 0666))
+        {
+        }
+        if (old)
+            fchmod(m_descriptor.Number(), old->st_mode & 07777);
     }
     ~Temporary()
     {
@@ -36,37 +53,42 @@ public:
     Temporary(Temporary const&) = delete;
     Temporary& operator=(Temporary const&) = delete;
 
-    void Write(std::string_view content, std::filesystem::path const& file)
+    void Write(std::string_view content)
     {
-        WriteAll(m_descriptor.Number(), content, file);
+        WriteAll(m_descriptor.Number(), content, m_shown);
         if (fsync(m_descriptor.Number()) != 0)
-            throw FileError(FileFault(file, "cannot be flushed to the disk", errno));
+            throw FileError(FileFault(m_shown, "cannot be flushed to the disk", errno));
     }
 
     void TakeThePlaceOf(std::filesystem::path const& file)
     {
         if (rename(m_path.c_str(), file.c_str()) != 0)
-            throw FileError(FileFault(file, "cannot be replaced", errno));
+            throw FileError(FileFault(m_shown, "cannot be replaced", errno));
         m_path.clear();
     }
 
 private:
-    static std::filesystem::path NameFor(std::filesystem::path const& file)
+    // False if the name is taken, or if somebody took the file for a leftover before it was locked.
+    bool Make(std::filesystem::path const& file, mode_t mode)
     {
-        static std::atomic<unsigned> counter{0};
-        std::filesystem::path name = file;
-        name += "." + std::to_string(getpid()) + "-" + std::to_string(counter++) + ".tmp";
-        unlink(name.c_str());  // left by a process of the same number that was killed
-        return name;
+        std::filesystem::path const path =
+            file.parent_path() / (BeginningFor(file) + "." + RandomName() + std::string(Tail));
+        m_descriptor =
+            Descriptor(open(path.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_NOFOLLOW | O_CLOEXEC, mode));
+        if (m_descriptor.Number() < 0 && errno != EEXIST)
+            throw FileError(FileFault(m_shown, "cannot be written", errno));
+        struct stat made = {};
+        bool const isOurs =
+            m_descriptor.Number() >= 0 &&
+            (Lock(m_descriptor.Number()) || errno != EWOULDBLOCK) &&  // some file systems have no locks
+            fstat(m_descriptor.Number(), &made) == 0 && made.st_nlink > 0;
+        if (!isOurs)
+            return false;
+        m_path = path;
+        return true;
     }
 
-    void TakePermissionsOf(std::filesystem::path const& file) const
-    {
-        struct stat old = {};
-        if (stat(file.c_str(), &old) == 0)
-            fchmod(m_descriptor.Number(), old.st_mode & 07777);
-    }
-
+    std::filesystem::path const& m_shown;
     std::filesystem::path m_path;
     Descriptor m_descriptor;
 };
@@ -130,43 +152,47 @@ void ReplaceFile(std::filesystem::path const& file, std::string_view content)
     std::filesystem::path const target = std::filesystem::canonical(file, noLink);
     std::filesystem::path const& name = noLink ? file : target;
     struct stat old = {};
-    if (stat(name.c_str(), &old) == 0)
+    bool const isThere = stat(name.c_str(), &old) == 0;
+    if (isThere)
         DatabaseFiles::Refuse(old, file.string());
-    Temporary temporary(name);
-    temporary.Write(content, name);
+    Temporary temporary(name, file, isThere ? &old : nullptr);
+    temporary.Write(content);
     temporary.TakeThePlaceOf(name);
     FlushFolder(FolderOf(name));
 }
 
-std::optional<pid_t> ProcessOfTemporary(std::string_view ending)
+std::string RandomName()
 {
-    auto const areDigits = [](std::string_view text)
-    { return !text.empty() && text.find_first_not_of("0123456789") == text.npos; };
-    constexpr std::string_view Tail = ".tmp";
-    if (!ending.starts_with('.') || !ending.ends_with(Tail))
-        return std::nullopt;
-    ending.remove_prefix(1);
-    ending.remove_suffix(std::min(Tail.size(), ending.size()));
-    auto const dash = ending.find('-');
-    if (dash > 9 || !areDigits(ending.substr(0, dash)) || !areDigits(ending.substr(dash + 1)))
-        return std::nullopt;
-    return std::stoi(std::string(ending.substr(0, dash)));
+    std::random_device random;
+    std::string name;
+    while (name.size() < RandomSize)
+        name += "0123456789abcdef"[random() % 16];
+    return name;
 }
 
-bool IsAlive(pid_t process) { return process <= 0 || kill(process, 0) == 0 || errno != ESRCH; }
+bool IsTemporary(std::string_view name, std::string_view beginning)
+{
+    bool const isFramed = name.size() == beginning.size() + 1 + RandomSize + Tail.size() &&
+                          name.starts_with(beginning) && name[beginning.size()] == '.' &&
+                          name.ends_with(Tail);
+    return isFramed &&
+           name.substr(beginning.size() + 1, RandomSize).find_first_not_of("0123456789abcdef") == name.npos;
+}
 
 void RemoveLeftovers(std::filesystem::path const& file)
 {
-    std::string const name = file.filename().string();
+    std::string const beginning = BeginningFor(file);
     std::error_code error;
     std::filesystem::directory_iterator entry(FolderOf(file), error);
     for (; !error && entry != std::filesystem::directory_iterator(); entry.increment(error))
     {
-        std::string const found = entry->path().filename().string();
-        if (!found.starts_with(name))
+        if (!IsTemporary(entry->path().filename().string(), beginning))
             continue;
-        auto const process = ProcessOfTemporary(std::string_view(found).substr(name.size()));
-        if (process && !IsAlive(*process))
+        Descriptor const found(
+            open(entry->path().c_str(), O_RDONLY | O_NOFOLLOW | O_NONBLOCK | O_NOCTTY | O_CLOEXEC));
+        struct stat what = {};
+        bool const isFile = found.Number() >= 0 && fstat(found.Number(), &what) == 0 && S_ISREG(what.st_mode);
+        if (isFile && Lock(found.Number()))
             unlink(entry->path().c_str());
     }
 }

@@ -6,10 +6,8 @@
 #include "standin/server/files/FileError.h"
 #include <cstddef>
 #include <filesystem>
-#include <optional>
 #include <string>
 #include <string_view>
-#include <sys/types.h>
 
 namespace standin
 {
@@ -32,16 +30,18 @@ void WriteAll(int descriptor, std::string_view content, std::filesystem::path co
 
 // Writes a new file beside the old one, flushes it to the disk and puts it in the old one's place, whose
 // permissions it takes over. A link stays, and what it points at is replaced. On failure the old content is
-// there as it was and nothing else is left. A process killed in between leaves NAME.PID-N.tmp behind.
+// there as it was and nothing else is left. A process killed in between leaves NAME.RANDOM.tmp behind, where
+// RANDOM is a RandomName and a NAME that would be too long is cut.
 void ReplaceFile(std::filesystem::path const& file, std::string_view content);
 
-// The process that a temporary name tells of, by what stands in it behind its beginning: ".PID-N.tmp".
-// Nothing for another text.
-std::optional<pid_t> ProcessOfTemporary(std::string_view ending);
+// Sixteen digits of a hexadecimal number that nobody can foresee, so that none comes twice and nobody lays a
+// link in the way of a file that is about to be made.
+std::string RandomName();
 
-bool IsAlive(pid_t process);
+// Whether that is BEGINNING.RANDOM.tmp.
+bool IsTemporary(std::string_view name, std::string_view beginning);
 
-// Removes what killed processes have left behind beside the file. What belongs to a process that lives, this
-// one included, stays, and so does what cannot be removed.
+// Removes what ReplaceFile has left beside the file in processes that were killed. What belongs to a process
+// that lives, on whatever machine or in whatever container, stays, and so does what cannot be removed.
 void RemoveLeftovers(std::filesystem::path const& file);
 }  // namespace standin

@@ -9,7 +9,6 @@
 #include <chrono>
 #include <cstdio>
 #include <fcntl.h>
-#include <random>
 #include <sys/stat.h>
 #include <thread>
 
@@ -222,14 +221,7 @@ bool Mark(Descriptor const& folder, std::string_view mark)
 }
 }  // namespace
 
-std::string NewJobMark()
-{
-    std::random_device random;
-    std::string mark;
-    while (mark.size() < MarkSize)
-        mark += "0123456789abcdef"[random() % 16];
-    return mark;
-}
+std::string NewJobMark() { return RandomName(); }
 
 Descriptor MakeJobFolder(FolderTable const& table, int id, std::string_view mark)
 {

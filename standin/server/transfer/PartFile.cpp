@@ -5,7 +5,6 @@
 #include "standin/server/files/Report.h"
 #include "standin/server/transfer/TransferError.h"
 #include <algorithm>
-#include <atomic>
 #include <cerrno>
 #include <climits>
 #include <fcntl.h>
@@ -17,19 +16,7 @@ namespace
 {
 constexpr std::string_view PartNameBeginning = ".transfer";
 
-// The process that made the part file of that name; nothing for other names.
-std::optional<pid_t> ProcessOf(std::string_view name)
-{
-    return name.starts_with(PartNameBeginning) ? ProcessOfTemporary(name.substr(PartNameBeginning.size()))
-                                               : std::nullopt;
-}
-
-std::string NewPartName()
-{
-    static std::atomic<unsigned> counter{0};
-    return std::string(PartNameBeginning) + "." + std::to_string(getpid()) + "-" + std::to_string(counter++) +
-           ".tmp";
-}
+std::string NewPartName() { return std::string(PartNameBeginning) + "." + RandomName() + ".tmp"; }
 
 // The absolute path of an open folder.
 std::string PathOf(int folder)
@@ -65,7 +52,7 @@ Descriptor Opened(int folder, std::string const& name, int flags)
 }
 }  // namespace
 
-bool IsPartFileName(std::string_view name) { return ProcessOf(name).has_value(); }
+bool IsPartFileName(std::string_view name) { return IsTemporary(name, PartNameBeginning); }
 
 void RemovePartFile(std::filesystem::path const& file)
 {
@@ -117,15 +104,13 @@ PartFile::PartFile(Store& store, int folder, std::string name)
         RefusingDatabases([&] { DatabaseFiles::Refuse(old, m_name); });
     if (isThere && !S_ISREG(old.st_mode))
         throw TransferError(NotAFile, Shown() + ": something else than a file has that name; choose another");
-    MakeFile();
+    MakeFile(isThere ? 0600 : 0666);
     if (isThere)
         fchmod(m_file.Number(), old.st_mode & 07777);
 }
 
-// A name that is noted by a program that has died is for others to clear. One that is taken stays: another
-// machine or container that shares the folder may have a process of the same number, and what that is writing
-// must not come under our file's name.
-void PartFile::MakeFile()
+// One that is taken stays, whoever's it is.
+void PartFile::MakeFile(mode_t mode)
 {
     for (;;)
     {
@@ -133,7 +118,8 @@ void PartFile::MakeFile()
         m_partPath = PathOf(m_folder) + "/" + name;
         if (!m_store.AddPartFile(m_partPath))
             continue;
-        m_file = Descriptor(openat(m_folder, name.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_CLOEXEC, 0666));
+        m_file = Descriptor(
+            openat(m_folder, name.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_NOFOLLOW | O_CLOEXEC, mode));
         int const reason = errno;
         if (m_file.Number() >= 0)
         {

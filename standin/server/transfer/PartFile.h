@@ -68,7 +68,7 @@ private:
     [[noreturn]] void FailAsCut() const;
     std::string Shown() const { return ForMessages(m_name); }
 
-    void MakeFile();
+    void MakeFile(mode_t mode);  // of a new file
     void Forget() noexcept;
 
     Store& m_store;
