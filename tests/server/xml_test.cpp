@@ -377,8 +377,25 @@ INSTANTIATE_TEST_SUITE_P(
         BadText{"ZeroByteInAString", "<parameter key='K' type='string' encoding='base64'>AEE=</parameter>",
                 "2: a zero byte in a string; type binary may hold it"},
         BadText{"ReferenceToZero", "<parameter key='K' type='string'>a&#x00;b</parameter>",
-                "2: the character zero cannot stand in a value"}),
+                "2: no number of a character that XML allows; such a value is written as base64"}),
     [](auto const& fact) { return std::string(fact.param.name); });
+
+TEST(TicketXmlParse, ReferenceToWhatIsNoCharacter_IsRefused)
+{
+    auto const reason = [](std::string const& reference)
+    {
+        return ReasonOf("<ticket version='1'><parameter key='K' type='string'>a" + reference +
+                        "b</parameter></ticket>");
+    };
+    for (char const* const wrong :
+         {"&#0;", "&#00;", "&#x0;", "&#1;", "&#x1F;", "&#xD800;", "&#xDFFF;", "&#xFFFE;", "&#xFFFF;",
+          "&#x110000;", "&#4294967296;", "&#x100000000;", "&#4294967361;", "&#18446744073709551616;",
+          "&#99999999999999999999999999;"})
+        EXPECT_THAT(reason(wrong), HasSubstr("no number of a character")) << wrong;
+    for (char const* const right : {"&#9;", "&#10;", "&#13;", "&#32;", "&#x41;", "&#xD7FF;", "&#xE000;",
+                                    "&#xFFFD;", "&#x10000;", "&#x10FFFF;"})
+        EXPECT_EQ(reason(right), "accepted") << right;
+}
 
 TEST(TicketXmlParse, EveryPrefix_IsRefused)
 {

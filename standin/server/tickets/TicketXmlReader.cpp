@@ -43,16 +43,27 @@ bool IsText(pugi::xml_node node)
     return node.type() == pugi::node_pcdata || node.type() == pugi::node_cdata;
 }
 
-// Where the text names the character zero, which would end a string of the parser unseen.
-std::size_t FirstZeroReference(std::string_view text)
+bool IsXmlCharacter(unsigned long code)
+{
+    return code == '\t' || code == '\n' || code == '\r' || (code >= 0x20 && code < 0xD800) ||
+           (code >= 0xE000 && code < 0xFFFE) || (code >= 0x10000 && code <= 0x10FFFF);
+}
+
+// Where the text names by its number what is no character. The parser would take the number modulo 2^32, and
+// a zero would end a string unseen.
+std::size_t FirstWrongReference(std::string_view text)
 {
     for (std::size_t at = text.find("&#"); at != std::string_view::npos; at = text.find("&#", at + 1))
     {
-        std::size_t end = at + 2;
-        end += end < text.size() && text[end] == 'x' ? 1 : 0;
-        std::size_t const digits = end;
-        end = std::min(text.find_first_not_of('0', end), text.size());
-        if (end > digits && end < text.size() && text[end] == ';')
+        std::string_view digits = text.substr(at + 2);
+        bool const isHex = digits.starts_with('x');
+        digits.remove_prefix(isHex ? 1 : 0);
+        unsigned long code = 0;
+        auto const [end, error] =
+            std::from_chars(digits.data(), digits.data() + digits.size(), code, isHex ? 16 : 10);
+        bool const isReference =
+            error != std::errc::invalid_argument && end != digits.data() + digits.size() && *end == ';';
+        if (isReference && (error != std::errc() || !IsXmlCharacter(code)))
             return at;
     }
     return std::string_view::npos;
@@ -126,8 +137,8 @@ TicketXmlReader::TicketXmlReader(std::string_view text, std::string name)
         m_text.remove_prefix(3);
     if (std::size_t const offset = FirstForbiddenInXml(m_text); offset != std::string_view::npos)
         FailAt(offset, "not UTF-8, or a control character; such a value is written as base64");
-    if (std::size_t const offset = FirstZeroReference(m_text); offset != std::string_view::npos)
-        FailAt(offset, "the character zero cannot stand in a value");
+    if (std::size_t const offset = FirstWrongReference(m_text); offset != std::string_view::npos)
+        FailAt(offset, "no number of a character that XML allows; such a value is written as base64");
     // White space counts in strings, so all of it is kept; text beside the root is kept to be refused.
     unsigned const options = pugi::parse_cdata | pugi::parse_escapes | pugi::parse_eol |
                              pugi::parse_ws_pcdata | pugi::parse_fragment;
