@@ -193,7 +193,7 @@ bool LogIn(ComGUIManager& manager, TLogin* login)
 {
     std::unique_ptr<TLogin, decltype(&std::free)> record(login, std::free);
     if (!manager.IsServerOnline(login))
-        return Fail("no server answers at " + std::string(login->szServerHost) + ", port " +
+        return Fail("cannot reach a server at " + std::string(login->szServerHost) + ", port " +
                     std::to_string(login->iServerPort));
     if (int const result = manager.Initialize(login, Stamp); result != 0)
         return Fail("cannot prepare a session", result);

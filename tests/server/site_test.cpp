@@ -175,16 +175,15 @@ TEST_F(SiteFolderByEnvironment, WithoutAnything_SaysWhatToSet)
 TEST_F(SiteFolder, FirstStart_MakesFoldersForThisUserAlone)
 {
     MakeSite();
-    for (char const* const name : {"", "tickets", "temp", "job", "upload", "preview", "log", "hot",
-                                   "linearisation/lab", "remote/wcc", "profiles/paper"})
+    for (char const* const name :
+         {"", "tickets", "temp", "job", "upload", "preview", "log", "hot", "linearisation",
+          "linearisation/lab", "remote", "remote/wcc", "profiles", "profiles/paper"})
     {
         struct stat found = {};
         ASSERT_EQ(stat(File(name).c_str(), &found), 0) << name;
         EXPECT_TRUE(S_ISDIR(found.st_mode)) << name;
+        EXPECT_EQ(found.st_mode & 07777, 0700u) << name;
     }
-    struct stat found = {};
-    stat(Folder().c_str(), &found);
-    EXPECT_EQ(found.st_mode & 07777, 0700u);
 }
 
 TEST_F(SiteFolder, FirstStart_FillsTheDatabaseFromTheSeedAndSaysNothing)
@@ -464,6 +463,26 @@ TEST_F(SiteFolder, ProgramStartedByTheOwner_DoesNotHoldTheSite)
     EXPECT_TRUE(SqliteStore(Folder(), NoContent).WasFirst());
     EXPECT_EQ(kill(helper, SIGKILL), 0);
     waitpid(helper, nullptr, 0);
+}
+
+// What the program prints must not go into a file of the site. SQLite puts /dev/null there.
+TEST_F(SiteFolder, OpenedByAProgramWithoutStandardOutput_IsNotWhereThatGoes)
+{
+    ChildProcess child(
+        [&](ChildProcess::Report const& report)
+        {
+            for (int const standard : {STDIN_FILENO, STDOUT_FILENO, STDERR_FILENO})
+                close(standard);
+            OpenedSite const site(Folder(), ShippedSeed);
+            for (int const standard : {STDIN_FILENO, STDOUT_FILENO, STDERR_FILENO})
+            {
+                struct stat found = {};
+                report(fstat(standard, &found) != 0 || S_ISCHR(found.st_mode) ? 1 : 0);
+            }
+        });
+    for (int i = 0; i < 3; ++i)
+        EXPECT_EQ(child.Next(), 1) << i;
+    EXPECT_EQ(child.Wait(), 0);
 }
 
 TEST_F(SiteFolder, EndedInOrder_LeavesTheDatabaseAsOneFile)

@@ -1,6 +1,10 @@
-// An open file or folder of the operating system; closed with its owner. -1 for none.
+// An open file or folder of the operating system; closed with its owner. -1 for none. Never one of the three
+// of standard input and output, which a program may have been started without: what it prints would go into
+// the file.
 #pragma once
 
+#include <cerrno>
+#include <fcntl.h>
 #include <unistd.h>
 #include <utility>
 
@@ -9,7 +13,7 @@ namespace standin
 class Descriptor
 {
 public:
-    explicit Descriptor(int number = -1) : m_number(number) {}
+    explicit Descriptor(int number = -1) : m_number(AboveStandardOnes(number)) {}
     ~Descriptor()
     {
         if (m_number >= 0)
@@ -28,6 +32,18 @@ public:
     bool Close() { return close(std::exchange(m_number, -1)) == 0; }
 
 private:
+    // errno is as it was for one that is -1 already.
+    static int AboveStandardOnes(int number)
+    {
+        if (number < 0 || number > STDERR_FILENO)
+            return number;
+        int const above = fcntl(number, F_DUPFD_CLOEXEC, STDERR_FILENO + 1);
+        int const error = errno;
+        close(number);
+        errno = error;
+        return above;
+    }
+
     int m_number;
 };
 }  // namespace standin

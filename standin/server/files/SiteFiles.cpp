@@ -38,10 +38,10 @@ void MakeAbove(std::filesystem::path const& folder, Folders& changed)
     if (above.empty() || std::filesystem::exists(above, error))
         return;
     MakeAbove(above, changed);
-    if (std::filesystem::create_directory(above, error))
+    if (mkdir(above.c_str(), 0700) == 0)
         changed.insert(above.parent_path());
-    if (error)
-        throw FileError(FileFault(folder, "the folder cannot be made", error.value()));
+    else if (errno != EEXIST)
+        throw FileError(FileFault(folder, "the folder cannot be made", errno));
 }
 
 void MakePrivateFolder(std::filesystem::path const& folder, Folders& changed)
