@@ -159,7 +159,7 @@ void FlushedValue(benchmark::State& state)
     state.SetItemsProcessed(state.iterations());
     if (state.thread_index() == 0)
     {
-        flushTime = {};
+        flushTime = std::chrono::microseconds(0);
         flushedSite.reset();
     }
 }

@@ -5,6 +5,7 @@
 #include "comgui/ticket/TICKET_OP.h"
 #include "standin/module/LocalTicket.h"
 #include "standin/module/ValueWords.h"
+#include "standin/server/files/ForkedChild.h"
 #include <new>
 
 namespace standin
@@ -30,6 +31,7 @@ public:
         m_container.MOPERATION = OnOperation;  // to load takes no other slot
         m_translator.reset(CreateFolderVariables(&m_container));
     }
+    Loaded() { m_translator.reset(CreateFolderVariables(nullptr)); }
     Loaded(Loaded const&) = delete;
     Loaded& operator=(Loaded const&) = delete;
 
@@ -75,6 +77,8 @@ bool FolderTranslator::HandOut(void* out)
 
 std::shared_ptr<FolderTranslator::Loaded> FolderTranslator::UpToDate() const
 {
+    if (IsForkedChild())
+        return std::make_shared<Loaded>();  // paths stay as they are
     Sequence const revision = m_tickets.SystemTicketRevision();
     {
         std::lock_guard const lock(m_lock);
@@ -90,6 +94,8 @@ std::shared_ptr<FolderTranslator::Loaded> FolderTranslator::UpToDate() const
 
 void FolderTranslator::Load()
 {
+    if (IsForkedChild())
+        return;
     {
         std::lock_guard const lock(m_lock);
         m_loaded.reset();

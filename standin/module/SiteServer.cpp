@@ -6,6 +6,7 @@
 #include "standin/server/files/Report.h"
 #include <dlfcn.h>
 #include <map>
+#include <unistd.h>
 
 namespace standin
 {
@@ -31,10 +32,11 @@ using Sites = std::map<std::filesystem::path, std::unique_ptr<OpenSite>>;
 struct EndOfWork
 {
     Sites const& sites;
+    pid_t const process = getpid();
 
     ~EndOfWork()
     {
-        if (IsForkedChild())
+        if (IsForkedChild() || getpid() != process)  // a child of a raw clone is told nothing
             return;
         for (auto const& [folder, open] : sites)
         {

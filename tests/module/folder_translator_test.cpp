@@ -6,6 +6,7 @@
 #include "comgui/folders/clFOLDER_VARIABLES.h"
 #include "comgui/folders/clSETMULTIPAR_FOLDER_VARIABLES.h"
 #include "tests/support/Allocations.h"
+#include "tests/support/ChildProcess.h"
 #include <new>
 #include <thread>
 
@@ -263,4 +264,22 @@ TEST_F(FolderTranslators, LoadedWithoutMemory_LoadOnceMoreAtTheNextOperation)
         EXPECT_EQ(folders.Decode("$(TEMP)/x", false), expected) << n;
     }
     testing::internal::GetCapturedStderr();
+}
+
+// Its locks may be those of threads that are not there.
+TEST_F(FolderTranslators, InAChildMadeByFork_LeavePathsAsTheyAre)
+{
+    clFOLDER_VARIABLES* const folders = OfTheContainer(admin);
+    ASSERT_TRUE(folders);
+    std::string const path = SiteFolder() + "/temp/a";
+    EXPECT_EQ(folders->Decode("$(TEMP)/a", false), path);
+    ChildProcess child(
+        [&](ChildProcess::Report const& report)
+        {
+            report(folders->Decode("$(TEMP)/a", false) == "$(TEMP)/a" ? 1 : 0);
+            report(folders->Encode(path) == path ? 1 : 0);
+        });
+    EXPECT_EQ(child.Next(), 1);
+    EXPECT_EQ(child.Next(), 1);
+    EXPECT_EQ(child.Wait(), 0);
 }

@@ -531,3 +531,23 @@ TEST_F(SitesOwnFiles, AreNoTickets)
     }
     ExpectUntouched();
 }
+
+// Nor are they replaced by one that was opened under the name before.
+TEST_F(SitesOwnFiles, AreReplacedByNoTicket)
+{
+    for (char const* const name : {"site.db", "site.lock"})
+    {
+        fs::path const file = folder.Write("ticket.xml", "<ticket version='1'/>");
+        STICKET_ACCESS const* ticket = module->STicketFactory->CreateTicket(file.c_str());
+        ASSERT_TRUE(ticket);
+        int const value = 7;
+        EXPECT_TRUE(ticket->SSETPARAMETER(ticket->Instance, "K", PARAM_INT, &value, -1));
+        fs::remove(file);
+        fs::create_symlink(Site() / name, file);
+        testing::internal::CaptureStderr();
+        module->STicketFactory->DestroyTicket(&ticket);
+        EXPECT_THAT(testing::internal::GetCapturedStderr(), HasSubstr("belongs to the database"));
+        fs::remove(file);
+    }
+    ExpectUntouched();
+}

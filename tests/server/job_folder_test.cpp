@@ -8,7 +8,10 @@
 #include <chrono>
 #include <gmock/gmock.h>
 #include <mutex>
+#include <sys/fsuid.h>
+#include <sys/stat.h>
 #include <thread>
+#include <unistd.h>
 
 using namespace standin;
 using testing::ElementsAre;
@@ -155,6 +158,20 @@ TEST_F(SweptJobFolder, ThatWasBeingRemoved_Goes)
     fs::create_directory(folder / ".removed-10-0123456789abcdef");
     Sweep();
     EXPECT_THAT(NamesIn(folder.Path()), IsEmpty());
+}
+
+// Nobody can tell whose it is.
+TEST_F(SweptJobFolder, ThatCanBeListedAndNotLookedInto_Stays)
+{
+    MakeJob(9);
+    chmod((folder / "9").c_str(), 0444);
+    chmod(folder.Path().c_str(), 0777);
+    if (geteuid() == 0)
+        setfsuid(65534);  // an administrator may look into everything
+    Sweep();
+    setfsuid(geteuid());
+    chmod((folder / "9").c_str(), 0700);
+    EXPECT_THAT(NamesIn(folder.Path()), ElementsAre("9"));
 }
 
 // A maker whose jobs come and go under one id, and a sweeper that is always a bit behind.

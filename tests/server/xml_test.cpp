@@ -538,13 +538,12 @@ TEST(ReplaceFile, OfAPrivateFile_ShowsItToNobody)
     MemoryFolder folder;
     WriteFile(folder / "file", "old");
     std::filesystem::permissions(folder / "file", std::filesystem::perms::owner_all);
-    std::atomic<bool> isOver{false};
     std::atomic<int> seen{0};
     std::atomic<int> open{0};
     std::jthread looker(
-        [&]
+        [&](std::stop_token const& end)
         {
-            while (!isOver)
+            while (!end.stop_requested())
                 for (std::string const& name : NamesIn(folder.Path()))
                 {
                     struct stat found = {};
@@ -556,10 +555,26 @@ TEST(ReplaceFile, OfAPrivateFile_ShowsItToNobody)
         });
     for (int round = 0; round < 10'000 && seen < 20; ++round)
         ReplaceFile(folder / "file", std::string(1'000'000, 'x'));
-    isOver = true;
+    looker.request_stop();
     looker.join();
     EXPECT_GT(seen, 0);
     EXPECT_EQ(open, 0);
+}
+
+TEST(ReplaceFile, OfAnotherUsersFile_StaysHis)
+{
+    if (geteuid() != 0)
+        GTEST_SKIP() << "only an administrator has files of others";
+    MemoryFolder folder;
+    WriteFile(folder / "file", "old");
+    ASSERT_EQ(chown((folder / "file").c_str(), 1234, 5678), 0);
+    chmod((folder / "file").c_str(), 0640);
+    ReplaceFile(folder / "file", "new");
+    struct stat found = {};
+    ASSERT_EQ(stat((folder / "file").c_str(), &found), 0);
+    EXPECT_EQ(found.st_uid, 1234u);
+    EXPECT_EQ(found.st_gid, 5678u);
+    EXPECT_EQ(found.st_mode & 07777, 0640u);
 }
 
 TEST(ReplaceFile, IsNotLedAwayByALinkOfAnOldName)
@@ -685,11 +700,10 @@ TEST(RemoveLeftovers, OfProcessesThatAreGone_GoAndNothingElseDoes)
 TEST(RemoveLeftovers, WhileFilesAreReplaced_DisturbNobody)
 {
     MemoryFolder folder;
-    std::atomic<bool> isOver{false};
     std::jthread const cleaner(
-        [&]
+        [&](std::stop_token const& end)
         {
-            while (!isOver)
+            while (!end.stop_requested())
                 RemoveLeftovers(folder / "file");
         });
     std::vector<std::jthread> writers;
@@ -701,7 +715,6 @@ TEST(RemoveLeftovers, WhileFilesAreReplaced_DisturbNobody)
                     EXPECT_NO_THROW(ReplaceFile(folder / "file", std::string(1000, letter)));
             });
     writers.clear();
-    isOver = true;
     EXPECT_THAT(NamesIn(folder.Path()), ElementsAre("file"));
 }
 

@@ -4,6 +4,7 @@
 #include "tools/comgui_site/OpenedSite.h"
 #include "tools/comgui_site/Progress.h"
 #include "tools/comgui_site/Trouble.h"
+#include "tools/comgui_site/Workplace.h"
 #include <cerrno>
 #include <cstring>
 #include <sys/stat.h>
@@ -15,35 +16,16 @@ namespace
 {
 using std::filesystem::path;
 
-// A file that goes unless it is kept.
-class Temporary
+// A link fails where a file is by now, a renaming would replace it. Some file systems have no links.
+void Name(path const& made, path const& file, bool mayReplace)
 {
-public:
-    explicit Temporary(path const& file) : m_path(file.string() + "." + std::to_string(getpid()) + "-0.tmp")
-    {
-        standin::RemoveLeftovers(file);
-        unlink(m_path.c_str());  // of a process of the same number that was killed
-    }
-    ~Temporary() { unlink(m_path.c_str()); }
-    Temporary(Temporary const&) = delete;
-    Temporary& operator=(Temporary const&) = delete;
-
-    path const& Path() const { return m_path; }
-
-    // A link fails where a file is by now, a renaming would replace it. Some file systems have no links.
-    void Name(path const& file, bool mayReplace) const
-    {
-        bool const isLinked = !mayReplace && link(m_path.c_str(), file.c_str()) == 0;
-        if (!isLinked && !mayReplace && errno == EEXIST)
-            throw Trouble(file.string() + ": is there already; choose another name, or say --force");
-        if (!isLinked && rename(m_path.c_str(), file.c_str()) != 0)
-            throw standin::FileError(standin::FileFault(file, "cannot be written", errno));
-        standin::FlushFolder(file.parent_path());
-    }
-
-private:
-    path const m_path;
-};
+    bool const isLinked = !mayReplace && link(made.c_str(), file.c_str()) == 0;
+    if (!isLinked && !mayReplace && errno == EEXIST)
+        throw Trouble(file.string() + ": is there already; choose another name, or say --force");
+    if (!isLinked && rename(made.c_str(), file.c_str()) != 0)
+        throw standin::FileError(standin::FileFault(file, "cannot be written", errno));
+    standin::FlushFolder(file.parent_path());
+}
 
 // What new files may be for others: nothing.
 class PrivateFiles
@@ -77,15 +59,15 @@ void BackUp(OpenedSite& site, path const& file, bool mayReplace)
 {
     path const target = TargetOf(file);
     CheckTarget(site.Folder(), target, mayReplace);
-    Temporary const temporary(target);
+    Workplace const workplace(target);
     {
         PrivateFiles const privately;
         Progress progress("copying the database");
         auto const tell = [&](long long done, long long total)
         { progress(static_cast<unsigned long long>(done), static_cast<unsigned long long>(total)); };
-        site.Store().BackupTo(temporary.Path(), tell);
+        site.Store().BackupTo(workplace.Database(), tell);
     }
-    standin::FlushFile(temporary.Path());
-    temporary.Name(target, mayReplace);
+    standin::FlushFile(workplace.Database());
+    Name(workplace.Database(), target, mayReplace);
 }
 }  // namespace comgui_site

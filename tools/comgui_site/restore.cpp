@@ -7,6 +7,7 @@
 #include "tools/comgui_site/OpenedSite.h"
 #include "tools/comgui_site/Progress.h"
 #include "tools/comgui_site/Trouble.h"
+#include "tools/comgui_site/Workplace.h"
 #include "tools/comgui_site/backup.h"
 #include "tools/comgui_site/check.h"
 #include "tools/comgui_site/words.h"
@@ -23,8 +24,6 @@ namespace
 using namespace std::chrono_literals;
 using standin::LockFile;
 using std::filesystem::path;
-
-constexpr char Prefix[] = ".restore.";
 
 // The site for this program alone: nobody has it open, and who wants to open it waits.
 class Alone
@@ -64,45 +63,6 @@ private:
     }
 
     LockFile m_lock;
-};
-
-// A folder in the site's for the copy, until that is in its place. It goes with everything in it.
-class Workplace
-{
-public:
-    explicit Workplace(path const& site) : m_folder(site / (Prefix + std::to_string(getpid())))
-    {
-        RemoveLeftovers(site);
-        std::filesystem::remove_all(m_folder);  // of a process of the same number that was killed
-        standin::MakePrivateFolders({m_folder});
-    }
-    ~Workplace()
-    {
-        std::error_code ignored;
-        std::filesystem::remove_all(m_folder, ignored);
-    }
-    Workplace(Workplace const&) = delete;
-    Workplace& operator=(Workplace const&) = delete;
-
-    path const& Folder() const { return m_folder; }
-    path Database() const { return m_folder / "site.db"; }
-
-private:
-    static void RemoveLeftovers(path const& site)
-    {
-        for (auto const& entry : std::filesystem::directory_iterator(site))
-        {
-            std::string const name = entry.path().filename().string();
-            std::string const process = name.starts_with(Prefix) ? name.substr(sizeof Prefix - 1) : "";
-            bool const isNumber = !process.empty() && process.size() < 10 &&
-                                  process.find_first_not_of("0123456789") == process.npos;
-            std::error_code ignored;
-            if (isNumber && !standin::IsAlive(std::stoi(process)))
-                std::filesystem::remove_all(entry.path(), ignored);
-        }
-    }
-
-    path const m_folder;
 };
 
 void Copy(path const& from, path const& to, char const* what)
@@ -382,7 +342,7 @@ Restored Restore(path const& folder, path const& file)
     {
         Alone const beforeTheLongWork(folder);
     }
-    Workplace const workplace(folder);
+    Workplace const workplace(folder / ".restore");
     Copy(file, workplace.Database(), "copying the backup");
     auto const jobs = CheckCopy(file, workplace);
     standin::FlushFile(workplace.Database());

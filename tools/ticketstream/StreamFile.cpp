@@ -71,7 +71,10 @@ void Replace(std::string const& name, std::string_view bytes)
     }
     catch (standin::FileError const& error)
     {
-        throw Trouble(ShownName(error.what()));
+        std::string text = error.what();
+        if (text.starts_with(name))
+            text.replace(0, name.size(), ShownName(name));
+        throw Trouble(text);
     }
 }
 

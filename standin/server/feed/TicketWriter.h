@@ -2,7 +2,8 @@
 // thread or program was faster. So what several make at once is as if one after the other had made it. A
 // change that was committed is in the cache when its call returns.
 //
-// For any thread, with no lock held. Failures of the store are reported on stderr, and the change fails.
+// For any thread, with no lock held. Failures of the store are reported on stderr, and the change fails; of
+// DeleteOrThrow they pass through.
 #pragma once
 
 #include "standin/server/feed/Feed.h"

@@ -17,18 +17,21 @@ namespace standin
 {
 namespace
 {
-constexpr std::size_t RandomSize = 16;
 constexpr std::string_view Tail = ".tmp";
 constexpr std::size_t LongestName = 255;
 
-// As much of a file's name as leaves room for what comes behind it.
-std::string BeginningFor(std::filesystem::path const& file)
-{
-    std::string const name = file.filename().string();
-    return name.substr(0, LongestName - std::strlen(".") - RandomSize - Tail.size());
-}
+constexpr int Attempts = 100;
 
-bool Lock(int file) { return flock(file, LOCK_EX | LOCK_NB) == 0; }
+// As much of a file's name as leaves room for what comes behind it, in whole characters.
+std::string_view BeginningOf(std::string_view name)
+{
+    std::size_t size = LongestName - std::strlen(".") - RandomNameSize - Tail.size();
+    if (name.size() <= size)
+        return name;
+    while (size > 0 && (static_cast<unsigned char>(name[size]) & 0xC0) == 0x80)
+        --size;
+    return name.substr(0, size);
+}
 
 // The new file until it has taken the old one's place. It is locked as long as it is somebody's.
 class Temporary
@@ -39,11 +42,12 @@ public:
     Temporary(std::filesystem::path const& file, std::filesystem::path const& shown, struct stat const* old)
         : m_shown(shown)
     {
+        int attempt = 1;
         while (!Make(file, old ? 0600 : 0666))
-        {
-        }
+            if (++attempt > Attempts)
+                throw FileError(FileFault(m_shown, "cannot be written", errno));
         if (old)
-            fchmod(m_descriptor.Number(), old->st_mode & 07777);
+            TakeRightsOf(*old, m_descriptor.Number());
     }
     ~Temporary()
     {
@@ -71,18 +75,16 @@ private:
     // False if the name is taken, or if somebody took the file for a leftover before it was locked.
     bool Make(std::filesystem::path const& file, mode_t mode)
     {
-        std::filesystem::path const path =
-            file.parent_path() / (BeginningFor(file) + "." + RandomName() + std::string(Tail));
+        std::filesystem::path const path = TemporaryFor(file);
         m_descriptor =
             Descriptor(open(path.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_NOFOLLOW | O_CLOEXEC, mode));
         if (m_descriptor.Number() < 0 && errno != EEXIST)
             throw FileError(FileFault(m_shown, "cannot be written", errno));
-        struct stat made = {};
-        bool const isOurs =
-            m_descriptor.Number() >= 0 &&
-            (Lock(m_descriptor.Number()) || errno != EWOULDBLOCK) &&  // some file systems have no locks
-            fstat(m_descriptor.Number(), &made) == 0 && made.st_nlink > 0;
-        if (!isOurs)
+        if (m_descriptor.Number() < 0)
+            return false;
+        bool const isOthers = !LockTemporary(m_descriptor.Number()) && errno == EWOULDBLOCK;
+        struct stat named = {};
+        if (isOthers || lstat(path.c_str(), &named) != 0)
             return false;
         m_path = path;
         return true;
@@ -110,7 +112,7 @@ void FlushFolder(std::filesystem::path const& folder)
 
 void FlushFile(std::filesystem::path const& file)
 {
-    Descriptor const opened(open(file.c_str(), O_RDONLY | O_CLOEXEC));
+    Descriptor const opened = OpenToRead(AT_FDCWD, file, O_RDONLY | O_CLOEXEC);
     if (opened.Number() < 0 || fsync(opened.Number()) != 0)
         throw FileError(FileFault(file, "cannot be flushed to the disk", errno));
 }
@@ -154,46 +156,78 @@ void ReplaceFile(std::filesystem::path const& file, std::string_view content)
     struct stat old = {};
     bool const isThere = stat(name.c_str(), &old) == 0;
     if (isThere)
-        DatabaseFiles::Refuse(old, file.string());
+        DatabaseFiles::RefuseIfOpen(old, file.string());
     Temporary temporary(name, file, isThere ? &old : nullptr);
     temporary.Write(content);
     temporary.TakeThePlaceOf(name);
     FlushFolder(FolderOf(name));
 }
 
+void TakeRightsOf(struct stat const& other, int file)
+{
+    mode_t rights = other.st_mode & 07777;
+    struct stat own = {};
+    if (fchown(file, other.st_uid, other.st_gid) != 0)
+    {
+        rights &= 0777;
+        if (fchown(file, static_cast<uid_t>(-1), other.st_gid) != 0 &&
+            (fstat(file, &own) != 0 || own.st_gid != other.st_gid))
+            rights &= ~static_cast<mode_t>(070);
+    }
+    fchmod(file, rights);
+}
+
 std::string RandomName()
 {
     std::random_device random;
     std::string name;
-    while (name.size() < RandomSize)
+    while (name.size() < RandomNameSize)
         name += "0123456789abcdef"[random() % 16];
     return name;
 }
 
-bool IsTemporary(std::string_view name, std::string_view beginning)
+std::filesystem::path TemporaryFor(std::filesystem::path const& file)
 {
-    bool const isFramed = name.size() == beginning.size() + 1 + RandomSize + Tail.size() &&
+    std::string name = file.filename().string();
+    name = std::string(BeginningOf(name)) + "." + RandomName() + std::string(Tail);
+    return file.parent_path() / name;
+}
+
+bool IsTemporary(std::string_view name, std::string_view file)
+{
+    std::string_view const beginning = BeginningOf(file);
+    bool const isFramed = name.size() == beginning.size() + 1 + RandomNameSize + Tail.size() &&
                           name.starts_with(beginning) && name[beginning.size()] == '.' &&
                           name.ends_with(Tail);
     return isFramed &&
-           name.substr(beginning.size() + 1, RandomSize).find_first_not_of("0123456789abcdef") == name.npos;
+           name.substr(beginning.size() + 1, RandomNameSize).find_first_not_of("0123456789abcdef") ==
+               name.npos;
 }
+
+bool LockTemporary(int file) { return flock(file, LOCK_EX | LOCK_NB) == 0; }
 
 void RemoveLeftovers(std::filesystem::path const& file)
 {
-    std::string const beginning = BeginningFor(file);
     std::error_code error;
     std::filesystem::directory_iterator entry(FolderOf(file), error);
     for (; !error && entry != std::filesystem::directory_iterator(); entry.increment(error))
     {
-        if (!IsTemporary(entry->path().filename().string(), beginning))
+        if (!IsTemporary(entry->path().filename().string(), file.filename().string()))
             continue;
-        Descriptor const found(
-            open(entry->path().c_str(), O_RDONLY | O_NOFOLLOW | O_NONBLOCK | O_NOCTTY | O_CLOEXEC));
-        struct stat what = {};
-        bool const isFile = found.Number() >= 0 && fstat(found.Number(), &what) == 0 && S_ISREG(what.st_mode);
-        if (isFile && Lock(found.Number()))
-            unlink(entry->path().c_str());
+        try
+        {
+            Descriptor const found = OpenToRead(AT_FDCWD, entry->path(),
+                                                O_RDONLY | O_NOFOLLOW | O_NONBLOCK | O_NOCTTY | O_CLOEXEC);
+            struct stat what = {};
+            bool const isFile =
+                found.Number() >= 0 && fstat(found.Number(), &what) == 0 && S_ISREG(what.st_mode);
+            if (isFile && LockTemporary(found.Number()))
+                unlink(entry->path().c_str());
+        }
+        catch (FileError const&)
+        {
+            // it stays
+        }
     }
 }
 }  // namespace standin

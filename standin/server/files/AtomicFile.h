@@ -8,6 +8,7 @@
 #include <filesystem>
 #include <string>
 #include <string_view>
+#include <sys/stat.h>
 
 namespace standin
 {
@@ -30,18 +31,31 @@ void WriteAll(int descriptor, std::string_view content, std::filesystem::path co
 
 // Writes a new file beside the old one, flushes it to the disk and puts it in the old one's place, whose
 // permissions it takes over. A link stays, and what it points at is replaced. On failure the old content is
-// there as it was and nothing else is left. A process killed in between leaves NAME.RANDOM.tmp behind, where
-// RANDOM is a RandomName and a NAME that would be too long is cut.
+// there as it was and nothing else is left, unless the folder cannot be flushed, which comes last. A process
+// killed in between leaves NAME.RANDOM.tmp behind, where RANDOM is a RandomName and a NAME that would be too
+// long is cut.
 void ReplaceFile(std::filesystem::path const& file, std::string_view content);
 
-// Sixteen digits of a hexadecimal number that nobody can foresee, so that none comes twice and nobody lays a
+// Gives an open file owner, group and permissions of another as far as this user may. Nobody who may not read
+// that may then read this.
+void TakeRightsOf(struct stat const& other, int file);
+
+// So many digits of a hexadecimal number that nobody can foresee, so that none comes twice and nobody lays a
 // link in the way of a file that is about to be made.
+inline constexpr std::size_t RandomNameSize = 16;
 std::string RandomName();
 
-// Whether that is BEGINNING.RANDOM.tmp.
-bool IsTemporary(std::string_view name, std::string_view beginning);
+// A name in the same folder, BEGINNING.RANDOM.tmp, for what is not to have the file's own name yet.
+std::filesystem::path TemporaryFor(std::filesystem::path const& file);
+
+// Whether TemporaryFor may have given that name for a file of that one.
+bool IsTemporary(std::string_view name, std::string_view file);
+
+// Locks what is open for its maker, as long as it is open, so that it is not taken for a leftover. False if
+// somebody else has it, with EWOULDBLOCK, or if the file system has no locks.
+bool LockTemporary(int file);
 
 // Removes what ReplaceFile has left beside the file in processes that were killed. What belongs to a process
-// that lives, on whatever machine or in whatever container, stays, and so does what cannot be removed.
+// that lives stays, as far as the file system's locks reach, and so does what cannot be removed.
 void RemoveLeftovers(std::filesystem::path const& file);
 }  // namespace standin

@@ -1,5 +1,6 @@
 #include "standin/server/files/DatabaseFiles.h"
 
+#include "standin/server/files/ForkedChild.h"
 #include <algorithm>
 #include <cerrno>
 #include <fcntl.h>
@@ -11,13 +12,13 @@ namespace standin
 namespace
 {
 constinit std::mutex lock;
-std::vector<std::vector<std::filesystem::path> const*>& All()
+std::vector<std::vector<std::filesystem::path> const*>& OpenDatabases()
 {
     static auto& all = *new std::vector<std::vector<std::filesystem::path> const*>;
     return all;
 }
 
-bool Is(std::filesystem::path const& path, struct stat const& file)
+bool IsTheFileAt(std::filesystem::path const& path, struct stat const& file)
 {
     struct stat named = {};
     return stat(path.c_str(), &named) == 0 && named.st_dev == file.st_dev && named.st_ino == file.st_ino;
@@ -27,20 +28,23 @@ bool Is(std::filesystem::path const& path, struct stat const& file)
 DatabaseFiles::DatabaseFiles(std::vector<std::filesystem::path> files) : m_files(std::move(files))
 {
     std::lock_guard const guard(lock);
-    All().push_back(&m_files);
+    OpenDatabases().push_back(&m_files);
 }
 
 DatabaseFiles::~DatabaseFiles()
 {
+    if (IsForkedChild())
+        return;  // the lock may be a thread's that is not here, and nobody will look any more
     std::lock_guard const guard(lock);
-    std::erase(All(), &m_files);
+    std::erase(OpenDatabases(), &m_files);
 }
 
-void DatabaseFiles::Refuse(struct stat const& file, std::string const& shown)
+void DatabaseFiles::RefuseIfOpen(struct stat const& file, std::string const& shown)
 {
     std::lock_guard const guard(lock);
-    for (auto const* const files : All())
-        if (std::any_of(files->begin(), files->end(), [&](auto const& path) { return Is(path, file); }))
+    for (auto const* const files : OpenDatabases())
+        if (std::any_of(files->begin(), files->end(),
+                        [&](auto const& path) { return IsTheFileAt(path, file); }))
             throw FileError(
                 shown + ": belongs to the database of a site that is open; choose another file, or make a "
                         "copy of this one by comgui_site backup");
@@ -56,7 +60,7 @@ Descriptor OpenToRead(int folder, std::filesystem::path const& file, int flags)
     struct stat found = {};
     if (fstat(look.Number(), &found) != 0)
         return Descriptor();
-    DatabaseFiles::Refuse(found, file.string());
+    DatabaseFiles::RefuseIfOpen(found, file.string());
     if (S_ISLNK(found.st_mode))
     {
         errno = ELOOP;
@@ -69,7 +73,7 @@ Descriptor OpenToRead(int folder, std::filesystem::path const& file, int flags)
 #else
     struct stat found = {};
     if (fstatat(folder, file.c_str(), &found, (flags & O_NOFOLLOW) ? AT_SYMLINK_NOFOLLOW : 0) == 0)
-        DatabaseFiles::Refuse(found, file.string());
+        DatabaseFiles::RefuseIfOpen(found, file.string());
 #endif
     return Descriptor(openat(folder, file.c_str(), flags));
 }

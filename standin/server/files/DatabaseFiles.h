@@ -1,6 +1,8 @@
-// The files of a database that this process has open. The system gives up a process's locks on a file as soon
-// as the process closes any descriptor of it; another program then takes itself for the only one and clears
-// away what it must not. So nothing else in the process may open them, whatever name a client gives them.
+// The files of a site's database that this process has open. Its locks on two of them, site.db and
+// site.db-shm, are given up by the system as soon as the process closes any descriptor of them; another
+// program then takes itself for the only one and clears away what it must not. So nothing else in the process
+// may open them, whatever name a client gives them; and nothing but the server may replace any of the four. A
+// file that was opened before its site is not noticed.
 #pragma once
 
 #include "standin/server/files/Descriptor.h"
@@ -21,8 +23,8 @@ public:
     DatabaseFiles(DatabaseFiles const&) = delete;
     DatabaseFiles& operator=(DatabaseFiles const&) = delete;
 
-    // Throws FileError if that is one of anybody's; shown is for the message.
-    static void Refuse(struct stat const& file, std::string const& shown);
+    // Throws FileError if that is one of those; shown is for the message.
+    static void RefuseIfOpen(struct stat const& file, std::string const& shown);
 
 private:
     std::vector<std::filesystem::path> const m_files;

@@ -7,6 +7,6 @@ namespace standin
 // Whether this process is such a child, of one that had a site open.
 bool IsForkedChild() noexcept;
 
-// For who is told of the fork, in the child.
+// Called in the child by the handler of fork.
 void NoteForkedChild() noexcept;
 }  // namespace standin

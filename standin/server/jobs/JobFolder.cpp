@@ -19,7 +19,6 @@ namespace
 using std::filesystem::path;
 
 constexpr std::string_view MarkBeginning = ".job-";
-constexpr std::size_t MarkSize = 16;
 constexpr std::string_view RemovalBeginning = ".removed-";
 
 // An empty folder may be swept before it is marked, and a dead job's may come back to its name for a moment;
@@ -30,7 +29,7 @@ constexpr std::chrono::milliseconds Pause(5);
 // A client may have written anything into the ticket.
 bool IsMark(std::string_view mark)
 {
-    return mark.size() == MarkSize && mark.find_first_not_of("0123456789abcdef") == mark.npos;
+    return mark.size() == RandomNameSize && mark.find_first_not_of("0123456789abcdef") == mark.npos;
 }
 
 bool IsMarkFile(path const& file)
@@ -102,7 +101,8 @@ bool GiveBack(path const& apart, path const& folder)
 {
     if (renameat2(AT_FDCWD, apart.c_str(), AT_FDCWD, folder.c_str(), RENAME_NOREPLACE) == 0)
         return true;
-    return errno == EINVAL && rename(apart.c_str(), folder.c_str()) == 0;
+    bool const isUnknown = errno == EINVAL || errno == ENOSYS || errno == EPERM;
+    return isUnknown && rename(apart.c_str(), folder.c_str()) == 0;
 }
 
 // First it gets a name that no job has, so that whoever makes the next job of that id is in nobody's way.
@@ -165,7 +165,8 @@ void RemoveTheDead(path const& folder, int id, std::string mark, KnownJobs const
     while (RemoveMarkedFolder(folder, id, mark))
     {
         auto const back = ContentOf(folder);
-        if (!back || back->mark.empty() || known.hasMark(id, back->mark))
+        bool const isSame = back && back->mark == mark;  // one that can be listed and not looked into
+        if (!back || back->mark.empty() || isSame || known.hasMark(id, back->mark))
             return;
         mark = back->mark;
     }

@@ -101,12 +101,12 @@ PartFile::PartFile(Store& store, int folder, std::string name)
     if (isThere && S_ISLNK(old.st_mode))
         throw TransferError(PathRefused, Shown() + ": a symbolic link; name the file that it points at");
     if (isThere)
-        RefusingDatabases([&] { DatabaseFiles::Refuse(old, m_name); });
+        RefusingDatabases([&] { DatabaseFiles::RefuseIfOpen(old, m_name); });
     if (isThere && !S_ISREG(old.st_mode))
         throw TransferError(NotAFile, Shown() + ": something else than a file has that name; choose another");
     MakeFile(isThere ? 0600 : 0666);
     if (isThere)
-        fchmod(m_file.Number(), old.st_mode & 07777);
+        TakeRightsOf(old, m_file.Number());
 }
 
 // One that is taken stays, whoever's it is.
