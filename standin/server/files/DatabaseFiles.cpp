@@ -46,8 +46,8 @@ void DatabaseFiles::RefuseIfOpen(struct stat const& file, std::string const& sho
         if (std::any_of(files->begin(), files->end(),
                         [&](auto const& path) { return IsTheFileAt(path, file); }))
             throw FileError(
-                shown + ": belongs to the database of a site that is open; choose another file, or make a "
-                        "copy of this one by comgui_site backup");
+                shown + ": belongs to the database of a site that is open; choose another file, or copy the "
+                        "site with comgui_site backup");
 }
 
 // A descriptor that is good for nothing but looking holds no locks, and what was looked at is what is opened.
