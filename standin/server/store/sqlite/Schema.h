@@ -8,9 +8,8 @@
 namespace standin::schema
 {
 // The number of the newest change, of which the journal may know no more.
-inline constexpr char SelectLastSequence[] =
-    "SELECT max(coalesce((SELECT max(sequence) FROM journal), 0), "
-    "(SELECT value FROM site WHERE name = 'pruned'))";
+inline constexpr char SelectLastSequence[] = "SELECT max(coalesce((SELECT max(sequence) FROM journal), 0), "
+                                             "(SELECT value FROM site WHERE name = 'pruned'))";
 
 // Whether nothing has been made in the file yet. Also true for what a process leaves behind that is killed
 // before its first commit.
