@@ -166,7 +166,7 @@ void FlushedValue(benchmark::State& state)
 }  // namespace
 
 // In the place of the system's: SQLite flushes its journal by this one.
-extern "C" int fdatasync(int file)
+extern "C" __attribute__((visibility("default"))) int fdatasync(int file)
 {
     auto const begin = std::chrono::steady_clock::now();
     int const result = static_cast<int>(syscall(SYS_fdatasync, file));
