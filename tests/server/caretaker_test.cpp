@@ -188,6 +188,7 @@ TEST_F(LeftByTheDead, TransferInTheMiddle_GoesWithItsProgram)
 {
     EXPECT_TRUE(living->Set(SystemTicket, "System/Folders/Temp", (folder / "temp").string()));
     Make("a");
+    living->server.Stop(std::chrono::minutes(1));  // it must not clear up before there is something
     std::string part;
     dying->server.Transfers().Set({4, [&]
                                    {
