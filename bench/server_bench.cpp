@@ -6,7 +6,6 @@
 // beside a writer they read while another thread changes a ticket 100 times a second. SharedSequence is the
 // look at whether another program has changed anything, which is a part of every read.
 #include "standin/module/Container.h"
-#include "standin/module/KeptTexts.h"
 #include "standin/server/sessions/Password.h"
 #include <benchmark/benchmark.h>
 #include <malloc.h>
@@ -111,7 +110,7 @@ private:
 struct FILLED_SERVER
 {
     explicit FILLED_SERVER(int tickets)
-        : store(tickets), server(store, texts, "/nowhere"), container(server, server.Login("bench", "bench"))
+        : store(tickets), server(store, "/nowhere"), container(server, server.Login("bench", "bench"))
     {
         std::size_t const before = HeapBytes();
         int value = 0;
@@ -122,7 +121,6 @@ struct FILLED_SERVER
     MTICKET_ACCESS const& access() const { return *container.Access(); }
 
     MadeUpStore store;
-    standin::KeptTexts texts;
     standin::Server server;
     standin::Container container;
     std::size_t bytes = 0;  // that the tickets take

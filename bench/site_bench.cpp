@@ -5,7 +5,6 @@
 #include "comgui/ticket/TICKET_ID.h"
 #include "comgui/ticket/TICKET_OP.h"
 #include "standin/module/Container.h"
-#include "standin/module/KeptTexts.h"
 #include "standin/server/sessions/Password.h"
 #include <benchmark/benchmark.h>
 #include <map>
@@ -31,7 +30,7 @@ StoreContent Jobs(int count)
 struct OPEN_SITE
 {
     explicit OPEN_SITE(std::filesystem::path const& folder, int tickets = 1)
-        : store(folder, [tickets] { return Jobs(tickets); }), server(store, texts, folder)
+        : store(folder, [tickets] { return Jobs(tickets); }), server(store, folder)
     {
     }
     ~OPEN_SITE()
@@ -41,7 +40,6 @@ struct OPEN_SITE
     }
 
     SqliteStore store;
-    KeptTexts texts;
     standin::Server server;
 };
 

@@ -131,7 +131,7 @@ int LogIn(TLogin& login)
         auto const session = site->server.Login(TextOf(login.szUser), TextOf(login.szPassword));
         if (!session)
             return MODULE_LOGIN_REFUSED;
-        FillIn(login, session->Who(), Handles::Get().NewSession(*site, session));
+        FillIn(login, session->Who(), Handles::Get().NewSession(site->server, session));
         session->SetEndPoint(login.szLocalEndPoint);
         return MODULE_DONE;
     }

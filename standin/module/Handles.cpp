@@ -39,13 +39,12 @@ bool Handles::Uninitialize(void* hInstance, TLogin const* record)
     return m_instances.at(hInstance).erase(record) != 0;
 }
 
-void* Handles::NewSession(OpenSite& site, std::shared_ptr<Session> session)
+void* Handles::NewSession(Server& server, std::shared_ptr<Session> session)
 {
-    site.texts.Open(session->Number());
-    auto container = std::make_unique<Container>(site.server, std::move(session));
+    auto container = std::make_unique<Container>(server, std::move(session));
     std::lock_guard const lock(m_lock);
     void* const handle = HandleOf(m_sessions.size() + 1);
-    m_sessions.emplace(handle, OpenSession{&site, std::move(container)});
+    m_sessions.emplace(handle, std::move(container));
     return handle;
 }
 
@@ -53,21 +52,13 @@ Container const* Handles::SessionOf(void* hSession) const
 {
     std::lock_guard const lock(m_lock);
     auto const found = m_sessions.find(hSession);
-    bool const lives = found != m_sessions.end() && !found->second.container->Session().Ended();
-    return lives ? found->second.container.get() : nullptr;
+    bool const lives = found != m_sessions.end() && !found->second->Session().Ended();
+    return lives ? found->second.get() : nullptr;
 }
 
 bool Handles::EndSession(void* hSession)
 {
     Container const* const container = SessionOf(hSession);
-    if (!container || !container->Server().Logout(container->Session()))
-        return false;
-    OpenSite* site = nullptr;
-    {
-        std::lock_guard const lock(m_lock);
-        site = m_sessions.find(hSession)->second.site;
-    }
-    site->texts.Close(container->Session().Number());
-    return true;
+    return container && container->Server().Logout(container->Session());
 }
 }  // namespace standin

@@ -25,18 +25,13 @@ public:
     void Initialize(void* hInstance, TLogin const* record);
     bool Uninitialize(void* hInstance, TLogin const* record);  // false if it was not initialised
 
-    void* NewSession(OpenSite& site, std::shared_ptr<Session> session);
+    void* NewSession(Server& server, std::shared_ptr<Session> session);
     Container const* SessionOf(void* hSession) const;  // null for a handle that is none, or no longer
     bool EndSession(void* hSession);                   // false for such a handle
 
 private:
     mutable std::mutex m_lock;
-    std::map<void*, std::set<TLogin const*>> m_instances;  // with the records that are initialised
-    struct OpenSession
-    {
-        OpenSite* site;
-        std::unique_ptr<Container> container;
-    };
-    std::map<void*, OpenSession> m_sessions;  // ended ones, too: their tables stay
+    std::map<void*, std::set<TLogin const*>> m_instances;    // with the records that are initialised
+    std::map<void*, std::unique_ptr<Container>> m_sessions;  // ended ones, too: their tables stay
 };
 }  // namespace standin

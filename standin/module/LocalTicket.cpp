@@ -45,7 +45,7 @@ void LocalTicket::Save() const
 bool LocalTicket::Get(char const* key, PARAM_TYPE type, void* value, int pos)
 {
     KeyValues const* const values = key ? m_ticket.Now().Find(std::string_view(key)) : nullptr;
-    return values && ReadValue(*values, type, value, pos);
+    return values && ReadValue(*values, type, value, pos, m_reader);
 }
 
 bool LocalTicket::GetTable(GETMULTIPAR* table)
@@ -96,6 +96,8 @@ bool LocalTicket::Walk(SWALKPARAMETERS_ACTION action, void* context, char const*
                 break;
             TicketElement const element = *found;  // the action may write to the key
             pos = element.pos + 1;
+            if (element.IsText())
+                element.text->HandOut(m_reader.Mark());
             BIN_STRING binary;
             bool const isNumber = SizeOfNumber(element.type) && element.type != PARAM_POINTER;
             void const* const word = isNumber ? m_numbers.AddressOf(element.word) : WordOf(element, binary);

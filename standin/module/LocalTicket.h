@@ -5,6 +5,7 @@
 #include "standin/module/TicketTable.h"
 #include "standin/module/WalkedNumbers.h"
 #include "standin/server/tickets/OwnedTicket.h"
+#include "standin/server/tickets/TextReader.h"
 #include <filesystem>
 
 namespace standin
@@ -38,6 +39,7 @@ private:
 
     std::filesystem::path const m_file;  // empty in memory
     OwnedTicket m_ticket;
+    TextReader m_reader{1};  // the only one, so that any mark will do
     WalkedNumbers m_numbers;
     TicketTable const m_table{*this};
 };

@@ -8,9 +8,9 @@ namespace standin
 bool ReadTicket(TicketService& tickets, Session const& session, TicketAddress address,
                 Incarnation incarnation, char const* key, PARAM_TYPE type, void* value, int pos)
 {
-    return key &&
-           tickets.LookAtKey(session, address, incarnation, key,
-                             [&](KeyValues const& values) { return ReadValue(values, type, value, pos); });
+    return key && tickets.LookAtKey(session, address, incarnation, key,
+                                    [&](KeyValues const& values)
+                                    { return ReadValue(values, type, value, pos, session.Reader()); });
 }
 
 // All of it from the ticket of one moment.
@@ -25,7 +25,8 @@ bool ReadTable(TicketService& tickets, Session const& session, TicketAddress add
         {
             std::string_view const key = record->key;
             KeyValues const* const values = !limit || limit->Selects(key) ? ticket.Find(key) : nullptr;
-            record->ok = values && ReadValue(*values, record->type, record->value, record->pos);
+            record->ok =
+                values && ReadValue(*values, record->type, record->value, record->pos, session.Reader());
         }
         return true;
     };
@@ -84,7 +85,8 @@ bool OpenTicket::SetTable(SETMULTIPAR* table)
 // walk that left out values would lose them for good where a ticket is copied by walking over it.
 bool OpenTicket::Walk(SWALKPARAMETERS_ACTION action, void* context, char const* prefix, int)
 {
-    if (!action)
+    auto const texts = m_session.HoldTexts();  // the session may end meanwhile, in the action or elsewhere
+    if (!action || !texts)
         return false;
     auto const values = m_tickets.Values(m_session, m_address, Which(), prefix ? prefix : "");
     if (!values)
@@ -95,7 +97,6 @@ bool OpenTicket::Walk(SWALKPARAMETERS_ACTION action, void* context, char const* 
         bool const isNumber = SizeOfNumber(value.element.type) && value.element.type != PARAM_POINTER;
         void const* const word =
             isNumber ? m_numbers.AddressOf(value.element.word) : WordOf(value.element, binary);
-        // The action may have ended the session, and the texts with it.
         if (m_session.Ended() ||
             !action(context, value.key->CStr(), value.element.type, word, value.element.pos))
             break;

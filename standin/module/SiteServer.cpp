@@ -61,7 +61,7 @@ OpenSite& Opened(std::filesystem::path const& folder)
 }  // namespace
 
 OpenSite::OpenSite(std::filesystem::path const& folder)
-    : site(folder, ShippedSeed()), server(site.store(), texts, site.folder())
+    : site(folder, ShippedSeed()), server(site.store(), site.folder())
 {
     site.PutInOrder(server);
 }

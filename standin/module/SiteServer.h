@@ -2,7 +2,6 @@
 // process, since containers that clients hold lead there. For any thread.
 #pragma once
 
-#include "standin/module/KeptTexts.h"
 #include "standin/server/site/Server.h"
 #include "standin/server/site/Site.h"
 
@@ -13,7 +12,6 @@ struct OpenSite
     explicit OpenSite(std::filesystem::path const& folder);
 
     Site site;
-    KeptTexts texts;
     Server server;
 };
 

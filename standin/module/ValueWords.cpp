@@ -7,27 +7,28 @@ namespace standin
 {
 namespace
 {
-void const* WordOf(PARAM_TYPE type, unsigned long long const& word, TicketText* text, BIN_STRING& binary)
+void const* WordOf(PARAM_TYPE type, unsigned long long const& word, TicketText const* text,
+                   BIN_STRING& binary)
 {
     if (type == PARAM_POINTER)
         return std::bit_cast<void const*>(word);
     if (!text)
         return &word;  // a short number's bytes come first
-    text->HandOut();
     if (type == PARAM_STRING)
         return text->bytes.c_str();
     binary = {text->bytes.data(), text->bytes.size()};
     return &binary;
 }
 
-void CopyTo(void* out, TicketElement const& element)
+void CopyTo(void* out, TicketElement const& element, TextReader& reader)
 {
     if (!element.IsText())
     {
         std::memcpy(out, &element.word, SizeOfNumber(element.type));
         return;
     }
-    element.text->HandOut();
+    element.text->HandOut(reader.Mark());
+    reader.NoteRead();
     if (element.type == PARAM_STRING)
         *static_cast<char const**>(out) = element.text->bytes.c_str();
     else
@@ -55,7 +56,7 @@ std::optional<TicketValue> ValueOf(PARAM_TYPE type, void const* word)
 }
 }  // namespace
 
-bool ReadValue(KeyValues const& values, PARAM_TYPE type, void* out, int pos)
+bool ReadValue(KeyValues const& values, PARAM_TYPE type, void* out, int pos, TextReader& reader)
 {
     if (!out || pos < -1)
         return false;
@@ -77,7 +78,7 @@ bool ReadValue(KeyValues const& values, PARAM_TYPE type, void* out, int pos)
     if (type == PARAM_NONE)
         *static_cast<int*>(out) = element->type;
     else if (type == element->type)
-        CopyTo(out, *element);
+        CopyTo(out, *element, reader);
     else
         return false;
     return true;

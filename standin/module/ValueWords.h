@@ -3,6 +3,7 @@
 
 #include "comgui/ticket/BIN_STRING.h"
 #include "comgui/ticket/SETMULTIPAR.h"
+#include "standin/server/tickets/TextReader.h"
 #include "standin/server/tickets/WritePlan.h"
 #include <span>
 #include <vector>
@@ -11,10 +12,10 @@ namespace standin
 {
 // Answers a read of a key's values as the slots promise; *out is untouched when it gives false. False for a
 // null out, too.
-bool ReadValue(KeyValues const& values, PARAM_TYPE type, void* out, int pos);
+bool ReadValue(KeyValues const& values, PARAM_TYPE type, void* out, int pos, TextReader& reader);
 
 // The value word of a write of an element. It points into the element, for a BINSTRING at binary, which is
-// filled in. Its text counts as handed out.
+// filled in.
 void const* WordOf(TicketElement const& element, BIN_STRING& binary);
 void const* WordOf(TicketValue const& value, BIN_STRING& binary);
 

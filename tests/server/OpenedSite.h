@@ -1,7 +1,6 @@
 // A site on disk that a program has open, with its server, as the plug-in opens one.
 #pragma once
 
-#include "standin/module/KeptTexts.h"
 #include "standin/server/site/Site.h"
 #include <memory>
 #include <string>
@@ -11,7 +10,7 @@ class OpenedSite
 {
 public:
     OpenedSite(std::filesystem::path const& folder, std::filesystem::path const& seed)
-        : site(folder, seed), m_server(std::make_unique<standin::Server>(site.store(), texts, site.folder()))
+        : site(folder, seed), m_server(std::make_unique<standin::Server>(site.store(), site.folder()))
     {
         site.PutInOrder(*m_server);
     }
@@ -67,7 +66,6 @@ public:
         return tickets;
     }
 
-    standin::KeptTexts texts;
     standin::Site site;
 
 private:

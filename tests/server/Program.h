@@ -1,7 +1,6 @@
 // One of several programs that have a site in memory open at the same time, with an administrator's session.
 #pragma once
 
-#include "standin/module/KeptTexts.h"
 #include "standin/module/OpenTicket.h"
 #include "standin/server/site/Server.h"
 #include "standin/server/store/memory/MemoryStore.h"
@@ -14,11 +13,9 @@ class Program
 public:
     // folder: of the site.
     Program(std::shared_ptr<standin::MemorySite> const& site, std::filesystem::path const& folder)
-        : store(site), server(store, texts, folder),
-          session(static_cast<unsigned long long>(store.OpenSession("admin")),
-                  {"admin", "", standin::AdministratorRole, 1})
+        : store(site), server(store, folder),
+          opened(server.Open({"admin", "", standin::AdministratorRole, 1})), session(*opened)
     {
-        texts.Open(session.Number());
         server.StartCare();
     }
 
@@ -69,8 +66,8 @@ public:
     bool Create(standin::TicketAddress address) { return Tickets().Create(session, address).has_value(); }
     bool Delete(standin::TicketAddress address) { return Tickets().Delete(session, address); }
 
-    standin::KeptTexts texts;
     standin::MemoryStore store;
     standin::Server server;
-    standin::Session session;
+    std::shared_ptr<standin::Session> opened;
+    standin::Session& session;
 };

@@ -2,7 +2,6 @@
 // the slots of the plug-in make them.
 #pragma once
 
-#include "standin/module/KeptTexts.h"
 #include "standin/module/OpenTicket.h"
 #include "standin/server/site/Server.h"
 #include "standin/server/store/memory/MemoryStore.h"
@@ -36,7 +35,7 @@ protected:
             store = std::make_unique<standin::MemoryStore>(site);
         if (!server)
         {
-            server = std::make_unique<standin::Server>(*store, texts, siteFolder);
+            server = std::make_unique<standin::Server>(*store, siteFolder);
             server->StartCare();
         }
         return *server;
@@ -47,24 +46,16 @@ protected:
     {
         auto& session = sessions[user];
         if (!session)
-        {
             session = Server().Login(user, "secret");
-            texts.Open(session->Number());
-        }
         return *session;
     }
-    bool Logout(std::string const& user)
-    {
-        bool const ended = Server().Logout(As(user));
-        texts.Close(As(user).Number());
-        return ended;
-    }
+    bool Logout(std::string const& user) { return Server().Logout(As(user)); }
 
     // Texts that are gone from their tickets and that somebody may still have the address of.
-    std::size_t RetiredTexts() const
+    std::size_t RetiredTexts()
     {
         standin::Epochs::Get().Drain();
-        return texts.Count();
+        return Server().Texts().Count();
     }
 
     // Of any type, as that user.
@@ -139,8 +130,6 @@ protected:
     // The program's death and its next start.
     void Restart()
     {
-        for (auto const& [user, session] : sessions)
-            texts.Close(session->Number());
         sessions.clear();
         server.reset();
         store.reset();
@@ -150,7 +139,6 @@ protected:
     std::filesystem::path siteFolder =
         folder.Path();  // a fixture may choose another before the server starts
     std::shared_ptr<standin::MemorySite> site = std::make_shared<standin::MemorySite>();
-    standin::KeptTexts texts;
     std::unique_ptr<standin::MemoryStore> store;
     std::unique_ptr<standin::Server> server;
     std::map<std::string, std::shared_ptr<standin::Session>> sessions;

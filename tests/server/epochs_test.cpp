@@ -38,7 +38,7 @@ Garbage OneText()
 {
     Garbage garbage;
     garbage.texts.push_back(std::make_unique<TicketText>("a text that is long enough to be on the heap"));
-    garbage.texts.back()->HandOut();
+    garbage.texts.back()->HandOut(1);
     return garbage;
 }
 

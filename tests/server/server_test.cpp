@@ -116,7 +116,6 @@ TEST_F(Sessions, ReadersWritersAndLogins_AtOnce_SeeWholeValuesOnly)
                    for (int round = 0; round < 20; ++round)
                    {
                        auto const session = Server().Login("operator", "secret");
-                       texts.Open(session->Number());
                        for (int step = 0; step < 40; ++step)
                        {
                            std::string const text(static_cast<std::size_t>(20 + step),
@@ -129,7 +128,6 @@ TEST_F(Sessions, ReadersWritersAndLogins_AtOnce_SeeWholeValuesOnly)
                                ++broken;
                        }
                        Server().Logout(*session);
-                       texts.Close(session->Number());
                    }
                });
     EXPECT_EQ(broken, 0);

@@ -132,9 +132,8 @@ TEST_F(FoldersOfASite, OfTheOriginal_StayWhenItsCopyIsOpened)
     std::filesystem::copy(Folder(), copy, std::filesystem::copy_options::recursive);
     testing::internal::CaptureStderr();
     Site site(copy, COMGUI_TEST_SEED);
-    KeptTexts texts;
     {
-        Server server(site.store(), texts, copy);
+        Server server(site.store(), copy);
         std::this_thread::sleep_for(
             std::chrono::milliseconds(300));  // for a caretaker that must not work yet
         site.PutInOrder(server);

@@ -409,16 +409,52 @@ TEST_F(TicketPromises, ATextThatNobodyRead_GoesAtOnce)
     EXPECT_EQ(RetiredTexts(), 0u);
 }
 
-TEST_F(TicketPromises, ARetiredText_GoesWithTheLastSessionThatCanHoldIt)
+// In the action or in another thread, which is the same to the walk.
+TEST_F(TicketPromises, TextsOfAWalk_StayToItsEndThoughTheSessionEnds)
 {
+    Set(Job, "A", "first text, too long for any short string");
+    Set(Job, "B", "second text, too long for any short string");
+    standin::FolderTranslator folders(Tickets());
+    standin::OpenTicket const ticket(Tickets(), As("admin"), folders, Job, Tickets().IncarnationOf(Job));
     As("operator");
+    struct Walk
+    {
+        std::function<void(char const*)> onText;
+        int calls = 0;
+    } walk;
+    walk.onText = [&](char const* text)
+    {
+        std::thread([&] { Logout("admin"); }).join();
+        char const* const news = "other";
+        EXPECT_TRUE(Set(As("operator"), Job, "A", PARAM_STRING, news, -1));
+        EXPECT_TRUE(Set(As("operator"), Job, "B", PARAM_STRING, news, -1));
+        EXPECT_EQ(RetiredTexts(), 2u);
+        EXPECT_STREQ(text, "first text, too long for any short string");
+    };
+    auto const action = [](void* context, char const*, PARAM_TYPE, void const* value, int)
+    {
+        auto& now = *static_cast<Walk*>(context);
+        ++now.calls;
+        now.onText(static_cast<char const*>(value));
+        return true;
+    };
+    EXPECT_EQ(ticket.Access()->SWALKPARAMETERS(ticket.Access()->Instance, action, &walk, "", 8000), 1);
+    EXPECT_EQ(walk.calls, 1);
+    EXPECT_EQ(RetiredTexts(), 0u);
+}
+
+TEST_F(TicketPromises, ARetiredText_GoesWithTheLastSessionThatHasReadIt)
+{
+    As("guest");  // reads nothing
     Set(Job, "K", "first");
     Text(Job, "K");
+    char const* text = nullptr;
+    EXPECT_TRUE(Get(As("operator"), Job, "K", PARAM_STRING, &text, -1));
     Set(Job, "K", "second");
     EXPECT_EQ(RetiredTexts(), 1u);
-    As("guest");  // came later, and cannot have seen it
     Logout("admin");
     EXPECT_EQ(RetiredTexts(), 1u);
+    EXPECT_STREQ(text, "first");
     Logout("operator");
     EXPECT_EQ(RetiredTexts(), 0u);
 }

@@ -94,7 +94,7 @@ std::uint64_t Epochs::OldestReader()
 void Epochs::Dispose(Garbage&& garbage, TextKeeper& texts)
 {
     std::erase_if(garbage.texts,
-                  [](auto const& text) { return !text->handedOut.load(std::memory_order_relaxed); });
+                  [](auto const& text) { return !text->readers.load(std::memory_order_relaxed); });
     if (!garbage.texts.empty())
         texts.Keep(std::move(garbage.texts));
     garbage.memory.clear();

@@ -12,6 +12,18 @@ void Session::Limit(TicketAddress address, KeyFilter keys)
     m_limited.store(!m_limits.empty(), std::memory_order_release);
 }
 
+void Session::KeepTexts(std::shared_ptr<TextReader const> lease)
+{
+    std::lock_guard const lock(m_lock);
+    m_texts.swap(lease);
+}
+
+std::shared_ptr<TextReader const> Session::HoldTexts() const
+{
+    std::lock_guard const lock(m_lock);
+    return m_texts;
+}
+
 void Session::SetEndPoint(std::string endPoint)
 {
     std::lock_guard const lock(m_lock);

@@ -4,6 +4,7 @@
 
 #include "standin/server/store/Store.h"
 #include "standin/server/tickets/KeyFilter.h"
+#include "standin/server/tickets/TextReader.h"
 #include <atomic>
 #include <filesystem>
 #include <map>
@@ -26,6 +27,13 @@ public:
 
     bool Ended() const { return m_ended.load(std::memory_order_acquire); }
     bool End() { return !m_ended.exchange(true, std::memory_order_acq_rel); }  // false if it had ended before
+
+    // Of the texts of tickets. They are kept for the session while anybody holds them: the session itself, to
+    // the end of the logout, and calls that use more than one text. Null once it has let go.
+    TextReader& Reader() const { return m_reader; }
+    void KeepTexts(std::shared_ptr<TextReader const> lease);
+    std::shared_ptr<TextReader const> HoldTexts() const;
+    void ReleaseTexts() { KeepTexts(nullptr); }
 
     // Where the client is, as "address:port"; empty until it is told.
     void SetEndPoint(std::string endPoint);
@@ -53,9 +61,11 @@ private:
     unsigned long long const m_number;
     User const m_user;
     std::atomic<bool> m_ended{false};
+    TextReader mutable m_reader;
 
     mutable std::mutex m_lock;
     std::map<TicketAddress, std::shared_ptr<KeyFilter const>> m_limits;
+    std::shared_ptr<TextReader const> m_texts;
     std::string m_endPoint;
     std::map<ClientFolder, std::filesystem::path> m_folders;
     std::atomic<bool> m_limited{false};  // spares sessions without limits the lock

@@ -27,7 +27,10 @@ std::optional<std::vector<WalkedValue>> TicketService::Values(Session const& ses
                                           if (limit && !limit->Selects(values->Name()->Text()))
                                               continue;
                                           if (element.IsText())
-                                              element.text->HandOut();
+                                          {
+                                              element.text->HandOut(session.Reader().Mark());
+                                              session.Reader().NoteRead();
+                                          }
                                           found.push_back({values->Name(), element});
                                       }
                                   return true;

@@ -6,8 +6,8 @@
 
 namespace standin
 {
-Server::Server(Store& store, TextKeeper& texts, std::filesystem::path const& site)
-    : m_store(store), m_feed(store, m_notifications, texts), m_writer(store, m_feed, *this),
+Server::Server(Store& store, std::filesystem::path const& site, KeptTexts::Clock clock)
+    : m_store(store), m_texts(std::move(clock)), m_feed(store, m_notifications, m_texts), m_writer(store, m_feed, *this),
       m_tickets(m_feed, m_writer), m_mirror(m_tickets, site),
       m_transfers(store, m_tickets, m_notifications, site), m_jobs(store, m_tickets, m_writer, m_transfers),
       m_caretaker(store, m_feed, m_tickets, m_writer, m_jobs, m_mirror, site)
@@ -27,8 +27,15 @@ std::shared_ptr<Session> Server::Login(std::string const& user, std::string cons
     }
     if (!Password::Verify(password, known->passwordHash))
         return nullptr;
-    auto const number = static_cast<unsigned long long>(m_store.OpenSession(user));
-    return std::make_shared<Session>(number, std::move(*known));
+    return Open(std::move(*known));
+}
+
+std::shared_ptr<Session> Server::Open(User user)
+{
+    auto const number = static_cast<unsigned long long>(m_store.OpenSession(user.name));
+    auto session = std::make_shared<Session>(number, std::move(user));
+    session->KeepTexts(m_texts.Open(session->Reader()));
+    return session;
 }
 
 bool Server::Logout(Session& session)
@@ -46,6 +53,7 @@ bool Server::Logout(Session& session)
     {
         Report(error.what());  // the row goes with this program
     }
+    session.ReleaseTexts();
     return true;
 }
 

@@ -3,6 +3,7 @@
 #pragma once
 
 #include "standin/server/jobs/JobIntake.h"
+#include "standin/server/sessions/KeptTexts.h"
 #include "standin/server/site/Caretaker.h"
 #include "standin/server/site/SystemTicketMirror.h"
 
@@ -11,8 +12,9 @@ namespace standin
 class Server final : private AfterChange
 {
 public:
-    // site: its folder. Store and texts outlive the server. Throws StoreError.
-    Server(Store& store, TextKeeper& texts, std::filesystem::path const& site);
+    // site: its folder. The store outlives the server. clock: by which texts grow old. Throws StoreError.
+    Server(Store& store, std::filesystem::path const& site,
+           KeptTexts::Clock clock = std::chrono::steady_clock::now);
     ~Server() override;  // not while a call is on its way
     Server(Server const&) = delete;
     Server& operator=(Server const&) = delete;
@@ -20,10 +22,15 @@ public:
     // Null for a wrong user or password, which are not told apart. Throws StoreError.
     std::shared_ptr<Session> Login(std::string const& user, std::string const& password);
 
+    // A session of a user who need not prove who he is.
+    std::shared_ptr<Session> Open(User user);
+
     // False if it had ended before. Waits for the end of a notification callback that runs for the session,
-    // and of its transfers, which are cut. Jobs that it has prepared and not sent go.
+    // and of its transfers, which are cut. Jobs that it has prepared and not sent go, and so do texts that it
+    // alone has read and that are gone from their tickets.
     bool Logout(Session& session);
 
+    KeptTexts const& Texts() const { return m_texts; }
     TicketService& Tickets() { return m_tickets; }
     NotificationService& Notifications() { return m_notifications; }
     TransferService& Transfers() { return m_transfers; }
@@ -54,6 +61,7 @@ private:
 
     // In the order in which one leans on the other.
     Store& m_store;
+    KeptTexts m_texts;
     NotificationService m_notifications;
     Feed m_feed;
     TicketWriter m_writer;

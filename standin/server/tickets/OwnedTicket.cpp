@@ -36,7 +36,7 @@ void OwnedTicket::Become(SnapshotEdit& edit, std::span<ParameterChange> changes)
     for (ParameterChange& change : changes)
         static_cast<void>(change.value.text.release());
     std::copy_if(std::move_iterator(garbage.texts.begin()), std::move_iterator(garbage.texts.end()),
-                 std::back_inserter(m_retired), [](auto const& text) { return text->handedOut.load(); });
+                 std::back_inserter(m_retired), [](auto const& text) { return text->readers.load() != 0; });
 }
 
 void OwnedTicket::Write(std::span<TicketWrite> writes)

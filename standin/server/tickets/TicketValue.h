@@ -4,6 +4,7 @@
 
 #include "standin/server/tickets/StoredValue.h"
 #include <atomic>
+#include <cstdint>
 #include <memory>
 #include <string>
 #include <utility>
@@ -15,15 +16,15 @@ struct TicketText
 {
     explicit TicketText(std::string_view text) : bytes(text) {}
 
-    // Notes that somebody outside has the address. Readers of a text that is already out write nothing.
-    void HandOut()
+    // Notes that somebody outside has the address. Who reads a text once more writes nothing.
+    void HandOut(std::uint64_t reader)
     {
-        if (!handedOut.load(std::memory_order_relaxed))
-            handedOut.store(true, std::memory_order_relaxed);
+        if ((readers.load(std::memory_order_relaxed) & reader) != reader)
+            readers.fetch_or(reader, std::memory_order_relaxed);
     }
 
     std::string const bytes;
-    std::atomic<bool> handedOut{false};
+    std::atomic<std::uint64_t> readers{0};  // the marks of those who may have its address
 };
 
 // Texts that a change took out of their ticket.

@@ -1,0 +1,59 @@
+// Somebody outside who reads texts and keeps their addresses: the mark that he leaves on each, and how many
+// he has read. For any thread.
+#pragma once
+
+#include <atomic>
+#include <cstdint>
+
+namespace standin
+{
+class TextReader
+{
+public:
+    explicit TextReader(std::uint64_t marks = 0) : m_marks(marks) {}
+    TextReader(TextReader const&) = delete;
+    TextReader& operator=(TextReader const&) = delete;
+
+    // One bit; 0: his reading leaves no trace. Set before he reads.
+    void SetMark(std::uint64_t mark) { m_marks = mark; }
+    std::uint64_t Mark() const { return m_marks; }
+
+    // Threads that read in turns with others of their process count a few at a time, and lose some: what is
+    // counted is never too much.
+    void NoteRead() noexcept
+    {
+        Batch& batch = s_batch;
+        if (batch.reader != m_number)
+        {
+            batch = {m_number, 0};
+            m_reads.fetch_add(1, std::memory_order_relaxed);
+        }
+        else if (++batch.reads == BatchSize)
+        {
+            batch.reads = 0;
+            m_reads.fetch_add(BatchSize, std::memory_order_relaxed);
+        }
+    }
+    std::uint64_t Reads() const { return m_reads.load(std::memory_order_relaxed); }
+
+private:
+    static constexpr std::uint64_t BatchSize = 64;
+
+    // What a thread has read and not counted yet, of the reader that it read for last.
+    struct Batch
+    {
+        std::uint64_t reader;
+        std::uint64_t reads;
+    };
+#ifdef __GLIBC__
+    // Without this a plug-in's thread_local costs a call.
+    [[gnu::tls_model("initial-exec")]]
+#endif
+    static inline thread_local constinit Batch s_batch{};
+    static inline std::atomic<std::uint64_t> s_newest{0};
+
+    std::uint64_t const m_number = s_newest.fetch_add(1, std::memory_order_relaxed) + 1;  // none twice
+    std::uint64_t m_marks;
+    std::atomic<std::uint64_t> m_reads{0};
+};
+}  // namespace standin
