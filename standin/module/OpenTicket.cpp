@@ -1,6 +1,7 @@
 #include "standin/module/OpenTicket.h"
 
 #include "comgui/ticket/TICKET_OP.h"
+#include "standin/module/FolderReading.h"
 #include "standin/module/ValueWords.h"
 
 namespace standin
@@ -63,7 +64,20 @@ bool WriteTable(TicketService& tickets, Session const& session, TicketAddress ad
 
 bool OpenTicket::Get(char const* key, PARAM_TYPE type, void* value, int pos)
 {
-    return ReadTicket(m_tickets, m_session, m_address, Which(), key, type, value, pos);
+    bool const isRead = ReadTicket(m_tickets, m_session, m_address, Which(), key, type, value, pos);
+    if (m_address != SystemTicket || !key) [[likely]]
+        return isRead;
+    int const number = isRead && type == PARAM_INT ? *static_cast<int const*>(value) : 0;
+    char const* const text =
+        isRead && type == PARAM_STRING ? *static_cast<char const* const*>(value) : nullptr;
+    auto& folders = FolderReading::OfThisThread();
+    if (!folders.Note(this, key, type, number, text))
+        return isRead;
+    auto const texts = m_session.HoldTexts();
+    if (texts)
+        *static_cast<char const**>(value) =
+            m_tickets.HandOut(m_session, folders.Resolved(m_tickets.Folders()));
+    return texts != nullptr;
 }
 
 bool OpenTicket::GetTable(GETMULTIPAR* table)

@@ -39,6 +39,8 @@ public:
         return m_cache;
     }
 
+    TextKeeper& Texts() { return m_cache.Texts(); }
+
     // Brings the parameters of a ticket into the cache. False if there is no such ticket, or if it cannot be
     // read. Not inside an Epochs::Guard.
     bool Load(TicketAddress address);

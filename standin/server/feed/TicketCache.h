@@ -16,6 +16,7 @@ class TicketCache
 {
 public:
     explicit TicketCache(TextKeeper& texts) : m_texts(texts) {}
+    TextKeeper& Texts() const { return m_texts; }
     ~TicketCache();  // no reader looks any more
     TicketCache(TicketCache const&) = delete;
     TicketCache& operator=(TicketCache const&) = delete;

@@ -38,6 +38,16 @@ std::optional<std::vector<WalkedValue>> TicketService::Values(Session const& ses
     return isThere ? std::optional(std::move(found)) : std::nullopt;
 }
 
+char const* TicketService::HandOut(Session const& session, std::string_view text)
+{
+    TicketTexts texts;
+    texts.push_back(std::make_unique<TicketText>(text));
+    char const* const handedOut = texts.back()->bytes.c_str();
+    texts.back()->HandOut(session.Reader().Mark());
+    m_feed.Texts().Keep(std::move(texts));
+    return handedOut;
+}
+
 bool TicketService::Write(Session const& session, TicketAddress address, Incarnation incarnation,
                           std::span<TicketWrite> writes)
 {

@@ -56,6 +56,9 @@ public:
     std::optional<std::vector<WalkedValue>> Values(Session const& session, TicketAddress address,
                                                    Incarnation incarnation, std::string_view prefix);
 
+    // A text of no ticket for a session that holds its texts; it stays as one does that has left its ticket.
+    char const* HandOut(Session const& session, std::string_view text);
+
     // As TicketWriter::Write; false, with every ok false, also without the right.
     bool Write(Session const& session, TicketAddress address, Incarnation incarnation,
                std::span<TicketWrite> writes);

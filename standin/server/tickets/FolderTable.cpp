@@ -28,27 +28,26 @@ bool BeginsWithVariable(std::string_view value) { return value.size() >= 4 && va
 FolderTable::FolderTable(std::array<std::string, FolderRows.size()> const& values)
 {
     for (std::size_t row = 0; row < FolderRows.size(); ++row)
-    {
-        if (values[row].empty())
-            continue;
-        std::string folder = Cleaned(values[row]);
-        // Comes to an end: the shortest variable takes six bytes, and a folder that begins with "$(" three.
-        while (BeginsWithVariable(folder))
-        {
-            auto const end = folder.find(')', 2);
-            auto const above = end == std::string::npos
-                                   ? std::nullopt
-                                   : FolderOf(std::string_view(folder).substr(2, end - 2));
-            if (!above)
-                break;
-            folder = *above + folder.substr(end + 1);
-        }
-        m_known[row] = !BeginsWithVariable(folder);
-        if (m_known[row])
-            m_folders[row] = std::move(folder);
-        else
+        if (!values[row].empty() && !Add(row, values[row]))
             m_unresolved.push_back(row);
+}
+
+bool FolderTable::Add(std::size_t row, std::string_view value)
+{
+    std::string folder = Cleaned(std::string(value));
+    // Comes to an end: the shortest variable takes six bytes, and a folder that begins with "$(" three.
+    while (BeginsWithVariable(folder))
+    {
+        auto const end = folder.find(')', 2);
+        auto const above =
+            end == std::string::npos ? std::nullopt : FolderOf(std::string_view(folder).substr(2, end - 2));
+        if (!above)
+            return false;
+        folder = *above + folder.substr(end + 1);
     }
+    m_known[row] = true;
+    m_folders[row] = std::move(folder);
+    return true;
 }
 
 std::optional<std::string> FolderTable::FolderOf(std::string_view variable) const

@@ -27,8 +27,13 @@ inline constexpr char UseFolderVariablesKey[] = "System/UseFolderVariables";
 class FolderTable
 {
 public:
+    FolderTable() = default;
+
     // values: row by row as the ticket has them; empty: no such folder.
     explicit FolderTable(std::array<std::string, FolderRows.size()> const& values);
+
+    // The next row, which may not be empty, behind those above. False if it cannot be resolved.
+    bool Add(std::size_t row, std::string_view value);
 
     // With slashes and without one at the end; nothing for a variable that is unknown, has no value, or
     // cannot be resolved.
