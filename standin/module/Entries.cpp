@@ -9,6 +9,7 @@
 #include "standin/module/TicketData.h"
 #include "standin/module/Transfers.h"
 #include "standin/server/files/Report.h"
+#include "standin/server/sessions/Password.h"
 #include <cstdio>
 #include <cstring>
 #include <strings.h>
@@ -53,6 +54,16 @@ bool IsThisHost(char const* host)
            (*own && strcasecmp(host, own) == 0);
 }
 
+constexpr char PortKey[] = "System/MasterSOAPPort";
+constexpr int PortOfANewSite = 50000;
+
+// Whoever deletes the port, or writes what is none, locks nobody out.
+int PortOf(OpenSite& site)
+{
+    int const port = site.server.Tickets().Int(SystemTicket, PortKey).value_or(PortOfANewSite);
+    return port >= 1 && port <= 65535 ? port : PortOfANewSite;
+}
+
 // The server behind host and port, or a code that says why there is none.
 int FindServer(char const* host, int port, OpenSite*& site)
 {
@@ -61,8 +72,7 @@ int FindServer(char const* host, int port, OpenSite*& site)
     site = SiteOfThisProcess();
     if (!site)
         return MODULE_SITE_UNAVAILABLE;
-    return site->server.Tickets().Int(SystemTicket, "System/MasterSOAPPort") == port ? MODULE_DONE
-                                                                                     : MODULE_NO_SERVER_THERE;
+    return PortOf(*site) == port ? MODULE_DONE : MODULE_NO_SERVER_THERE;
 }
 
 int Open(void** hInstance)
@@ -128,7 +138,8 @@ int LogIn(TLogin& login)
         return found;
     try
     {
-        auto const session = site->server.Login(TextOf(login.szUser), TextOf(login.szPassword));
+        Password::Secret const password(TextOf(login.szPassword));
+        auto const session = site->server.Login(TextOf(login.szUser), password.Text());
         if (!session)
             return MODULE_LOGIN_REFUSED;
         FillIn(login, session->Who(), Handles::Get().NewSession(site->server, session));

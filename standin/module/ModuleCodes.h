@@ -29,6 +29,7 @@ enum ModuleCode : int
     MODULE_TARGET_UNWRITABLE = TargetUnwritable,
     MODULE_EMPTY_JOB = EmptyJob,
     MODULE_TRANSFER_CUT = TransferCut,
+    MODULE_TOO_MANY_TRANSFERS = TooManyTransfers,
 };
 static_assert(int{MODULE_UNKNOWN_TICKET} == JobGone && int{MODULE_FAILED} == TransferFailed);
 }  // namespace standin

@@ -4,9 +4,11 @@
 #include "standin/module/ModuleCodes.h"
 #include "tests/support/ChildProcess.h"
 #include <algorithm>
+#include <atomic>
 #include <cstring>
 #include <filesystem>
 #include <functional>
+#include <pthread.h>
 #include <set>
 #include <thread>
 #include <unistd.h>
@@ -69,6 +71,68 @@ TEST_F(Entries, IsAlive_FollowsAChangeOfTheSitesPort)
     EXPECT_TRUE(access->MSETPARAMETER(access->Instance, 0, 0, "System/MasterSOAPPort", PARAM_INT, &port, -1));
     EXPECT_EQ(IsAlive("localhost", 50000), MODULE_NO_SERVER_THERE);
     EXPECT_EQ(IsAlive("localhost", 50500), MODULE_DONE);
+}
+
+// Nobody can be locked out by the port, not even by who deletes it.
+TEST_F(Entries, IsAlive_WithoutAPortThatIsOne_ThePortIsThatOfANewSite)
+{
+    auto const* const access = Container(LogIn());
+    ASSERT_TRUE(access);
+    auto const write = [&](PARAM_TYPE type, void const* value)
+    { return access->MSETPARAMETER(access->Instance, 0, 0, "System/MasterSOAPPort", type, value, -1); };
+    for (int const port : {0, -1, 65536})
+    {
+        ASSERT_TRUE(write(PARAM_INT, &port));
+        EXPECT_EQ(IsAlive("localhost", 50000), MODULE_DONE) << port;
+        EXPECT_EQ(IsAlive("localhost", port), MODULE_NO_SERVER_THERE) << port;
+    }
+    for (int const port : {1, 65535})
+    {
+        ASSERT_TRUE(write(PARAM_INT, &port));
+        EXPECT_EQ(IsAlive("localhost", port), MODULE_DONE);
+        EXPECT_EQ(IsAlive("localhost", 50000), MODULE_NO_SERVER_THERE) << port;
+    }
+    ASSERT_TRUE(write(PARAM_STRING, "50001"));
+    EXPECT_EQ(IsAlive("localhost", 50000), MODULE_DONE);
+    ASSERT_TRUE(write(PARAM_NONE, nullptr));
+    EXPECT_EQ(IsAlive("localhost", 50000), MODULE_DONE);
+    EXPECT_TRUE(Container(LogIn()));
+}
+
+// A thread that is cancelled ends behind a call, and leaves nothing locked.
+TEST_F(Entries, ThreadThatIsCancelledInACall_EndsBehindIt)
+{
+    auto const* const access = Container(LogIn());
+    ASSERT_TRUE(access);
+    for (int round = 0; round < 30; ++round)
+    {
+        struct Loop
+        {
+            MTICKET_ACCESS const* access;
+            std::atomic<int> calls{0};
+        } loop{access};
+        auto const work = [](void* context) -> void*
+        {
+            auto& now = *static_cast<Loop*>(context);
+            for (int i = 0;; ++i)
+            {
+                now.access->MSETPARAMETER(now.access->Instance, 3, 1, "Test/Cancelled", PARAM_INT, &i, -1);
+                ++now.calls;
+                pthread_testcancel();
+            }
+        };
+        pthread_t thread{};
+        ASSERT_EQ(pthread_create(&thread, nullptr, work, &loop), 0);
+        while (loop.calls < 3)
+            std::this_thread::yield();
+        std::this_thread::sleep_for(std::chrono::microseconds(37 * round));
+        pthread_cancel(thread);
+        void* result = nullptr;
+        ASSERT_EQ(pthread_join(thread, &result), 0);
+        EXPECT_EQ(result, PTHREAD_CANCELED);
+    }
+    int const value = 7;
+    EXPECT_TRUE(access->MSETPARAMETER(access->Instance, 3, 1, "Test/Cancelled", PARAM_INT, &value, -1));
 }
 
 TEST_F(Entries, GetLocalAddress_IsTheLoopbackAddress)

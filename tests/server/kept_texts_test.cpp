@@ -99,6 +99,13 @@ TEST_F(KeptTextsTest, Lease_LivesAsLongAsItsLastCopy)
     EXPECT_EQ(kept.Count(), 0u);
 }
 
+TEST(KeptTextsOfAServer, ThatHasGone_LeaveTheirReadersInPeace)
+{
+    auto kept = std::make_unique<KeptTexts>();
+    Client const client(*kept);
+    kept.reset();
+}
+
 TEST_F(KeptTextsTest, TenMinutesAlone_AreNotEnough)
 {
     Client client(kept);

@@ -1,6 +1,6 @@
 #include "standin/server/sessions/Password.h"
 
-#include <gtest/gtest.h>
+#include <gmock/gmock.h>
 #include <stdexcept>
 
 namespace Password = standin::Password;
@@ -71,4 +71,40 @@ TEST(Password, TooLong_IsRefused)
     EXPECT_TRUE(Password::Verify(std::string(511, 'x'), Password::Hash(std::string(511, 'x'))));
     EXPECT_THROW(Password::Hash(std::string(512, 'x')), std::runtime_error);
     EXPECT_NO_THROW(Password::VerifyNobody(std::string(512, 'x')));
+}
+
+TEST(Password, Secret_LeavesNothingInMemory)
+{
+    using Password::Secret;
+    alignas(Secret) unsigned char room[sizeof(Secret)];  // a short text lies in the object itself
+    auto* const secret = new (room) Secret("s3cret-word");
+    EXPECT_EQ(secret->Text(), "s3cret-word");
+    secret->~Secret();
+    std::string const left(reinterpret_cast<char const*>(room), sizeof room);
+    EXPECT_EQ(left.find("s3cret"), left.npos);
+    EXPECT_EQ(left.find("word"), left.npos);
+}
+
+TEST(PasswordFailures, AfterAFew_WaitLongerAndLonger)
+{
+    Password::Failures failures;
+    Password::Failures::Time now{};
+    std::vector<long long> waits;
+    for (int i = 0; i < 13; ++i)
+        waits.push_back(failures.Note(now += std::chrono::seconds(1)).count());
+    EXPECT_THAT(waits, testing::ElementsAre(0, 0, 0, 0, 0, 100, 200, 400, 800, 1600, 3200, 3200, 3200));
+}
+
+TEST(PasswordFailures, AfterAQuietMinute_BeginAnew)
+{
+    Password::Failures failures;
+    Password::Failures::Time now{};
+    now += std::chrono::hours(1);
+    for (int i = 0; i < 8; ++i)
+        failures.Note(now);
+    EXPECT_GT(failures.Note(now + std::chrono::seconds(60)).count(), 0);
+    EXPECT_EQ(failures.Note(now + std::chrono::seconds(121)).count(), 0);
+    for (int i = 0; i < 4; ++i)
+        EXPECT_EQ(failures.Note(now + std::chrono::seconds(122)).count(), 0) << "five again";
+    EXPECT_GT(failures.Note(now + std::chrono::seconds(123)).count(), 0);
 }

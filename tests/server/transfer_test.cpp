@@ -672,13 +672,65 @@ TEST_F(LaterTransfers, RelativePath_CountsFromWhereTheClientWasWhenItAsked)
     EXPECT_EQ(ContentOf(Temp("second")), "content");
 }
 
-TEST_F(LaterTransfers, SwitchingOff_DoesNotTouchThem)
+// Changes that wait for a callback go when the client switches them off; a transfer's end that waits does
+// not.
+TEST_F(LaterTransfers, SwitchingOff_TakesBackWhatWaits_ButNotTheirEnds)
 {
-    Listen("operator");
     auto& service = Server().Notifications();
-    EXPECT_TRUE(service.Disable(As("operator"), 1, AllTickets));
+    int const id = service.NewId();
+    std::atomic<bool> isHeld{false};
+    std::atomic<bool> mayGoOn{false};
+    std::vector<int> told;
+    service.Register(As("operator"), id,
+                     [&](Notification const& each)
+                     {
+                         isHeld = true;
+                         while (!mayGoOn)
+                             std::this_thread::yield();
+                         std::lock_guard const guard(lock);
+                         told.push_back(each.kind);
+                         changed.notify_all();
+                     });
+    standin::TicketAddress const job{3, 1};
+    ASSERT_TRUE(service.Enable(As("operator"), id, job, KeyFilter(nullptr)));
+    Set(job, "K", 1);
+    while (!isHeld)
+        std::this_thread::yield();
+    Set(job, "K", 2);
     PutLater("operator", Write("a", "content"), "$(TEMP)/a");
-    EXPECT_THAT(Calls(1), ElementsAre("6 0/0 code 0" + ended));
+    PutLater("operator", Write("a", "content"), "$(TEMP)/b");
+    while (!fs::exists(Temp("b")))
+        std::this_thread::yield();
+    std::thread switching([&] { EXPECT_TRUE(service.Disable(As("operator"), id, job)); });
+    while (static_cast<ChangeListener&>(service).Wants(job))
+        std::this_thread::yield();
+    static_cast<ChangeListener&>(service).HasRoom();  // behind the lock under which it withdraws
+    mayGoOn = true;
+    switching.join();
+    std::unique_lock guard(lock);
+    changed.wait_for(guard, std::chrono::minutes(2), [&] { return told.size() >= 3; });
+    ASSERT_EQ(told.size(), 3u);
+    EXPECT_NE(told[0], 6);
+    EXPECT_THAT(std::vector(told.begin() + 1, told.end()), ElementsAre(6, 6));
+}
+
+TEST_F(LaterTransfers, MoreThanCanWait_AreRefusedUntilSomeAreDone)
+{
+    constexpr int Most = TransferService::MostWaiting;
+    Listen("operator");
+    Close();
+    std::string const file = Write("a", "c");
+    EXPECT_EQ(PutLater("operator", file, "$(TEMP)/a"), Transferred);
+    AwaitHeld();  // it runs, and waits no more
+    for (int i = 0; i < Most; ++i)
+        ASSERT_EQ(PutLater("operator", file, "$(TEMP)/a"), Transferred) << i;
+    EXPECT_EQ(PutLater("operator", file, "$(TEMP)/b"), TooManyTransfers);
+    EXPECT_EQ(PutLater("guest", file, "$(TEMP)/guest"), Transferred) << "each session has its own";
+    Open();
+    EXPECT_EQ(Calls(Most + 1).size(), static_cast<std::size_t>(Most) + 1);
+    EXPECT_EQ(PutLater("operator", file, "$(TEMP)/b"), Transferred);
+    Calls(Most + 2);
+    EXPECT_TRUE(fs::exists(Temp("b")));
 }
 
 TEST_F(LaterTransfers, Logout_CutsWhatRunsAndTakesBackWhatWaits)

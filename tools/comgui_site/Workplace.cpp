@@ -1,9 +1,11 @@
 #include "tools/comgui_site/Workplace.h"
 
 #include "standin/server/files/AtomicFile.h"
+#include "standin/server/files/RemoveTree.h"
 #include <cerrno>
 #include <fcntl.h>
 #include <sys/stat.h>
+#include <unistd.h>
 
 namespace comgui_site
 {
@@ -27,8 +29,9 @@ void RemoveLeftovers(path const& file)
         if (!standin::IsTemporary(entry.path().filename().string(), file.filename().string()))
             continue;
         Descriptor const folder = Opened(entry.path());
-        if (folder.Number() >= 0 && standin::LockTemporary(folder.Number()))
-            std::filesystem::remove_all(entry.path(), error);
+        if (folder.Number() >= 0 && standin::LockTemporary(folder.Number()) &&
+            standin::RemoveContent(folder.Number()))
+            rmdir(entry.path().c_str());
     }
 }
 }  // namespace
@@ -44,8 +47,8 @@ Workplace::Workplace(path const& file)
 
 Workplace::~Workplace()
 {
-    std::error_code ignored;
-    std::filesystem::remove_all(m_folder, ignored);
+    if (standin::RemoveContent(m_lock.Number()))
+        rmdir(m_folder.c_str());
 }
 
 // False if somebody took it for a leftover before it was locked.

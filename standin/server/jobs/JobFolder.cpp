@@ -1,6 +1,7 @@
 #include "standin/server/jobs/JobFolder.h"
 
 #include "standin/server/files/AtomicFile.h"
+#include "standin/server/files/RemoveTree.h"
 #include "standin/server/files/Report.h"
 #include "standin/server/tickets/TicketAddress.h"
 #include "standin/server/transfer/TransferError.h"
@@ -32,9 +33,8 @@ bool IsMark(std::string_view mark)
     return mark.size() == RandomNameSize && mark.find_first_not_of("0123456789abcdef") == mark.npos;
 }
 
-bool IsMarkFile(path const& file)
+bool IsMarkFile(std::string const& name)
 {
-    std::string const name = file.filename();
     return name.starts_with(MarkBeginning) && IsMark(std::string_view(name).substr(MarkBeginning.size()));
 }
 
@@ -57,10 +57,16 @@ std::vector<path> EntriesOf(path const& folder, std::error_code& error)
     return entries;
 }
 
-bool HasMark(path const& folder, std::string_view mark)
+Descriptor OpenFolder(path const& folder)
+{
+    return Descriptor(open(folder.c_str(), O_RDONLY | O_DIRECTORY | O_NOFOLLOW | O_CLOEXEC));
+}
+
+bool HasMark(Descriptor const& folder, std::string_view mark)
 {
     struct stat file = {};
-    return lstat((folder / FileOf(mark)).c_str(), &file) == 0;
+    return folder.Number() >= 0 &&
+           fstatat(folder.Number(), FileOf(mark).c_str(), &file, AT_SYMLINK_NOFOLLOW) == 0;
 }
 
 // The mark of a folder, and whether there is anything in it. Nothing if nobody can tell.
@@ -71,29 +77,23 @@ struct FolderContent
 };
 std::optional<FolderContent> ContentOf(path const& folder)
 {
-    std::error_code error;
-    auto const entries = EntriesOf(folder, error);
-    if (error)
+    Descriptor const opened = OpenFolder(folder);
+    if (opened.Number() < 0)
         return std::nullopt;
-    auto const mark = std::find_if(entries.begin(), entries.end(), IsMarkFile);
-    return FolderContent{mark == entries.end() ? std::string()
-                                               : mark->filename().string().substr(MarkBeginning.size()),
-                         entries.empty()};
+    auto const names = NamesIn(opened.Number());
+    if (errno != 0)
+        return std::nullopt;
+    auto const mark = std::find_if(names.begin(), names.end(), IsMarkFile);
+    return FolderContent{mark == names.end() ? std::string() : mark->substr(MarkBeginning.size()),
+                         names.empty()};
 }
 
 // The mark goes last: as long as anything is left, it tells whose that was.
-void RemoveWithMarkLast(path const& folder)
+void RemoveWithMarkLast(path const& folder, Descriptor const& opened)
 {
-    std::error_code error;
-    std::vector<path> entries = EntriesOf(folder, error);
-    std::stable_partition(entries.begin(), entries.end(),
-                          [](path const& entry) { return !IsMarkFile(entry); });
-    entries.push_back(folder);
-    for (path const& entry : entries)
-        if (!error)
-            std::filesystem::remove_all(entry, error);
-    if (error && error != std::errc::no_such_file_or_directory)
-        Report(FileFault(folder, "the job's folder cannot be removed", error.value()));
+    bool const isGone = RemoveContent(opened.Number(), IsMarkFile) && rmdir(folder.c_str()) == 0;
+    if (!isGone && errno != ENOENT)
+        Report(FileFault(folder, "the job's folder cannot be removed", errno));
 }
 
 // Not in the place of another; where the file system has no such rename, a plain one has to do.
@@ -118,11 +118,14 @@ bool RemoveMarkedFolder(path const& folder, int id, std::string_view mark)
     if (error == std::errc::no_such_file_or_directory)
         return false;  // somebody else was faster
     if (error)
+    {
         Report(FileFault(folder, "the job's folder cannot be removed", error.value()));
-    else if (!HasMark(apart, mark))
+        return false;
+    }
+    Descriptor const opened = OpenFolder(apart);
+    if (!HasMark(opened, mark))
         return GiveBack(apart, folder);
-    else
-        RemoveWithMarkLast(apart);
+    RemoveWithMarkLast(apart, opened);
     return false;
 }
 
@@ -195,8 +198,8 @@ void SweepOnItsWayOut(path const& folder, int id, KnownJobs const& known)
         rmdir(folder.c_str());
     else if (content->mark.empty() || known.hasMark(id, content->mark))
         GiveBack(folder, folder.parent_path() / std::to_string(id));
-    else
-        RemoveWithMarkLast(folder);
+    else if (Descriptor const opened = OpenFolder(folder); HasMark(opened, content->mark))
+        RemoveWithMarkLast(folder, opened);
 }
 
 // An empty one is what a process leaves that is killed before it can mark it.
@@ -208,11 +211,6 @@ bool MakeFolder(path const& folder)
 }
 
 bool IsOccupied(int reason) { return reason == EEXIST || reason == ENOTEMPTY || reason == ENOTDIR; }
-
-Descriptor OpenFolder(path const& folder)
-{
-    return Descriptor(open(folder.c_str(), O_RDONLY | O_DIRECTORY | O_NOFOLLOW | O_CLOEXEC));
-}
 
 bool Mark(Descriptor const& folder, std::string_view mark)
 {
@@ -274,7 +272,7 @@ void FlushFolderForJobs(FolderTable const& table)
 void RemoveJobFolder(FolderTable const& table, int id, std::string_view mark)
 {
     auto const folder = PathOf(table, id);
-    if (folder && IsMark(mark) && HasMark(*folder, mark))
+    if (folder && IsMark(mark) && HasMark(OpenFolder(*folder), mark))
         RemoveMarkedFolder(*folder, id, mark);
 }
 

@@ -22,7 +22,12 @@ KeptTexts::Lease KeptTexts::Open(TextReader& reader)
         m_open |= BitOf(mark);
         reader.SetMark(BitOf(mark));
     }
-    return {&reader, [this](TextReader const* closing) { Close(*closing); }};
+    auto const close = [kept = std::weak_ptr(m_self)](TextReader const* closing)
+    {
+        if (auto const still = kept.lock())
+            still->Close(*closing);
+    };
+    return {&reader, close};
 }
 
 void KeptTexts::Close(TextReader const& reader)

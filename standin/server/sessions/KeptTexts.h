@@ -26,7 +26,7 @@ public:
     explicit KeptTexts(Clock clock = std::chrono::steady_clock::now) : m_clock(std::move(clock)) {}
 
     // Gives the reader his mark. What he reads is kept for him until the last copy of the lease has gone, as
-    // above. He outlives it, and it does not outlive this.
+    // above. He outlives it.
     Lease Open(TextReader& reader);
 
     // What is old enough goes on the way.
@@ -61,6 +61,9 @@ private:
     void CloseNewest(Time now);
     std::uint64_t WhoIsPast(Group const& group, Time now) const;
     static void TakeAway(Group& group, std::uint64_t readers);
+
+    // What leases know this by, since sessions may outlive their server.
+    std::shared_ptr<KeptTexts> const m_self{this, [](KeptTexts*) {}};
 
     Clock const m_clock;
     mutable std::mutex m_lock;

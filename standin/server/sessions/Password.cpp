@@ -1,10 +1,10 @@
 #include "standin/server/sessions/Password.h"
 
+#include <algorithm>
 #include <cerrno>
 #include <crypt.h>
 #include <memory>
 #include <stdexcept>
-#include <string.h>
 #include <system_error>
 
 namespace standin::Password
@@ -64,6 +64,19 @@ bool Verify(std::string const& password, std::string const& hash)
 {
     std::string const again = WorkSpace().Crypt(password, hash.c_str());
     return !again.empty() && SameBytes(again, hash);
+}
+
+std::chrono::milliseconds Failures::Note(Time now)
+{
+    using namespace std::chrono_literals;
+    constexpr int Free = 5;
+    constexpr int Doublings = 5;
+    std::lock_guard const lock(m_lock);
+    if (now - m_last > 1min)
+        m_count = 0;
+    m_last = now;
+    int const beyond = ++m_count - Free;
+    return beyond <= 0 ? 0ms : 100ms * (1 << std::min(beyond - 1, Doublings));
 }
 
 void VerifyNobody(std::string const& password)

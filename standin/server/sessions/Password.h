@@ -3,10 +3,44 @@
 // so one that holds a zero byte is refused; so is one of 512 bytes and more.
 #pragma once
 
+#include <chrono>
+#include <mutex>
+#include <string.h>
 #include <string>
 
 namespace standin::Password
 {
+// A copy of a password, of which nothing is left in memory when it goes.
+class Secret
+{
+public:
+    explicit Secret(std::string text) : m_text(std::move(text)) {}
+    ~Secret() { explicit_bzero(m_text.data(), m_text.size()); }
+    Secret(Secret const&) = delete;
+    Secret& operator=(Secret const&) = delete;
+
+    std::string const& Text() const { return m_text; }
+
+private:
+    std::string m_text;
+};
+
+// Slows down who guesses: after a few failures within a minute each further one is answered later and later.
+// A right password never waits, so that nobody can keep another out. For any thread.
+class Failures
+{
+public:
+    using Time = std::chrono::steady_clock::time_point;
+
+    // One more; how long its answer is to wait.
+    std::chrono::milliseconds Note(Time now);
+
+private:
+    std::mutex m_lock;
+    int m_count = 0;  // within the minute
+    Time m_last{};
+};
+
 // A new hash with a salt of its own, at the cost that the system's library takes for granted. Throws
 // std::runtime_error when the password is refused or the system offers no yescrypt.
 std::string Hash(std::string const& password);

@@ -2,13 +2,13 @@
 
 #include "standin/server/files/Report.h"
 #include "standin/server/jobs/JobFolder.h"
-#include "standin/server/sessions/Password.h"
+#include <thread>
 
 namespace standin
 {
 Server::Server(Store& store, std::filesystem::path const& site, KeptTexts::Clock clock)
-    : m_store(store), m_texts(std::move(clock)), m_feed(store, m_notifications, m_texts), m_writer(store, m_feed, *this),
-      m_tickets(m_feed, m_writer), m_mirror(m_tickets, site),
+    : m_store(store), m_texts(std::move(clock)), m_feed(store, m_notifications, m_texts),
+      m_writer(store, m_feed, *this), m_tickets(m_feed, m_writer), m_mirror(m_tickets, site),
       m_transfers(store, m_tickets, m_notifications, site), m_jobs(store, m_tickets, m_writer, m_transfers),
       m_caretaker(store, m_feed, m_tickets, m_writer, m_jobs, m_mirror, site)
 {
@@ -18,16 +18,21 @@ Server::~Server() = default;
 
 std::shared_ptr<Session> Server::Login(std::string const& user, std::string const& password)
 {
+    if (auto known = Verified(user, password))
+        return Open(std::move(*known));
+    std::this_thread::sleep_for(m_failures.Note(std::chrono::steady_clock::now()));
+    return nullptr;
+}
+
+// Slow by intent; and as slow for a user who does not exist.
+std::optional<User> Server::Verified(std::string const& user, std::string const& password)
+{
     std::optional<User> known = m_store.FindUser(user);
-    // Slow by intent; and as slow for a user who does not exist.
     if (!known)
-    {
         Password::VerifyNobody(password);
-        return nullptr;
-    }
-    if (!Password::Verify(password, known->passwordHash))
-        return nullptr;
-    return Open(std::move(*known));
+    else if (!Password::Verify(password, known->passwordHash))
+        known.reset();
+    return known;
 }
 
 std::shared_ptr<Session> Server::Open(User user)

@@ -4,6 +4,7 @@
 
 #include "standin/server/jobs/JobIntake.h"
 #include "standin/server/sessions/KeptTexts.h"
+#include "standin/server/sessions/Password.h"
 #include "standin/server/site/Caretaker.h"
 #include "standin/server/site/SystemTicketMirror.h"
 
@@ -19,7 +20,8 @@ public:
     Server(Server const&) = delete;
     Server& operator=(Server const&) = delete;
 
-    // Null for a wrong user or password, which are not told apart. Throws StoreError.
+    // Null for a wrong user or password, which are not told apart; the more of that, the later it is told.
+    // Throws StoreError.
     std::shared_ptr<Session> Login(std::string const& user, std::string const& password);
 
     // A session of a user who need not prove who he is.
@@ -56,12 +58,14 @@ public:
     void Stop(std::chrono::milliseconds patience);
 
 private:
+    std::optional<User> Verified(std::string const& user, std::string const& password);
     void SystemTicketChanged() noexcept override { m_mirror.Write(); }
     std::function<void()> WhenDeleted(TicketAddress ticket, TicketSnapshot const& last) override;
 
     // In the order in which one leans on the other.
     Store& m_store;
     KeptTexts m_texts;
+    Password::Failures m_failures;
     NotificationService m_notifications;
     Feed m_feed;
     TicketWriter m_writer;

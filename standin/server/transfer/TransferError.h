@@ -15,7 +15,8 @@ enum TransferResult : int
     PathRefused = 115,       // a path or name that the server does not take
     TargetUnwritable = 116,  // disk full, or a folder that is missing or may not be written to
     EmptyJob = 117,
-    TransferCut = 118,  // by the session's logout, or by the end of the process
+    TransferCut = 118,       // by the session's logout, or by the end of the process
+    TooManyTransfers = 119,  // wait
 };
 
 // what() is one clear line, or empty where there is nothing to tell.

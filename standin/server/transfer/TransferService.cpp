@@ -155,6 +155,9 @@ TransferResult TransferService::CarryLater(Session const& session, Request reque
     std::lock_guard const lock(m_lock);
     if (session.Ended() || m_stopped)
         return TransferCut;
+    auto const isOurs = [&](Waiting const& each) { return each.session == session.Number(); };
+    if (std::count_if(m_waiting.begin(), m_waiting.end(), isOurs) >= std::ptrdiff_t{MostWaiting})
+        return TooManyTransfers;
     if (!m_thread.joinable())
         m_thread = std::thread([this] { Work(); });
     m_waiting.push_back({session.Number(), asked, std::move(request)});

@@ -36,6 +36,8 @@ private:
 class TransferService
 {
 public:
+    static constexpr std::size_t MostWaiting = 1000;  // of one session
+
     // site: its folder, where nothing is put nor fetched, whatever the system ticket has for $(INSTALL).
     TransferService(Store& store, TicketService& tickets, NotificationService& notifications,
                     std::filesystem::path const& site)
@@ -63,7 +65,7 @@ public:
 
     // The same later, and told to the session as TransferEnded with the strings "Transfer/Source" and
     // "Transfer/Target" as they came, the int "Transfer/Code" and the int64 "Transfer/Size" in bytes. What is
-    // wrong with the paths themselves, and an ended session, is told at once.
+    // wrong with the paths themselves, and an ended session, is told at once; so are too many.
     TransferResult CarryLater(Session const& session, Request request);
 
     // Runs a transfer of any kind in such a way that it can be cut, and answers how it ended.

@@ -1,5 +1,6 @@
 #include "standin/server/store/sqlite/Database.h"
 
+#include "standin/server/files/Descriptor.h"
 #include <cerrno>
 #include <sqlite3.h>
 #include <system_error>
@@ -35,6 +36,11 @@ char const* RemedyOf(int code)
         return "check the disk and its free space, then try again";
     }
 }
+// Hashes of passwords are in it, and SQLite would let everybody read it. Its other files follow its rights.
+void MakePrivate(std::filesystem::path const& file)
+{
+    Descriptor(open(file.c_str(), O_RDWR | O_CREAT | O_EXCL | O_NOFOLLOW | O_CLOEXEC, 0600));
+}
 }  // namespace
 
 void Database::FinalizeStatement::operator()(sqlite3_stmt* statement) const noexcept
@@ -44,6 +50,8 @@ void Database::FinalizeStatement::operator()(sqlite3_stmt* statement) const noex
 
 Database::Database(std::filesystem::path file, bool mayMake) : m_file(std::move(file))
 {
+    if (mayMake)
+        MakePrivate(m_file);  // if that fails SQLite will tell why
     int const make = mayMake ? SQLITE_OPEN_CREATE : 0;
     int const flags = SQLITE_OPEN_READWRITE | make | SQLITE_OPEN_NOMUTEX | SQLITE_OPEN_EXRESCODE;
     if (sqlite3_open_v2(m_file.c_str(), &m_database, flags, nullptr) != SQLITE_OK)
