@@ -1,28 +1,77 @@
 #include "bench/site/CrashWriter.h"
 
-#include "tests/support/SiteClient.h"
+#include "bench/site/LaneListener.h"
+#include <fstream>
 #include <map>
 #include <random>
 #include <sstream>
+#include <sys/mman.h>
+#include <system_error>
+#include <thread>
 #include <unistd.h>
 
 namespace
 {
-constexpr int CounterType = 60;  // ticket LANE + 1
-constexpr int TableType = 61;    // the same, and one that all lanes write
-constexpr int CreatedType = 62;
-constexpr int ListType = 63;
-constexpr TicketName SharedTable{TableType, 100};
-constexpr char CounterKey[] = "Counter";
 constexpr char LaneKey[] = "Lane";
-constexpr int LaneShift = 40;  // in the numbers of the list
 
-// A line leaves at once and whole, so that it is there even if the program dies behind it.
-void Print(std::string line)
+// The jobs of a lane have numbers from 1 up; the number says what the file holds.
+std::string JobPrefix(int lane) { return "lane-" + std::to_string(lane) + "-"; }
+std::size_t JobSize(int number) { return 1000 + static_cast<std::size_t>(number) % 100 * 1000; }
+char JobByte(int number) { return static_cast<char>('a' + number % 26); }
+
+bool IsFileOfJob(std::string const& path, int number)
 {
-    line += '\n';
-    if (write(STDOUT_FILENO, line.data(), line.size()) != static_cast<ssize_t>(line.size()))
-        _exit(1);
+    std::ifstream file(path, std::ios::binary);
+    std::string const content(std::istreambuf_iterator<char>(file), {});
+    return content == std::string(JobSize(number), JobByte(number));
+}
+
+// A file that no other program sees, and that goes with this one.
+class PrivateFile
+{
+public:
+    explicit PrivateFile(std::string const& content) : m_file(memfd_create("job", MFD_CLOEXEC))
+    {
+        if (write(m_file, content.data(), content.size()) != static_cast<ssize_t>(content.size()))
+            throw std::system_error(errno, std::generic_category(), "cannot make a file in memory");
+    }
+    ~PrivateFile() { close(m_file); }
+    PrivateFile(PrivateFile const&) = delete;
+    PrivateFile& operator=(PrivateFile const&) = delete;
+
+    std::string Path() const { return "/proc/self/fd/" + std::to_string(m_file); }
+
+private:
+    int m_file;
+};
+
+std::string JobText(int id, char const* key)
+{
+    return SiteClient::Manager().GetwxStringParameter(JobType, id, key, -1).utf8_string();
+}
+
+struct Job
+{
+    int id;
+    std::string path;
+};
+
+// Those of a lane that have arrived, by number; one without its whole file is told.
+std::map<int, Job> JobsOf(SiteClient const& client, int lane)
+{
+    std::string const prefix = JobPrefix(lane);
+    std::map<int, Job> jobs;
+    for (int const id : client.Ids(JobType))
+    {
+        std::string const name = JobText(id, "Job/Identification/Name");
+        if (!name.starts_with(prefix) || SiteClient::StateOfJob(id) != 1)
+            continue;
+        int const number = std::stoi(name.substr(prefix.size()));
+        jobs[number] = {id, JobText(id, "Job/File")};
+        if (!IsFileOfJob(jobs[number].path, number))
+            PrintLine("torn job " + name);
+    }
+    return jobs;
 }
 
 // What a program finds of a lane. block: where to begin to look for the lane's last number in the list.
@@ -33,8 +82,8 @@ std::string Found(SiteClient const& client, int lane, int block)
         .Walk(block,
               [&](std::int64_t value)
               {
-                  if (value >> LaneShift == lane)
-                      appended = value & ((std::int64_t{1} << LaneShift) - 1);
+                  if (LaneOf(value) == lane)
+                      appended = CountOf(value);
               });
     auto const table = client.Table({TableType, lane + 1});
     std::ostringstream line;
@@ -43,6 +92,9 @@ std::string Found(SiteClient const& client, int lane, int block)
     for (int const id : client.Ids(CreatedType))
         if (client.Get({CreatedType, id}, LaneKey) == lane)
             line << ' ' << id;
+    line << " jobs";
+    for (auto const& [number, job] : JobsOf(client, lane))
+        line << ' ' << number;
     return line.str();
 }
 
@@ -50,7 +102,8 @@ class Writer
 {
 public:
     explicit Writer(CrashTask const& task)
-        : m_lane(task.lane), m_lanes(task.lanes), m_list(m_client, ListType, task.block), m_random(task.seed)
+        : m_lane(task.lane), m_lanes(task.lanes), m_pause(task.pause), m_list(m_client, ListType, task.block),
+          m_random(task.seed)
     {
     }
 
@@ -58,12 +111,16 @@ public:
     {
         if (int const code = m_client.LogIn(); code != 0)
         {
-            Print("refused login " + std::to_string(code));
+            PrintLine("refused login " + std::to_string(code));
             return 1;
         }
         Begin();
         for (;;)
+        {
             Step();
+            if (m_pause.count() > 0)
+                std::this_thread::sleep_for(m_pause);
+        }
     }
 
 private:
@@ -73,22 +130,32 @@ private:
         std::istringstream numbers(found.substr(found.find(' ')));
         numbers >> m_counter >> m_table >> m_appended;
         m_tickets.assign(std::istream_iterator<int>(numbers), {});
-        Print(found);
+        for (auto const& [number, job] : JobsOf(m_client, m_lane))
+            m_jobs.push_back(number);
+        PrintLine(found);
+        MakeTickets();
+        if (!m_listener.Listen(m_client, {CounterType}))
+            PrintLine("refused callback");
+    }
+
+    void MakeTickets()
+    {
         m_client.Create({CounterType, m_lane + 1});
         m_client.Create({TableType, m_lane + 1});
         m_client.Create(SharedTable);
-        if (!m_client.Listen([this](Heard const& heard) { Hear(heard); }) || !m_client.Enable(CounterType))
-            Print("refused callback");
     }
 
     void Step()
     {
+        if (m_random() % 32 == 0)  // flushes the disk, so it is rare
+            return m_jobs.size() < MostJobs ? SendJob() : DropJob();
         switch (m_random() % 8)
         {
         case 0:
             return WriteTable();
         case 1:
-            return Report("", m_client.SetTable(SharedTable, static_cast<std::int64_t>(m_random() >> 1)));
+            Report("", m_client.SetTable(SharedTable, static_cast<std::int64_t>(m_random() >> 1)));
+            return;
         case 2:
             return Append();
         case 3:
@@ -102,78 +169,99 @@ private:
         }
     }
 
-    // what: the report of a change that was done, nothing for one that is nobody's
-    static void Report(std::string const& what, bool isDone)
+    // what: the report of a change that was done, nothing for one that is nobody's. What was refused may lack
+    // its ticket.
+    bool Report(std::string const& what, bool isDone)
     {
         if (!isDone)
-            Print("refused " + what);
+        {
+            PrintLine("refused " + what);
+            MakeTickets();
+        }
         else if (!what.empty())
-            Print(what);
+            PrintLine(what);
+        return isDone;
     }
 
     void Count()
     {
         bool const isDone = m_client.Set({CounterType, m_lane + 1}, CounterKey, m_counter + 1);
-        Report("counter " + std::to_string(++m_counter), isDone);
+        m_counter += Report("counter " + std::to_string(m_counter + 1), isDone) ? 1 : 0;
     }
 
     void WriteTable()
     {
         bool const isDone = m_client.SetTable({TableType, m_lane + 1}, m_table + 1);
-        Report("table " + std::to_string(++m_table), isDone);
+        m_table += Report("table " + std::to_string(m_table + 1), isDone) ? 1 : 0;
     }
 
     void Append()
     {
         bool const isDone = m_list.Append((std::int64_t{m_lane} << LaneShift) + m_appended + 1);
-        Report("append " + std::to_string(++m_appended) + " " + std::to_string(m_list.Block()), isDone);
+        std::string const block = std::to_string(m_list.Block());
+        m_appended += Report("append " + std::to_string(m_appended + 1) + " " + block, isDone) ? 1 : 0;
     }
 
     void CreateTicket()
     {
         auto const id = m_client.CreateNext(CreatedType);
         bool const isDone = id && m_client.Set({CreatedType, *id}, LaneKey, m_lane);
-        m_tickets.push_back(id.value_or(0));
-        Report("create " + std::to_string(m_tickets.back()), isDone);
+        if (Report("create " + std::to_string(id.value_or(0)), isDone))
+            m_tickets.push_back(*id);
     }
 
     void DeleteTicket()
     {
         bool const isDone = m_client.Delete({CreatedType, m_tickets.front()});
-        Report("delete " + std::to_string(m_tickets.front()), isDone);
-        m_tickets.erase(m_tickets.begin());
+        if (Report("delete " + std::to_string(m_tickets.front()), isDone))
+            m_tickets.erase(m_tickets.begin());
+    }
+
+    // Half of the jobs are announced before.
+    void SendJob()
+    {
+        int const number = m_jobs.empty() ? 1 : m_jobs.back() + 1;
+        std::string const name = JobPrefix(m_lane) + std::to_string(number);
+        PrivateFile const file(std::string(JobSize(number), JobByte(number)));
+        bool const isPrepared = m_random() % 2 == 0 || SiteClient::PrepareJob(name) >= 0;
+        bool const isDone = isPrepared && SiteClient::SendJob(file.Path(), name) == 0;
+        if (Report("send " + std::to_string(number), isDone))
+            m_jobs.push_back(number);
+    }
+
+    void DropJob()
+    {
+        int const number = m_jobs.front();
+        auto const jobs = JobsOf(m_client, m_lane);
+        auto const job = jobs.find(number);
+        if (job == jobs.end())
+            return PrintLine("lost job " + std::to_string(number) + " of the lane");
+        if (!Report("drop " + std::to_string(number), m_client.Delete({JobType, job->second.id})))
+            return;
+        m_jobs.erase(m_jobs.begin());
+        if (std::filesystem::exists(job->second.path))
+            PrintLine("torn job " + std::to_string(number) + " is deleted, but has its file");
     }
 
     void LookAt(TicketName ticket) const
     {
         auto const table = m_random() % 2 == 0 ? m_client.Table(ticket) : m_client.TableOfXml(ticket);
         if (!SiteClient::IsWhole(table))
-            Print("torn table " + std::to_string(ticket.id));
-    }
-
-    // On the server's thread. A counter increases by one; its first value is unknown.
-    void Hear(Heard const& heard)
-    {
-        if (heard.kind != Heard::Changed)
-            return;
-        std::int64_t const value = *static_cast<long long const*>(heard.records->value);
-        auto const [last, isFirst] = m_heard.try_emplace(heard.ticket.id, value);
-        if (!isFirst && value != last->second + 1)
-            Print("misheard " + std::to_string(value) + " of lane " + std::to_string(heard.ticket.id - 1) +
-                  " behind " + std::to_string(last->second));
-        last->second = value;
+            PrintLine("torn table " + std::to_string(ticket.id));
     }
 
     int const m_lane;
     int const m_lanes;
-    SiteClient m_client;
+    std::chrono::microseconds const m_pause;
+    LaneListener m_listener;
+    SiteClient m_client;  // does not outlive what hears for it
     SharedList m_list;
     std::mt19937 mutable m_random;
     std::int64_t m_counter = 0;
     std::int64_t m_table = 0;
     std::int64_t m_appended = 0;
     std::vector<int> m_tickets;  // the oldest first
-    std::map<int, std::int64_t> m_heard;
+    std::vector<int> m_jobs;     // the same
 };
 }  // namespace
 
@@ -184,23 +272,23 @@ int CheckLanes(int lanes)
     SiteClient client;
     if (int const code = client.LogIn(); code != 0)
     {
-        Print("refused login " + std::to_string(code));
+        PrintLine("refused login " + std::to_string(code));
         return 1;
     }
     for (int lane = 0; lane < lanes; ++lane)
-        Print(Found(client, lane, 1));
-    std::map<std::int64_t, std::int64_t> last;
+        PrintLine(Found(client, lane, 1));
+    std::map<int, std::int64_t> last;
     SharedList(client, ListType)
         .Walk(1,
               [&](std::int64_t value)
               {
-                  std::int64_t const number = value & ((std::int64_t{1} << LaneShift) - 1);
-                  std::int64_t& before = last[value >> LaneShift];
+                  std::int64_t const number = CountOf(value);
+                  std::int64_t& before = last[LaneOf(value)];
                   if (number != before + 1)
-                      Print("disordered " + std::to_string(number) + " of lane " +
-                            std::to_string(value >> LaneShift) + " behind " + std::to_string(before));
+                      PrintLine("disordered " + std::to_string(number) + " of lane " +
+                                std::to_string(LaneOf(value)) + " behind " + std::to_string(before));
                   before = number;
               });
-    Print("done");
+    PrintLine("done");
     return 0;
 }

@@ -1,16 +1,19 @@
-// One of the programs that crash_series starts, to be killed. It has a lane, in which no other program
-// writes: a counter, a table, numbers that it appends to a list of all lanes, and tickets that it creates and
-// deletes, the oldest as soon as there are MostTickets. It reports a change when the call has returned, by a
-// line:
-//     found COUNTER TABLE APPENDED [ID...]    first of all: what it finds of its lane, with its tickets' ids
-//     counter N | table N | append N BLOCK | create ID | delete ID    what was done
-//     torn WHAT | misheard WHAT | refused WHAT                        what must not be
+// One of the programs that crash_series and soak start, to be killed. It has a lane, in which no other
+// program writes: a counter, a table, numbers that it appends to a list of all lanes, tickets that it creates
+// and deletes, the oldest as soon as there are MostTickets, and jobs that it sends and deletes likewise. It
+// reports a change when the call has returned, by a line:
+//     found COUNTER TABLE APPENDED [ID...] jobs [N...]    first of all: what it finds of its lane
+//     counter N | table N | append N BLOCK | create ID | delete ID | send N | drop N    what was done
+//     torn WHAT | misheard WHAT | refused WHAT                                        what must not be
 // It dies between any two instructions; so of its last change, and of no other, the report may be missing.
+// What is refused it tries again: it was not done.
 #pragma once
 
+#include <chrono>
 #include <cstddef>
 
 inline constexpr std::size_t MostTickets = 3;
+inline constexpr std::size_t MostJobs = 2;
 
 struct CrashTask
 {
@@ -18,6 +21,7 @@ struct CrashTask
     int lanes;  // of all writers
     int block;  // of the list: where the lane's last number is, or before
     unsigned seed;
+    std::chrono::microseconds pause{};  // between two steps
 };
 
 // Returns only if the login fails: the exit code.

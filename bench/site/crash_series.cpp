@@ -2,17 +2,15 @@
 // and starts new ones in their place, and checks that every acknowledged change is there. Starts
 // itself anew for each of them.
 #include "bench/site/CrashWriter.h"
+#include "bench/site/Lane.h"
 #include "tests/support/Program.h"
 #include "tests/support/SiteClient.h"
 #include "tests/support/TemporaryFolder.h"
 #include <CLI/CLI.hpp>
-#include <algorithm>
 #include <iostream>
 #include <memory>
 #include <poll.h>
 #include <random>
-#include <set>
-#include <sstream>
 
 namespace
 {
@@ -42,117 +40,6 @@ struct Options
     double longestPause = 100;  // ms of a living writer; 0: not judged
     unsigned seed = std::random_device()();
     std::string site;
-};
-
-// Counts what is wrong, and prints each case when it is found.
-struct Wrongs
-{
-    int lost = 0;
-    int torn = 0;
-    int misheard = 0;
-    int refused = 0;
-
-    void Take(int lane, std::string const& kind, std::string const& line)
-    {
-        (kind == "torn" ? torn : kind == "misheard" ? misheard : kind == "refused" ? refused : lost) += 1;
-        std::cerr << "lane " << lane << ": " << line << std::endl;
-    }
-    bool IsGood() const { return lost + torn + misheard + refused == 0; }
-};
-
-// What is known of a lane, from the reports of its writers.
-class Lane
-{
-public:
-    Lane(int number, Wrongs& wrongs) : m_number(number), m_wrongs(wrongs) {}
-
-    // Takes a line of a writer.
-    void Take(std::string const& line)
-    {
-        std::istringstream words(line);
-        std::string kind;
-        words >> kind;
-        if (kind == "found")
-            return Compare(words);
-        std::int64_t number = 0;
-        if (kind == "counter" && words >> number)
-            m_counter = number;
-        else if (kind == "table" && words >> number)
-            m_table = number;
-        else if (kind == "append" && words >> number >> m_block)
-            m_appended = number;
-        else if (kind == "create" && words >> number)
-            m_tickets.push_back(static_cast<int>(number));
-        else if (kind == "delete" && words >> number)
-        {
-            std::erase(m_tickets, static_cast<int>(number));
-            m_deleted.insert(static_cast<int>(number));
-        }
-        else
-            return m_wrongs.Take(m_number, kind, line);
-        ++m_changes;
-    }
-
-    int Block() const { return m_block; }  // of the list, where the lane's last number is
-    std::int64_t Changes() const { return m_changes; }
-    std::int64_t Finds() const { return m_finds; }
-
-private:
-    void Compare(std::istringstream& found)
-    {
-        CompareNumber("counter", m_counter, found);
-        CompareNumber("table", m_table, found);
-        CompareNumber("appended", m_appended, found);
-        CompareTickets({std::istream_iterator<int>(found), {}});
-        ++m_finds;
-    }
-
-    // One more may have been done whose report is missing.
-    void CompareNumber(char const* what, std::int64_t& acknowledged, std::istringstream& found)
-    {
-        std::int64_t number = -1;
-        found >> number;
-        if (number != acknowledged && number != acknowledged + 1)
-            m_wrongs.Take(m_number, "lost",
-                          std::string(what) + " " + std::to_string(acknowledged) + " was acknowledged, " +
-                              std::to_string(number) + " is there");
-        acknowledged = number;
-    }
-
-    // One ticket more may be there, or where a deletion was due the oldest may be gone. What is gone never
-    // comes back: only the oldest ticket of a lane is deleted, so no id is given anew.
-    void CompareTickets(std::vector<int> const& found)
-    {
-        std::vector<int> expected = m_tickets;
-        auto const isThere = [&](int id) { return std::find(found.begin(), found.end(), id) != found.end(); };
-        if (expected.size() == MostTickets && !isThere(expected.front()))
-        {
-            m_deleted.insert(expected.front());
-            expected.erase(expected.begin());
-        }
-        for (int const id : expected)
-            if (!isThere(id))
-                m_wrongs.Take(m_number, "lost", "ticket " + std::to_string(id) + " was created, but is gone");
-        std::size_t const most = m_tickets.size() < MostTickets ? expected.size() + 1 : expected.size();
-        if (found.size() > most)
-            m_wrongs.Take(m_number, "lost", "more tickets are there than were created");
-        for (int const id : found)
-            if (m_deleted.contains(id))
-                m_wrongs.Take(m_number, "lost",
-                              "ticket " + std::to_string(id) + " was deleted, but is there");
-        m_tickets = found;
-    }
-
-    int const m_number;
-    Wrongs& m_wrongs;
-    std::int64_t m_counter = 0;
-    std::int64_t m_table = 0;
-    std::int64_t m_appended = 0;
-    int m_block = 1;
-    std::vector<int> m_tickets;
-    std::set<int> m_deleted;
-    std::int64_t m_changes = 0;
-    std::int64_t m_finds = 0;
 };
 
 // A lane with the program that writes it at the moment.
@@ -262,7 +149,7 @@ private:
             if (line->starts_with("found"))
                 m_runners.at(lane++).lane.Take(*line);
             else
-                m_wrongs.Take(-1, "lost", *line);
+                m_wrongs.Take("all lanes", "lost", *line);
         }
         if (lane != m_runners.size())
             throw Trouble("the checker has not seen all lanes");
@@ -290,11 +177,12 @@ private:
                   << Sum(&Lane::Finds) << " comparisons of a lane\n"
                   << "longest pause of a living writer between two changes: "
                   << std::chrono::duration_cast<std::chrono::milliseconds>(m_longestPause).count() << " ms\n";
-        if (m_wrongs.misheard + m_wrongs.refused > 0)
-            std::cout << m_wrongs.misheard << " notifications misheard, " << m_wrongs.refused
-                      << " changes refused\n";
-        std::cout << m_options.kills << " kills: " << m_wrongs.lost << " lost, " << m_wrongs.torn
-                  << " torn\n";
+        int const misheard = m_wrongs.Count("misheard");
+        int const refused = m_wrongs.Count("refused");
+        if (misheard + refused > 0)
+            std::cout << misheard << " notifications misheard, " << refused << " changes refused\n";
+        std::cout << m_options.kills << " kills: " << m_wrongs.Count("lost") << " lost, "
+                  << m_wrongs.Count("torn") << " torn\n";
         if (Sum(&Lane::Changes) == 0)
             throw Trouble("no writer came to write anything: --interval is too short for this machine");
         double const pause = std::chrono::duration<double, std::milli>(m_longestPause).count();

@@ -153,10 +153,8 @@ private:
 
     std::string State(Words& words)
     {
-        int state = -1;
-        bool const isThere =
-            SiteClient::Manager().GetParameter(3, words.Int(), "Job/State", PARAM_INT, &state, -1) != 0;
-        return isThere ? std::to_string(state) : "none";
+        auto const state = SiteClient::StateOfJob(words.Int());
+        return state ? std::to_string(*state) : "none";
     }
 
     std::string List(Words& words)
@@ -291,27 +289,18 @@ private:
         return Yes(m_isListening && m_client.Enable(words.Int()));
     }
 
-    std::string Prepare(Words& words)
-    {
-        return std::to_string(SiteClient::Manager().PrepareJob(words.Text(), 0, 0, -1, 1, 0));
-    }
+    std::string Prepare(Words& words) { return std::to_string(SiteClient::PrepareJob(words.Text())); }
 
     std::string Send(Words& words)
     {
-        std::string path = words.Text();
-        std::string name = words.Text();
-        char folder[] = "$(UPLOADJOB)";
-        TJobIdentification job = {};
-        job.nSize = sizeof job;
-        job.pszUploadFolder = folder;
-        return std::to_string(SiteClient::Manager().SendJob(&job, path.data(), name.data()));
+        std::string const path = words.Text();
+        return std::to_string(SiteClient::SendJob(path, words.Text()));
     }
 
     std::string Put(Words& words)
     {
-        std::string source = words.Text();
-        std::string target = words.Text();
-        return std::to_string(SiteClient::Manager().PutFile(source.data(), target.data()));
+        std::string const source = words.Text();
+        return std::to_string(SiteClient::PutFile(source, words.Text(), SiteClient::Sync::Later));
     }
 
     SiteClient m_client;

@@ -226,6 +226,37 @@ STICKET_ACCESS const* SiteClient::Open(TicketName ticket) const
     return Operate(ticket, MTICKET_OP_OPEN, &table) ? table : nullptr;
 }
 
+int SiteClient::PrepareJob(std::string const& name) { return Manager().PrepareJob(name, 0, 0, -1, 1, 0); }
+
+int SiteClient::SendJob(std::string path, std::string name)
+{
+    char folder[] = "$(UPLOADJOB)";
+    TJobIdentification job = {};
+    job.nSize = sizeof job;
+    job.pszUploadFolder = folder;
+    return Manager().SendJob(&job, path.data(), name.data());
+}
+
+std::optional<int> SiteClient::StateOfJob(int id)
+{
+    constexpr int JobType = 3;
+    int state = -1;
+    if (!Manager().GetParameter(JobType, id, "Job/State", PARAM_INT, &state, -1))
+        return std::nullopt;
+    return state;
+}
+
+int SiteClient::PutFile(std::string source, std::string serverPath, Sync sync)
+{
+    return sync == Sync::Now ? Manager().PutFileSync(source.data(), serverPath.data())
+                             : Manager().PutFile(source.data(), serverPath.data());
+}
+
+int SiteClient::GetFile(std::string serverPath, std::string target)
+{
+    return Manager().GetFileSync(serverPath.data(), target.data());
+}
+
 bool SiteClient::Listen(std::function<void(Heard const&)> handler)
 {
     m_handler = std::move(handler);

@@ -72,6 +72,18 @@ public:
     std::vector<int> Ids(int type) const;
     STICKET_ACCESS const* Open(TicketName ticket) const;
 
+    // Jobs and files of the session that is open.
+    static int PrepareJob(std::string const& name);          // the id of its ticket, -1 if it is refused
+    static int SendJob(std::string path, std::string name);  // 0, or the plug-in's code
+    static std::optional<int> StateOfJob(int id);
+    enum class Sync
+    {
+        Now,    // answers how it ended
+        Later,  // does not wait for the end
+    };
+    static int PutFile(std::string source, std::string serverPath, Sync sync = Sync::Now);  // as SendJob
+    static int GetFile(std::string serverPath, std::string target);                         // the same
+
     // Has the handler called with all that is enabled later on, one call at a time. Once.
     bool Listen(std::function<void(Heard const&)> handler);
     bool Enable(int type) const;  // every change of every ticket of that type
