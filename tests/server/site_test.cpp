@@ -11,6 +11,7 @@
 #include "tests/support/Files.h"
 #include "tests/support/sanitizers.h"
 #include <algorithm>
+#include <atomic>
 #include <chrono>
 #include <csignal>
 #include <cstdlib>
@@ -345,6 +346,35 @@ TEST_F(SiteFolder, SystemTicketFile_WhoseTurnSomebodyKeeps_IsWrittenWhenItIsFree
     EXPECT_THAT(testing::internal::GetCapturedStderr(), ContainsRegex("^[^\n]*cannot be locked[^\n]*\n$"));
     site.Server().Tidy();
     EXPECT_THAT(ContentOf(File("tickets/SYS_0000.xml")), HasSubstr("Name 19"));
+}
+
+TEST_F(SiteFolder, SystemTicketFile_WrittenWhileThreadsFork_IsNobodysTurnAfterwards)
+{
+    OpenedSite site(Folder(), ShippedSeed);
+    std::atomic<bool> isDone = false;
+    std::thread writer(
+        [&]
+        {
+            for (int i = 0; !isDone; ++i)
+                site.Put("System/Name", "Name " + std::to_string(i));
+        });
+    std::vector<pid_t> children;
+    for (int i = 0; i < 20; ++i)
+    {
+        children.push_back(fork());
+        while (children.back() == 0)
+            pause();
+        std::this_thread::sleep_for(std::chrono::milliseconds(2));
+    }
+    isDone = true;
+    writer.join();
+    Descriptor const turn(open(File("tickets").c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
+    EXPECT_EQ(flock(turn.Number(), LOCK_EX | LOCK_NB), 0) << "a child that lives on keeps it";
+    for (pid_t const child : children)
+    {
+        kill(child, SIGKILL);
+        waitpid(child, nullptr, 0);
+    }
 }
 
 // Somebody edits the database with tools of his own, past the journal.

@@ -16,6 +16,27 @@ namespace
 {
 constexpr std::chrono::milliseconds TurnLimit(2000);
 constexpr std::chrono::milliseconds Pause(1);
+
+// The turn among programs. It ends by itself with the last copy of the descriptor, which may be that of a
+// child that was made by fork meanwhile; so it is ended in words.
+class Turn
+{
+public:
+    explicit Turn(std::filesystem::path const& folder)
+        : m_folder(open(folder.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC))
+    {
+        if (m_folder.Number() < 0)
+            throw FileError(FileFault(folder, "cannot be locked", errno));
+    }
+    ~Turn() { flock(m_folder.Number(), LOCK_UN); }
+    Turn(Turn const&) = delete;
+    Turn& operator=(Turn const&) = delete;
+
+    bool Try() { return flock(m_folder.Number(), LOCK_EX | LOCK_NB) == 0; }  // errno tells why not
+
+private:
+    Descriptor m_folder;
+};
 }  // namespace
 
 SystemTicketMirror::SystemTicketMirror(TicketService& tickets, std::filesystem::path const& site)
@@ -51,11 +72,9 @@ void SystemTicketMirror::WriteInTurn(std::chrono::milliseconds limit)
     auto const end = std::chrono::steady_clock::now() + limit;
     auto const folder = m_file.parent_path();
     std::unique_lock turn(m_turn, std::defer_lock);
-    Descriptor const lock(open(folder.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
-    if (lock.Number() < 0)
-        throw FileError(FileFault(folder, "cannot be locked", errno));
+    Turn programs(folder);
     errno = EWOULDBLOCK;
-    while (!(turn.owns_lock() || turn.try_lock()) || flock(lock.Number(), LOCK_EX | LOCK_NB) != 0)
+    while (!(turn.owns_lock() || turn.try_lock()) || !programs.Try())
     {
         if (errno != EWOULDBLOCK || std::chrono::steady_clock::now() > end)
             throw FileError(FileFault(folder, "cannot be locked", errno));
