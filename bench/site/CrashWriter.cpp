@@ -6,7 +6,6 @@
 #include <random>
 #include <sstream>
 #include <sys/mman.h>
-#include <system_error>
 #include <thread>
 #include <unistd.h>
 
@@ -32,17 +31,18 @@ class PrivateFile
 public:
     explicit PrivateFile(std::string const& content) : m_file(memfd_create("job", MFD_CLOEXEC))
     {
-        if (write(m_file, content.data(), content.size()) != static_cast<ssize_t>(content.size()))
-            throw std::system_error(errno, std::generic_category(), "cannot make a file in memory");
+        m_isWhole = write(m_file, content.data(), content.size()) == static_cast<ssize_t>(content.size());
     }
     ~PrivateFile() { close(m_file); }
     PrivateFile(PrivateFile const&) = delete;
     PrivateFile& operator=(PrivateFile const&) = delete;
 
+    bool IsWhole() const { return m_isWhole; }
     std::string Path() const { return "/proc/self/fd/" + std::to_string(m_file); }
 
 private:
     int m_file;
+    bool m_isWhole;
 };
 
 std::string JobText(int id, char const* key)
@@ -223,7 +223,7 @@ private:
         int const number = m_jobs.empty() ? 1 : m_jobs.back() + 1;
         std::string const name = JobPrefix(m_lane) + std::to_string(number);
         PrivateFile const file(std::string(JobSize(number), JobByte(number)));
-        bool const isPrepared = m_random() % 2 == 0 || SiteClient::PrepareJob(name) >= 0;
+        bool const isPrepared = file.IsWhole() && (m_random() % 2 == 0 || SiteClient::PrepareJob(name) >= 0);
         bool const isDone = isPrepared && SiteClient::SendJob(file.Path(), name) == 0;
         if (Report("send " + std::to_string(number), isDone))
             m_jobs.push_back(number);

@@ -6,7 +6,9 @@
 
 void Wrongs::Take(std::string const& where, std::string const& kind, std::string const& what)
 {
-    ++m_counts[m_counts.contains(kind) ? kind : "lost"];
+    constexpr int MostPrinted = 20;  // of a kind: one fault may show itself everywhere
+    if (++m_counts[m_counts.contains(kind) ? kind : "lost"] > MostPrinted)
+        return;
     std::cerr << where << ": " << what << std::endl;
 }
 

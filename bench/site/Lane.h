@@ -9,7 +9,7 @@
 #include <string>
 #include <vector>
 
-// Counts what is wrong, and prints each case when it is found.
+// Counts what is wrong, and prints the first cases of each kind when they are found.
 class Wrongs
 {
 public:
