@@ -172,7 +172,7 @@ public:
                 m_listener.Hear(heard);
                 if (Clock::now() >= m_nextHalt.load())
                 {
-                    std::this_thread::sleep_for(12s);
+                    std::this_thread::sleep_for(20s);
                     m_nextHalt = Clock::now() + 15s;
                 }
             });
