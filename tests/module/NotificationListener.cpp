@@ -1,41 +1,8 @@
 #include "tests/module/NotificationListener.h"
 
-#include "comgui/ticket/BIN_STRING.h"
+#include "tests/module/ValueText.h"
 #include <chrono>
 #include <set>
-
-namespace
-{
-std::string TextOf(SETMULTIPAR const& record)
-{
-    switch (record.type)
-    {
-    case PARAM_NONE:
-        return record.value ? "not null" : "none";
-    case PARAM_INT:
-        return std::to_string(*static_cast<int const*>(record.value));
-    case PARAM_DOUBLE:
-        return std::to_string(*static_cast<double const*>(record.value));
-    case PARAM_INT64:
-        return std::to_string(*static_cast<long long const*>(record.value)) + "ll";
-    case PARAM_UNSIGNED:
-        return std::to_string(*static_cast<unsigned const*>(record.value)) + "u";
-    case PARAM_UNSIGNED64:
-        return std::to_string(*static_cast<unsigned long long const*>(record.value)) + "ull";
-    case PARAM_POINTER:
-        return "->" + std::to_string(reinterpret_cast<std::uintptr_t>(record.value));
-    case PARAM_STRING:
-        return "'" + std::string(static_cast<char const*>(record.value)) + "'";
-    case PARAM_BINSTRING:
-    {
-        auto const& bytes = *static_cast<BIN_STRING const*>(record.value);
-        return "[" + std::string(static_cast<char const*>(bytes.data), bytes.size) + "]";
-    }
-    default:
-        return "of type " + std::to_string(record.type);
-    }
-}
-}  // namespace
 
 void LISTENER::Call(void* user, int kind, int argA, int argB, int code, void* data)
 {
@@ -56,7 +23,8 @@ void LISTENER::Take(int kind, int argA, int argB, int code, SETMULTIPAR const* r
     std::set<std::string> keys;
     for (SETMULTIPAR const* record = records; record && record->key; ++record)
     {
-        text += " " + std::string(record->key) + "@" + std::to_string(record->pos) + "=" + TextOf(*record);
+        text += " " + std::string(record->key) + "@" + std::to_string(record->pos) + "=" +
+                TextOf(record->type, record->value);
         bool const isNewKey = record == records || record->key != record[-1].key;
         if (isNewKey && !keys.insert(record->key).second)
             sharesKeys = false;
