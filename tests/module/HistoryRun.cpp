@@ -13,7 +13,7 @@ namespace fs = std::filesystem;
 
 namespace
 {
-constexpr unsigned Patience = 120;     // seconds for a history, which takes less than one
+constexpr unsigned Patience = 60;      // seconds for a history, which takes one, or some under a sanitizer
 constexpr std::size_t NewsEvery = 16;  // steps
 
 // What every history ends with, so that all that was handed out is read once more.
@@ -27,7 +27,7 @@ std::vector<STEP> WithItsEnd(std::vector<STEP> history)
         history.push_back(step);
     step.action = ACTION::CloseFile;
     step.session = STEP::Files;
-    for (step.table = 0; step.table < 3; ++step.table)
+    for (step.table = 0; step.table < STEP::OpenFiles; ++step.table)
         history.push_back(step);
     return history;
 }
@@ -230,8 +230,8 @@ void LayOut(MemoryFolder const& folder)
     for (auto const& [name, content] : LocalFiles())
         folder.Write(fs::path("local") / name, content);
     fs::create_directory(folder / "local" / "folder");
-    for (int file = 0; file < 3; ++file)
-        folder.Write("ticket" + std::to_string(file) + ".xml", EmptyTicket);
+    for (int file = 0; file < TicketFiles; ++file)
+        folder.Write(TicketFileName(file), EmptyTicket);
 }
 
 // Does something in a program of its own that throws DIFFERENCE. Gives that, or how else the program ended;

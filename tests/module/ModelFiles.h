@@ -17,6 +17,10 @@ inline std::array<std::pair<std::string, std::string>, 3> const& LocalFiles()
 inline constexpr char FetchedFile[] = "~/fetched";
 inline constexpr char NoSuchFolder[] = "~/nowhere/fetched";
 
+// The ticket files, in the folder itself.
+inline constexpr int TicketFiles = 3;
+inline std::string TicketFileName(int number) { return "ticket" + std::to_string(number) + ".xml"; }
+
 // A file by its size and its beginning.
 inline std::string ContentLine(std::string const& content)
 {

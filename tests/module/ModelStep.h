@@ -34,7 +34,7 @@ enum class ACTION
     Disable,      // number likewise
     Hold,         // the thread that calls the callbacks waits in one, in the first program
     Release,      // it goes on
-    Flood,        // a write of more records than may wait for a client
+    Flood,        // records[0] FloodSize times in one table
     Put,          // source, target; number 1: later
     Get,          // likewise
     PrepareJob,   // source: the name; number: the queue, stop: the copies
@@ -61,8 +61,11 @@ struct STEP
     static constexpr int SessionElsewhere = 3;
     static constexpr int Sessions = 4;
     static constexpr int Files = 4;
+    static constexpr int OpenFiles = 3;  // at most, at a time
 
     static constexpr int Container = -1;  // as the table: the container's slots instead
+
+    static constexpr std::size_t FloodSize = 70'000;  // more records than may wait for a client
 
     ACTION action = ACTION::Read;
     int session = 0;
@@ -77,6 +80,12 @@ struct STEP
     int number = 0;  // of a walk: at which place, from 0, the following steps are carried out
     int stop = 0;    // of a walk: after how many places it is given up, 0 never
     int during = 0;  // of a walk: how many steps are carried out inside it
+
+    // What it writes or reads.
+    std::vector<MODEL_RECORD> Records() const
+    {
+        return action == ACTION::Flood ? std::vector(FloodSize, records[0]) : records;
+    }
 
     // Is it for the second program?
     bool IsElsewhere() const { return session == SessionElsewhere; }

@@ -2,7 +2,6 @@
 
 #include "comgui/ticket/TICKET_ID.h"
 #include "standin/module/ModuleCodes.h"
-#include "tests/module/ModelFiles.h"
 #include "tests/module/ValueText.h"
 #include <algorithm>
 
@@ -326,7 +325,7 @@ std::string MODULE_MODEL::WriteTable(STEP const& step)
     if (step.isNullTable)
         return "0";
     std::string oks;
-    bool const isDone = WriteRecords(step, step.records, oks);
+    bool const isDone = WriteRecords(step, step.Records(), oks);
     return (isDone ? "1 [" : "0 [") + oks + "]";
 }
 
@@ -780,6 +779,8 @@ std::string MODULE_MODEL::Folders() const
         if (!ticket.jobFile.empty())
             text += "job " + std::to_string(address.second) + " " + ticket.jobFile + ": " +
                     ContentLine(ticket.jobContent) + "\n";
+    for (PLAIN_TICKET const& ticket : m_saved)
+        text += "file\n" + Joined(ticket.Lines([](std::string const&) { return true; }));
     return text;
 }
 
@@ -797,7 +798,7 @@ std::string MODULE_MODEL::Everything(std::size_t program) const
 MODULE_MODEL::LINE MODULE_MODEL::OpenFile(STEP const& step)
 {
     FILE_MODEL& file = *FileOf(step);
-    bool const isMissing = step.number >= static_cast<int>(std::size(m_saved));
+    bool const isMissing = step.number >= TicketFiles;
     if (file.isOpen)
         return std::nullopt;
     if (isMissing)

@@ -2,6 +2,7 @@
 // about it. A step gives the text that the real module must give, too.
 #pragma once
 
+#include "tests/module/ModelFiles.h"
 #include "tests/module/PlainNotifications.h"
 #include <array>
 
@@ -49,7 +50,7 @@ public:
 
     // Every ticket as a program sees it, and what lies in the folders. Program 2 comes later than all this.
     std::string Everything(std::size_t program) const;
-    std::string Folders() const;
+    std::string Folders() const;  // the ticket files among them
 
     // A path of the server's, as far as it can be looked at without the server: $(VARIABLE)/folder/name.
     struct SERVER_FILE
@@ -166,6 +167,6 @@ private:
     bool m_isFlooded = false;
     std::vector<PREPARED> m_prepared;
     std::map<std::string, std::string> m_temp;  // the files of $(TEMP)
-    FILE_MODEL m_files[3];
-    PLAIN_TICKET m_saved[3];
+    FILE_MODEL m_files[STEP::OpenFiles];
+    PLAIN_TICKET m_saved[TicketFiles];
 };

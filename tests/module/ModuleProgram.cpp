@@ -328,7 +328,8 @@ std::string MODULE_PROGRAM::Write(STEP const& step)
 
 std::string MODULE_PROGRAM::WriteTable(STEP const& step)
 {
-    WRITE_TABLE writes(step.records);
+    std::vector<MODEL_RECORD> const records = step.Records();
+    WRITE_TABLE writes(records);
     SETMULTIPAR* const given = step.isNullTable ? nullptr : writes.records.data();
     STICKET_ACCESS const* const table = TableOf(step);
     MTICKET_ACCESS const* const access = Who(step).access;
@@ -418,15 +419,20 @@ std::string MODULE_PROGRAM::TicketData(STEP const& step)
     std::string xml(static_cast<std::size_t>(size), '?');
     if (int const again = copy(xml.data()))
         return "then " + std::to_string(again);
-    std::string const file = (m_folder / "data.xml").string();
+    fs::path const file = m_folder / "data.xml";
     WriteFile(file, xml);
+    return "0\n" + TextOfFile(file);
+}
+
+std::string MODULE_PROGRAM::TextOfFile(fs::path const& file)
+{
     STICKET_ACCESS const* ticket = m_module->STicketFactory->CreateTicket(file.c_str());
     if (!ticket)
-        return "no ticket: " + xml;
+        return "no ticket: " + ContentOf(file);
     SESSION nobody;
     std::string const text = TextOfTable(nobody, ticket);
     m_module->STicketFactory->DestroyTicket(&ticket);
-    return "0\n" + text;
+    return text;
 }
 
 // --- walks
@@ -686,7 +692,7 @@ std::string MODULE_PROGRAM::SendJob(STEP const& step)
         m_module->SendJobEntry(m_module.Instance(), Who(step).handle, &record, path.data(), name.data()));
 }
 
-std::string MODULE_PROGRAM::Folders() const
+std::string MODULE_PROGRAM::Folders()
 {
     std::string text;
     for (std::string const& name : NamesIn(m_folder / "site" / "temp"))
@@ -700,6 +706,8 @@ std::string MODULE_PROGRAM::Folders() const
             if (!name.starts_with('.'))
                 text += "job " + std::to_string(id) + " " + name + ": " +
                         ContentLine(ContentOf(folder / name)) + "\n";
+    for (int file = 0; file < TicketFiles; ++file)
+        text += "file\n" + TextOfFile(m_folder / TicketFileName(file));
     return text;
 }
 
@@ -707,7 +715,7 @@ std::string MODULE_PROGRAM::Folders() const
 
 std::string MODULE_PROGRAM::OpenFile(STEP const& step)
 {
-    std::string const path = (m_folder / ("ticket" + std::to_string(step.number) + ".xml")).string();
+    std::string const path = (m_folder / TicketFileName(step.number)).string();
     STICKET_ACCESS const*& ticket = m_files[static_cast<std::size_t>(step.table)];
     ticket = m_module->STicketFactory->CreateTicket(step.number < 0 ? nullptr : path.c_str());
     return ticket ? "open" : "-";

@@ -32,7 +32,7 @@ public:
     bool IsHeld() const { return m_isHeld; }
 
     std::string Everything();  // every ticket with its values
-    std::string Folders() const;
+    std::string Folders();     // the ticket files among them
 
 private:
     struct HANDED_OUT
@@ -91,6 +91,7 @@ private:
     std::string CloseFile(STEP const& step);
 
     std::string TextOfTable(SESSION& session, STICKET_ACCESS const* ticket);
+    std::string TextOfFile(std::filesystem::path const& file);
     std::string NumberOf(SESSION& session, STICKET_ACCESS const* table);
     union READ_WORD;
     std::string TakeRead(SESSION& session, PARAM_TYPE type, READ_WORD const& word);
@@ -105,8 +106,8 @@ private:
     std::filesystem::path const m_folder;
     int const m_number;
     MODULE m_module;
-    std::array<STICKET_ACCESS const*, 3> m_files{};
-    std::array<SESSION, STEP::Sessions + 3> m_sessions;  // the last ones for the files
+    std::array<STICKET_ACCESS const*, STEP::OpenFiles> m_files{};
+    std::array<SESSION, STEP::Sessions + STEP::OpenFiles> m_sessions;  // the last ones for the files
     std::deque<CLIENT_HERE> m_clients;
 
     // The test's own session, which holds up the callbacks, and shows how far they have come.

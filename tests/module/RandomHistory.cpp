@@ -10,58 +10,131 @@ namespace
 constexpr int LargestPosition = 0xFFFFFF;
 constexpr int LargestTicketId = 0xFFFFFF;
 
-// How often each action comes, among all of them together.
+// How often each action comes, among all of them together, in a history that prefers none.
 struct SHARE
 {
     ACTION action;
     int share;
 };
 constexpr SHARE Shares[] = {
-    {ACTION::LogIn, 60},      {ACTION::LogOut, 6},      {ACTION::Read, 120},     {ACTION::ReadTable, 60},
+    {ACTION::LogIn, 80},      {ACTION::LogOut, 10},     {ACTION::Read, 120},     {ACTION::ReadTable, 60},
     {ACTION::Write, 200},     {ACTION::WriteTable, 80}, {ACTION::Open, 60},      {ACTION::Close, 50},
-    {ACTION::Create, 60},     {ACTION::CreateNext, 25}, {ACTION::Delete, 50},    {ACTION::Limit, 20},
+    {ACTION::Create, 60},     {ACTION::CreateNext, 35}, {ACTION::Delete, 60},    {ACTION::Limit, 20},
     {ACTION::Operate, 4},     {ACTION::WhoAmI, 20},     {ACTION::TicketData, 8}, {ACTION::WalkTickets, 20},
     {ACTION::WalkValues, 25}, {ACTION::Register, 15},   {ACTION::Enable, 50},    {ACTION::Disable, 20},
-    {ACTION::Hold, 10},       {ACTION::Release, 10},    {ACTION::Flood, 1},      {ACTION::Put, 12},
-    {ACTION::Get, 12},        {ACTION::PrepareJob, 14}, {ACTION::SendJob, 12},   {ACTION::OpenFile, 15},
-    {ACTION::CloseFile, 10}};
+    {ACTION::Hold, 10},       {ACTION::Release, 10},    {ACTION::Put, 12},       {ACTION::Get, 12},
+    {ACTION::PrepareJob, 14}, {ACTION::SendJob, 12},    {ACTION::OpenFile, 25},  {ACTION::CloseFile, 25}};
+
+constexpr char const* Patterns[] = {"A", "B", "Job/*", "a*", "A*", "*", "J*", "Job/State"};
 
 class DRAWING
 {
 public:
-    explicit DRAWING(unsigned seed) : m_random(seed) {}
+    // A history does a few things often rather than all things now and then: what goes wrong only in a row
+    // of certain steps would hardly ever be met.
+    explicit DRAWING(unsigned seed) : m_random(seed)
+    {
+        static constexpr int Types[] = {3, 3, 7, 7, 17, 0};
+        static constexpr int Ids[] = {1, 1, 2, 3, 0};
+        static char const* const Keys[] = {"A",
+                                           "B",
+                                           "Job/State",
+                                           "Job/Copies",
+                                           "a",
+                                           "\xC3\x84 <&>",
+                                           "a rather long key that lies on the heap"};
+        for (SHARE const& share : Shares)
+            m_shares.push_back({share.action, share.share * Factor(share.action)});
+        m_types = Some(Types, 2);
+        m_ids = Some(Ids, 3);
+        m_keys = Some(Keys, 4);
+        m_patterns = Some(Patterns, 4);
+    }
 
-    STEP Step()
+    STEP Step() { return Step(Action()); }
+
+    // Few histories have floods, which take long. Twice in a row: the second must not lean on what the first
+    // has left. Of use only when somebody in the first program is to be told of it, and is not.
+    std::vector<STEP> Floods()
+    {
+        if (!OneIn(16))
+            return {};
+        STEP base = Step(ACTION::Flood);
+        base.type = Of(m_types);
+        std::vector<STEP> steps;
+        auto const add = [&](ACTION action, int session)
+        {
+            STEP& step = steps.emplace_back(base);
+            step.action = action;
+            step.session = session;
+            step.number = action == ACTION::Register ? 1 : 0;
+        };
+        int const listening = Among(0, STEP::SessionsHere - 1);
+        for (ACTION const action : {ACTION::Create, ACTION::Register, ACTION::Enable})
+            add(action, listening);
+        for (int flood = 0; flood < 2; ++flood)
+        {
+            add(ACTION::Release, 0);
+            add(ACTION::Hold, 0);
+            add(ACTION::Flood, Among(0, STEP::Sessions - 1));
+            for (int i = 0; i < 5; ++i)
+            {
+                add(ACTION::Write, Among(0, STEP::Sessions - 1));
+                steps.back().records = {Record(true, false)};
+            }
+        }
+        return steps;
+    }
+
+private:
+    STEP Step(ACTION action)
     {
         STEP step;
-        step.action = Action();
+        step.action = action;
         step.session = Session(step.action);
         step.type = Type();
         step.id = Id();
-        step.table = step.session == STEP::Files ? Among(0, 2) : OneIn(2) ? STEP::Container : Among(0, 9);
+        step.table = step.session == STEP::Files ? Among(0, STEP::OpenFiles - 1)
+                     : OneIn(2)                  ? STEP::Container
+                                                 : Among(0, 9);
         Arguments(step);
         return step;
     }
 
-private:
     int Among(int from, int to)  // both included
     {
         return from + static_cast<int>(m_random() % static_cast<unsigned>(to - from + 1));
     }
     bool OneIn(int chances) { return Among(1, chances) == 1; }
     template <typename Range>
-    auto const& Of(Range const& range)
+    auto Of(Range const& range) -> decltype(*std::begin(range))
     {
         return *std::next(std::begin(range), Among(0, static_cast<int>(std::size(range)) - 1));
+    }
+
+    // Up to so many of a range.
+    template <typename T, std::size_t Size>
+    std::vector<T> Some(T const (&range)[Size], int most)
+    {
+        std::vector<T> some;
+        for (int count = Among(1, most); count > 0; --count)
+            some.push_back(Of(range));
+        return some;
+    }
+
+    int Factor(ACTION action)
+    {
+        static constexpr int Factors[] = {0, 1, 1, 3};
+        return action == ACTION::LogIn || action == ACTION::Release ? 1 : Of(Factors);
     }
 
     ACTION Action()
     {
         int sum = 0;
-        for (SHARE const& share : Shares)
+        for (SHARE const& share : m_shares)
             sum += share.share;
         int drawn = Among(1, sum);
-        auto share = std::begin(Shares);
+        auto share = m_shares.begin();
         while ((drawn -= share->share) > 0)
             ++share;
         return share->action;
@@ -73,7 +146,7 @@ private:
         bool const mayBeOfFiles = action == ACTION::Read || action == ACTION::ReadTable ||
                                   action == ACTION::Write || action == ACTION::WriteTable ||
                                   action == ACTION::WalkValues || action == ACTION::WhoAmI;
-        if (isOfFiles || (mayBeOfFiles && OneIn(6)))
+        if (isOfFiles || (mayBeOfFiles && OneIn(4)))
             return STEP::Files;
         bool const isOfProgram = action == ACTION::Hold || action == ACTION::Release;
         return isOfProgram ? 0 : Among(0, STEP::Sessions - 1);
@@ -81,39 +154,24 @@ private:
 
     int Type()
     {
-        static constexpr int Types[] = {3, 3, 3, 3, 3, 3, 7, 7, 7, 7, 17, 17, 0};
-        static constexpr int Others[] = {-1, 100};
-        return OneIn(40) ? Of(Others) : Of(Types);
+        static constexpr int Others[] = {-1, 0, 3, 7, 17, 100};
+        return OneIn(20) ? Of(Others) : Of(m_types);
     }
 
     int Id()
     {
-        static constexpr int Ids[] = {0, 1, 1, 1, 1, 1, 1, 1, 2, 2, 2, 2, 3, 5};
-        static constexpr int Others[] = {LargestTicketId - 1, LargestTicketId, -1, LargestTicketId + 1};
-        return OneIn(20) ? Of(Others) : Of(Ids);
+        static constexpr int Others[] = {LargestTicketId - 1, LargestTicketId, -1, LargestTicketId + 1, 4, 5};
+        return OneIn(15) ? Of(Others) : Of(m_ids);
     }
 
-    std::string Key()
-    {
-        static char const* const Keys[] = {"A",
-                                           "A",
-                                           "B",
-                                           "B",
-                                           "Job/State",
-                                           "Job/Copies",
-                                           "a",
-                                           "\xC3\x84 <&>",
-                                           "a rather long key that lies on the heap"};
-        return OneIn(60) ? "" : Of(Keys);
-    }
+    std::string Key() { return OneIn(60) ? "" : Of(m_keys); }
 
-    std::vector<std::string> Patterns()
+    std::vector<std::string> KeyTable()
     {
-        static char const* const Some[] = {"A", "B", "Job/*", "a*", "A*", "*", "J*", "Job/State"};
-        std::vector<std::string> patterns;
+        std::vector<std::string> table;
         for (int count = OneIn(3) ? 0 : Among(1, 3); count > 0; --count)
-            patterns.emplace_back(Of(Some));
-        return patterns;
+            table.emplace_back(Of(m_patterns));
+        return table;
     }
 
     int Position()
@@ -180,16 +238,18 @@ private:
             step.isNullTable = OneIn(40);
             for (int count = Among(0, 6); count > 0; --count)
                 step.records.push_back(Record(isWrite, false));
+            if (OneIn(30))
+                ManyKeys(step);
             break;
         case ACTION::Flood:
             step.table = STEP::Container;
-            step.records.assign(70'000, {"A", PARAM_INT, -1, 7, "", false});
+            step.records = {{"A", PARAM_INT, -1, 7, "", false}};
             break;
         case ACTION::Create:
         case ACTION::Limit:
             step.isNullTable = OneIn(3);
             if (!step.isNullTable)
-                step.keys = Patterns();
+                step.keys = KeyTable();
             break;
         case ACTION::Operate:
         {
@@ -215,11 +275,21 @@ private:
             Files(step);
             break;
         case ACTION::OpenFile:
-            step.number = Among(-1, 3);
+            step.number = Among(-1, TicketFiles);  // the last is not there
             break;
         default:
             break;
         }
+    }
+
+    // More than a ticket keeps in one piece.
+    void ManyKeys(STEP& step)
+    {
+        bool const isDeletion = OneIn(3);
+        int const first = Among(0, 100);
+        for (int key = first; key < first + 150; ++key)
+            step.records.push_back({"Many/" + std::to_string(key), isDeletion ? PARAM_NONE : PARAM_INT, -1,
+                                    key, "", isDeletion});
     }
 
     void Walk(STEP& step)
@@ -242,7 +312,7 @@ private:
         step.number = OneIn(10) ? Among(1, 5) : 0;
         step.isNullTable = OneIn(20);
         if (!step.isNullTable)
-            step.keys = Patterns();
+            step.keys = KeyTable();
     }
 
     void Files(STEP& step)
@@ -271,6 +341,11 @@ private:
     }
 
     std::mt19937 m_random;
+    std::vector<SHARE> m_shares;
+    std::vector<int> m_types;
+    std::vector<int> m_ids;
+    std::vector<char const*> m_keys;
+    std::vector<char const*> m_patterns;
 };
 }  // namespace
 
@@ -285,7 +360,10 @@ std::vector<STEP> RandomHistory(unsigned seed, std::size_t steps)
         step.session = session;
         step.source = step.target = session == 1 ? "operator" : "admin";
     }
-    while (history.size() < steps)
+    auto const floods = drawing.Floods();
+    while (history.size() + floods.size() < steps)
         history.push_back(drawing.Step());
+    auto const middle = history.begin() + static_cast<std::ptrdiff_t>(history.size() / 2);
+    history.insert(middle, floods.begin(), floods.end());
     return history;
 }
