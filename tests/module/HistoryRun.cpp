@@ -7,6 +7,7 @@
 #include "tests/server/MemoryFolder.h"
 #include "tests/support/Files.h"
 #include "tests/support/SiteClient.h"
+#include <algorithm>
 #include <unistd.h>
 
 namespace fs = std::filesystem;
@@ -37,17 +38,24 @@ struct DIFFERENCE
     std::string text;
 };
 
-std::string Shortened(std::string const& text)
+// Where it differs from another text, with what stands around there.
+std::string Shown(std::string const& text, std::size_t difference)
 {
-    constexpr std::size_t Length = 4000;
-    return text.size() > Length ? text.substr(0, Length) + " ..." : text;
+    constexpr std::size_t Before = 500;
+    constexpr std::size_t Length = 1500;
+    std::size_t const begin = difference - std::min(difference, Before);
+    std::string const end = text.size() > begin + Length ? " ..." : "";
+    return (begin ? "... " : "") + text.substr(begin, Length) + end;
 }
 
 void ThrowIfDifferent(std::string const& what, std::string const& expected, std::string const& found)
 {
-    if (found != expected)
-        throw DIFFERENCE{what + "\n--- expected:\n" + Shortened(expected) + "\n--- found:\n" +
-                         Shortened(found) + "\n"};
+    if (found == expected)
+        return;
+    auto const ends = std::mismatch(expected.begin(), expected.end(), found.begin(), found.end());
+    auto const difference = static_cast<std::size_t>(ends.first - expected.begin());
+    throw DIFFERENCE{what + "\n--- expected:\n" + Shown(expected, difference) + "\n--- found:\n" +
+                     Shown(found, difference) + "\n"};
 }
 
 class HISTORY_RUN
@@ -86,7 +94,8 @@ private:
             WalkValues(number);
         else if (auto const expected = m_model.Run(step))
             Compare(number, *expected, Found(number));
-        if (number % NewsEvery == 0)
+        // Who subscribes while its program is behind may be told of what was before; so it catches up first.
+        if (number % NewsEvery == 0 || step.action == ACTION::Release)
             CompareNews();
     }
 

@@ -32,7 +32,7 @@ class DRAWING
 public:
     // A history does a few things often rather than all things now and then: what goes wrong only in a row
     // of certain steps would hardly ever be met.
-    explicit DRAWING(unsigned seed) : m_random(seed)
+    explicit DRAWING(unsigned seed) : m_hasFloods(seed % 16 == 0), m_random(seed)
     {
         static constexpr int Types[] = {3, 3, 7, 7, 17, 0};
         static constexpr int Ids[] = {1, 1, 2, 3, 0};
@@ -57,7 +57,7 @@ public:
     // has left. Of use only when somebody in the first program is to be told of it, and is not.
     std::vector<STEP> Floods()
     {
-        if (!OneIn(16))
+        if (!m_hasFloods)
             return {};
         STEP base = Step(ACTION::Flood);
         base.type = Of(m_types);
@@ -340,6 +340,7 @@ private:
         step.stop = Among(-1, 2);
     }
 
+    bool const m_hasFloods;
     std::mt19937 m_random;
     std::vector<SHARE> m_shares;
     std::vector<int> m_types;

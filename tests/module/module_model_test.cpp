@@ -80,14 +80,14 @@ TEST(ModuleModel, RandomHistories_AreAsThePlainModelHasThem)
     if (!keep.empty())
     {
         auto const history = RandomHistory(seed, StepsOfAHistory);
-        EXPECT_EQ(DifferenceIn(Chosen(history, keep)), "") << Listed(history, keep);
+        std::string const difference = DifferenceIn(Chosen(history, keep));
+        EXPECT_TRUE(difference.empty()) << Listed(history, keep) << difference;
         return;
     }
     for (unsigned drawn = 0; drawn < steps / StepsOfAHistory; ++drawn)
     {
         auto const history = RandomHistory(seed + drawn, StepsOfAHistory);
-        std::string const difference = DifferenceIn(history);
-        ASSERT_EQ(difference, "") << Report(seed + drawn, history);
+        ASSERT_TRUE(DifferenceIn(history).empty()) << Report(seed + drawn, history);
     }
 }
 
