@@ -14,7 +14,7 @@ namespace fs = std::filesystem;
 
 namespace
 {
-constexpr unsigned Patience = 60;      // seconds for a history, which takes one, or some under a sanitizer
+constexpr unsigned Patience = 300;     // seconds for a history, which takes one, unless the machine is busy
 constexpr std::size_t NewsEvery = 16;  // steps
 
 // What every history ends with, so that all that was handed out is read once more.

@@ -113,71 +113,49 @@ bool MODULE_MODEL::EndsNotifications(ACTION action)
 
 std::optional<std::string> MODULE_MODEL::Run(STEP const& step)
 {
-    bool const hasNobody = step.session < STEP::Sessions && !Who(step).hasBegun;
-    if (hasNobody && step.action != ACTION::LogIn)
-        return std::nullopt;
-    if (FileOf(step) && !FileOf(step)->isOpen && step.action != ACTION::OpenFile)
-        return std::nullopt;
-    switch (step.action)
-    {
-    case ACTION::LogIn:
-        return Who(step).isAlive ? std::nullopt : LINE(LogIn(step));
-    case ACTION::LogOut:
-        return LogOut(step);
-    case ACTION::Read:
-        return Read(step);
-    case ACTION::ReadTable:
-        return ReadTable(step);
-    case ACTION::Write:
-        return Write(step);
-    case ACTION::WriteTable:
-        return WriteTable(step);
-    case ACTION::Open:
-        return Open(step);
-    case ACTION::Close:
-        return Close(step);
-    case ACTION::Create:
-        return Create(step);
-    case ACTION::CreateNext:
-        return CreateNext(step);
-    case ACTION::Delete:
-        return Delete(step);
-    case ACTION::Limit:
-        return Limit(step);
-    case ACTION::Operate:
-        return "0";
-    case ACTION::WhoAmI:
-        return WhoAmI(step);
-    case ACTION::TicketData:
-        return TicketData(step);
-    case ACTION::Register:
-        return m_isFlooded ? std::nullopt : LINE(Register(step));
-    case ACTION::Enable:
-        return m_isFlooded ? std::nullopt : LINE(Switch(step));
-    case ACTION::Disable:
-        return Switch(step);
-    case ACTION::Hold:
-        return Hold();
-    case ACTION::Release:
-        return Release();
-    case ACTION::Flood:
-        return Flood(step);
-    case ACTION::Put:
-    case ACTION::Get:
-        return m_isFlooded ? std::nullopt : LINE(Carry(step));
-    case ACTION::PrepareJob:
-        return PrepareJob(step);
-    case ACTION::SendJob:
-        return SendJob(step);
-    case ACTION::OpenFile:
-        return OpenFile(step);
-    case ACTION::CloseFile:
-        return CloseFile(step);
-    case ACTION::WalkTickets:
-    case ACTION::WalkValues:
-        break;
-    }
-    return std::nullopt;
+    using ANSWER = std::function<LINE(MODULE_MODEL&, STEP const&)>;
+    static std::map<ACTION, ANSWER> const answers{
+        {ACTION::LogIn, &MODULE_MODEL::LogIn},
+        {ACTION::LogOut, &MODULE_MODEL::LogOut},
+        {ACTION::Read, &MODULE_MODEL::Read},
+        {ACTION::ReadTable, &MODULE_MODEL::ReadTable},
+        {ACTION::Write, &MODULE_MODEL::Write},
+        {ACTION::WriteTable, &MODULE_MODEL::WriteTable},
+        {ACTION::Open, &MODULE_MODEL::Open},
+        {ACTION::Close, &MODULE_MODEL::Close},
+        {ACTION::Create, &MODULE_MODEL::Create},
+        {ACTION::CreateNext, &MODULE_MODEL::CreateNext},
+        {ACTION::Delete, &MODULE_MODEL::Delete},
+        {ACTION::Limit, &MODULE_MODEL::Limit},
+        {ACTION::Operate, [](MODULE_MODEL&, STEP const&) { return "0"; }},
+        {ACTION::WhoAmI, &MODULE_MODEL::WhoAmI},
+        {ACTION::TicketData, &MODULE_MODEL::TicketData},
+        {ACTION::Register, &MODULE_MODEL::Register},
+        {ACTION::Enable, &MODULE_MODEL::Switch},
+        {ACTION::Disable, &MODULE_MODEL::Switch},
+        {ACTION::Hold, &MODULE_MODEL::Hold},
+        {ACTION::Release, &MODULE_MODEL::Release},
+        {ACTION::Flood, &MODULE_MODEL::Flood},
+        {ACTION::Put, &MODULE_MODEL::Carry},
+        {ACTION::Get, &MODULE_MODEL::Carry},
+        {ACTION::PrepareJob, &MODULE_MODEL::PrepareJob},
+        {ACTION::SendJob, &MODULE_MODEL::SendJob},
+        {ACTION::OpenFile, &MODULE_MODEL::OpenFile},
+        {ACTION::CloseFile, &MODULE_MODEL::CloseFile}};
+    return MakesSense(step) ? answers.at(step.action)(*this, step) : std::nullopt;
+}
+
+// Who subscribes while a program is behind may be told of what was before, and the end of a transfer
+// overtakes what is late: that is left open.
+bool MODULE_MODEL::MakesSense(STEP const& step) const
+{
+    bool const isLeftOpen = step.action == ACTION::Register || step.action == ACTION::Enable ||
+                            step.action == ACTION::Put || step.action == ACTION::Get;
+    if (m_isFlooded && isLeftOpen)
+        return false;
+    if (FileOf(step))
+        return FileOf(step)->isOpen != (step.action == ACTION::OpenFile);
+    return step.action == ACTION::LogIn ? !Who(step).isAlive : Who(step).hasBegun;
 }
 
 MODULE_MODEL::TICKET_MODEL* MODULE_MODEL::Find(VISIT const& visit)
@@ -588,7 +566,7 @@ std::string MODULE_MODEL::Switch(STEP const& step)
     return "1";
 }
 
-MODULE_MODEL::LINE MODULE_MODEL::Hold()
+MODULE_MODEL::LINE MODULE_MODEL::Hold(STEP const&)
 {
     if (IsHeld())
         return std::nullopt;
@@ -596,7 +574,7 @@ MODULE_MODEL::LINE MODULE_MODEL::Hold()
     return "held";
 }
 
-MODULE_MODEL::LINE MODULE_MODEL::Release()
+MODULE_MODEL::LINE MODULE_MODEL::Release(STEP const&)
 {
     if (!IsHeld())
         return std::nullopt;
@@ -795,13 +773,10 @@ std::string MODULE_MODEL::Everything(std::size_t program) const
 
 // --- ticket files
 
-MODULE_MODEL::LINE MODULE_MODEL::OpenFile(STEP const& step)
+std::string MODULE_MODEL::OpenFile(STEP const& step)
 {
     FILE_MODEL& file = *FileOf(step);
-    bool const isMissing = step.number >= TicketFiles;
-    if (file.isOpen)
-        return std::nullopt;
-    if (isMissing)
+    if (step.number >= TicketFiles)
         return "-";
     file = {true, step.number, false, 0, {}};
     if (step.number >= 0)

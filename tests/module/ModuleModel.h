@@ -118,6 +118,7 @@ private:
     std::vector<std::string> LinesOf(STEP const& step, VISIT const& visit) const;
     bool MayWrite(STEP const& step, PLAIN_ADDRESS ticket) const;
 
+    bool MakesSense(STEP const& step) const;
     std::string LogIn(STEP const& step);
     std::string LogOut(STEP const& step);
     std::string Read(STEP const& step) const;
@@ -136,8 +137,8 @@ private:
     std::string TicketData(STEP const& step) const;
     std::string Register(STEP const& step);
     std::string Switch(STEP const& step);
-    LINE Hold();
-    LINE Release();
+    LINE Hold(STEP const&);
+    LINE Release(STEP const&);
     LINE Flood(STEP const& step);
     TICKET_MODEL const* JobIn(std::string const& folder) const;
     int CodeOfFolder(SERVER_FILE const& file, bool isPut) const;
@@ -147,7 +148,7 @@ private:
     int CarryNow(STEP const& step, std::optional<std::string>& fetched);
     std::string PrepareJob(STEP const& step);
     std::string SendJob(STEP const& step);
-    LINE OpenFile(STEP const& step);
+    std::string OpenFile(STEP const& step);
     LINE CloseFile(STEP const& step);
 
     int NextId(int type) const;

@@ -106,65 +106,37 @@ MODULE_PROGRAM::MODULE_PROGRAM(fs::path folder, int number) : m_folder(std::move
 
 std::string MODULE_PROGRAM::Run(STEP const& step)
 {
-    switch (step.action)
-    {
-    case ACTION::LogIn:
-        return LogIn(step);
-    case ACTION::LogOut:
-        return LogOut(step);
-    case ACTION::Read:
-        return Read(step);
-    case ACTION::ReadTable:
-        return ReadTable(step);
-    case ACTION::Write:
-        return Write(step);
-    case ACTION::WriteTable:
-        return WriteTable(step);
-    case ACTION::Open:
-        return Open(step);
-    case ACTION::Close:
-        return Close(step);
-    case ACTION::Create:
-        return Create(step);
-    case ACTION::CreateNext:
-        return CreateNext(step);
-    case ACTION::Delete:
-        return std::to_string(Operate(step, MTICKET_OP_DELETE, nullptr));
-    case ACTION::Limit:
-        return Limit(step);
-    case ACTION::Operate:
-        return std::to_string(Operate(step, step.number, nullptr));
-    case ACTION::WhoAmI:
-        return WhoAmI(step);
-    case ACTION::TicketData:
-        return TicketData(step);
-    case ACTION::WalkTickets:
-    case ACTION::WalkValues:
-        return AllOfWalk(step);
-    case ACTION::Register:
-        return Register(step);
-    case ACTION::Enable:
-    case ACTION::Disable:
-        return Switch(step);
-    case ACTION::Hold:
-        return Hold();
-    case ACTION::Release:
-        return Release();
-    case ACTION::Flood:
-        return WriteTable(step);
-    case ACTION::Put:
-    case ACTION::Get:
-        return Carry(step);
-    case ACTION::PrepareJob:
-        return PrepareJob(step);
-    case ACTION::SendJob:
-        return SendJob(step);
-    case ACTION::OpenFile:
-        return OpenFile(step);
-    case ACTION::CloseFile:
-        return CloseFile(step);
-    }
-    return "no such step";
+    using ANSWER = std::string (MODULE_PROGRAM::*)(STEP const&);
+    static std::map<ACTION, ANSWER> const answers{{ACTION::LogIn, &MODULE_PROGRAM::LogIn},
+                                                  {ACTION::LogOut, &MODULE_PROGRAM::LogOut},
+                                                  {ACTION::Read, &MODULE_PROGRAM::Read},
+                                                  {ACTION::ReadTable, &MODULE_PROGRAM::ReadTable},
+                                                  {ACTION::Write, &MODULE_PROGRAM::Write},
+                                                  {ACTION::WriteTable, &MODULE_PROGRAM::WriteTable},
+                                                  {ACTION::Open, &MODULE_PROGRAM::Open},
+                                                  {ACTION::Close, &MODULE_PROGRAM::Close},
+                                                  {ACTION::Create, &MODULE_PROGRAM::Create},
+                                                  {ACTION::CreateNext, &MODULE_PROGRAM::CreateNext},
+                                                  {ACTION::Delete, &MODULE_PROGRAM::Delete},
+                                                  {ACTION::Limit, &MODULE_PROGRAM::Limit},
+                                                  {ACTION::Operate, &MODULE_PROGRAM::OperateAnything},
+                                                  {ACTION::WhoAmI, &MODULE_PROGRAM::WhoAmI},
+                                                  {ACTION::TicketData, &MODULE_PROGRAM::TicketData},
+                                                  {ACTION::WalkTickets, &MODULE_PROGRAM::AllOfWalk},
+                                                  {ACTION::WalkValues, &MODULE_PROGRAM::AllOfWalk},
+                                                  {ACTION::Register, &MODULE_PROGRAM::Register},
+                                                  {ACTION::Enable, &MODULE_PROGRAM::Switch},
+                                                  {ACTION::Disable, &MODULE_PROGRAM::Switch},
+                                                  {ACTION::Hold, &MODULE_PROGRAM::Hold},
+                                                  {ACTION::Release, &MODULE_PROGRAM::Release},
+                                                  {ACTION::Flood, &MODULE_PROGRAM::WriteTable},
+                                                  {ACTION::Put, &MODULE_PROGRAM::Carry},
+                                                  {ACTION::Get, &MODULE_PROGRAM::Carry},
+                                                  {ACTION::PrepareJob, &MODULE_PROGRAM::PrepareJob},
+                                                  {ACTION::SendJob, &MODULE_PROGRAM::SendJob},
+                                                  {ACTION::OpenFile, &MODULE_PROGRAM::OpenFile},
+                                                  {ACTION::CloseFile, &MODULE_PROGRAM::CloseFile}};
+    return (this->*answers.at(step.action))(step);
 }
 
 std::string MODULE_PROGRAM::Shown(std::string text) const
@@ -387,6 +359,16 @@ std::string MODULE_PROGRAM::CreateNext(STEP const& step)
     return result == (id >= 0) ? std::to_string(id) : "half made";
 }
 
+std::string MODULE_PROGRAM::Delete(STEP const& step)
+{
+    return std::to_string(Operate(step, MTICKET_OP_DELETE, nullptr));
+}
+
+std::string MODULE_PROGRAM::OperateAnything(STEP const& step)
+{
+    return std::to_string(Operate(step, step.number, nullptr));
+}
+
 std::string MODULE_PROGRAM::Limit(STEP const& step)
 {
     KEY_TABLE keys(step.keys);
@@ -577,7 +559,7 @@ std::string MODULE_PROGRAM::Switch(STEP const& step)
 }
 
 // The test's own client is called, and does not return.
-std::string MODULE_PROGRAM::Hold()
+std::string MODULE_PROGRAM::Hold(STEP const&)
 {
     m_gate.lock();
     m_isHeld = true;
@@ -587,7 +569,7 @@ std::string MODULE_PROGRAM::Hold()
     return "held";
 }
 
-std::string MODULE_PROGRAM::Release()
+std::string MODULE_PROGRAM::Release(STEP const&)
 {
     m_isHeld = false;
     m_gate.unlock();

@@ -75,6 +75,8 @@ private:
     std::string Close(STEP const& step);
     std::string Create(STEP const& step);
     std::string CreateNext(STEP const& step);
+    std::string Delete(STEP const& step);
+    std::string OperateAnything(STEP const& step);
     std::string Limit(STEP const& step);
     std::string WhoAmI(STEP const& step);
     std::string TicketData(STEP const& step);
@@ -82,8 +84,8 @@ private:
     std::string Register(STEP const& step);
     int Register(void* hSession, LISTENER* listener, int& id);
     std::string Switch(STEP const& step);
-    std::string Hold();
-    std::string Release();
+    std::string Hold(STEP const&);
+    std::string Release(STEP const&);
     std::string Carry(STEP const& step);
     std::string PrepareJob(STEP const& step);
     std::string SendJob(STEP const& step);

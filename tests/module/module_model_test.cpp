@@ -57,8 +57,8 @@ std::string Listed(std::vector<STEP> const& history, NUMBERS const& numbers)
     return text + "COMGUI_MODULE_MODEL_KEEP=" + keep + "\n";
 }
 
-// The history of a seed, reduced to what it takes.
-std::string Report(unsigned seed, std::vector<STEP> const& history)
+// The history of a seed, reduced to what it takes, behind the difference that it was found by.
+std::string Report(unsigned seed, std::vector<STEP> const& history, std::string const& difference)
 {
     NUMBERS all(history.size());
     for (std::size_t i = 0; i < all.size(); ++i)
@@ -67,8 +67,8 @@ std::string Report(unsigned seed, std::vector<STEP> const& history)
     auto const fails = [&](NUMBERS const& numbers)
     { return std::chrono::steady_clock::now() < end && !DifferenceIn(Chosen(history, numbers)).empty(); };
     NUMBERS const numbers = Shrunk(all, fails, Attempts);
-    return Listed(history, numbers) + "COMGUI_MODULE_MODEL_SEED=" + std::to_string(seed) + "\n" +
-           DifferenceIn(Chosen(history, numbers));
+    return difference + "\n--- of these steps:\n" + Listed(history, numbers) +
+           "COMGUI_MODULE_MODEL_SEED=" + std::to_string(seed) + "\n" + DifferenceIn(Chosen(history, numbers));
 }
 }  // namespace
 
@@ -87,7 +87,8 @@ TEST(ModuleModel, RandomHistories_AreAsThePlainModelHasThem)
     for (unsigned drawn = 0; drawn < steps / StepsOfAHistory; ++drawn)
     {
         auto const history = RandomHistory(seed + drawn, StepsOfAHistory);
-        ASSERT_TRUE(DifferenceIn(history).empty()) << Report(seed + drawn, history);
+        std::string const difference = DifferenceIn(history);
+        ASSERT_TRUE(difference.empty()) << Report(seed + drawn, history, difference);
     }
 }
 
