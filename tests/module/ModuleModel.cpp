@@ -221,9 +221,11 @@ std::string MODULE_MODEL::LogIn(STEP const& step)
     return isAdministrator ? "0 role 16 stamp 1" : "0 role 1 stamp 2";
 }
 
-// Its prepared jobs go. Whether it is told of that itself is left open.
+// Its prepared jobs go. Whether it is told of that itself is left open. The test's own client registers anew.
 std::string MODULE_MODEL::LogOut(STEP const& step)
 {
+    if (!Told(step).IsHeld())
+        ++m_newestNotification[ProgramOf(step)];
     if (!Who(step).isAlive)
         return std::to_string(MODULE_UNKNOWN_SESSION);
     Who(step).isAlive = false;

@@ -13,6 +13,7 @@
 #include <algorithm>
 #include <cstring>
 #include <thread>
+#include <utility>
 
 using namespace standin;
 namespace fs = std::filesystem;
@@ -91,17 +92,26 @@ union MODULE_PROGRAM::READ_WORD
 MODULE_PROGRAM::MODULE_PROGRAM(fs::path folder, int number) : m_folder(std::move(folder)), m_number(number)
 {
     MODULE_AT_SITE::UseSite((m_folder / "site").string());
+    m_ownListener.onCall = [this] { std::lock_guard const wait(m_gate); };
+    LogInOwn();
+    ++m_ownCalls;
+    m_own.access->MCREATETICKET(m_own.access->Instance, OwnType, m_number, nullptr);
+}
+
+// Anew, so that it is the newest session: what may go with the end of older ones is not kept for it.
+void MODULE_PROGRAM::LogInOwn()
+{
     RECORD record;
-    if (m_module->LoginEntry(m_module.Instance(), &record) != 0)
-        throw std::runtime_error("the test's own session is refused");
-    m_own.handle = record.hSession;
+    if (int const code = m_module->LoginEntry(m_module.Instance(), &record))
+        throw std::runtime_error("the test's own session is refused by " + std::to_string(code));
+    void* const before = std::exchange(m_own.handle, record.hSession);
     m_own.access = m_module->GetClientContainerEntry(m_module.Instance(), m_own.handle);
     int id = 0;
     Register(m_own.handle, &m_ownListener, id);
-    m_ownListener.onCall = [this] { std::lock_guard const wait(m_gate); };
-    m_own.access->MCREATETICKET(m_own.access->Instance, OwnType, m_number, nullptr);
     char const* const noKeys[] = {nullptr};
     m_own.access->MENDISNOTIF(m_own.access->Instance, OwnType, m_number, id, true, noKeys);
+    if (before)
+        m_module->LogoutEntry(m_module.Instance(), before);
 }
 
 std::string MODULE_PROGRAM::Run(STEP const& step)
@@ -180,6 +190,8 @@ std::string MODULE_PROGRAM::LogOut(STEP const& step)
 {
     SESSION& session = Who(step);
     std::string const changed = WhatHasChanged(session);
+    if (!m_isHeld)
+        LogInOwn();
     int const code = m_module->LogoutEntry(m_module.Instance(), session.handle);
     session.handedOut.clear();
     if (session.listener != NoListener)

@@ -64,6 +64,7 @@ private:
     }
     STICKET_ACCESS const* TableOf(STEP const& step);  // null: the container's slots
 
+    void LogInOwn();
     std::string LogIn(STEP const& step);
     std::string LogOut(STEP const& step);
     std::string Read(STEP const& step);

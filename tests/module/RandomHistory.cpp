@@ -21,8 +21,8 @@ constexpr SHARE Shares[] = {
     {ACTION::Write, 200},     {ACTION::WriteTable, 80}, {ACTION::Open, 60},      {ACTION::Close, 50},
     {ACTION::Create, 60},     {ACTION::CreateNext, 35}, {ACTION::Delete, 60},    {ACTION::Limit, 20},
     {ACTION::Operate, 4},     {ACTION::WhoAmI, 20},     {ACTION::TicketData, 8}, {ACTION::WalkTickets, 20},
-    {ACTION::WalkValues, 25}, {ACTION::Register, 15},   {ACTION::Enable, 50},    {ACTION::Disable, 25},
-    {ACTION::Hold, 16},       {ACTION::Release, 10},    {ACTION::Put, 20},       {ACTION::Get, 16},
+    {ACTION::WalkValues, 25}, {ACTION::Register, 20},   {ACTION::Enable, 50},    {ACTION::Disable, 25},
+    {ACTION::Hold, 16},       {ACTION::Release, 7},     {ACTION::Put, 20},       {ACTION::Get, 16},
     {ACTION::PrepareJob, 14}, {ACTION::SendJob, 12},    {ACTION::OpenFile, 25},  {ACTION::CloseFile, 25}};
 
 constexpr char const* Patterns[] = {"A", "B", "Job/*", "a*", "A*", "*", "J*", "Job/State"};
@@ -60,7 +60,8 @@ public:
         if (!m_hasFloods)
             return {};
         STEP base = Step(ACTION::Flood);
-        base.type = Of(m_types);
+        base.type = Among(0, 1) ? 3 : 7;
+        base.id = 1;
         std::vector<STEP> steps;
         auto const add = [&](ACTION action, int session)
         {
@@ -68,19 +69,21 @@ public:
             step.action = action;
             step.session = session;
             step.number = action == ACTION::Register ? 1 : 0;
+            step.source = step.target = "admin";
         };
         int const listening = Among(0, STEP::SessionsHere - 1);
-        for (ACTION const action : {ACTION::Create, ACTION::Register, ACTION::Enable})
+        for (ACTION const action :
+             {ACTION::LogIn, ACTION::Create, ACTION::Limit, ACTION::Register, ACTION::Enable})
             add(action, listening);
         for (int flood = 0; flood < 2; ++flood)
         {
             add(ACTION::Release, 0);
             add(ACTION::Hold, 0);
-            add(ACTION::Flood, Among(0, STEP::Sessions - 1));
-            for (int i = 0; i < 5; ++i)
+            add(ACTION::Flood, listening);
+            for (PARAM_TYPE const type : {PARAM_INT, PARAM_POINTER, PARAM_INT})
             {
-                add(ACTION::Write, Among(0, STEP::Sessions - 1));
-                steps.back().records = {Record(true, false)};
+                add(ACTION::Write, listening);
+                steps.back().records[0].type = type;
             }
         }
         return steps;

@@ -15,8 +15,8 @@
 
 namespace
 {
-constexpr std::size_t StepsOfAHistory = 500;
-constexpr std::size_t Steps = IsSanitized ? 2'000 : 10'000;  // each costs some ten times as much there
+constexpr std::size_t StepsOfAHistory = 400;
+constexpr std::size_t Steps = IsSanitized ? 4'000 : 10'000;  // each costs some ten times as much there
 constexpr int Attempts = 2'000;                              // to make a history shorter, and
 constexpr std::chrono::minutes Patience(2);                  // as long at most
 
