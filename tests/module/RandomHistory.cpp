@@ -17,12 +17,12 @@ struct SHARE
     int share;
 };
 constexpr SHARE Shares[] = {
-    {ACTION::LogIn, 80},      {ACTION::LogOut, 10},     {ACTION::Read, 120},     {ACTION::ReadTable, 60},
+    {ACTION::LogIn, 110},     {ACTION::LogOut, 20},     {ACTION::Read, 120},     {ACTION::ReadTable, 60},
     {ACTION::Write, 200},     {ACTION::WriteTable, 80}, {ACTION::Open, 60},      {ACTION::Close, 50},
     {ACTION::Create, 60},     {ACTION::CreateNext, 35}, {ACTION::Delete, 60},    {ACTION::Limit, 20},
     {ACTION::Operate, 4},     {ACTION::WhoAmI, 20},     {ACTION::TicketData, 8}, {ACTION::WalkTickets, 20},
-    {ACTION::WalkValues, 25}, {ACTION::Register, 20},   {ACTION::Enable, 50},    {ACTION::Disable, 25},
-    {ACTION::Hold, 16},       {ACTION::Release, 7},     {ACTION::Put, 20},       {ACTION::Get, 16},
+    {ACTION::WalkValues, 25}, {ACTION::Register, 30},   {ACTION::Enable, 50},    {ACTION::Disable, 40},
+    {ACTION::Hold, 25},       {ACTION::Release, 12},    {ACTION::Put, 30},       {ACTION::Get, 16},
     {ACTION::PrepareJob, 14}, {ACTION::SendJob, 12},    {ACTION::OpenFile, 25},  {ACTION::CloseFile, 25}};
 
 constexpr char const* Patterns[] = {"A", "B", "Job/*", "a*", "A*", "*", "J*", "Job/State"};
@@ -45,6 +45,8 @@ public:
                                            "a rather long key that lies on the heap"};
         for (SHARE const& share : Shares)
             m_shares.push_back({share.action, share.share * Factor(share.action)});
+        static constexpr int Sessions[] = {0, 0, 1, 1, 2, 2, STEP::SessionElsewhere};
+        m_sessions = Some(Sessions, 6);
         m_types = Some(Types, 2);
         m_ids = Some(Ids, 3);
         m_keys = Some(Keys, 4);
@@ -152,7 +154,7 @@ private:
         if (isOfFiles || (mayBeOfFiles && OneIn(4)))
             return STEP::Files;
         bool const isOfProgram = action == ACTION::Hold || action == ACTION::Release;
-        return isOfProgram ? 0 : Among(0, STEP::Sessions - 1);
+        return isOfProgram ? 0 : Of(m_sessions);
     }
 
     int Type()
@@ -346,6 +348,7 @@ private:
     bool const m_hasFloods;
     std::mt19937 m_random;
     std::vector<SHARE> m_shares;
+    std::vector<int> m_sessions;
     std::vector<int> m_types;
     std::vector<int> m_ids;
     std::vector<char const*> m_keys;
