@@ -253,7 +253,8 @@ std::string DifferenceOf(fs::path const& folder, std::function<void()> const& wo
         [&](ChildProcess::Report const&)
         {
             alarm(Patience);
-            if (!std::freopen(messages.c_str(), "w", stderr))
+            // Without a buffer, which would go with a program that dies.
+            if (!std::freopen(messages.c_str(), "w", stderr) || std::setvbuf(stderr, nullptr, _IONBF, 0) != 0)
                 throw std::runtime_error("no place for messages");
             try
             {

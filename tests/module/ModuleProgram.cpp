@@ -424,7 +424,7 @@ std::string MODULE_PROGRAM::TextOfFile(fs::path const& file)
     if (!ticket)
         return "no ticket: " + ContentOf(file);
     SESSION nobody;
-    std::string const text = TextOfTable(nobody, ticket);
+    std::string text = TextOfTable(nobody, ticket);
     m_module->STicketFactory->DestroyTicket(&ticket);
     return text;
 }
@@ -488,7 +488,7 @@ int MODULE_PROGRAM::WalkValues(STEP const& step, PLACE const& place)
         to.program.Keep(to.session, type, word);
         if (to.keepsNumbers && !IsText(type) && type != PARAM_POINTER)
             to.session.handedOut.push_back({word, {static_cast<char const*>(word), SizeOfNumber(type)}});
-        std::string const line = to.program.Shown(WalkedLine(key, pos, TextOf(type, word)));
+        std::string line = to.program.Shown(WalkedLine(key, pos, TextOf(type, word)));
         return to.place([&] { return line; });
     };
     STICKET_ACCESS const* const table = TableOf(step);

@@ -47,6 +47,10 @@ public:
             m_shares.push_back({share.action, share.share * Factor(share.action)});
         static constexpr int Sessions[] = {0, 0, 1, 1, 2, 2, STEP::SessionElsewhere};
         m_sessions = Some(Sessions, 6);
+        static constexpr PARAM_TYPE ValueTypes[] = {
+            PARAM_STRING, PARAM_STRING, PARAM_STRING,    PARAM_STRING,  PARAM_INT,      PARAM_INT,
+            PARAM_DOUBLE, PARAM_INT64,  PARAM_BINSTRING, PARAM_POINTER, PARAM_UNSIGNED, PARAM_UNSIGNED64};
+        m_valueTypes = Some(ValueTypes, 4);
         m_types = Some(Types, 2);
         m_ids = Some(Ids, 3);
         m_keys = Some(Keys, 4);
@@ -182,16 +186,10 @@ private:
     int Position()
     {
         static constexpr int Others[] = {-3, 7, LargestPosition - 1, LargestPosition, LargestPosition + 1};
-        return OneIn(30) ? Of(Others) : OneIn(3) ? -1 : Among(-2, 4);
+        return OneIn(30) ? Of(Others) : OneIn(3) ? -1 : Among(-2, 2);
     }
 
-    PARAM_TYPE ValueType()
-    {
-        static constexpr PARAM_TYPE Types[] = {
-            PARAM_POINTER, PARAM_INT,       PARAM_INT,   PARAM_DOUBLE,   PARAM_STRING,    PARAM_STRING,
-            PARAM_STRING,  PARAM_BINSTRING, PARAM_INT64, PARAM_UNSIGNED, PARAM_UNSIGNED64};
-        return OneIn(40) ? static_cast<PARAM_TYPE>(Among(-1, 10)) : Of(Types);
-    }
+    PARAM_TYPE ValueType() { return OneIn(30) ? static_cast<PARAM_TYPE>(Among(-1, 10)) : Of(m_valueTypes); }
 
     std::string Text()
     {
@@ -349,6 +347,7 @@ private:
     std::mt19937 m_random;
     std::vector<SHARE> m_shares;
     std::vector<int> m_sessions;
+    std::vector<PARAM_TYPE> m_valueTypes;
     std::vector<int> m_types;
     std::vector<int> m_ids;
     std::vector<char const*> m_keys;

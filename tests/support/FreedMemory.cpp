@@ -11,6 +11,13 @@
 
 namespace
 {
+void* Allocated(std::size_t size)
+{
+    if (void* const block = std::malloc(size ? size : 1))
+        return block;
+    throw std::bad_alloc();
+}
+
 void Freed(void* block) noexcept
 {
     if (block)
@@ -19,6 +26,8 @@ void Freed(void* block) noexcept
 }
 }  // namespace
 
+void* operator new(std::size_t size) { return Allocated(size); }
+void* operator new[](std::size_t size) { return Allocated(size); }
 void operator delete(void* block) noexcept { Freed(block); }
 void operator delete[](void* block) noexcept { Freed(block); }
 void operator delete(void* block, std::size_t) noexcept { Freed(block); }
