@@ -14,7 +14,6 @@ namespace fs = std::filesystem;
 
 namespace
 {
-constexpr unsigned Patience = 300;     // seconds for a history, which takes one, unless the machine is busy
 constexpr std::size_t NewsEvery = 16;  // steps
 
 // What every history ends with, so that all that was handed out is read once more.
@@ -252,7 +251,7 @@ std::string DifferenceOf(fs::path const& folder, std::function<void()> const& wo
     ChildProcess program(
         [&](ChildProcess::Report const&)
         {
-            alarm(Patience);
+            alarm(OTHER_PROGRAM::Patience);  // a history takes one second, unless the machine is busy
             // Without a buffer, which would go with a program that dies.
             if (!std::freopen(messages.c_str(), "w", stderr) || std::setvbuf(stderr, nullptr, _IONBF, 0) != 0)
                 throw std::runtime_error("no place for messages");

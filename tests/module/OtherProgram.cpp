@@ -51,6 +51,7 @@ OTHER_PROGRAM::~OTHER_PROGRAM() { close(m_channel[0]); }
 
 void OTHER_PROGRAM::Serve(int channel, std::filesystem::path const& folder, std::vector<STEP> const& history)
 {
+    alarm(Patience);
     auto& program = *new MODULE_PROGRAM(folder, 1);  // never destroyed: threads of the module use it
     for (int question = 0; Receive(channel, &question, sizeof question);)
     {

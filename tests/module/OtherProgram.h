@@ -10,6 +10,8 @@
 class OTHER_PROGRAM
 {
 public:
+    static constexpr unsigned Patience = 300;  // seconds, after which it ends, whatever it waits for
+
     // The history outlives it.
     OTHER_PROGRAM(std::filesystem::path const& folder, std::vector<STEP> const& history);
     ~OTHER_PROGRAM();
