@@ -21,7 +21,7 @@ constexpr SHARE Shares[] = {
     {ACTION::Write, 200},     {ACTION::WriteTable, 80}, {ACTION::Open, 60},      {ACTION::Close, 50},
     {ACTION::Create, 60},     {ACTION::CreateNext, 35}, {ACTION::Delete, 60},    {ACTION::Limit, 20},
     {ACTION::Operate, 4},     {ACTION::WhoAmI, 20},     {ACTION::TicketData, 8}, {ACTION::WalkTickets, 20},
-    {ACTION::WalkValues, 25}, {ACTION::Register, 30},   {ACTION::Enable, 50},    {ACTION::Disable, 40},
+    {ACTION::WalkValues, 25}, {ACTION::Register, 30},   {ACTION::Enable, 70},    {ACTION::Disable, 40},
     {ACTION::Hold, 25},       {ACTION::Release, 12},    {ACTION::Put, 30},       {ACTION::Get, 16},
     {ACTION::PrepareJob, 14}, {ACTION::SendJob, 12},    {ACTION::OpenFile, 25},  {ACTION::CloseFile, 25}};
 
@@ -133,7 +133,7 @@ private:
 
     int Factor(ACTION action)
     {
-        static constexpr int Factors[] = {0, 1, 1, 3};
+        static constexpr int Factors[] = {0, 1, 1, 1, 2, 2, 4};
         return action == ACTION::LogIn || action == ACTION::Release ? 1 : Of(Factors);
     }
 
