@@ -74,6 +74,7 @@ public:
         Compare("the folders", m_model.Folders(), m_here.Folders());
         Compare("all tickets, in the first program", m_model.Everything(0), m_here.Everything());
         Compare("all tickets, in the second program", m_model.Everything(1), m_other.Everything());
+        m_other.End();
         return m_model.Everything(2);
     }
 

@@ -49,6 +49,12 @@ OTHER_PROGRAM::OTHER_PROGRAM(std::filesystem::path const& folder, std::vector<ST
 
 OTHER_PROGRAM::~OTHER_PROGRAM() { close(m_channel[0]); }
 
+void OTHER_PROGRAM::End()
+{
+    shutdown(m_channel[0], SHUT_RDWR);
+    m_program.Wait();
+}
+
 void OTHER_PROGRAM::Serve(int channel, std::filesystem::path const& folder, std::vector<STEP> const& history)
 {
     alarm(Patience);

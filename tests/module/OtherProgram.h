@@ -23,6 +23,8 @@ public:
     std::string News() { return Ask(AskForNews); }
     std::string Everything() { return Ask(AskForEverything); }
 
+    void End();  // it is gone when this returns
+
 private:
     enum : int
     {
