@@ -3,6 +3,7 @@
 #include "comgui/ticket/TICKET_OP.h"
 #include "standin/module/ValueWords.h"
 #include "standin/server/files/FileError.h"
+#include "standin/server/files/Report.h"
 #include <algorithm>
 #include <utility>
 
@@ -16,7 +17,7 @@ TicketXml ContentOf(std::filesystem::path const& file)
     std::error_code error;
     auto const status = std::filesystem::status(file, error);
     if (exists(status) && !is_regular_file(status))
-        throw FileError(file.string() + ": cannot be read: no regular file; correct the path");
+        throw FileError(ForMessages(file.string()) + ": cannot be read: no regular file; correct the path");
     return TicketXml::Read(file);
 }
 }  // namespace

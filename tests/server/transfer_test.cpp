@@ -384,6 +384,15 @@ TEST_F(PutFile, ManyToOneTarget_AreWholeAtAnyInstant)
     EXPECT_THAT(NamesIn(Temp()), ElementsAre("x"));
 }
 
+TEST_F(PutFile, NameWithALineEnd_FailsInOneLine)
+{
+    SetText("System/Folders/Log", folder / "no\nfolder");
+    EXPECT_EQ(Put(Write("a", "content"), "$(LOG)/a"), PathRefused);
+    EXPECT_THAT(said, HasSubstr("no?folder"));
+    EXPECT_EQ(Put(Client("no\nfile"), "$(TEMP)/a"), SourceUnreadable);
+    EXPECT_THAT(said, HasSubstr("no?file"));
+}
+
 TEST_F(PutFile, GoodOrBad_LeavesNothingOpen)
 {
     auto const open = [] { return NamesIn("/proc/self/fd").size(); };

@@ -376,6 +376,10 @@ INSTANTIATE_TEST_SUITE_P(
                 "2: encoding belongs to each <value> where there are any"},
         BadText{"ZeroByteInAString", "<parameter key='K' type='string' encoding='base64'>AEE=</parameter>",
                 "2: a zero byte in a string; type binary may hold it"},
+        BadText{"LineEndsInNoNumber", "<parameter key='K' type='int'>\ntwo\r\nlines\n</parameter>",
+                "2: not a number of type int: ?two?lines?"},
+        BadText{"LineEndInAnAttribute", "<parameter key='K' type='a&#10;b'>1</parameter>",
+                "2: unknown type a?b"},
         BadText{"ReferenceToZero", "<parameter key='K' type='string'>a&#x00;b</parameter>",
                 "2: no number of a character that XML allows; such a value is written as base64"}),
     [](auto const& fact) { return std::string(fact.param.name); });

@@ -1,5 +1,6 @@
 #include "standin/server/files/FileError.h"
 
+#include "standin/server/files/Report.h"
 #include <cerrno>
 #include <system_error>
 
@@ -35,7 +36,7 @@ char const* RemedyOf(int error)
 
 std::string FileFault(std::filesystem::path const& file, std::string const& failed, int error)
 {
-    return file.string() + ": " + failed + ": " + std::generic_category().message(error) + "; " +
+    return ForMessages(file.string() + ": " + failed) + ": " + std::generic_category().message(error) + "; " +
            RemedyOf(error);
 }
 }  // namespace standin

@@ -243,7 +243,7 @@ Descriptor MakeJobFolder(FolderTable const& table, int id, std::string_view mark
     }
     if (IsOccupied(reason))
         throw TransferError(TargetUnwritable,
-                            folder->string() +
+                            ForMessages(folder->string()) +
                                 ": something else has the name of the job's folder; move it away, or "
                                 "give System/Folders/Job a folder of its own");
     throw TransferError(TargetUnwritable, FileFault(*folder, "the job's folder cannot be made", reason));

@@ -1,6 +1,7 @@
 #include "standin/server/tickets/TicketXml.h"
 
 #include "standin/server/files/AtomicFile.h"
+#include "standin/server/files/Report.h"
 #include "standin/server/tickets/TicketXmlReader.h"
 #include "standin/server/tickets/TicketXmlText.h"
 #include <charconv>
@@ -81,7 +82,7 @@ void TicketXml::Write(std::filesystem::path const& file) const
 {
     std::string const text = Text();
     if (text.size() > SizeLimit)
-        throw FileError(file.string() + ": cannot be written: the ticket takes more than " +
+        throw FileError(ForMessages(file.string()) + ": cannot be written: the ticket takes more than " +
                         std::to_string(SizeLimit >> 20) + " MiB; delete values, then try again");
     ReplaceFile(file, text);
 }

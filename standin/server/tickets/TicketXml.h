@@ -33,7 +33,7 @@
 
 namespace standin
 {
-// The text is not what it should be: "FILE:LINE: reason". There is never half a result.
+// The text is not what it should be: "FILE:LINE: reason" on one line. There is never half a result.
 class XmlError : public std::runtime_error
 {
 public:

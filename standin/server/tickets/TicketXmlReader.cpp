@@ -1,5 +1,6 @@
 #include "standin/server/tickets/TicketXmlReader.h"
 
+#include "standin/server/files/Report.h"
 #include "standin/server/tickets/TicketSnapshot.h"
 #include "standin/server/tickets/TicketXmlText.h"
 #include <algorithm>
@@ -339,7 +340,8 @@ void TicketXmlReader::Fail(pugi::xml_node node, std::string const& reason) const
 void TicketXmlReader::FailAt(std::size_t offset, std::string const& reason) const
 {
     std::string_view const before = m_text.substr(0, offset);
-    throw XmlError(m_name + ":" + std::to_string(1 + std::count(before.begin(), before.end(), '\n')) + ": " +
-                   reason);
+    auto const line = 1 + std::count(before.begin(), before.end(), '\n');
+    // One line: the reason may quote what the text has.
+    throw XmlError(ForMessages(m_name + ":" + std::to_string(line) + ": " + reason));
 }
 }  // namespace standin

@@ -22,8 +22,7 @@ Descriptor OpenClientFolder(std::filesystem::path const& folder)
 {
     Descriptor opened(open(folder.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
     if (opened.Number() < 0)
-        throw TransferError(TargetUnwritable,
-                            FileFault(ForMessages(folder.string()), "cannot be opened", errno));
+        throw TransferError(TargetUnwritable, FileFault(folder, "cannot be opened", errno));
     return opened;
 }
 
