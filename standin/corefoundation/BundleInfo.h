@@ -1,7 +1,7 @@
 // What the Info.plist of a plug-in bundle says, as far as opening the plug-in needs it.
 #pragma once
 
-#include "standin/corefoundation/CFUUID.h"
+#include "standin/corefoundation/Uuid.h"
 #include <filesystem>
 #include <map>
 #include <optional>

@@ -1,19 +1,8 @@
-// The sixteen bytes behind a CFUUIDRef, in the order in which their text writes them.
+// The UUID behind a CFUUIDRef.
 #pragma once
 
 #include "standin/corefoundation/CountedObject.h"
-#include <CoreFoundation/CoreFoundation.h>
-#include <array>
-#include <optional>
-#include <string_view>
-
-namespace comgui::detail
-{
-using Uuid = std::array<UInt8, 16>;
-
-// Nothing for a text that is not of the form 01234567-89AB-CDEF-0123-456789ABCDEF, in either letter case.
-std::optional<Uuid> ParseUuid(std::string_view text);
-}  // namespace comgui::detail
+#include "standin/corefoundation/Uuid.h"
 
 struct __CFUUID final : comgui::detail::CountedObject
 {
