@@ -1,6 +1,7 @@
 // The folders by variable, and how the server keeps them such that clients come to an end with them.
 #include "standin/server/tickets/FolderTable.h"
 
+#include "tests/server/FolderClient.h"
 #include "tests/server/ServerTest.h"
 #include <gmock/gmock.h>
 #include <random>
@@ -21,39 +22,6 @@ FolderSettings Settings(int use, std::initializer_list<std::pair<std::size_t, ch
     for (auto const& [row, value] : values)
         settings.values[row] = value;
     return settings;
-}
-
-// What a client does with the settings, step by step and in the plainest way; false if it never ends.
-bool ClientComesToAnEnd(FolderSettings const& settings)
-{
-    std::vector<std::pair<std::string, std::string>> mappings;
-    int const flags = settings.use & 3;
-    for (std::size_t row = 0; flags && row < FolderRows.size(); ++row)
-    {
-        std::string value = settings.values[row];
-        if (value.empty())
-            continue;
-        for (char& byte : value)
-            byte = byte == '\\' ? '/' : byte;
-        if (value.back() == '/')
-            value.pop_back();
-        for (int turn = 0; value.size() >= 4 && value[0] == '$' && value[1] == '('; ++turn)
-        {
-            if (turn == 1000)
-                return false;
-            auto const end = value.find(')');
-            if (!(flags & 1) || end == std::string::npos)
-                continue;
-            for (auto const& [variable, folder] : mappings)
-                if (variable == value.substr(2, end - 2))
-                {
-                    value = folder + value.substr(end + 1);
-                    break;
-                }
-        }
-        mappings.emplace_back(FolderRows[row].variable, value);
-    }
-    return true;
 }
 }  // namespace
 
@@ -110,7 +78,7 @@ TEST_P(Reading, CanBeRead_IsWhatAClientFinds)
 {
     FolderSettings const settings = Settings(GetParam().use, {{Install, "/site"}, {Temp, GetParam().temp}});
     EXPECT_EQ(settings.CanBeRead(), GetParam().canBeRead);
-    EXPECT_EQ(ClientComesToAnEnd(settings), GetParam().canBeRead);
+    EXPECT_EQ(FoldersOfAClient(settings).has_value(), GetParam().canBeRead);
 }
 
 INSTANTIATE_TEST_SUITE_P(Facts, Reading,
@@ -141,7 +109,7 @@ TEST(Reading, RandomFolders_CanBeReadJustWhenAClientComesToAnEnd)
                 settings.values[row] += parts[random() % parts.size()];
         bool const canBeRead = settings.CanBeRead();
         readable += canBeRead ? 1 : 0;
-        ASSERT_EQ(canBeRead, ClientComesToAnEnd(settings))
+        ASSERT_EQ(canBeRead, FoldersOfAClient(settings).has_value())
             << settings.use << " " << settings.values[Install] << " | " << settings.values[Temp] << " | "
             << settings.values[JobRow];
     }
