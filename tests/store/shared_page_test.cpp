@@ -136,6 +136,22 @@ TEST_F(LockFileTest, FolderIsHeldByAll)
     EXPECT_FALSE(other.IsFolderHeldElsewhere());
 }
 
+// As by a program that dies: its locks on the file have gone by then.
+TEST_F(LockFileTest, FolderThatIsLetGoOfAtOnce_IsNotHeld)
+{
+    LockFile file(folder.Path());
+    LockFile other(folder.Path());
+    file.HoldFolder();
+    std::thread dying(
+        [&file]
+        {
+            std::this_thread::sleep_for(std::chrono::milliseconds(50));
+            file.Close();
+        });
+    EXPECT_FALSE(other.IsFolderHeldElsewhere());
+    dying.join();
+}
+
 TEST_F(LockFileTest, FileThatIsRemovedOrReplaced_IsNoMoreAtItsPath)
 {
     LockFile file(folder.Path());

@@ -22,6 +22,9 @@ namespace standin
 {
 namespace
 {
+constexpr std::chrono::milliseconds DeathLimit(500);
+constexpr std::chrono::milliseconds Pause(5);
+
 // "process 4711 (session_tour)", as the version that knew only one owner has left it in the file.
 std::string OnlyOwner(int descriptor)
 {
@@ -170,10 +173,18 @@ bool LockFile::IsLockedElsewhere(off_t byte) const
 
 void LockFile::HoldFolder() { flock(m_folder.Number(), LOCK_SH | LOCK_NB); }
 
-// A file system that locks no folders has no opinion.
+// Of a program that dies the locks go one after the other, that of the folder perhaps behind those of the
+// file. A file system that locks no folders has no opinion.
 bool LockFile::IsFolderHeldElsewhere()
 {
-    return flock(m_folder.Number(), LOCK_EX | LOCK_NB) != 0 && errno == EWOULDBLOCK;
+    auto const end = std::chrono::steady_clock::now() + DeathLimit;
+    while (flock(m_folder.Number(), LOCK_EX | LOCK_NB) != 0 && errno == EWOULDBLOCK)
+    {
+        if (std::chrono::steady_clock::now() > end)
+            return true;
+        std::this_thread::sleep_for(Pause);
+    }
+    return false;
 }
 
 bool LockFile::IsAtItsPath() const

@@ -50,7 +50,7 @@ public:
     // Everybody who has the site open holds a shared lock on the folder too, which cannot be removed under
     // them as the file can. For who has the right to open.
     void HoldFolder();
-    bool IsFolderHeldElsewhere();
+    bool IsFolderHeldElsewhere();  // and goes on being so, for a moment
 
     // Whether the file still is the one of that name.
     bool IsAtItsPath() const;
