@@ -2,8 +2,8 @@
 #include "standin/server/files/RemoveTree.h"
 
 #include "standin/server/files/Descriptor.h"
-#include "tests/support/Files.h"
 #include "tests/server/MemoryFolder.h"
+#include "tests/support/Files.h"
 #include <gmock/gmock.h>
 #include <sys/inotify.h>
 #include <sys/stat.h>
