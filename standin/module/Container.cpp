@@ -15,22 +15,30 @@ int Slot(void* instance, Work const& work) noexcept
     return container ? Guarded<int>(0, [&] { return work(*container) ? 1 : 0; }) : 0;
 }
 
+template <typename Work>
+int ReadSlot(void* instance, Work const& work) noexcept
+{
+    auto* const container = static_cast<Container*>(instance);
+    return container ? GuardedRead<int>(0, [&] { return work(*container) ? 1 : 0; }) : 0;
+}
+
 int OnGet(void* instance, int type, int id, char const* key, PARAM_TYPE ptype, void* value, int pos)
 {
-    return Slot(instance,
-                [&](Container& container)
-                {
-                    return ReadTicket(container.Server().Tickets(), container.Session(), {type, id}, 0, key,
-                                      ptype, value, pos);
-                });
+    return ReadSlot(instance,
+                    [&](Container& container)
+                    {
+                        return ReadTicket(container.Server().Tickets(), container.Session(), {type, id}, 0,
+                                          key, ptype, value, pos);
+                    });
 }
 
 int OnGetTable(void* instance, int type, int id, GETMULTIPAR* table)
 {
-    return Slot(instance,
-                [&](Container& container) {
-                    return ReadTable(container.Server().Tickets(), container.Session(), {type, id}, 0, table);
-                });
+    return ReadSlot(
+        instance,
+        [&](Container& container) {
+            return ReadTable(container.Server().Tickets(), container.Session(), {type, id}, 0, table);
+        });
 }
 
 int OnSet(void* instance, int type, int id, char const* key, PARAM_TYPE ptype, void const* value, int pos)

@@ -1,38 +1,28 @@
 // Keeps exceptions inside the module: whoever calls one of its functions was compiled elsewhere. Keeps
 // callers out of it that would wait for threads which are not there. And lets no caller's thread be cancelled
-// in here, where it would leave a lock held: it is cancelled once it is back.
+// in here: it is cancelled once it is back.
 #pragma once
 
 #include "standin/server/files/ForkedChild.h"
+#include "standin/server/files/NotCancelled.h"
 #include <cstdio>
 #include <exception>
-#include <pthread.h>
 
 namespace standin
 {
-class NotCancelled
-{
-public:
-    NotCancelled() { pthread_setcancelstate(PTHREAD_CANCEL_DISABLE, &m_before); }
-    ~NotCancelled() { pthread_setcancelstate(m_before, nullptr); }
-    NotCancelled(NotCancelled const&) = delete;
-    NotCancelled& operator=(NotCancelled const&) = delete;
-
-private:
-    int m_before = PTHREAD_CANCEL_ENABLE;
-};
-
-// What work returns, or failure if it throws or if this is a child made by fork; stderr then tells why.
-template <typename Result, typename Work>
-Result Guarded(Result failure, Work const& work) noexcept
+inline void TellOfFailure(char const* reason) noexcept
 {
     NotCancelled const here;
+    std::fprintf(stderr, "ComGUI.Bundle: a call failed%s%s\n", *reason ? ": " : "", reason);
+}
+
+// For reads, which have to be fast: only the feed blocks in them, and looks after that itself.
+template <typename Result, typename Work>
+Result GuardedRead(Result failure, Work const& work) noexcept
+{
     if (IsForkedChild())
     {
-        std::fputs(
-            "ComGUI.Bundle: a call failed: this process is a copy of one that has a site open; start a "
-            "program anew instead\n",
-            stderr);
+        TellOfFailure("this process is a copy of one that has a site open; start a program anew instead");
         return failure;
     }
     try
@@ -41,12 +31,20 @@ Result Guarded(Result failure, Work const& work) noexcept
     }
     catch (std::exception const& error)
     {
-        std::fprintf(stderr, "ComGUI.Bundle: a call failed: %s\n", error.what());
+        TellOfFailure(error.what());
     }
     catch (...)
     {
-        std::fputs("ComGUI.Bundle: a call failed\n", stderr);
+        TellOfFailure("");
     }
     return failure;
+}
+
+// What work returns, or failure if it throws or if this is a child made by fork; stderr then tells why.
+template <typename Result, typename Work>
+Result Guarded(Result failure, Work const& work) noexcept
+{
+    NotCancelled const here;
+    return GuardedRead(failure, work);
 }
 }  // namespace standin

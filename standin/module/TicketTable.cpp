@@ -15,14 +15,21 @@ int Slot(void* instance, Work const& work) noexcept
     return subject ? Guarded<int>(0, [&] { return work(*subject) ? 1 : 0; }) : 0;
 }
 
+template <typename Work>
+int ReadSlot(void* instance, Work const& work) noexcept
+{
+    auto* const subject = static_cast<TicketSubject*>(instance);
+    return subject ? GuardedRead<int>(0, [&] { return work(*subject) ? 1 : 0; }) : 0;
+}
+
 int OnGet(void* instance, char const* key, PARAM_TYPE type, void* value, int pos)
 {
-    return Slot(instance, [&](TicketSubject& ticket) { return ticket.Get(key, type, value, pos); });
+    return ReadSlot(instance, [&](TicketSubject& ticket) { return ticket.Get(key, type, value, pos); });
 }
 
 int OnGetTable(void* instance, GETMULTIPAR* table)
 {
-    return Slot(instance, [&](TicketSubject& ticket) { return ticket.GetTable(table); });
+    return ReadSlot(instance, [&](TicketSubject& ticket) { return ticket.GetTable(table); });
 }
 
 int OnWalk(void* instance, SWALKPARAMETERS_ACTION action, void* context, char const* prefix, int limit)

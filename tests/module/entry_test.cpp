@@ -116,7 +116,10 @@ TEST_F(Entries, ThreadThatIsCancelledInACall_EndsBehindIt)
             auto& now = *static_cast<Loop*>(context);
             for (int i = 0;; ++i)
             {
+                int read = 0;
                 now.access->MSETPARAMETER(now.access->Instance, 3, 1, "Test/Cancelled", PARAM_INT, &i, -1);
+                now.access->MGETPARAMETER(now.access->Instance, 2 + i % 2, 1, "Test/Cancelled", PARAM_INT,
+                                          &read, -1);
                 ++now.calls;
                 pthread_testcancel();
             }

@@ -1,5 +1,6 @@
 #include "standin/server/feed/Feed.h"
 
+#include "standin/server/files/NotCancelled.h"
 #include "standin/server/files/Report.h"
 #include <algorithm>
 #include <cassert>
@@ -54,6 +55,7 @@ bool Feed::CatchUp() noexcept { return CatchUp(m_committed.load(std::memory_orde
 
 bool Feed::CatchUp(Sequence sequence) noexcept
 {
+    NotCancelled const here;
     try
     {
         Lock lock(m_lock);
@@ -269,6 +271,7 @@ std::optional<Store::Loaded> Feed::Read(TicketAddress address, Values& values)
 
 bool Feed::Load(TicketAddress address)
 {
+    NotCancelled const here;
     try
     {
         for (;;)
