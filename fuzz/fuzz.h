@@ -38,7 +38,8 @@ public:
     {
         T value{};
         std::size_t const size = sizeof value < m_left ? sizeof value : m_left;
-        std::memcpy(&value, m_next, size);
+        if (size)  // the input may be null
+            std::memcpy(&value, m_next, size);
         Skip(size);
         return value;
     }
