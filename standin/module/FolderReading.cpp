@@ -39,7 +39,7 @@ bool FolderReading::CanResolve(std::string_view folder)
 std::string FolderReading::Resolved(FolderSettings const& folders)
 {
     std::size_t const row = m_next - 1;
-    std::string const resolved = FolderTable(folders.values).FolderOf(FolderRows[row].variable).value_or("");
+    std::string resolved = FolderTable(folders.values).FolderOf(FolderRows[row].variable).value_or("");
     if (m_decodes && !resolved.empty())
         m_table.Add(row, resolved);
     return resolved;
