@@ -71,7 +71,8 @@ bool OpenTicket::Get(char const* key, PARAM_TYPE type, void* value, int pos)
     char const* const text =
         isRead && type == PARAM_STRING ? *static_cast<char const* const*>(value) : nullptr;
     auto& folders = FolderReading::OfThisThread();
-    if (!folders.Note(this, key, type, number, text))
+    std::string_view const read = pos <= 0 ? key : "";  // no folder is at another position
+    if (!folders.Note(this, read, type, number, text))
         return isRead;
     auto const texts = m_session.HoldTexts();
     if (texts)

@@ -190,6 +190,19 @@ TEST_F(FolderReaders, WhoReadsOtherwise_GetsTheTextThatIsThere)
     EXPECT_STREQ(Text(ticket, Temp), "$(INSTALL)/tmp");
 }
 
+TEST_F(FolderReaders, WhoReadsAnotherPosition_GetsTheTextThatIsThere)
+{
+    auto const* const ticket = other.Open(0, 0);
+    int use = 0;
+    ASSERT_TRUE(ticket->SGETPARAMETER(ticket->Instance, Use, PARAM_INT, &use, -1));
+    EXPECT_EQ(Text(ticket, Install), nullptr);
+    ASSERT_TRUE(admin.Access()->MSETPARAMETER(admin.Access()->Instance, 0, 0, Temp, PARAM_STRING,
+                                              "$(NOWHERE)/tmp", 1));
+    char const* text = nullptr;
+    ASSERT_TRUE(ticket->SGETPARAMETER(ticket->Instance, Temp, PARAM_STRING, &text, 1));
+    EXPECT_STREQ(text, "$(NOWHERE)/tmp");
+}
+
 TEST_F(FolderReaders, ResolvedText_LivesAsLongAsAnyOther)
 {
     auto const* const ticket = other.Open(0, 0);
