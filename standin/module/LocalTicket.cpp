@@ -85,13 +85,13 @@ bool LocalTicket::Walk(SWALKPARAMETERS_ACTION action, void* context, char const*
 {
     if (!action)
         return false;
-    std::vector<Key> keys;
+    std::vector<HeldKey> keys;
     for (KeyValues const* const values : m_ticket.Now().Sorted(prefix ? prefix : ""))
         keys.push_back(values->Name());
-    for (Key const key : keys)
+    for (HeldKey const& key : keys)
         for (int pos = 0;;)
         {
-            KeyValues const* const values = m_ticket.Now().Find(key);
+            KeyValues const* const values = m_ticket.Now().Find(key.Get());
             TicketElement const* const found = values ? values->From(pos) : nullptr;
             if (!found)
                 break;

@@ -103,17 +103,17 @@ bool OpenTicket::Walk(SWALKPARAMETERS_ACTION action, void* context, char const* 
     auto const texts = m_session.HoldTexts();  // the session may end meanwhile, in the action or elsewhere
     if (!action || !texts)
         return false;
-    auto const values = m_tickets.Values(m_session, m_address, Which(), prefix ? prefix : "");
-    if (!values)
+    auto const walked = m_tickets.Values(m_session, m_address, Which(), prefix ? prefix : "");
+    if (!walked)
         return false;
-    for (WalkedValue const& value : *values)
+    for (WalkedValues::Value const& value : walked->Values())
     {
         BIN_STRING binary;
         bool const isNumber = SizeOfNumber(value.element.type) && value.element.type != PARAM_POINTER;
         void const* const word =
             isNumber ? m_numbers.AddressOf(value.element.word) : WordOf(value.element, binary);
         if (m_session.Ended() ||
-            !action(context, value.key->CStr(), value.element.type, word, value.element.pos))
+            !action(context, walked->KeyOf(value), value.element.type, word, value.element.pos))
             break;
     }
     return true;

@@ -3,6 +3,7 @@
 #include "comgui/host/ServerNotificationEvent.h"
 #include <gtest/gtest.h>
 #include <memory>
+#include <optional>
 
 namespace
 {
@@ -55,11 +56,11 @@ TEST(ServerNotificationEvent, HasItsIdItsTypeAndRefersToTheData)
 
 TEST(ServerNotificationEvent, Clone_OutlivesTheData)
 {
-    std::unique_ptr<wxEvent> clone;
-    {
-        NotifData const data = Sample();
-        clone.reset(ServerNotificationEvent(1000002, data).Clone());
-    }
+    std::optional<NotifData> data = Sample();
+    std::unique_ptr<wxEvent> const clone(ServerNotificationEvent(1000002, *data).Clone());
+    data->NotifKey = "another";
+    data->NotifPos = 8;
+    data.reset();
     auto const& event = dynamic_cast<ServerNotificationEvent const&>(*clone);
     EXPECT_EQ(event.GetId(), 1000002);
     EXPECT_EQ(event.GetNotifData().NotifKey, wxString::FromUTF8("Gr\xC3\xBCn"));

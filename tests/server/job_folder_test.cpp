@@ -2,6 +2,7 @@
 #include "standin/server/jobs/JobFolder.h"
 
 #include "standin/server/transfer/TransferError.h"
+#include "tests/server/DeletedNames.h"
 #include "tests/server/MemoryFolder.h"
 #include "tests/support/Files.h"
 #include <array>
@@ -82,6 +83,28 @@ TEST_F(SweptJobFolder, WithoutAJob_Goes)
     fs::create_directory(folder / "10");
     Sweep();
     EXPECT_THAT(NamesIn(folder.Path()), IsEmpty());
+}
+
+// As long as anything is left, the mark tells whose that was. Folders are listed in the order of their
+// making, backwards, or in none.
+TEST_F(SweptJobFolder, LosesItsMarkLast)
+{
+    for (bool const isMarkNewest : {false, true})
+    {
+        std::string const name = ".job-" + MakeJob(9);
+        for (int i = 0; i < 20; ++i)
+            WriteFile(folder / "9" / std::to_string(i), "content");
+        if (isMarkNewest)
+        {
+            fs::rename(folder / "9" / name, folder / "mark");
+            fs::rename(folder / "mark", folder / "9" / name);
+        }
+        DeletedNames deleted(folder / "9");
+        Sweep();
+        auto const names = deleted.SoFar();
+        ASSERT_EQ(names.size(), 22u);
+        EXPECT_EQ(names.back(), name);
+    }
 }
 
 TEST_F(SweptJobFolder, OfTheNextJobOfThatId_StaysWheneverThatIsMade)

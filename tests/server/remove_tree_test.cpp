@@ -2,10 +2,10 @@
 #include "standin/server/files/RemoveTree.h"
 
 #include "standin/server/files/Descriptor.h"
+#include "tests/server/DeletedNames.h"
 #include "tests/server/MemoryFolder.h"
 #include "tests/support/Files.h"
 #include <gmock/gmock.h>
-#include <sys/inotify.h>
 #include <sys/stat.h>
 
 using namespace standin;
@@ -71,18 +71,9 @@ TEST_F(RemovedTree, WhatIsToGoLast_GoesBehindAllOthers)
     for (int i = 0; i < 20; ++i)
         WriteFile(Tree() / std::to_string(i), "content");
     fs::create_directories(Tree() / "folder");
-    Descriptor const watch(inotify_init1(IN_CLOEXEC));
-    ASSERT_GE(inotify_add_watch(watch.Number(), Tree().c_str(), IN_DELETE), 0);
+    DeletedNames deleted(Tree());
     EXPECT_TRUE(RemoveContent(Opened().Number(), [](std::string const& name) { return name == "7"; }));
-    std::vector<std::string> removed;
-    alignas(inotify_event) char events[8192];
-    auto const size = read(watch.Number(), events, sizeof events);
-    for (char const* at = events; at < events + size;)
-    {
-        auto const* const event = reinterpret_cast<inotify_event const*>(at);
-        removed.emplace_back(event->name);
-        at += sizeof(inotify_event) + event->len;
-    }
+    auto const removed = deleted.SoFar();
     ASSERT_EQ(removed.size(), 21u);
     EXPECT_EQ(removed.back(), "7");
 }

@@ -169,16 +169,16 @@ TEST(TicketSnapshot, AKeyWhoseLastValueGoes_IsNone)
 class MADE_KEY
 {
 public:
-    MADE_KEY(std::string_view text, std::size_t hash) : m_words(2 + (text.size() + 8) / 8)
+    MADE_KEY(std::string_view text, std::size_t hash) : m_words(Header + (text.size() + 8) / 8)
     {
-        static_assert(sizeof(PooledKey) == 2 * sizeof(std::size_t));
         m_words[0] = hash;
         m_words[1] = text.size();
-        std::memcpy(&m_words[2], text.data(), text.size());
+        std::memcpy(&m_words[Header], text.data(), text.size());
     }
     Key Get() const { return reinterpret_cast<Key>(m_words.data()); }
 
 private:
+    static constexpr std::size_t Header = sizeof(PooledKey) / sizeof(std::size_t);
     std::vector<std::size_t> m_words;
 };
 

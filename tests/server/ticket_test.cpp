@@ -285,9 +285,9 @@ TEST_F(TicketPromises, Values_ComeByKeyAndPosition)
     auto const shown = [this](standin::TicketAddress address, std::string_view prefix)
     {
         std::string seen;
-        for (standin::WalkedValue const& value :
-             Tickets().Values(As("guest"), address, 0, prefix).value_or(std::vector<standin::WalkedValue>()))
-            seen += value.key->CStr() + std::to_string(value.element.pos) + ':' +
+        auto const walked = Tickets().Values(As("guest"), address, 0, prefix);
+        for (standin::WalkedValues::Value const& value : walked->Values())
+            seen += walked->KeyOf(value) + std::to_string(value.element.pos) + ':' +
                     std::to_string(value.element.type) + ' ';
         return seen;
     };

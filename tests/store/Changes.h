@@ -44,6 +44,11 @@ struct CHANGE : standin::TicketChange
         owner = newOwner;
         return std::move(*this);
     }
+    CHANGE&& On(standin::TicketAddress other, standin::TicketState const& planned) &&
+    {
+        others.push_back({other, planned.incarnation, planned.revision});
+        return std::move(*this);
+    }
     CHANGE&& Above(int id) &&
     {
         aboveId = id;

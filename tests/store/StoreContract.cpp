@@ -13,8 +13,10 @@
 
 using namespace standin;
 using namespace std::chrono_literals;
+using testing::Contains;
 using testing::ElementsAre;
 using testing::IsEmpty;
+using testing::Not;
 using testing::Pair;
 
 StoreValues ValuesOf(Store& store, TicketAddress address)
@@ -263,6 +265,50 @@ TEST_P(StoreContract, Write_ToNoTicket_IsAConflict)
     EXPECT_EQ(writer->Try(WriteTo(Job, {1, 1}).Put("A", 0, 1)).kind, CommitOutcome::Conflict);
     EXPECT_FALSE(StateOf(*store, Job));
     EXPECT_THAT(ValuesOf(*store, Job), IsEmpty());
+}
+
+TEST_P(StoreContract, Change_PlannedOnOtherTicketsAsWell_IsCommittedIfTheyAreAsTheyWere)
+{
+    writer->Make(Job);
+    writer->Make(OtherJob);
+    writer->Make(Printer);
+    auto const planned = [&](CHANGE&& change)
+    { return std::move(change).On(OtherJob, writer->State(OtherJob)).On(Printer, writer->State(Printer)); };
+    EXPECT_EQ(writer->Do(planned(WriteTo(Job, writer->State(Job)).Put("A", 0, 1))).sequence, 4u);
+    EXPECT_EQ(writer->Do(planned(DeletionOf(Job, writer->State(Job)))).sequence, 5u);
+    EXPECT_EQ(writer->Do(planned(Creation(Job))).sequence, 6u);
+}
+
+TEST_P(StoreContract, Change_PlannedOnAnotherTicketThatIsNoLongerAsItWas_IsAConflictAndChangesNothing)
+{
+    writer->Make(Job);
+    writer->Make(OtherJob);
+    writer->Make(Printer);
+    TicketState const asItWas = writer->State(OtherJob);
+    auto const expectConflict = [&](TicketState const& planned)
+    {
+        Sequence const last = FeedOf(*store, 0).back().sequence;
+        auto const changeOn = [&](CHANGE&& change)
+        { return std::move(change).On(Printer, writer->State(Printer)).On(OtherJob, planned); };
+        for (CommitOutcome const& lost :
+             {writer->Try(changeOn(WriteTo(Job, writer->State(Job)).Put("A", 0, 1))),
+              writer->Try(changeOn(DeletionOf(Job, writer->State(Job)))),
+              writer->Try(changeOn(Creation({3, 77}))), writer->Try(changeOn(CreationOfNext(3)))})
+        {
+            EXPECT_EQ(lost.kind, CommitOutcome::Conflict);
+            EXPECT_EQ(lost.sequence, last);
+        }
+        EXPECT_EQ(FeedOf(*store, 0).back().sequence, last);
+        EXPECT_THAT(ValuesOf(*store, Job), IsEmpty());
+        EXPECT_THAT(AddressesIn(*store), Not(Contains(TicketAddress{3, 77})));
+    };
+    expectConflict({asItWas.incarnation, asItWas.revision + 1});
+    otherWriter->Put(OtherJob, "A", 0, 1);
+    expectConflict(asItWas);
+    otherWriter->Remove(OtherJob);
+    expectConflict(asItWas);
+    otherWriter->Make(OtherJob);
+    expectConflict(asItWas);
 }
 
 TEST_P(StoreContract, Write_WithoutParameters_IsCommitted)

@@ -92,6 +92,7 @@ class StoreContract : public testing::TestWithParam<STORE_ENGINE>
 protected:
     static constexpr standin::TicketAddress Job{3, 1};
     static constexpr standin::TicketAddress OtherJob{3, 2};
+    static constexpr standin::TicketAddress Printer{7, 1};
 
     StoreContract() { UseLimits({}); }
 

@@ -1,5 +1,6 @@
 #include "tests/support/Allocations.h"
 
+#include "tests/support/FreedMemory.h"
 #include <atomic>
 #include <cstdlib>
 #include <new>
@@ -40,6 +41,7 @@ void Freed(void* block) noexcept
 {
     if (block)
         --live;
+    Spoil(block);
     std::free(block);
 }
 }  // namespace

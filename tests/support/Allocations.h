@@ -1,5 +1,6 @@
 // Failing allocations on demand: the test program's own operator new counts what is alive, and lets one
-// allocation fail that a test has chosen. The library's allocations go through it as well.
+// allocation fail that a test has chosen. The library's allocations go through it as well. What is given back
+// gets another content, so that whoever still reads it finds out.
 #pragma once
 
 #include <gtest/gtest.h>

@@ -1,12 +1,8 @@
-// In a program that has this in its list of sources memory has another content as soon as it is given back,
-// so that whoever still reads it finds out: the library's and the module's as well. The sanitizers have
-// better means.
-#include "tests/support/sanitizers.h"
+// A program that has this in its list of sources notices who reads memory that was given back.
+#include "tests/support/FreedMemory.h"
 
 #if !COMGUI_SANITIZED
 #    include <cstdlib>
-#    include <cstring>
-#    include <malloc.h>
 #    include <new>
 
 namespace
@@ -20,8 +16,7 @@ void* Allocated(std::size_t size)
 
 void Freed(void* block) noexcept
 {
-    if (block)
-        std::memset(block, 0xDD, malloc_usable_size(block));
+    Spoil(block);
     std::free(block);
 }
 }  // namespace

@@ -9,7 +9,7 @@ namespace standin
 // A value as one change left it; PARAM_NONE: deleted. pos is -1 for a key that was written anew or deleted.
 struct ChangedParameter
 {
-    Key key = nullptr;
+    HeldKey key{};
     int pos = 0;
     TicketValue value{};
 };

@@ -98,6 +98,7 @@ void Epochs::Dispose(Garbage&& garbage, TextKeeper& texts)
     if (!garbage.texts.empty())
         texts.Keep(std::move(garbage.texts));
     garbage.memory.clear();
+    garbage.keys.clear();
 }
 
 void Epochs::Retire(Garbage&& garbage, TextKeeper& texts) noexcept

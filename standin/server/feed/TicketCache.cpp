@@ -132,6 +132,7 @@ bool TicketCache::Publish(TicketAddress address, TicketState const& state, std::
         return false;
     if (entry->snapshot.load(std::memory_order_relaxed))
         return true;
+    ForgetUnusedKeys();
     SnapshotEdit edit(nullptr);
     for (LoadedValue const& each : values)
         edit.Put(m_keys.Intern(each.key), each.pos, each.value);
@@ -162,8 +163,18 @@ void TicketCache::Make(TicketChange& change, Sequence sequence)
     entry->revision.store(sequence, std::memory_order_release);
 }
 
+void TicketCache::ForgetUnusedKeys()
+{
+    if (!m_keys.IsFull())
+        return;
+    Garbage garbage;
+    garbage.keys = m_keys.TakeUnused();
+    Epochs::Get().Retire(std::move(garbage), m_texts);
+}
+
 void TicketCache::MakeSnapshot(Entry& entry, TicketChange& change, TicketState const& state)
 {
+    ForgetUnusedKeys();
     SnapshotEdit edit(entry.snapshot.load(std::memory_order_relaxed));
     for (ParameterChange const& each : change.parameters)
         edit.Make(m_keys.Intern(each.key), each);

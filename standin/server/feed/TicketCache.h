@@ -66,7 +66,9 @@ public:
     // Takes over the change's texts, if it keeps them.
     void Make(TicketChange& change, Sequence sequence);
 
+    // Good until the next call of Make or Publish, unless a ticket has it or it is held.
     Key Intern(std::string_view key) { return m_keys.Intern(key); }
+    std::size_t Keys() const { return m_keys.Size(); }  // that it knows
 
     // Every ticket, in ascending order.
     template <typename Take>
@@ -121,6 +123,7 @@ private:
     }
     Leaf& MakeLeaf(TicketAddress address);
     void Replace(Entry& entry, TicketSnapshot const* snapshot, Garbage&& garbage) noexcept;
+    void ForgetUnusedKeys();
     void MakeSnapshot(Entry& entry, TicketChange& change, TicketState const& state);
 
     TextKeeper& m_texts;

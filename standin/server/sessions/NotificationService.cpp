@@ -32,10 +32,10 @@ void GroupByKey(ChangedParameters& changes)
 {
     std::unordered_map<Key, std::size_t> first;
     for (ChangedParameter const& change : changes)
-        first.try_emplace(change.key, first.size());
+        first.try_emplace(change.key.Get(), first.size());
     std::stable_sort(changes.begin(), changes.end(),
                      [&](auto const& left, auto const& right)
-                     { return first.find(left.key)->second < first.find(right.key)->second; });
+                     { return first.find(left.key.Get())->second < first.find(right.key.Get())->second; });
 }
 
 ChangedParameter Copy(ChangedParameter const& change)

@@ -13,29 +13,44 @@ bool TicketService::MayWrite(Session const& session, TicketAddress address)
     return true;
 }
 
-std::optional<std::vector<WalkedValue>> TicketService::Values(Session const& session, TicketAddress address,
-                                                              Incarnation incarnation,
-                                                              std::string_view prefix)
+namespace
 {
-    std::vector<WalkedValue> found;
+void HandOut(KeyValues const& values, TextReader& reader)
+{
+    for (TicketElement const& element : values.Elements())
+        if (element.IsText())
+        {
+            element.text->HandOut(reader.Mark());
+            reader.NoteRead();
+        }
+}
+}  // namespace
+
+void WalkedValues::Add(KeyValues const& values)
+{
+    std::size_t const key = m_keys.size();
+    m_keys.append(values.Name()->CStr(), values.Name()->Text().size() + 1);
+    for (TicketElement const& element : values.Elements())
+        m_values.push_back({key, element});
+}
+
+std::optional<WalkedValues> TicketService::Values(Session const& session, TicketAddress address,
+                                                  Incarnation incarnation, std::string_view prefix)
+{
+    WalkedValues walked;
     bool const isThere = Look(session, address, incarnation,
                               [&](TicketSnapshot const& ticket, KeyFilter const* limit)
                               {
                                   for (KeyValues const* const values : ticket.Sorted(prefix))
-                                      for (TicketElement const& element : values->Elements())
-                                      {
-                                          if (limit && !limit->Selects(values->Name()->Text()))
-                                              continue;
-                                          if (element.IsText())
-                                          {
-                                              element.text->HandOut(session.Reader().Mark());
-                                              session.Reader().NoteRead();
-                                          }
-                                          found.push_back({values->Name(), element});
-                                      }
+                                  {
+                                      if (limit && !limit->Selects(values->Name()->Text()))
+                                          continue;
+                                      standin::HandOut(*values, session.Reader());
+                                      walked.Add(*values);
+                                  }
                                   return true;
                               });
-    return isThere ? std::optional(std::move(found)) : std::nullopt;
+    return isThere ? std::optional(std::move(walked)) : std::nullopt;
 }
 
 char const* TicketService::HandOut(Session const& session, std::string_view text)

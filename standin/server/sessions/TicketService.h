@@ -10,11 +10,23 @@
 
 namespace standin
 {
-// A value of a ticket at one moment. The text is the ticket's own, and counts as handed out.
-struct WalkedValue
+// Values of a ticket at one moment. Their texts are the ticket's own, and count as handed out.
+class WalkedValues
 {
-    Key key;
-    TicketElement element;
+public:
+    struct Value
+    {
+        std::size_t key;  // where it begins in m_keys
+        TicketElement element;
+    };
+    std::span<Value const> Values() const { return m_values; }
+    char const* KeyOf(Value const& value) const { return m_keys.c_str() + value.key; }
+
+    void Add(KeyValues const& values);
+
+private:
+    std::string m_keys;  // one behind the other, each ended by a zero byte: a key may go during the walk
+    std::vector<Value> m_values;
 };
 
 class TicketService
@@ -53,8 +65,8 @@ public:
 
     // Every value of the keys that begin with the prefix, by key, bytewise, and by position; nothing if there
     // is no such ticket.
-    std::optional<std::vector<WalkedValue>> Values(Session const& session, TicketAddress address,
-                                                   Incarnation incarnation, std::string_view prefix);
+    std::optional<WalkedValues> Values(Session const& session, TicketAddress address, Incarnation incarnation,
+                                       std::string_view prefix);
 
     // A text of no ticket for a session that holds its texts; it stays as one does that has left its ticket.
     char const* HandOut(Session const& session, std::string_view text);

@@ -44,6 +44,8 @@ void OwnedTicket::Write(std::span<TicketWrite> writes)
     WritePlan plan(m_snapshot, writes);
     if (plan.Changes().empty())
         return;
+    if (m_keys.IsFull())
+        m_keys.TakeUnused();
     SnapshotEdit edit(m_snapshot);
     for (ParameterChange const& change : plan.Changes())
         edit.Make(m_keys.Intern(change.key), change);

@@ -35,6 +35,7 @@ void Garbage::Append(Garbage&& more)
     memory.insert(memory.end(), std::move_iterator(more.memory.begin()),
                   std::move_iterator(more.memory.end()));
     texts.insert(texts.end(), std::move_iterator(more.texts.begin()), std::move_iterator(more.texts.end()));
+    keys.insert(keys.end(), std::move_iterator(more.keys.begin()), std::move_iterator(more.keys.end()));
     more = {};
 }
 
@@ -268,6 +269,17 @@ void SnapshotEdit::AddToOld(bool allSegments)
             m_old.push_back(const_cast<TicketElement*>(draft.before->Elements().data()));
 }
 
+void SnapshotEdit::CountKeys() const
+{
+    for (Draft const& draft : m_drafts)
+    {
+        if (draft.before)
+            draft.key->Lose();
+        if (!draft.elements.empty())
+            draft.key->Gain();
+    }
+}
+
 TicketSnapshot const* SnapshotEdit::Finish(TicketSnapshot::Version version, Garbage& garbage)
 {
     std::size_t const now = m_before ? m_before->m_mask + std::size_t{1} : 1;
@@ -284,6 +296,7 @@ TicketSnapshot const* SnapshotEdit::Finish(TicketSnapshot::Version version, Garb
         garbage.texts.emplace_back(text);
     for (Garbage::Memory& memory : m_fresh)
         static_cast<void>(memory.release());  // the snapshot's from now on
+    CountKeys();
     return next;
 }
 
@@ -321,6 +334,7 @@ Garbage SnapshotEdit::Dismantle(TicketSnapshot const* snapshot)
     ForEachPiece(
         *snapshot, [&](TicketText* text) { garbage.texts.emplace_back(text); },
         [&](void* memory) { garbage.memory.emplace_back(memory); });
+    snapshot->ForEachKey([](KeyValues const& values) { values.Name()->Lose(); });
     return garbage;
 }
 

@@ -29,8 +29,9 @@ struct Garbage
 
     std::vector<Memory> memory;
     TicketTexts texts;
+    std::vector<HeldKey> keys;
 
-    bool IsEmpty() const { return memory.empty() && texts.empty(); }
+    bool IsEmpty() const { return memory.empty() && texts.empty() && keys.empty(); }
     void Append(Garbage&& more);
 };
 
@@ -169,7 +170,7 @@ private:
 
 // Makes the next snapshot of a ticket: first the edits, in order, then Finish. What it is given to put in
 // stays with its owner until Finish, after which the snapshot owns it; so an edit that is given up, for
-// want of memory perhaps, has changed nothing.
+// want of memory perhaps, has changed nothing. Meanwhile no key is taken out of the pool.
 class SnapshotEdit
 {
 public:
@@ -190,7 +191,8 @@ public:
     // with nothing changed.
     TicketSnapshot const* Finish(TicketSnapshot::Version version, Garbage& garbage);
 
-    // All that the snapshot owns, which is nothing for null. Throws bad_alloc, with nothing changed.
+    // All that the snapshot owns, which is nothing for null. Its keys have a ticket less. Throws bad_alloc,
+    // with nothing changed.
     static Garbage Dismantle(TicketSnapshot const* snapshot);
 
     // Frees all that the snapshot owns, for who knows that nobody sees any of it.
@@ -213,6 +215,7 @@ private:
     Draft& DraftOf(Key key);
     void Discard(TicketElement const& element);
     std::size_t KeysAfter() const;
+    void CountKeys() const;
     std::vector<Bucket> Buckets(std::size_t segments);
     std::vector<bool> TouchedSegments() const;
     KeyValues Settled(Draft const& draft);
