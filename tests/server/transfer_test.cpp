@@ -314,6 +314,17 @@ TEST_F(PutFile, SourceThatIsCutMeanwhile_LeavesNothing)
     ExpectNothingArrived();
 }
 
+// Where nothing has to be read, so that no read ends early.
+TEST_F(PutFile, SourceThatIsCutMeanwhileInTheHoleAtItsEnd_LeavesNothing)
+{
+    std::string const file = Write("a", Bytes(100000));
+    fs::resize_file(file, 1'000'000);
+    Server().Transfers().Set({65536, [&] { fs::resize_file(file, 999'999); }});
+    EXPECT_EQ(Put(file, "$(TEMP)/a"), SourceUnreadable);
+    EXPECT_THAT(said, HasSubstr("try again"));
+    ExpectNothingArrived();
+}
+
 TEST_F(PutFile, SourceThatGrowsMeanwhile_ArrivesAsLongAsItWas)
 {
     std::string const content = Bytes(300000);
