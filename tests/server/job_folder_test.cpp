@@ -85,6 +85,25 @@ TEST_F(SweptJobFolder, WithoutAJob_Goes)
     EXPECT_THAT(NamesIn(folder.Path()), IsEmpty());
 }
 
+// Also one in a folder where only its owner may remove it, or on which something is mounted.
+TEST_F(JobFolders, EmptyOneThatCannotGo_IsNotFree)
+{
+    fs::create_directory(folder / "8");
+    fs::create_directory(folder / "9");
+    EXPECT_TRUE(IsJobFolderFree(table, 8));
+    EXPECT_THAT(NamesIn(folder.Path()), ElementsAre("9")) << "who makes a job's folder may find it gone";
+    EXPECT_TRUE(IsJobFolderFree(table, 8));
+    fs::permissions(folder.Path(), fs::perms::owner_write, fs::perm_options::remove);
+    if (geteuid() == 0)
+        setfsuid(65534);
+    bool const isFree = IsJobFolderFree(table, 9);
+    setfsuid(geteuid());
+    fs::permissions(folder.Path(), fs::perms::owner_write, fs::perm_options::add);
+    EXPECT_FALSE(isFree);
+    WriteFile(folder / "10", "content");
+    EXPECT_FALSE(IsJobFolderFree(table, 10));
+}
+
 // As long as anything is left, the mark tells whose that was. Folders are listed in the order of their
 // making, backwards, or in none.
 TEST_F(SweptJobFolder, LosesItsMarkLast)

@@ -272,6 +272,17 @@ TEST_F(SentJob, WhenItsTicketIsDeleted_ItsFolderGoesToo)
     EXPECT_THAT(NamesIn(folder / "job"), IsEmpty());
 }
 
+// A power cut may bring back the ticket as it was some changes ago, and then the file has to be there.
+TEST_F(SentJob, WhoseTicketsEndDoesNotReachTheDisk_KeepsItsFolder)
+{
+    EXPECT_EQ(Send(file, "file.pdf"), Transferred);
+    EXPECT_TRUE(Set(As("admin"), {3, 2}, "Job/File", PARAM_NONE, nullptr, -1));
+    site->Fail("Sync", true);
+    EXPECT_TRUE(Tickets().Delete(As("guest"), {3, 2}));
+    site->Fail("Sync", false);
+    EXPECT_THAT(NamesIn(folder / "job"), ElementsAre("2"));
+}
+
 TEST_F(SentJob, FolderThatIsNoJobs_IsPassedOverAndStays)
 {
     Server();

@@ -6,6 +6,7 @@
 #include "tests/server/MemoryFolder.h"
 #include "tests/support/Files.h"
 #include <gmock/gmock.h>
+#include <sys/fsuid.h>
 #include <sys/stat.h>
 
 using namespace standin;
@@ -76,6 +77,26 @@ TEST_F(RemovedTree, WhatIsToGoLast_GoesBehindAllOthers)
     auto const removed = deleted.SoFar();
     ASSERT_EQ(removed.size(), 21u);
     EXPECT_EQ(removed.back(), "7");
+}
+
+TEST_F(RemovedTree, WithSomethingThatCannotGo_LosesAllTheRestButWhatIsToGoLast)
+{
+    fs::permissions(Tree(), fs::perms::all);
+    for (int i = 0; i < 20; ++i)
+        WriteFile(Tree() / std::to_string(i), "content");
+    fs::create_directories(Tree() / "foreign");
+    WriteFile(Tree() / "foreign" / "file", "content");
+    fs::permissions(Tree() / "foreign", fs::perms::owner_write, fs::perm_options::remove);
+    Descriptor const opened = Opened();
+    if (geteuid() == 0)
+        setfsuid(65534);  // an administrator may remove everything
+    bool const isGone = RemoveContent(opened.Number(), [](std::string const& name) { return name == "7"; });
+    int const reason = errno;
+    setfsuid(geteuid());
+    fs::permissions(Tree() / "foreign", fs::perms::owner_write, fs::perm_options::add);
+    EXPECT_FALSE(isGone);
+    EXPECT_EQ(reason, EACCES);
+    EXPECT_THAT(NamesIn(Tree()), UnorderedElementsAre("7", "foreign"));
 }
 
 TEST_F(RemovedTree, OfNoFolder_IsAFailure)

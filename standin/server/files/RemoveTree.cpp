@@ -59,9 +59,18 @@ bool RemoveContent(int folder, std::function<bool(std::string const& name)> cons
     auto names = NamesIn(folder);
     if (errno != 0)
         return false;
-    if (last)
-        std::stable_partition(names.begin(), names.end(), [&](auto const& name) { return !last(name); });
-    return std::all_of(names.begin(), names.end(),
-                       [folder](std::string const& name) { return RemoveEntry(folder, name.c_str()); });
+    auto const lasts = std::stable_partition(names.begin(), names.end(),
+                                             [&](auto const& name) { return !last || !last(name); });
+    int reason = 0;
+    auto const remove = [&](std::string const& name)
+    {
+        if (!RemoveEntry(folder, name.c_str()) && reason == 0)
+            reason = errno;
+    };
+    std::for_each(names.begin(), lasts, remove);
+    if (reason == 0)
+        std::for_each(lasts, names.end(), remove);
+    errno = reason;
+    return reason == 0;
 }
 }  // namespace standin

@@ -12,6 +12,7 @@ namespace standin
 // if it cannot be read to its end.
 std::vector<std::string> NamesIn(int folder);
 
-// last: what goes behind all others, if any does. False, and errno tells why, if something stays.
+// last: what goes behind all others, and stays if one of them does. False, and errno tells why of the first,
+// if something stays; then all that can go has gone.
 bool RemoveContent(int folder, std::function<bool(std::string const& name)> const& last = {});
 }  // namespace standin

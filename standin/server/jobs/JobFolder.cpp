@@ -252,11 +252,7 @@ Descriptor MakeJobFolder(FolderTable const& table, int id, std::string_view mark
 bool IsJobFolderFree(FolderTable const& table, int id)
 {
     auto const folder = PathOf(table, id);
-    std::error_code error;
-    if (!folder || !exists(symlink_status(*folder, error)))
-        return true;
-    return is_directory(symlink_status(*folder, error)) && std::filesystem::is_empty(*folder, error) &&
-           !error;
+    return !folder || rmdir(folder->c_str()) == 0 || errno == ENOENT;
 }
 
 void FlushFolderForJobs(FolderTable const& table)

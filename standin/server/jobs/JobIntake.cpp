@@ -156,10 +156,33 @@ TransferResult JobIntake::Prepare(Session const& session, Announcement const& an
                            });
 }
 
+// The look at a ticket may wait for the disk, so it is taken without the lock.
+void JobIntake::ForgetGone()
+{
+    std::vector<TicketWriter::Ticket> gone;
+    {
+        std::lock_guard const lock(m_lock);
+        for (Prepared const& prepared : m_prepared)
+            gone.push_back(prepared.job.ticket);
+    }
+    std::erase_if(gone, [this](TicketWriter::Ticket const& ticket) { return !IsGone(ticket); });
+    std::lock_guard const lock(m_lock);
+    std::erase_if(m_prepared,
+                  [&](Prepared const& prepared)
+                  {
+                      auto const isSame = [&](TicketWriter::Ticket const& ticket)
+                      {
+                          return ticket.address == prepared.job.ticket.address &&
+                                 ticket.incarnation == prepared.job.ticket.incarnation;
+                      };
+                      return std::any_of(gone.begin(), gone.end(), isSame);
+                  });
+}
+
 std::optional<JobIntake::Job> JobIntake::Claim(Session const& session, std::string const& name)
 {
+    ForgetGone();
     std::lock_guard const lock(m_lock);
-    std::erase_if(m_prepared, [&](Prepared const& prepared) { return IsGone(prepared.job.ticket); });
     auto const found = std::find_if(m_prepared.rbegin(), m_prepared.rend(),
                                     [&](Prepared const& prepared)
                                     {
@@ -248,17 +271,17 @@ void JobIntake::Receive(Session const& session, Job& job, SourceFile const& sour
     // that comes before, this look tells; of one that goes later, the write at the end.
     if (IsGone(job.ticket))
         FailAsGone();
-    PartFile file(m_store, folder.Number(), name);
-    auto const write = [&](int percent) { WriteOrFail(job.ticket, ListOf(Put(ProgressKey, percent))); };
-    m_transfers.Copy(file, source, running, ProgressReport(source.Size(), write));
     try
     {
+        PartFile file(m_store, folder.Number(), name);
+        auto const write = [&](int percent) { WriteOrFail(job.ticket, ListOf(Put(ProgressKey, percent))); };
+        m_transfers.Copy(file, source, running, ProgressReport(source.Size(), write));
         file.Finish(PartFile::Survives::PowerCut);
         FlushFolderForJobs(*job.folders);
     }
-    catch (TransferError const&)
+    catch (TransferError const& error)
     {
-        if (IsGone(job.ticket))
+        if (error.Result() != TransferCut && IsGone(job.ticket))
             FailAsGone();  // in a folder that was removed nothing gets a name
         throw;
     }

@@ -61,6 +61,7 @@ private:
     Job Make(Session const& session, Announcement const& announcement);
     int FreeId() const;
     std::optional<TicketWriter::Ticket> MakeTicket(std::vector<TicketWrite>& writes);
+    void ForgetGone();
     std::optional<Job> Claim(Session const& session, std::string const& name);
     void Receive(Session const& session, Job& job, SourceFile const& source, std::string const& name,
                  RunningTransfer const& running);

@@ -71,19 +71,18 @@ void Server::Stop(std::chrono::milliseconds patience)
 }
 
 // A job's folder goes with its ticket. If a power cut brings back a ticket that tells of a file, that has to
-// be there; so the end of the ticket comes to the disk first, or the folder stays until it is swept.
+// be there, also if the ticket told of it before its last changes only; so the end of the ticket comes to the
+// disk first, or the folder stays until it is swept.
 std::function<void()> Server::WhenDeleted(TicketAddress ticket, TicketSnapshot const& last)
 {
     std::string mark = ticket.type == JobTicketType ? TextOf(last, JobMarkKey) : "";
     if (mark.empty())
         return {};
-    bool const hasFile = last.Find(std::string_view(JobFileKey)) != nullptr;
-    return [this, id = ticket.id, mark = std::move(mark), hasFile]
+    return [this, id = ticket.id, mark = std::move(mark)]
     {
         try
         {
-            if (hasFile)
-                m_store.Sync();
+            m_store.Sync();
             RemoveJobFolder(FolderTable(m_tickets.Folders().values), id, mark);
         }
         catch (StoreError const& error)
