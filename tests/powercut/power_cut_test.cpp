@@ -476,6 +476,17 @@ TEST_F(PowerCut, JobOfANewSite_IsThereWithItsWholeFile)
     EXPECT_EQ(AllAcknowledged(), 2);
 }
 
+// Another program has made the folder, and has not come as far as to flush its name.
+TEST_F(PowerCut, JobOfANewSiteInAFolderThatWasThere_IsThereWithItsWholeFile)
+{
+    site = disk / "made" / "for" / "the site";
+    MakeSources(2);
+    RecordPrograms(
+        {{{"/bin/mkdir", "-p", site}}, {{COMGUI_POWER_CUT_CLIENT, "jobs", "2", folder / "sources"}}});
+    ForEach(CutsAtAcknowledgements(2), [this] { ExpectJobs(); });
+    EXPECT_EQ(AllAcknowledged(), 2);
+}
+
 // --- tickets
 
 TEST_F(PowerCut, FullDurability_KeepsEveryAcknowledgedChange)

@@ -188,12 +188,12 @@ TEST_F(SiteFolder, FirstStart_MakesFoldersForThisUserAlone)
 }
 
 // Hashes of passwords are in it.
-TEST_F(SiteFolder, FirstStart_InAFolderThatOthersMayRead_MakesADatabaseThatTheyMayNot)
+TEST_F(SiteFolder, FirstStart_InAFolderThatOthersMayRead_MakesADatabaseAndASeedThatTheyMayNot)
 {
     std::filesystem::create_directories(Folder());
     ASSERT_EQ(chmod(Folder().c_str(), 0755), 0);
     OpenedSite const site(Folder(), ShippedSeed);
-    for (char const* const name : {"site.db", "site.db-wal", "site.db-shm", "site.lock"})
+    for (char const* const name : {"site.db", "site.db-wal", "site.db-shm", "site.lock", "seed.xml"})
     {
         struct stat found = {};
         ASSERT_EQ(stat(File(name).c_str(), &found), 0) << name;

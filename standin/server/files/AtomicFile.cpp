@@ -38,12 +38,13 @@ class Temporary
 {
 public:
     // shown: its name for messages. old: the file that is there, or null; nobody who may not read that may
-    // read this.
-    Temporary(std::filesystem::path const& file, std::filesystem::path const& shown, struct stat const* old)
+    // read this. mode: of a new one.
+    Temporary(std::filesystem::path const& file, std::filesystem::path const& shown, struct stat const* old,
+              mode_t mode)
         : m_shown(shown)
     {
         int attempt = 1;
-        while (!Make(file, old ? 0600 : 0666))
+        while (!Make(file, old ? 0600 : mode))
             if (++attempt > Attempts)
                 throw FileError(FileFault(m_shown, "cannot be written", errno));
         if (old)
@@ -148,7 +149,7 @@ std::string ReadFile(std::filesystem::path const& file, std::size_t limit)
     return content;
 }
 
-void ReplaceFile(std::filesystem::path const& file, std::string_view content)
+void ReplaceFile(std::filesystem::path const& file, std::string_view content, mode_t mode)
 {
     std::error_code noLink;
     std::filesystem::path const target = std::filesystem::canonical(file, noLink);
@@ -157,7 +158,7 @@ void ReplaceFile(std::filesystem::path const& file, std::string_view content)
     bool const isThere = stat(name.c_str(), &old) == 0;
     if (isThere)
         DatabaseFiles::RefuseIfOpen(old, file.string());
-    Temporary temporary(name, file, isThere ? &old : nullptr);
+    Temporary temporary(name, file, isThere ? &old : nullptr, mode);
     temporary.Write(content);
     temporary.TakeThePlaceOf(name);
     FlushFolder(FolderOf(name));

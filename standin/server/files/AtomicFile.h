@@ -33,8 +33,8 @@ void WriteAll(int descriptor, std::string_view content, std::filesystem::path co
 // permissions it takes over. A link stays, and what it points at is replaced. On failure the old content is
 // there as it was and nothing else is left, unless the folder cannot be flushed, which comes last. A process
 // killed in between leaves NAME.RANDOM.tmp behind, where RANDOM is a RandomName and a NAME that would be too
-// long is cut.
-void ReplaceFile(std::filesystem::path const& file, std::string_view content);
+// long is cut. mode: of a file that is new, less what the process's mask takes away.
+void ReplaceFile(std::filesystem::path const& file, std::string_view content, mode_t mode = 0666);
 
 // Gives an open file owner, group and permissions of another as far as this user may. Nobody who may not read
 // that may then read this.

@@ -74,6 +74,15 @@ void MakePrivateFolders(std::vector<std::filesystem::path> const& folders, bool 
         FlushFolder(folder);
 }
 
+void FlushFoldersAbove(std::filesystem::path const& folder)
+{
+    for (auto above = folder; above.has_relative_path();)
+    {
+        above = above.parent_path();
+        FlushFolder(above);
+    }
+}
+
 std::filesystem::path FreeName(std::filesystem::path const& file, std::string const& word,
                                std::vector<std::string> const& suffixes)
 {

@@ -13,6 +13,9 @@ namespace standin
 // have made them and got no further. Throws FileError.
 void MakePrivateFolders(std::vector<std::filesystem::path> const& folders, bool flushesAll = false);
 
+// Flushes the names of a folder and of those that it is in, as far as this user may. Throws FileError.
+void FlushFoldersAbove(std::filesystem::path const& folder);
+
 // NAME.WORD-YYYYmmdd-HHMMSS, with a number behind it as long as that with one of the suffixes is taken.
 std::filesystem::path FreeName(std::filesystem::path const& file, std::string const& word,
                                std::vector<std::string> const& suffixes);

@@ -53,7 +53,7 @@ Seed SeedOfSite(std::filesystem::path const& folder, std::filesystem::path const
         Seed seed = Seed::Parse(text, shipped.string());
         if (std::filesystem::exists(file))
             SetAside(file, {""});
-        ReplaceFile(file, text);
+        ReplaceFile(file, text, 0600);  // the hashes of passwords are in it
         return seed;
     }
     catch (XmlError const& error)
@@ -175,6 +175,8 @@ std::filesystem::path Site::Folder()
 Site::Site(std::filesystem::path const& folder, std::filesystem::path const& seedFile)
     : m_folder(Prepared(folder)), m_store(OpenStore(m_folder, seedFile))
 {
+    if (MayBeUnflushed(*m_store))
+        FlushFoldersAbove(m_folder);
     std::vector<std::filesystem::path> own;
     for (std::string_view const name : OwnFolders)
         own.push_back(m_folder / name);
