@@ -753,6 +753,38 @@ TEST_F(LaterTransfers, MoreThanCanWait_AreRefusedUntilSomeAreDone)
     EXPECT_TRUE(fs::exists(Temp("b")));
 }
 
+// They wait to be told, and are kept so long.
+TEST_F(LaterTransfers, MoreThanWhoseEndsCanWait_AreRefused)
+{
+    constexpr std::size_t Most = TransferService::MostWaiting;
+    auto& service = Server().Notifications();
+    std::atomic<bool> mayGoOn{false};
+    std::atomic<std::size_t> told{0};
+    service.Register(As("operator"), service.NewId(),
+                     [&](Notification const&)
+                     {
+                         while (!mayGoOn)
+                             std::this_thread::yield();
+                         ++told;
+                     });
+    std::string const file = Write("a", "c");
+    std::size_t left = 0;
+    while (left < Most + 10 && PutLater("operator", file, "$(TEMP)/" + std::to_string(left)) == Transferred)
+    {
+        while (!fs::exists(Temp(std::to_string(left))))
+            std::this_thread::yield();
+        ++left;
+    }
+    EXPECT_GE(left, Most);
+    EXPECT_LE(left, Most + 2) << "one is being told, one may be on its way";
+    mayGoOn = true;
+    while (told < left)
+        std::this_thread::yield();
+    EXPECT_EQ(PutLater("operator", file, "$(TEMP)/later"), Transferred);
+    while (told < left + 1)
+        std::this_thread::yield();
+}
+
 TEST_F(LaterTransfers, Logout_CutsWhatRunsAndTakesBackWhatWaits)
 {
     Listen("operator");

@@ -187,7 +187,20 @@ void NotificationService::Withdraw(Listener& listener)
                   });
 }
 
-void NotificationService::Unqueue(Message& message) { message.listener->pending -= message.weight; }
+void NotificationService::Unqueue(Message& message)
+{
+    message.listener->pending -= message.weight;
+    message.listener->ends -= message.kind == TransferEnded ? 1 : 0;
+}
+
+std::size_t NotificationService::UntoldEnds(Session const& session) const
+{
+    std::lock_guard const lock(m_lock);
+    std::size_t ends = 0;
+    for (auto const& listener : m_listeners)
+        ends += listener->session == session.Number() ? listener->ends : 0;
+    return ends;
+}
 
 void NotificationService::WaitFor(int id, Lock& lock)
 {
@@ -269,6 +282,7 @@ void NotificationService::Append(Message message)
 {
     message.weight = WeightOf(message.changes);
     message.listener->pending += message.weight;
+    message.listener->ends += message.kind == TransferEnded ? 1 : 0;
     m_waiting.push_back(std::move(message));
 }
 

@@ -76,8 +76,9 @@ public:
     void Deleted(TicketAddress ticket) noexcept override { Post(TicketDeleted, ticket, {}); }
 
     // Notifies one session of the end of a transfer, whatever it has switched on or off; nothing if it has
-    // not registered. The keys outlive the service.
+    // not registered.
     void TransferHasEnded(unsigned long long session, int code, ChangedParameters parameters) noexcept;
+    std::size_t UntoldEnds(Session const& session) const;  // of its transfers
 
     // Begins no further callback, for good, and waits for a running one, but no longer than told. Unless that
     // goes on, the thread is gone when this returns.
@@ -91,6 +92,7 @@ private:
         Callback callback;
         std::map<TicketAddress, KeyFilter> subscriptions{};
         std::size_t pending = 0;
+        std::size_t ends = 0;  // of transfers, among those that are pending
         bool gone = false;
 
         bool Wants(TicketAddress ticket) const;

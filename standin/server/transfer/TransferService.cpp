@@ -155,7 +155,8 @@ TransferResult TransferService::CarryLater(Session const& session, Request reque
     if (session.Ended() || m_stopped)
         return TransferCut;
     auto const isOurs = [&](Waiting const& each) { return each.session == session.Number(); };
-    if (std::count_if(m_waiting.begin(), m_waiting.end(), isOurs) >= std::ptrdiff_t{MostWaiting})
+    auto const waiting = static_cast<std::size_t>(std::count_if(m_waiting.begin(), m_waiting.end(), isOurs));
+    if (waiting + m_notifications.UntoldEnds(session) >= MostWaiting)
         return TooManyTransfers;
     if (!m_thread.joinable())
         m_thread = std::thread([this] { Work(); });

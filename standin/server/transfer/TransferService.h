@@ -1,6 +1,6 @@
 // Brings files to the server and fetches them. Each call works on the thread of its caller; those that are
 // left for later come one after another on one thread of the service's own. For any thread; no lock is held
-// while a file is copied. Failures are told in one line on stderr.
+// while a file is copied. A failure is one line on stderr.
 //
 // A path of the client's side is UTF-8; backslashes in it are separators, as in the paths of ticket files.
 #pragma once
@@ -36,7 +36,7 @@ private:
 class TransferService
 {
 public:
-    static constexpr std::size_t MostWaiting = 1000;  // of one session
+    static constexpr std::size_t MostWaiting = 1000;  // of one session, with those whose ends wait to be told
 
     // site: its folder, where nothing is put nor fetched, whatever the system ticket has for $(INSTALL).
     TransferService(Store& store, TicketService& tickets, NotificationService& notifications,
