@@ -85,6 +85,13 @@ TEST(Password, Secret_LeavesNothingInMemory)
     EXPECT_EQ(left.find("word"), left.npos);
 }
 
+TEST(Password, Secret_LeavesNothingWhereItsTextWas)
+{
+    std::string text = "s3cret-word";
+    Password::Secret const secret(std::move(text));
+    EXPECT_EQ(std::string(text.data(), text.capacity()), std::string(text.capacity(), '\0'));
+}
+
 TEST(PasswordFailures, AfterAFew_WaitLongerAndLonger)
 {
     Password::Failures failures;

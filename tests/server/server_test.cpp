@@ -44,6 +44,20 @@ TEST_F(Sessions, Login_WithAWrongPasswordOrUser_GivesNothing)
     EXPECT_FALSE(Server().Login("", ""));
 }
 
+TEST_F(Sessions, Login_OfWhoGuesses_IsAnsweredLaterAndLater_AndARightOneAtOnce)
+{
+    auto const duration = [this](char const* password)
+    {
+        auto const begin = std::chrono::steady_clock::now();
+        EXPECT_EQ(Server().Login("operator", password) != nullptr, password == std::string_view("secret"));
+        return std::chrono::steady_clock::now() - begin;
+    };
+    for (int i = 0; i < 8; ++i)
+        duration("guess");
+    EXPECT_GE(duration("guess"), std::chrono::milliseconds(800));
+    EXPECT_LT(duration("secret"), std::chrono::milliseconds(1600)) << "as a further guess would have to wait";
+}
+
 TEST_F(Sessions, Login_WithAFailingStore_Throws)
 {
     Server();

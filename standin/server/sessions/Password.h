@@ -14,8 +14,11 @@ namespace standin::Password
 class Secret
 {
 public:
-    explicit Secret(std::string text) : m_text(std::move(text)) {}
-    ~Secret() { explicit_bzero(m_text.data(), m_text.size()); }
+    explicit Secret(std::string&& text) : m_text(std::move(text))
+    {
+        explicit_bzero(text.data(), text.capacity());  // moving leaves a copy of a short text behind
+    }
+    ~Secret() { explicit_bzero(m_text.data(), m_text.capacity()); }
     Secret(Secret const&) = delete;
     Secret& operator=(Secret const&) = delete;
 
@@ -25,8 +28,9 @@ private:
     std::string m_text;
 };
 
-// Slows down who guesses: after a few failures within a minute each further one is answered later and later.
-// A right password never waits, so that nobody can keep another out. For any thread.
+// Slows down who guesses: after a few failures without a quiet minute between them each further one is
+// answered later and later. A right password never waits, so that nobody can keep another out. For any
+// thread.
 class Failures
 {
 public:
@@ -37,7 +41,7 @@ public:
 
 private:
     std::mutex m_lock;
-    int m_count = 0;  // within the minute
+    int m_count = 0;  // since the last quiet minute
     Time m_last{};
 };
 
