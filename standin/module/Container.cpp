@@ -137,7 +137,8 @@ bool Walk(Container& container, MWALKTICKETS_ACTION action, void* context, int t
             break;
         if (incarnation == 0)
             continue;
-        OpenTicket ticket(tickets, container.Session(), container.Folders(), {type, id}, incarnation);
+        OpenTicket ticket(tickets, container.Session(), container.Folders(), container.Numbers(), {type, id},
+                          incarnation);
         if (!action(context, type, id, ticket.Access()))
             break;
     }
@@ -182,7 +183,7 @@ STICKET_ACCESS const* OnCreate(void* instance, int type, int id, char const* con
 
 Container::Container(standin::Server& server, std::shared_ptr<standin::Session> session)
     : m_server(server), m_session(std::move(session)), m_folders(server.Tickets()),
-      m_opened(server.Tickets(), *m_session, m_folders)
+      m_opened(server.Tickets(), *m_session, m_folders, m_numbers)
 {
     m_access.Instance = this;
     m_access.MGETPARAMETER = OnGet;
@@ -193,5 +194,13 @@ Container::Container(standin::Server& server, std::shared_ptr<standin::Session> 
     m_access.MOPERATION = OnOperation;
     m_access.MENDISNOTIF = OnSwitch;
     m_access.MCREATETICKET = OnCreate;
+}
+
+bool Container::EndSession()
+{
+    if (!m_server.Logout(*m_session))
+        return false;
+    m_ownNumbers.reset();
+    return true;
 }
 }  // namespace standin

@@ -21,11 +21,18 @@ public:
     standin::Session& Session() const { return *m_session; }
     FolderTranslator& Folders() { return m_folders; }
     OpenTickets& Opened() { return m_opened; }
+    std::weak_ptr<WalkedNumbers> const& Numbers() const { return m_numbers; }
+
+    // False if the session had ended before.
+    bool EndSession();
 
 private:
     standin::Server& m_server;
     std::shared_ptr<standin::Session> const m_session;
     FolderTranslator m_folders;
+    std::shared_ptr<WalkedNumbers> m_ownNumbers =
+        std::make_shared<WalkedNumbers>();  // until the session ends
+    std::weak_ptr<WalkedNumbers> const m_numbers = m_ownNumbers;
     OpenTickets m_opened;
     MTICKET_ACCESS m_access{};
 };

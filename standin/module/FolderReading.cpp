@@ -23,7 +23,7 @@ bool FolderReading::Note(void const* ticket, std::string_view key, PARAM_TYPE ty
                        type == PARAM_STRING;
     if (!isDue)
     {
-        m_ticket = nullptr;
+        Forget();
         return false;
     }
     ++m_next;

@@ -23,6 +23,9 @@ public:
     // for what is no text. True if he cannot resolve it: Resolved tells what he is to get in its place.
     bool Note(void const* ticket, std::string_view key, PARAM_TYPE type, int number, char const* text);
 
+    // Something else was read of the ticket.
+    void Forget() { m_ticket = nullptr; }
+
     // Empty, as if the folder were not there, if nobody can resolve it. folders: as they are now.
     std::string Resolved(FolderSettings const& folders);
 

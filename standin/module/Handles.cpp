@@ -58,7 +58,12 @@ Container const* Handles::SessionOf(void* hSession) const
 
 bool Handles::EndSession(void* hSession)
 {
-    Container const* const container = SessionOf(hSession);
-    return container && container->Server().Logout(container->Session());
+    Container* container = nullptr;
+    {
+        std::lock_guard const lock(m_lock);
+        auto const found = m_sessions.find(hSession);
+        container = found == m_sessions.end() ? nullptr : found->second.get();
+    }
+    return container && container->EndSession();
 }
 }  // namespace standin

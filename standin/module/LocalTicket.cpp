@@ -100,8 +100,7 @@ bool LocalTicket::Walk(SWALKPARAMETERS_ACTION action, void* context, char const*
             if (element.IsText())
                 element.text->HandOut(m_reader.Mark());
             BIN_STRING binary;
-            bool const isNumber = SizeOfNumber(element.type) && element.type != PARAM_POINTER;
-            void const* const word = isNumber ? m_numbers.AddressOf(element.word) : WordOf(element, binary);
+            void const* const word = WordOfWalked(element, m_numbers, binary);
             if (!action(context, key->CStr(), element.type, word, element.pos))
                 return true;
         }

@@ -64,25 +64,40 @@ bool WriteTable(TicketService& tickets, Session const& session, TicketAddress ad
 
 bool OpenTicket::Get(char const* key, PARAM_TYPE type, void* value, int pos)
 {
-    bool const isRead = ReadTicket(m_tickets, m_session, m_address, Which(), key, type, value, pos);
-    if (m_address != SystemTicket || !key) [[likely]]
-        return isRead;
-    int const number = isRead && type == PARAM_INT ? *static_cast<int const*>(value) : 0;
-    char const* const text =
-        isRead && type == PARAM_STRING ? *static_cast<char const* const*>(value) : nullptr;
+    if (m_address == SystemTicket && key && value && (type == PARAM_STRING || type == PARAM_INT)) [[unlikely]]
+        return GetFolder(key, type, value, pos);
+    if (m_address == SystemTicket)
+        FolderReading::OfThisThread().Forget();
+    return ReadTicket(m_tickets, m_session, m_address, Which(), key, type, value, pos);
+}
+
+// A folder, perhaps, or whether folders are used at all.
+bool OpenTicket::GetFolder(char const* key, PARAM_TYPE type, void* value, int pos)
+{
+    char const* text = nullptr;
+    int number = 0;
+    void* const out = type == PARAM_STRING ? static_cast<void*>(&text) : &number;
+    bool isRead = ReadTicket(m_tickets, m_session, m_address, Which(), key, type, out, pos);
     auto& folders = FolderReading::OfThisThread();
     std::string_view const read = pos <= 0 ? key : "";  // no folder is at another position
-    if (!folders.Note(this, read, type, number, text))
-        return isRead;
-    auto const texts = m_session.HoldTexts();
-    if (texts)
-        *static_cast<char const**>(value) =
-            m_tickets.HandOut(m_session, folders.Resolved(m_tickets.Folders()));
-    return texts != nullptr;
+    if (folders.Note(this, read, type, number, text))
+    {
+        auto const texts = m_session.HoldTexts();
+        isRead = texts != nullptr;
+        if (isRead)
+            text = m_tickets.HandOut(m_session, folders.Resolved(m_tickets.Folders()));
+    }
+    if (isRead && type == PARAM_STRING)
+        *static_cast<char const**>(value) = text;
+    else if (isRead)
+        *static_cast<int*>(value) = number;
+    return isRead;
 }
 
 bool OpenTicket::GetTable(GETMULTIPAR* table)
 {
+    if (m_address == SystemTicket)
+        FolderReading::OfThisThread().Forget();
     return ReadTable(m_tickets, m_session, m_address, Which(), table);
 }
 
@@ -100,8 +115,13 @@ bool OpenTicket::SetTable(SETMULTIPAR* table)
 // walk that left out values would lose them for good where a ticket is copied by walking over it.
 bool OpenTicket::Walk(SWALKPARAMETERS_ACTION action, void* context, char const* prefix, int)
 {
-    auto const texts = m_session.HoldTexts();  // the session may end meanwhile, in the action or elsewhere
-    if (!action || !texts)
+    if (m_address == SystemTicket)
+        FolderReading::OfThisThread().Forget();
+    // The session may end meanwhile, in the action or elsewhere, and the action may take any time.
+    auto const texts = m_session.HoldTexts();
+    auto const numbers = m_numbers.lock();
+    TextReader::Walk const walk(m_session.Reader());
+    if (!action || !texts || !numbers)
         return false;
     auto const walked = m_tickets.Values(m_session, m_address, Which(), prefix ? prefix : "");
     if (!walked)
@@ -109,9 +129,7 @@ bool OpenTicket::Walk(SWALKPARAMETERS_ACTION action, void* context, char const* 
     for (WalkedValues::Value const& value : walked->Values())
     {
         BIN_STRING binary;
-        bool const isNumber = SizeOfNumber(value.element.type) && value.element.type != PARAM_POINTER;
-        void const* const word =
-            isNumber ? m_numbers.AddressOf(value.element.word) : WordOf(value.element, binary);
+        void const* const word = WordOfWalked(value.element, *numbers, binary);
         if (m_session.Ended() ||
             !action(context, walked->KeyOf(value), value.element.type, word, value.element.pos))
             break;

@@ -7,6 +7,7 @@
 #include "standin/module/TicketTable.h"
 #include "standin/module/WalkedNumbers.h"
 #include "standin/server/sessions/TicketService.h"
+#include <memory>
 
 namespace standin
 {
@@ -25,11 +26,11 @@ bool WriteTable(TicketService& tickets, Session const& session, TicketAddress ad
 class OpenTicket : private TicketSubject
 {
 public:
-    // The services, the session and its translator outlive it.
+    // The services, the session and its translator outlive it. numbers: of the session, gone with its end.
     OpenTicket(TicketService& tickets, Session const& session, FolderTranslator& folders,
-               TicketAddress address, Incarnation incarnation)
-        : m_tickets(tickets), m_session(session), m_folders(folders), m_address(address),
-          m_incarnation(incarnation)
+               std::weak_ptr<WalkedNumbers> numbers, TicketAddress address, Incarnation incarnation)
+        : m_tickets(tickets), m_session(session), m_folders(folders), m_numbers(std::move(numbers)),
+          m_address(address), m_incarnation(incarnation)
     {
     }
 
@@ -41,6 +42,7 @@ public:
 
 private:
     bool Get(char const* key, PARAM_TYPE type, void* value, int pos) override;
+    bool GetFolder(char const* key, PARAM_TYPE type, void* value, int pos);
     bool GetTable(GETMULTIPAR* table) override;
     bool Set(char const* key, PARAM_TYPE type, void const* value, int pos) override;
     bool SetTable(SETMULTIPAR* table) override;
@@ -50,9 +52,9 @@ private:
     TicketService& m_tickets;
     Session const& m_session;
     FolderTranslator& m_folders;
+    std::weak_ptr<WalkedNumbers> const m_numbers;
     TicketAddress const m_address;
     std::atomic<Incarnation> m_incarnation;
-    WalkedNumbers m_numbers;
     TicketTable const m_table{*this};
 };
 }  // namespace standin

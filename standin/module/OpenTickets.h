@@ -11,8 +11,9 @@ namespace standin
 class OpenTickets
 {
 public:
-    OpenTickets(TicketService& tickets, Session const& session, FolderTranslator& folders)
-        : m_tickets(tickets), m_session(session), m_folders(folders)
+    OpenTickets(TicketService& tickets, Session const& session, FolderTranslator& folders,
+                std::weak_ptr<WalkedNumbers> numbers)
+        : m_tickets(tickets), m_session(session), m_folders(folders), m_numbers(std::move(numbers))
     {
     }
 
@@ -35,6 +36,7 @@ private:
     TicketService& m_tickets;
     Session const& m_session;
     FolderTranslator& m_folders;
+    std::weak_ptr<WalkedNumbers> const m_numbers;
     std::mutex m_lock;
     std::map<TicketAddress, Entry> m_open;
     std::vector<std::unique_ptr<OpenTicket>> m_outlived;  // open when their ticket was made anew

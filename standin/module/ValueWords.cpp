@@ -89,6 +89,12 @@ void const* WordOf(TicketElement const& element, BIN_STRING& binary)
     return WordOf(element.type, element.word, element.IsText() ? element.text : nullptr, binary);
 }
 
+void const* WordOfWalked(TicketElement const& element, WalkedNumbers& numbers, BIN_STRING& binary)
+{
+    bool const isNumber = SizeOfNumber(element.type) && element.type != PARAM_POINTER;
+    return isNumber ? numbers.AddressOf(element.word) : WordOf(element, binary);
+}
+
 void const* WordOf(TicketValue const& value, BIN_STRING& binary)
 {
     return WordOf(value.type, value.word, value.text.get(), binary);

@@ -3,6 +3,7 @@
 
 #include "comgui/ticket/BIN_STRING.h"
 #include "comgui/ticket/SETMULTIPAR.h"
+#include "standin/module/WalkedNumbers.h"
 #include "standin/server/tickets/TextReader.h"
 #include "standin/server/tickets/WritePlan.h"
 #include <span>
@@ -18,6 +19,9 @@ bool ReadValue(KeyValues const& values, PARAM_TYPE type, void* out, int pos, Tex
 // filled in.
 void const* WordOf(TicketElement const& element, BIN_STRING& binary);
 void const* WordOf(TicketValue const& value, BIN_STRING& binary);
+
+// The same as a walk gives it: a number's stays good for a while.
+void const* WordOfWalked(TicketElement const& element, WalkedNumbers& numbers, BIN_STRING& binary);
 
 // A record's write. Without a value if that cannot be written: an unknown type, PARAM_COUNT, a null word
 // where an address is due, a deletion with a value, a BIN_STRING without bytes. Keys are borrowed.

@@ -4,6 +4,7 @@
 #include "comgui/folders/FolderVariables.h"
 #include "comgui/folders/Variables.h"
 #include "comgui/folders/clFOLDER_VARIABLES.h"
+#include "tests/support/Allocations.h"
 #include <cstdio>
 #include <future>
 #include <random>
@@ -188,6 +189,62 @@ TEST_F(FolderReaders, WhoReadsOtherwise_GetsTheTextThatIsThere)
     EXPECT_STREQ(Text(ticket, Install), "/opt/it");
     EXPECT_STREQ(Text(ticket, Temp), "$(INSTALL)/tmp");
     EXPECT_STREQ(Text(ticket, Temp), "$(INSTALL)/tmp");
+}
+
+// The first folder after the beginning is due, and leans on one that was not read.
+TEST_F(FolderReaders, WhoReadsATableOrWalksInBetween_GetsTheTextThatIsThere)
+{
+    ASSERT_TRUE(Write(Install, "/opt/it"));
+    ASSERT_TRUE(Write(Temp, "$(INSTALL)/tmp"));
+    ASSERT_TRUE(other.Limit(0, 0, {Use, Temp}));
+    auto const* const ticket = other.Open(0, 0);
+    auto const readUpTo = [&]
+    {
+        int use = 0;
+        EXPECT_TRUE(ticket->SGETPARAMETER(ticket->Instance, Use, PARAM_INT, &use, -1));
+        Text(ticket, Install);
+    };
+    readUpTo();
+    EXPECT_STREQ(Text(ticket, Temp), "/opt/it/tmp") << "as the library reads";
+    readUpTo();
+    GETMULTIPAR table[1] = {};
+    EXPECT_EQ(ticket->SGETMULTIPAR(ticket->Instance, table), 1);
+    EXPECT_STREQ(Text(ticket, Temp), "$(INSTALL)/tmp");
+    readUpTo();
+    auto const action = [](void*, char const*, PARAM_TYPE, void const*, int) { return true; };
+    EXPECT_EQ(ticket->SWALKPARAMETERS(ticket->Instance, action, nullptr, "none", 8000), 1);
+    EXPECT_STREQ(Text(ticket, Temp), "$(INSTALL)/tmp");
+    readUpTo();
+    double number = 0;
+    EXPECT_EQ(ticket->SGETPARAMETER(ticket->Instance, Use, PARAM_DOUBLE, &number, -1), 0);
+    EXPECT_STREQ(Text(ticket, Temp), "$(INSTALL)/tmp");
+}
+
+// At whichever place the memory ends: what is not read is not touched.
+TEST_F(FolderReaders, WithoutMemory_ReadNothingOrTheWholeText)
+{
+    ASSERT_TRUE(Write(Install, "/opt/it"));
+    ASSERT_TRUE(Write(Temp, "$(INSTALL)/tmp"));
+    ASSERT_TRUE(other.Limit(0, 0, {Use, Temp}));
+    auto const* const ticket = other.Open(0, 0);
+    bool hasFailed = true;
+    int failures = 0;
+    for (int n = 0; hasFailed && n < 1000; ++n)
+    {
+        int use = 0;
+        EXPECT_TRUE(ticket->SGETPARAMETER(ticket->Instance, Use, PARAM_INT, &use, -1));
+        Text(ticket, Install);
+        char const* text = "untouched";
+        int isRead = 0;
+        {
+            FailingAllocation const failing(n);
+            isRead = ticket->SGETPARAMETER(ticket->Instance, Temp, PARAM_STRING, &text, -1);
+            hasFailed = failing.HasHappened();
+        }
+        failures += hasFailed ? 1 : 0;
+        EXPECT_STREQ(text, isRead ? "/opt/it/tmp" : "untouched") << n;
+    }
+    EXPECT_GT(failures, 0);
 }
 
 TEST_F(FolderReaders, WhoReadsAnotherPosition_GetsTheTextThatIsThere)

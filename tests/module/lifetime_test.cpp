@@ -163,6 +163,30 @@ TEST_F(Lifetimes, TextsOfAWalk_StayToItsEnd)
     EXPECT_LT(LiveAllocations() - before, Others);
 }
 
+// Whatever ticket they were of, and whether it is still open.
+TEST_F(Lifetimes, NumbersOfWalks_StayUntilTheLogout)
+{
+    Flush(second);
+    long const before = LiveAllocations();
+    for (int pos = 0; pos < Texts; ++pos)
+        second.Set("Texts", PARAM_INT, &pos, pos);
+    std::vector<void const*> numbers;
+    auto const action = [](void* context, char const*, PARAM_TYPE, void const* value, int)
+    {
+        static_cast<std::vector<void const*>*>(context)->push_back(value);
+        return true;
+    };
+    first.Walk(action, &numbers);
+    second.Delete();
+    Flush(second);
+    ASSERT_EQ(numbers.size(), std::size_t{Texts});
+    for (int pos = 0; pos < Texts; ++pos)
+        ASSERT_EQ(*static_cast<int const*>(numbers[static_cast<std::size_t>(pos)]), pos);
+    EXPECT_GT(LiveAllocations() - before, Texts);
+    first.Logout();
+    EXPECT_LT(LiveAllocations() - before, Others);
+}
+
 TEST(LocalTicketLifetimes, TextsThatWereRead_StayUntilTheTicketIsDestroyed)
 {
     TICKET_FACTORY const factory;

@@ -16,7 +16,7 @@ namespace
 class COUNTING_KEEPER : public TextKeeper
 {
 public:
-    void Keep(TicketTexts texts) override
+    void Keep(TicketTexts texts) noexcept override
     {
         std::lock_guard const lock(m_lock);
         for (auto& text : texts)
@@ -229,7 +229,7 @@ TEST_F(ReadingSections, Drain_WaitsForWhoCollects)
 {
     struct SlowKeeper : TextKeeper
     {
-        void Keep(TicketTexts) override
+        void Keep(TicketTexts) noexcept override
         {
             begun.set_value();
             gate.get_future().wait();

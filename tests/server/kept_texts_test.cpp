@@ -1,6 +1,7 @@
 // How long texts live that were read, by a clock of the test's own.
 #include "standin/module/WalkedNumbers.h"
 #include "standin/server/sessions/KeptTexts.h"
+#include "tests/support/Allocations.h"
 #include <gtest/gtest.h>
 #include <memory>
 #include <vector>
@@ -147,6 +148,57 @@ TEST_F(KeptTextsTest, TenMinutesAndTenThousandReads_AreEnough)
     now += 1min;
     Replace({&client});
     EXPECT_EQ(kept.Count(), 3u) << "the first has gone, and there is a fourth";
+}
+
+// A dialog of a walk's action may be open for hours.
+TEST_F(KeptTextsTest, WhileTheirReaderWalks_NoneGoes)
+{
+    Client client(kept);
+    auto const growOld = [&]
+    {
+        for (int i = 0; i < 3; ++i)
+        {
+            client.Reads(2 * KeptTexts::KeptReads);
+            now += 1h;
+            LookAgain();
+        }
+    };
+    {
+        TextReader::Walk const walk(client.reader);
+        {
+            TextReader::Walk const inner(client.reader);
+        }
+        Replace({&client});
+        growOld();
+        EXPECT_EQ(kept.Count(), 1u);
+    }
+    growOld();
+    EXPECT_EQ(kept.Count(), 0u);
+}
+
+TEST_F(KeptTextsTest, WithoutMemoryForAnAccount_ATextStaysForGood)
+{
+    for (int failing = 0; failing < 3; ++failing)
+    {
+        KeptTexts texts;
+        Client client(texts);
+        TicketTexts replaced;
+        replaced.push_back(std::make_unique<TicketText>("a text that is long enough to be on the heap"));
+        std::unique_ptr<TicketText> stays;
+        TicketText* const text = replaced.back().get();
+        text->HandOut(client.reader.Mark());
+        bool hasFailed = false;
+        {
+            FailingAllocation const fault(failing);
+            texts.Keep(std::move(replaced));
+            hasFailed = fault.HasHappened();
+        }
+        EXPECT_EQ(text->bytes, "a text that is long enough to be on the heap");
+        EXPECT_EQ(texts.Count(), hasFailed ? 0u : 1u);
+        if (hasFailed)
+            stays.reset(text);
+        EXPECT_TRUE(hasFailed || failing > 0) << "nothing was asked for";
+    }
 }
 
 TEST_F(KeptTextsTest, WhoReadsOn_DoesNotTakeAwayWhatAnotherMayHold)

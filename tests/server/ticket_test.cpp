@@ -415,7 +415,9 @@ TEST_F(TicketPromises, TextsOfAWalk_StayToItsEndThoughTheSessionEnds)
     Set(Job, "A", "first text, too long for any short string");
     Set(Job, "B", "second text, too long for any short string");
     standin::FolderTranslator folders(Tickets());
-    standin::OpenTicket const ticket(Tickets(), As("admin"), folders, Job, Tickets().IncarnationOf(Job));
+    auto const numbers = std::make_shared<standin::WalkedNumbers>();
+    standin::OpenTicket const ticket(Tickets(), As("admin"), folders, numbers, Job,
+                                     Tickets().IncarnationOf(Job));
     As("operator");
     struct Walk
     {
@@ -430,6 +432,7 @@ TEST_F(TicketPromises, TextsOfAWalk_StayToItsEndThoughTheSessionEnds)
         EXPECT_TRUE(Set(As("operator"), Job, "B", PARAM_STRING, news, -1));
         EXPECT_EQ(RetiredTexts(), 2u);
         EXPECT_STREQ(text, "first text, too long for any short string");
+        EXPECT_TRUE(As("admin").Reader().IsWalking());
     };
     auto const action = [](void* context, char const*, PARAM_TYPE, void const* value, int)
     {
@@ -440,6 +443,7 @@ TEST_F(TicketPromises, TextsOfAWalk_StayToItsEndThoughTheSessionEnds)
     };
     EXPECT_EQ(ticket.Access()->SWALKPARAMETERS(ticket.Access()->Instance, action, &walk, "", 8000), 1);
     EXPECT_EQ(walk.calls, 1);
+    EXPECT_FALSE(As("admin").Reader().IsWalking());
     EXPECT_EQ(RetiredTexts(), 0u);
 }
 

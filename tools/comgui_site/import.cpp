@@ -64,7 +64,7 @@ class Nobody final : public standin::ChangeListener, public standin::TextKeeper,
     void Created(TicketAddress) noexcept override {}
     void Written(TicketAddress, standin::ChangedParameters&&) noexcept override {}
     void Deleted(TicketAddress) noexcept override {}
-    void Keep(standin::TicketTexts) override {}
+    void Keep(standin::TicketTexts) noexcept override {}
     void SystemTicketChanged() noexcept override {}
     std::function<void()> WhenDeleted(TicketAddress, standin::TicketSnapshot const&) override { return {}; }
 };

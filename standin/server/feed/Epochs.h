@@ -21,7 +21,7 @@ class TextKeeper
 {
 public:
     virtual ~TextKeeper() = default;
-    virtual void Keep(TicketTexts texts) = 0;  // called on any thread that changes tickets
+    virtual void Keep(TicketTexts texts) noexcept = 0;  // called on any thread that changes tickets
 };
 
 class Epochs

@@ -42,20 +42,36 @@ void KeptTexts::Close(TextReader const& reader)
     std::erase_if(m_groups, [](Group const& group) { return group.texts.empty(); });
 }
 
-void KeptTexts::Keep(TicketTexts texts)
+void KeptTexts::Keep(TicketTexts texts) noexcept
 {
-    Time const now = m_clock();
     std::lock_guard const lock(m_lock);
+    Time const now = m_clock();
     if (now - m_lastLook >= GroupTime)
         Forget(now);
+    std::erase_if(texts, [this](auto const& text)
+                  { return (text->readers.load(std::memory_order_relaxed) & m_open) == 0; });
+    try
+    {
+        Append(texts);
+    }
+    catch (std::bad_alloc const&)
+    {
+        for (auto& text : texts)
+            static_cast<void>(text.release());  // somebody has its address: it stays for good
+    }
+}
+
+void KeptTexts::Append(TicketTexts& texts)
+{
+    if (texts.empty())
+        return;
+    if (m_groups.empty() || m_groups.back().isClosed)
+        m_groups.emplace_back();
+    auto& newest = m_groups.back().texts;
     for (auto& text : texts)
     {
-        std::uint64_t const readers = text->readers.load(std::memory_order_relaxed) & m_open;
-        if (!readers)
-            continue;
-        if (m_groups.empty() || m_groups.back().isClosed)
-            m_groups.emplace_back();
-        m_groups.back().texts.push_back({readers, std::move(text)});
+        newest.push_back({text->readers.load(std::memory_order_relaxed) & m_open, nullptr});
+        newest.back().text = std::move(text);
     }
 }
 
@@ -85,8 +101,12 @@ std::uint64_t KeptTexts::WhoIsPast(Group const& group, Time now) const
     std::uint64_t past = 0;
     if (now - group.end >= KeptFor)
         for (std::size_t mark = 0; mark < SharedMark; ++mark)
-            if ((m_open & BitOf(mark)) && m_readers[mark]->Reads() - group.reads[mark] >= KeptReads)
+        {
+            bool const isOpen = (m_open & BitOf(mark)) != 0;
+            if (isOpen && !m_readers[mark]->IsWalking() &&
+                m_readers[mark]->Reads() - group.reads[mark] >= KeptReads)
                 past |= BitOf(mark);
+        }
     return past;
 }
 

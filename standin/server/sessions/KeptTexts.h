@@ -1,6 +1,7 @@
 // How long texts live that clients have read. A text that leaves its ticket stays for each session that has
 // read it, until that session has ended, or until ten minutes have passed and the session has read 10,000
-// texts more. So the memory of a session that lives for months stays bounded. For any thread.
+// texts more; a walk that is under way keeps its texts to its end. So the memory of a session that lives for
+// months stays bounded. For any thread.
 #pragma once
 
 #include "standin/server/feed/Epochs.h"
@@ -29,8 +30,8 @@ public:
     // above. He outlives it.
     Lease Open(TextReader& reader);
 
-    // What is old enough goes on the way.
-    void Keep(TicketTexts texts) override;
+    // What is old enough goes on the way. For what there is no memory to keep account of stays for good.
+    void Keep(TicketTexts texts) noexcept override;
 
     std::size_t Count() const;  // of texts that still wait
 
@@ -57,6 +58,7 @@ private:
     };
 
     void Close(TextReader const& reader);
+    void Append(TicketTexts& texts);
     void Forget(Time now);
     void CloseNewest(Time now);
     std::uint64_t WhoIsPast(Group const& group, Time now) const;

@@ -18,8 +18,8 @@ public:
     void SetMark(std::uint64_t mark) { m_marks = mark; }
     std::uint64_t Mark() const { return m_marks; }
 
-    // Threads that read in turns with others of their process count a few at a time, and lose some: what is
-    // counted is never too much.
+    // A thread counts a batch at a time, and loses the rest of one when it reads for another reader: what is
+    // counted may be less than what was read, and never more.
     void NoteRead() noexcept
     {
         Batch& batch = s_batch;
@@ -35,6 +35,21 @@ public:
         }
     }
     std::uint64_t Reads() const { return m_reads.load(std::memory_order_relaxed); }
+
+    // While it lives a walk is under way, which has read all its texts at the beginning and hands them out
+    // one by one, however long that takes.
+    class Walk
+    {
+    public:
+        explicit Walk(TextReader& reader) : m_reader(reader) { m_reader.m_walks.fetch_add(1); }
+        ~Walk() { m_reader.m_walks.fetch_sub(1); }
+        Walk(Walk const&) = delete;
+        Walk& operator=(Walk const&) = delete;
+
+    private:
+        TextReader& m_reader;
+    };
+    bool IsWalking() const { return m_walks.load() != 0; }
 
 private:
     static constexpr std::uint64_t BatchSize = 64;
@@ -55,5 +70,6 @@ private:
     std::uint64_t const m_number = s_newest.fetch_add(1, std::memory_order_relaxed) + 1;  // none twice
     std::uint64_t m_marks;
     std::atomic<std::uint64_t> m_reads{0};
+    std::atomic<unsigned> m_walks{0};
 };
 }  // namespace standin
