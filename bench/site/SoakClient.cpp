@@ -196,7 +196,8 @@ private:
     std::int64_t m_rounds = 0;
 };
 
-// Long sessions that read and replace many texts; a text that was read stays until the logout.
+// Long sessions that read and replace many texts, but not so many that one that was read may go before the
+// logout.
 class Texts : public Work
 {
 public:
