@@ -15,6 +15,8 @@
 
 namespace comgui_site
 {
+using standin::Password::Secret;
+
 namespace
 {
 // While it lives the terminal shows nothing but the ends of lines, and Ctrl-Z has no effect: the shell would
@@ -122,8 +124,6 @@ void AskTwice(std::string const& user, Secret& password)
         throw Trouble("the two passwords differ; nothing was changed, try again");
 }
 }  // namespace
-
-Secret::~Secret() { explicit_bzero(m_text.data(), m_text.size()); }
 
 std::string HashOfNewPassword(std::string const& user)
 {

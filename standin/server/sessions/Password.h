@@ -10,10 +10,14 @@
 
 namespace standin::Password
 {
-// A copy of a password, of which nothing is left in memory when it goes.
+// A password of which nothing is left in memory when it goes. Longer ones than there is room for are of use
+// to nobody.
 class Secret
 {
 public:
+    static constexpr std::size_t Room = 4096;
+
+    Secret() { m_text.reserve(Room); }  // a text that has to move leaves itself behind
     explicit Secret(std::string&& text) : m_text(std::move(text))
     {
         explicit_bzero(text.data(), text.capacity());  // moving leaves a copy of a short text behind
@@ -22,6 +26,8 @@ public:
     Secret(Secret const&) = delete;
     Secret& operator=(Secret const&) = delete;
 
+    bool IsFull() const { return m_text.size() >= Room; }
+    void Add(char byte) { m_text += byte; }  // of one made empty, unless it is full
     std::string const& Text() const { return m_text; }
 
 private:
