@@ -97,7 +97,7 @@ TEST(SetDataHolder, Text_IsCopiedAsItStands)
     EXPECT_STREQ(static_cast<char*>(holder.m_value), "Gr\xC3\xBC\xFFn");
 }
 
-// Whoever reads it as wide finds an end within the copy, which a sanitizer of addresses watches.
+// Whoever reads it as wide finds an end within the copy; behind it is none.
 TEST(SetDataHolder, TextOfAnyLength_IsATerminatedWideTextAsWell)
 {
     for (std::size_t length = 0; length < 10; ++length)

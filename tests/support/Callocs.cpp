@@ -2,6 +2,8 @@
 
 #include "tests/support/sanitizers.h"
 #include <cstddef>
+#include <cstdint>
+#include <cstring>
 
 // A sanitizer has to know each block that is given back to it.
 #if COMGUI_SANITIZED
@@ -20,6 +22,7 @@ namespace
 {
 thread_local int calls = 0;
 thread_local int failIn = -1;
+constexpr std::size_t Behind = 16;
 }  // namespace
 
 // A new thread calls it before the thread sanitizer knows that thread, so it must not be instrumented.
@@ -31,9 +34,19 @@ __attribute__((no_sanitize("thread")))
 void* calloc(std::size_t count, std::size_t size) noexcept
 {
     ++calls;
-    if (failIn >= 0 && failIn-- == 0)
+    bool const isTooLarge = size != 0 && count > (PTRDIFF_MAX - Behind) / size;
+    if (isTooLarge || (failIn >= 0 && failIn-- == 0))
         return nullptr;
+#if COMGUI_SANITIZED
     return COMGUI_REAL_CALLOC(count, size);
+#else
+    // Behind a block is what is no end of any text.
+    std::size_t const room = count * size;
+    auto* const block = static_cast<unsigned char*>(COMGUI_REAL_CALLOC(1, room + Behind));
+    if (block)
+        std::memset(block + room, 0xDD, Behind);
+    return block;
+#endif
 }
 
 CountedCallocs::CountedCallocs() : m_before(calls) {}
