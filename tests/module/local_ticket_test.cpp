@@ -291,6 +291,17 @@ TEST_F(TicketFile, AChange_IsInTheFileOnceTheTicketIsDestroyed)
     EXPECT_THAT(NamesIn(folder.Path()), ElementsAre("ticket.xml"));
 }
 
+TEST_F(TicketFile, AChangeBeforeADeletionOfWhatIsNotThere_IsInTheFile)
+{
+    std::string const path = Written("<parameter key='Old' type='int'>1</parameter>");
+    {
+        TICKET const ticket(factory, path);
+        EXPECT_TRUE(ticket.Set("New", "text"));
+        EXPECT_TRUE(ticket.Delete("missing"));
+    }
+    EXPECT_THAT(WalkOver(TICKET(factory, path)), ElementsAre("New[0]=text", "Old[0]=1"));
+}
+
 TEST_F(TicketFile, WithoutAChange_IsLeftAsItWas)
 {
     std::string const path = Written("<!-- by hand --><parameter key='K' type='int'>1</parameter>");

@@ -4,8 +4,12 @@
 #include "standin/server/feed/TicketCache.h"
 #include "standin/server/sessions/KeptTexts.h"
 #include "standin/server/tickets/OwnedTicket.h"
+#include "tests/server/MemoryFolder.h"
+#include "tests/server/Program.h"
 #include "tests/support/Allocations.h"
+#include <condition_variable>
 #include <gmock/gmock.h>
+#include <mutex>
 #include <thread>
 
 using namespace standin;
@@ -157,6 +161,17 @@ TEST_F(CachedKeys, KeysThatComeAndGo_DoNotPileUp)
     EXPECT_EQ(cache.Find(Job)->Keys(), 1u);
 }
 
+TEST_F(CachedKeys, WrittenAgainAndAgain_StayTheSame)
+{
+    Load();
+    for (int i = 0; i < 3; ++i)
+        Make("stays", TicketValue::Int(i));
+    WriteAndDelete(0, 3000);
+    EXPECT_EQ(cache.Intern("stays"), cache.Find(Job)->Find("stays")->Name());
+    Make("stays", TicketValue::Int(4));
+    EXPECT_EQ(cache.Find(Job)->Keys(), 1u);
+}
+
 TEST_F(CachedKeys, OfDeletedTickets_DoNotPileUp)
 {
     for (int i = 0; i < 5000; ++i)
@@ -183,6 +198,45 @@ TEST_F(CachedKeys, ThatAReaderMaySee_AreThereUntilItLeaves)
         EXPECT_EQ(values->Name()->Text(), "seen");        // freed memory has other bytes
     }
     Epochs::Get().Drain();
+}
+
+// The callback for the first change waits while the key of the second goes from the ticket.
+TEST(NotifiedKeys, StayUntilTheyAreTold)
+{
+    MemoryFolder const folder;
+    auto const site = std::make_shared<MemorySite>();
+    site->AddTicket(SystemTicket);
+    site->AddTicket(Job);
+    Program program(site, folder.Path());
+    auto& service = program.server.Notifications();
+    int const id = service.NewId();
+    std::atomic<bool> mayGoOn{false};
+    std::mutex lock;
+    std::condition_variable changed;
+    std::vector<std::string> told;
+    ASSERT_TRUE(service.Register(program.session, id,
+                                 [&](Notification const& each)
+                                 {
+                                     while (!mayGoOn)
+                                         std::this_thread::yield();
+                                     std::lock_guard const guard(lock);
+                                     for (ChangedParameter const& change : each.parameters)
+                                         told.emplace_back(change.key->CStr());
+                                     changed.notify_all();
+                                 }));
+    ASSERT_TRUE(service.Enable(program.session, id, Job, KeyFilter(nullptr)));
+    std::vector<std::string> written{"first", "second", "second"};
+    EXPECT_TRUE(program.Set(Job, "first", 1) && program.Set(Job, "second", 2) && program.Drop(Job, "second"));
+    for (int i = 0; i < 3000; ++i)
+    {
+        EXPECT_TRUE(program.Set(Job, KeyOf(i).c_str(), i) && program.Drop(Job, KeyOf(i).c_str()));
+        written.insert(written.end(), 2, KeyOf(i));
+    }
+    Epochs::Get().Drain();
+    mayGoOn = true;
+    std::unique_lock guard(lock);
+    changed.wait_for(guard, std::chrono::minutes(2), [&] { return told.size() == written.size(); });
+    EXPECT_EQ(told, written);
 }
 
 TEST(TicketFileKeys, ThatComeAndGo_DoNotPileUp)
