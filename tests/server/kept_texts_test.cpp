@@ -4,6 +4,7 @@
 #include "tests/support/Allocations.h"
 #include <gtest/gtest.h>
 #include <memory>
+#include <optional>
 #include <vector>
 
 using namespace standin;
@@ -176,28 +177,34 @@ TEST_F(KeptTextsTest, WhileTheirReaderWalks_NoneGoes)
     EXPECT_EQ(kept.Count(), 0u);
 }
 
-TEST_F(KeptTextsTest, WithoutMemoryForAnAccount_ATextStaysForGood)
+TEST_F(KeptTextsTest, WithoutMemoryForAnAccount_TextsStayAsLongAsAnybodyReads)
 {
     for (int failing = 0; failing < 3; ++failing)
     {
         KeptTexts texts;
         Client client(texts);
+        std::optional<Client> other(texts);
+        long const before = LiveAllocations();
         TicketTexts replaced;
-        replaced.push_back(std::make_unique<TicketText>("a text that is long enough to be on the heap"));
-        std::unique_ptr<TicketText> stays;
-        TicketText* const text = replaced.back().get();
-        text->HandOut(client.reader.Mark());
+        for (int i = 0; i < 2; ++i)
+        {
+            replaced.push_back(std::make_unique<TicketText>("a text that is long enough to be on the heap"));
+            replaced.back()->HandOut(client.reader.Mark());
+        }
+        TicketText const* const handedOut[] = {replaced[0].get(), replaced[1].get()};
         bool hasFailed = false;
         {
             FailingAllocation const fault(failing);
             texts.Keep(std::move(replaced));
             hasFailed = fault.HasHappened();
         }
-        EXPECT_EQ(text->bytes, "a text that is long enough to be on the heap");
-        EXPECT_EQ(texts.Count(), hasFailed ? 0u : 1u);
-        if (hasFailed)
-            stays.reset(text);
         EXPECT_TRUE(hasFailed || failing > 0) << "nothing was asked for";
+        other.reset();
+        for (TicketText const* const each : handedOut)
+            EXPECT_EQ(each->bytes, "a text that is long enough to be on the heap");
+        client.lease.reset();
+        replaced.clear();
+        EXPECT_LE(LiveAllocations(), before) << "they have gone";
     }
 }
 

@@ -37,6 +37,8 @@ void KeptTexts::Close(TextReader const& reader)
     if (isShared && --m_sharing != 0)
         return;
     m_open &= ~reader.Mark();
+    if (m_open == 0)
+        DropUnaccounted();
     for (Group& group : m_groups)
         TakeAway(group, reader.Mark());
     std::erase_if(m_groups, [](Group const& group) { return group.texts.empty(); });
@@ -56,8 +58,27 @@ void KeptTexts::Keep(TicketTexts texts) noexcept
     }
     catch (std::bad_alloc const&)
     {
-        for (auto& text : texts)
-            static_cast<void>(text.release());  // somebody has its address: it stays for good
+        KeepUnaccounted(texts);
+    }
+}
+
+void KeptTexts::KeepUnaccounted(TicketTexts& texts) noexcept
+{
+    for (auto& text : texts)
+        if (text)
+        {
+            text->readers.store(std::bit_cast<std::uintptr_t>(m_unaccounted), std::memory_order_relaxed);
+            m_unaccounted = text.release();
+        }
+}
+
+void KeptTexts::DropUnaccounted() noexcept
+{
+    while (m_unaccounted)
+    {
+        std::unique_ptr<TicketText> const text(m_unaccounted);
+        auto const next = static_cast<std::uintptr_t>(text->readers.load(std::memory_order_relaxed));
+        m_unaccounted = std::bit_cast<TicketText*>(next);
     }
 }
 

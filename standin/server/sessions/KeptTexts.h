@@ -25,12 +25,16 @@ public:
     static constexpr std::uint64_t KeptReads = 10'000;
 
     explicit KeptTexts(Clock clock = std::chrono::steady_clock::now) : m_clock(std::move(clock)) {}
+    ~KeptTexts() { DropUnaccounted(); }
+    KeptTexts(KeptTexts const&) = delete;
+    KeptTexts& operator=(KeptTexts const&) = delete;
 
     // Gives the reader his mark. What he reads is kept for him until the last copy of the lease has gone, as
     // above. He outlives it.
     Lease Open(TextReader& reader);
 
-    // What is old enough goes on the way. For what there is no memory to keep account of stays for good.
+    // What is old enough goes on the way. Texts that there is no memory to keep account of stay until nobody
+    // reads any more.
     void Keep(TicketTexts texts) noexcept override;
 
     std::size_t Count() const;  // of texts that still wait
@@ -59,6 +63,8 @@ private:
 
     void Close(TextReader const& reader);
     void Append(TicketTexts& texts);
+    void KeepUnaccounted(TicketTexts& texts) noexcept;
+    void DropUnaccounted() noexcept;
     void Forget(Time now);
     void CloseNewest(Time now);
     std::uint64_t WhoIsPast(Group const& group, Time now) const;
@@ -73,6 +79,8 @@ private:
     std::uint64_t m_open = 0;  // the marks in use
     std::size_t m_sharing = 0;
     std::deque<Group> m_groups;  // the oldest first
+    TicketText* m_unaccounted =
+        nullptr;  // leads to the next by the word of its marks, which nobody needs any more
     Time m_lastLook{};
 };
 }  // namespace standin
