@@ -25,7 +25,7 @@ public:
     static constexpr std::uint64_t KeptReads = 10'000;
 
     explicit KeptTexts(Clock clock = std::chrono::steady_clock::now) : m_clock(std::move(clock)) {}
-    ~KeptTexts() { DropUnaccounted(); }
+    ~KeptTexts() override { DropUnaccounted(); }
     KeptTexts(KeptTexts const&) = delete;
     KeptTexts& operator=(KeptTexts const&) = delete;
 

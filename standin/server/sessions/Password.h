@@ -18,10 +18,8 @@ public:
     static constexpr std::size_t Room = 4096;
 
     Secret() { m_text.reserve(Room); }  // a text that has to move leaves itself behind
-    explicit Secret(std::string&& text) : m_text(std::move(text))
-    {
-        explicit_bzero(text.data(), text.capacity());  // moving leaves a copy of a short text behind
-    }
+    // Nothing is left of it in text, either; moving would leave a short one behind.
+    explicit Secret(std::string&& text) : m_text(text) { explicit_bzero(text.data(), text.capacity()); }
     ~Secret() { explicit_bzero(m_text.data(), m_text.capacity()); }
     Secret(Secret const&) = delete;
     Secret& operator=(Secret const&) = delete;
