@@ -1,6 +1,6 @@
 #include "standin/server/store/sqlite/Schema.h"
 
-#include <bit>
+#include "standin/server/store/StoreRows.h"
 
 namespace standin::schema
 {
@@ -134,31 +134,13 @@ void Upgrade(Database& database)
 
 std::optional<StoredValue> FittingValueOf(Database::Run const& row, int column)
 {
-    StoredValue value;
-    value.type = static_cast<PARAM_TYPE>(row.Int(column));
-    switch (value.type)
-    {
-    case PARAM_STRING:
-    case PARAM_BINSTRING:
-        if (!row.IsBlob(column + 1))
-            return std::nullopt;
-        value.bytes = row.Bytes(column + 1);
-        return value;
-    case PARAM_INT:
-    case PARAM_INT64:
-    case PARAM_UNSIGNED:
-    case PARAM_UNSIGNED64:
-    case PARAM_DOUBLE:
-        if (!row.IsInteger(column + 1))
-            return std::nullopt;
-        if (value.type == PARAM_DOUBLE)
-            value.number = std::bit_cast<double>(row.Integer(column + 1));
-        else
-            value.integer = row.Integer(column + 1);
-        return value;
-    default:
-        return std::nullopt;
-    }
+    std::optional<long long> number;
+    std::optional<std::string_view> bytes;
+    if (row.IsBlob(column + 1))
+        bytes = row.Bytes(column + 1);
+    else if (row.IsInteger(column + 1))
+        number = row.Integer(column + 1);
+    return FittingValue(row.Int(column), number, bytes);
 }
 
 StoredValue ValueOf(Database const& database, Database::Run const& row, int column)

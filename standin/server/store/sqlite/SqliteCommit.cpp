@@ -1,18 +1,11 @@
 // How a SqliteStore commits changes and brings them to the disk.
 #include "standin/server/store/ChangeRecord.h"
+#include "standin/server/store/StoreRows.h"
 #include "standin/server/store/sqlite/SqliteConnections.h"
 #include <algorithm>
 
 namespace standin
 {
-namespace
-{
-bool IsDeletion(ParameterChange const& parameter)
-{
-    return parameter.value.type == PARAM_NONE || parameter.value.type == PARAM_POINTER;
-}
-}  // namespace
-
 CommitOutcome SqliteStore::Commit(TicketChange const& change, std::uint64_t number)
 {
     CheckUsable();
@@ -57,13 +50,9 @@ void SqliteStore::CommitTogether(GroupCommit::Group group)
 void SqliteStore::RecordOf(TicketChange const& change)
 {
     m_writer->record.clear();
-    TicketAddress const address = change.address;
-    bool const isNext = change.kind == TicketChange::Create && address.id == TicketChange::NextId;
     try
     {
-        if (!IsValid({address.type, isNext ? 0 : address.id}))
-            throw StoreError("no ticket can have the address " + std::to_string(address.type) + "/" +
-                             std::to_string(address.id) + "; choose another");
+        CheckAddress(change);
         AppendChangeRecord(m_writer->record, change);
     }
     catch (StoreError const& error)
@@ -158,14 +147,10 @@ void SqliteStore::PutParameters(TicketAddress address, TicketChange const& chang
         TicketValue const& value = parameter.value;
         put.AgainFrom(2);
         put << std::string_view(parameter.key) << std::max(parameter.pos, 0) << static_cast<int>(value.type);
-        if (value.type == PARAM_STRING || value.type == PARAM_BINSTRING)
+        if (IsText(value.type))
             put << (value.text ? std::string_view(value.text->bytes) : std::string_view());
-        else if (value.type == PARAM_INT)
-            put << static_cast<int>(value.word);
-        else if (value.type == PARAM_UNSIGNED)
-            put << static_cast<long long>(static_cast<unsigned>(value.word));
         else  // a double as bits: SQLite makes NULL of a NaN and an integer of a whole number
-            put << static_cast<long long>(value.word);
+            put << ColumnOf(value);
         put.Do();
     }
 }

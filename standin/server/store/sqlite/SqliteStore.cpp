@@ -1,8 +1,7 @@
 #include "standin/server/store/sqlite/SqliteStore.h"
 
+#include "standin/server/store/StoreRows.h"
 #include "standin/server/store/sqlite/SqliteConnections.h"
-#include <cerrno>
-#include <cstdlib>
 #include <ctime>
 #include <sys/stat.h>
 #include <tuple>
@@ -14,25 +13,10 @@ namespace
 {
 using namespace std::chrono_literals;
 
-std::string ProgramName()
-{
-#if defined(__GLIBC__)
-    return program_invocation_short_name;
-#else
-    return getprogname();
-#endif
-}
-
 std::vector<std::filesystem::path> FilesOf(std::filesystem::path const& database)
 {
     return {database, database.string() + "-wal", database.string() + "-shm",
             database.parent_path() / "site.lock"};
-}
-
-std::string MachineName()
-{
-    char name[256] = {};
-    return gethostname(name, sizeof name - 1) == 0 && name[0] != '\0' ? name : "localhost";
 }
 }  // namespace
 
