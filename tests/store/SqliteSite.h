@@ -10,29 +10,6 @@
 #include <sqlite3.h>
 #include <string>
 
-inline standin::StoreContent NoContent() { return {}; }
-
-inline standin::StoreContent OneTicket(standin::TicketAddress address, char const* key, int value)
-{
-    standin::StoreContent content;
-    content.tickets.push_back(Creation(address).Put(key, 0, value));
-    return content;
-}
-
-// what() of the StoreError that the action throws; empty if it throws none.
-inline std::string ReasonOf(std::function<void()> const& action)
-{
-    try
-    {
-        action();
-    }
-    catch (standin::StoreError const& error)
-    {
-        return error.what();
-    }
-    return {};
-}
-
 inline void RunSql(std::filesystem::path const& file, std::string const& sql)
 {
     sqlite3* database = nullptr;

@@ -5,6 +5,7 @@
 #pragma once
 
 #include "standin/server/store/Store.h"
+#include "standin/server/store/StoreContent.h"
 #include "standin/server/store/StoreLimits.h"
 #include "tests/store/Changes.h"
 #include <functional>
@@ -32,6 +33,9 @@ struct STORE_ENGINE
     char const* name;
     std::unique_ptr<StoreSite> (*makeSite)(standin::StoreLimits const& limits);
 
+    // Committed() follows other programs when the engine's bell rings, and not at once.
+    bool hearsByBell = false;
+
     friend void PrintTo(STORE_ENGINE const& engine, std::ostream* out) { *out << engine.name; }
 };
 
@@ -55,6 +59,18 @@ struct KEPT_VALUE
     std::string bytes;
 };
 using StoreValues = std::map<std::pair<std::string, int>, KEPT_VALUE>;
+
+inline standin::StoreContent NoContent() { return {}; }
+
+inline standin::StoreContent OneTicket(standin::TicketAddress address, char const* key, int value)
+{
+    standin::StoreContent content;
+    content.tickets.push_back(Creation(address).Put(key, 0, value));
+    return content;
+}
+
+// what() of the StoreError that the action throws; empty if it throws none.
+std::string ReasonOf(std::function<void()> const& action);
 
 StoreValues ValuesOf(standin::Store& store, standin::TicketAddress address);
 
@@ -98,6 +114,9 @@ protected:
 
     // Begins anew with a site of those limits.
     void UseLimits(standin::StoreLimits const& limits);
+
+    // Expects that the handle knows of that change, which another one has committed.
+    void ExpectHeard(standin::Store& listener, standin::Sequence committed) const;
 
     std::unique_ptr<StoreSite> site;
     std::unique_ptr<standin::Store> store;  // two programs
