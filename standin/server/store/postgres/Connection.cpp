@@ -1,0 +1,441 @@
+#include "standin/server/store/postgres/Connection.h"
+
+#include <algorithm>
+#include <cerrno>
+#include <libpq-fe.h>
+#include <poll.h>
+#include <system_error>
+#include <tuple>
+#include <utility>
+
+namespace standin::postgres
+{
+namespace
+{
+// The types of parameters, which are the same in every database.
+constexpr unsigned Bytea = 17;
+constexpr unsigned Int8 = 20;
+constexpr unsigned Int4 = 23;
+constexpr unsigned ByteaArray = 1001;
+constexpr unsigned Int4Array = 1007;
+constexpr unsigned Int8Array = 1016;
+
+constexpr int Binary = 1;
+constexpr int NullSize = -1;  // of an array's element
+constexpr std::size_t LargestParameter = 0x3FFFFFFF;
+
+constexpr char const* LostRemedy = "check the server and the network; the program connects again by itself";
+
+void Put(std::string& out, unsigned long long number, int size)
+{
+    for (int shift = 8 * (size - 1); shift >= 0; shift -= 8)
+        out.push_back(static_cast<char>(number >> shift));
+}
+
+void Put(std::string& out, int number) { Put(out, static_cast<unsigned>(number), 4); }
+
+// An array of one dimension, whose elements put themselves with their sizes.
+template <typename Elements, typename PutElement>
+std::string ArrayOf(unsigned type, Elements const& elements, PutElement const& putElement)
+{
+    std::string out;
+    Put(out, elements.empty() ? 0 : 1);  // dimensions
+    Put(out, 1);                         // there may be NULLs
+    Put(out, static_cast<int>(type));
+    if (elements.empty())
+        return out;
+    Put(out, static_cast<int>(elements.size()));
+    Put(out, 1);  // the first index
+    for (auto const& element : elements)
+        putElement(out, element);
+    return out;
+}
+
+// libpq's texts have several lines.
+std::string OneLine(char const* text)
+{
+    std::string line;
+    for (char const* next = text; *next != '\0'; ++next)
+        if (*next != '\n' && *next != '\t')
+            line.push_back(*next);
+        else if (!line.empty() && line.back() != ' ')
+            line.push_back(' ');
+    while (!line.empty() && line.back() == ' ')
+        line.pop_back();
+    return line;
+}
+
+bool EndsConnection(std::string_view code)
+{
+    return code.starts_with("08") || code == "57P01" || code == "57P02" || code == "57P03" || code == "57P05";
+}
+
+char const* RemedyOf(std::string_view code)
+{
+    struct REMEDY
+    {
+        std::string_view code;  // or its beginning
+        char const* remedy;
+    };
+    static constexpr REMEDY Remedies[] = {
+        {"53100", "free some space on the server's disk, then try again"},
+        {"53200", "give the server more memory, then try again"},
+        {"53300", "raise max_connections, or end other programs"},
+        {"42501", "grant this user what the schema's owner may do"},
+        {"25006", "connect to the primary server: add target_session_attrs=read-write"},
+        {"57014", "see in pg_stat_activity who keeps it waiting, then try again"},
+        {"40", "try again"},
+        {"54", "keep a value below 1 GB"},
+        {"58", "check the server's disk and its log, then try again"},
+        {"XX", "check the server's disk and its log; bring a backup back if data is damaged"},
+        {"42", "somebody has changed the site's schema: bring a backup back"},
+        {"3F000", "somebody has removed the site's schema: bring a backup back"},
+    };
+    for (REMEDY const& known : Remedies)
+        if (code.starts_with(known.code))
+            return known.remedy;
+    return "see the server's log, then try again";
+}
+
+struct FreeOptions
+{
+    void operator()(PQconninfoOption* options) const noexcept { PQconninfoFree(options); }
+};
+using Options = std::unique_ptr<PQconninfoOption, FreeOptions>;
+
+// libpq's own reason could repeat the text, with the password in it.
+void CheckUri(std::string const& uri)
+{
+    char* reason = nullptr;
+    Options const options(PQconninfoParse(uri.c_str(), &reason));
+    PQfreemem(reason);
+    if (!options)
+        throw BrokenConnection("the name of the database cannot be read; write it as "
+                               "postgresql://user@host/database");
+}
+
+std::string DatabaseOf(PGconn* connection)
+{
+    std::map<std::string_view, std::string> values;
+    Options const options(PQconninfo(connection));
+    for (PQconninfoOption const* option = options.get(); option && option->keyword; ++option)
+        if (option->val)
+            values[option->keyword] = option->val;
+    std::string const host = PQhost(connection) && *PQhost(connection) ? PQhost(connection) : values["host"];
+    return "database " + values["dbname"] + " at " + host + ":" + values["port"] + " as " + values["user"];
+}
+}  // namespace
+
+Parameters::Value& Parameters::Add(unsigned type) { return m_values.emplace_back(Value{type, false, true}); }
+
+Parameters& Parameters::AddNumber(unsigned long long number, std::size_t size)
+{
+    Put(Add(size == 4 ? Int4 : Int8).own, number, static_cast<int>(size));
+    return *this;
+}
+
+Parameters& Parameters::operator<<(std::string_view bytes)
+{
+    Value& value = Add(Bytea);
+    value.isOurs = false;
+    value.bytes = bytes;
+    return *this;
+}
+
+Parameters& Parameters::operator<<(std::vector<int> const& numbers)
+{
+    Add(Int4Array).own = ArrayOf(Int4, numbers,
+                                 [](std::string& out, int number)
+                                 {
+                                     Put(out, 4);
+                                     Put(out, number);
+                                 });
+    return *this;
+}
+
+Parameters& Parameters::operator<<(std::vector<long long> const& numbers)
+{
+    Add(Int8Array).own = ArrayOf(Int8, numbers,
+                                 [](std::string& out, long long number)
+                                 {
+                                     Put(out, 8);
+                                     Put(out, static_cast<unsigned long long>(number), 8);
+                                 });
+    return *this;
+}
+
+Parameters& Parameters::operator<<(std::vector<std::string_view> const& bytes)
+{
+    Add(ByteaArray).own = ArrayOf(Bytea, bytes,
+                                  [](std::string& out, std::string_view element)
+                                  {
+                                      bool const isNull = element.data() == nullptr;
+                                      Put(out, isNull ? NullSize : static_cast<int>(element.size()));
+                                      out.append(element);
+                                  });
+    return *this;
+}
+
+Parameters& Parameters::Keep(std::string bytes)
+{
+    Add(Bytea).own = std::move(bytes);
+    return *this;
+}
+
+Parameters& Parameters::Null()
+{
+    Add(Int8).isNull = true;
+    return *this;
+}
+
+void Result::Clear::operator()(pg_result* result) const noexcept { PQclear(result); }
+
+int Result::Rows() const { return PQntuples(m_result.get()); }
+
+bool Result::IsNull(int row, int column) const { return PQgetisnull(m_result.get(), row, column) != 0; }
+
+long long Result::Integer(int row, int column) const
+{
+    std::string_view const bytes = Bytes(row, column);
+    unsigned long long word = 0;
+    for (char const byte : bytes.substr(0, sizeof word))
+        word = word << 8 | static_cast<unsigned char>(byte);
+    return bytes.size() == 4 ? static_cast<int>(word) : static_cast<long long>(word);
+}
+
+std::string_view Result::Bytes(int row, int column) const
+{
+    return {PQgetvalue(m_result.get(), row, column),
+            static_cast<std::size_t>(PQgetlength(m_result.get(), row, column))};
+}
+
+long long Result::Changes() const
+{
+    char const* const count = PQcmdTuples(m_result.get());
+    return *count == '\0' ? 0 : std::stoll(count);
+}
+
+void Connection::Close::operator()(pg_conn* connection) const noexcept { PQfinish(connection); }
+
+Connection::Connection(Target const& target, std::chrono::milliseconds statementLimit,
+                       Clock::time_point deadline)
+{
+    CheckUri(target.uri);
+    Connect(target, deadline);
+    SetUp(target, statementLimit, deadline);
+}
+
+Connection::~Connection() = default;
+
+void Connection::Connect(Target const& target, Clock::time_point deadline)
+{
+    char const* const keywords[] = {"dbname", "fallback_application_name", "client_encoding", nullptr};
+    char const* const values[] = {target.uri.c_str(), "comgui", "UTF8", nullptr};
+    m_connection.reset(PQconnectStartParams(keywords, values, 1));
+    if (!m_connection)
+        throw BrokenConnection("no memory for a connection; end other programs, then try again");
+    m_name = DatabaseOf(m_connection.get());
+    if (PQstatus(m_connection.get()) == CONNECTION_BAD)
+        FailAsBroken();
+    for (PostgresPollingStatusType state = PGRES_POLLING_WRITING; state != PGRES_POLLING_OK;
+         state = PQconnectPoll(m_connection.get()))
+    {
+        if (state == PGRES_POLLING_FAILED)
+            FailAsBroken();
+        Wait(state == PGRES_POLLING_READING ? POLLIN : POLLOUT, deadline);
+    }
+    m_isConnected = true;
+    if (PQsetnonblocking(m_connection.get(), 1) != 0)
+        FailAsBroken();
+}
+
+// The schema alone is searched beside PostgreSQL's own, so that nobody's table gets between. A transaction
+// sees what others have committed meanwhile, whatever the database's default is: commits rely on that.
+void Connection::SetUp(Target const& target, std::chrono::milliseconds statementLimit,
+                       Clock::time_point deadline)
+{
+    std::string const limit = std::to_string(statementLimit.count());
+    Run("SELECT set_config('search_path', quote_ident(convert_from($1, 'UTF8')) || ', pg_temp', false), "
+        "set_config('statement_timeout', convert_from($2, 'UTF8'), false), "
+        "set_config('default_transaction_isolation', 'read committed', false), "
+        "set_config('client_min_messages', 'error', false)",
+        Parameters() << std::string_view(target.schema) << std::string_view(limit), deadline);
+}
+
+Result Connection::Run(char const* sql, Parameters const& parameters, Clock::time_point deadline)
+{
+    std::string const& name = Prepared(sql, parameters, deadline);
+    std::vector<char const*> values;
+    std::vector<int> sizes;
+    for (Parameters::Value const& value : parameters.m_values)
+    {
+        std::string_view const bytes = value.isOurs ? std::string_view(value.own) : value.bytes;
+        if (bytes.size() > LargestParameter)
+            throw StoreError(m_name + ": a value is too large for it; " + RemedyOf("54"));
+        values.push_back(value.isNull ? nullptr : bytes.data() == nullptr ? "" : bytes.data());
+        sizes.push_back(static_cast<int>(bytes.size()));
+    }
+    std::vector<int> const formats(values.size(), Binary);
+    MustSend(PQsendQueryPrepared(m_connection.get(), name.c_str(), static_cast<int>(values.size()),
+                                 values.data(), sizes.data(), formats.data(), Binary));
+    return Finish(deadline);
+}
+
+void Connection::Execute(std::string const& sql, Clock::time_point deadline)
+{
+    MustSend(PQsendQuery(m_connection.get(), sql.c_str()));
+    Finish(deadline);
+}
+
+std::string const& Connection::Prepared(char const* sql, Parameters const& parameters,
+                                        Clock::time_point deadline)
+{
+    auto const known = m_prepared.find(sql);
+    if (known != m_prepared.end())
+        return known->second;
+    std::string const name = "s" + std::to_string(m_prepared.size());
+    std::vector<Oid> types;
+    for (Parameters::Value const& value : parameters.m_values)
+        types.push_back(value.type);
+    MustSend(
+        PQsendPrepare(m_connection.get(), name.c_str(), sql, static_cast<int>(types.size()), types.data()));
+    Finish(deadline);
+    return m_prepared[sql] = name;
+}
+
+bool Connection::IsSound()
+{
+    try
+    {
+        pollfd unasked{Socket(), POLLIN, 0};
+        while (!m_isBroken && poll(&unasked, 1, 0) > 0)
+            TakeIn();
+    }
+    catch (BrokenConnection const&)
+    {
+    }
+    return !m_isBroken;
+}
+
+void Connection::TakeIn()
+{
+    if (PQconsumeInput(m_connection.get()) == 0)
+        FailAsBroken();
+}
+
+int Connection::Socket() const { return PQsocket(m_connection.get()); }
+
+bool Connection::TakeNotification(std::string& payload)
+{
+    std::unique_ptr<PGnotify, decltype(&PQfreemem)> const notification(PQnotifies(m_connection.get()),
+                                                                       PQfreemem);
+    if (!notification)
+        return false;
+    payload = notification->extra;
+    return true;
+}
+
+bool Connection::IsInTransaction() const { return PQtransactionStatus(m_connection.get()) != PQTRANS_IDLE; }
+
+int Connection::Backend() const { return PQbackendPID(m_connection.get()); }
+
+std::string Connection::Quoted(std::string const& name) const
+{
+    std::unique_ptr<char, decltype(&PQfreemem)> const quoted(
+        PQescapeIdentifier(m_connection.get(), name.data(), name.size()), PQfreemem);
+    if (!quoted)
+        throw StoreError(m_name + ": " + OneLine(PQerrorMessage(m_connection.get())) +
+                         "; choose another name");
+    return quoted.get();
+}
+
+void Connection::Abandon() noexcept { std::ignore = m_connection.release(); }
+
+void Connection::Wait(short events, Clock::time_point deadline)
+{
+    for (;;)
+    {
+        auto const left = std::chrono::ceil<std::chrono::milliseconds>(deadline - Clock::now());
+        pollfd waiting{Socket(), events, 0};
+        int const ready = poll(&waiting, 1, static_cast<int>(std::max<std::int64_t>(left.count(), 0)));
+        if (ready > 0)
+            return;
+        if (ready == 0)
+            FailAsBroken("has not answered in time", LostRemedy);
+        if (errno != EINTR)
+            FailAsBroken(std::generic_category().message(errno), LostRemedy);
+    }
+}
+
+// Reads meanwhile, lest server and client wait for each other with full buffers.
+void Connection::Flush(Clock::time_point deadline)
+{
+    for (int left = PQflush(m_connection.get()); left != 0; left = PQflush(m_connection.get()))
+    {
+        if (left < 0)
+            FailAsBroken();
+        Wait(POLLIN | POLLOUT, deadline);
+        TakeIn();
+    }
+}
+
+// The result of what was sent last, up to the end of it.
+Result Connection::Finish(Clock::time_point deadline)
+{
+    Flush(deadline);
+    Result last(nullptr);
+    for (;;)
+    {
+        while (PQisBusy(m_connection.get()) != 0)
+        {
+            Wait(POLLIN, deadline);
+            TakeIn();
+        }
+        Result next(PQgetResult(m_connection.get()));
+        if (!next.m_result)
+            break;
+        last = std::move(next);
+    }
+    Check(last.m_result.get());
+    return last;
+}
+
+void Connection::MustSend(int isSent)
+{
+    if (isSent == 0)
+        FailAsBroken();
+}
+
+void Connection::Check(pg_result const* result)
+{
+    if (PQstatus(m_connection.get()) == CONNECTION_BAD || result == nullptr)
+        FailAsBroken();
+    ExecStatusType const status = PQresultStatus(result);
+    if (status == PGRES_COMMAND_OK || status == PGRES_TUPLES_OK)
+        return;
+    char const* const field = PQresultErrorField(result, PG_DIAG_SQLSTATE);
+    std::string_view const code = field == nullptr ? "" : field;
+    if (EndsConnection(code))
+        FailAsBroken();
+    char const* const reason = PQresultErrorField(result, PG_DIAG_MESSAGE_PRIMARY);
+    throw RefusedStatement(
+        m_name + ": " + OneLine(reason == nullptr ? "no reason" : reason) + "; " + RemedyOf(code), code);
+}
+
+void Connection::FailAsBroken()
+{
+    char const* const remedy = m_isConnected ? LostRemedy
+                               : PQconnectionNeedsPassword(m_connection.get())
+                                   ? "name a password, best in a "
+                                     "password file"
+                                   : "check that the server runs there, and that host, database, user and "
+                                     "password are right";
+    FailAsBroken(OneLine(PQerrorMessage(m_connection.get())), remedy);
+}
+
+void Connection::FailAsBroken(std::string const& reason, char const* remedy)
+{
+    m_isBroken = true;
+    throw BrokenConnection(m_name + ": " + reason + "; " + remedy);
+}
+}  // namespace standin::postgres

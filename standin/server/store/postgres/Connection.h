@@ -1,0 +1,182 @@
+// One connection to a PostgreSQL database, with what every use of it needs: a deadline for every call,
+// statements that are prepared once, parameters apart from the SQL, and failures that throw one line. For one
+// thread at a time.
+//
+// Over libpq itself: a deadline needs its asynchronous calls, and a listener needs its socket and its
+// notifications one by one; libpqxx 6.4 hides the first two and has no pipeline mode, to which a commit of
+// several statements could still be moved.
+#pragma once
+
+#include "standin/server/store/Store.h"
+#include <array>
+#include <chrono>
+#include <concepts>
+#include <cstdint>
+#include <map>
+#include <memory>
+#include <string>
+#include <string_view>
+#include <vector>
+
+struct pg_conn;
+struct pg_result;
+
+namespace standin::postgres
+{
+using Clock = std::chrono::steady_clock;
+
+// The connection is of no more use. Nobody knows whether the statement that it was lost over has taken
+// effect.
+class BrokenConnection : public StoreError
+{
+public:
+    using StoreError::StoreError;
+};
+
+// The server has refused a statement, which has had no effect. The connection is sound.
+class RefusedStatement : public StoreError
+{
+public:
+    RefusedStatement(std::string const& line, std::string_view code) : StoreError(line)
+    {
+        code.copy(m_code.data(), m_code.size());
+    }
+
+    std::string_view Code() const { return {m_code.data(), m_code.size()}; }  // SQLSTATE
+
+private:
+    std::array<char, 5> m_code{};
+};
+
+// What a statement is given, in the order of $1, $2 ... Texts live until the statement has run; numbers and
+// arrays are copied.
+class Parameters
+{
+public:
+    template <std::integral Number>
+    Parameters& operator<<(Number number)
+    {
+        static_assert(sizeof number == 4 || sizeof number == 8);
+        return AddNumber(static_cast<unsigned long long>(number), sizeof number);
+    }
+    Parameters& operator<<(std::string_view bytes);
+    Parameters& operator<<(TicketAddress address) { return *this << address.type << address.id; }
+    Parameters& operator<<(std::vector<int> const& numbers);
+    Parameters& operator<<(std::vector<long long> const& numbers);
+    Parameters& operator<<(std::vector<std::string_view> const& bytes);  // a null address stands for NULL
+    Parameters& Keep(std::string bytes);
+    Parameters& Null();  // of bigint
+
+private:
+    friend class Connection;
+
+    struct Value
+    {
+        unsigned type;
+        bool isNull;
+        bool isOurs;
+        std::string own{};
+        std::string_view bytes{};
+    };
+    Value& Add(unsigned type);
+    Parameters& AddNumber(unsigned long long number, std::size_t size);
+
+    std::vector<Value> m_values;
+};
+
+// Rows, held in memory until the object goes.
+class Result
+{
+public:
+    explicit Result(pg_result* result) : m_result(result) {}
+
+    int Rows() const;
+    bool IsNull(int row, int column) const;
+    long long Integer(int row, int column) const;
+    int Int(int row, int column) const { return static_cast<int>(Integer(row, column)); }
+    Sequence Number(int row, int column) const { return static_cast<Sequence>(Integer(row, column)); }
+    bool Bool(int row, int column) const { return Integer(row, column) != 0; }
+    std::string_view Bytes(int row, int column) const;  // as long as the result
+    std::string Text(int row, int column) const { return std::string(Bytes(row, column)); }
+    long long Changes() const;  // rows that the statement has changed
+
+private:
+    friend class Connection;
+
+    struct Clear
+    {
+        void operator()(pg_result* result) const noexcept;
+    };
+    std::unique_ptr<pg_result, Clear> m_result;
+};
+
+struct Target
+{
+    std::string uri;     // or keywords and values, as libpq takes them
+    std::string schema;  // in which the site is
+};
+
+class Connection
+{
+public:
+    // Connects; statements find what they name in the schema, and the server ends one that takes longer than
+    // statementLimit. Throws BrokenConnection, at the deadline at the latest, but for the time that the
+    // system takes to look up the name of a host.
+    Connection(Target const& target, std::chrono::milliseconds statementLimit, Clock::time_point deadline);
+    ~Connection();
+    Connection(Connection const&) = delete;
+    Connection& operator=(Connection const&) = delete;
+
+    // One statement, which is prepared at its first use; sql is a literal. Throws RefusedStatement, or
+    // BrokenConnection: also at the deadline, since what the server does then is unknown.
+    Result Run(char const* sql, Parameters const& parameters, Clock::time_point deadline);
+
+    // Statements without parameters or results.
+    void Execute(std::string const& sql, Clock::time_point deadline);
+
+    // Whether the server has not ended it, as far as it has said so. For a connection that only works.
+    bool IsSound();
+
+    // Takes in what the server has sent, for who polls the socket. Throws BrokenConnection.
+    void TakeIn();
+    int Socket() const;
+
+    // The payload of the next notification that was taken in; false if there is none.
+    bool TakeNotification(std::string& payload);
+
+    bool IsBroken() const { return m_isBroken; }
+    bool IsInTransaction() const;
+    int Backend() const;                                // the process that serves it
+    std::string Quoted(std::string const& name) const;  // as an identifier
+
+    // The database, its server and the user: what a message begins with. Never the password.
+    std::string const& Name() const { return m_name; }
+
+    // Gives the connection up without a word to the server, for a child that has inherited it: it is the
+    // parent's.
+    void Abandon() noexcept;
+
+private:
+    struct Close
+    {
+        void operator()(pg_conn* connection) const noexcept;
+    };
+
+    void Connect(Target const& target, Clock::time_point deadline);
+    void SetUp(Target const& target, std::chrono::milliseconds statementLimit, Clock::time_point deadline);
+    void Wait(short events, Clock::time_point deadline);
+    void Flush(Clock::time_point deadline);
+    Result Finish(Clock::time_point deadline);
+    std::string const& Prepared(char const* sql, Parameters const& parameters, Clock::time_point deadline);
+    void MustSend(int isSent);
+    void Check(pg_result const* result);
+    [[noreturn]] void FailAsBroken(std::string const& reason, char const* remedy);
+    [[noreturn]] void FailAsBroken();
+
+    std::unique_ptr<pg_conn, Close> m_connection;
+    std::string m_name;
+    bool m_isConnected = false;  // once
+    bool m_isBroken = false;
+    std::map<char const*, std::string> m_prepared;
+};
+}  // namespace standin::postgres

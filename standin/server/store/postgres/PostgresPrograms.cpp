@@ -1,0 +1,219 @@
+// The programs that have a PostgresStore open, what belongs to them, and their end.
+#include "standin/server/store/postgres/PostgresTurn.h"
+#include <ctime>
+
+namespace standin
+{
+using postgres::Clock;
+using postgres::Parameters;
+using postgres::Result;
+
+ProgramId PostgresStore::Self() const noexcept { return m_self; }
+
+std::vector<ProgramInfo> PostgresStore::Programs()
+{
+    Result const rows = Turn(*this).Run("SELECT id, process, machine, name, since, heard, "
+                                        "id IN (SELECT program FROM living) FROM program ORDER BY id");
+    std::vector<ProgramInfo> programs;
+    for (int row = 0; row < rows.Rows(); ++row)
+        programs.push_back({rows.Integer(row, 0), static_cast<long>(rows.Integer(row, 1)), rows.Text(row, 2),
+                            rows.Text(row, 3), rows.Integer(row, 4), rows.Number(row, 5), rows.Bool(row, 6)});
+    return programs;
+}
+
+int PostgresStore::Bury(std::function<void(Estate const&)> const& clear)
+{
+    int buried = 0;
+    std::exception_ptr failure;
+    for (ProgramId const program : DueForBurial())
+    {
+        try
+        {
+            buried += BuryOne(program, clear) ? 1 : 0;
+        }
+        catch (...)
+        {
+            failure = failure ? failure : std::current_exception();
+        }
+    }
+    if (failure)
+        std::rethrow_exception(failure);
+    return buried;
+}
+
+std::vector<ProgramId> PostgresStore::DueForBurial()
+{
+    std::vector<ProgramId> due;
+    auto const programs = Programs();
+    auto const now = Clock::now();
+    std::lock_guard const lock(m_burials);
+    std::map<ProgramId, Clock::time_point> missing;
+    for (ProgramInfo const& program : programs)
+    {
+        if (program.isAlive)
+            continue;
+        auto const known = m_missing.find(program.id);
+        auto const since = known == m_missing.end() ? now : known->second;
+        missing[program.id] = since;
+        if (now - since >= m_options.grace)
+            due.push_back(program.id);
+    }
+    m_missing = std::move(missing);
+    return due;
+}
+
+// The lock of a dead program's life, so that nobody else buries it, and that it waits if it is not dead after
+// all. It goes with the connection; threads of this handle share that, and are kept apart by m_burying.
+class PostgresStore::Burial
+{
+public:
+    Burial(PostgresStore& store, ProgramId program) : m_store(store), m_program(program)
+    {
+        {
+            std::lock_guard const lock(store.m_burials);
+            m_isFirst = store.m_burying.insert(program).second;
+        }
+        if (!m_isFirst)
+            return;
+        try
+        {
+            Turn turn(store);
+            m_connection = store.m_connected;
+            m_isOurs = turn.Run("SELECT pg_try_advisory_lock($1, $2)", Key()).Bool(0, 0);
+        }
+        catch (...)
+        {
+            NoteEnd();
+            throw;
+        }
+    }
+    ~Burial()
+    {
+        try
+        {
+            if (m_isOurs)
+                IfStillOurs([this](Turn& turn) { turn.Run("SELECT pg_advisory_unlock($1, $2)", Key()); });
+        }
+        catch (StoreError const&)
+        {
+            // The lock has gone with the connection.
+        }
+        if (m_isFirst)
+            NoteEnd();
+    }
+    Burial(Burial const&) = delete;
+    Burial& operator=(Burial const&) = delete;
+
+    bool IsOurs() const { return m_isOurs; }
+
+    void Forget()
+    {
+        IfStillOurs([this](Turn& turn) { turn.Run("SELECT forget_program($1)", Parameters() << m_program); });
+    }
+
+private:
+    template <typename Action>
+    void IfStillOurs(Action const& action)
+    {
+        Turn turn(m_store);
+        if (m_store.m_connected != m_connection)
+            throw StoreError(m_store.m_name +
+                             ": the connection broke during a burial; it is repeated by itself");
+        action(turn);
+    }
+
+    Parameters Key() const { return Parameters() << m_store.m_lockClass << static_cast<int>(m_program); }
+
+    void NoteEnd() noexcept
+    {
+        std::lock_guard const lock(m_store.m_burials);
+        m_store.m_burying.erase(m_program);
+    }
+
+    PostgresStore& m_store;
+    ProgramId const m_program;
+    std::uint64_t m_connection = 0;  // which of the handle's connections has the lock
+    bool m_isFirst = false;
+    bool m_isOurs = false;
+};
+
+// False if somebody else does it or has done it.
+bool PostgresStore::BuryOne(ProgramId program, std::function<void(Estate const&)> const& clear)
+{
+    Burial burial(*this, program);
+    Estate estate;
+    estate.program = program;
+    if (!burial.IsOurs() || !TakeEstate(estate))
+        return false;
+    clear(estate);
+    burial.Forget();
+    return true;
+}
+
+// False if the program is buried already.
+bool PostgresStore::TakeEstate(Estate& estate)
+{
+    Turn turn(*this);
+    Parameters const id = Parameters() << estate.program;
+    if (turn.Run("SELECT FROM program WHERE id = $1", id).Rows() == 0)
+        return false;
+    Result const tickets =
+        turn.Run("SELECT type, id, incarnation FROM ticket WHERE owner = $1 AND owner <> 0", id);
+    for (int row = 0; row < tickets.Rows(); ++row)
+        estate.tickets.push_back({{tickets.Int(row, 0), tickets.Int(row, 1)}, tickets.Number(row, 2)});
+    Result const files = turn.Run("SELECT path FROM part_file WHERE program = $1", id);
+    for (int row = 0; row < files.Rows(); ++row)
+        estate.partFiles.push_back(files.Text(row, 0));
+    return true;
+}
+
+void PostgresStore::Leave()
+{
+    Turn turn(*this);
+    turn.Run("SELECT leave_site($1)", Parameters() << m_self);
+    m_hasLeft = true;
+    m_bell.reset();
+    turn.Run("SELECT pg_advisory_unlock_all()");
+}
+
+// --- sessions and part files
+
+long long PostgresStore::OpenSession(std::string_view user)
+{
+    return Turn(*this)
+        .Run("INSERT INTO session (program, account, since) VALUES ($1, $2, $3) RETURNING id",
+             Parameters() << m_self << user << static_cast<long long>(std::time(nullptr)))
+        .Integer(0, 0);
+}
+
+void PostgresStore::CloseSession(long long session)
+{
+    Turn(*this).Run("DELETE FROM session WHERE id = $1", Parameters() << session);
+}
+
+std::vector<SessionInfo> PostgresStore::Sessions()
+{
+    Result const rows = Turn(*this).Run("SELECT id, program, account, since FROM session ORDER BY id");
+    std::vector<SessionInfo> sessions;
+    for (int row = 0; row < rows.Rows(); ++row)
+        sessions.push_back(
+            {rows.Integer(row, 0), rows.Integer(row, 1), rows.Text(row, 2), rows.Integer(row, 3)});
+    return sessions;
+}
+
+bool PostgresStore::AddPartFile(std::string_view path)
+{
+    // Touches a row of this program's, too, so that the changes tell whether the note stands.
+    return Turn(*this)
+               .Run("INSERT INTO part_file AS f VALUES ($1, $2) ON CONFLICT (place(path)) DO UPDATE "
+                    "SET program = $2 WHERE f.program = $2",
+                    Parameters() << path << m_self)
+               .Changes() == 1;
+}
+
+void PostgresStore::RemovePartFile(std::string_view path)
+{
+    Turn(*this).Run("DELETE FROM part_file WHERE place(path) = place($1) AND program = $2",
+                    Parameters() << path << m_self);
+}
+}  // namespace standin

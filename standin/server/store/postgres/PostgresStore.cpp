@@ -1,0 +1,298 @@
+#include "standin/server/store/postgres/PostgresStore.h"
+
+#include "standin/server/store/StoreRows.h"
+#include "standin/server/store/postgres/PostgresTurn.h"
+#include "standin/server/store/postgres/Schema.h"
+#include <algorithm>
+#include <ctime>
+#include <thread>
+#include <unistd.h>
+
+namespace standin
+{
+using namespace std::chrono_literals;
+using postgres::BrokenConnection;
+using postgres::Clock;
+using postgres::Connection;
+using postgres::Parameters;
+using postgres::Result;
+
+namespace
+{
+constexpr std::chrono::milliseconds ClosingLimit = 1s;
+
+User UserOf(Result const& rows, int row)
+{
+    return {rows.Text(row, 0), rows.Text(row, 1), rows.Int(row, 2), rows.Int(row, 3)};
+}
+
+// The server gives a statement up before the client does, so that the connection can be kept.
+std::chrono::milliseconds OnServer(std::chrono::milliseconds limit) { return limit - limit / 10; }
+}  // namespace
+
+// --- opening and closing
+
+PostgresStore::PostgresStore(std::string const& uri, std::function<StoreContent()> const& first,
+                             PostgresOptions options)
+    : m_target{uri, options.schema}, m_options(std::move(options)), m_process(getpid()),
+      m_machine(MachineName()), m_program(ProgramName()), m_since(std::time(nullptr))
+{
+    m_working = std::make_unique<Connection>(m_target, OnServer(m_options.statementLimit),
+                                             Clock::now() + m_options.connectLimit);
+    m_name = m_working->Name();
+    {
+        Turn opening(*this, m_options.openingLimit);
+        postgres::OpenSchema(
+            opening.Connection(), m_options.schema, [&] { Fill(opening, first()); }, opening.Deadline());
+    }
+    // Listens before it looks: what is committed after the look rings.
+    m_bell = std::make_unique<postgres::Bell>(
+        m_target, postgres::Bell::Limits{m_options.connectLimit, OnServer(m_options.statementLimit)},
+        [this](Sequence newest) { RaiseCommitted(newest); });
+    Register();
+}
+
+PostgresStore::~PostgresStore()
+{
+    if (IsForeign())
+    {
+        if (m_bell)
+            m_bell.release()->Abandon();
+        if (m_working)
+            m_working.release()->Abandon();
+        return;
+    }
+    m_bell.reset();
+    try
+    {
+        // The server notices the end of a connection a moment later, and so would who asks for the dead.
+        if (m_working && !m_working->IsBroken())
+            m_working->Run("SELECT pg_advisory_unlock_all()", {}, Clock::now() + ClosingLimit);
+    }
+    catch (StoreError const&)
+    {
+    }
+}
+
+// In the transaction that makes the schema.
+void PostgresStore::Fill(Turn& turn, StoreContent const& content) const
+{
+    std::uint64_t number = 0;
+    for (TicketChange const& change : content.tickets)
+        if (Send(turn, RequestOf(change, 0, ++number), change.address).kind != CommitOutcome::Committed)
+            throw StoreError(m_name + ": a site cannot begin with a ticket twice; correct its content");
+    // Nobody has heard of the site before, so its journal begins behind what it began with.
+    turn.Run("DELETE FROM journal");
+    turn.Run("UPDATE site SET pruned = (SELECT sequence FROM newest)");
+    for (User const& user : content.users)
+        Put(turn, user);
+}
+
+void PostgresStore::Register()
+{
+    Turn turn(*this);
+    Result const registered =
+        turn.Run("SELECT self, heard, lock_class() FROM register_program($1, $2, $3, $4)",
+                 Parameters() << static_cast<long long>(m_process) << std::string_view(m_machine)
+                              << std::string_view(m_program) << m_since);
+    m_self = registered.Integer(0, 0);
+    m_committed = registered.Number(0, 1);
+    m_lockClass = registered.Int(0, 2);
+}
+
+bool PostgresStore::IsForeign() const noexcept { return getpid() != m_process; }
+
+void PostgresStore::CheckUsable() const
+{
+    if (IsForeign())
+        throw StoreError(m_name + ": was opened by the parent of this process; open it in a program that was "
+                                  "started anew");
+    if (m_hasLeft)
+        throw StoreError(m_name + ": has been left; open it anew");
+}
+
+// --- the working connection
+
+PostgresStore::Turn::Turn(PostgresStore& store, std::chrono::milliseconds limit)
+    : m_store(store), m_deadline(Clock::now() + limit)
+{
+    store.CheckUsable();  // a copy in a child may have inherited a locked mutex
+    {
+        std::unique_lock lock(store.m_turns);
+        if (!store.m_turnEnded.wait_until(lock, m_deadline, [&store] { return !store.m_isTaken; }))
+            throw StoreError(store.m_name + ": other calls wait for its answer; check the server and the "
+                                            "network");
+        store.m_isTaken = true;
+    }
+    try
+    {
+        store.CheckUsable();
+        m_connection = &store.Working(m_deadline);
+    }
+    catch (...)
+    {
+        End();
+        throw;
+    }
+}
+
+PostgresStore::Turn::~Turn()
+{
+    if (m_connection->IsBroken() || m_store.m_hasLeft)
+        m_store.Drop();
+    End();
+}
+
+void PostgresStore::Turn::End() noexcept
+{
+    std::lock_guard const lock(m_store.m_turns);
+    m_store.m_isTaken = false;
+    m_store.m_turnEnded.notify_one();
+}
+
+// For who has the turn, like all below.
+Connection& PostgresStore::Working(Clock::time_point deadline)
+{
+    if (m_working && !m_working->IsSound())
+        Drop();
+    if (!m_working)
+        ConnectAgain(deadline);
+    return *m_working;
+}
+
+void PostgresStore::Drop()
+{
+    m_backend = m_working->Backend();
+    m_working.reset();
+}
+
+void PostgresStore::ConnectAgain(Clock::time_point deadline)
+{
+    std::this_thread::sleep_until(std::min(m_nextAttempt, deadline));
+    try
+    {
+        m_working = std::make_unique<Connection>(m_target, OnServer(m_options.statementLimit),
+                                                 std::min(deadline, Clock::now() + m_options.connectLimit));
+        TakeLifeBack(deadline);
+        ++m_connected;
+        m_pause.Reset();
+    }
+    catch (StoreError const&)
+    {
+        m_working.reset();
+        m_nextAttempt = Clock::now() + m_pause.Take();
+        throw;
+    }
+}
+
+// The old connection, of which the server may know nothing yet, still holds the lock: when it is ours alone,
+// all that was sent over the old one has ended, and FindCommit can be certain. So has a burial.
+void PostgresStore::TakeLifeBack(Clock::time_point deadline)
+{
+    Parameters const key = Parameters() << m_lockClass << static_cast<int>(m_self);
+    if (!m_working->Run("SELECT pg_try_advisory_lock($1, $2)", key, deadline).Bool(0, 0))
+    {
+        try
+        {
+            m_working->Run("SELECT pg_terminate_backend(l.pid) FROM pg_locks l WHERE l.locktype = 'advisory' "
+                           "AND l.mode = 'ShareLock' AND l.objsubid = 2 AND l.pid = $1 "
+                           "AND l.classid::bigint::bit(32)::integer = $2 AND l.objid::bigint = $3",
+                           Parameters() << m_backend << m_lockClass << m_self, deadline);
+        }
+        catch (postgres::RefusedStatement const&)
+        {
+            // Not permitted: the server will find out by itself.
+        }
+        m_working->Run("SELECT pg_advisory_lock($1, $2)", key, deadline);
+    }
+    m_working->Run("SELECT pg_advisory_lock_shared($1, $2)", key, deadline);
+    m_working->Run("SELECT pg_advisory_unlock($1, $2)", key, deadline);
+    m_working->Run("INSERT INTO program (id, process, machine, name, since, heard) "
+                   "VALUES ($1, $2, $3, $4, $5, $6) ON CONFLICT DO NOTHING",
+                   Parameters() << m_self << static_cast<long long>(m_process) << std::string_view(m_machine)
+                                << std::string_view(m_program) << m_since << Committed().load(),
+                   deadline);
+}
+
+// --- what holds
+
+std::atomic<Sequence> const& PostgresStore::Committed() const noexcept { return m_committed; }
+
+Sequence PostgresStore::Tickets(std::function<void(TicketAddress, TicketState const&)> const& take)
+{
+    Result const rows = Turn(*this).Run("SELECT n.sequence, t.type, t.id, t.incarnation, t.revision "
+                                        "FROM newest n LEFT JOIN ticket t ON true ORDER BY t.type, t.id");
+    for (int row = 0; row < rows.Rows() && !rows.IsNull(row, 1); ++row)
+        take({rows.Int(row, 1), rows.Int(row, 2)}, {rows.Number(row, 3), rows.Number(row, 4)});
+    return rows.Number(0, 0);
+}
+
+std::optional<Store::Loaded>
+PostgresStore::Load(TicketAddress address,
+                    std::function<void(std::string_view key, int pos, StoredValue const& value)> const& take)
+{
+    // One statement, hence one moment.
+    Result const rows = Turn(*this).Run(
+        "SELECT t.incarnation, t.revision, n.sequence, p.key, p.pos, p.value_type, p.number, "
+        "p.bytes FROM newest n, ticket t LEFT JOIN parameter p ON p.type = t.type AND p.id = t.id "
+        "WHERE t.type = $1 AND t.id = $2 ORDER BY p.key, p.pos",
+        Parameters() << address);
+    if (rows.Rows() == 0)
+        return std::nullopt;
+    for (int row = 0; row < rows.Rows() && !rows.IsNull(row, 3); ++row)
+    {
+        auto const bytes = rows.IsNull(row, 7) ? std::nullopt : std::optional(rows.Bytes(row, 7));
+        auto const value = FittingValue(rows.Int(row, 5), rows.Integer(row, 6), bytes);
+        if (!value)
+            throw StoreError(m_name + ": a value of ticket " + std::to_string(address.type) + "/" +
+                             std::to_string(address.id) + " does not fit its type " +
+                             std::to_string(rows.Int(row, 5)) + "; bring a backup back");
+        take(rows.Bytes(row, 3), rows.Int(row, 4), *value);
+    }
+    return Loaded{{rows.Number(0, 0), rows.Number(0, 1)}, rows.Number(0, 2)};
+}
+
+// --- users
+
+std::optional<User> PostgresStore::FindUser(std::string_view name)
+{
+    Result const rows = Turn(*this).Run("SELECT name, password_hash, role, ticket_id FROM account "
+                                        "WHERE place(name) = place($1)",
+                                        Parameters() << name);
+    if (rows.Rows() == 0)
+        return std::nullopt;
+    return UserOf(rows, 0);
+}
+
+std::vector<User> PostgresStore::Users()
+{
+    Result const rows =
+        Turn(*this).Run("SELECT name, password_hash, role, ticket_id FROM account ORDER BY name");
+    std::vector<User> users;
+    for (int row = 0; row < rows.Rows(); ++row)
+        users.push_back(UserOf(rows, row));
+    return users;
+}
+
+void PostgresStore::PutUser(User const& user)
+{
+    Turn turn(*this);
+    Put(turn, user);
+}
+
+void PostgresStore::Put(Turn& turn, User const& user)
+{
+    turn.Run("INSERT INTO account VALUES ($1, $2, $3, $4) ON CONFLICT (place(name)) DO UPDATE "
+             "SET password_hash = excluded.password_hash, role = excluded.role, "
+             "ticket_id = excluded.ticket_id",
+             Parameters() << std::string_view(user.name) << std::string_view(user.passwordHash) << user.role
+                          << user.ticketId);
+}
+
+bool PostgresStore::RemoveUser(std::string_view name)
+{
+    return Turn(*this)
+               .Run("DELETE FROM account WHERE place(name) = place($1)", Parameters() << name)
+               .Changes() == 1;
+}
+}  // namespace standin

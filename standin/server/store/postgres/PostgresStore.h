@@ -1,0 +1,138 @@
+// The tickets of a site in a schema of a PostgreSQL database, for any number of programs on any number of
+// machines. A handle has two connections: one for its work, which its threads take in turns, and one that
+// listens, see Bell.
+//
+// What was committed is as safe as the server's synchronous_commit makes it. Committed() follows what others
+// commit as soon as the bell rings, which takes about a millisecond.
+//
+// A call that finds the working connection broken throws StoreError, or answers Unknown if it is a Commit
+// that was under way; the next one connects again, and no call takes longer than the limits of connecting and
+// of a statement together. Until a program is back, others take it for dead and may bury it: it then goes on
+// under its number, without the sessions, part files and tickets that it had.
+//
+// In a child process that was made by fork every operation throws StoreError.
+#pragma once
+
+#include "standin/server/store/StoreContent.h"
+#include "standin/server/store/StoreLimits.h"
+#include "standin/server/store/postgres/Bell.h"
+#include "standin/server/store/postgres/Connection.h"
+#include <condition_variable>
+#include <functional>
+#include <map>
+#include <memory>
+#include <mutex>
+#include <optional>
+#include <set>
+#include <string>
+#include <vector>
+
+namespace standin
+{
+struct PostgresOptions
+{
+    std::string schema = "comgui";
+    std::chrono::milliseconds connectLimit{5000};
+    std::chrono::milliseconds statementLimit{10'000};
+    std::chrono::milliseconds openingLimit{30'000};  // for others who make or upgrade the site
+
+    // A program whose connection is gone is buried when it has been gone for so long.
+    std::chrono::milliseconds grace{0};
+    StoreLimits limits{};
+};
+
+class PostgresStore final : public Store
+{
+public:
+    // Opens the site in that database, which has to be there; uri is one of libpq's, or its keywords and
+    // values. first is asked for the content of a new site while others who open it wait; what it throws
+    // passes through, and the site stays new. A schema of an older version is upgraded, one of a newer
+    // version or of another program is refused by StoreError and left as it is.
+    PostgresStore(std::string const& uri, std::function<StoreContent()> const& first,
+                  PostgresOptions options = {});
+    ~PostgresStore() override;
+    PostgresStore(PostgresStore const&) = delete;
+    PostgresStore& operator=(PostgresStore const&) = delete;
+
+    CommitOutcome Commit(TicketChange const& change, std::uint64_t number) override;
+    std::optional<CommitOutcome> FindCommit(std::uint64_t number) override;
+    void Sync() override;
+    std::atomic<Sequence> const& Committed() const noexcept override;
+    Sequence Tickets(std::function<void(TicketAddress, TicketState const&)> const& take) override;
+    std::optional<Loaded>
+    Load(TicketAddress address,
+         std::function<void(std::string_view key, int pos, StoredValue const& value)> const& take) override;
+    bool ChangesSince(Sequence after, std::function<void(CommittedChange&&)> const& take) override;
+    void WaitForChanges(Sequence heard, std::chrono::milliseconds time) override;
+    void Interrupt() noexcept override;
+    void Maintain(Sequence heard) override;
+    ProgramId Self() const noexcept override;
+    std::vector<ProgramInfo> Programs() override;
+    int Bury(std::function<void(Estate const&)> const& clear) override;
+    void Leave() override;
+    long long OpenSession(std::string_view user) override;
+    void CloseSession(long long session) override;
+    std::vector<SessionInfo> Sessions() override;
+    bool AddPartFile(std::string_view path) override;
+    void RemovePartFile(std::string_view path) override;
+    std::optional<User> FindUser(std::string_view name) override;
+    std::vector<User> Users() override;
+    void PutUser(User const& user) override;
+    bool RemoveUser(std::string_view name) override;
+
+private:
+    class Turn;    // with the working connection
+    class Burial;  // the right to bury a program
+
+    void Fill(Turn& turn, StoreContent const& content) const;
+    void Register();
+    bool IsForeign() const noexcept;
+    void CheckUsable() const;
+    postgres::Connection& Working(postgres::Clock::time_point deadline);
+    void Drop();
+    void ConnectAgain(postgres::Clock::time_point deadline);
+    void TakeLifeBack(postgres::Clock::time_point deadline);
+    static void Put(Turn& turn, User const& user);
+    postgres::Parameters RequestOf(TicketChange const& change, ProgramId program, std::uint64_t number) const;
+    static CommitOutcome Send(Turn& turn, postgres::Parameters const& request, TicketAddress address);
+    void Announce(Sequence committed);
+    void RaiseCommitted(Sequence newest);
+    std::vector<ProgramId> DueForBurial();
+    bool BuryOne(ProgramId program, std::function<void(Estate const&)> const& clear);
+    bool TakeEstate(Estate& estate);
+
+    postgres::Target const m_target;
+    PostgresOptions const m_options;
+    long const m_process;  // that has opened it
+    ProgramId m_self = 0;
+    int m_lockClass = 0;  // of the site's advisory locks
+    std::string const m_machine, m_program;
+    long long const m_since;
+    std::string m_name;  // of the database, for messages
+    std::atomic<bool> m_hasLeft{false};
+
+    // The working connection belongs to the thread that has the turn.
+    std::mutex m_turns;
+    std::condition_variable m_turnEnded;
+    bool m_isTaken = false;
+    std::unique_ptr<postgres::Connection> m_working;  // null: broken
+    std::uint64_t m_connected = 0;                    // how often
+    int m_backend = 0;                                // of the connection before
+    postgres::GrowingPause m_pause;
+    postgres::Clock::time_point m_nextAttempt{};
+
+    // What WaitForChanges waits for.
+    std::atomic<Sequence> m_committed{0};
+    std::mutex m_hearing;
+    std::condition_variable m_heard;
+    bool m_isInterrupted = false;
+    std::unique_ptr<postgres::Bell> m_bell;
+
+    std::mutex m_burials;
+    std::set<ProgramId> m_burying;                               // by threads of this handle
+    std::map<ProgramId, postgres::Clock::time_point> m_missing;  // since when
+
+    std::mutex m_unknowns;
+    std::map<std::uint64_t, Sequence> m_unknown;  // numbers not asked after yet, and what was known then
+};
+}  // namespace standin

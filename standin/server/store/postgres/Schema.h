@@ -1,0 +1,24 @@
+// The tables and functions of a site in a PostgreSQL database: made, checked, and brought up from version to
+// version.
+#pragma once
+
+#include "standin/server/store/postgres/Connection.h"
+#include <functional>
+
+namespace standin::postgres
+{
+// What commit_change answers.
+enum class CommitAnswer : int
+{
+    Committed = 0,
+    Conflict = 1,
+    NoFreeId = 2,
+};
+
+// Makes the schema if there is none, or it is empty, and fills it then, and brings an older one up to this
+// version: one program at a time, each step in one transaction. Throws StoreError, and changes nothing, if
+// the schema is somebody else's or of a newer version. What fill throws passes through, and the site stays
+// new.
+void OpenSchema(Connection& connection, std::string const& schema, std::function<void()> const& fill,
+                Clock::time_point deadline);
+}  // namespace standin::postgres
