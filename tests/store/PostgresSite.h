@@ -20,8 +20,23 @@ public:
 
     std::unique_ptr<standin::PostgresStore> Open(standin::PostgresOptions options = {}) const
     {
+        return OpenAs(cluster.Uri(), NoContent, options);
+    }
+
+    std::unique_ptr<standin::PostgresStore> OpenAs(std::string const& uri,
+                                                   std::function<standin::StoreContent()> const& first,
+                                                   standin::PostgresOptions options = {}) const
+    {
         options.schema = m_name;
-        return std::make_unique<standin::PostgresStore>(cluster.Uri(), NoContent, options);
+        return std::make_unique<standin::PostgresStore>(uri, first, options);
+    }
+
+    // SQL in which S. stands for the schema.
+    std::string Run(std::string sql) const
+    {
+        for (auto at = sql.find("S."); at != sql.npos; at = sql.find("S.", at + 1))
+            sql.replace(at, 1, m_name);
+        return cluster.Run(sql);
     }
 
     PostgresCluster& cluster = PostgresCluster::Instance();
@@ -34,4 +49,31 @@ private:
     }
 
     std::string const m_name;
+};
+
+class PostgresSite : public testing::Test
+{
+protected:
+    static constexpr standin::TicketAddress Job{3, 1};
+    static constexpr standin::TicketAddress OtherJob{3, 2};
+
+    std::string ReasonOfOpeningAs(std::string const& uri) const
+    {
+        return ReasonOf([&] { schema.OpenAs(uri, NoContent); });
+    }
+
+    // The locks by which a handle's working connection is known.
+    std::string LocksOf(standin::Store const& store) const
+    {
+        return "pg_locks WHERE locktype = 'advisory' AND mode = 'ShareLock' AND granted AND objid = " +
+               std::to_string(store.Self()) + " AND classid = '" + schema.Name() + "'::regnamespace";
+    }
+
+    // Ends the handle's working connection, and returns when it has ended. False if it has none just now.
+    bool Terminate(standin::Store const& store) const
+    {
+        return schema.cluster.Run("SELECT pg_terminate_backend(pid, 60000) FROM " + LocksOf(store)) == "t";
+    }
+
+    PostgresSchema schema;
 };

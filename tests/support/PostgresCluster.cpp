@@ -87,9 +87,19 @@ std::string Program(char const* name) { return std::string(COMGUI_POSTGRESQL_PRO
     _exit(0);
 }
 
-using Connection = std::unique_ptr<PGconn, decltype(&PQfinish)>;
-using Rows = std::unique_ptr<PGresult, decltype(&PQclear)>;
 }  // namespace
+
+SqlSession::SqlSession(std::string const& uri) : m_connection(PQconnectdb(uri.c_str()), PQfinish) {}
+
+std::string SqlSession::Run(std::string const& sql) const
+{
+    std::unique_ptr<PGresult, decltype(&PQclear)> const rows(PQexec(m_connection.get(), sql.c_str()),
+                                                             PQclear);
+    ExecStatusType const status = PQresultStatus(rows.get());
+    if (status != PGRES_COMMAND_OK && status != PGRES_TUPLES_OK)
+        throw std::runtime_error(sql + ": " + PQerrorMessage(m_connection.get()));
+    return PQntuples(rows.get()) > 0 && PQnfields(rows.get()) > 0 ? PQgetvalue(rows.get(), 0, 0) : "";
+}
 
 PostgresCluster& PostgresCluster::Instance()
 {
@@ -135,11 +145,12 @@ void PostgresCluster::Start()
     {
         setsid();  // an interrupted terminal ends the test program, and this one only after it
         close(ends[1]);
-        WatchOver(StartAs({Program("postgres"), "-D", (m_folder / "data").string(), "-k", m_folder.string(),
-                           "-c", "listen_addresses=", "-c", "fsync=off", "-c", "shared_buffers=16MB", "-c",
-                           "max_connections=60", "-c", "max_wal_size=128MB"},
-                          m_folder / "log"),
-                  ends[0], m_folder);
+        WatchOver(
+            StartAs({Program("postgres"), "-D", (m_folder / "data").string(), "-k", m_folder.string(), "-c",
+                     "listen_addresses=", "-c", "fsync=off", "-c", "shared_buffers=16MB", "-c",
+                     "max_connections=60", "-c", "client_min_messages=warning", "-c", "max_wal_size=128MB"},
+                    m_folder / "log"),
+            ends[0], m_folder);
     }
     close(ends[0]);
     m_lifeline = ends[1];
@@ -167,14 +178,22 @@ std::string PostgresCluster::Uri(std::string const& user, std::string const& dat
     return "postgresql://" + user + "@" + host + "/" + database;
 }
 
-std::string PostgresCluster::Run(std::string const& sql) const
+void PostgresCluster::Await(std::string const& sql, std::string const& answer) const
 {
-    Connection const connection(PQconnectdb(Uri().c_str()), PQfinish);
-    Rows const rows(PQexec(connection.get(), sql.c_str()), PQclear);
-    ExecStatusType const status = PQresultStatus(rows.get());
-    if (status != PGRES_COMMAND_OK && status != PGRES_TUPLES_OK)
-        throw std::runtime_error(sql + ": " + PQerrorMessage(connection.get()));
-    return PQntuples(rows.get()) > 0 && PQnfields(rows.get()) > 0 ? PQgetvalue(rows.get(), 0, 0) : "";
+    SqlSession const session(Uri());
+    for (auto const end = std::chrono::steady_clock::now() + 60s; std::chrono::steady_clock::now() < end;
+         std::this_thread::sleep_for(1ms))
+        if (session.Run(sql) == answer)
+            return;
+    throw std::runtime_error(sql + ": never " + answer);
+}
+
+void PostgresCluster::AskForThePasswordOf(std::string const& role) const
+{
+    fs::path const rules = m_folder / "data/pg_hba.conf";
+    WriteFile(rules, "local all " + role + " scram-sha-256\n" + ContentOf(rules));
+    Run("SELECT pg_reload_conf()");
+    Await("SELECT count(*) FROM pg_hba_file_rules WHERE '" + role + "' = ANY (user_name)", "1");
 }
 
 void PostgresCluster::Stop()

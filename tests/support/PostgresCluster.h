@@ -7,9 +7,25 @@
 #pragma once
 
 #include <filesystem>
+#include <memory>
 #include <string>
 #include <sys/types.h>
 #include <vector>
+
+struct pg_conn;
+
+// A connection for SQL of a test's own. Failures throw std::runtime_error.
+class SqlSession
+{
+public:
+    explicit SqlSession(std::string const& uri);
+
+    // The first column of the first row; empty if there is none.
+    std::string Run(std::string const& sql) const;
+
+private:
+    std::unique_ptr<pg_conn, void (*)(pg_conn*)> m_connection;
+};
 
 class PostgresCluster
 {
@@ -23,8 +39,14 @@ public:
     // As libpq takes it: of a database that is there, for its owner or another user.
     std::string Uri(std::string const& user = "postgres", std::string const& database = "postgres") const;
 
-    // SQL of the test's own, with all rights; the first column of the first row, empty if there is none.
-    std::string Run(std::string const& sql) const;
+    // In a session with all rights.
+    std::string Run(std::string const& sql) const { return SqlSession(Uri()).Run(sql); }
+
+    // Returns when the SQL answers that; throws if it has not within a minute.
+    void Await(std::string const& sql, std::string const& answer) const;
+
+    // Trusts everybody but that role from now on.
+    void AskForThePasswordOf(std::string const& role) const;
 
     // The server with all its processes stands still, and goes on.
     void Stop();

@@ -234,6 +234,8 @@ void Connection::Connect(Target const& target, Clock::time_point deadline)
     m_connection.reset(PQconnectStartParams(keywords, values, 1));
     if (!m_connection)
         throw BrokenConnection("no memory for a connection; end other programs, then try again");
+    PQsetNoticeReceiver(
+        m_connection.get(), [](void*, PGresult const*) {}, nullptr);  // not to stderr
     m_name = DatabaseOf(m_connection.get());
     if (PQstatus(m_connection.get()) == CONNECTION_BAD)
         FailAsBroken();

@@ -315,15 +315,18 @@ private:
     // 0 for a schema that is new; it is there then.
     int FoundVersion()
     {
-        Result const found = Run(
-            "SELECT count(DISTINCT n.oid), count(c.oid), count(c.oid) FILTER (WHERE c.relname = 'site' AND "
-            "EXISTS (SELECT FROM pg_attribute a WHERE a.attrelid = c.oid AND a.attname = 'version' "
-            "AND a.atttypid = 'integer'::regtype)) "
-            "FROM pg_namespace n LEFT JOIN pg_class c ON c.relnamespace = n.oid "
-            "WHERE n.nspname = convert_from($1, 'UTF8')",
-            Parameters() << std::string_view(m_schema));
+        Result const found =
+            Run("SELECT count(DISTINCT n.oid), count(c.oid), count(c.oid) FILTER (WHERE c.relname = 'site' "
+                "AND EXISTS (SELECT FROM pg_attribute a WHERE a.attrelid = c.oid AND a.attname = 'version' "
+                "AND a.atttypid = 'integer'::regtype)), bool_and(has_schema_privilege(n.oid, 'USAGE')) "
+                "FROM pg_namespace n LEFT JOIN pg_class c ON c.relnamespace = n.oid "
+                "WHERE n.nspname = convert_from($1, 'UTF8')",
+                Parameters() << std::string_view(m_schema));
         if (found.Integer(0, 0) == 0)
             m_connection.Execute("CREATE SCHEMA " + m_connection.Quoted(m_schema), m_deadline);
+        else if (!found.Bool(0, 3))
+            throw StoreError(m_connection.Name() + ": this user may not look into its schema " + m_schema +
+                             "; grant the user what the schema's owner may do");
         if (found.Integer(0, 1) == 0)
             return 0;
         if (found.Integer(0, 2) == 0)

@@ -1,0 +1,331 @@
+// What the PostgreSQL store does when its connections break, and what becomes of its program meanwhile.
+#include "standin/server/store/postgres/PostgresStore.h"
+
+#include "tests/store/PostgresSite.h"
+#include "tests/support/sanitizers.h"
+#include <future>
+#include <gmock/gmock.h>
+#include <thread>
+
+using namespace standin;
+using namespace std::chrono_literals;
+using testing::ElementsAre;
+using testing::IsEmpty;
+using testing::SizeIs;
+
+namespace
+{
+using Clock = std::chrono::steady_clock;
+
+void LeaveAlone(Estate const&) {}
+
+PostgresOptions Impatient()
+{
+    PostgresOptions options;
+    options.connectLimit = 300ms;
+    options.statementLimit = 500ms;
+    return options;
+}
+
+// Every commit of the cluster is made, and waits for a standby that never comes, until the end of this.
+class NoStandby
+{
+public:
+    explicit NoStandby(PostgresCluster const& cluster) : m_cluster(cluster) { Name("'nobody'"); }
+    ~NoStandby() { Name("''"); }
+    NoStandby(NoStandby const&) = delete;
+    NoStandby& operator=(NoStandby const&) = delete;
+
+private:
+    void Name(std::string const& standby) const
+    {
+        m_cluster.Run("ALTER SYSTEM SET synchronous_standby_names = " + standby);
+        m_cluster.Run("SELECT pg_reload_conf()");
+        m_cluster.Await("SELECT current_setting('synchronous_standby_names') = " + standby, "t");
+    }
+
+    PostgresCluster const& m_cluster;
+};
+
+class PostgresBreak : public PostgresSite
+{
+protected:
+    std::unique_ptr<PostgresStore> store = schema.Open();
+    std::unique_ptr<PostgresStore> other = schema.Open();
+    Writer writer{*store};
+    Writer otherWriter{*other};
+
+    int Value() { return static_cast<int>(ValuesOf(*other, Job).at({"Key", 0}).value.integer); }
+
+    // Adds one to the value, as a writer does who knows of no break: plans on what holds, asks after an
+    // outcome that did not come, and tries again after a failure, which has had no effect. Returns how
+    // often it has.
+    static int CountUp(Store& handle, std::uint64_t number, std::atomic<bool> const& isOver)
+    {
+        int done = 0;
+        for (; !isOver; ++number)
+        {
+            auto outcome = CommitOutcome{CommitOutcome::Conflict, 0, {}};
+            try
+            {
+                int count = 0;
+                auto const loaded = handle.Load(Job, [&count](std::string_view, int, StoredValue const& value)
+                                                { count = static_cast<int>(value.integer); });
+                outcome = handle.Commit(WriteTo(Job, loaded->state).Put("Key", 0, count + 1), number);
+            }
+            catch (StoreError const&)
+            {
+                continue;
+            }
+            done += WasCommitted(handle, outcome, number) ? 1 : 0;
+        }
+        return done;
+    }
+
+    static bool WasCommitted(Store& handle, CommitOutcome const& outcome, std::uint64_t number)
+    {
+        while (outcome.kind == CommitOutcome::Unknown)
+        {
+            try
+            {
+                return handle.FindCommit(number).has_value();
+            }
+            catch (StoreError const&)
+            {
+                // Broken again.
+            }
+        }
+        return outcome.kind == CommitOutcome::Committed;
+    }
+};
+
+using PostgresBell = PostgresBreak;
+using PostgresDeath = PostgresBreak;
+}  // namespace
+
+// --- calls
+
+TEST_F(PostgresBreak, BetweenTwoCalls_IsNotNoticedByTheSecond)
+{
+    ProgramId const self = store->Self();
+    writer.Make(Job);
+    Terminate(*store);
+    EXPECT_EQ(writer.Put(Job, "Key", 0, 1).sequence, 2u);
+    Terminate(*store);
+    EXPECT_EQ(Value(), 1);
+    EXPECT_EQ(store->Self(), self);
+    EXPECT_TRUE(store->Programs().at(0).isAlive);
+}
+
+TEST_F(PostgresBreak, InACommitThatIsNotMade_IsUnknownUntilItIsAskedAfter)
+{
+    writer.Do(Creation(Job).Put("Key", 0, 1));
+    TicketState const before = writer.State(Job);
+    SqlSession const obstacle(schema.cluster.Uri());
+    obstacle.Run("BEGIN");
+    obstacle.Run("SELECT FROM " + schema.Name() + ".newest FOR UPDATE");
+    auto commit = std::async(std::launch::async,
+                             [&] { return store->Commit(WriteTo(Job, before).Put("Key", 0, 2), 50); });
+    std::string const worker = schema.cluster.Run("SELECT pid FROM " + LocksOf(*store));
+    schema.cluster.Await("SELECT wait_event_type FROM pg_stat_activity WHERE pid = " + worker, "Lock");
+    Terminate(*store);
+    EXPECT_EQ(commit.get().kind, CommitOutcome::Unknown);
+    obstacle.Run("ROLLBACK");
+    EXPECT_FALSE(store->FindCommit(50));
+    EXPECT_EQ(Value(), 1);
+    EXPECT_EQ(writer.Put(Job, "Key", 0, 3).sequence, 2u);
+}
+
+TEST_F(PostgresBreak, InACommitThatIsMade_IsUnknownUntilItIsAskedAfter)
+{
+    writer.Do(Creation(Job).Put("Key", 0, 1));
+    TicketState const before = writer.State(Job);
+    std::string const worker = schema.cluster.Run("SELECT pid FROM " + LocksOf(*store));
+    {
+        NoStandby const waiting(schema.cluster);
+        auto commit = std::async(std::launch::async,
+                                 [&] { return store->Commit(WriteTo(Job, before).Put("Key", 0, 2), 50); });
+        schema.cluster.Await("SELECT wait_event FROM pg_stat_activity WHERE pid = " + worker, "SyncRep");
+        Terminate(*store);
+        EXPECT_EQ(commit.get().kind, CommitOutcome::Unknown);
+    }
+    EXPECT_EQ(store->Committed(), 1u);
+    auto const found = store->FindCommit(50);
+    ASSERT_TRUE(found);
+    EXPECT_EQ(found->kind, CommitOutcome::Committed);
+    EXPECT_EQ(found->sequence, 2u);
+    EXPECT_EQ(found->address, Job);
+    EXPECT_EQ(store->Committed(), 2u);
+    other->WaitForChanges(1, 60s);
+    EXPECT_EQ(other->Committed(), 2u);
+    EXPECT_EQ(Value(), 2);
+}
+
+// As long as a program cannot be reached, the journal is not kept for it.
+TEST_F(PostgresBreak, OutcomeOfACommit_IsFoundThoughTheJournalWasPrunedMeanwhile)
+{
+    StoreLimits limits;
+    limits.journalKept = 0;
+    PostgresOptions options;
+    options.limits = limits;
+    auto const third = schema.Open(options);
+    writer.Make(Job);
+    Terminate(*store);
+    other->Maintain(1);
+    third->Maintain(1);
+    EXPECT_FALSE(other->ChangesSince(0, [](CommittedChange&&) { ADD_FAILURE(); }));
+    auto const found = store->FindCommit(writer.LastNumber());
+    ASSERT_TRUE(found);
+    EXPECT_EQ(found->sequence, 1u);
+    EXPECT_EQ(found->address, Job);
+    EXPECT_FALSE(store->FindCommit(writer.LastNumber() + 1));
+}
+
+TEST_F(PostgresBreak, AgainAndAgain_LosesNothingAndMakesNothingTwice)
+{
+    writer.Do(Creation(Job).Put("Key", 0, 0));
+    std::atomic<bool> isOver{false};
+    auto const count = [&isOver](Store& handle, std::uint64_t firstNumber) {
+        return std::async(std::launch::async,
+                          [&, firstNumber] { return CountUp(handle, firstNumber, isOver); });
+    };
+    std::future<int> counts[] = {count(*store, 1'000'000), count(*store, 2'000'000),
+                                 count(*other, 3'000'000)};
+    for (int terminated = 0; terminated < (IsSanitized ? 20 : 60);)
+        terminated += Terminate(terminated % 3 == 0 ? *other : *store) ? 1 : 0;
+    isOver = true;
+    int made = 0;
+    for (std::future<int>& counted : counts)
+        made += counted.get();
+    EXPECT_EQ(Value(), made);
+    EXPECT_THAT(FeedOf(*other, 0), SizeIs(static_cast<std::size_t>(1 + made)));
+}
+
+TEST_F(PostgresBreak, ByAServerThatStandsStill_EndsEveryCallAtItsLimit)
+{
+    writer.Do(Creation(Job).Put("Key", 0, 1));
+    TicketState const before = writer.State(Job);
+    auto const impatient = schema.Open(Impatient());
+    schema.cluster.Stop();
+    auto const start = Clock::now();
+    CommitOutcome const outcome = impatient->Commit(WriteTo(Job, before).Put("Key", 0, 2), 50);
+    EXPECT_THROW(ValuesOf(*impatient, Job), StoreError);
+    EXPECT_THROW(impatient->WaitForChanges(1, 10ms), StoreError);
+    EXPECT_LT(Clock::now() - start, 5s);
+    schema.cluster.Continue();
+    EXPECT_EQ(outcome.kind, CommitOutcome::Unknown);
+    std::optional<CommitOutcome> found;
+    for (bool isAnswered = false; !isAnswered;)
+    {
+        isAnswered = ReasonOf([&] { found = impatient->FindCommit(50); }).empty();
+        ASSERT_LT(Clock::now() - start, 60s);
+    }
+    EXPECT_EQ(Value(), found ? 2 : 1);
+}
+
+// --- the bell
+
+TEST_F(PostgresBell, IsHeardByAHandleThatDoesNotWait)
+{
+    for (Sequence made = 1; made <= 50; ++made)
+    {
+        writer.Do(CreationOfNext(3));
+        auto const start = Clock::now();
+        while (other->Committed() < made && Clock::now() - start < 60s)
+            std::this_thread::yield();
+        ASSERT_EQ(other->Committed(), made);
+    }
+}
+
+TEST_F(PostgresBell, ThatBroke_RingsAgainForWhatWasMissed)
+{
+    Sequence const heard = other->Committed();
+    schema.cluster.Run(
+        "SELECT pg_terminate_backend(pid, 60000) FROM pg_stat_activity WHERE application_name = "
+        "'comgui' AND query LIKE '%LISTEN \"" +
+        schema.Name() + "\"%'");
+    writer.Make(Job);
+    auto const start = Clock::now();
+    while (other->Committed() == heard && Clock::now() - start < 60s)
+        std::this_thread::yield();
+    EXPECT_EQ(other->Committed(), heard + 1);
+}
+
+TEST_F(PostgresBell, OfAHandleThatEnds_RingsBeforeIt)
+{
+    writer.Make(Job);
+    store.reset();
+    other->WaitForChanges(0, 60s);
+    EXPECT_EQ(other->Committed(), 1u);
+}
+
+// --- life and death
+
+TEST_F(PostgresDeath, OfAConnection_LeavesTheProgramToBeBuried_AndItGoesOnUnderItsNumber)
+{
+    ProgramId const self = store->Self();
+    store->OpenSession("admin");
+    writer.Do(Creation(Job).Own(CHANGE::Owner::ThisProgram));
+    Terminate(*store);
+    EXPECT_FALSE(other->Programs().at(0).isAlive);
+    int tickets = 0;
+    EXPECT_EQ(
+        other->Bury([&tickets](Estate const& estate) { tickets += static_cast<int>(estate.tickets.size()); }),
+        1);
+    EXPECT_EQ(tickets, 1);
+    EXPECT_EQ(writer.Make(OtherJob).sequence, 2u);
+    EXPECT_EQ(store->Self(), self);
+    EXPECT_THAT(store->Sessions(), IsEmpty());
+    ASSERT_EQ(other->Programs().size(), 2u);
+    EXPECT_EQ(other->Programs()[0].id, self);
+    EXPECT_TRUE(other->Programs()[0].isAlive);
+}
+
+TEST_F(PostgresDeath, OfAConnectionThatIsBack_BuriesNobody)
+{
+    store->OpenSession("admin");
+    Terminate(*store);
+    EXPECT_THAT(store->Sessions(), SizeIs(1));
+    EXPECT_EQ(other->Bury([](Estate const&) { ADD_FAILURE(); }), 0);
+}
+
+TEST_F(PostgresDeath, WithinTheGrace_IsNoReasonToBury)
+{
+    PostgresOptions options;
+    options.grace = 1h;
+    auto const patient = schema.Open(options);
+    Terminate(*store);
+    EXPECT_EQ(patient->Bury([](Estate const&) { ADD_FAILURE(); }), 0);
+    EXPECT_EQ(other->Bury(LeaveAlone), 1);
+}
+
+TEST_F(PostgresDeath, WhoComesBackDuringItsBurial_WaitsForItsEnd)
+{
+    Terminate(*store);
+    std::future<bool> isBack;
+    EXPECT_EQ(other->Bury(
+                  [&](Estate const&)
+                  {
+                      isBack = std::async(std::launch::async, [&] { return store->Programs().size() == 2; });
+                      schema.cluster.Await(
+                          "SELECT count(*) FROM pg_locks WHERE locktype = 'advisory' AND NOT "
+                          "granted AND classid = '" +
+                              schema.Name() + "'::regnamespace",
+                          "1");
+                  }),
+              1);
+    EXPECT_TRUE(isBack.get());
+}
+
+TEST_F(PostgresDeath, OfTheBurier_LeavesTheBurialToBeRepeated)
+{
+    auto const third = schema.Open();
+    store->AddPartFile("/tmp/a");
+    Terminate(*store);
+    EXPECT_THROW(other->Bury([&](Estate const&) { Terminate(*other); }), StoreError);
+    int files = 0;
+    EXPECT_EQ(
+        third->Bury([&files](Estate const& estate) { files += static_cast<int>(estate.partFiles.size()); }),
+        1);
+    EXPECT_EQ(files, 1);
+}
