@@ -18,7 +18,7 @@ public:
 
     std::string const& Name() const { return m_name; }
 
-    std::unique_ptr<standin::PostgresStore> Open(standin::PostgresOptions options = {}) const
+    std::unique_ptr<standin::PostgresStore> Open(standin::PostgresOptions const& options = {}) const
     {
         return OpenAs(cluster.Uri(), NoContent, options);
     }

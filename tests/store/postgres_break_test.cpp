@@ -9,7 +9,6 @@
 
 using namespace standin;
 using namespace std::chrono_literals;
-using testing::ElementsAre;
 using testing::IsEmpty;
 using testing::SizeIs;
 

@@ -47,6 +47,7 @@ passwd const* UnprivilegedUser()
     dup2(out, STDOUT_FILENO);
     dup2(out, STDERR_FILENO);
     std::vector<char*> arguments;
+    arguments.reserve(command.size() + 1);
     for (std::string& argument : command)
         arguments.push_back(argument.data());
     arguments.push_back(nullptr);

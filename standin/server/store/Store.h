@@ -108,7 +108,8 @@ public:
     // write the incarnation and the revision, of a deletion the incarnation, and the revision unless it is
     // AnyRevision; of a creation, that there is no ticket. Once it answers Committed the change survives the
     // end of the process at any instant, and every Committed() of the site on this machine is at least its
-    // sequence. number: the caller's own, from 1 up, none twice by this handle.
+    // sequence; of an engine whose programs share no memory only this handle's is, and the others follow when
+    // its bell rings. number: the caller's own, from 1 up, none twice by this handle.
     // PARAM_POINTER values are of use to this process alone: what they replace goes from the store, and in
     // the journal they are deletions. A change that expects nothing untrue but has no parameters is
     // committed like others.
@@ -127,7 +128,8 @@ public:
     // --- what holds
 
     // The newest change that this handle knows of; never falls. On one machine that is the newest at all
-    // that was acknowledged to anybody. One load, for any thread, at any time.
+    // that was acknowledged to anybody, but for what the bell takes in an engine whose programs share no
+    // memory. One load, for any thread, at any time.
     virtual std::atomic<Sequence> const& Committed() const noexcept = 0;
 
     // Every ticket, in ascending order of addresses; take must not use the store. Returns the number of the

@@ -229,8 +229,12 @@ Connection::~Connection() = default;
 
 void Connection::Connect(Target const& target, Clock::time_point deadline)
 {
-    char const* const keywords[] = {"dbname", "fallback_application_name", "client_encoding", nullptr};
-    char const* const values[] = {target.uri.c_str(), "comgui", "UTF8", nullptr};
+    // What stands before the URI is a default for it. A network that swallows packets is noticed in some
+    // twenty seconds, also by a connection that only listens.
+    char const* const keywords[] = {
+        "keepalives_idle", "keepalives_interval",       "keepalives_count", "tcp_user_timeout",
+        "dbname",          "fallback_application_name", "client_encoding",  nullptr};
+    char const* const values[] = {"5", "5", "3", "20000", target.uri.c_str(), "comgui", "UTF8", nullptr};
     m_connection.reset(PQconnectStartParams(keywords, values, 1));
     if (!m_connection)
         throw BrokenConnection("no memory for a connection; end other programs, then try again");
@@ -252,7 +256,8 @@ void Connection::Connect(Target const& target, Clock::time_point deadline)
 }
 
 // The schema alone is searched beside PostgreSQL's own, so that nobody's table gets between. A transaction
-// sees what others have committed meanwhile, whatever the database's default is: commits rely on that.
+// sees what others have committed meanwhile, whatever the database's default is: commits rely on that. The
+// server, too, is to notice soon when the other machine is gone: the program's death shows by that.
 void Connection::SetUp(Target const& target, std::chrono::milliseconds statementLimit,
                        Clock::time_point deadline)
 {
@@ -260,6 +265,8 @@ void Connection::SetUp(Target const& target, std::chrono::milliseconds statement
     Run("SELECT set_config('search_path', quote_ident(convert_from($1, 'UTF8')) || ', pg_temp', false), "
         "set_config('statement_timeout', convert_from($2, 'UTF8'), false), "
         "set_config('default_transaction_isolation', 'read committed', false), "
+        "set_config('tcp_keepalives_idle', '5', false), set_config('tcp_keepalives_interval', '5', false), "
+        "set_config('tcp_keepalives_count', '3', false), set_config('tcp_user_timeout', '20000', false), "
         "set_config('client_min_messages', 'error', false)",
         Parameters() << std::string_view(target.schema) << std::string_view(limit), deadline);
 }

@@ -100,6 +100,17 @@ public:
     std::string Text(int row, int column) const { return std::string(Bytes(row, column)); }
     long long Changes() const;  // rows that the statement has changed
 
+    // What make makes of each row.
+    template <typename Make>
+    auto Each(Make const& make) const
+    {
+        std::vector<decltype(make(0))> all;
+        all.reserve(static_cast<std::size_t>(Rows()));
+        for (int row = 0; row < Rows(); ++row)
+            all.push_back(make(row));
+        return all;
+    }
+
 private:
     friend class Connection;
 

@@ -14,7 +14,7 @@ namespace
 using namespace std::chrono_literals;
 
 // What one call hands out of the journal is held in memory.
-constexpr long long LargestFeedBytes = 16ll << 20;
+constexpr long long LargestFeedBytes = 16LL << 20;
 
 // So many records go in one transaction, and so many transactions in one call of Maintain, lest others wait.
 constexpr long long PrunedAtOnce = 1000;

@@ -14,11 +14,14 @@ std::vector<ProgramInfo> PostgresStore::Programs()
 {
     Result const rows = Turn(*this).Run("SELECT id, process, machine, name, since, heard, "
                                         "id IN (SELECT program FROM living) FROM program ORDER BY id");
-    std::vector<ProgramInfo> programs;
-    for (int row = 0; row < rows.Rows(); ++row)
-        programs.push_back({rows.Integer(row, 0), static_cast<long>(rows.Integer(row, 1)), rows.Text(row, 2),
-                            rows.Text(row, 3), rows.Integer(row, 4), rows.Number(row, 5), rows.Bool(row, 6)});
-    return programs;
+    return rows.Each(
+        [&rows](int row)
+        {
+            return ProgramInfo{rows.Integer(row, 0), static_cast<long>(rows.Integer(row, 1)),
+                               rows.Text(row, 2),    rows.Text(row, 3),
+                               rows.Integer(row, 4), rows.Number(row, 5),
+                               rows.Bool(row, 6)};
+        });
 }
 
 int PostgresStore::Bury(std::function<void(Estate const&)> const& clear)
@@ -159,11 +162,12 @@ bool PostgresStore::TakeEstate(Estate& estate)
         return false;
     Result const tickets =
         turn.Run("SELECT type, id, incarnation FROM ticket WHERE owner = $1 AND owner <> 0", id);
-    for (int row = 0; row < tickets.Rows(); ++row)
-        estate.tickets.push_back({{tickets.Int(row, 0), tickets.Int(row, 1)}, tickets.Number(row, 2)});
+    estate.tickets = tickets.Each(
+        [&tickets](int row) {
+            return Estate::Ticket{{tickets.Int(row, 0), tickets.Int(row, 1)}, tickets.Number(row, 2)};
+        });
     Result const files = turn.Run("SELECT path FROM part_file WHERE program = $1", id);
-    for (int row = 0; row < files.Rows(); ++row)
-        estate.partFiles.push_back(files.Text(row, 0));
+    estate.partFiles = files.Each([&files](int row) { return files.Text(row, 0); });
     return true;
 }
 
@@ -194,11 +198,11 @@ void PostgresStore::CloseSession(long long session)
 std::vector<SessionInfo> PostgresStore::Sessions()
 {
     Result const rows = Turn(*this).Run("SELECT id, program, account, since FROM session ORDER BY id");
-    std::vector<SessionInfo> sessions;
-    for (int row = 0; row < rows.Rows(); ++row)
-        sessions.push_back(
-            {rows.Integer(row, 0), rows.Integer(row, 1), rows.Text(row, 2), rows.Integer(row, 3)});
-    return sessions;
+    return rows.Each(
+        [&rows](int row) {
+            return SessionInfo{rows.Integer(row, 0), rows.Integer(row, 1), rows.Text(row, 2),
+                               rows.Integer(row, 3)};
+        });
 }
 
 bool PostgresStore::AddPartFile(std::string_view path)

@@ -11,7 +11,6 @@
 namespace standin
 {
 using namespace std::chrono_literals;
-using postgres::BrokenConnection;
 using postgres::Clock;
 using postgres::Connection;
 using postgres::Parameters;
@@ -268,10 +267,7 @@ std::vector<User> PostgresStore::Users()
 {
     Result const rows =
         Turn(*this).Run("SELECT name, password_hash, role, ticket_id FROM account ORDER BY name");
-    std::vector<User> users;
-    for (int row = 0; row < rows.Rows(); ++row)
-        users.push_back(UserOf(rows, row));
-    return users;
+    return rows.Each([&rows](int row) { return UserOf(rows, row); });
 }
 
 void PostgresStore::PutUser(User const& user)
