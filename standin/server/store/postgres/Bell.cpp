@@ -1,5 +1,6 @@
 #include "standin/server/store/postgres/Bell.h"
 
+#include <algorithm>
 #include <charconv>
 #include <fcntl.h>
 #include <poll.h>
@@ -14,6 +15,7 @@ using namespace std::chrono_literals;
 
 constexpr std::chrono::milliseconds LastRingLimit = 500ms;
 constexpr std::chrono::milliseconds Forever = 24h;
+constexpr std::chrono::milliseconds RingDistance = 2ms;  // a ring costs as much as a small change
 }  // namespace
 
 Bell::Bell(Target target, Limits const& limits, std::function<void(Sequence)> heard)
@@ -42,7 +44,7 @@ void Bell::Ring(Sequence newest) noexcept
     Sequence known = m_toRing;
     while (known < newest && !m_toRing.compare_exchange_weak(known, newest))
         ;
-    if (known < newest)
+    if (known < newest && !m_isAsked.exchange(true))
         Wake();
 }
 
@@ -86,7 +88,10 @@ void Bell::Run() noexcept
         {
             // The working connection reports what is wrong; this one goes on until it can listen again.
             m_connection.reset();
-            HearUntil(Clock::now() + pause.Take());
+            if (m_toRing > m_rung)
+                m_isAsked = true;
+            for (auto const end = Clock::now() + pause.Take(); !m_isOver && Clock::now() < end;)
+                Hear(end);
         }
     }
 }
@@ -95,31 +100,29 @@ void Bell::Serve()
 {
     while (!m_isOver)
     {
-        HearUntil(Clock::now() + Forever);
-        SendRing(m_limits.statement);
+        bool const isAsked = m_isAsked;
+        if (isAsked && Clock::now() >= m_nextRing)
+            SendRing(m_limits.statement);
+        else
+            Hear(isAsked ? m_nextRing : Clock::now() + Forever);
     }
     SendRing(LastRingLimit);
 }
 
-// Until something is to be done or the time is over.
-void Bell::HearUntil(Clock::time_point end)
+// Until something has happened or the time is over.
+void Bell::Hear(Clock::time_point end)
 {
-    while (!m_isOver && (m_toRing <= m_rung || !m_connection))
+    auto const left = std::chrono::ceil<std::chrono::milliseconds>(end - Clock::now());
+    pollfd waiting[] = {{m_wokenEnd.Number(), POLLIN, 0},
+                        {m_connection ? m_connection->Socket() : -1, POLLIN, 0}};
+    poll(waiting, 2, static_cast<int>(std::max<std::int64_t>(left.count(), 0)));
+    char bytes[64];
+    while (read(m_wokenEnd.Number(), bytes, sizeof bytes) > 0)
+        ;
+    if (waiting[1].revents != 0)
     {
-        auto const left = std::chrono::ceil<std::chrono::milliseconds>(end - Clock::now());
-        if (left <= 0ms)
-            return;
-        pollfd waiting[] = {{m_wokenEnd.Number(), POLLIN, 0},
-                            {m_connection ? m_connection->Socket() : -1, POLLIN, 0}};
-        poll(waiting, 2, static_cast<int>(left.count()));
-        char bytes[64];
-        while (read(m_wokenEnd.Number(), bytes, sizeof bytes) > 0)
-            ;
-        if (waiting[1].revents != 0)
-        {
-            m_connection->TakeIn();
-            HearRings();
-        }
+        m_connection->TakeIn();
+        HearRings();
     }
 }
 
@@ -139,9 +142,11 @@ void Bell::HearRings()
 
 void Bell::SendRing(std::chrono::milliseconds limit)
 {
+    m_isAsked = false;  // before the look: who raises the number after it asks anew
     Sequence const newest = m_toRing;
     if (newest <= m_rung)
         return;
+    m_nextRing = Clock::now() + RingDistance;
     std::string const payload = std::to_string(newest);
     m_connection->Run("SELECT pg_notify(convert_from($1, 'UTF8'), convert_from($2, 'UTF8'))",
                       Parameters() << std::string_view(m_target.schema) << std::string_view(payload),

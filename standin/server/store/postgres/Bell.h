@@ -1,8 +1,8 @@
 // How the programs of a site wake each other: a connection that listens, and a thread of its own that rings
 // and hears. A ring is a notification with the number of the newest change; the journal is the truth.
 //
-// PostgreSQL commits one notification at a time in the whole cluster, so the changes do not carry them: one
-// ring at a time is under way, and the changes committed meanwhile share the next one. For any thread.
+// PostgreSQL commits one notification at a time in the whole cluster, so the changes do not carry them: a
+// ring keeps a distance from the one before, and the changes committed meanwhile share it. For any thread.
 #pragma once
 
 #include "standin/server/files/Descriptor.h"
@@ -60,7 +60,7 @@ private:
     void Listen();
     void Run() noexcept;
     void Serve();
-    void HearUntil(Clock::time_point end);
+    void Hear(Clock::time_point end);
     void HearRings();
     void SendRing(std::chrono::milliseconds limit);
     void Wake() noexcept;
@@ -70,11 +70,13 @@ private:
     std::function<void(Sequence)> const m_heard;
     Descriptor m_wakingEnd, m_wokenEnd;  // a pipe, so that the thread waits for it and the socket at once
     std::atomic<Sequence> m_toRing{0};
+    std::atomic<bool> m_isAsked{false};  // to ring
     std::atomic<bool> m_isOver{false};
 
     // The thread's own.
     std::unique_ptr<Connection> m_connection;
     Sequence m_rung = 0;
+    Clock::time_point m_nextRing{};
 
     std::thread m_thread;
 };
