@@ -155,7 +155,7 @@ TEST_F(PostgresRefusal, IsOneLineThatNamesTheDatabaseAndNotThePassword)
 {
     PostgresCluster& cluster = schema.cluster;
     cluster.Run("CREATE ROLE locked LOGIN PASSWORD 'the right one'");
-    cluster.AskForThePasswordOf("locked");
+    cluster.LetIn("locked", "scram-sha-256");
     std::string const withPassword = cluster.Uri("locked:s3cret");
     std::string const folder = cluster.Folder().string();
     struct FACT

@@ -189,12 +189,13 @@ void PostgresCluster::Await(std::string const& sql, std::string const& answer) c
     throw std::runtime_error(sql + ": never " + answer);
 }
 
-void PostgresCluster::AskForThePasswordOf(std::string const& role) const
+void PostgresCluster::LetIn(std::string const& role, std::string const& method) const
 {
     fs::path const rules = m_folder / "data/pg_hba.conf";
-    WriteFile(rules, "local all " + role + " scram-sha-256\n" + ContentOf(rules));
+    WriteFile(rules, "local all " + role + " " + method + "\n" + ContentOf(rules));
+    std::string const before = Run("SELECT pg_conf_load_time()");
     Run("SELECT pg_reload_conf()");
-    Await("SELECT count(*) FROM pg_hba_file_rules WHERE '" + role + "' = ANY (user_name)", "1");
+    Await("SELECT pg_conf_load_time() > '" + before + "'", "t");
 }
 
 void PostgresCluster::Stop()

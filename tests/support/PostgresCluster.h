@@ -45,8 +45,9 @@ public:
     // Returns when the SQL answers that; throws if it has not within a minute.
     void Await(std::string const& sql, std::string const& answer) const;
 
-    // Trusts everybody but that role from now on.
-    void AskForThePasswordOf(std::string const& role) const;
+    // How that role is let in from now on, for example scram-sha-256 or reject; everybody is by trust at
+    // first.
+    void LetIn(std::string const& role, std::string const& method) const;
 
     // The server with all its processes stands still, and goes on.
     void Stop();
