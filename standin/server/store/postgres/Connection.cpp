@@ -346,8 +346,6 @@ bool Connection::TakeNotification(std::string& payload)
 
 bool Connection::IsInTransaction() const { return PQtransactionStatus(m_connection.get()) != PQTRANS_IDLE; }
 
-int Connection::Backend() const { return PQbackendPID(m_connection.get()); }
-
 std::string Connection::Quoted(std::string const& name) const
 {
     std::unique_ptr<char, decltype(&PQfreemem)> const quoted(

@@ -157,7 +157,6 @@ public:
 
     bool IsBroken() const { return m_isBroken; }
     bool IsInTransaction() const;
-    int Backend() const;                                // the process that serves it
     std::string Quoted(std::string const& name) const;  // as an identifier
 
     // The database, its server and the user: what a message begins with. Never the password.

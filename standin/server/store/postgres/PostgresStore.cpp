@@ -138,7 +138,7 @@ PostgresStore::Turn::Turn(PostgresStore& store, std::chrono::milliseconds limit)
 PostgresStore::Turn::~Turn()
 {
     if (m_connection->IsBroken() || m_store.m_hasLeft)
-        m_store.Drop();
+        m_store.m_working.reset();
     End();
 }
 
@@ -153,16 +153,10 @@ void PostgresStore::Turn::End() noexcept
 Connection& PostgresStore::Working(Clock::time_point deadline)
 {
     if (m_working && !m_working->IsSound())
-        Drop();
+        m_working.reset();
     if (!m_working)
         ConnectAgain(deadline);
     return *m_working;
-}
-
-void PostgresStore::Drop()
-{
-    m_backend = m_working->Backend();
-    m_working.reset();
 }
 
 void PostgresStore::ConnectAgain(Clock::time_point deadline)
@@ -193,10 +187,8 @@ void PostgresStore::TakeLifeBack(Clock::time_point deadline)
     {
         try
         {
-            m_working->Run("SELECT pg_terminate_backend(l.pid) FROM pg_locks l WHERE l.locktype = 'advisory' "
-                           "AND l.mode = 'ShareLock' AND l.objsubid = 2 AND l.pid = $1 "
-                           "AND l.classid::bigint::bit(32)::integer = $2 AND l.objid::bigint = $3",
-                           Parameters() << m_backend << m_lockClass << m_self, deadline);
+            m_working->Run("SELECT pg_terminate_backend(pid) FROM living WHERE program = $1",
+                           Parameters() << m_self, deadline);
         }
         catch (postgres::RefusedStatement const&)
         {

@@ -89,7 +89,6 @@ private:
     bool IsForeign() const noexcept;
     void CheckUsable() const;
     postgres::Connection& Working(postgres::Clock::time_point deadline);
-    void Drop();
     void ConnectAgain(postgres::Clock::time_point deadline);
     void TakeLifeBack(postgres::Clock::time_point deadline);
     static void Put(Turn& turn, User const& user);
@@ -117,7 +116,6 @@ private:
     bool m_isTaken = false;
     std::unique_ptr<postgres::Connection> m_working;  // null: broken
     std::uint64_t m_connected = 0;                    // how often
-    int m_backend = 0;                                // of the connection before
     postgres::GrowingPause m_pause;
     postgres::Clock::time_point m_nextAttempt{};
 

@@ -57,7 +57,7 @@ constexpr char const* Life = R"(
     CREATE FUNCTION lock_class() RETURNS integer LANGUAGE sql STABLE AS
         'SELECT relnamespace::bigint::bit(32)::integer FROM pg_class WHERE oid = ''site''::regclass';
     CREATE VIEW living AS
-        SELECT objid::bigint AS program FROM pg_locks
+        SELECT objid::bigint AS program, pid FROM pg_locks
         WHERE locktype = 'advisory' AND mode = 'ShareLock' AND granted AND objsubid = 2
             AND classid = (SELECT relnamespace FROM pg_class WHERE oid = 'site'::regclass)
             AND database = (SELECT oid FROM pg_database WHERE datname = current_database());
