@@ -83,9 +83,9 @@ public:
         auto const known = m_keys.find(text);
         if (known != m_keys.end())
             return known->second.Get();
-        HeldKey const key(new (::operator new(sizeof(PooledKey) + text.size() + 1)) PooledKey(text));
-        m_keys.emplace(key->Text(), key);
-        return key.Get();
+        HeldKey key(new (::operator new(sizeof(PooledKey) + text.size() + 1)) PooledKey(text));
+        std::string_view const name = key->Text();
+        return m_keys.emplace(name, std::move(key)).first->second.Get();
     }
 
     std::size_t Size() const { return m_keys.size(); }
