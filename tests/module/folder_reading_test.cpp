@@ -115,6 +115,22 @@ protected:
         char const* text = nullptr;
         return ticket->SGETPARAMETER(ticket->Instance, key, PARAM_STRING, &text, -1) ? text : nullptr;
     }
+
+    // The system ticket for a session that does not see the folder on which Temp leans.
+    STICKET_ACCESS const* OpenWithoutInstall()
+    {
+        EXPECT_TRUE(Write(Install, "/opt/it"));
+        EXPECT_TRUE(Write(Temp, "$(INSTALL)/tmp"));
+        EXPECT_TRUE(other.Limit(0, 0, {Use, Temp}));
+        return other.Open(0, 0);
+    }
+    // As the library does; Temp is due then.
+    void ReadUpToTemp(STICKET_ACCESS const* ticket) const
+    {
+        int use = 0;
+        EXPECT_TRUE(ticket->SGETPARAMETER(ticket->Instance, Use, PARAM_INT, &use, -1));
+        Text(ticket, Install);
+    }
 };
 }  // namespace
 
@@ -194,27 +210,18 @@ TEST_F(FolderReaders, WhoReadsOtherwise_GetsTheTextThatIsThere)
 // The first folder after the beginning is due, and leans on one that was not read.
 TEST_F(FolderReaders, WhoReadsATableOrWalksInBetween_GetsTheTextThatIsThere)
 {
-    ASSERT_TRUE(Write(Install, "/opt/it"));
-    ASSERT_TRUE(Write(Temp, "$(INSTALL)/tmp"));
-    ASSERT_TRUE(other.Limit(0, 0, {Use, Temp}));
-    auto const* const ticket = other.Open(0, 0);
-    auto const readUpTo = [&]
-    {
-        int use = 0;
-        EXPECT_TRUE(ticket->SGETPARAMETER(ticket->Instance, Use, PARAM_INT, &use, -1));
-        Text(ticket, Install);
-    };
-    readUpTo();
+    auto const* const ticket = OpenWithoutInstall();
+    ReadUpToTemp(ticket);
     EXPECT_STREQ(Text(ticket, Temp), "/opt/it/tmp") << "as the library reads";
-    readUpTo();
+    ReadUpToTemp(ticket);
     GETMULTIPAR table[1] = {};
     EXPECT_EQ(ticket->SGETMULTIPAR(ticket->Instance, table), 1);
     EXPECT_STREQ(Text(ticket, Temp), "$(INSTALL)/tmp");
-    readUpTo();
+    ReadUpToTemp(ticket);
     auto const action = [](void*, char const*, PARAM_TYPE, void const*, int) { return true; };
     EXPECT_EQ(ticket->SWALKPARAMETERS(ticket->Instance, action, nullptr, "none", 8000), 1);
     EXPECT_STREQ(Text(ticket, Temp), "$(INSTALL)/tmp");
-    readUpTo();
+    ReadUpToTemp(ticket);
     double number = 0;
     EXPECT_EQ(ticket->SGETPARAMETER(ticket->Instance, Use, PARAM_DOUBLE, &number, -1), 0);
     EXPECT_STREQ(Text(ticket, Temp), "$(INSTALL)/tmp");
@@ -223,17 +230,12 @@ TEST_F(FolderReaders, WhoReadsATableOrWalksInBetween_GetsTheTextThatIsThere)
 // At whichever place the memory ends: what is not read is not touched.
 TEST_F(FolderReaders, WithoutMemory_ReadNothingOrTheWholeText)
 {
-    ASSERT_TRUE(Write(Install, "/opt/it"));
-    ASSERT_TRUE(Write(Temp, "$(INSTALL)/tmp"));
-    ASSERT_TRUE(other.Limit(0, 0, {Use, Temp}));
-    auto const* const ticket = other.Open(0, 0);
+    auto const* const ticket = OpenWithoutInstall();
     bool hasFailed = true;
     int failures = 0;
     for (int n = 0; hasFailed && n < 1000; ++n)
     {
-        int use = 0;
-        EXPECT_TRUE(ticket->SGETPARAMETER(ticket->Instance, Use, PARAM_INT, &use, -1));
-        Text(ticket, Install);
+        ReadUpToTemp(ticket);
         char const* text = "untouched";
         int isRead = 0;
         {
