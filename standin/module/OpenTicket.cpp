@@ -66,8 +66,7 @@ bool OpenTicket::Get(char const* key, PARAM_TYPE type, void* value, int pos)
 {
     if (m_address == SystemTicket && key && value && (type == PARAM_STRING || type == PARAM_INT)) [[unlikely]]
         return GetFolder(key, type, value, pos);
-    if (m_address == SystemTicket)
-        FolderReading::OfThisThread().Forget();
+    EndFolderReading();
     return ReadTicket(m_tickets, m_session, m_address, Which(), key, type, value, pos);
 }
 
@@ -94,10 +93,16 @@ bool OpenTicket::GetFolder(char const* key, PARAM_TYPE type, void* value, int po
     return isRead;
 }
 
-bool OpenTicket::GetTable(GETMULTIPAR* table)
+// Something else is read through this table.
+void OpenTicket::EndFolderReading() const
 {
     if (m_address == SystemTicket)
         FolderReading::OfThisThread().Forget();
+}
+
+bool OpenTicket::GetTable(GETMULTIPAR* table)
+{
+    EndFolderReading();
     return ReadTable(m_tickets, m_session, m_address, Which(), table);
 }
 
@@ -115,8 +120,7 @@ bool OpenTicket::SetTable(SETMULTIPAR* table)
 // walk that left out values would lose them for good where a ticket is copied by walking over it.
 bool OpenTicket::Walk(SWALKPARAMETERS_ACTION action, void* context, char const* prefix, int)
 {
-    if (m_address == SystemTicket)
-        FolderReading::OfThisThread().Forget();
+    EndFolderReading();
     // The session may end meanwhile, in the action or elsewhere, and the action may take any time.
     auto const texts = m_session.HoldTexts();
     auto const numbers = m_numbers.lock();

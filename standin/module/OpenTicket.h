@@ -43,6 +43,7 @@ public:
 private:
     bool Get(char const* key, PARAM_TYPE type, void* value, int pos) override;
     bool GetFolder(char const* key, PARAM_TYPE type, void* value, int pos);
+    void EndFolderReading() const;
     bool GetTable(GETMULTIPAR* table) override;
     bool Set(char const* key, PARAM_TYPE type, void const* value, int pos) override;
     bool SetTable(SETMULTIPAR* table) override;
