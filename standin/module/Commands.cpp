@@ -68,10 +68,10 @@ TCommandRecord* RecordIn(int size, void* data)
     return isRecord && record->nSize == sizeof *record ? record : nullptr;
 }
 
-int IsAlive(Container const&, TCommandRecord& record)
+int IsAlive(Container const& container, TCommandRecord& record)
 {
-    record.iResult = 0;
-    return MODULE_DONE;
+    record.iResult = container.Server().IsReachable() ? MODULE_DONE : MODULE_SITE_UNAVAILABLE;
+    return record.iResult;
 }
 
 // The name of the job's file comes as $(JOB)/NAME. iArgA is the job's queue, iArgC the number of copies.

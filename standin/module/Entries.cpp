@@ -115,8 +115,12 @@ int IsAlive(void* hInstance, char const* host, int port)
     return Entry(hInstance,
                  [&]() -> int
                  {
+                     if (!host)
+                         return MODULE_INVALID_ARGUMENT;
                      OpenSite* site = nullptr;
-                     return host ? FindServer(host, port, site) : MODULE_INVALID_ARGUMENT;
+                     int const code = FindServer(host, port, site);
+                     bool const isLost = code == MODULE_DONE && !site->server.IsReachable();
+                     return isLost ? MODULE_SITE_UNAVAILABLE : code;
                  });
 }
 

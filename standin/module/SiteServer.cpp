@@ -24,7 +24,7 @@ std::filesystem::path ShippedSeed()
     return executable.parent_path().parent_path() / "Resources" / "seed.xml";
 }
 
-using Sites = std::map<std::filesystem::path, std::unique_ptr<OpenSite>>;
+using Sites = std::map<SiteName, std::unique_ptr<OpenSite>>;
 
 // At the end of the process the clients' callbacks go before this module does; no thread of ours may call
 // them then. A callback that hangs holds up the end for a moment only. Transfers are cut, so that they take
@@ -38,7 +38,7 @@ struct EndOfWork
     {
         if (IsForkedChild() || getpid() != process)  // a child of a raw clone is told nothing
             return;
-        for (auto const& [folder, open] : sites)
+        for (auto const& [name, open] : sites)
         {
             open->server.Stop(PatienceAtTheEnd);
             open->site.Leave();
@@ -46,22 +46,22 @@ struct EndOfWork
     }
 };
 
-OpenSite& Opened(std::filesystem::path const& folder)
+OpenSite& Opened(SiteName const& name)
 {
     // Never destroyed: containers may be used while the process comes to its end.
     static auto& lock = *new std::mutex;
     static auto& sites = *new Sites;
     static EndOfWork const atExit{sites};
     std::lock_guard const guard(lock);
-    auto const known = sites.find(folder);
+    auto const known = sites.find(name);
     if (known != sites.end())
         return *known->second;
-    return *sites.emplace(folder, std::make_unique<OpenSite>(folder)).first->second;
+    return *sites.emplace(name, std::make_unique<OpenSite>(name)).first->second;
 }
 }  // namespace
 
-OpenSite::OpenSite(std::filesystem::path const& folder)
-    : site(folder, ShippedSeed()), server(site.store(), site.folder())
+OpenSite::OpenSite(SiteName const& name)
+    : site(name, ShippedSeed()), server(site.store(), site.folder())
 {
     site.PutInOrder(server);
 }
@@ -73,7 +73,7 @@ OpenSite* SiteOfThisProcess() noexcept
                               {
                                   try
                                   {
-                                      return &Opened(Site::Folder());
+                                      return &Opened(SiteName::OfThisUser());
                                   }
                                   catch (StoreError const& error)
                                   {

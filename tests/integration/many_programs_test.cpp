@@ -4,6 +4,7 @@
 #include "tests/support/Program.h"
 #include "tests/support/SiteClient.h"
 #include "tests/support/TemporaryFolder.h"
+#include "tests/support/TestSite.h"
 #include "tests/support/sanitizers.h"
 #include <algorithm>
 #include <deque>
@@ -127,7 +128,7 @@ protected:
     ManyPrograms()
     {
         SiteClient::MakeSite(site);
-        setenv("COMGUI_SITE", site.c_str(), 1);
+        UseSiteIn(site);
     }
 
     // Gives all of them the command made from their number and only then waits, so that they work at once.

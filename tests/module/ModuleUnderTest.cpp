@@ -1,6 +1,7 @@
 #include "tests/module/ModuleUnderTest.h"
 
 #include "comgui/foundation/stracpy.h"
+#include "tests/support/TestSite.h"
 #include <CoreFoundation/CoreFoundation.h>
 #include <cstdlib>
 #include <deque>
@@ -59,7 +60,7 @@ RECORD::RECORD(char const* user, char const* password, char const* host, int por
 
 MODULE_AT_SITE::MODULE_AT_SITE() : folder(NewFolder()) { UseSite(folder.Path() / "site"); }
 
-void MODULE_AT_SITE::UseSite(std::string const& site) { setenv("COMGUI_SITE", site.c_str(), 1); }
+void MODULE_AT_SITE::UseSite(std::string const& site) { UseSiteIn(site); }
 
 void* MODULE_AT_SITE::LogIn(char const* user, char const* password) const
 {

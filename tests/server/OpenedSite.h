@@ -10,7 +10,7 @@ class OpenedSite
 {
 public:
     OpenedSite(std::filesystem::path const& folder, std::filesystem::path const& seed)
-        : site(folder, seed), m_server(std::make_unique<standin::Server>(site.store(), site.folder()))
+        : site(standin::SiteName::Of(folder.string()), seed), m_server(std::make_unique<standin::Server>(site.store(), site.folder()))
     {
         site.PutInOrder(*m_server);
     }

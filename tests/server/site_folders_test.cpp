@@ -131,7 +131,7 @@ TEST_F(FoldersOfASite, OfTheOriginal_StayWhenItsCopyIsOpened)
     std::filesystem::path const copy = folder / "copy";
     std::filesystem::copy(Folder(), copy, std::filesystem::copy_options::recursive);
     testing::internal::CaptureStderr();
-    Site site(copy, COMGUI_TEST_SEED);
+    Site site({copy}, COMGUI_TEST_SEED);
     {
         Server server(site.store(), copy);
         std::this_thread::sleep_for(

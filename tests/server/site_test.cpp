@@ -4,6 +4,7 @@
 #include "standin/server/files/Descriptor.h"
 #include "standin/server/sessions/Password.h"
 #include "standin/server/site/Seed.h"
+#include "standin/server/store/sqlite/SqliteStore.h"
 #include "standin/server/tickets/TicketXml.h"
 #include "tests/server/MemoryFolder.h"
 #include "tests/server/OpenedSite.h"
@@ -135,13 +136,13 @@ TEST_F(SiteFolderByEnvironment, IsWhatComguiSiteSays)
 {
     setenv("COMGUI_SITE", "/somewhere/else/", 1);
     setenv("XDG_DATA_HOME", "/data", 1);
-    EXPECT_EQ(Site::Folder(), "/somewhere/else");
+    EXPECT_EQ(SiteName::OfThisUser().folder, "/somewhere/else");
 }
 
 TEST_F(SiteFolderByEnvironment, RelativeComguiSite_IsMadeAbsolute)
 {
     setenv("COMGUI_SITE", "my/../site", 1);
-    EXPECT_EQ(Site::Folder(), std::filesystem::current_path() / "site");
+    EXPECT_EQ(SiteName::OfThisUser().folder, std::filesystem::current_path() / "site");
 }
 
 TEST_F(SiteFolderByEnvironment, OtherwiseLiesInTheDataFolder)
@@ -149,22 +150,22 @@ TEST_F(SiteFolderByEnvironment, OtherwiseLiesInTheDataFolder)
     setenv("COMGUI_SITE", "", 1);
     setenv("XDG_DATA_HOME", "/data", 1);
     setenv("HOME", "/home/me", 1);
-    EXPECT_EQ(Site::Folder(), "/data/comgui/site");
+    EXPECT_EQ(SiteName::OfThisUser().folder, "/data/comgui/site");
 }
 
 TEST_F(SiteFolderByEnvironment, WithoutADataFolder_LiesInTheHome)
 {
     setenv("HOME", "/home/me", 1);
-    EXPECT_EQ(Site::Folder(), "/home/me/.local/share/comgui/site");
+    EXPECT_EQ(SiteName::OfThisUser().folder, "/home/me/.local/share/comgui/site");
     setenv("XDG_DATA_HOME", "relative", 1);
-    EXPECT_EQ(Site::Folder(), "/home/me/.local/share/comgui/site");
+    EXPECT_EQ(SiteName::OfThisUser().folder, "/home/me/.local/share/comgui/site");
 }
 
 TEST_F(SiteFolderByEnvironment, WithoutAnything_SaysWhatToSet)
 {
     try
     {
-        Site::Folder();
+        SiteName::OfThisUser();
         FAIL() << "found a folder";
     }
     catch (StoreError const& error)
@@ -346,6 +347,22 @@ TEST_F(SiteFolder, SystemTicketFile_WhoseTurnSomebodyKeeps_IsWrittenWhenItIsFree
     EXPECT_THAT(testing::internal::GetCapturedStderr(), ContainsRegex("^[^\n]*cannot be locked[^\n]*\n$"));
     site.Server().Tidy();
     EXPECT_THAT(ContentOf(File("tickets/SYS_0000.xml")), HasSubstr("Name 19"));
+}
+
+TEST_F(SiteFolder, SystemTicketFile_WhoseTurnComes_IsWrittenWhenTheChangeReturns)
+{
+    OpenedSite site(Folder(), ShippedSeed);
+    auto turn = std::make_unique<Descriptor>(open(File("tickets").c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
+    ASSERT_EQ(flock(turn->Number(), LOCK_EX), 0);
+    std::thread holder(
+        [&]
+        {
+            std::this_thread::sleep_for(std::chrono::milliseconds(100));
+            turn.reset();
+        });
+    EXPECT_TRUE(site.Put("System/Name", "In turn"));
+    EXPECT_THAT(ContentOf(File("tickets/SYS_0000.xml")), HasSubstr("In turn"));
+    holder.join();
 }
 
 TEST_F(SiteFolder, SystemTicketFile_WrittenWhileThreadsFork_IsNobodysTurnAfterwards)

@@ -149,7 +149,7 @@ void PostgresCluster::Start()
         WatchOver(
             StartAs({Program("postgres"), "-D", (m_folder / "data").string(), "-k", m_folder.string(), "-c",
                      "listen_addresses=", "-c", "fsync=off", "-c", "shared_buffers=16MB", "-c",
-                     "max_connections=60", "-c", "client_min_messages=warning", "-c", "max_wal_size=128MB"},
+                     "max_connections=200", "-c", "client_min_messages=warning", "-c", "max_wal_size=128MB"},
                     m_folder / "log"),
             ends[0], m_folder);
     }

@@ -1,5 +1,6 @@
 #include "tools/comgui_site/users.h"
 
+#include "standin/server/store/sqlite/SqliteStore.h"
 #include "tests/support/TemporaryFolder.h"
 #include "tests/tools/SiteTest.h"
 
@@ -155,9 +156,9 @@ TEST_F(SiteUsers, SetPasswordHash_LeavesTheRest)
 TEST(SiteUsersTurn, IsForOneAtATime)
 {
     TemporaryFolder const folder;
-    auto first = std::make_unique<UsersTurn>(folder.Path());
-    standin::LockFile other(folder.Path());
-    EXPECT_FALSE(other.TryLock(4, standin::LockFile::Hold::Exclusive));
+    standin::SqliteStore store(folder.Path(), [] { return standin::StoreContent(); });
+    auto first = std::make_unique<UsersTurn>(store);
+    EXPECT_EQ(store.TakeUsersTurn(std::chrono::milliseconds(20)), nullptr);
     first.reset();
-    EXPECT_TRUE(other.TryLock(4, standin::LockFile::Hold::Exclusive));
+    EXPECT_NE(store.TakeUsersTurn(std::chrono::milliseconds(20)), nullptr);
 }

@@ -2,6 +2,7 @@
 
 #include "standin/server/files/AtomicFile.h"
 #include "standin/server/files/RemoveTree.h"
+#include "tools/comgui_site/Trouble.h"
 #include <cerrno>
 #include <fcntl.h>
 #include <sys/stat.h>
@@ -35,6 +36,18 @@ void RemoveLeftovers(path const& file)
     }
 }
 }  // namespace
+
+// A link fails where a file is by now, a renaming would replace it. Some file systems have no links.
+void GiveName(path const& made, path const& file, bool mayReplace)
+{
+    standin::FlushFile(made);
+    bool const isLinked = !mayReplace && link(made.c_str(), file.c_str()) == 0;
+    if (!isLinked && !mayReplace && errno == EEXIST)
+        throw Trouble(file.string() + ": is there already; choose another name, or say --force");
+    if (!isLinked && rename(made.c_str(), file.c_str()) != 0)
+        throw standin::FileError(standin::FileFault(file, "cannot be written", errno));
+    standin::FlushFolder(file.parent_path());
+}
 
 Workplace::Workplace(path const& file)
 {

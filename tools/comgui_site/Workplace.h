@@ -7,6 +7,10 @@
 
 namespace comgui_site
 {
+// Gives a file that is whole its name, and returns when it is on the disk under it. Throws FileError; Trouble
+// if there is a file of that name which it may not replace.
+void GiveName(std::filesystem::path const& made, std::filesystem::path const& file, bool mayReplace);
+
 class Workplace
 {
 public:

@@ -1,10 +1,12 @@
 #include "tools/comgui_site/backup.h"
 
 #include "standin/server/files/AtomicFile.h"
+#include "standin/server/store/sqlite/SqliteStore.h"
 #include "tools/comgui_site/OpenedSite.h"
 #include "tools/comgui_site/Progress.h"
 #include "tools/comgui_site/Trouble.h"
 #include "tools/comgui_site/Workplace.h"
+#include "tools/comgui_site/content.h"
 #include <cerrno>
 #include <cstring>
 #include <sys/stat.h>
@@ -15,17 +17,6 @@ namespace comgui_site
 namespace
 {
 using std::filesystem::path;
-
-// A link fails where a file is by now, a renaming would replace it. Some file systems have no links.
-void Name(path const& made, path const& file, bool mayReplace)
-{
-    bool const isLinked = !mayReplace && link(made.c_str(), file.c_str()) == 0;
-    if (!isLinked && !mayReplace && errno == EEXIST)
-        throw Trouble(file.string() + ": is there already; choose another name, or say --force");
-    if (!isLinked && rename(made.c_str(), file.c_str()) != 0)
-        throw standin::FileError(standin::FileFault(file, "cannot be written", errno));
-    standin::FlushFolder(file.parent_path());
-}
 
 // What new files may be for others: nothing.
 class PrivateFiles
@@ -53,6 +44,20 @@ void CheckTarget(path const& site, path const& file, bool mayReplace)
     if (!mayReplace)
         throw Trouble(file.string() + ": is there already; choose another name, or say --force");
 }
+// One in a folder is copied page by page, with the journal's numbers; another one ticket by ticket.
+void Copy(standin::SiteStore& store, Workplace const& workplace)
+{
+    if (auto* const inFolder = dynamic_cast<standin::SqliteStore*>(&store))
+    {
+        Progress progress("copying the database");
+        auto const tell = [&](long long done, long long total)
+        { progress(static_cast<unsigned long long>(done), static_cast<unsigned long long>(total)); };
+        return inFolder->BackupTo(workplace.Database(), tell);
+    }
+    standin::SqliteStore copy(workplace.Folder(), [] { return standin::StoreContent(); });
+    CopyContent(store, copy);
+    copy.Leave();
+}
 }  // namespace
 
 void BackUp(OpenedSite& site, path const& file, bool mayReplace)
@@ -60,14 +65,8 @@ void BackUp(OpenedSite& site, path const& file, bool mayReplace)
     path const target = TargetOf(file);
     CheckTarget(site.Folder(), target, mayReplace);
     Workplace const workplace(target);
-    {
-        PrivateFiles const privately;
-        Progress progress("copying the database");
-        auto const tell = [&](long long done, long long total)
-        { progress(static_cast<unsigned long long>(done), static_cast<unsigned long long>(total)); };
-        site.Store().BackupTo(workplace.Database(), tell);
-    }
-    standin::FlushFile(workplace.Database());
-    Name(workplace.Database(), target, mayReplace);
+    PrivateFiles const privately;
+    Copy(site.Store(), workplace);
+    GiveName(workplace.Database(), target, mayReplace);
 }
 }  // namespace comgui_site

@@ -1,15 +1,14 @@
 // All that a site's database holds as one file, and back. The folders of files are no part of it.
 #pragma once
 
-#include <filesystem>
-#include <string>
+#include "standin/server/site/SiteName.h"
 #include <vector>
 
 namespace comgui_site
 {
 class OpenedSite;
 
-// Writes the database as of one moment to a new file, readable by this user alone, under a name of its own
+// Writes tickets and users as of one moment to a new file, a database as a folder has it, readable by this user alone, under a name of its own
 // until it is whole and on the disk. mayReplace: an older regular file of that name, but never one of the
 // site's own. Throws Trouble, FileError or StoreError, with the older file as it was.
 void BackUp(OpenedSite& site, std::filesystem::path const& file, bool mayReplace);
@@ -21,9 +20,9 @@ struct Restored
     std::vector<std::string> problems;    // of the site as it is now, see check.h
 };
 
-// Makes a copy of the file the database of the site in that folder, which is made if it is missing. The file
-// is checked first, and all of it is copied; only then the site changes, in one step. The old database gets
-// another name, and so do the folders of jobs that the backup does not know, since the server would remove
-// them. Throws Trouble if a program has the site open or the file is no sound database of a site.
-Restored Restore(std::filesystem::path const& folder, std::filesystem::path const& file);
+// Makes what is in the file the database of that site, which is made if it is missing. The file is checked
+// first, and all of it is copied; only then the site changes, in one step. The old database gets another
+// name, and so do the folders of jobs that the backup does not know, since the server would remove them.
+// Throws Trouble or StoreError if a program has the site open or the file is no sound database of a site.
+Restored Restore(standin::SiteName const& name, std::filesystem::path const& file);
 }  // namespace comgui_site

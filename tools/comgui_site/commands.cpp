@@ -1,12 +1,14 @@
 #include "tools/comgui_site/commands.h"
 
 #include "standin/server/files/AtomicFile.h"
+#include "standin/server/store/sqlite/Database.h"
 #include "tools/comgui_site/OpenedSite.h"
 #include "tools/comgui_site/Password.h"
 #include "tools/comgui_site/Progress.h"
 #include "tools/comgui_site/Trouble.h"
 #include "tools/comgui_site/backup.h"
 #include "tools/comgui_site/check.h"
+#include "tools/comgui_site/copy.h"
 #include "tools/comgui_site/export.h"
 #include "tools/comgui_site/follow.h"
 #include "tools/comgui_site/import.h"
@@ -75,10 +77,10 @@ std::vector<std::string> AllProblemsOf(OpenedSite& site)
 }
 
 // A database that is too damaged to be opened has a problem, too.
-std::vector<std::string> ProblemsOfSite(std::filesystem::path const& folder)
+std::vector<std::string> ProblemsOfSite(standin::SiteName const& name)
 try
 {
-    OpenedSite site(folder);
+    OpenedSite site(name);
     return AllProblemsOf(site);
 }
 catch (standin::DamagedStore const& damage)
@@ -121,19 +123,24 @@ std::string ResultOf(bool isJson, standin::TicketAddress address, TicketCommits:
 
 int RunInfo(Request const& request)
 {
-    OpenedSite site(FolderOfSite(request.site));
-    SiteInfo const info = InfoOf(site.Store(), site.Folder());
+    OpenedSite site(NameOfSite(request.site));
+    SiteInfo info = InfoOf(site.Store(), site.Folder());
+    if (site.IsDatabase())
+    {
+        info.database = site.Store().Name();
+        info.databaseSize = static_cast<unsigned long long>(site.Store().Measure().databaseBytes);
+    }
     Print(request.isJson ? LinesOf(JsonOf(info)) : TextOf(info));
     return 0;
 }
 
 int RunCheck(Request const& request)
 {
-    auto const folder = FolderOfSite(request.site);
-    auto const problems = ProblemsOfSite(folder);
+    auto const name = NameOfSite(request.site);
+    auto const problems = ProblemsOfSite(name);
     if (request.isJson)
     {
-        Json json{{"site", JsonOf(folder.string())}, {"problems", Json::array()}};
+        Json json{{"site", JsonOf(name.folder.string())}, {"problems", Json::array()}};
         for (std::string const& problem : problems)
             json["problems"].push_back(JsonOf(problem));
         Print(LinesOf(json));
@@ -145,7 +152,7 @@ int RunCheck(Request const& request)
 
 int RunUsers(Request const& request)
 {
-    OpenedSite site(FolderOfSite(request.site));
+    OpenedSite site(NameOfSite(request.site));
     std::string text;
     Json json = Json::array();
     for (standin::User const& user : site.Store().Users())
@@ -161,12 +168,12 @@ int RunUsers(Request const& request)
 
 int RunUsersAdd(Request const& request)
 {
-    OpenedSite site(FolderOfSite(request.site));
+    OpenedSite site(NameOfSite(request.site));
     CheckNewUser(site.Store(), request.user);
     std::string const hash = HashOfNewPassword(request.user.name);
     standin::User made;
     {
-        UsersTurn const turn(site.Folder());
+        UsersTurn const turn(site.Store());
         made = AddUser(site.Store(), request.user, hash);
     }
     site.Leave();
@@ -177,11 +184,11 @@ int RunUsersAdd(Request const& request)
 
 int RunUsersRemove(Request const& request)
 {
-    OpenedSite site(FolderOfSite(request.site));
+    OpenedSite site(NameOfSite(request.site));
     std::string const& name = request.user.name;
     std::string text = "removed " + Cleaned(name);
     {
-        UsersTurn const turn(site.Folder());
+        UsersTurn const turn(site.Store());
         int const ticket = MustBeUser(site.Store(), name).ticketId;
         text += RemoveUser(site.Store(), name, request.keepTicket) ? " with the ticket 17/"
                                                                    : "; there still is the ticket 17/";
@@ -195,9 +202,9 @@ int RunUsersRemove(Request const& request)
 
 int RunUsersRole(Request const& request)
 {
-    OpenedSite site(FolderOfSite(request.site));
+    OpenedSite site(NameOfSite(request.site));
     {
-        UsersTurn const turn(site.Folder());
+        UsersTurn const turn(site.Store());
         SetRole(site.Store(), request.user.name, request.user.role);
     }
     std::string const sessions = SessionsText(site, request.user.name);
@@ -209,11 +216,11 @@ int RunUsersRole(Request const& request)
 
 int RunPasswd(Request const& request)
 {
-    OpenedSite site(FolderOfSite(request.site));
+    OpenedSite site(NameOfSite(request.site));
     MustBeUser(site.Store(), request.user.name);
     std::string const hash = HashOfNewPassword(request.user.name);
     {
-        UsersTurn const turn(site.Folder());
+        UsersTurn const turn(site.Store());
         SetPasswordHash(site.Store(), request.user.name, hash);
     }
     site.Leave();
@@ -223,7 +230,7 @@ int RunPasswd(Request const& request)
 
 int RunBackup(Request const& request)
 {
-    OpenedSite site(FolderOfSite(request.site));
+    OpenedSite site(NameOfSite(request.site));
     BackUp(site, request.file, request.force);
     std::error_code error;
     Print("backed up to " + Cleaned(request.file) + ", " +
@@ -234,9 +241,10 @@ int RunBackup(Request const& request)
 
 int RunRestore(Request const& request)
 {
-    auto const folder = FolderOfSite(request.site);
-    Restored const restored = Restore(folder, request.file);
-    std::string text = "restored " + Cleaned(folder.string()) + " from " + Cleaned(request.file) + '\n';
+    auto const name = NameOfSite(request.site);
+    Restored const restored = Restore(name, request.file);
+    std::string text =
+        "restored " + Cleaned(name.folder.string()) + " from " + Cleaned(request.file) + '\n';
     if (!restored.setAside.empty())
         text += "the database before is " + Cleaned(restored.setAside) + '\n';
     text += "the folders of files are as they were; a backup has none of them\n";
@@ -248,9 +256,18 @@ int RunRestore(Request const& request)
     return 0;
 }
 
+int RunCopy(Request const& request)
+{
+    Copied const copied = CopySite(NameOfSite(request.from), NameOfSite(request.to));
+    Print("copied " + Counted(copied.tickets, "ticket") + ", " + Counted(copied.users, "user") + ", " +
+          Counted(copied.files, "file") + " (" + SizeText(copied.bytes) +
+          "); compared, and all of it is the same\n");
+    return 0;
+}
+
 int RunExport(Request const& request)
 {
-    OpenedSite site(FolderOfSite(request.site));
+    OpenedSite site(NameOfSite(request.site));
     auto const tickets = Chosen(site.Store(), request.tickets);
     if (request.output != "-" && IsFolder(request.output))
     {
@@ -275,7 +292,7 @@ int RunExport(Request const& request)
 int RunImport(Request const& request)
 {
     auto const tickets = ReadTickets(request.files);
-    OpenedSite site(FolderOfSite(request.site));
+    OpenedSite site(NameOfSite(request.site));
     std::string results;  // printed at the end: a pipe that is closed keeps no ticket from being written
     bool isMirrorDue = false;
     auto const tell = [&](standin::TicketAddress address, TicketCommits::Done const& done)
@@ -304,7 +321,7 @@ int RunImport(Request const& request)
 
 int RunFollow(Request const& request)
 {
-    OpenedSite site(FolderOfSite(request.site));
+    OpenedSite site(NameOfSite(request.site));
     Output out(stdout);
     Follow(site.Store(), request.since, request.isJson, out);
     return 0;

@@ -21,6 +21,7 @@ struct Request
     TicketCommits::Mode mode = TicketCommits::Mode::Merge;
     NewUser user;                       // add, remove, role and passwd
     std::string file;                   // backup and restore
+    std::string from, to;               // copy
     std::string output = "-";           // export
     std::vector<std::string> files;     // import
     std::vector<TicketChoice> tickets;  // export
@@ -36,6 +37,7 @@ int RunUsersRole(Request const& request);
 int RunPasswd(Request const& request);
 int RunBackup(Request const& request);
 int RunRestore(Request const& request);
+int RunCopy(Request const& request);
 int RunExport(Request const& request);
 int RunImport(Request const& request);
 int RunFollow(Request const& request);

@@ -91,7 +91,8 @@ SiteInfo InfoOf(Store& store, std::filesystem::path const& folder)
 std::string TextOf(SiteInfo const& info)
 {
     std::string text = "site      " + Cleaned(info.folder.string()) + "\ndatabase  " +
-                       SizeText(info.databaseSize) + "\nfiles     " + SizeText(info.filesSize) +
+                       SizeText(info.databaseSize) +
+                       (info.database.empty() ? "" : ", " + Cleaned(info.database)) + "\nfiles     " + SizeText(info.filesSize) +
                        "\nchanges   " + std::to_string(info.newest) + "\njournal   " + JournalText(info);
     std::size_t count = 0;
     for (auto const& [type, number] : info.tickets)
@@ -116,6 +117,7 @@ std::string TextOf(SiteInfo const& info)
 Json JsonOf(SiteInfo const& info)
 {
     Json json{{"site", JsonOf(info.folder.string())},
+              {"database", info.database.empty() ? Json(nullptr) : JsonOf(info.database)},
               {"databaseBytes", info.databaseSize},
               {"fileBytes", info.filesSize},
               {"newestChange", info.newest},

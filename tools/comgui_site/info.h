@@ -14,6 +14,7 @@ namespace comgui_site
 struct SiteInfo
 {
     std::filesystem::path folder;
+    std::string database{};               // where it is, if not in the folder
     unsigned long long databaseSize = 0;  // in bytes, with the journal of the engine
     unsigned long long filesSize = 0;     // of everything else in the folder
     std::map<int, std::size_t> tickets;   // by type

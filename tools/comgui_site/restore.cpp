@@ -4,12 +4,15 @@
 #include "standin/server/jobs/JobIntake.h"
 #include "standin/server/store/sqlite/Database.h"
 #include "standin/server/store/sqlite/LockFile.h"
+#include "standin/server/store/sqlite/SqliteStore.h"
+#include "tools/comgui_site/NewDatabase.h"
 #include "tools/comgui_site/OpenedSite.h"
 #include "tools/comgui_site/Progress.h"
 #include "tools/comgui_site/Trouble.h"
 #include "tools/comgui_site/Workplace.h"
 #include "tools/comgui_site/backup.h"
 #include "tools/comgui_site/check.h"
+#include "tools/comgui_site/content.h"
 #include "tools/comgui_site/words.h"
 #include <cerrno>
 #include <fcntl.h>
@@ -23,6 +26,7 @@ namespace
 {
 using namespace std::chrono_literals;
 using standin::LockFile;
+using standin::SiteName;
 using std::filesystem::path;
 
 // The site for this program alone: nobody has it open, and who wants to open it waits.
@@ -49,13 +53,8 @@ private:
     static std::string WhoHas(path const& folder)
     try
     {
-        OpenedSite site(folder);
-        std::string names;
-        for (auto const& program : site.Store().Programs())
-            if (program.isAlive && program.id != site.Store().Self())
-                names += (names.empty() ? " by " : ", ") + program.name + " (process " +
-                         std::to_string(program.process) + " on " + program.machine + ")";
-        return names;
+        OpenedSite site({folder});
+        return OtherPrograms(site.Store());
     }
     catch (std::exception const&)
     {
@@ -333,29 +332,64 @@ void CheckFile(path const& file)
                       ": is the database of a site that was not left in order, and not all of it; "
                       "let a program open that site, or use backup");
 }
+
+// The database of a folder is exchanged as a file.
+void Exchanged(path const& folder, Workplace const& workplace, std::set<std::string> const& jobs,
+               Restored& restored)
+{
+    standin::FlushFile(workplace.Database());
+    Alone const alone(folder);
+    Exchange exchange(folder, workplace);
+    StrayJobFolders strays(folder, jobs);
+    restored.setAside = exchange.Do();
+    restored.jobFolders = strays.Keep();
+}
+
+// Another one is filled anew beside the old one.
+void Refilled(SiteName const& name, Workplace const& workplace, std::set<std::string> const& jobs,
+              Restored& restored)
+{
+    auto const database = NewDatabase::Begin(name, workplace.Folder(), NewDatabase::Old::SetAside);
+    standin::SqliteStore backup(workplace.Folder(), [] { return standin::StoreContent(); });
+    CopyContent(backup, database->Store());
+    backup.Leave();
+    StrayJobFolders strays(name.folder, jobs);
+    restored.setAside = database->Finish();
+    restored.jobFolders = strays.Keep();
+}
+
+// Before the long work: that nobody has it open, and that the folder is the database's.
+void CheckIsFree(SiteName const& name)
+try
+{
+    if (!name.IsDatabase())
+    {
+        Alone const alone(name.folder);
+        return;
+    }
+    OpenedSite site(name);
+    CheckIsAlone(site);
+}
+catch (MissingSite const&)
+{
+}
 }  // namespace
 
-Restored Restore(path const& folder, path const& file)
+Restored Restore(SiteName const& name, path const& file)
 {
     CheckFile(file);
-    standin::MakePrivateFolders({folder});
-    {
-        Alone const beforeTheLongWork(folder);
-    }
-    Workplace const workplace(folder / ".restore");
+    standin::MakePrivateFolders({name.folder});
+    CheckIsFree(name);
+    Workplace const workplace(name.folder / ".restore");
     Copy(file, workplace.Database(), "copying the backup");
     auto const jobs = CheckCopy(file, workplace);
-    standin::FlushFile(workplace.Database());
     Restored restored;
-    {
-        Alone const alone(folder);
-        Exchange exchange(folder, workplace);
-        StrayJobFolders strays(folder, jobs);
-        restored.setAside = exchange.Do();
-        restored.jobFolders = strays.Keep();
-    }
-    OpenedSite site(folder);
-    restored.problems = ProblemsOf(site.Store(), folder, [](long long, long long) {});
+    if (name.IsDatabase())
+        Refilled(name, workplace, jobs, restored);
+    else
+        Exchanged(name.folder, workplace, jobs, restored);
+    OpenedSite site(name);
+    restored.problems = ProblemsOf(site.Store(), name.folder, [](long long, long long) {});
     site.Leave();
     return restored;
 }

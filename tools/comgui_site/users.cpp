@@ -8,7 +8,6 @@
 
 namespace comgui_site
 {
-using standin::LockFile;
 using standin::Store;
 using standin::StoredValue;
 using standin::TicketAddress;
@@ -18,7 +17,6 @@ using standin::UserTicketType;
 
 namespace
 {
-constexpr off_t UsersByte = 4;  // of the lock file; the store has those below
 constexpr char RoleKey[] = "User/Role";
 constexpr std::size_t LongestName = 127;  // bytes; the record of a login has room for so many
 
@@ -72,9 +70,9 @@ TicketXml OwnTicketOf(NewUser const& user)
 }
 }  // namespace
 
-UsersTurn::UsersTurn(std::filesystem::path const& folder) : m_lock(folder)
+UsersTurn::UsersTurn(standin::SiteStore& store) : m_turn(store.TakeUsersTurn(std::chrono::seconds(10)))
 {
-    if (!m_lock.LockWithin(UsersByte, LockFile::Hold::Exclusive, std::chrono::seconds(10)))
+    if (!m_turn)
         throw Trouble("another comgui_site has been changing users all the time; end it, then try again");
 }
 

@@ -1,8 +1,7 @@
 // The users of a site. What several owners do at the same time comes one after another, see UsersTurn.
 #pragma once
 
-#include "standin/server/store/Store.h"
-#include "standin/server/store/sqlite/LockFile.h"
+#include "standin/server/store/SiteStore.h"
 #include <optional>
 #include <string>
 
@@ -17,10 +16,10 @@ inline constexpr int Operator = 1;
 class UsersTurn
 {
 public:
-    explicit UsersTurn(std::filesystem::path const& folder);
+    explicit UsersTurn(standin::SiteStore& store);
 
 private:
-    standin::LockFile m_lock;
+    std::unique_ptr<standin::SiteStore::UsersTurn> m_turn;
 };
 
 struct NewUser

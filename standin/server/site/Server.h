@@ -32,6 +32,9 @@ public:
     // alone has read and that are gone from their tickets.
     bool Logout(Session& session);
 
+    // Whether the store answers: without it nothing can be written, and nobody hears of others' changes.
+    bool IsReachable() const noexcept { return m_store.IsReachable(); }
+
     KeptTexts const& Texts() const { return m_texts; }
     TicketService& Tickets() { return m_tickets; }
     NotificationService& Notifications() { return m_notifications; }

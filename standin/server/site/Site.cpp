@@ -3,8 +3,10 @@
 #include "standin/server/files/AtomicFile.h"
 #include "standin/server/files/Report.h"
 #include "standin/server/files/SiteFiles.h"
+#include "standin/server/site/OpenStore.h"
 #include "standin/server/site/Seed.h"
 #include "standin/server/site/SiteFolders.h"
+#include <algorithm>
 #include <cstdlib>
 #include <string>
 #include <string_view>
@@ -18,18 +20,6 @@ constexpr std::string_view InstallFolderKey = "System/InstallFolder";
 constexpr char SeedFile[] = "seed.xml";
 constexpr char SystemTicketFile[] = "tickets/SYS_0000.xml";
 constexpr std::string_view OwnFolders[] = {"tickets", "temp", "job", "upload", "preview", "log"};
-
-std::filesystem::path FromEnvironment(char const* name)
-{
-    char const* const value = std::getenv(name);
-    return value == nullptr ? "" : value;
-}
-
-std::filesystem::path MadeAbsolute(std::filesystem::path const& folder)
-{
-    std::filesystem::path const absolute = std::filesystem::absolute(folder).lexically_normal();
-    return absolute.has_filename() ? absolute : absolute.parent_path();  // no slash at the end
-}
 
 // The seed of the site. A missing one is copied from the program's, and so is a damaged one, but only after
 // the program's own has proved to be sound.
@@ -66,7 +56,8 @@ Seed SeedOfSite(std::filesystem::path const& folder, std::filesystem::path const
 // COMGUI_DURABILITY=full: every write survives a power cut.
 Durability DurabilityFromEnvironment()
 {
-    std::string const wanted = FromEnvironment("COMGUI_DURABILITY").string();
+    char const* const value = std::getenv("COMGUI_DURABILITY");
+    std::string const wanted = value == nullptr ? "" : value;
     if (wanted == "full")
         return Durability::Full;
     if (wanted.empty() || wanted == "normal")
@@ -75,11 +66,11 @@ Durability DurabilityFromEnvironment()
                      "\"; it can be normal, which is the default, or full");
 }
 
-std::unique_ptr<SqliteStore> OpenStore(std::filesystem::path const& folder,
-                                       std::filesystem::path const& shippedSeed)
+std::unique_ptr<SiteStore> StoreOf(SiteName const& name, std::filesystem::path const& shippedSeed)
 {
-    auto const first = [&folder, &shippedSeed]
+    auto const first = [&folder = name.folder, &shippedSeed]
     {
+        MakePrivateFolders({folder});
         Seed const seed = SeedOfSite(folder, shippedSeed);
         SetJobFoldersAside(folder / "job");  // the jobs that they belong to are gone
         return seed.Content();
@@ -87,19 +78,14 @@ std::unique_ptr<SqliteStore> OpenStore(std::filesystem::path const& folder,
     SqliteOptions options;
     options.durability = DurabilityFromEnvironment();
     options.keepOpening = true;
-    options.setAside = [&folder](DamagedStore const& damage)
+    options.setAside = [&folder = name.folder](DamagedStore const& damage)
     {
         Report(damage.what());
         SetAside(folder / "site.db", {"-wal", "-shm", "-journal", ""});
     };
-    return std::make_unique<SqliteStore>(folder, first, std::move(options));
-}
-
-std::filesystem::path Prepared(std::filesystem::path const& folder)
-{
-    std::filesystem::path absolute = MadeAbsolute(folder);
-    MakePrivateFolders({absolute});
-    return absolute;
+    if (!name.IsDatabase())
+        MakePrivateFolders({name.folder});
+    return OpenStore(name, first, std::move(options));
 }
 
 // What cannot be put in order keeps the site from being opened: in a copy of another site $(JOB) would be
@@ -112,9 +98,17 @@ void Put(Server& server, std::string_view key, TicketValue value)
                          " cannot be corrected; see the line before, and try again");
 }
 
-// The site may have been moved, or copied from another machine.
-void KeepInstallFolder(Server& server, std::filesystem::path const& folder)
+bool IsOpenElsewhere(SiteStore& store)
 {
+    auto const programs = store.Programs();
+    return std::any_of(programs.begin(), programs.end(), [&](ProgramInfo const& program)
+                       { return program.isAlive && program.id != store.Self(); });
+}
+
+// The site may have been moved, or copied from another machine. Machines that share it must agree.
+void KeepInstallFolder(Server& server, SiteStore& store, SiteName const& name)
+{
+    std::string const folder = name.folder.string();
     std::string known;
     bool const isThere = server.Tickets().LookAt(SystemTicket, 0,
                                                  [&](TicketSnapshot const& ticket)
@@ -126,8 +120,13 @@ void KeepInstallFolder(Server& server, std::filesystem::path const& folder)
         throw StoreError(
             "the site cannot be opened: its system ticket is missing and cannot be made; see the "
             "line before, and try again");
-    if (known != folder.string())
-        Put(server, InstallFolderKey, TicketValue::String(folder.string()));
+    if (known == folder)
+        return;
+    if (name.IsDatabase() && !known.empty() && IsOpenElsewhere(store))
+        throw StoreError(folder + ": programs that have the site open have its files in " +
+                         ForMessages(known) +
+                         "; mount them there on this machine too, or end those programs first");
+    Put(server, InstallFolderKey, TicketValue::String(folder));
 }
 
 void KeepFoldersReadable(Server& server, std::filesystem::path const& site)
@@ -151,35 +150,23 @@ std::vector<std::filesystem::path> FoldersOf(Server& server, std::filesystem::pa
         std::filesystem::path const below =
             std::filesystem::path(folder.substr(Below.size())).lexically_normal();
         if (below.is_relative() && !below.empty() && *below.begin() != "..")
-            folders.push_back(MadeAbsolute(site / below));
+            folders.push_back((site / below / "").parent_path());
     }
     return folders;
 }
 
 // Whether a program that is gone may have made folders whose names a power cut takes away.
-bool MayBeUnflushed(SqliteStore const& store) { return !store.IsTidy(); }
+bool MayBeUnflushed(SiteStore const& store) { return !store.IsTidy(); }
 }  // namespace
 
-std::filesystem::path Site::Folder()
-{
-    if (std::filesystem::path const site = FromEnvironment("COMGUI_SITE"); !site.empty())
-        return MadeAbsolute(site);
-    if (std::filesystem::path const data = FromEnvironment("XDG_DATA_HOME"); data.is_absolute())
-        return MadeAbsolute(data / "comgui" / "site");
-    if (std::filesystem::path const home = FromEnvironment("HOME"); !home.empty())
-        return MadeAbsolute(home / ".local" / "share" / "comgui" / "site");
-    throw StoreError(
-        "no folder for the site: neither COMGUI_SITE nor HOME is set; set COMGUI_SITE to a folder");
-}
-
-Site::Site(std::filesystem::path const& folder, std::filesystem::path const& seedFile)
-    : m_folder(Prepared(folder)), m_store(OpenStore(m_folder, seedFile))
+Site::Site(SiteName name, std::filesystem::path const& seedFile)
+    : m_name(std::move(name)), m_store(StoreOf(m_name, seedFile))
 {
     if (MayBeUnflushed(*m_store))
-        FlushFoldersAbove(m_folder);
+        FlushFoldersAbove(folder());
     std::vector<std::filesystem::path> own;
-    for (std::string_view const name : OwnFolders)
-        own.push_back(m_folder / name);
+    for (std::string_view const each : OwnFolders)
+        own.push_back(folder() / each);
     MakePrivateFolders(own, MayBeUnflushed(*m_store));
 }
 
@@ -188,15 +175,15 @@ void Site::PutInOrder(Server& server)
     if (DurabilityFromEnvironment() == Durability::Full)
         server.Transfers().Set(PartFile::Survives::PowerCut);
     for (char const* const file : {SeedFile, SystemTicketFile})
-        RemoveLeftovers(m_folder / file);
-    KeepInstallFolder(server, m_folder);
-    KeepFoldersReadable(server, m_folder);
-    MakePrivateFolders(FoldersOf(server, m_folder), MayBeUnflushed(*m_store));
+        RemoveLeftovers(folder() / file);
+    KeepInstallFolder(server, *m_store, m_name);
+    KeepFoldersReadable(server, folder());
+    MakePrivateFolders(FoldersOf(server, folder()), MayBeUnflushed(*m_store));
     server.Tidy();
     if (!m_store->IsTidy())
     {
         SweepJobFolders(*m_store, server.Tickets(),
-                        m_folder);  // the rounds before may have had another install folder
+                        folder());  // the rounds before may have had another install folder
         m_store->NoteTidy();
     }
     server.Mirror().Write();

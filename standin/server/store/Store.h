@@ -127,6 +127,10 @@ public:
 
     // --- what holds
 
+    // Whether the store answers, as far as that is known without asking it now; one on this machine always
+    // does. Never waits.
+    virtual bool IsReachable() const noexcept { return true; }
+
     // The newest change that this handle knows of; never falls. On one machine that is the newest at all
     // that was acknowledged to anybody, but for what the bell takes in an engine whose programs share no
     // memory. One load, for any thread, at any time.

@@ -5,6 +5,7 @@
 #include <cerrno>
 #include <cstdlib>
 #include <unistd.h>
+#include <utility>
 
 namespace standin
 {
@@ -54,6 +55,27 @@ std::optional<StoredValue> FittingValue(int type, std::optional<long long> numbe
     default:
         return std::nullopt;
     }
+}
+
+void TicketAssembly::Begin(TicketAddress address)
+{
+    if (m_ticket && m_ticket->address == address)
+        return;
+    End();
+    m_ticket.emplace();
+    m_ticket->kind = TicketChange::Create;
+    m_ticket->address = address;
+}
+
+void TicketAssembly::Add(std::string_view key, int pos, StoredValue const& value)
+{
+    m_ticket->parameters.push_back({std::string(key), pos, TicketValue::FromStored(value), false});
+}
+
+void TicketAssembly::End()
+{
+    if (m_ticket)
+        m_take(*std::exchange(m_ticket, std::nullopt));
 }
 
 std::string ProgramName()

@@ -4,6 +4,7 @@
 
 #include "standin/server/store/TicketChange.h"
 #include "standin/server/tickets/StoredValue.h"
+#include <functional>
 #include <optional>
 #include <string>
 #include <string_view>
@@ -29,6 +30,22 @@ long long ColumnOf(TicketValue const& value);
 // fit the type. A database can be edited by hand. bytes live as long as theirs do.
 std::optional<StoredValue> FittingValue(int type, std::optional<long long> number,
                                         std::optional<std::string_view> bytes);
+
+// Puts tickets together from their rows, which come in the order of addresses, and hands each out as a
+// creation with all its values. A ticket without values has one row without a key.
+class TicketAssembly
+{
+public:
+    explicit TicketAssembly(std::function<void(TicketChange&&)> const& take) : m_take(take) {}
+
+    void Begin(TicketAddress address);  // also of a ticket that is begun already
+    void Add(std::string_view key, int pos, StoredValue const& value);
+    void End();
+
+private:
+    std::function<void(TicketChange&&)> const& m_take;
+    std::optional<TicketChange> m_ticket;
+};
 
 std::string ProgramName();
 std::string MachineName();

@@ -7,6 +7,7 @@
 #include <ctime>
 #include <thread>
 #include <unistd.h>
+#include <utility>
 
 namespace standin
 {
@@ -19,11 +20,7 @@ using postgres::Result;
 namespace
 {
 constexpr std::chrono::milliseconds ClosingLimit = 1s;
-
-User UserOf(Result const& rows, int row)
-{
-    return {rows.Text(row, 0), rows.Text(row, 1), rows.Int(row, 2), rows.Int(row, 3)};
-}
+constexpr std::chrono::milliseconds PauseForLock = 10ms;
 
 // The server gives a statement up before the client does, so that the connection can be kept.
 std::chrono::milliseconds OnServer(std::chrono::milliseconds limit) { return limit - limit / 10; }
@@ -43,12 +40,36 @@ PostgresStore::PostgresStore(std::string const& uri, std::function<StoreContent(
         Turn opening(*this, m_options.openingLimit);
         postgres::OpenSchema(
             opening.Connection(), m_options.schema, [&] { Fill(opening, first()); }, opening.Deadline());
+        if (!TakeLock(opening.Connection(), LockOfOpening, opening.Deadline()))
+            throw StoreError(
+                m_name + ": another program has been opening the site all the time; end that, then try again");
+        m_isOpening = true;
     }
     // Listens before it looks: what is committed after the look rings.
     m_bell = std::make_unique<postgres::Bell>(
         m_target, postgres::Bell::Limits{m_options.connectLimit, OnServer(m_options.statementLimit)},
         [this](Sequence newest) { RaiseCommitted(newest); });
     Register();
+    if (!m_options.keepOpening)
+        EndOpening();
+}
+
+// Not by waiting in the server, which would end the statement after a limit of its own.
+bool PostgresStore::TakeLock(Connection& connection, int lock, Clock::time_point deadline)
+{
+    auto const isTaken = [&]
+    {
+        return connection
+            .Run("SELECT pg_try_advisory_lock(lock_class(), $1)", Parameters() << lock, deadline)
+            .Bool(0, 0);
+    };
+    while (!isTaken())
+    {
+        if (Clock::now() + PauseForLock >= deadline)
+            return false;
+        std::this_thread::sleep_for(PauseForLock);
+    }
+    return true;
 }
 
 PostgresStore::~PostgresStore()
@@ -90,6 +111,11 @@ void PostgresStore::Fill(Turn& turn, StoreContent const& content) const
 void PostgresStore::Register()
 {
     Turn turn(*this);
+    Result const found = turn.Run(
+        "SELECT number::text, NOT EXISTS (SELECT FROM program WHERE id NOT IN (SELECT program FROM living)) "
+        "FROM site");
+    m_siteNumber = found.Text(0, 0);
+    m_isTidy = found.Bool(0, 1);
     Result const registered =
         turn.Run("SELECT self, heard, lock_class() FROM register_program($1, $2, $3, $4)",
                  Parameters() << static_cast<long long>(m_process) << std::string_view(m_machine)
@@ -98,6 +124,18 @@ void PostgresStore::Register()
     m_committed = registered.Number(0, 1);
     m_lockClass = registered.Int(0, 2);
 }
+
+// If the connection has broken meanwhile the lock is gone already, and another's may not be given up.
+void PostgresStore::EndOpening()
+{
+    std::lock_guard const lock(m_opening);
+    if (std::exchange(m_isOpening, false))
+        Turn(*this).Run("SELECT pg_advisory_unlock($1, $2)", Parameters() << m_lockClass << LockOfOpening);
+}
+
+bool PostgresStore::HasFolder() { return Turn(*this).Run("SELECT has_folder FROM site").Bool(0, 0); }
+
+void PostgresStore::NoteFolder() { Turn(*this).Run("UPDATE site SET has_folder = true"); }
 
 bool PostgresStore::IsForeign() const noexcept { return getpid() != m_process; }
 
@@ -168,11 +206,13 @@ void PostgresStore::ConnectAgain(Clock::time_point deadline)
                                                  std::min(deadline, Clock::now() + m_options.connectLimit));
         TakeLifeBack(deadline);
         ++m_connected;
+        m_isReachable = true;
         m_pause.Reset();
     }
     catch (StoreError const&)
     {
         m_working.reset();
+        m_isReachable = false;
         m_nextAttempt = Clock::now() + m_pause.Take();
         throw;
     }
@@ -231,16 +271,20 @@ PostgresStore::Load(TicketAddress address,
     if (rows.Rows() == 0)
         return std::nullopt;
     for (int row = 0; row < rows.Rows() && !rows.IsNull(row, 3); ++row)
-    {
-        auto const bytes = rows.IsNull(row, 7) ? std::nullopt : std::optional(rows.Bytes(row, 7));
-        auto const value = FittingValue(rows.Int(row, 5), rows.Integer(row, 6), bytes);
-        if (!value)
-            throw StoreError(m_name + ": a value of ticket " + std::to_string(address.type) + "/" +
-                             std::to_string(address.id) + " does not fit its type " +
-                             std::to_string(rows.Int(row, 5)) + "; bring a backup back");
-        take(rows.Bytes(row, 3), rows.Int(row, 4), *value);
-    }
+        take(rows.Bytes(row, 3), rows.Int(row, 4), ValueOf(rows, row, 5, address));
     return Loaded{{rows.Number(0, 0), rows.Number(0, 1)}, rows.Number(0, 2)};
+}
+
+// Of three columns: type, number, bytes.
+StoredValue PostgresStore::ValueOf(Result const& rows, int row, int column, TicketAddress address) const
+{
+    auto const bytes = rows.IsNull(row, column + 2) ? std::nullopt : std::optional(rows.Bytes(row, column + 2));
+    auto const value = FittingValue(rows.Int(row, column), rows.Integer(row, column + 1), bytes);
+    if (!value)
+        throw StoreError(m_name + ": a value of ticket " + std::to_string(address.type) + "/" +
+                         std::to_string(address.id) + " does not fit its type " +
+                         std::to_string(rows.Int(row, column)) + "; bring a backup back");
+    return *value;
 }
 
 // --- users
@@ -250,16 +294,21 @@ std::optional<User> PostgresStore::FindUser(std::string_view name)
     Result const rows = Turn(*this).Run("SELECT name, password_hash, role, ticket_id FROM account "
                                         "WHERE place(name) = place($1)",
                                         Parameters() << name);
-    if (rows.Rows() == 0)
-        return std::nullopt;
-    return UserOf(rows, 0);
+    auto users = UsersOf(rows);
+    return users.empty() ? std::nullopt : std::optional(std::move(users[0]));
 }
 
 std::vector<User> PostgresStore::Users()
 {
-    Result const rows =
-        Turn(*this).Run("SELECT name, password_hash, role, ticket_id FROM account ORDER BY name");
-    return rows.Each([&rows](int row) { return UserOf(rows, row); });
+    return UsersOf(Turn(*this).Run(SelectUsers));
+}
+
+std::vector<User> PostgresStore::UsersOf(Result const& rows)
+{
+    return rows.Each(
+        [&rows](int row) {
+            return User{rows.Text(row, 0), rows.Text(row, 1), rows.Int(row, 2), rows.Int(row, 3)};
+        });
 }
 
 void PostgresStore::PutUser(User const& user)

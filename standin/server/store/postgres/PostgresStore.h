@@ -13,12 +13,14 @@
 // In a child process that was made by fork every operation throws StoreError.
 #pragma once
 
+#include "standin/server/store/SiteStore.h"
 #include "standin/server/store/StoreContent.h"
 #include "standin/server/store/StoreLimits.h"
 #include "standin/server/store/postgres/Bell.h"
 #include "standin/server/store/postgres/Connection.h"
 #include <condition_variable>
 #include <functional>
+#include <limits>
 #include <map>
 #include <memory>
 #include <mutex>
@@ -34,14 +36,17 @@ struct PostgresOptions
     std::string schema = "comgui";
     std::chrono::milliseconds connectLimit{5000};
     std::chrono::milliseconds statementLimit{10'000};
-    std::chrono::milliseconds openingLimit{30'000};  // for others who make or upgrade the site
+    std::chrono::milliseconds openingLimit{30'000};  // for others who open the site
+
+    // Keeps others who open the site waiting until EndOpening.
+    bool keepOpening = false;
 
     // A program whose connection is gone is buried when it has been gone for so long.
     std::chrono::milliseconds grace{0};
     StoreLimits limits{};
 };
 
-class PostgresStore final : public Store
+class PostgresStore final : public SiteStore
 {
 public:
     // Opens the site in that database, which has to be there; uri is one of libpq's, or its keywords and
@@ -53,6 +58,14 @@ public:
     ~PostgresStore() override;
     PostgresStore(PostgresStore const&) = delete;
     PostgresStore& operator=(PostgresStore const&) = delete;
+
+    // By which the site is told from every other: a text of 36 characters, made with it.
+    std::string const& SiteNumber() const { return m_siteNumber; }
+
+    // Whether the folder of the site's files bears that number. Nobody has said so of a new site. For who
+    // opens it, while others wait.
+    bool HasFolder();
+    void NoteFolder();
 
     CommitOutcome Commit(TicketChange const& change, std::uint64_t number) override;
     std::optional<CommitOutcome> FindCommit(std::uint64_t number) override;
@@ -79,19 +92,41 @@ public:
     std::vector<User> Users() override;
     void PutUser(User const& user) override;
     bool RemoveUser(std::string_view name) override;
+    std::string Name() const override { return m_name; }
+    bool IsTidy() const noexcept override { return m_isTidy; }
+    void NoteTidy() noexcept override { m_isTidy = true; }
+    void EndOpening() override;
+    bool IsReachable() const noexcept override { return m_isReachable; }
+    std::unique_ptr<UsersTurn> TakeUsersTurn(std::chrono::milliseconds limit) override;
+    std::vector<std::string> Check(Progress const& progress) override;
+    void ReadContent(std::function<void(TicketChange&&)> const& takeTicket,
+                     std::function<void(User&&)> const& takeUser, Progress const& progress) override;
+    Sizes Measure() override;
 
 private:
+    // Advisory locks of the site beside those of its programs, which have numbers above 0, and of types, of
+    // which an id is looked for, below 0.
+    static constexpr int LockOfOpening = 0;
+    static constexpr int LockOfUsers = std::numeric_limits<int>::min();
+
+    static constexpr char const* SelectUsers =
+        "SELECT name, password_hash, role, ticket_id FROM account ORDER BY name";
+
     class Turn;    // with the working connection
     class Burial;  // the right to bury a program
 
     void Fill(Turn& turn, StoreContent const& content) const;
     void Register();
+    static bool TakeLock(postgres::Connection& connection, int lock, postgres::Clock::time_point deadline);
+    std::unique_ptr<postgres::Connection> OwnConnection() const;
     bool IsForeign() const noexcept;
     void CheckUsable() const;
     postgres::Connection& Working(postgres::Clock::time_point deadline);
     void ConnectAgain(postgres::Clock::time_point deadline);
     void TakeLifeBack(postgres::Clock::time_point deadline);
     static void Put(Turn& turn, User const& user);
+    StoredValue ValueOf(postgres::Result const& rows, int row, int column, TicketAddress address) const;
+    static std::vector<User> UsersOf(postgres::Result const& rows);
     postgres::Parameters RequestOf(TicketChange const& change, ProgramId program, std::uint64_t number) const;
     static CommitOutcome Send(Turn& turn, postgres::Parameters const& request, TicketAddress address);
     void Announce(Sequence committed);
@@ -108,7 +143,13 @@ private:
     std::string const m_machine, m_program;
     long long const m_since;
     std::string m_name;  // of the database, for messages
+    std::string m_siteNumber;
+    std::atomic<bool> m_isTidy{false};
     std::atomic<bool> m_hasLeft{false};
+    std::atomic<bool> m_isReachable{true};
+
+    std::mutex m_opening;
+    bool m_isOpening = false;
 
     // The working connection belongs to the thread that has the turn.
     std::mutex m_turns;

@@ -1,6 +1,7 @@
 #include "standin/server/store/postgres/Schema.h"
 
 #include <iterator>
+#include <thread>
 
 namespace standin::postgres
 {
@@ -15,7 +16,9 @@ namespace
 // outcome keeps, of a program that could not be reached when the journal was pruned, which of its changes
 // were committed.
 constexpr char const* Tables = R"(
-    CREATE TABLE site (version integer NOT NULL, pruned bigint NOT NULL);
+    CREATE TABLE site (
+        version integer NOT NULL, pruned bigint NOT NULL, number uuid NOT NULL DEFAULT gen_random_uuid(),
+        has_folder boolean NOT NULL DEFAULT false);
     CREATE TABLE newest (sequence bigint NOT NULL) WITH (fillfactor = 10);
     CREATE TABLE ticket (
         type integer NOT NULL, id integer NOT NULL, incarnation bigint NOT NULL, revision bigint NOT NULL,
@@ -280,6 +283,9 @@ private:
     Clock::time_point const m_deadline;
 };
 
+// Of $1.
+#define COMGUI_LOCK_OF_SCHEMA "hashtextextended('comgui ' || convert_from($1, 'UTF8'), 0)"
+
 class Opening
 {
 public:
@@ -292,8 +298,7 @@ public:
     bool Step(std::function<void()> const& fill)
     {
         Transaction transaction(m_connection, m_deadline);
-        Run("SELECT pg_advisory_xact_lock(hashtextextended('comgui ' || convert_from($1, 'UTF8'), 0))",
-            Parameters() << std::string_view(m_schema));
+        Run("SELECT pg_advisory_xact_lock(" COMGUI_LOCK_OF_SCHEMA ")", Parameters() << std::string_view(m_schema));
         int const version = FoundVersion();
         if (version == Version)
             return true;
@@ -352,6 +357,21 @@ private:
     Clock::time_point const m_deadline;
 };
 }  // namespace
+
+bool KeepFromOpening(Connection& connection, std::string const& schema, Clock::time_point deadline)
+{
+    constexpr std::chrono::milliseconds Pause(10);
+    while (!connection
+                .Run("SELECT pg_try_advisory_lock(" COMGUI_LOCK_OF_SCHEMA ")",
+                     Parameters() << std::string_view(schema), deadline + Pause)
+                .Bool(0, 0))
+    {
+        if (Clock::now() >= deadline)
+            return false;
+        std::this_thread::sleep_for(Pause);
+    }
+    return true;
+}
 
 void OpenSchema(Connection& connection, std::string const& schema, std::function<void()> const& fill,
                 Clock::time_point deadline)

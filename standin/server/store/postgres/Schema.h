@@ -15,6 +15,10 @@ enum class CommitAnswer : int
     NoFreeId = 2,
 };
 
+// Keeps every other program from opening the site in that schema, until the connection goes. False if one has
+// been doing so all the time.
+bool KeepFromOpening(Connection& connection, std::string const& schema, Clock::time_point deadline);
+
 // Makes the schema if there is none, or it is empty, and fills it then, and brings an older one up to this
 // version: one program at a time, each step in one transaction. Throws StoreError, and changes nothing, if
 // the schema is somebody else's or of a newer version. What fill throws passes through, and the site stays

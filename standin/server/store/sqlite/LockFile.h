@@ -28,6 +28,7 @@ public:
     static constexpr off_t Opening = 1;  // exclusive for who opens or is the last to leave
     static constexpr off_t Site = 2;     // shared for who has the site open: who gets it exclusively is alone
     static constexpr off_t Turn = 3;     // exclusive for who writes, where there is no better means
+    static constexpr off_t Users = 4;    // exclusive for who changes users, see SiteStore
     static off_t Life(std::int64_t program) { return 1000 + program; }  // exclusive while alive
     static off_t Burial(std::int64_t program)
     {

@@ -1,5 +1,6 @@
 // What an owner's tools ask of the store. On connections of their own, so that nobody waits for them.
-#include "standin/server/store/ChangeRecord.h"
+#include "standin/server/store/Inspection.h"
+#include "standin/server/store/StoreRows.h"
 #include "standin/server/store/sqlite/Schema.h"
 #include "standin/server/store/sqlite/SqliteStore.h"
 #include <sqlite3.h>
@@ -8,48 +9,31 @@ namespace standin
 {
 namespace
 {
-constexpr std::size_t MostProblems = 100;
 constexpr int ReportEvery = 4096;  // rows
 constexpr int CopiedAtOnce = 256;  // pages
 
-std::string NameOf(int type, int id) { return "ticket " + std::to_string(type) + "/" + std::to_string(id); }
-
-class Inspection
+class SqliteInspection
 {
 public:
-    Inspection(Database& database, SqliteStore::Progress const& progress)
-        : m_database(database), m_progress(progress), m_moment(database, Database::Transaction::Read),
-          m_tickets(database.Number("SELECT count(*) FROM ticket")),
-          m_parameters(database.Number("SELECT count(*) FROM parameter")),
-          m_records(database.Number("SELECT count(*) FROM journal")),
-          m_pages(database.Number("PRAGMA page_count"))
+    SqliteInspection(Database& database, SqliteStore::Progress const& progress)
+        : m_database(database), m_moment(database, Database::Transaction::Read),
+          m_pages(database.Number("PRAGMA page_count")),
+          m_inspection(progress, m_pages + database.Number("SELECT (SELECT count(*) FROM ticket) + "
+                                                           "(SELECT count(*) FROM parameter) + "
+                                                           "(SELECT count(*) FROM journal)"))
     {
     }
 
     std::vector<std::string> Problems()
     {
-        Advance(0);
         LookAtPages();
         LookAtTickets();
         LookAtParameters();
         LookAtJournal();
-        return std::move(m_problems);
+        return std::move(m_inspection).Problems();
     }
 
 private:
-    void Add(std::string problem)
-    {
-        if (m_problems.size() < MostProblems)
-            m_problems.push_back(std::move(problem));
-    }
-
-    void Advance(long long done)
-    {
-        m_done += done;
-        if (m_progress)
-            m_progress(m_done, m_pages + m_tickets + m_parameters + m_records);
-    }
-
     // Steps through the rows and tells the progress now and then.
     void ForEachRow(char const* sql, std::function<void(Database::Run const&)> const& look)
     {
@@ -60,9 +44,9 @@ private:
         {
             look(run);
             if (seen == ReportEvery)
-                Advance(std::exchange(seen, 0));
+                m_inspection.Advance(std::exchange(seen, 0));
         }
-        Advance(seen);
+        m_inspection.Advance(seen);
     }
 
     void LookAtPages()
@@ -71,8 +55,8 @@ private:
         Database::Run run(m_database, statement);
         while (run.Step())
             if (run.Bytes(0) != "ok")
-                Add(run.Text(0));
-        Advance(m_pages);
+                m_inspection.Add(run.Text(0));
+        m_inspection.Advance(m_pages);
     }
 
     void LookAtTickets()
@@ -80,16 +64,9 @@ private:
         auto const last = static_cast<Sequence>(m_database.Number(schema::SelectLastSequence));
         ForEachRow("SELECT type, id, incarnation, revision, "
                    "owner = 0 OR EXISTS (SELECT 1 FROM program WHERE program.id = owner) FROM ticket",
-                   [this, last](Database::Run const& row)
-                   {
-                       std::string const name = NameOf(row.Int(0), row.Int(1));
-                       if (!IsValid({row.Int(0), row.Int(1)}))
-                           Add(name + ": no ticket can have this address");
-                       if (row.Number(2) < 1 || row.Number(2) > row.Number(3) || row.Number(3) > last)
-                           Add(name + ": made by change " + std::to_string(row.Number(2)) +
-                               " and changed by " + std::to_string(row.Number(3)) + ", which cannot be");
-                       if (row.Int(4) == 0)
-                           Add(name + ": belongs to a program that nobody knows");
+                   [this, last](Database::Run const& row) {
+                       m_inspection.LookAtTicket({row.Int(0), row.Int(1)}, {row.Number(2), row.Number(3)},
+                                                 last, row.Int(4) != 0);
                    });
     }
 
@@ -99,13 +76,8 @@ private:
                    "EXISTS (SELECT 1 FROM ticket WHERE type = ticket_type AND id = ticket_id) FROM parameter",
                    [this](Database::Run const& row)
                    {
-                       std::string const name = NameOf(row.Int(0), row.Int(1));
-                       if (!schema::FittingValueOf(row, 2))
-                           Add(name + ": a value does not fit its type " + std::to_string(row.Int(2)));
-                       if (row.Int(4) < 0)
-                           Add(name + ": a value at position " + std::to_string(row.Int(4)));
-                       if (row.Int(5) == 0)
-                           Add(name + ": has values but is no ticket");
+                       m_inspection.LookAtParameter({row.Int(0), row.Int(1)}, row.Int(4), row.Int(2),
+                                                    schema::FittingValueOf(row, 2), row.Int(5) != 0);
                    });
     }
 
@@ -116,28 +88,15 @@ private:
         ForEachRow("SELECT sequence, kind, type, id, record FROM journal ORDER BY sequence",
                    [this, &expected](Database::Run const& row)
                    {
-                       Sequence const found = row.Number(0);
-                       if (found != expected)
-                           Add("journal: record " + std::to_string(found) + " where " +
-                               std::to_string(expected) + " is due");
-                       expected = found + 1;
-                       try
-                       {
-                           ReadChangeRecord(row.Int(1), {row.Int(2), row.Int(3)}, row.Bytes(4));
-                       }
-                       catch (StoreError const& error)
-                       {
-                           Add("journal: record " + std::to_string(found) + ": " + error.what());
-                       }
+                       m_inspection.LookAtRecord(row.Number(0), expected, row.Int(1),
+                                                 {row.Int(2), row.Int(3)}, row.Bytes(4));
                    });
     }
 
     Database& m_database;
-    SqliteStore::Progress const& m_progress;
     Database::Transaction m_moment;
-    long long const m_tickets, m_parameters, m_records, m_pages;
-    long long m_done = 0;
-    std::vector<std::string> m_problems;
+    long long const m_pages;
+    Inspection m_inspection;
 };
 
 struct FinishBackup
@@ -192,7 +151,7 @@ std::vector<std::string> SqliteStore::Check(Progress const& progress)
     CheckUsable();
     Database database(m_file, false);
     database.ReportDamageTo([this] { m_page->NoteDamage(); });
-    auto problems = Inspection(database, progress).Problems();
+    auto problems = SqliteInspection(database, progress).Problems();
     if (!problems.empty())
         m_page->NoteDamage();
     return problems;
@@ -218,6 +177,33 @@ void SqliteStore::BackupTo(std::filesystem::path const& file, Progress const& pr
             std::filesystem::remove(file.string() + suffix, ignored);
         throw;
     }
+}
+
+void SqliteStore::ReadContent(std::function<void(TicketChange&&)> const& takeTicket,
+                              std::function<void(User&&)> const& takeUser, Progress const& progress)
+{
+    CheckUsable();
+    Database database(m_file, false);
+    database.ReportDamageTo([this] { m_page->NoteDamage(); });
+    Database::Transaction const moment(database, Database::Transaction::Read);
+    long long const total = database.Number("SELECT count(*) FROM parameter");
+    Database::Statement const rows = database.Prepare(
+        "SELECT t.type, t.id, p.key, p.pos, p.value_type, p.value FROM ticket t "
+        "LEFT JOIN parameter p ON p.ticket_type = t.type AND p.ticket_id = t.id "
+        "WHERE t.owner = 0 ORDER BY t.type, t.id, p.key, p.pos");
+    Database::Run run(database, rows);
+    TicketAssembly tickets(takeTicket);
+    for (long long done = 0; run.Step(); ++done)
+    {
+        tickets.Begin({run.Int(0), run.Int(1)});
+        if (run.IsInteger(3))
+            tickets.Add(run.Bytes(2), run.Int(3), schema::ValueOf(database, run, 4));
+        if (progress && done % ReportEvery == 0)
+            progress(done, total);
+    }
+    tickets.End();
+    for (User& user : UsersIn(database))
+        takeUser(std::move(user));
 }
 
 SqliteStore::Sizes SqliteStore::Measure()

@@ -214,6 +214,19 @@ void SqliteStore::EndOpening()
         m_lock->Unlock(LockFile::Opening);
 }
 
+std::unique_ptr<SiteStore::UsersTurn> SqliteStore::TakeUsersTurn(std::chrono::milliseconds limit)
+{
+    struct Turn : UsersTurn
+    {
+        explicit Turn(std::filesystem::path const& folder) : lock(folder) {}
+
+        LockFile lock;
+    };
+    CheckUsable();
+    auto turn = std::make_unique<Turn>(m_folder);
+    return turn->lock.LockWithin(LockFile::Users, LockFile::Hold::Exclusive, limit) ? std::move(turn) : nullptr;
+}
+
 // The note of the database as it is, if it is all in one file.
 bool SqliteStore::MayHaveNote(SharedPage::ClosingNote& note) const
 {
@@ -317,7 +330,11 @@ std::optional<User> SqliteStore::FindUser(std::string_view name)
 std::vector<User> SqliteStore::Users()
 {
     auto const lock = Lock(m_reading);
-    Database& database = m_reader->database;
+    return UsersIn(m_reader->database);
+}
+
+std::vector<User> SqliteStore::UsersIn(Database& database)
+{
     std::vector<User> users;
     Database::Statement const list =
         database.Prepare("SELECT name, password_hash, role, ticket_id FROM user ORDER BY name");

@@ -11,6 +11,7 @@
 #pragma once
 
 #include "standin/server/files/DatabaseFiles.h"
+#include "standin/server/store/SiteStore.h"
 #include "standin/server/store/StoreContent.h"
 #include "standin/server/store/StoreLimits.h"
 #include "standin/server/store/sqlite/Database.h"
@@ -52,7 +53,7 @@ struct SqliteOptions
     StoreLimits limits{};
 };
 
-class SqliteStore final : public Store
+class SqliteStore final : public SiteStore
 {
 public:
     // Opens the site in that folder, which has to be there. first is asked for the content of a new one,
@@ -73,15 +74,6 @@ public:
 
     // Whether the last that had it open before has left in order. Of use to the first only.
     bool EndedInOrder() const { return m_endedInOrder; }
-
-    // Whether what belongs to the site and not to the store is in order: everybody has left in order since
-    // somebody said so. It may not have been, and not be now, while the first program is one that does not
-    // care.
-    bool IsTidy() const noexcept { return m_page->IsTidy(); }
-    void NoteTidy() noexcept { m_page->NoteTidy(); }
-
-    // With keepOpening: lets others open the site. May be called always.
-    void EndOpening();
 
     CommitOutcome Commit(TicketChange const& change, std::uint64_t number) override;
     std::optional<CommitOutcome> FindCommit(std::uint64_t number) override;
@@ -108,29 +100,21 @@ public:
     std::vector<User> Users() override;
     void PutUser(User const& user) override;
     bool RemoveUser(std::string_view name) override;
+    std::string Name() const override { return m_folder.string(); }
+    bool IsTidy() const noexcept override { return m_page->IsTidy(); }
+    void NoteTidy() noexcept override { m_page->NoteTidy(); }
+    void EndOpening() override;
+    std::unique_ptr<UsersTurn> TakeUsersTurn(std::chrono::milliseconds limit) override;
 
-    // --- for tools of the owner, while programs work on the site
-
-    // done of total, in a unit of its own.
-    using Progress = std::function<void(long long done, long long total)>;
-
-    // Looks at every page and every row, as of one moment, and returns a line for each problem, but for at
-    // most a hundred. Takes about two seconds for 300 MB.
-    std::vector<std::string> Check(Progress const& progress);
+    // Looks at every page, too. Takes about two seconds for 300 MB.
+    std::vector<std::string> Check(Progress const& progress) override;
+    void ReadContent(std::function<void(TicketChange&&)> const& takeTicket,
+                     std::function<void(User&&)> const& takeUser, Progress const& progress) override;
+    Sizes Measure() override;
 
     // Copies the database, as of one moment, into a new file that is a whole site.db. Throws StoreError, and
     // leaves no file, if there is one of that name already or it cannot be written.
     void BackupTo(std::filesystem::path const& file, Progress const& progress);
-
-    struct Sizes
-    {
-        long long tickets = 0;
-        long long users = 0;
-        long long records = 0;        // of the journal
-        long long databaseBytes = 0;  // of site.db
-        long long walBytes = 0;       // of site.db-wal
-    };
-    Sizes Measure();
 
 private:
     struct Writer;  // the connection for changes, with its statements
@@ -163,6 +147,7 @@ private:
     bool BuryOne(ProgramId program, std::function<void(Estate const&)> const& clear);
     long long Change(char const* sql, long long parameter);
     void Put(User const& user);
+    static std::vector<User> UsersIn(Database& database);
 
     std::filesystem::path const m_folder;
     std::filesystem::path const m_file;

@@ -1,0 +1,241 @@
+// What a PostgreSQL store has beside what every lasting store has, for who opens it as a site and for tools.
+#include "standin/server/store/postgres/PostgresReplacement.h"
+
+#include "tests/store/PostgresSite.h"
+#include "tests/store/SiteStoreContract.h"
+#include <future>
+#include <gmock/gmock.h>
+
+using namespace standin;
+using namespace std::chrono_literals;
+using testing::ContainsRegex;
+using testing::ElementsAre;
+using testing::HasSubstr;
+using testing::IsEmpty;
+using testing::Not;
+using Old = PostgresReplacement::Old;
+
+namespace
+{
+class SiteInASchema : public LastingSite
+{
+public:
+    std::unique_ptr<SiteStore> Open(bool keepOpening) override
+    {
+        PostgresOptions options;
+        options.keepOpening = keepOpening;
+        return m_schema.Open(options);
+    }
+
+private:
+    PostgresSchema m_schema;
+};
+
+std::unique_ptr<LastingSite> MakeSite() { return std::make_unique<SiteInASchema>(); }
+
+using PostgresOpening = PostgresSite;
+using PostgresFolder = PostgresSite;
+
+class PostgresCheck : public PostgresSite
+{
+protected:
+    PostgresCheck() { writer.Put(Job, "Key", 0, 1); }
+
+    std::vector<std::string> Problems() const { return store->Check({}); }
+
+    std::unique_ptr<PostgresStore> const store = schema.OpenAs(
+        schema.cluster.Uri(), [] { return OneTicket(Job, "Text", 1); }, {});
+    Writer writer{*store};
+};
+
+class PostgresReplacing : public PostgresSite
+{
+protected:
+    PostgresReplacing() { options.schema = schema.Name(); }
+    ~PostgresReplacing() override
+    {
+        std::string const aside = schema.cluster.Run(
+            "SELECT string_agg(nspname, ', ') FROM pg_namespace WHERE nspname LIKE '" + schema.Name() + "\\_%'");
+        if (!aside.empty())
+            schema.cluster.Run("DROP SCHEMA " + aside + " CASCADE");
+    }
+
+    std::unique_ptr<PostgresReplacement> Begin(Old old) const
+    {
+        return std::make_unique<PostgresReplacement>(schema.cluster.Uri(), old, options);
+    }
+    std::string ReasonOfBeginning(Old old) const
+    {
+        return ReasonOf([&] { Begin(old); });
+    }
+    void MakeSiteWith(int value) const
+    {
+        schema.OpenAs(schema.cluster.Uri(), [=] { return OneTicket(Job, "Key", value); }, {})->Leave();
+    }
+    int Value() const
+    {
+        auto const store = schema.Open();
+        StoreValues const values = ValuesOf(*store, Job);
+        store->Leave();
+        return values.empty() ? -1 : static_cast<int>(values.begin()->second.value.integer);
+    }
+    bool HasLeftovers() const
+    {
+        return schema.cluster.Run("SELECT count(*) FROM pg_namespace WHERE nspname = '" + schema.Name() +
+                                  "_new'") != "0";
+    }
+
+    PostgresOptions options;
+};
+}  // namespace
+
+INSTANTIATE_TEST_SUITE_P(Postgres, SiteStoreContract, testing::Values(LASTING_ENGINE{"Schema", MakeSite}),
+                         testing::PrintToStringParamName());
+
+TEST_F(PostgresOpening, ThatIsKept_EndsWithTheConnection_AndIsNotTakenFromTheNext)
+{
+    PostgresOptions keeping;
+    keeping.keepOpening = true;
+    auto const first = schema.Open(keeping);
+    ASSERT_TRUE(Terminate(*first));
+    auto const second = schema.Open(keeping);
+    first->EndOpening();
+    auto third = std::async(std::launch::async, [this] { return schema.Open(); });
+    EXPECT_EQ(third.wait_for(100ms), std::future_status::timeout);
+    second->EndOpening();
+    EXPECT_NE(third.get(), nullptr);
+}
+
+TEST_F(PostgresOpening, ThatOthersKeepTooLong_IsGivenUp)
+{
+    PostgresOptions keeping;
+    keeping.keepOpening = true;
+    auto const first = schema.Open(keeping);
+    PostgresOptions impatient;
+    impatient.openingLimit = 200ms;
+    EXPECT_THAT(ReasonOf([&] { schema.Open(impatient); }),
+                HasSubstr("another program has been opening the site all the time; end that, then try again"));
+}
+
+TEST_F(PostgresFolder, NumberOfTheSite_IsTheSameForAll_AndNoOthers)
+{
+    auto const store = schema.Open();
+    auto const other = schema.Open();
+    PostgresSchema const elsewhere;
+    EXPECT_EQ(store->SiteNumber().size(), 36u);
+    EXPECT_EQ(other->SiteNumber(), store->SiteNumber());
+    EXPECT_NE(elsewhere.Open()->SiteNumber(), store->SiteNumber());
+}
+
+TEST_F(PostgresFolder, IsThereOnceSomebodyHasSaidSo)
+{
+    auto const store = schema.Open();
+    EXPECT_FALSE(store->HasFolder());
+    store->NoteFolder();
+    EXPECT_TRUE(store->HasFolder());
+    EXPECT_TRUE(schema.Open()->HasFolder());
+}
+
+TEST_F(PostgresCheck, FindsWhatSomebodyHasEditedByHand)
+{
+    EXPECT_THAT(Problems(), IsEmpty());
+    schema.Run("INSERT INTO S.ticket VALUES (3, 5, 9, 8, 77)");
+    schema.Run("INSERT INTO S.parameter VALUES (3, 9, 'Key', -4, 999, 0, NULL)");
+    schema.Run("UPDATE S.journal SET sequence = 12, record = 'nonsense'");
+    EXPECT_THAT(Problems(),
+                ElementsAre("ticket 3/5: made by change 9 and changed by 8, which cannot be",
+                            "ticket 3/5: belongs to a program that nobody knows",
+                            "ticket 3/9: a value does not fit its type 999",
+                            "ticket 3/9: a value at position -4", "ticket 3/9: has values but is no ticket",
+                            "journal: record 12 where 2 is due", HasSubstr("journal: record 12: ")));
+}
+
+TEST_F(PostgresCheck, ListsAHundredProblemsAtMost)
+{
+    schema.Run("INSERT INTO S.parameter SELECT 3, 9, 'Key', n, 999, 0, NULL FROM generate_series(0, 300) n");
+    EXPECT_EQ(Problems().size(), 100u);
+}
+
+TEST_F(PostgresReplacing, ASiteThatIsThere_IsRefusedUnlessItMayBeSetAside)
+{
+    MakeSiteWith(1);
+    EXPECT_THAT(ReasonOfBeginning(Old::Forbidden),
+                HasSubstr("there is a site already; name another database"));
+    EXPECT_EQ(ReasonOfBeginning(Old::SetAside), "");
+    EXPECT_EQ(Value(), 1);
+}
+
+TEST_F(PostgresReplacing, Finished_IsTheSite)
+{
+    auto const replacement = Begin(Old::Forbidden);
+    Writer(replacement->Store()).Do(Creation(Job).Put("Key", 0, 2));
+    replacement->Store().PutUser({"anna", "$y$", 16, 1});
+    EXPECT_EQ(replacement->Finish(), "");
+    EXPECT_FALSE(HasLeftovers());
+    EXPECT_EQ(Value(), 2);
+    EXPECT_TRUE(schema.Open()->FindUser("anna"));
+}
+
+TEST_F(PostgresReplacing, Finished_SetsTheOldOneAsideAndHasItsNumberAndFolder)
+{
+    MakeSiteWith(1);
+    std::string number;
+    {
+        auto const store = schema.Open();
+        store->NoteFolder();
+        number = store->SiteNumber();
+        store->Leave();
+    }
+    auto const replacement = Begin(Old::SetAside);
+    Writer(replacement->Store()).Do(Creation(Job).Put("Key", 0, 2));
+    std::string const aside = replacement->Finish();
+    EXPECT_THAT(aside, ContainsRegex("^" + schema.Name() + "_replaced_[0-9]{8}_[0-9]{6}_[0-9]{6}$"));
+    EXPECT_EQ(Value(), 2);
+    EXPECT_EQ(schema.cluster.Run("SELECT number FROM " + aside + ".parameter"), "1");
+    auto const store = schema.Open();
+    EXPECT_EQ(store->SiteNumber(), number);
+    EXPECT_TRUE(store->HasFolder());
+}
+
+TEST_F(PostgresReplacing, NotFinished_LeavesTheOldOneAndNothingElse)
+{
+    MakeSiteWith(1);
+    {
+        auto const replacement = Begin(Old::SetAside);
+        Writer(replacement->Store()).Do(Creation(Job).Put("Key", 0, 2));
+    }
+    EXPECT_FALSE(HasLeftovers());
+    EXPECT_EQ(Value(), 1);
+}
+
+TEST_F(PostgresReplacing, AfterAKill_BeginsAnew)
+{
+    schema.cluster.Run("CREATE SCHEMA " + schema.Name() + "_new");
+    schema.cluster.Run("CREATE TABLE " + schema.Name() + "_new.site (rest integer)");
+    auto const replacement = Begin(Old::Forbidden);
+    Writer(replacement->Store()).Do(Creation(Job).Put("Key", 0, 2));
+    replacement->Finish();
+    EXPECT_EQ(Value(), 2);
+}
+
+TEST_F(PostgresReplacing, OfASiteThatIsOpen_IsRefusedWithTheNameOfWhoHasIt)
+{
+    MakeSiteWith(1);
+    auto const open = schema.Open();
+    EXPECT_THAT(ReasonOfBeginning(Old::SetAside),
+                ContainsRegex("in use by [^ ]*postgres_store[^ ]* \\(process " + std::to_string(getpid()) +
+                              " on [^)]+\\); end what has it open, then try again"));
+}
+
+TEST_F(PostgresReplacing, KeepsOthersFromOpening)
+{
+    MakeSiteWith(1);
+    auto replacement = Begin(Old::SetAside);
+    EXPECT_THAT(ReasonOfBeginning(Old::SetAside), HasSubstr("another program is opening or replacing the site"));
+    auto opening = std::async(std::launch::async, [this] { return Value(); });
+    EXPECT_EQ(opening.wait_for(200ms), std::future_status::timeout);
+    Writer(replacement->Store()).Do(Creation(Job).Put("Key", 0, 2));
+    replacement->Finish();
+    replacement.reset();
+    EXPECT_EQ(opening.get(), 2);
+}
