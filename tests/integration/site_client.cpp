@@ -5,6 +5,7 @@
 //
 // Values are whole numbers. TICKET is TYPE/ID.
 #include "tests/support/SiteClient.h"
+#include "tests/support/TestSite.h"
 
 #include <chrono>
 #include <cstring>
@@ -129,6 +130,8 @@ public:
         auto const command = Commands().find(words.Text());
         if (command == Commands().end())
             throw std::invalid_argument("no such command");
+        if (m_isLoggedIn && AreSitesInDatabases())
+            HearWhatOthersHaveDone();
         return (this->*command->second)(words);
     }
 
@@ -143,7 +146,22 @@ private:
         return value ? std::to_string(*value) : "none";
     }
 
-    std::string LogIn(Words&) { return std::to_string(m_client.LogIn()); }
+    std::string LogIn(Words&)
+    {
+        int const code = m_client.LogIn();
+        m_isLoggedIn = code == 0;
+        return std::to_string(code);
+    }
+
+    // In a folder everybody sees at once what was acknowledged to anybody. In a database that takes a moment;
+    // but whoever has written something has heard of everything before it.
+    void HearWhatOthersHaveDone()
+    {
+        constexpr int OwnType = 89;
+        TicketName const own{OwnType, static_cast<int>(getpid())};
+        m_client.Create(own);
+        m_client.Set(own, "Commands", ++m_commands);
+    }
 
     std::string Get(Words& words)
     {
@@ -303,6 +321,8 @@ private:
         return std::to_string(SiteClient::PutFile(source, words.Text(), SiteClient::Sync::Later));
     }
 
+    bool m_isLoggedIn = false;
+    std::int64_t m_commands = 0;
     SiteClient m_client;
     STICKET_ACCESS const* m_open = nullptr;
     bool m_isListening = false;

@@ -8,6 +8,7 @@
 #include "tests/support/ChildProcess.h"
 #include "tests/support/Files.h"
 #include "tests/support/FullDisk.h"
+#include "tests/support/TestSite.h"
 #include <cstring>
 #include <fcntl.h>
 #include <gmock/gmock.h>
@@ -453,6 +454,8 @@ bool HasLocks(fs::path const& database)
 class SitesOwnFiles : public TransferTest
 {
 protected:
+    void SetUp() override { COMGUI_SKIP_IN_DATABASE("its folder has no database"); }
+
     // By their names, and by others that a client may give them.
     std::vector<fs::path> Names() const
     {

@@ -9,4 +9,14 @@ bool IsForkedChild() noexcept;
 
 // Called in the child by the handler of fork.
 void NoteForkedChild() noexcept;
+
+// While one lives, a site is open: a child that is made by fork is noted.
+class ForkWatch
+{
+public:
+    ForkWatch();
+    ~ForkWatch();
+    ForkWatch(ForkWatch const&) = delete;
+    ForkWatch& operator=(ForkWatch const&) = delete;
+};
 }  // namespace standin

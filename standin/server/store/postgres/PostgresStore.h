@@ -13,6 +13,7 @@
 // In a child process that was made by fork every operation throws StoreError.
 #pragma once
 
+#include "standin/server/files/ForkedChild.h"
 #include "standin/server/store/SiteStore.h"
 #include "standin/server/store/StoreContent.h"
 #include "standin/server/store/StoreLimits.h"
@@ -135,6 +136,7 @@ private:
     bool BuryOne(ProgramId program, std::function<void(Estate const&)> const& clear);
     bool TakeEstate(Estate& estate);
 
+    ForkWatch const m_forks;
     postgres::Target const m_target;
     PostgresOptions const m_options;
     long const m_process;  // that has opened it
