@@ -1,8 +1,8 @@
 // What the tests of comgui_site need beside it: a site to look after, another program that has it open, and a
 // person at a terminal.
 //
-//     site_helper make FOLDER SEED          makes a site, as the first program that opens it does
-//     site_helper hold FOLDER               has it open with one session; says "open", leaves at the end of
+//     site_helper make SITE SEED            makes a site, as the first program that opens it does
+//     site_helper hold SITE                 has it open with one session; says "open", leaves at the end of
 //     input site_helper fits FOLDER USER PASSWORD  succeeds if that is the user's password site_helper put
 //     FOLDER TYPE ID KEY BYTES  writes a text of whatever bytes, escaped as \xNN site_helper terminal
 //     [ANSWER]... -- PROGRAM [ARGUMENT]...
@@ -12,8 +12,8 @@
 //         that the terminal showed, then "echo on" or "echo off" as the program left it, and ends as the
 //         program did, with 128 more than the number of a signal.
 #include "standin/server/sessions/Password.h"
+#include "standin/server/site/OpenStore.h"
 #include "standin/server/site/Seed.h"
-#include "standin/server/store/sqlite/SqliteStore.h"
 #include "tools/comgui_site/TicketCommits.h"
 #include <algorithm>
 #include <csignal>
@@ -37,15 +37,16 @@ standin::StoreContent NoContent() { throw std::runtime_error("there is no site")
 
 int Make(Words const& words)
 {
-    std::filesystem::create_directories(words.at(0));
-    standin::SqliteStore store(words[0], [&] { return standin::Seed::Read(words.at(1)).Content(); });
-    store.Leave();
+    auto const name = standin::SiteName::Of(words.at(0));
+    std::filesystem::create_directories(name.folder);
+    OpenStore(name, [&] { return standin::Seed::Read(words.at(1)).Content(); })->Leave();
     return 0;
 }
 
 int Hold(Words const& words)
 {
-    standin::SqliteStore store(words.at(0), NoContent);
+    auto const opened = OpenStore(standin::SiteName::Of(words.at(0)), NoContent);
+    standin::SiteStore& store = *opened;
     store.OpenSession("admin");
     std::cout << "open" << std::endl;
     std::string line;
@@ -57,7 +58,8 @@ int Hold(Words const& words)
 
 int Fits(Words const& words)
 {
-    standin::SqliteStore store(words.at(0), NoContent);
+    auto const opened = OpenStore(standin::SiteName::Of(words.at(0)), NoContent);
+    standin::SiteStore& store = *opened;
     auto const user = store.FindUser(words.at(1));
     store.Leave();
     return user && standin::Password::Verify(words.at(2), user->passwordHash) ? 0 : 1;
@@ -77,7 +79,8 @@ std::string Unescaped(std::string const& text)
 
 int Put(Words const& words)
 {
-    standin::SqliteStore store(words.at(0), NoContent);
+    auto const opened = OpenStore(standin::SiteName::Of(words.at(0)), NoContent);
+    standin::SiteStore& store = *opened;
     std::string const bytes = Unescaped(words.at(4));
     standin::StoredValue value;
     value.type = PARAM_STRING;

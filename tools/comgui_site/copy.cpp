@@ -101,7 +101,7 @@ private:
              entry != std::filesystem::recursive_directory_iterator(); ++entry)
         {
             if (!IsOfPlace(*entry, entry.depth()))
-                action(*entry, m_to / std::filesystem::relative(entry->path(), m_from));
+                action(*entry, m_to / entry->path().lexically_relative(m_from));
             else if (entry->is_directory())
                 entry.disable_recursion_pending();
         }
@@ -140,6 +140,7 @@ void Compare(OpenedSite& source, NewDatabase& target)
 }  // namespace
 
 Copied CopySite(standin::SiteName const& from, standin::SiteName const& to)
+try
 {
     OpenedSite source(from, OpenedSite::Others::Wait);
     CheckIsAlone(source);
@@ -162,5 +163,9 @@ Copied CopySite(standin::SiteName const& from, standin::SiteName const& to)
     target->Finish();
     source.Leave();
     return copied;
+}
+catch (std::filesystem::filesystem_error const& error)
+{
+    throw standin::FileError(standin::FileFault(error.path1(), "cannot be copied", error.code().value()));
 }
 }  // namespace comgui_site
