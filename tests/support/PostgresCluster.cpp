@@ -14,6 +14,7 @@
 #include <sstream>
 #include <stdexcept>
 #include <sys/prctl.h>
+#include <sys/shm.h>
 #include <sys/wait.h>
 #include <thread>
 #include <unistd.h>
@@ -74,7 +75,7 @@ int ExitOf(pid_t child)
 
 std::string Program(char const* name) { return std::string(COMGUI_POSTGRESQL_PROGRAMS) + "/" + name; }
 
-// The watchdog's life: until the other end of the lifeline is closed, or the server has ended by itself.
+// The watchdog's life: until the other end of the lifeline is written to or closed.
 [[noreturn]] void WatchOver(pid_t server, int lifeline, fs::path const& folder)
 {
     char byte = 0;
@@ -108,7 +109,31 @@ PostgresCluster& PostgresCluster::Instance()
     return cluster;
 }
 
-PostgresCluster::PostgresCluster()
+PostgresCluster::PostgresCluster() : PostgresCluster(nullptr) {}
+
+PostgresCluster::PostgresCluster(PostgresCluster const* primary)
+{
+    MakeFolder();
+    std::string const data = (m_folder / "data").string();
+    if (primary == nullptr)
+        Make({Program("initdb"), "--no-sync", "--auth=trust", "--username=postgres", "--encoding=UTF8",
+              "--locale=C", "--pgdata=" + data});
+    else
+        Make({Program("pg_basebackup"), "--no-sync", "--checkpoint=fast", "--write-recovery-conf",
+              "--dbname=" + primary->Uri(), "--pgdata=" + data});
+    Start();
+    AwaitAnswer();
+}
+
+PostgresCluster::~PostgresCluster()
+{
+    // A later cluster's watchdog has a copy of this end, so that it takes a word to end before that.
+    [[maybe_unused]] ssize_t const ignored = write(m_lifeline, "", 1);
+    close(m_lifeline);
+    ExitOf(m_watchdog);
+}
+
+void PostgresCluster::MakeFolder()
 {
     std::string name = (fs::canonical(fs::temp_directory_path()) / "comgui-postgres-XXXXXX").string();
     if (mkdtemp(name.data()) == nullptr)
@@ -117,23 +142,12 @@ PostgresCluster::PostgresCluster()
     if (passwd const* const user = UnprivilegedUser())
         if (chown(name.c_str(), user->pw_uid, user->pw_gid) != 0)
             throw std::runtime_error("cannot give " + name + " to " + user->pw_name);
-    Make();
-    Start();
-    AwaitAnswer();
 }
 
-PostgresCluster::~PostgresCluster()
+void PostgresCluster::Make(std::vector<std::string> const& command)
 {
-    close(m_lifeline);
-    ExitOf(m_watchdog);
-}
-
-void PostgresCluster::Make()
-{
-    if (ExitOf(StartAs({Program("initdb"), "--no-sync", "--auth=trust", "--username=postgres",
-                        "--encoding=UTF8", "--locale=C", "--pgdata=" + (m_folder / "data").string()},
-                       m_folder / "log")) != 0)
-        Fail("initdb");
+    if (ExitOf(StartAs(command, m_folder / "log")) != 0)
+        Fail(command[0]);
 }
 
 void PostgresCluster::Start()
@@ -215,4 +229,37 @@ void PostgresCluster::Continue()
     for (pid_t const process : m_stopped)
         kill(process, SIGCONT);
     m_stopped.clear();
+}
+
+std::unique_ptr<PostgresCluster> PostgresCluster::MakeStandby() const
+{
+    std::unique_ptr<PostgresCluster> standby(new PostgresCluster(this));
+    Await("SELECT state FROM pg_stat_replication", "streaming");
+    Run("ALTER SYSTEM SET synchronous_standby_names = '*'");
+    Run("SELECT pg_reload_conf()");
+    Await("SELECT sync_state FROM pg_stat_replication", "sync");
+    return standby;
+}
+
+void PostgresCluster::Kill()
+{
+    // Its seventh line names a piece of shared memory that a killed server leaves to its next start.
+    std::istringstream lines(ContentOf(m_folder / "data/postmaster.pid"));
+    std::string line;
+    for (int i = 0; i < 7; ++i)
+        std::getline(lines, line);
+    Stop();
+    for (pid_t const process : m_stopped)
+        kill(process, SIGKILL);
+    m_stopped.clear();
+    std::istringstream numbers(line);
+    int memory = -1;
+    if (unsigned long key = 0; numbers >> key >> memory)
+        shmctl(memory, IPC_RMID, nullptr);
+}
+
+void PostgresCluster::Promote() const
+{
+    if (Run("SELECT pg_promote()") != "t")
+        Fail("a promoted standby");
 }

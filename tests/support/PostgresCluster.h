@@ -1,7 +1,6 @@
 // A PostgreSQL server of the test program's own: a cluster in a temporary folder, reached by a socket in it
-// and by no port, so that any number of them run side by side. It is made at the first use, and gone with the
-// test program, however that ends: a process beside it waits for the end, stops the server and removes the
-// folder.
+// and by no port, so that any number of them run side by side. It is gone with the object, or with the test
+// program, however that ends: a process beside it waits for the end, stops the server and removes the folder.
 //
 // Not for a power cut: it does not wait for the disk.
 #pragma once
@@ -30,9 +29,12 @@ private:
 class PostgresCluster
 {
 public:
-    // Throws std::runtime_error, with the server's own words, if it cannot be started.
+    // That of all tests which do it no harm. Made at the first use.
     static PostgresCluster& Instance();
 
+    // Throws std::runtime_error, with the server's own words, if it cannot be started.
+    PostgresCluster();
+    ~PostgresCluster();
     PostgresCluster(PostgresCluster const&) = delete;
     PostgresCluster& operator=(PostgresCluster const&) = delete;
 
@@ -53,13 +55,23 @@ public:
     void Stop();
     void Continue();
 
+    // A server that follows this one and can be read. From then on this one acknowledges only what that one
+    // has, too.
+    std::unique_ptr<PostgresCluster> MakeStandby() const;
+
+    // Ends the server with all its processes at one instant, for good.
+    void Kill();
+
+    // Makes a primary of a standby, which needs nobody else then.
+    void Promote() const;
+
     std::filesystem::path const& Folder() const { return m_folder; }
 
 private:
-    PostgresCluster();
-    ~PostgresCluster();
+    explicit PostgresCluster(PostgresCluster const* primary);
 
-    void Make();
+    void MakeFolder();
+    void Make(std::vector<std::string> const& command);
     void Start();
     void AwaitAnswer() const;
     [[noreturn]] void Fail(std::string const& what) const;
