@@ -2,10 +2,12 @@
 
 #include <algorithm>
 #include <cerrno>
+#include <fcntl.h>
 #include <libpq-fe.h>
 #include <poll.h>
 #include <system_error>
 #include <tuple>
+#include <unistd.h>
 #include <utility>
 
 namespace standin::postgres
@@ -82,7 +84,8 @@ char const* RemedyOf(std::string_view code)
         {"53200", "give the server more memory, then try again"},
         {"53300", "raise max_connections, or end other programs"},
         {"42501", "grant this user what the schema's owner may do"},
-        {"25006", "connect to the primary server: add target_session_attrs=read-write"},
+        {"25006", "connect to the primary server: name it too, or promote this one"},
+        {"57P03", "wait until the server is up, or promote its standby"},
         {"57014", "see in pg_stat_activity who keeps it waiting, then try again"},
         {"40", "try again"},
         {"54", "keep a value below 1 GB"},
@@ -104,25 +107,64 @@ struct FreeOptions
 using Options = std::unique_ptr<PQconninfoOption, FreeOptions>;
 
 // libpq's own reason could repeat the text, with the password in it.
-void CheckUri(std::string const& uri)
+Options Parsed(std::string const& uri)
 {
     char* reason = nullptr;
-    Options const options(PQconninfoParse(uri.c_str(), &reason));
+    Options options(PQconninfoParse(uri.c_str(), &reason));
     PQfreemem(reason);
     if (!options)
         throw BrokenConnection("the name of the database cannot be read; write it as "
                                "postgresql://user@host/database");
+    return options;
 }
 
-std::string DatabaseOf(PGconn* connection)
+std::map<std::string, std::string> ValuesOf(Options const& options)
 {
-    std::map<std::string_view, std::string> values;
-    Options const options(PQconninfo(connection));
+    std::map<std::string, std::string> values;
     for (PQconninfoOption const* option = options.get(); option && option->keyword; ++option)
         if (option->val)
             values[option->keyword] = option->val;
+    return values;
+}
+
+std::vector<std::string> Split(std::string const& list)
+{
+    std::vector<std::string> parts(1);
+    for (char const letter : list)
+        if (letter == ',')
+            parts.emplace_back();
+        else
+            parts.back() += letter;
+    return parts;
+}
+
+// hosts: empty if they are libpq's choice.
+std::string DatabaseOf(PGconn* connection, std::string const& hosts)
+{
+    auto values = ValuesOf(Options(PQconninfo(connection)));
     std::string const host = PQhost(connection) && *PQhost(connection) ? PQhost(connection) : values["host"];
-    return "database " + values["dbname"] + " at " + host + ":" + values["port"] + " as " + values["user"];
+    return "database " + values["dbname"] + " at " + (hosts.empty() ? host + ":" + values["port"] : hosts) +
+           " as " + values["user"];
+}
+
+// The SQLSTATE of a server that has not let a connection in, which libpq gives in a verbose text alone:
+// "FATAL:  53300: sorry, ...". Takes it out of the text, and what follows about the server's source; empty
+// if the server has not said anything.
+std::string TakeCode(std::string& text)
+{
+    static constexpr char Mark[] = ":  ";
+    for (auto at = text.find(Mark); at != text.npos; at = text.find(Mark, at + 1))
+    {
+        std::string const code = text.substr(at + 3, 5);
+        bool const isCode =
+            code.size() == 5 && code.find_first_not_of("0123456789ABCDEFGHIJKLMNOPQRSTUVWXYZ") == code.npos;
+        if (!isCode || text.compare(at + 8, 2, ": ") != 0)
+            continue;
+        text.erase(at + 3, 7);
+        text.resize(std::min(text.find('\n', at), text.size()));
+        return code;
+    }
+    return {};
 }
 }  // namespace
 
@@ -217,58 +259,164 @@ long long Result::Changes() const
 
 void Connection::Close::operator()(pg_conn* connection) const noexcept { PQfinish(connection); }
 
-Connection::Connection(Target const& target, std::chrono::milliseconds statementLimit,
-                       Clock::time_point deadline)
+Hurry::Hurry()
 {
-    CheckUri(target.uri);
-    Connect(target, deadline);
-    SetUp(target, statementLimit, deadline);
+    int ends[2];
+    if (pipe2(ends, O_CLOEXEC | O_NONBLOCK) != 0)
+        throw StoreError("cannot make a pipe (" + std::generic_category().message(errno) +
+                         "); close some files, then try again");
+    m_begun = Descriptor(ends[0]);
+    m_beginning = Descriptor(ends[1]);
+}
+
+void Hurry::Begin() noexcept { [[maybe_unused]] ssize_t const ignored = write(m_beginning.Number(), "", 1); }
+
+// What is a host's own; nothing for libpq's choice.
+struct Connection::Host
+{
+    std::string name, address, port;
+
+    std::string Place() const { return (name.empty() ? address : name) + ":" + port; }
+};
+
+Connection::Connection(Target const& target, std::chrono::milliseconds statementLimit,
+                       Clock::time_point deadline, Hurry const* hurry)
+    : m_hurry(hurry)
+{
+    Open(target, statementLimit, deadline);
 }
 
 Connection::~Connection() = default;
 
-void Connection::Connect(Target const& target, Clock::time_point deadline)
+// libpq tries several hosts, too, but would wait for the first silent one until the end. What it is to leave
+// out of a list cannot be said to it, so lists with gaps are its own.
+std::vector<Connection::Host> Connection::HostsOf(std::string const& uri)
 {
-    // What stands before the URI is a default for it. A network that swallows packets is noticed in some
-    // twenty seconds, also by a connection that only listens.
-    char const* const keywords[] = {
-        "keepalives_idle", "keepalives_interval",       "keepalives_count", "tcp_user_timeout",
-        "dbname",          "fallback_application_name", "client_encoding",  nullptr};
-    char const* const values[] = {"5", "5", "3", "20000", target.uri.c_str(), "comgui", "UTF8", nullptr};
+    auto values = ValuesOf(Parsed(uri));
+    bool const isElsewhere = values.contains("service") && !values.contains("host");
+    values.merge(ValuesOf(Options(PQconndefaults())));
+    auto const names = Split(values["host"]), addresses = Split(values["hostaddr"]);
+    auto const ports = Split(values["port"]);
+    std::size_t const count = std::max(names.size(), addresses.size());
+    std::vector<Host> hosts;
+    auto const part = [&](std::vector<std::string> const& list, std::size_t i) {
+        return list.size() == 1 ? list[0] : i < list.size() ? list[i] : "";
+    };
+    for (std::size_t i = 0; i < count && !isElsewhere; ++i)
+        hosts.push_back({part(names, i), part(addresses, i), part(ports, i)});
+    bool const isWhole = std::all_of(hosts.begin(), hosts.end(),
+                                     [&](Host const& host)
+                                     {
+                                         return (names.size() == 1 || !host.name.empty()) &&
+                                                (addresses.size() == 1 || !host.address.empty()) &&
+                                                !host.port.empty();
+                                     });
+    return count > 1 && isWhole && !isElsewhere ? hosts : std::vector<Host>(1);
+}
+
+void Connection::Open(Target const& target, std::chrono::milliseconds statementLimit,
+                      Clock::time_point deadline)
+{
+    std::vector<Host> const hosts = HostsOf(target.uri);
+    std::string places, reasons, remedy;
+    for (Host const& host : hosts)
+        places += hosts.size() == 1 ? "" : (places.empty() ? "" : ",") + host.Place();
+    bool isRefused = false;
+    for (std::size_t i = 0; i < hosts.size(); ++i)
+    {
+        auto const now = Clock::now();
+        auto const end = now + (deadline - now) / static_cast<int>(hosts.size() - i);
+        try
+        {
+            Connect(target, hosts[i], places, end);
+            SetUp(target, statementLimit, end);
+            return;
+        }
+        catch (BrokenConnection const& error)
+        {
+            if (hosts.size() == 1)
+                throw;
+            reasons += (reasons.empty() ? "" : ", ") + hosts[i].Place() + ": " + m_reason;
+            if (!isRefused)
+                remedy = m_remedy;
+            isRefused = isRefused || error.IsRefusal();
+        }
+    }
+    FailAsBroken(reasons, remedy, isRefused);
+}
+
+void Connection::Connect(Target const& target, Host const& host, std::string const& places,
+                         Clock::time_point deadline)
+{
+    // What stands before the URI is a default for it, and what stands behind it goes before it. A network
+    // that swallows packets is noticed in some twenty seconds, also by a connection that only listens.
+    char const* const keywords[] = {"keepalives_idle",
+                                    "keepalives_interval",
+                                    "keepalives_count",
+                                    "tcp_user_timeout",
+                                    "dbname",
+                                    "host",
+                                    "hostaddr",
+                                    "port",
+                                    "fallback_application_name",
+                                    "client_encoding",
+                                    nullptr};
+    char const* const values[] = {"5",
+                                  "5",
+                                  "3",
+                                  "20000",
+                                  target.uri.c_str(),
+                                  host.name.c_str(),
+                                  host.address.c_str(),
+                                  host.port.c_str(),
+                                  "comgui",
+                                  "UTF8",
+                                  nullptr};
+    m_isConnected = m_isBroken = false;
+    m_prepared.clear();
     m_connection.reset(PQconnectStartParams(keywords, values, 1));
     if (!m_connection)
         throw BrokenConnection("no memory for a connection; end other programs, then try again");
     PQsetNoticeReceiver(
         m_connection.get(), [](void*, PGresult const*) {}, nullptr);  // not to stderr
-    m_name = DatabaseOf(m_connection.get());
+    PQsetErrorVerbosity(m_connection.get(), PQERRORS_VERBOSE);
+    m_name = DatabaseOf(m_connection.get(), places);
     if (PQstatus(m_connection.get()) == CONNECTION_BAD)
-        FailAsBroken();
+        FailAsUnconnected();
     for (PostgresPollingStatusType state = PGRES_POLLING_WRITING; state != PGRES_POLLING_OK;
          state = PQconnectPoll(m_connection.get()))
     {
         if (state == PGRES_POLLING_FAILED)
-            FailAsBroken();
+            FailAsUnconnected();
         Wait(state == PGRES_POLLING_READING ? POLLIN : POLLOUT, deadline);
     }
     m_isConnected = true;
+    PQsetErrorVerbosity(m_connection.get(), PQERRORS_DEFAULT);
     if (PQsetnonblocking(m_connection.get(), 1) != 0)
         FailAsBroken();
 }
 
 // The schema alone is searched beside PostgreSQL's own, so that nobody's table gets between. A transaction
 // sees what others have committed meanwhile, whatever the database's default is: commits rely on that. The
-// server, too, is to notice soon when the other machine is gone: the program's death shows by that.
+// server, too, is to notice soon when the other machine is gone: the program's death shows by that. A server
+// that does not let it write is of no use, whatever the URI asks for.
 void Connection::SetUp(Target const& target, std::chrono::milliseconds statementLimit,
                        Clock::time_point deadline)
 {
     std::string const limit = std::to_string(statementLimit.count());
-    Run("SELECT set_config('search_path', quote_ident(convert_from($1, 'UTF8')) || ', pg_temp', false), "
+    Result const row = Run(
+        "SELECT pg_is_in_recovery(), current_setting('transaction_read_only')::boolean, "
+        "set_config('search_path', quote_ident(convert_from($1, 'UTF8')) || ', pg_temp', false), "
         "set_config('statement_timeout', convert_from($2, 'UTF8'), false), "
         "set_config('default_transaction_isolation', 'read committed', false), "
         "set_config('tcp_keepalives_idle', '5', false), set_config('tcp_keepalives_interval', '5', false), "
         "set_config('tcp_keepalives_count', '3', false), set_config('tcp_user_timeout', '20000', false), "
         "set_config('client_min_messages', 'error', false)",
         Parameters() << std::string_view(target.schema) << std::string_view(limit), deadline);
+    if (row.Bool(0, 1))
+        FailAsBroken(row.Bool(0, 0) ? "the server is a standby, which cannot be written to"
+                                    : "the server lets this user only read",
+                     RemedyOf("25006"));
 }
 
 Result Connection::Run(char const* sql, Parameters const& parameters, Clock::time_point deadline)
@@ -358,19 +506,43 @@ std::string Connection::Quoted(std::string const& name) const
 
 void Connection::Abandon() noexcept { std::ignore = m_connection.release(); }
 
+void Connection::OnSilence(std::chrono::milliseconds time, std::function<void()> report)
+{
+    m_silence = time;
+    m_reportSilence = std::move(report);
+}
+
 void Connection::Wait(short events, Clock::time_point deadline)
+{
+    auto const silent = m_reportSilence ? Clock::now() + m_silence : deadline;
+    if (WaitUntil(std::min(silent, deadline), events))
+        return;
+    if (silent < deadline)
+    {
+        m_reportSilence();
+        if (WaitUntil(deadline, events))
+            return;
+    }
+    FailAsBroken("has not answered in time", LostRemedy);
+}
+
+bool Connection::WaitUntil(Clock::time_point end, short events)
 {
     for (;;)
     {
-        auto const left = std::chrono::ceil<std::chrono::milliseconds>(deadline - Clock::now());
-        pollfd waiting{Socket(), events, 0};
-        int const ready = poll(&waiting, 1, static_cast<int>(std::max<std::int64_t>(left.count(), 0)));
-        if (ready > 0)
-            return;
-        if (ready == 0)
-            FailAsBroken("has not answered in time", LostRemedy);
-        if (errno != EINTR)
+        bool const isHurried = !m_hurry || m_lastMoment != Clock::time_point::max();
+        auto const left =
+            std::chrono::ceil<std::chrono::milliseconds>(std::min(end, m_lastMoment) - Clock::now());
+        pollfd waiting[] = {{Socket(), events, 0}, {isHurried ? -1 : m_hurry->Begun(), POLLIN, 0}};
+        int const ready = poll(waiting, 2, static_cast<int>(std::max<std::int64_t>(left.count(), 0)));
+        if (ready < 0 && errno != EINTR)
             FailAsBroken(std::generic_category().message(errno), LostRemedy);
+        if (ready == 0)
+            return false;
+        if (ready > 0 && waiting[0].revents != 0)
+            return true;
+        if (ready > 0)
+            m_lastMoment = Clock::now() + Hurry::Limit;
     }
 }
 
@@ -429,20 +601,26 @@ void Connection::Check(pg_result const* result)
         m_name + ": " + OneLine(reason == nullptr ? "no reason" : reason) + "; " + RemedyOf(code), code);
 }
 
-void Connection::FailAsBroken()
+void Connection::FailAsBroken() { FailAsBroken(OneLine(PQerrorMessage(m_connection.get())), LostRemedy); }
+
+void Connection::FailAsUnconnected()
 {
-    char const* const remedy = m_isConnected ? LostRemedy
-                               : PQconnectionNeedsPassword(m_connection.get())
-                                   ? "name a password, best in a "
-                                     "password file"
+    std::string text = PQerrorMessage(m_connection.get());
+    std::string const code = TakeCode(text);
+    char const* const remedy = PQconnectionNeedsPassword(m_connection.get())
+                                   ? "name a password, best in a password file"
+                               : code.starts_with("53") || code == "57P03"
+                                   ? RemedyOf(code)
                                    : "check that the server runs there, and that host, database, user and "
                                      "password are right";
-    FailAsBroken(OneLine(PQerrorMessage(m_connection.get())), remedy);
+    FailAsBroken(OneLine(text.c_str()), remedy, !code.empty() && !EndsConnection(code));
 }
 
-void Connection::FailAsBroken(std::string const& reason, char const* remedy)
+void Connection::FailAsBroken(std::string const& reason, std::string const& remedy, bool isRefusal)
 {
     m_isBroken = true;
-    throw BrokenConnection(m_name + ": " + reason + "; " + remedy);
+    m_reason = reason;
+    m_remedy = remedy;
+    throw BrokenConnection(m_name + ": " + reason + "; " + remedy, isRefusal);
 }
 }  // namespace standin::postgres

@@ -7,11 +7,13 @@
 // several statements could still be moved.
 #pragma once
 
+#include "standin/server/files/Descriptor.h"
 #include "standin/server/store/Store.h"
 #include <array>
 #include <chrono>
 #include <concepts>
 #include <cstdint>
+#include <functional>
 #include <map>
 #include <memory>
 #include <string>
@@ -30,7 +32,16 @@ using Clock = std::chrono::steady_clock;
 class BrokenConnection : public StoreError
 {
 public:
-    using StoreError::StoreError;
+    explicit BrokenConnection(std::string const& line, bool isRefusal = false)
+        : StoreError(line), m_isRefusal(isRefusal)
+    {
+    }
+
+    // The server works, but has a reason not to let this program in.
+    bool IsRefusal() const { return m_isRefusal; }
+
+private:
+    bool m_isRefusal;
 };
 
 // The server has refused a statement, which has had no effect. The connection is sound.
@@ -127,13 +138,31 @@ struct Target
     std::string schema;  // in which the site is
 };
 
+// Lets a thread that is about to end cut short what connections wait for in other threads.
+class Hurry
+{
+public:
+    static constexpr std::chrono::milliseconds Limit{300};
+
+    Hurry();  // throws StoreError
+
+    // From now on no wait takes longer than the limit. Once and for all.
+    void Begin() noexcept;
+    int Begun() const { return m_begun.Number(); }  // readable from then on
+
+private:
+    Descriptor m_beginning, m_begun;
+};
+
 class Connection
 {
 public:
-    // Connects; statements find what they name in the schema, and the server ends one that takes longer than
-    // statementLimit. Throws BrokenConnection, at the deadline at the latest, but for the time that the
-    // system takes to look up the name of a host.
-    Connection(Target const& target, std::chrono::milliseconds statementLimit, Clock::time_point deadline);
+    // Connects to the first of the hosts that lets it write; each gets its share of the time. Statements find
+    // what they name in the schema, and the server ends one that takes longer than statementLimit. Throws
+    // BrokenConnection, at the deadline at the latest, but for the time that the system takes to look up the
+    // name of a host. hurry lives longer.
+    Connection(Target const& target, std::chrono::milliseconds statementLimit, Clock::time_point deadline,
+               Hurry const* hurry = nullptr);
     ~Connection();
     Connection(Connection const&) = delete;
     Connection& operator=(Connection const&) = delete;
@@ -144,6 +173,9 @@ public:
 
     // Statements without parameters or results.
     void Execute(std::string const& sql, Clock::time_point deadline);
+
+    // report is called when the server has been silent for so long while it is waited for; the wait goes on.
+    void OnSilence(std::chrono::milliseconds time, std::function<void()> report);
 
     // Whether the server has not ended it, as far as it has said so. For a connection that only works.
     bool IsSound();
@@ -167,25 +199,37 @@ public:
     void Abandon() noexcept;
 
 private:
+    struct Host;
     struct Close
     {
         void operator()(pg_conn* connection) const noexcept;
     };
 
-    void Connect(Target const& target, Clock::time_point deadline);
+    static std::vector<Host> HostsOf(std::string const& uri);
+    void Open(Target const& target, std::chrono::milliseconds statementLimit, Clock::time_point deadline);
+    void Connect(Target const& target, Host const& host, std::string const& places,
+                 Clock::time_point deadline);
     void SetUp(Target const& target, std::chrono::milliseconds statementLimit, Clock::time_point deadline);
     void Wait(short events, Clock::time_point deadline);
+    bool WaitUntil(Clock::time_point end, short events);
     void Flush(Clock::time_point deadline);
     Result Finish(Clock::time_point deadline);
     std::string const& Prepared(char const* sql, Parameters const& parameters, Clock::time_point deadline);
     void MustSend(int isSent);
     void Check(pg_result const* result);
-    [[noreturn]] void FailAsBroken(std::string const& reason, char const* remedy);
+    [[noreturn]] void FailAsBroken(std::string const& reason, std::string const& remedy,
+                                   bool isRefusal = false);
+    [[noreturn]] void FailAsUnconnected();
     [[noreturn]] void FailAsBroken();
 
+    Hurry const* const m_hurry;
+    Clock::time_point m_lastMoment = Clock::time_point::max();  // once there is hurry
+    std::chrono::milliseconds m_silence{};
+    std::function<void()> m_reportSilence;  // null: nobody asks for it
     std::unique_ptr<pg_conn, Close> m_connection;
     std::string m_name;
-    bool m_isConnected = false;  // once
+    std::string m_reason, m_remedy;  // of a failure
+    bool m_isConnected = false;      // once
     bool m_isBroken = false;
     std::map<char const*, std::string> m_prepared;
 };
