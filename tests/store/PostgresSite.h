@@ -4,9 +4,19 @@
 #include "standin/server/store/postgres/PostgresStore.h"
 #include "tests/store/StoreContract.h"
 #include "tests/support/PostgresCluster.h"
+#include <chrono>
 #include <gtest/gtest.h>
 #include <memory>
 #include <string>
+#include <thread>
+
+// Of a program that buries others at once, and comes back after a break only when it is called.
+inline standin::PostgresOptions AtOnce()
+{
+    standin::PostgresOptions options;
+    options.pulse = std::chrono::hours(1);
+    return options;
+}
 
 class PostgresSchema
 {
@@ -18,14 +28,14 @@ public:
 
     std::string const& Name() const { return m_name; }
 
-    std::unique_ptr<standin::PostgresStore> Open(standin::PostgresOptions const& options = {}) const
+    std::unique_ptr<standin::PostgresStore> Open(standin::PostgresOptions const& options = AtOnce()) const
     {
         return OpenAs(cluster.Uri(), NoContent, options);
     }
 
     std::unique_ptr<standin::PostgresStore> OpenAs(std::string const& uri,
                                                    std::function<standin::StoreContent()> const& first,
-                                                   standin::PostgresOptions options = {}) const
+                                                   standin::PostgresOptions options = AtOnce()) const
     {
         options.schema = m_name;
         return std::make_unique<standin::PostgresStore>(uri, first, options);
@@ -50,6 +60,24 @@ private:
 
     std::string const m_name;
 };
+
+// What a call throws that takes no time; empty if it throws nothing.
+inline std::string ReasonAtOnce(std::function<void()> const& call)
+{
+    auto const start = std::chrono::steady_clock::now();
+    std::string const reason = ReasonOf(call);
+    EXPECT_LT(std::chrono::steady_clock::now() - start, std::chrono::milliseconds(250)) << reason;
+    return reason;
+}
+
+inline void AwaitReach(standin::PostgresStore const& store, bool isReachable)
+{
+    auto const start = std::chrono::steady_clock::now();
+    while (store.IsReachable() != isReachable &&
+           std::chrono::steady_clock::now() - start < std::chrono::seconds(6))
+        std::this_thread::sleep_for(std::chrono::milliseconds(1));
+    EXPECT_EQ(store.IsReachable(), isReachable);
+}
 
 class PostgresSite : public testing::Test
 {

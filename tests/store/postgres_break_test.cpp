@@ -21,7 +21,7 @@ void LeaveAlone(Estate const&) {}
 
 PostgresOptions Impatient()
 {
-    PostgresOptions options;
+    PostgresOptions options = AtOnce();
     options.connectLimit = 300ms;
     options.statementLimit = 500ms;
     return options;
@@ -216,7 +216,7 @@ TEST_F(PostgresBreak, OutcomeOfACommit_IsFoundThoughTheJournalWasPrunedMeanwhile
 {
     StoreLimits limits;
     limits.journalKept = 0;
-    PostgresOptions options;
+    PostgresOptions options = AtOnce();
     options.limits = limits;
     auto const third = schema.Open(options);
     writer.Make(Job);
@@ -344,6 +344,14 @@ TEST_F(PostgresDeath, OfAConnection_LeavesTheProgramToBeBuried_AndItGoesOnUnderI
     EXPECT_TRUE(other->Programs()[0].isAlive);
 }
 
+TEST_F(PostgresDeath, OfAConnection_IsMendedByItself)
+{
+    auto const idle = schema.Open(PostgresOptions());
+    Terminate(*idle);
+    schema.cluster.Await("SELECT count(*) FROM " + LocksOf(*idle), "1");
+    EXPECT_EQ(other->Bury([](Estate const&) { ADD_FAILURE(); }), 0);
+}
+
 TEST_F(PostgresDeath, OfAConnectionThatIsBack_BuriesNobody)
 {
     store->OpenSession("admin");
@@ -354,7 +362,7 @@ TEST_F(PostgresDeath, OfAConnectionThatIsBack_BuriesNobody)
 
 TEST_F(PostgresDeath, WithinTheGrace_IsNoReasonToBury)
 {
-    PostgresOptions options;
+    PostgresOptions options = AtOnce();
     options.grace = 1h;
     auto const patient = schema.Open(options);
     Terminate(*store);

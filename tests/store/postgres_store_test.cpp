@@ -24,7 +24,7 @@ public:
 
 private:
     PostgresSchema m_schema;
-    PostgresOptions m_options;
+    PostgresOptions m_options = AtOnce();
 };
 
 std::unique_ptr<StoreSite> MakeSite(StoreLimits const& limits)

@@ -13,13 +13,19 @@ namespace
 {
 using namespace std::chrono_literals;
 
-constexpr std::chrono::milliseconds LastRingLimit = 500ms;
-constexpr std::chrono::milliseconds Forever = 24h;
 constexpr std::chrono::milliseconds RingDistance = 2ms;  // a ring costs as much as a small change
+
+// The server is asked so long after its last answer, lost if it is silent for so long, and the connection is
+// given up later, since it may go on.
+constexpr std::chrono::milliseconds QuestionDistance = 1s;
+constexpr std::chrono::milliseconds Silence = 2s;
+
+// A server that refuses connections while it starts again need not be noticed.
+constexpr std::chrono::milliseconds Patience = 300ms;
 }  // namespace
 
-Bell::Bell(Target target, Limits const& limits, std::function<void(Sequence)> heard)
-    : m_target(std::move(target)), m_limits(limits), m_heard(std::move(heard))
+Bell::Bell(Target target, Limits const& limits, Calls calls, Reach& reach, Hurry& hurry)
+    : m_target(std::move(target)), m_limits(limits), m_calls(std::move(calls)), m_reach(reach), m_hurry(hurry)
 {
     int ends[2];
     if (pipe2(ends, O_CLOEXEC | O_NONBLOCK) != 0)
@@ -27,13 +33,14 @@ Bell::Bell(Target target, Limits const& limits, std::function<void(Sequence)> he
                          "); close some files, then try again");
     m_wokenEnd = Descriptor(ends[0]);
     m_wakingEnd = Descriptor(ends[1]);
-    Listen();
+    Listen(m_limits.connect);
     m_thread = std::thread([this] { Run(); });
 }
 
 Bell::~Bell()
 {
     m_isOver = true;
+    m_hurry.Begin();
     Wake();
     if (m_thread.joinable())
         m_thread.join();
@@ -59,54 +66,99 @@ void Bell::Abandon() noexcept
 void Bell::Wake() noexcept { [[maybe_unused]] ssize_t const ignored = write(m_wakingEnd.Number(), "", 1); }
 
 // A ring must not wait for the disk: nothing is lost with it.
-void Bell::Listen()
+void Bell::Listen(std::chrono::milliseconds limit)
 {
-    m_connection =
-        std::make_unique<Connection>(m_target, m_limits.statement, Clock::now() + m_limits.connect);
+    m_connection = std::make_unique<Connection>(m_target, m_limits.statement, Clock::now() + limit, &m_hurry);
     m_connection->Execute("SET synchronous_commit = off; LISTEN " + m_connection->Quoted(m_target.schema),
-                          Clock::now() + m_limits.statement);
+                          Clock::now() + limit);
+    m_connection->OnSilence(Silence,
+                            [this]
+                            {
+                                m_reach.NoteLoss(m_connection->Name() + ": the server does not answer; " +
+                                                 "check the server and the network");
+                                m_calls.look();
+                            });
+    m_lastAnswer = Clock::now();
 }
 
 void Bell::Run() noexcept
 {
-    GrowingPause pause;
     while (!m_isOver)
     {
         try
         {
             if (!m_connection)
-            {
-                Listen();
-                m_heard(
-                    m_connection->Run("SELECT sequence FROM newest", {}, Clock::now() + m_limits.statement)
-                        .Number(0, 0));
-            }
-            pause.Reset();
+                ListenAgain();
+            m_pause.Reset();
+            m_brokenSince.reset();
             Serve();
         }
-        catch (std::exception const&)
+        catch (std::exception const& failure)
         {
-            // The working connection reports what is wrong; this one goes on until it can listen again.
-            m_connection.reset();
-            if (m_toRing > m_rung)
-                m_isAsked = true;
-            for (auto const end = Clock::now() + pause.Take(); !m_isOver && Clock::now() < end;)
-                Hear(end);
+            NoteBreak(failure);
+            PauseAfterBreak();
         }
     }
+}
+
+void Bell::ListenAgain()
+{
+    Listen(m_reach.IsThere() ? std::min(m_limits.connect, Silence) : m_limits.connect);
+    m_calls.heard(
+        m_connection->Run("SELECT sequence FROM newest", {}, Clock::now() + m_limits.statement).Number(0, 0));
+    m_reach.NoteReturn();
+    m_calls.look();
+}
+
+// It goes on until it can listen again. A server that refuses this connection alone is there.
+void Bell::NoteBreak(std::exception const& failure)
+{
+    m_connection.reset();
+    m_brokenSince = m_brokenSince.value_or(Clock::now());
+    if (m_toRing > m_rung)
+        m_isAsked = true;
+    auto const* const broken = dynamic_cast<BrokenConnection const*>(&failure);
+    if (broken == nullptr || broken->IsRefusal())
+        m_reach.NoteAnswer();
+    else if (Clock::now() - *m_brokenSince > Patience)
+        m_reach.NoteLoss(failure.what());
+}
+
+void Bell::PauseAfterBreak()
+{
+    for (auto const end = Clock::now() + m_pause.Take(); !m_isOver && Clock::now() < end;)
+        Hear(end);
+    m_calls.look();
 }
 
 void Bell::Serve()
 {
     while (!m_isOver)
     {
+        auto const now = Clock::now();
         bool const isAsked = m_isAsked;
-        if (isAsked && Clock::now() >= m_nextRing)
-            SendRing(m_limits.statement);
+        if (isAsked && now >= m_nextRing)
+            SendRing();
+        else if (now >= m_lastAnswer + QuestionDistance)
+            Ask("SELECT", {});
+        else if (now >= m_nextLook)
+        {
+            m_calls.look();
+            m_nextLook = now + m_limits.pulse;
+        }
         else
-            Hear(isAsked ? m_nextRing : Clock::now() + Forever);
+            Hear(std::min({isAsked ? m_nextRing : Clock::time_point::max(), m_lastAnswer + QuestionDistance,
+                           m_nextLook}));
     }
-    SendRing(LastRingLimit);
+    SendRing();
+}
+
+void Bell::Ask(char const* sql, Parameters const& parameters)
+{
+    m_connection->Run(sql, parameters, Clock::now() + m_limits.connect);
+    m_lastAnswer = Clock::now();
+    m_reach.NoteAnswer();
+    HearRings();
 }
 
 // Until something has happened or the time is over.
@@ -137,10 +189,10 @@ void Bell::HearRings()
             newest = std::max(newest, rung);
     }
     if (newest != 0)
-        m_heard(newest);
+        m_calls.heard(newest);
 }
 
-void Bell::SendRing(std::chrono::milliseconds limit)
+void Bell::SendRing()
 {
     m_isAsked = false;  // before the look: who raises the number after it asks anew
     Sequence const newest = m_toRing;
@@ -148,10 +200,8 @@ void Bell::SendRing(std::chrono::milliseconds limit)
         return;
     m_nextRing = Clock::now() + RingDistance;
     std::string const payload = std::to_string(newest);
-    m_connection->Run("SELECT pg_notify(convert_from($1, 'UTF8'), convert_from($2, 'UTF8'))",
-                      Parameters() << std::string_view(m_target.schema) << std::string_view(payload),
-                      Clock::now() + limit);
+    Ask("SELECT pg_notify(convert_from($1, 'UTF8'), convert_from($2, 'UTF8'))",
+        Parameters() << std::string_view(m_target.schema) << std::string_view(payload));
     m_rung = newest;
-    HearRings();
 }
 }  // namespace standin::postgres

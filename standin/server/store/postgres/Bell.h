@@ -2,15 +2,19 @@
 // and hears. A ring is a notification with the number of the newest change; the journal is the truth.
 //
 // PostgreSQL commits one notification at a time in the whole cluster, so the changes do not carry them: a
-// ring keeps a distance from the one before, and the changes committed meanwhile share it. For any thread.
+// ring keeps a distance from the one before, and the changes committed meanwhile share it.
+//
+// As this connection is always there, it shows whether the server is: what it does not answer for two
+// seconds, a ring or else a question a second, or connecting again, is noted as a loss. For any thread.
 #pragma once
 
 #include "standin/server/files/Descriptor.h"
 #include "standin/server/store/postgres/Connection.h"
+#include "standin/server/store/postgres/Reach.h"
 #include <atomic>
 #include <functional>
 #include <memory>
-#include <mutex>
+#include <optional>
 #include <thread>
 
 namespace standin::postgres
@@ -29,7 +33,7 @@ public:
 
 private:
     static constexpr std::chrono::milliseconds Shortest{50};
-    static constexpr std::chrono::milliseconds Longest{2000};
+    static constexpr std::chrono::milliseconds Longest{1000};
 
     std::chrono::milliseconds m_next = Shortest;
 };
@@ -41,12 +45,23 @@ public:
     {
         std::chrono::milliseconds connect;
         std::chrono::milliseconds statement;
+        std::chrono::milliseconds pulse;
     };
 
-    // Listens when this returns. heard is called by the bell's thread with the number of a change that was
-    // committed; also after a break, when there may have been rings that nobody has heard. Throws StoreError.
-    Bell(Target target, Limits const& limits, std::function<void(Sequence)> heard);
-    ~Bell();  // what was to be rung is rung, if the server answers at once
+    // Both are called by the bell's thread, and throw nothing.
+    struct Calls
+    {
+        // With the number of a change that was committed; also after a break, when there may have been rings
+        // that nobody has heard.
+        std::function<void(Sequence)> heard;
+
+        // At every pulse, and when the server is found to be lost or to be back.
+        std::function<void()> look;
+    };
+
+    // Listens when this returns. reach and hurry live longer. Throws StoreError.
+    Bell(Target target, Limits const& limits, Calls calls, Reach& reach, Hurry& hurry);
+    ~Bell();  // begins the hurry; what was to be rung is rung, if the server answers at once
     Bell(Bell const&) = delete;
     Bell& operator=(Bell const&) = delete;
 
@@ -57,17 +72,23 @@ public:
     void Abandon() noexcept;
 
 private:
-    void Listen();
+    void Listen(std::chrono::milliseconds limit);
     void Run() noexcept;
+    void ListenAgain();
+    void NoteBreak(std::exception const& failure);
+    void PauseAfterBreak();
     void Serve();
+    void Ask(char const* sql, Parameters const& parameters);
     void Hear(Clock::time_point end);
     void HearRings();
-    void SendRing(std::chrono::milliseconds limit);
+    void SendRing();
     void Wake() noexcept;
 
     Target const m_target;
     Limits const m_limits;
-    std::function<void(Sequence)> const m_heard;
+    Calls const m_calls;
+    Reach& m_reach;
+    Hurry& m_hurry;
     Descriptor m_wakingEnd, m_wokenEnd;  // a pipe, so that the thread waits for it and the socket at once
     std::atomic<Sequence> m_toRing{0};
     std::atomic<bool> m_isAsked{false};  // to ring
@@ -76,7 +97,10 @@ private:
     // The thread's own.
     std::unique_ptr<Connection> m_connection;
     Sequence m_rung = 0;
-    Clock::time_point m_nextRing{};
+    Clock::time_point m_nextRing{}, m_nextQuestion{}, m_nextLook{};
+    Clock::time_point m_lastAnswer{};
+    std::optional<Clock::time_point> m_brokenSince;
+    GrowingPause m_pause;
 
     std::thread m_thread;
 };

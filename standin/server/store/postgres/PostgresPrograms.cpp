@@ -8,6 +8,11 @@ using postgres::Clock;
 using postgres::Parameters;
 using postgres::Result;
 
+namespace
+{
+constexpr std::chrono::seconds LeavingLimit(1);
+}
+
 ProgramId PostgresStore::Self() const noexcept { return m_self; }
 
 std::vector<ProgramInfo> PostgresStore::Programs()
@@ -173,7 +178,7 @@ bool PostgresStore::TakeEstate(Estate& estate)
 
 void PostgresStore::Leave()
 {
-    Turn turn(*this);
+    Turn turn(*this, LeavingLimit);
     turn.Run("SELECT leave_site($1)", Parameters() << m_self);
     m_hasLeft = true;
     m_bell.reset();

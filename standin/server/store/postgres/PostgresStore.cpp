@@ -12,6 +12,7 @@
 namespace standin
 {
 using namespace std::chrono_literals;
+using postgres::BrokenConnection;
 using postgres::Clock;
 using postgres::Connection;
 using postgres::Parameters;
@@ -21,6 +22,12 @@ namespace
 {
 constexpr std::chrono::milliseconds ClosingLimit = 1s;
 constexpr std::chrono::milliseconds PauseForLock = 10ms;
+
+// A break is not noticed by callers if the server can be had again within so long.
+constexpr std::chrono::milliseconds Patience = 300ms;
+
+// A caller waits for a connection no longer; where that takes more, the bell's thread gets it.
+constexpr std::chrono::milliseconds CallersLimit = 2s;
 
 // The server gives a statement up before the client does, so that the connection can be kept.
 std::chrono::milliseconds OnServer(std::chrono::milliseconds limit) { return limit - limit / 10; }
@@ -34,7 +41,7 @@ PostgresStore::PostgresStore(std::string const& uri, std::function<StoreContent(
       m_machine(MachineName()), m_program(ProgramName()), m_since(std::time(nullptr))
 {
     m_working = std::make_unique<Connection>(m_target, OnServer(m_options.statementLimit),
-                                             Clock::now() + m_options.connectLimit);
+                                             Clock::now() + m_options.connectLimit, &m_hurry);
     m_name = m_working->Name();
     {
         Turn opening(*this, m_options.openingLimit);
@@ -47,8 +54,10 @@ PostgresStore::PostgresStore(std::string const& uri, std::function<StoreContent(
     }
     // Listens before it looks: what is committed after the look rings.
     m_bell = std::make_unique<postgres::Bell>(
-        m_target, postgres::Bell::Limits{m_options.connectLimit, OnServer(m_options.statementLimit)},
-        [this](Sequence newest) { RaiseCommitted(newest); });
+        m_target,
+        postgres::Bell::Limits{m_options.connectLimit, OnServer(m_options.statementLimit), m_options.pulse},
+        postgres::Bell::Calls{[this](Sequence newest) { RaiseCommitted(newest); }, [this] { Look(); }},
+        m_reach, m_hurry);
     Register();
     if (!m_options.keepOpening)
         EndOpening();
@@ -86,7 +95,7 @@ PostgresStore::~PostgresStore()
     try
     {
         // The server notices the end of a connection a moment later, and so would who asks for the dead.
-        if (m_working && !m_working->IsBroken())
+        if (m_working && !m_working->IsBroken() && m_reach.IsThere())
             m_working->Run("SELECT pg_advisory_unlock_all()", {}, Clock::now() + ClosingLimit);
     }
     catch (StoreError const&)
@@ -156,9 +165,13 @@ PostgresStore::Turn::Turn(PostgresStore& store, std::chrono::milliseconds limit)
     store.CheckUsable();  // a copy in a child may have inherited a locked mutex
     {
         std::unique_lock lock(store.m_turns);
-        if (!store.m_turnEnded.wait_until(lock, m_deadline, [&store] { return !store.m_isTaken; }))
+        if (!store.m_turnEnded.wait_until(lock, m_deadline,
+                                          [&store] { return !store.m_isTaken || !store.m_reach.IsThere(); }))
             throw StoreError(store.m_name + ": other calls wait for its answer; check the server and the "
                                             "network");
+        if (!store.m_isTaken)
+            store.m_turnEnded.notify_one();  // if this one does not take it
+        store.CheckReach();
         store.m_isTaken = true;
     }
     try
@@ -168,51 +181,119 @@ PostgresStore::Turn::Turn(PostgresStore& store, std::chrono::milliseconds limit)
     }
     catch (...)
     {
-        End();
+        store.EndTurn();
         throw;
     }
 }
 
 PostgresStore::Turn::~Turn()
 {
+    if (m_connection->IsBroken())
+        m_store.m_brokenSince = Clock::now();
     if (m_connection->IsBroken() || m_store.m_hasLeft)
         m_store.m_working.reset();
-    End();
+    m_store.EndTurn();
 }
 
-void PostgresStore::Turn::End() noexcept
+void PostgresStore::EndTurn() noexcept
 {
-    std::lock_guard const lock(m_store.m_turns);
-    m_store.m_isTaken = false;
-    m_store.m_turnEnded.notify_one();
+    std::lock_guard const lock(m_turns);
+    m_isTaken = false;
+    m_turnEnded.notify_one();
+}
+
+void PostgresStore::CheckReach() const
+{
+    if (!m_reach.IsThere())
+        throw BrokenConnection(m_reach.Reason());
+}
+
+// In the thread of the bell. A program that makes no call just now is not to be taken for dead, and who waits
+// for a turn is not to wait for a server that is known to be lost.
+void PostgresStore::Look() noexcept
+{
+    {
+        std::lock_guard const lock(m_turns);
+        if (!m_reach.IsThere())
+            m_turnEnded.notify_all();
+        if (m_isTaken || m_hasLeft || !m_reach.IsThere())
+            return;
+        m_isTaken = true;
+    }
+    try
+    {
+        if (!HasSoundConnection() && IsAttemptDue())
+            Attempt(Clock::now() + m_options.statementLimit, m_options.connectLimit);
+    }
+    catch (std::exception const&)
+    {
+        // Calls report it.
+    }
+    EndTurn();
 }
 
 // For who has the turn, like all below.
 Connection& PostgresStore::Working(Clock::time_point deadline)
 {
-    if (m_working && !m_working->IsSound())
-        m_working.reset();
-    if (!m_working)
+    if (!HasSoundConnection())
         ConnectAgain(deadline);
     return *m_working;
 }
 
+bool PostgresStore::HasSoundConnection()
+{
+    if (m_working && !m_working->IsSound())
+    {
+        m_working.reset();
+        m_brokenSince = Clock::now();
+    }
+    return m_working != nullptr;
+}
+
+bool PostgresStore::IsAttemptDue() const
+{
+    return Clock::now() >= m_nextAttempt || m_reach.Returns() != m_returnsBeforeFailure;
+}
+
 void PostgresStore::ConnectAgain(Clock::time_point deadline)
 {
-    std::this_thread::sleep_until(std::min(m_nextAttempt, deadline));
+    auto const isNew = [&]
+    { return Clock::now() < std::min(m_brokenSince + Patience, deadline) && m_reach.IsThere(); };
+    while (!m_working)
+    {
+        if (!IsAttemptDue() && !isNew())
+            throw BrokenConnection(m_failure);
+        if (!IsAttemptDue())
+            std::this_thread::sleep_until(std::min(m_nextAttempt, deadline));
+        try
+        {
+            Attempt(deadline, std::min(m_options.connectLimit, CallersLimit));
+        }
+        catch (StoreError const&)
+        {
+            if (!isNew())
+                throw;
+        }
+    }
+}
+
+void PostgresStore::Attempt(Clock::time_point deadline, std::chrono::milliseconds connectLimit)
+{
+    auto const returns = m_reach.Returns();
     try
     {
         m_working = std::make_unique<Connection>(m_target, OnServer(m_options.statementLimit),
-                                                 std::min(deadline, Clock::now() + m_options.connectLimit));
-        TakeLifeBack(deadline);
+                                                 std::min(deadline, Clock::now() + connectLimit), &m_hurry);
+        if (m_self != 0)
+            TakeLifeBack(deadline);
         ++m_connected;
-        m_isReachable = true;
         m_pause.Reset();
     }
-    catch (StoreError const&)
+    catch (StoreError const& error)
     {
         m_working.reset();
-        m_isReachable = false;
+        m_failure = error.what();
+        m_returnsBeforeFailure = returns;
         m_nextAttempt = Clock::now() + m_pause.Take();
         throw;
     }

@@ -5,10 +5,12 @@
 // What was committed is as safe as the server's synchronous_commit makes it. Committed() follows what others
 // commit as soon as the bell rings, which takes about a millisecond.
 //
-// A call that finds the working connection broken throws StoreError, or answers Unknown if it is a Commit
-// that was under way; the next one connects again, and no call takes longer than the limits of connecting and
-// of a statement together. Until a program is back, others take it for dead and may bury it: it then goes on
-// under its number, without the sessions, part files and tickets that it had.
+// A call whose connection breaks throws StoreError, or answers Unknown if it is a Commit. The next one
+// connects again, and does not notice a break of some 100 ms; as long as the server is known to be out of
+// reach, calls fail at once. No call takes longer than the limits of connecting and of a statement together.
+// The thread of the bell looks after the working connection, too, so that a program is soon back that calls
+// nothing. Until it is back, others take it for dead and may bury it: it then goes on under its number
+// without the sessions, part files and tickets that it had.
 //
 // In a child process that was made by fork every operation throws StoreError.
 #pragma once
@@ -44,6 +46,9 @@ struct PostgresOptions
 
     // A program whose connection is gone is buried when it has been gone for so long.
     std::chrono::milliseconds grace{0};
+
+    // How often the working connection is looked after.
+    std::chrono::milliseconds pulse{250};
     StoreLimits limits{};
 };
 
@@ -97,7 +102,10 @@ public:
     bool IsTidy() const noexcept override { return m_isTidy; }
     void NoteTidy() noexcept override { m_isTidy = true; }
     void EndOpening() override;
-    bool IsReachable() const noexcept override { return m_isReachable; }
+
+    // The server is asked in the background; its silence is noticed after some three seconds.
+    bool IsReachable() const noexcept override { return m_reach.IsThere(); }
+
     std::unique_ptr<UsersTurn> TakeUsersTurn(std::chrono::milliseconds limit) override;
     std::vector<std::string> Check(Progress const& progress) override;
     void ReadContent(std::function<void(TicketChange&&)> const& takeTicket,
@@ -122,8 +130,14 @@ private:
     std::unique_ptr<postgres::Connection> OwnConnection() const;
     bool IsForeign() const noexcept;
     void CheckUsable() const;
+    void CheckReach() const;
     postgres::Connection& Working(postgres::Clock::time_point deadline);
+    bool HasSoundConnection();
+    bool IsAttemptDue() const;
     void ConnectAgain(postgres::Clock::time_point deadline);
+    void Attempt(postgres::Clock::time_point deadline, std::chrono::milliseconds connectLimit);
+    void Look() noexcept;
+    void EndTurn() noexcept;
     void TakeLifeBack(postgres::Clock::time_point deadline);
     static void Put(Turn& turn, User const& user);
     StoredValue ValueOf(postgres::Result const& rows, int row, int column, TicketAddress address) const;
@@ -148,7 +162,8 @@ private:
     std::string m_siteNumber;
     std::atomic<bool> m_isTidy{false};
     std::atomic<bool> m_hasLeft{false};
-    std::atomic<bool> m_isReachable{true};
+    postgres::Reach m_reach;
+    postgres::Hurry m_hurry;
 
     std::mutex m_opening;
     bool m_isOpening = false;
@@ -159,8 +174,11 @@ private:
     bool m_isTaken = false;
     std::unique_ptr<postgres::Connection> m_working;  // null: broken
     std::uint64_t m_connected = 0;                    // how often
+    postgres::Clock::time_point m_brokenSince{};
     postgres::GrowingPause m_pause;
     postgres::Clock::time_point m_nextAttempt{};
+    std::string m_failure;                     // of the last attempt
+    std::uint64_t m_returnsBeforeFailure = 0;  // of the server
 
     // What WaitForChanges waits for.
     std::atomic<Sequence> m_committed{0};

@@ -9,7 +9,8 @@ class PostgresStore::Turn
 {
 public:
     // Waits for the turn, and connects again if the connection is broken. All of it, and of what is run in
-    // the turn, ends at the limit at the latest. Throws StoreError.
+    // the turn, ends at the limit at the latest. Throws StoreError, at once if the server is known to be
+    // lost.
     explicit Turn(PostgresStore& store) : Turn(store, store.m_options.statementLimit) {}
     Turn(PostgresStore& store, std::chrono::milliseconds limit);
     ~Turn();
@@ -25,8 +26,6 @@ public:
     postgres::Clock::time_point Deadline() const { return m_deadline; }
 
 private:
-    void End() noexcept;
-
     PostgresStore& m_store;
     postgres::Clock::time_point const m_deadline;
     postgres::Connection* m_connection = nullptr;

@@ -1,0 +1,103 @@
+// Steady writers over PostgreSQL in several processes, each program with a store of its own.
+#pragma once
+
+#include "standin/server/store/postgres/PostgresStore.h"
+#include "tests/store/SteadyWriter.h"
+#include "tests/support/ChildProcess.h"
+#include <gtest/gtest.h>
+#include <limits>
+#include <memory>
+#include <string>
+#include <thread>
+#include <vector>
+
+// The journal is kept, so that who was away for a moment has no gap in its feed.
+inline standin::PostgresOptions OptionsOfWriters(std::string const& schema)
+{
+    standin::PostgresOptions options;
+    options.schema = schema;
+    options.limits.journalKept = 10'000'000;
+    return options;
+}
+
+class WriterProcesses
+{
+public:
+    static constexpr int EachHas = 4;  // writers
+
+    // The site is to be there already. steps: of each writer.
+    WriterProcesses(int processes, std::string const& uri, standin::PostgresOptions const& options,
+                    long long steps = std::numeric_limits<long long>::max())
+    {
+        for (int process = 0; process < processes; ++process)
+            m_children.push_back(std::make_unique<ChildProcess>(
+                [this, process, uri, options, steps](ChildProcess::Report const&)
+                { Work(process * EachHas, uri, options, steps); }));
+    }
+    ~WriterProcesses() { board->isGivenUp = board->isOver = true; }
+
+    int Count() const { return static_cast<int>(m_children.size()) * EachHas; }
+
+    // Waits until every writer has done so many steps more, or gives up after a minute, false.
+    bool AwaitSteps(long long more) const
+    {
+        std::vector<long long> goals;
+        for (int i = 0; i < Count(); ++i)
+            goals.push_back(Writer(i).steps + more);
+        return Await([&](int i) { return Writer(i).steps >= goals[static_cast<std::size_t>(i)]; });
+    }
+
+    // As long as it takes each writer to finish a step that was begun after this call; in ms.
+    long long TimeUntilAllWork() const
+    {
+        auto const start = WRITERS_BOARD::Now();
+        return AwaitSteps(2) ? WRITERS_BOARD::Now() - start : std::numeric_limits<long long>::max();
+    }
+
+    // Expects that all of them end well.
+    void Finish()
+    {
+        board->isOver = true;
+        AwaitEnd();
+    }
+    void AwaitEnd()
+    {
+        for (auto const& child : m_children)
+            EXPECT_EQ(child->Wait(), 0);
+    }
+
+    std::shared_ptr<WRITERS_BOARD> const board = WRITERS_BOARD::Make();
+
+private:
+    void Work(int first, std::string const& uri, standin::PostgresOptions const& options,
+              long long steps) const
+    {
+        std::vector<std::unique_ptr<standin::PostgresStore>> stores;
+        std::vector<std::thread> writers;
+        for (int i = 0; i < EachHas; ++i)
+            stores.push_back(std::make_unique<standin::PostgresStore>(uri, ContentOfWriters, options));
+        for (int i = 0; i < EachHas; ++i)
+            writers.emplace_back(
+                [&, i] { SteadyWriter(*stores[static_cast<std::size_t>(i)], *board, first + i).Run(steps); });
+        for (std::thread& writer : writers)
+            writer.join();
+    }
+
+    WRITERS_BOARD::WRITER const& Writer(int i) const { return board->writers[static_cast<std::size_t>(i)]; }
+
+    template <typename Condition>
+    bool Await(Condition const& condition) const
+    {
+        auto const end = WRITERS_BOARD::Now() + 60'000;
+        for (int i = 0; i < Count(); ++i)
+            while (!condition(i))
+            {
+                if (WRITERS_BOARD::Now() > end)
+                    return false;
+                std::this_thread::sleep_for(std::chrono::milliseconds(1));
+            }
+        return true;
+    }
+
+    std::vector<std::unique_ptr<ChildProcess>> m_children;
+};

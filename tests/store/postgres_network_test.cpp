@@ -1,0 +1,205 @@
+// What the PostgreSQL store does over a network that swallows what it is given, and says nothing of it.
+#include "standin/server/store/postgres/PostgresStore.h"
+
+#include "tests/store/PostgresSite.h"
+#include "tests/store/WriterProcesses.h"
+#include "tests/support/NetworkProxy.h"
+#include "tests/support/sanitizers.h"
+#include <future>
+#include <gmock/gmock.h>
+#include <random>
+
+using namespace standin;
+using namespace std::chrono_literals;
+using testing::HasSubstr;
+using testing::IsEmpty;
+using testing::Not;
+using testing::SizeIs;
+
+namespace
+{
+using Clock = std::chrono::steady_clock;
+
+PostgresOptions Brief()
+{
+    PostgresOptions options;
+    options.connectLimit = 3s;  // longer than the silence that is noticed
+    options.statementLimit = 1500ms;
+    return options;
+}
+
+class PostgresNetwork : public PostgresSite
+{
+protected:
+    // Of the store behind the proxy, as a host with a port.
+    std::string Uri() const
+    {
+        return "host=127.0.0.1 port=" + proxy.Port() + " user=postgres dbname=postgres";
+    }
+
+    CommitOutcome LoseDuringACommit(NetworkProxy::Loss loss)
+    {
+        writer.Do(Creation(Job).Put("Key", 0, 1));
+        auto const state = writer.State(Job);
+        proxy.Lose(loss);
+        auto const start = Clock::now();
+        auto const outcome = store->Commit(WriteTo(Job, state).Put("Key", 0, 2), 50);
+        EXPECT_LT(Clock::now() - start, 4s);
+        return outcome;
+    }
+
+    // Asks until there is an answer.
+    std::optional<CommitOutcome> Found()
+    {
+        std::optional<CommitOutcome> found;
+        auto const start = Clock::now();
+        while (!ReasonOf([&] { found = store->FindCommit(50); }).empty() && Clock::now() - start < 60s)
+            std::this_thread::sleep_for(1ms);
+        return found;
+    }
+
+    static int Value(Store& handle)
+    {
+        return static_cast<int>(ValuesOf(handle, Job).at({"Key", 0}).value.integer);
+    }
+
+    NetworkProxy proxy{schema.cluster.Folder() / ".s.PGSQL.5432"};
+    std::unique_ptr<PostgresStore> store = schema.OpenAs(Uri(), NoContent, Brief());
+    std::unique_ptr<PostgresStore> const other = schema.Open();
+    Writer writer{*store};
+};
+
+class PostgresLoss : public PostgresNetwork, public testing::WithParamInterface<NetworkProxy::Loss>
+{
+};
+}  // namespace
+
+INSTANTIATE_TEST_SUITE_P(Of, PostgresLoss,
+                         testing::Values(NetworkProxy::ToServer, NetworkProxy::ToClient, NetworkProxy::Both),
+                         [](auto const& loss)
+                         {
+                             return loss.param == NetworkProxy::Both       ? "Both"
+                                    : loss.param == NetworkProxy::ToServer ? "WhatIsSent"
+                                                                           : "WhatComes";
+                         });
+
+// The request comes late: over a connection that nobody waits for.
+TEST_P(PostgresLoss, DuringACommitThatGoesOn_IsUnknownUntilItIsAskedAfter)
+{
+    EXPECT_EQ(LoseDuringACommit(GetParam()).kind, CommitOutcome::Unknown);
+    proxy.Lose(NetworkProxy::None);
+    auto const found = Found();
+    EXPECT_EQ(Value(*other), found ? 2 : 1);
+    EXPECT_EQ(Value(*store), found ? 2 : 1);
+    EXPECT_THAT(FeedOf(*other, 0), SizeIs(found ? 2 : 1));
+}
+
+TEST_P(PostgresLoss, DuringACommitThatEndsForGood_IsUnknownUntilItIsAskedAfter)
+{
+    EXPECT_EQ(LoseDuringACommit(GetParam()).kind, CommitOutcome::Unknown);
+    proxy.CloseAll();
+    proxy.Lose(NetworkProxy::None);
+    EXPECT_EQ(Found().has_value(), GetParam() == NetworkProxy::ToClient);
+    EXPECT_EQ(Value(*other), GetParam() == NetworkProxy::ToClient ? 2 : 1);
+    EXPECT_EQ(writer.Put(Job, "Key", 0, 3).kind, CommitOutcome::Committed);
+}
+
+TEST_P(PostgresLoss, IsNoticedWithoutACall_AndTheEndOfIt)
+{
+    writer.Make(Job);
+    EXPECT_TRUE(store->IsReachable());
+    proxy.Lose(GetParam());
+    AwaitReach(*store, false);
+    std::string const reason = ReasonAtOnce([&] { ValuesOf(*store, Job); });
+    EXPECT_THAT(reason, HasSubstr("does not answer; check the server and the network"));
+    EXPECT_THAT(reason, Not(HasSubstr("\n")));
+    proxy.Lose(NetworkProxy::None);
+    AwaitReach(*store, true);
+    EXPECT_THAT(ValuesOf(*store, Job), IsEmpty());
+}
+
+TEST_F(PostgresNetwork, LostForLong_FailsEveryCallAtOnce)
+{
+    writer.Make(Job);
+    proxy.Lose(NetworkProxy::Both);
+    AwaitReach(*store, false);
+    for (auto const end = Clock::now() + 4s; Clock::now() < end; std::this_thread::sleep_for(50ms))
+        EXPECT_THAT(ReasonAtOnce([&] { store->Users(); }), Not(IsEmpty()));
+    EXPECT_FALSE(store->IsReachable());
+    proxy.Lose(NetworkProxy::None);
+    AwaitReach(*store, true);
+    EXPECT_THAT(ReasonOf([&] { store->Users(); }), IsEmpty());
+}
+
+// Calls that wait for one that waits for the network.
+TEST_F(PostgresNetwork, LostDuringACall_EndsTheWaitOfOthers)
+{
+    PostgresOptions options = Brief();
+    options.statementLimit = 60s;
+    auto const patient = schema.OpenAs(Uri(), NoContent, options);
+    proxy.Lose(NetworkProxy::Both);
+    auto const first = std::async(std::launch::async, [&] { return ReasonOf([&] { patient->Users(); }); });
+    auto const second = std::async(std::launch::async, [&] { return ReasonOf([&] { patient->Users(); }); });
+    auto const start = Clock::now();
+    while (first.wait_for(1ms) != std::future_status::ready &&
+           second.wait_for(1ms) != std::future_status::ready)
+        ASSERT_LT(Clock::now() - start, 20s);
+    proxy.CloseAll();
+    proxy.Lose(NetworkProxy::None);
+}
+
+TEST_F(PostgresNetwork, Lost_IsLeftWithinASecond)
+{
+    proxy.Lose(NetworkProxy::Both);
+    auto start = Clock::now();
+    EXPECT_THROW(store->Leave(), StoreError);
+    store.reset();
+    EXPECT_LT(Clock::now() - start, 2s);
+    proxy.Lose(NetworkProxy::None);
+}
+
+TEST_F(PostgresNetwork, KnownToBeLost_IsLeftAtOnce)
+{
+    proxy.Lose(NetworkProxy::Both);
+    AwaitReach(*store, false);
+    EXPECT_THAT(ReasonAtOnce([&] { store->Leave(); }), Not(IsEmpty()));
+    auto const start = Clock::now();
+    store.reset();
+    EXPECT_LT(Clock::now() - start, 1s);
+}
+
+// It is tried first each time, and takes its share of the time alone.
+TEST_F(PostgresNetwork, WithAHostThatIsSilent_FindsTheNext)
+{
+    proxy.Lose(NetworkProxy::Both);
+    auto const start = Clock::now();
+    auto const found = schema.OpenAs("host=127.0.0.1," + schema.cluster.Folder().string() +
+                                         " port=" + proxy.Port() + ",5432 user=postgres dbname=postgres",
+                                     NoContent, Brief());
+    EXPECT_LT(Clock::now() - start, 5s);
+    Terminate(*found);
+    EXPECT_EQ(Writer(*found).Make(Job).sequence, 1u);
+}
+
+TEST_F(PostgresNetwork, AgainAndAgain_LosesNothingAndMakesNothingTwice)
+{
+    PostgresSchema writersSchema;
+    auto options = OptionsOfWriters(writersSchema.Name());
+    options.connectLimit = options.statementLimit = 1s;
+    writersSchema.OpenAs(schema.cluster.Uri(), ContentOfWriters, options)->Leave();
+    WriterProcesses writers(2, Uri(), options);
+    ASSERT_TRUE(writers.AwaitSteps(5));
+    std::minstd_rand random(1);
+    for (int i = 0; i < (IsSanitized ? 5 : 12); ++i)
+    {
+        proxy.Lose(static_cast<NetworkProxy::Loss>(1 + random() % 3));
+        std::this_thread::sleep_for(std::chrono::milliseconds(random() % 1500));
+        if (random() % 2 == 0)
+            proxy.CloseAll();
+        proxy.Lose(NetworkProxy::None);
+        std::this_thread::sleep_for(std::chrono::milliseconds(random() % 500));
+    }
+    EXPECT_LT(writers.TimeUntilAllWork(), 10'000);
+    writers.Finish();
+    ExpectWorkOf(*writers.board, writers.Count(), *writersSchema.Open());
+}
