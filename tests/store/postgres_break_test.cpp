@@ -338,10 +338,54 @@ TEST_F(PostgresDeath, OfAConnection_LeavesTheProgramToBeBuried_AndItGoesOnUnderI
     EXPECT_EQ(tickets, 1);
     EXPECT_EQ(writer.Make(OtherJob).sequence, 2u);
     EXPECT_EQ(store->Self(), self);
-    EXPECT_THAT(store->Sessions(), IsEmpty());
     ASSERT_EQ(other->Programs().size(), 2u);
     EXPECT_EQ(other->Programs()[0].id, self);
     EXPECT_TRUE(other->Programs()[0].isAlive);
+}
+
+TEST_F(PostgresDeath, OfAConnection_LeavesTheSessionsAndPartFilesOfTheLiving)
+{
+    long long const session = store->OpenSession("admin");
+    store->CloseSession(store->OpenSession("guest"));
+    long long const since = store->Sessions().at(0).since;
+    store->AddPartFile("/tmp/a");
+    store->AddPartFile("/tmp/b");
+    store->RemovePartFile("/tmp/b");
+    Terminate(*store);
+    ASSERT_EQ(other->Bury(LeaveAlone), 1);
+    EXPECT_THAT(other->Sessions(), IsEmpty());
+    auto const sessions = store->Sessions();
+    ASSERT_THAT(sessions, SizeIs(1));
+    EXPECT_EQ(sessions[0].id, session);
+    EXPECT_EQ(sessions[0].program, store->Self());
+    EXPECT_EQ(sessions[0].user, "admin");
+    EXPECT_EQ(sessions[0].since, since);
+    EXPECT_NE(other->OpenSession("admin"), session);
+    EXPECT_FALSE(other->AddPartFile("/tmp/a"));
+    EXPECT_TRUE(other->AddPartFile("/tmp/b"));
+}
+
+TEST_F(PostgresDeath, OfAConnection_LeavesAPartFileToWhoHasNotedItMeanwhile)
+{
+    store->AddPartFile("/tmp/a");
+    Terminate(*store);
+    other->Bury(LeaveAlone);
+    EXPECT_TRUE(other->AddPartFile("/tmp/a"));
+    EXPECT_THAT(store->Programs(), SizeIs(2));
+    EXPECT_FALSE(store->AddPartFile("/tmp/a"));
+    store->RemovePartFile("/tmp/a");
+    EXPECT_FALSE(store->AddPartFile("/tmp/a"));
+}
+
+// As if the connection had broken between the server and the answer.
+TEST_F(PostgresDeath, OfAConnection_TakesAwayWhatACallHasMadeWhoseAnswerWasLost)
+{
+    std::string const self = std::to_string(store->Self());
+    schema.Run("INSERT INTO S.session (program, account, since) VALUES (" + self + ", 'admin', 0)");
+    schema.Run("INSERT INTO S.part_file VALUES ('/tmp/a', " + self + ")");
+    Terminate(*store);
+    EXPECT_THAT(store->Sessions(), IsEmpty());
+    EXPECT_TRUE(other->AddPartFile("/tmp/a"));
 }
 
 TEST_F(PostgresDeath, OfAConnection_IsMendedByItself)

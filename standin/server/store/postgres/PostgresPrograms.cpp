@@ -189,15 +189,21 @@ void PostgresStore::Leave()
 
 long long PostgresStore::OpenSession(std::string_view user)
 {
-    return Turn(*this)
-        .Run("INSERT INTO session (program, account, since) VALUES ($1, $2, $3) RETURNING id",
-             Parameters() << m_self << user << static_cast<long long>(std::time(nullptr)))
-        .Integer(0, 0);
+    Turn turn(*this);
+    auto const since = static_cast<long long>(std::time(nullptr));
+    long long const id =
+        turn.Run("INSERT INTO session (program, account, since) VALUES ($1, $2, $3) RETURNING id",
+                 Parameters() << m_self << user << since)
+            .Integer(0, 0);
+    m_sessions[id] = {std::string(user), since};
+    return id;
 }
 
 void PostgresStore::CloseSession(long long session)
 {
-    Turn(*this).Run("DELETE FROM session WHERE id = $1", Parameters() << session);
+    Turn turn(*this);
+    turn.Run("DELETE FROM session WHERE id = $1", Parameters() << session);
+    m_sessions.erase(session);
 }
 
 std::vector<SessionInfo> PostgresStore::Sessions()
@@ -213,16 +219,48 @@ std::vector<SessionInfo> PostgresStore::Sessions()
 bool PostgresStore::AddPartFile(std::string_view path)
 {
     // Touches a row of this program's, too, so that the changes tell whether the note stands.
-    return Turn(*this)
-               .Run("INSERT INTO part_file AS f VALUES ($1, $2) ON CONFLICT (place(path)) DO UPDATE "
-                    "SET program = $2 WHERE f.program = $2",
-                    Parameters() << path << m_self)
-               .Changes() == 1;
+    Turn turn(*this);
+    bool const isOurs =
+        turn.Run("INSERT INTO part_file AS f VALUES ($1, $2) ON CONFLICT (place(path)) DO UPDATE "
+                 "SET program = $2 WHERE f.program = $2",
+                 Parameters() << path << m_self)
+            .Changes() == 1;
+    if (isOurs)
+        m_partFiles.emplace(path);
+    return isOurs;
 }
 
 void PostgresStore::RemovePartFile(std::string_view path)
 {
-    Turn(*this).Run("DELETE FROM part_file WHERE place(path) = place($1) AND program = $2",
-                    Parameters() << path << m_self);
+    Turn turn(*this);
+    turn.Run("DELETE FROM part_file WHERE place(path) = place($1) AND program = $2", Parameters()
+                                                                                         << path << m_self);
+    m_partFiles.erase(std::string(path));
+}
+
+// For who has the turn. What others have forgotten with this program while it was away is there again, and
+// what a call has put there that broke before its answer is gone.
+void PostgresStore::PutBelongingsBack(Clock::time_point deadline)
+{
+    std::vector<long long> ids, since;
+    std::vector<std::string_view> users;
+    for (auto const& [id, session] : m_sessions)
+    {
+        ids.push_back(id);
+        since.push_back(session.since);
+        users.push_back(session.user);
+    }
+    m_working->Run("DELETE FROM session WHERE program = $1 AND id <> ALL ($2)", Parameters() << m_self << ids,
+                   deadline);
+    m_working->Run("INSERT INTO session (id, program, account, since) OVERRIDING SYSTEM VALUE "
+                   "SELECT s.id, $1, s.account, s.since FROM unnest($2, $3, $4) AS s (id, account, since) "
+                   "ON CONFLICT DO NOTHING",
+                   Parameters() << m_self << ids << users << since, deadline);
+    std::vector<std::string_view> const files(m_partFiles.begin(), m_partFiles.end());
+    m_working->Run("DELETE FROM part_file WHERE program = $1 AND path <> ALL ($2)",
+                   Parameters() << m_self << files, deadline);
+    m_working->Run(
+        "INSERT INTO part_file SELECT f.path, $1 FROM unnest($2) AS f (path) ON CONFLICT DO NOTHING",
+        Parameters() << m_self << files, deadline);
 }
 }  // namespace standin

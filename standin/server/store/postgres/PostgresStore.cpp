@@ -324,6 +324,7 @@ void PostgresStore::TakeLifeBack(Clock::time_point deadline)
                    Parameters() << m_self << static_cast<long long>(m_process) << std::string_view(m_machine)
                                 << std::string_view(m_program) << m_since << Committed().load(),
                    deadline);
+    PutBelongingsBack(deadline);
 }
 
 // --- what holds

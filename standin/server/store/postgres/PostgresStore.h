@@ -9,8 +9,8 @@
 // connects again, and does not notice a break of some 100 ms; as long as the server is known to be out of
 // reach, calls fail at once. No call takes longer than the limits of connecting and of a statement together.
 // The thread of the bell looks after the working connection, too, so that a program is soon back that calls
-// nothing. Until it is back, others take it for dead and may bury it: it then goes on under its number
-// without the sessions, part files and tickets that it had.
+// nothing. Until it is back, others take it for dead and may bury it: it then goes on under its number with
+// its sessions and the notes of its part files, but without the tickets that it owned.
 //
 // In a child process that was made by fork every operation throws StoreError.
 #pragma once
@@ -139,6 +139,7 @@ private:
     void Look() noexcept;
     void EndTurn() noexcept;
     void TakeLifeBack(postgres::Clock::time_point deadline);
+    void PutBelongingsBack(postgres::Clock::time_point deadline);
     static void Put(Turn& turn, User const& user);
     StoredValue ValueOf(postgres::Result const& rows, int row, int column, TicketAddress address) const;
     static std::vector<User> UsersOf(postgres::Result const& rows);
@@ -179,6 +180,15 @@ private:
     postgres::Clock::time_point m_nextAttempt{};
     std::string m_failure;                     // of the last attempt
     std::uint64_t m_returnsBeforeFailure = 0;  // of the server
+
+    // What to put back if this program is buried by mistake. Of who has the turn, too.
+    struct SESSION
+    {
+        std::string user;
+        long long since;
+    };
+    std::map<long long, SESSION> m_sessions;
+    std::set<std::string> m_partFiles;
 
     // What WaitForChanges waits for.
     std::atomic<Sequence> m_committed{0};
