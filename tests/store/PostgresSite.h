@@ -14,6 +14,7 @@
 inline standin::PostgresOptions AtOnce()
 {
     standin::PostgresOptions options;
+    options.grace = options.settling = std::chrono::milliseconds(0);
     options.pulse = std::chrono::hours(1);
     return options;
 }

@@ -414,6 +414,36 @@ TEST_F(PostgresDeath, WithinTheGrace_IsNoReasonToBury)
     EXPECT_EQ(other->Bury(LeaveAlone), 1);
 }
 
+// Rounds of who clears up, 0.7 s apart.
+TEST_F(PostgresDeath, InQuietTimes_IsFollowedByABurialInTheSecondRound)
+{
+    PostgresOptions options;
+    options.settling = 0s;
+    auto const burier = schema.Open(options);
+    store.reset();
+    EXPECT_EQ(burier->Bury(LeaveAlone), 0);
+    std::this_thread::sleep_for(700ms);
+    EXPECT_EQ(burier->Bury(LeaveAlone), 1);
+}
+
+TEST_F(PostgresDeath, IsNoReasonToBury_ForWhoseConnectionIsYoung)
+{
+    PostgresOptions options = AtOnce();
+    options.settling = 1h;
+    auto const young = schema.Open(options);
+    options.settling = 2s;
+    auto const settling = schema.Open(options);
+    auto const start = Clock::now();
+    Terminate(*settling);
+    settling->Programs();
+    store.reset();
+    EXPECT_EQ(settling->Bury([](Estate const&) { ADD_FAILURE(); }), 0);
+    EXPECT_EQ(young->Bury([](Estate const&) { ADD_FAILURE(); }), 0);
+    while (settling->Bury(LeaveAlone) == 0)
+        ASSERT_LT(Clock::now() - start, 60s);
+    EXPECT_GE(Clock::now() - start, 2s);
+}
+
 TEST_F(PostgresDeath, WhoComesBackDuringItsBurial_WaitsForItsEnd)
 {
     Terminate(*store);

@@ -49,13 +49,20 @@ int PostgresStore::Bury(std::function<void(Estate const&)> const& clear)
     return buried;
 }
 
+// After a break of this program's own connection it looks anew who is missing.
 std::vector<ProgramId> PostgresStore::DueForBurial()
 {
     std::vector<ProgramId> due;
     auto const programs = Programs();
     auto const now = Clock::now();
+    bool const isSettled = now - m_connectedSince.load() >= m_options.settling;
     std::lock_guard const lock(m_burials);
     std::map<ProgramId, Clock::time_point> missing;
+    if (!isSettled)
+    {
+        m_missing.clear();
+        return due;
+    }
     for (ProgramInfo const& program : programs)
     {
         if (program.isAlive)

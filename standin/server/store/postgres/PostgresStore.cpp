@@ -42,6 +42,7 @@ PostgresStore::PostgresStore(std::string const& uri, std::function<StoreContent(
 {
     m_working = std::make_unique<Connection>(m_target, OnServer(m_options.statementLimit),
                                              Clock::now() + m_options.connectLimit, &m_hurry);
+    m_connectedSince = Clock::now();
     m_name = m_working->Name();
     {
         Turn opening(*this, m_options.openingLimit);
@@ -287,6 +288,7 @@ void PostgresStore::Attempt(Clock::time_point deadline, std::chrono::millisecond
         if (m_self != 0)
             TakeLifeBack(deadline);
         ++m_connected;
+        m_connectedSince = Clock::now();
         m_pause.Reset();
     }
     catch (StoreError const& error)

@@ -44,8 +44,13 @@ struct PostgresOptions
     // Keeps others who open the site waiting until EndOpening.
     bool keepOpening = false;
 
-    // A program whose connection is gone is buried when it has been gone for so long.
-    std::chrono::milliseconds grace{0};
+    // A program is buried when it has been missing for so long, which is twice what it takes one to come back
+    // after a break of its own connection, and two rounds of who clears up.
+    std::chrono::milliseconds grace{600};
+
+    // Nobody is buried by a program whose own connection is younger: when the server breaks down all are
+    // gone, and come back one by one.
+    std::chrono::milliseconds settling{10'000};
 
     // How often the working connection is looked after.
     std::chrono::milliseconds pulse{250};
@@ -175,6 +180,7 @@ private:
     bool m_isTaken = false;
     std::unique_ptr<postgres::Connection> m_working;  // null: broken
     std::uint64_t m_connected = 0;                    // how often
+    std::atomic<postgres::Clock::time_point> m_connectedSince{};
     postgres::Clock::time_point m_brokenSince{};
     postgres::GrowingPause m_pause;
     postgres::Clock::time_point m_nextAttempt{};
