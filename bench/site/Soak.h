@@ -2,8 +2,8 @@
 #pragma once
 
 #include "bench/site/Errands.h"
-#include "bench/site/SmallDisk.h"
 #include "bench/site/SoakRunner.h"
+#include "tests/support/SmallDisk.h"
 #include <deque>
 #include <map>
 #include <random>

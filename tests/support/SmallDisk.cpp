@@ -1,4 +1,4 @@
-#include "bench/site/SmallDisk.h"
+#include "tests/support/SmallDisk.h"
 
 #include <cerrno>
 #include <fcntl.h>
