@@ -38,6 +38,14 @@ public:
 
     int Count() const { return static_cast<int>(m_children.size()) * EachHas; }
 
+    bool HaveDone(long long steps) const
+    {
+        for (int i = 0; i < Count(); ++i)
+            if (Writer(i).steps < steps)
+                return false;
+        return true;
+    }
+
     // Waits until every writer has done so many steps more, or gives up after a minute, false.
     bool AwaitSteps(long long more) const
     {
@@ -60,7 +68,7 @@ public:
         board->isOver = true;
         AwaitEnd();
     }
-    void AwaitEnd()
+    void AwaitEnd() const
     {
         for (auto const& child : m_children)
             EXPECT_EQ(child->Wait(), 0);

@@ -139,9 +139,14 @@ void PostgresCluster::MakeFolder()
     if (mkdtemp(name.data()) == nullptr)
         throw std::runtime_error("cannot make " + name);
     m_folder = name;
+    LetServerInto(m_folder);
+}
+
+void PostgresCluster::LetServerInto(fs::path const& folder)
+{
     if (passwd const* const user = UnprivilegedUser())
-        if (chown(name.c_str(), user->pw_uid, user->pw_gid) != 0)
-            throw std::runtime_error("cannot give " + name + " to " + user->pw_name);
+        if (chown(folder.c_str(), user->pw_uid, user->pw_gid) != 0)
+            throw std::runtime_error("cannot give " + folder.string() + " to " + user->pw_name);
 }
 
 void PostgresCluster::Make(std::vector<std::string> const& command)

@@ -47,6 +47,12 @@ public:
     // Returns when the SQL answers that; throws if it has not within a minute.
     void Await(std::string const& sql, std::string const& answer) const;
 
+    // Returns when it lets programs in, as after a crash; throws if it does not within a minute.
+    void AwaitAnswer() const;
+
+    // Gives a folder to the user as whom servers run.
+    static void LetServerInto(std::filesystem::path const& folder);
+
     // How that role is let in from now on, for example scram-sha-256 or reject; everybody is by trust at
     // first.
     void LetIn(std::string const& role, std::string const& method) const;
@@ -73,7 +79,6 @@ private:
     void MakeFolder();
     void Make(std::vector<std::string> const& command);
     void Start();
-    void AwaitAnswer() const;
     [[noreturn]] void Fail(std::string const& what) const;
 
     std::filesystem::path m_folder;
