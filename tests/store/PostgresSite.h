@@ -66,7 +66,7 @@ private:
 inline std::string ReasonAtOnce(std::function<void()> const& call)
 {
     auto const start = std::chrono::steady_clock::now();
-    std::string const reason = ReasonOf(call);
+    std::string reason = ReasonOf(call);
     EXPECT_LT(std::chrono::steady_clock::now() - start, std::chrono::milliseconds(250)) << reason;
     return reason;
 }

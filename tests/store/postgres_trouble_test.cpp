@@ -79,7 +79,7 @@ using PostgresClocks = PostgresSite;
 
 TEST_F(PostgresTrouble, EndOfAllConnectionsEverySecond_LosesNothingAndMakesNothingTwice)
 {
-    long long const steps = WritesWanted() / 3 / (2 * WriterProcesses::EachHas) + 1;
+    long long const steps = WritesWanted() / (3LL * 2 * WriterProcesses::EachHas) + 1;
     auto const writers = StartWriters(steps);
     int storms = 0;
     for (auto next = Clock::now() + 1s; !writers.HaveDone(steps); std::this_thread::sleep_for(10ms))

@@ -155,7 +155,7 @@ std::string TakeCode(std::string& text)
     static constexpr char Mark[] = ":  ";
     for (auto at = text.find(Mark); at != text.npos; at = text.find(Mark, at + 1))
     {
-        std::string const code = text.substr(at + 3, 5);
+        std::string code = text.substr(at + 3, 5);
         bool const isCode =
             code.size() == 5 && code.find_first_not_of("0123456789ABCDEFGHIJKLMNOPQRSTUVWXYZ") == code.npos;
         if (!isCode || text.compare(at + 8, 2, ": ") != 0)
