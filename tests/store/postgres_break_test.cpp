@@ -444,6 +444,15 @@ TEST_F(PostgresDeath, IsNoReasonToBury_ForWhoseConnectionIsYoung)
     EXPECT_GE(Clock::now() - start, 2s);
 }
 
+TEST_F(PostgresDeath, IsNoticedByAProgramThatHasJustBegun_IfTheServerIsOldEnough)
+{
+    PostgresOptions options = AtOnce();
+    options.settling = 2s;
+    schema.cluster.Await("SELECT clock_timestamp() - pg_postmaster_start_time() > '2 s'", "t");
+    store.reset();
+    EXPECT_EQ(schema.Open(options)->Bury(LeaveAlone), 1);
+}
+
 TEST_F(PostgresDeath, WhoComesBackDuringItsBurial_WaitsForItsEnd)
 {
     Terminate(*store);

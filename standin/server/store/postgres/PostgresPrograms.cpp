@@ -55,7 +55,7 @@ std::vector<ProgramId> PostgresStore::DueForBurial()
     std::vector<ProgramId> due;
     auto const programs = Programs();
     auto const now = Clock::now();
-    bool const isSettled = now - m_connectedSince.load() >= m_options.settling;
+    bool const isSettled = now - m_unbrokenSince.load() >= m_options.settling;
     std::lock_guard const lock(m_burials);
     std::map<ProgramId, Clock::time_point> missing;
     if (!isSettled)

@@ -42,7 +42,6 @@ PostgresStore::PostgresStore(std::string const& uri, std::function<StoreContent(
 {
     m_working = std::make_unique<Connection>(m_target, OnServer(m_options.statementLimit),
                                              Clock::now() + m_options.connectLimit, &m_hurry);
-    m_connectedSince = Clock::now();
     m_name = m_working->Name();
     {
         Turn opening(*this, m_options.openingLimit);
@@ -122,10 +121,11 @@ void PostgresStore::Register()
 {
     Turn turn(*this);
     Result const found = turn.Run(
-        "SELECT number::text, NOT EXISTS (SELECT FROM program WHERE id NOT IN (SELECT program FROM living)) "
-        "FROM site");
+        "SELECT number::text, NOT EXISTS (SELECT FROM program WHERE id NOT IN (SELECT program FROM living)), "
+        "(extract(epoch FROM clock_timestamp() - pg_postmaster_start_time()) * 1000)::bigint FROM site");
     m_siteNumber = found.Text(0, 0);
     m_isTidy = found.Bool(0, 1);
+    m_unbrokenSince = Clock::now() - std::chrono::milliseconds(std::max(0LL, found.Integer(0, 2)));
     Result const registered =
         turn.Run("SELECT self, heard, lock_class() FROM register_program($1, $2, $3, $4)",
                  Parameters() << static_cast<long long>(m_process) << std::string_view(m_machine)
@@ -288,7 +288,7 @@ void PostgresStore::Attempt(Clock::time_point deadline, std::chrono::millisecond
         if (m_self != 0)
             TakeLifeBack(deadline);
         ++m_connected;
-        m_connectedSince = Clock::now();
+        m_unbrokenSince = Clock::now();
         m_pause.Reset();
     }
     catch (StoreError const& error)

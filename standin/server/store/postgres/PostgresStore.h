@@ -48,8 +48,8 @@ struct PostgresOptions
     // after a break of its own connection, and two rounds of who clears up.
     std::chrono::milliseconds grace{600};
 
-    // Nobody is buried by a program whose own connection is younger: when the server breaks down all are
-    // gone, and come back one by one.
+    // Nobody is buried by a program that has come back from a break of its own since, nor so soon after the
+    // server has started: when that breaks down all are gone, and come back one by one.
     std::chrono::milliseconds settling{10'000};
 
     // How often the working connection is looked after.
@@ -180,7 +180,7 @@ private:
     bool m_isTaken = false;
     std::unique_ptr<postgres::Connection> m_working;  // null: broken
     std::uint64_t m_connected = 0;                    // how often
-    std::atomic<postgres::Clock::time_point> m_connectedSince{};
+    std::atomic<postgres::Clock::time_point> m_unbrokenSince{};  // the server and this program's connection
     postgres::Clock::time_point m_brokenSince{};
     postgres::GrowingPause m_pause;
     postgres::Clock::time_point m_nextAttempt{};
