@@ -208,17 +208,28 @@ std::vector<json> RunClients(std::vector<LoadTask> const& tasks, double seconds)
     return figures;
 }
 
+std::filesystem::path FolderOfDatabase()
+{
+    char const* const folder = std::getenv("COMGUI_SITE_FOLDER");
+    if (folder == nullptr || *folder == '\0')
+        throw Trouble("COMGUI_SITE_FOLDER is not set; set it to the folder of the site's files");
+    return folder;
+}
+
 Figures Measure(Options const& options)
 {
     std::unique_ptr<TemporaryFolder> temporary;
+    bool const isDatabase = options.site.starts_with("postgresql://");
     if (options.site.empty())
     {
         temporary = std::make_unique<TemporaryFolder>();
         SiteClient::MakeSite(temporary->Path() / "site");
     }
-    std::filesystem::path const site =
+    else if (isDatabase)
+        SiteClient::MakeSite(FolderOfDatabase());
+    std::string const folder =
         temporary ? temporary->Path() / "site" : std::filesystem::absolute(options.site);
-    setenv("COMGUI_SITE", site.c_str(), 1);
+    setenv("COMGUI_SITE", isDatabase ? options.site.c_str() : folder.c_str(), 1);
 
     std::vector<LoadTask> const tasks = Tasks(options);
     std::vector<json> const figures = RunClients(tasks, options.seconds);

@@ -7,6 +7,7 @@
 #include "tests/support/PostgresCluster.h"
 #include <chrono>
 #include <cstdlib>
+#include <cstring>
 #include <functional>
 #include <gmock/gmock.h>
 #include <thread>
@@ -50,6 +51,18 @@ protected:
         int const code = module->SendCommandEntry(module.Instance(), client.Session(), "remote.system.isalive",
                                                   sizeof record, &record);
         EXPECT_EQ(record.iResult, code);
+        return code;
+    }
+
+    int PrepareJob() const
+    {
+        TCommandRecord record{};
+        record.nMagic = 0x49494949;
+        record.nSize = sizeof record;
+        std::strcpy(record.szText2, "$(JOB)/a.pdf");
+        int const code = module->SendCommandEntry(module.Instance(), client.Session(), "remote.job.prepare",
+                                                  sizeof record, &record);
+        EXPECT_EQ(record.iResult, -1);
         return code;
     }
 
@@ -125,6 +138,7 @@ TEST_F(LostDatabase, IsToldByIsAlive_WhileReadsGoOnAndWritesAreRefused)
         EXPECT_LT(std::chrono::steady_clock::now() - begun, 5s);
         RECORD login;
         EXPECT_EQ(module->LoginEntry(module.Instance(), &login), MODULE_SITE_UNAVAILABLE);
+        EXPECT_EQ(PrepareJob(), MODULE_FAILED);
         cluster.Continue();
         EXPECT_TRUE(Becomes([&] { return IsAlive() == 0; }));
         EXPECT_EQ(IsAliveByCommand(), 0);
