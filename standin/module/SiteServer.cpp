@@ -60,8 +60,7 @@ OpenSite& Opened(SiteName const& name)
 }
 }  // namespace
 
-OpenSite::OpenSite(SiteName const& name)
-    : site(name, ShippedSeed()), server(site.store(), site.folder())
+OpenSite::OpenSite(SiteName const& name) : site(name, ShippedSeed()), server(site.store(), site.folder())
 {
     site.PutInOrder(server);
 }

@@ -15,7 +15,7 @@ struct OpenSite
     Server server;
 };
 
-// The site that SiteName::OfThisUser() names at this moment. Null if it cannot be opened; one line on stderr says
-// why, and the next call tries again.
+// The site that SiteName::OfThisUser() names at this moment. Null if it cannot be opened; one line on stderr
+// says why, and the next call tries again.
 OpenSite* SiteOfThisProcess() noexcept;
 }  // namespace standin

@@ -48,8 +48,8 @@ protected:
         record.nMagic = 0x49494949;
         record.nSize = sizeof record;
         record.iResult = -1;
-        int const code = module->SendCommandEntry(module.Instance(), client.Session(), "remote.system.isalive",
-                                                  sizeof record, &record);
+        int const code = module->SendCommandEntry(module.Instance(), client.Session(),
+                                                  "remote.system.isalive", sizeof record, &record);
         EXPECT_EQ(record.iResult, code);
         return code;
     }
@@ -138,7 +138,7 @@ TEST_F(LostDatabase, IsToldByIsAlive_WhileReadsGoOnAndWritesAreRefused)
         EXPECT_LT(std::chrono::steady_clock::now() - begun, 5s);
         RECORD login;
         EXPECT_EQ(module->LoginEntry(module.Instance(), &login), MODULE_SITE_UNAVAILABLE);
-        EXPECT_EQ(PrepareJob(), MODULE_FAILED);
+        EXPECT_EQ(PrepareJob(), MODULE_TARGET_UNWRITABLE);
         cluster.Continue();
         EXPECT_TRUE(Becomes([&] { return IsAlive() == 0; }));
         EXPECT_EQ(IsAliveByCommand(), 0);

@@ -10,7 +10,8 @@ class OpenedSite
 {
 public:
     OpenedSite(std::filesystem::path const& folder, std::filesystem::path const& seed)
-        : site(standin::SiteName::Of(folder.string()), seed), m_server(std::make_unique<standin::Server>(site.store(), site.folder()))
+        : site(standin::SiteName::Of(folder.string()), seed),
+          m_server(std::make_unique<standin::Server>(site.store(), site.folder()))
     {
         site.PutInOrder(*m_server);
     }

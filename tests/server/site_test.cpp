@@ -352,7 +352,8 @@ TEST_F(SiteFolder, SystemTicketFile_WhoseTurnSomebodyKeeps_IsWrittenWhenItIsFree
 TEST_F(SiteFolder, SystemTicketFile_WhoseTurnComes_IsWrittenWhenTheChangeReturns)
 {
     OpenedSite site(Folder(), ShippedSeed);
-    auto turn = std::make_unique<Descriptor>(open(File("tickets").c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
+    auto turn =
+        std::make_unique<Descriptor>(open(File("tickets").c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
     ASSERT_EQ(flock(turn->Number(), LOCK_EX), 0);
     std::thread holder(
         [&]

@@ -30,7 +30,10 @@ protected:
     static constexpr standin::TicketAddress Job{3, 1};
     static constexpr standin::TicketAddress OtherJob{3, 2};
 
-    std::unique_ptr<standin::SiteStore> Open(bool keepOpening = false) const { return site->Open(keepOpening); }
+    std::unique_ptr<standin::SiteStore> Open(bool keepOpening = false) const
+    {
+        return site->Open(keepOpening);
+    }
 
     std::unique_ptr<LastingSite> site = GetParam().makeSite();
 };

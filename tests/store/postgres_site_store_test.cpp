@@ -43,8 +43,8 @@ protected:
 
     std::vector<std::string> Problems() const { return store->Check({}); }
 
-    std::unique_ptr<PostgresStore> const store = schema.OpenAs(
-        schema.cluster.Uri(), [] { return OneTicket(Job, "Text", 1); }, {});
+    std::unique_ptr<PostgresStore> const store =
+        schema.OpenAs(schema.cluster.Uri(), [] { return OneTicket(Job, "Text", 1); }, {});
     Writer writer{*store};
 };
 
@@ -54,8 +54,9 @@ protected:
     PostgresReplacing() { options.schema = schema.Name(); }
     ~PostgresReplacing() override
     {
-        std::string const aside = schema.cluster.Run(
-            "SELECT string_agg(nspname, ', ') FROM pg_namespace WHERE nspname LIKE '" + schema.Name() + "\\_%'");
+        std::string const aside =
+            schema.cluster.Run("SELECT string_agg(nspname, ', ') FROM pg_namespace WHERE nspname LIKE '" +
+                               schema.Name() + "\\_%'");
         if (!aside.empty())
             schema.cluster.Run("DROP SCHEMA " + aside + " CASCADE");
     }
@@ -113,8 +114,9 @@ TEST_F(PostgresOpening, ThatOthersKeepTooLong_IsGivenUp)
     auto const first = schema.Open(keeping);
     PostgresOptions impatient;
     impatient.openingLimit = 200ms;
-    EXPECT_THAT(ReasonOf([&] { schema.Open(impatient); }),
-                HasSubstr("another program has been opening the site all the time; end that, then try again"));
+    EXPECT_THAT(
+        ReasonOf([&] { schema.Open(impatient); }),
+        HasSubstr("another program has been opening the site all the time; end that, then try again"));
 }
 
 TEST_F(PostgresFolder, NumberOfTheSite_IsTheSameForAll_AndNoOthers)
@@ -231,7 +233,8 @@ TEST_F(PostgresReplacing, KeepsOthersFromOpening)
 {
     MakeSiteWith(1);
     auto replacement = Begin(Old::SetAside);
-    EXPECT_THAT(ReasonOfBeginning(Old::SetAside), HasSubstr("another program is opening or replacing the site"));
+    EXPECT_THAT(ReasonOfBeginning(Old::SetAside),
+                HasSubstr("another program is opening or replacing the site"));
     auto opening = std::async(std::launch::async, [this] { return Value(); });
     EXPECT_EQ(opening.wait_for(200ms), std::future_status::timeout);
     Writer(replacement->Store()).Do(Creation(Job).Put("Key", 0, 2));

@@ -16,8 +16,8 @@ namespace
 std::string DatabaseFor(std::filesystem::path const& folder)
 {
     static std::map<std::filesystem::path, std::string> databases;
-    auto const [known, isNew] = databases.try_emplace(
-        folder, "site_" + std::to_string(getpid()) + "_" + std::to_string(databases.size()));
+    auto const [known, isNew] = databases.try_emplace(folder, "site_" + std::to_string(getpid()) + "_" +
+                                                                  std::to_string(databases.size()));
     if (isNew)
         PostgresCluster::Instance().Run("CREATE DATABASE " + known->second);
     return PostgresCluster::Instance().Uri("postgres", known->second);

@@ -1,5 +1,6 @@
-// Where a test's programs have their site: in a folder, or, if COMGUI_TEST_ENGINE is postgresql, in a database
-// of its own in the test program's cluster, with the folder for its files. So one suite runs over both.
+// Where a test's programs have their site: in a folder, or, if COMGUI_TEST_ENGINE is postgresql, in a
+// database of its own in the test program's cluster, with the folder for its files. So one suite runs over
+// both.
 #pragma once
 
 #include <filesystem>

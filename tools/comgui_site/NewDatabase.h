@@ -18,8 +18,8 @@ public:
     };
 
     // workplace: an empty folder on the disk of the site's own, to work in. Throws Trouble or StoreError.
-    static std::unique_ptr<NewDatabase> Begin(standin::SiteName const& name, std::filesystem::path const& workplace,
-                                              Old old = Old::Forbidden);
+    static std::unique_ptr<NewDatabase>
+    Begin(standin::SiteName const& name, std::filesystem::path const& workplace, Old old = Old::Forbidden);
 
     virtual ~NewDatabase() = default;  // nothing of it is left unless it was finished
     NewDatabase(NewDatabase const&) = delete;

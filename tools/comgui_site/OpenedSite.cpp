@@ -15,7 +15,8 @@ namespace
 [[noreturn]] void FailAsMissing(SiteName const& name)
 {
     if (name.IsDatabase())
-        throw MissingSite("no site is in the database; name the one that has it, or start a program that makes it");
+        throw MissingSite(
+            "no site is in the database; name the one that has it, or start a program that makes it");
     throw MissingSite(name.folder.string() +
                       ": no site is there; name the folder of one, or start a program that makes it");
 }

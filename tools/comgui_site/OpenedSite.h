@@ -34,8 +34,8 @@ public:
         Wait,  // until the object goes, if they want to open it
     };
 
-    // Throws MissingSite if there is no such site, StoreError if it cannot be opened; a damaged database stays as
-    // it is.
+    // Throws MissingSite if there is no such site, StoreError if it cannot be opened; a damaged database
+    // stays as it is.
     explicit OpenedSite(standin::SiteName name, Others others = Others::Work);
     ~OpenedSite();  // leaves, and reports a failure on stderr
     OpenedSite(OpenedSite const&) = delete;

@@ -8,9 +8,10 @@ namespace comgui_site
 {
 class OpenedSite;
 
-// Writes tickets and users as of one moment to a new file, a database as a folder has it, readable by this user alone, under a name of its own
-// until it is whole and on the disk. mayReplace: an older regular file of that name, but never one of the
-// site's own. Throws Trouble, FileError or StoreError, with the older file as it was.
+// Writes tickets and users as of one moment to a new file, a database as a folder has it, readable by this
+// user alone, under a name of its own until it is whole and on the disk. mayReplace: an older regular file of
+// that name, but never one of the site's own. Throws Trouble, FileError or StoreError, with the older file as
+// it was.
 void BackUp(OpenedSite& site, std::filesystem::path const& file, bool mayReplace);
 
 struct Restored

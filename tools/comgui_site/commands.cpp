@@ -243,8 +243,7 @@ int RunRestore(Request const& request)
 {
     auto const name = NameOfSite(request.site);
     Restored const restored = Restore(name, request.file);
-    std::string text =
-        "restored " + Cleaned(name.folder.string()) + " from " + Cleaned(request.file) + '\n';
+    std::string text = "restored " + Cleaned(name.folder.string()) + " from " + Cleaned(request.file) + '\n';
     if (!restored.setAside.empty())
         text += "the database before is " + Cleaned(restored.setAside) + '\n';
     text += "the folders of files are as they were; a backup has none of them\n";

@@ -46,9 +46,8 @@ bool HasSameBytes(path const& left, path const& right)
     {
         one.read(first.data(), Block);
         other.read(second.data(), Block);
-        if (one.gcount() != other.gcount() ||
-            first.compare(0, static_cast<std::size_t>(one.gcount()), second, 0,
-                          static_cast<std::size_t>(one.gcount())) != 0)
+        if (one.gcount() != other.gcount() || first.compare(0, static_cast<std::size_t>(one.gcount()), second,
+                                                            0, static_cast<std::size_t>(one.gcount())) != 0)
             return false;
     }
     return one.eof() && other.eof();

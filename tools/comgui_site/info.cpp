@@ -92,8 +92,9 @@ std::string TextOf(SiteInfo const& info)
 {
     std::string text = "site      " + Cleaned(info.folder.string()) + "\ndatabase  " +
                        SizeText(info.databaseSize) +
-                       (info.database.empty() ? "" : ", " + Cleaned(info.database)) + "\nfiles     " + SizeText(info.filesSize) +
-                       "\nchanges   " + std::to_string(info.newest) + "\njournal   " + JournalText(info);
+                       (info.database.empty() ? "" : ", " + Cleaned(info.database)) + "\nfiles     " +
+                       SizeText(info.filesSize) + "\nchanges   " + std::to_string(info.newest) +
+                       "\njournal   " + JournalText(info);
     std::size_t count = 0;
     for (auto const& [type, number] : info.tickets)
         count += number;

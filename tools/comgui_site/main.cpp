@@ -45,12 +45,15 @@ public:
     {
         m_app.require_subcommand(0, 1);  // none is noted below, once unknown words were
         m_app.set_version_flag("--version", "comgui_site " COMGUI_SITE_VERSION);
-        m_app.add_option("--site", m_request.site, "The folder of the site, or its database")->type_name("SITE")->expected(1);
+        m_app.add_option("--site", m_request.site, "The folder of the site, or its database")
+            ->type_name("SITE")
+            ->expected(1);
         m_app.footer(
             "SITE is the folder of the site: the word before the command, unless that is the name of a "
             "command "
             "itself (then\nwrite ./info, or --site info). Without it: $COMGUI_SITE, or else comgui/site in "
-            "$XDG_DATA_HOME (~/.local/share).\nA site in a database is named postgresql://USER@HOST/DATABASE, "
+            "$XDG_DATA_HOME (~/.local/share).\nA site in a database is named "
+            "postgresql://USER@HOST/DATABASE, "
             "and $COMGUI_SITE_FOLDER is the folder of its files.\nOther programs may have the site open, but "
             "for restore and copy. comgui_site COMMAND --help describes a command.\n"
             "Exit status: 0 done; 1 failed, or problems were found; 2 the command line is wrong.");
@@ -178,13 +181,13 @@ private:
             "those of jobs that are not in\nthe backup move to job.replaced-DATE-TIME/.",
             RunRestore)
             ->add_option("FILE", m_request.file, "A file that backup has written");
-        CLI::App* const copy =
-            Add(m_app, "copy", "Make the same site at another place",
-                "FROM and TO are named as SITE is; one of them may be a database, so this moves a site from a "
-                "folder to a database\nor back. No program may have FROM open, and TO must be new: its folder "
-                "is empty or missing. Tickets, users and files\nare copied and then compared; only then TO is "
-                "there. FROM stays as it is: delete it when you no longer need it.",
-                RunCopy);
+        CLI::App* const copy = Add(
+            m_app, "copy", "Make the same site at another place",
+            "FROM and TO are named as SITE is; one of them may be a database, so this moves a site from a "
+            "folder to a database\nor back. No program may have FROM open, and TO must be new: its folder "
+            "is empty or missing. Tickets, users and files\nare copied and then compared; only then TO is "
+            "there. FROM stays as it is: delete it when you no longer need it.",
+            RunCopy);
         copy->add_option("FROM", m_request.from, "The site that is there");
         copy->add_option("TO", m_request.to, "The new one");
     }
@@ -241,7 +244,8 @@ private:
         while (!command->get_subcommands().empty())
             command = command->get_subcommands().front();
         if (command == &m_app)
-            return "the command (info, check, users, passwd, backup, restore, copy, export, import or follow)";
+            return "the command (info, check, users, passwd, backup, restore, copy, export, import or "
+                   "follow)";
         for (CLI::Option const* option : command->get_options())
             if (option->get_positional() && option->count() == 0 && option->get_name(true) != "TYPE[/ID]")
                 return option->get_name(true);

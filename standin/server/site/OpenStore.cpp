@@ -45,8 +45,9 @@ void CheckIsNobodys(std::filesystem::path const& folder)
 void CheckFolder(PostgresStore const& store, std::filesystem::path const& folder, std::string const& number)
 {
     if (number.empty())
-        RefuseFolder(store, folder, std::string("is not the folder of the site's files, as there is no ") +
-                                        NumberFile + " in it");
+        RefuseFolder(store, folder,
+                     std::string("is not the folder of the site's files, as there is no ") + NumberFile +
+                         " in it");
     if (number != store.SiteNumber())
         RefuseFolder(store, folder, "belongs to another site, with the number " + ForMessages(number));
 }

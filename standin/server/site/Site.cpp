@@ -101,7 +101,8 @@ void Put(Server& server, std::string_view key, TicketValue value)
 bool IsOpenElsewhere(SiteStore& store)
 {
     auto const programs = store.Programs();
-    return std::any_of(programs.begin(), programs.end(), [&](ProgramInfo const& program)
+    return std::any_of(programs.begin(), programs.end(),
+                       [&](ProgramInfo const& program)
                        { return program.isAlive && program.id != store.Self(); });
 }
 

@@ -9,7 +9,7 @@ namespace standin
 struct SiteName
 {
     std::filesystem::path folder;  // absolute, without a slash at the end
-    std::string database{};        // as libpq takes it, perhaps with a password; empty: the folder has its own
+    std::string database{};  // as libpq takes it, perhaps with a password; empty: the folder has its own
 
     // The site of this user: $COMGUI_SITE, or else comgui/site in the folder for data of programs. Throws
     // StoreError if the environment names none.

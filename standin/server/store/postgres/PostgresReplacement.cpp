@@ -28,8 +28,9 @@ PostgresReplacement::PostgresReplacement(std::string const& uri, Old old, Postgr
                                                 Clock::now() + m_options.connectLimit))
 {
     if (!postgres::KeepFromOpening(*m_connection, m_options.schema, Clock::now() + PatienceWithOthers))
-        throw StoreError(m_connection->Name() + ": another program is opening or replacing the site; wait until "
-                                                "that is done, then try again");
+        throw StoreError(m_connection->Name() +
+                         ": another program is opening or replacing the site; wait until "
+                         "that is done, then try again");
     m_hasOld = IsThere();
     if (m_hasOld && old == Old::Forbidden)
         throw StoreError(m_connection->Name() + ": there is a site already; name another database");
@@ -103,7 +104,8 @@ void PostgresReplacement::CheckIsNotOpen()
 std::string PostgresReplacement::FreeName()
 {
     return m_connection
-        ->Run("SELECT convert_from($1, 'UTF8') || to_char(clock_timestamp(), '\"_replaced_\"YYYYMMDD_HH24MISS_US')",
+        ->Run("SELECT convert_from($1, 'UTF8') || to_char(clock_timestamp(), "
+              "'\"_replaced_\"YYYYMMDD_HH24MISS_US')",
               Parameters() << std::string_view(m_options.schema), Deadline())
         .Text(0, 0);
 }

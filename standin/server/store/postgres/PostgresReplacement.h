@@ -15,8 +15,8 @@ public:
         SetAside,   // it gets another name, and the new one has its number
     };
 
-    // Begins it. Until it is finished, or the object goes, nobody can open the site that is there. Throws StoreError: also if
-    // programs have that open.
+    // Begins it. Until it is finished, or the object goes, nobody can open the site that is there. Throws
+    // StoreError: also if programs have that open.
     PostgresReplacement(std::string const& uri, Old old, PostgresOptions options = {});
     ~PostgresReplacement();  // nothing of it is left unless it was finished
     PostgresReplacement(PostgresReplacement const&) = delete;

@@ -49,7 +49,8 @@ PostgresStore::PostgresStore(std::string const& uri, std::function<StoreContent(
             opening.Connection(), m_options.schema, [&] { Fill(opening, first()); }, opening.Deadline());
         if (!TakeLock(opening.Connection(), LockOfOpening, opening.Deadline()))
             throw StoreError(
-                m_name + ": another program has been opening the site all the time; end that, then try again");
+                m_name +
+                ": another program has been opening the site all the time; end that, then try again");
         m_isOpening = true;
     }
     // Listens before it looks: what is committed after the look rings.
@@ -68,8 +69,7 @@ bool PostgresStore::TakeLock(Connection& connection, int lock, Clock::time_point
 {
     auto const isTaken = [&]
     {
-        return connection
-            .Run("SELECT pg_try_advisory_lock(lock_class(), $1)", Parameters() << lock, deadline)
+        return connection.Run("SELECT pg_try_advisory_lock(lock_class(), $1)", Parameters() << lock, deadline)
             .Bool(0, 0);
     };
     while (!isTaken())
@@ -362,7 +362,8 @@ PostgresStore::Load(TicketAddress address,
 // Of three columns: type, number, bytes.
 StoredValue PostgresStore::ValueOf(Result const& rows, int row, int column, TicketAddress address) const
 {
-    auto const bytes = rows.IsNull(row, column + 2) ? std::nullopt : std::optional(rows.Bytes(row, column + 2));
+    auto const bytes =
+        rows.IsNull(row, column + 2) ? std::nullopt : std::optional(rows.Bytes(row, column + 2));
     auto const value = FittingValue(rows.Int(row, column), rows.Integer(row, column + 1), bytes);
     if (!value)
         throw StoreError(m_name + ": a value of ticket " + std::to_string(address.type) + "/" +
@@ -382,10 +383,7 @@ std::optional<User> PostgresStore::FindUser(std::string_view name)
     return users.empty() ? std::nullopt : std::optional(std::move(users[0]));
 }
 
-std::vector<User> PostgresStore::Users()
-{
-    return UsersOf(Turn(*this).Run(SelectUsers));
-}
+std::vector<User> PostgresStore::Users() { return UsersOf(Turn(*this).Run(SelectUsers)); }
 
 std::vector<User> PostgresStore::UsersOf(Result const& rows)
 {

@@ -178,8 +178,8 @@ private:
     std::mutex m_turns;
     std::condition_variable m_turnEnded;
     bool m_isTaken = false;
-    std::unique_ptr<postgres::Connection> m_working;  // null: broken
-    std::uint64_t m_connected = 0;                    // how often
+    std::unique_ptr<postgres::Connection> m_working;             // null: broken
+    std::uint64_t m_connected = 0;                               // how often
     std::atomic<postgres::Clock::time_point> m_unbrokenSince{};  // the server and this program's connection
     postgres::Clock::time_point m_brokenSince{};
     postgres::GrowingPause m_pause;

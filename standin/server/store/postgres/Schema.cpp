@@ -298,7 +298,8 @@ public:
     bool Step(std::function<void()> const& fill)
     {
         Transaction transaction(m_connection, m_deadline);
-        Run("SELECT pg_advisory_xact_lock(" COMGUI_LOCK_OF_SCHEMA ")", Parameters() << std::string_view(m_schema));
+        Run("SELECT pg_advisory_xact_lock(" COMGUI_LOCK_OF_SCHEMA ")", Parameters()
+                                                                           << std::string_view(m_schema));
         int const version = FoundVersion();
         if (version == Version)
             return true;

@@ -64,7 +64,8 @@ private:
         auto const last = static_cast<Sequence>(m_database.Number(schema::SelectLastSequence));
         ForEachRow("SELECT type, id, incarnation, revision, "
                    "owner = 0 OR EXISTS (SELECT 1 FROM program WHERE program.id = owner) FROM ticket",
-                   [this, last](Database::Run const& row) {
+                   [this, last](Database::Run const& row)
+                   {
                        m_inspection.LookAtTicket({row.Int(0), row.Int(1)}, {row.Number(2), row.Number(3)},
                                                  last, row.Int(4) != 0);
                    });
@@ -86,8 +87,7 @@ private:
         auto expected =
             static_cast<Sequence>(m_database.Number("SELECT value FROM site WHERE name = 'pruned'")) + 1;
         ForEachRow("SELECT sequence, kind, type, id, record FROM journal ORDER BY sequence",
-                   [this, &expected](Database::Run const& row)
-                   {
+                   [this, &expected](Database::Run const& row) {
                        m_inspection.LookAtRecord(row.Number(0), expected, row.Int(1),
                                                  {row.Int(2), row.Int(3)}, row.Bytes(4));
                    });
@@ -187,10 +187,10 @@ void SqliteStore::ReadContent(std::function<void(TicketChange&&)> const& takeTic
     database.ReportDamageTo([this] { m_page->NoteDamage(); });
     Database::Transaction const moment(database, Database::Transaction::Read);
     long long const total = database.Number("SELECT count(*) FROM parameter");
-    Database::Statement const rows = database.Prepare(
-        "SELECT t.type, t.id, p.key, p.pos, p.value_type, p.value FROM ticket t "
-        "LEFT JOIN parameter p ON p.ticket_type = t.type AND p.ticket_id = t.id "
-        "WHERE t.owner = 0 ORDER BY t.type, t.id, p.key, p.pos");
+    Database::Statement const rows =
+        database.Prepare("SELECT t.type, t.id, p.key, p.pos, p.value_type, p.value FROM ticket t "
+                         "LEFT JOIN parameter p ON p.ticket_type = t.type AND p.ticket_id = t.id "
+                         "WHERE t.owner = 0 ORDER BY t.type, t.id, p.key, p.pos");
     Database::Run run(database, rows);
     TicketAssembly tickets(takeTicket);
     for (long long done = 0; run.Step(); ++done)

@@ -224,7 +224,8 @@ std::unique_ptr<SiteStore::UsersTurn> SqliteStore::TakeUsersTurn(std::chrono::mi
     };
     CheckUsable();
     auto turn = std::make_unique<Turn>(m_folder);
-    return turn->lock.LockWithin(LockFile::Users, LockFile::Hold::Exclusive, limit) ? std::move(turn) : nullptr;
+    return turn->lock.LockWithin(LockFile::Users, LockFile::Hold::Exclusive, limit) ? std::move(turn)
+                                                                                    : nullptr;
 }
 
 // The note of the database as it is, if it is all in one file.
