@@ -8,6 +8,7 @@
 #include <chrono>
 #include <cstdlib>
 #include <cstring>
+#include <filesystem>
 #include <functional>
 #include <gmock/gmock.h>
 #include <thread>
@@ -145,6 +146,22 @@ TEST_F(LostDatabase, IsToldByIsAlive_WhileReadsGoOnAndWritesAreRefused)
         EXPECT_TRUE(Becomes([&] { return Write(6 + round) == 1; }));
         EXPECT_EQ(Read(), 6 + round);
     }
+}
+
+TEST_F(LostDatabase, WhoseFilesOthersHaveElsewhere_IsNotOpened)
+{
+    std::filesystem::path const known = std::getenv("COMGUI_SITE_FOLDER");
+    std::filesystem::path const elsewhere = known.parent_path() / "elsewhere";
+    std::filesystem::create_directory(elsewhere);
+    std::filesystem::copy_file(known / "site.number", elsewhere / "site.number");
+    setenv("COMGUI_SITE_FOLDER", elsewhere.c_str(), 1);
+    testing::internal::CaptureStderr();
+    EXPECT_EQ(IsAlive(), MODULE_SITE_UNAVAILABLE);
+    EXPECT_EQ(testing::internal::GetCapturedStderr(),
+              elsewhere.string() + ": programs that have the site open have its files in " + known.string() +
+                  "; mount them there on this machine too, or end those programs first\n");
+    setenv("COMGUI_SITE_FOLDER", known.c_str(), 1);
+    EXPECT_EQ(IsAlive(), 0);
 }
 
 TEST_F(ModuleCutOff, HearsWhatWasChangedMeanwhile_WhenItIsBack)
