@@ -34,6 +34,7 @@ private:
 std::unique_ptr<LastingSite> MakeSite() { return std::make_unique<SiteInASchema>(); }
 
 using PostgresOpening = PostgresSite;
+using PostgresUsers = PostgresSite;
 using PostgresFolder = PostgresSite;
 
 class PostgresCheck : public PostgresSite
@@ -241,4 +242,12 @@ TEST_F(PostgresReplacing, KeepsOthersFromOpening)
     replacement->Finish();
     replacement.reset();
     EXPECT_EQ(opening.get(), 2);
+}
+
+// --- users
+
+TEST_F(PostgresUsers, TurnThatIsFree_NeedsNoPatience)
+{
+    auto const store = schema.Open();
+    EXPECT_NE(store->TakeUsersTurn(0ms), nullptr);
 }

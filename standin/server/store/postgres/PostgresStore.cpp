@@ -64,12 +64,15 @@ PostgresStore::PostgresStore(std::string const& uri, std::function<StoreContent(
         EndOpening();
 }
 
-// Not by waiting in the server, which would end the statement after a limit of its own.
-bool PostgresStore::TakeLock(Connection& connection, int lock, Clock::time_point deadline)
+// Not by waiting in the server, which would end the statement after a limit of its own. Who has little
+// patience for others has as much for the server's answer as anybody.
+bool PostgresStore::TakeLock(Connection& connection, int lock, Clock::time_point deadline) const
 {
     auto const isTaken = [&]
     {
-        return connection.Run("SELECT pg_try_advisory_lock(lock_class(), $1)", Parameters() << lock, deadline)
+        return connection
+            .Run("SELECT pg_try_advisory_lock(lock_class(), $1)", Parameters() << lock,
+                 Clock::now() + m_options.statementLimit)
             .Bool(0, 0);
     };
     while (!isTaken())

@@ -131,7 +131,7 @@ private:
 
     void Fill(Turn& turn, StoreContent const& content) const;
     void Register();
-    static bool TakeLock(postgres::Connection& connection, int lock, postgres::Clock::time_point deadline);
+    bool TakeLock(postgres::Connection& connection, int lock, postgres::Clock::time_point deadline) const;
     std::unique_ptr<postgres::Connection> OwnConnection() const;
     bool IsForeign() const noexcept;
     void CheckUsable() const;

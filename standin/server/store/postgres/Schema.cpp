@@ -362,9 +362,10 @@ private:
 bool KeepFromOpening(Connection& connection, std::string const& schema, Clock::time_point deadline)
 {
     constexpr std::chrono::milliseconds Pause(10);
+    constexpr std::chrono::seconds AnswerLimit(5);  // the server may be slow when the others are done
     while (!connection
                 .Run("SELECT pg_try_advisory_lock(" COMGUI_LOCK_OF_SCHEMA ")",
-                     Parameters() << std::string_view(schema), deadline + Pause)
+                     Parameters() << std::string_view(schema), Clock::now() + AnswerLimit)
                 .Bool(0, 0))
     {
         if (Clock::now() >= deadline)
