@@ -1,6 +1,7 @@
 #include "tests/store/SteadyWriter.h"
 
 #include "tests/store/StoreContract.h"
+#include <chrono>
 #include <new>
 #include <set>
 #include <stdexcept>
@@ -24,12 +25,6 @@ std::shared_ptr<WRITERS_BOARD> WRITERS_BOARD::Make()
     if (memory == MAP_FAILED)
         throw std::bad_alloc();
     return {new (memory) WRITERS_BOARD, [](WRITERS_BOARD* board) { munmap(board, sizeof *board); }};
-}
-
-long long WRITERS_BOARD::Now()
-{
-    auto const now = std::chrono::steady_clock::now().time_since_epoch();
-    return std::chrono::duration_cast<std::chrono::milliseconds>(now).count();
 }
 
 StoreContent ContentOfWriters()
@@ -60,7 +55,6 @@ void SteadyWriter::Run(long long steps)
     {
         Step(m_own.steps + 1);
         ++m_own.steps;
-        m_own.lastStep = WRITERS_BOARD::Now();
     }
     m_isDone = true;
     m_store.Interrupt();
@@ -106,7 +100,6 @@ void SteadyWriter::Do(std::function<CHANGE()> const& plan)
         std::optional<CHANGE> change;
         Persist([&] { change.emplace(plan()); });
         isMade = IsMade(*change);
-        m_own.retries += isMade ? 0 : 1;
     }
 }
 
@@ -116,9 +109,7 @@ bool SteadyWriter::IsMade(CHANGE const& change)
     CommitOutcome outcome;
     try
     {
-        auto const start = WRITERS_BOARD::Now();
         outcome = m_store.Commit(change, m_number);
-        m_board.longestCall = std::max<long long>(m_board.longestCall, WRITERS_BOARD::Now() - start);
     }
     catch (StoreError const&)
     {
@@ -130,6 +121,7 @@ bool SteadyWriter::IsMade(CHANGE const& change)
         Persist([&] { found = m_store.FindCommit(m_number); });
         return found.has_value();
     }
+    ++m_own.answers;
     return outcome.kind == CommitOutcome::Committed;
 }
 

@@ -6,7 +6,6 @@
 #include "standin/server/store/StoreContent.h"
 #include <array>
 #include <atomic>
-#include <chrono>
 #include <functional>
 #include <memory>
 #include <string>
@@ -22,21 +21,18 @@ struct WRITERS_BOARD
 
     struct WRITER
     {
-        std::atomic<long long> steps{0};  // done; three changes each
-        std::atomic<long long> retries{0};
-        std::atomic<long long> lastStep{0};       // when, see Now()
+        std::atomic<long long> steps{0};          // done; three changes each
+        std::atomic<long long> answers{0};        // of the store, to commits
         std::atomic<standin::Sequence> heard{0};  // of the feed
     };
     std::array<WRITER, Most> writers;
-    std::atomic<bool> isOver{false};       // they end after the step that they are at
-    std::atomic<bool> isGivenUp{false};    // they throw
-    std::atomic<int> torn{0};              // changes of which a part was seen
-    std::atomic<int> gaps{0};              // in somebody's feed
-    std::atomic<int> buried{0};            // programs, all of which live
-    std::atomic<long long> longestCall{};  // in ms
+    std::atomic<bool> isOver{false};     // they end after the step that they are at
+    std::atomic<bool> isGivenUp{false};  // they throw
+    std::atomic<int> torn{0};            // changes of which a part was seen
+    std::atomic<int> gaps{0};            // in somebody's feed
+    std::atomic<int> buried{0};          // programs, all of which live
 
     static std::shared_ptr<WRITERS_BOARD> Make();
-    static long long Now();  // in ms, of all processes
 };
 
 // What every board's site begins with.

@@ -4,6 +4,8 @@
 #include "standin/server/store/postgres/PostgresStore.h"
 #include "tests/store/SteadyWriter.h"
 #include "tests/support/ChildProcess.h"
+#include "tests/support/sanitizers.h"
+#include <chrono>
 #include <gtest/gtest.h>
 #include <limits>
 #include <memory>
@@ -46,20 +48,18 @@ public:
         return true;
     }
 
-    // Waits until every writer has done so many steps more, or gives up after a minute, false.
+    // Waits until every writer has done so many steps more; gives up after a minute, false.
     bool AwaitSteps(long long more) const
     {
-        std::vector<long long> goals;
-        for (int i = 0; i < Count(); ++i)
-            goals.push_back(Writer(i).steps + more);
-        return Await([&](int i) { return Writer(i).steps >= goals[static_cast<std::size_t>(i)]; });
+        return AwaitMore([](WRITERS_BOARD::WRITER const& writer) { return writer.steps.load(); }, more);
     }
 
-    // As long as it takes each writer to finish a step that was begun after this call; in ms.
-    long long TimeUntilAllWork() const
+    // Expects that every writer gets an answer to a commit that begins after this call, and soon.
+    void ExpectAnswers(std::chrono::seconds limit) const
     {
-        auto const start = WRITERS_BOARD::Now();
-        return AwaitSteps(2) ? WRITERS_BOARD::Now() - start : std::numeric_limits<long long>::max();
+        auto const start = std::chrono::steady_clock::now();
+        EXPECT_TRUE(AwaitMore([](WRITERS_BOARD::WRITER const& writer) { return writer.answers.load(); }, 2));
+        EXPECT_LT(std::chrono::steady_clock::now() - start, limit * (IsSanitized ? 4 : 1));
     }
 
     // Expects that all of them end well.
@@ -93,14 +93,17 @@ private:
 
     WRITERS_BOARD::WRITER const& Writer(int i) const { return board->writers[static_cast<std::size_t>(i)]; }
 
-    template <typename Condition>
-    bool Await(Condition const& condition) const
+    template <typename Number>
+    bool AwaitMore(Number const& number, long long more) const
     {
-        auto const end = WRITERS_BOARD::Now() + 60'000;
+        std::vector<long long> goals;
         for (int i = 0; i < Count(); ++i)
-            while (!condition(i))
+            goals.push_back(number(Writer(i)) + more);
+        auto const end = std::chrono::steady_clock::now() + std::chrono::minutes(1);
+        for (int i = 0; i < Count(); ++i)
+            while (number(Writer(i)) < goals[static_cast<std::size_t>(i)])
             {
-                if (WRITERS_BOARD::Now() > end)
+                if (std::chrono::steady_clock::now() > end)
                     return false;
                 std::this_thread::sleep_for(std::chrono::milliseconds(1));
             }

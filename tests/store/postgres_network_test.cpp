@@ -199,7 +199,7 @@ TEST_F(PostgresNetwork, AgainAndAgain_LosesNothingAndMakesNothingTwice)
         proxy.Lose(NetworkProxy::None);
         std::this_thread::sleep_for(std::chrono::milliseconds(random() % 500));
     }
-    EXPECT_LT(writers.TimeUntilAllWork(), 10'000);
+    writers.ExpectAnswers(10s);
     writers.Finish();
     ExpectWorkOf(*writers.board, writers.Count(), *writersSchema.Open());
 }

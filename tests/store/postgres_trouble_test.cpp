@@ -109,7 +109,7 @@ TEST_F(PostgresTrouble, CrashOfTheServer_LosesNothingAndMakesNothingTwice)
                                     "AND pid <> pg_backend_pid() LIMIT 1")),
              SIGKILL);
         schema.cluster.AwaitAnswer();
-        EXPECT_LT(writers.TimeUntilAllWork(), 5000);
+        writers.ExpectAnswers(5s);
     }
     writers.Finish();
     ExpectWorkOf(*writers.board, writers.Count(), *schema.Open());
@@ -126,25 +126,29 @@ TEST_F(PostgresTrouble, NoConnectionLeft_IsSaidAndEndsByItself)
     {
         try
         {
-            for (;; crowd.emplace_back(uri))
-                SqlSession(uri).Run("SELECT 1");
+            for (;;)
+                crowd.emplace_back(uri).Run("SELECT 1");
         }
         catch (std::runtime_error const&)
         {
             // There is no connection left.
         }
     };
-    fill();
-    ASSERT_THAT(crowd, Not(IsEmpty()));
-    Terminate(*store);
-    fill();
-    ExpectReason(ReasonOf([&] { store->Users(); }), "connection slots", "raise max_connections");
-    ExpectReason(ReasonAtOnce([&] { store->Users(); }), "connection slots", "raise max_connections");
+    std::string reason;
+    auto start = Clock::now();
+    while (reason.empty())
+    {
+        ASSERT_LT(Clock::now() - start, 60s);
+        Terminate(*store);
+        fill();
+        reason = ReasonOf([&] { store->Users(); });  // what has just ended may still leave it a connection
+    }
+    ExpectReason(reason, "connection slots", "raise max_connections");
     EXPECT_TRUE(store->IsReachable());
     crowd.clear();
-    auto const start = Clock::now();
+    start = Clock::now();
     while (!ReasonOf([&] { store->Users(); }).empty())
-        ASSERT_LT(Clock::now() - start, 5s);
+        ASSERT_LT(Clock::now() - start, 20s);
 }
 
 // --- the server's disk
