@@ -51,6 +51,10 @@ NetworkProxy::NetworkProxy(std::filesystem::path server)
     m_wokenEnd = Descriptor(ends[0]);
     m_wakingEnd = Descriptor(ends[1]);
     NeverWait(m_wokenEnd);
+}
+
+void NetworkProxy::Start()
+{
     m_thread = std::thread([this] { Run(); });
 }
 
@@ -58,7 +62,8 @@ NetworkProxy::~NetworkProxy()
 {
     m_isOver = true;
     Wake();
-    m_thread.join();
+    if (m_thread.joinable())
+        m_thread.join();
 }
 
 void NetworkProxy::Lose(Loss loss)

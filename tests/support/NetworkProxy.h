@@ -14,6 +14,9 @@ class NetworkProxy
 public:
     // server: the socket that is spoken to for whoever connects. Throws std::system_error.
     explicit NetworkProxy(std::filesystem::path server);
+
+    // Begins to pass on; who connects before that waits. A process makes copies of itself best before.
+    void Start();
     ~NetworkProxy();
     NetworkProxy(NetworkProxy const&) = delete;
     NetworkProxy& operator=(NetworkProxy const&) = delete;
