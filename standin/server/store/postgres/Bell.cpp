@@ -2,10 +2,7 @@
 
 #include <algorithm>
 #include <charconv>
-#include <fcntl.h>
 #include <poll.h>
-#include <system_error>
-#include <unistd.h>
 
 namespace standin::postgres
 {
@@ -27,12 +24,6 @@ constexpr std::chrono::milliseconds Patience = 300ms;
 Bell::Bell(Target target, Limits const& limits, Calls calls, Reach& reach, Hurry& hurry)
     : m_target(std::move(target)), m_limits(limits), m_calls(std::move(calls)), m_reach(reach), m_hurry(hurry)
 {
-    int ends[2];
-    if (pipe2(ends, O_CLOEXEC | O_NONBLOCK) != 0)
-        throw StoreError("cannot make a pipe (" + std::generic_category().message(errno) +
-                         "); close some files, then try again");
-    m_wokenEnd = Descriptor(ends[0]);
-    m_wakingEnd = Descriptor(ends[1]);
     Listen(m_limits.connect);
     m_thread = std::thread([this] { Run(); });
 }
@@ -41,7 +32,7 @@ Bell::~Bell()
 {
     m_isOver = true;
     m_hurry.Begin();
-    Wake();
+    m_wakeup.Wake();
     if (m_thread.joinable())
         m_thread.join();
 }
@@ -52,7 +43,7 @@ void Bell::Ring(Sequence newest) noexcept
     while (known < newest && !m_toRing.compare_exchange_weak(known, newest))
         ;
     if (known < newest && !m_isAsked.exchange(true))
-        Wake();
+        m_wakeup.Wake();
 }
 
 void Bell::Abandon() noexcept
@@ -61,9 +52,6 @@ void Bell::Abandon() noexcept
         m_connection->Abandon();
     m_thread.detach();
 }
-
-// A full pipe wakes as well.
-void Bell::Wake() noexcept { [[maybe_unused]] ssize_t const ignored = write(m_wakingEnd.Number(), "", 1); }
 
 // A ring must not wait for the disk: nothing is lost with it.
 void Bell::Listen(std::chrono::milliseconds limit)
@@ -165,12 +153,10 @@ void Bell::Ask(char const* sql, Parameters const& parameters)
 void Bell::Hear(Clock::time_point end)
 {
     auto const left = std::chrono::ceil<std::chrono::milliseconds>(end - Clock::now());
-    pollfd waiting[] = {{m_wokenEnd.Number(), POLLIN, 0},
+    pollfd waiting[] = {{m_wakeup.Number(), POLLIN, 0},
                         {m_connection ? m_connection->Socket() : -1, POLLIN, 0}};
     poll(waiting, 2, static_cast<int>(std::max<std::int64_t>(left.count(), 0)));
-    char bytes[64];
-    while (read(m_wokenEnd.Number(), bytes, sizeof bytes) > 0)
-        ;
+    m_wakeup.Clear();
     if (waiting[1].revents != 0)
     {
         m_connection->TakeIn();

@@ -8,9 +8,9 @@
 // seconds, a ring or else a question a second, or connecting again, is noted as a loss. For any thread.
 #pragma once
 
-#include "standin/server/files/Descriptor.h"
 #include "standin/server/store/postgres/Connection.h"
 #include "standin/server/store/postgres/Reach.h"
+#include "standin/server/store/postgres/Wakeup.h"
 #include <atomic>
 #include <functional>
 #include <memory>
@@ -82,14 +82,13 @@ private:
     void Hear(Clock::time_point end);
     void HearRings();
     void SendRing();
-    void Wake() noexcept;
 
     Target const m_target;
     Limits const m_limits;
     Calls const m_calls;
     Reach& m_reach;
     Hurry& m_hurry;
-    Descriptor m_wakingEnd, m_wokenEnd;  // a pipe, so that the thread waits for it and the socket at once
+    Wakeup m_wakeup;
     std::atomic<Sequence> m_toRing{0};
     std::atomic<bool> m_isAsked{false};  // to ring
     std::atomic<bool> m_isOver{false};

@@ -2,12 +2,10 @@
 
 #include <algorithm>
 #include <cerrno>
-#include <fcntl.h>
 #include <libpq-fe.h>
 #include <poll.h>
 #include <system_error>
 #include <tuple>
-#include <unistd.h>
 #include <utility>
 
 namespace standin::postgres
@@ -258,18 +256,6 @@ long long Result::Changes() const
 }
 
 void Connection::Close::operator()(pg_conn* connection) const noexcept { PQfinish(connection); }
-
-Hurry::Hurry()
-{
-    int ends[2];
-    if (pipe2(ends, O_CLOEXEC | O_NONBLOCK) != 0)
-        throw StoreError("cannot make a pipe (" + std::generic_category().message(errno) +
-                         "); close some files, then try again");
-    m_begun = Descriptor(ends[0]);
-    m_beginning = Descriptor(ends[1]);
-}
-
-void Hurry::Begin() noexcept { [[maybe_unused]] ssize_t const ignored = write(m_beginning.Number(), "", 1); }
 
 // What is a host's own; nothing for libpq's choice.
 struct Connection::Host

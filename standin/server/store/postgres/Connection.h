@@ -7,8 +7,8 @@
 // several statements could still be moved.
 #pragma once
 
-#include "standin/server/files/Descriptor.h"
 #include "standin/server/store/Store.h"
+#include "standin/server/store/postgres/Wakeup.h"
 #include <array>
 #include <chrono>
 #include <concepts>
@@ -144,14 +144,12 @@ class Hurry
 public:
     static constexpr std::chrono::milliseconds Limit{300};
 
-    Hurry();  // throws StoreError
-
     // From now on no wait takes longer than the limit. Once and for all.
-    void Begin() noexcept;
-    int Begun() const { return m_begun.Number(); }  // readable from then on
+    void Begin() noexcept { m_beginning.Wake(); }
+    int Begun() const { return m_beginning.Number(); }  // a descriptor, readable from then on
 
 private:
-    Descriptor m_beginning, m_begun;
+    Wakeup m_beginning;
 };
 
 class Connection
