@@ -6,6 +6,7 @@
 #include <csignal>
 #include <future>
 #include <gmock/gmock.h>
+#include <set>
 #include <thread>
 
 using namespace standin;
@@ -424,6 +425,19 @@ TEST_F(PostgresDeath, InQuietTimes_IsFollowedByABurialInTheSecondRound)
     EXPECT_EQ(burier->Bury(LeaveAlone), 0);
     std::this_thread::sleep_for(700ms);
     EXPECT_EQ(burier->Bury(LeaveAlone), 1);
+}
+
+TEST_F(PostgresDeath, OfWhoWasSeenAliveOrHasComeSince_IsNoneOfTheServer)
+{
+    PostgresOptions options = AtOnce();
+    options.settling = 1h;
+    auto const young = schema.Open(options);
+    EXPECT_EQ(young->Bury([](Estate const&) { ADD_FAILURE(); }), 0);
+    ProgramId const come = schema.Open()->Self();
+    store.reset();
+    std::set<ProgramId> buried;
+    EXPECT_EQ(young->Bury([&](Estate const& estate) { buried.insert(estate.program); }), 2);
+    EXPECT_TRUE(buried.contains(come));
 }
 
 TEST_F(PostgresDeath, IsNoReasonToBury_ForWhoseConnectionIsYoung)

@@ -49,31 +49,37 @@ int PostgresStore::Bury(std::function<void(Estate const&)> const& clear)
     return buried;
 }
 
-// After a break of this program's own connection it looks anew who is missing.
+// When the server breaks down, all programs are missing at first and come back one by one. Who was seen alive
+// over the connection that this program still has, or has come since, is missing for a reason of its own.
 std::vector<ProgramId> PostgresStore::DueForBurial()
 {
-    std::vector<ProgramId> due;
+    std::uint64_t connection = 0;
+    Clock::time_point connectedSince;
+    {
+        Turn const turn(*this);
+        connection = m_connected;
+        connectedSince = m_connectedSince;
+    }
     auto const programs = Programs();
     auto const now = Clock::now();
-    bool const isSettled = now - m_unbrokenSince.load() >= m_options.settling;
     std::lock_guard const lock(m_burials);
-    std::map<ProgramId, Clock::time_point> missing;
-    if (!isSettled)
-    {
-        m_missing.clear();
-        return due;
-    }
+    if (m_looks.connection != connection)
+        m_looks = {connection, programs.empty() ? 0 : programs.back().id, {}, {}};
+    LOOKS looks{connection, m_looks.newest, {}, {}};
+    std::vector<ProgramId> due;
     for (ProgramInfo const& program : programs)
     {
+        bool const isKnown = m_looks.known.contains(program.id) || program.id > m_looks.newest;
+        if (program.isAlive || isKnown)
+            looks.known.insert(program.id);
         if (program.isAlive)
             continue;
-        auto const known = m_missing.find(program.id);
-        auto const since = known == m_missing.end() ? now : known->second;
-        missing[program.id] = since;
-        if (now - since >= m_options.grace)
+        auto const since = m_looks.missing.try_emplace(program.id, now).first->second;
+        looks.missing[program.id] = since;
+        if (now - since >= m_options.grace && (isKnown || now - connectedSince >= m_options.settling))
             due.push_back(program.id);
     }
-    m_missing = std::move(missing);
+    m_looks = std::move(looks);
     return due;
 }
 

@@ -128,7 +128,7 @@ void PostgresStore::Register()
         "(extract(epoch FROM clock_timestamp() - pg_postmaster_start_time()) * 1000)::bigint FROM site");
     m_siteNumber = found.Text(0, 0);
     m_isTidy = found.Bool(0, 1);
-    m_unbrokenSince = Clock::now() - std::chrono::milliseconds(std::max(0LL, found.Integer(0, 2)));
+    m_connectedSince = Clock::now() - std::chrono::milliseconds(std::max(0LL, found.Integer(0, 2)));
     Result const registered =
         turn.Run("SELECT self, heard, lock_class() FROM register_program($1, $2, $3, $4)",
                  Parameters() << static_cast<long long>(m_process) << std::string_view(m_machine)
@@ -291,7 +291,7 @@ void PostgresStore::Attempt(Clock::time_point deadline, std::chrono::millisecond
         if (m_self != 0)
             TakeLifeBack(deadline);
         ++m_connected;
-        m_unbrokenSince = Clock::now();
+        m_connectedSince = Clock::now();
         m_pause.Reset();
     }
     catch (StoreError const& error)

@@ -48,8 +48,9 @@ struct PostgresOptions
     // after a break of its own connection, and two rounds of who clears up.
     std::chrono::milliseconds grace{600};
 
-    // Nobody is buried by a program that has come back from a break of its own since, nor so soon after the
-    // server has started: when that breaks down all are gone, and come back one by one.
+    // Who was not seen alive over its own connection is buried by a program only when that is older, or, if
+    // it is its first, the server has been up for longer: when that breaks down all are gone, and come back
+    // one by one.
     std::chrono::milliseconds settling{10'000};
 
     // How often the working connection is looked after.
@@ -178,10 +179,9 @@ private:
     std::mutex m_turns;
     std::condition_variable m_turnEnded;
     bool m_isTaken = false;
-    std::unique_ptr<postgres::Connection> m_working;             // null: broken
-    std::uint64_t m_connected = 0;                               // how often
-    std::atomic<postgres::Clock::time_point> m_unbrokenSince{};  // the server and this program's connection
-    postgres::Clock::time_point m_brokenSince{};
+    std::unique_ptr<postgres::Connection> m_working;  // null: broken
+    std::uint64_t m_connected = 0;                    // how often
+    postgres::Clock::time_point m_connectedSince{}, m_brokenSince{};
     postgres::GrowingPause m_pause;
     postgres::Clock::time_point m_nextAttempt{};
     std::string m_failure;                     // of the last attempt
@@ -204,8 +204,15 @@ private:
     std::unique_ptr<postgres::Bell> m_bell;
 
     std::mutex m_burials;
-    std::set<ProgramId> m_burying;                               // by threads of this handle
-    std::map<ProgramId, postgres::Clock::time_point> m_missing;  // since when
+    std::set<ProgramId> m_burying;  // by threads of this handle
+    struct LOOKS                    // for programs that are missing
+    {
+        std::uint64_t connection;  // over which
+        ProgramId newest;          // at the first look
+        std::set<ProgramId> known;
+        std::map<ProgramId, postgres::Clock::time_point> missing;  // since when
+    };
+    LOOKS m_looks{std::numeric_limits<std::uint64_t>::max(), 0, {}, {}};
 
     std::mutex m_unknowns;
     std::map<std::uint64_t, Sequence> m_unknown;  // numbers not asked after yet, and what was known then
