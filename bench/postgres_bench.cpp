@@ -1,6 +1,6 @@
-// Writes of the PostgreSQL store beside pgbench, which runs the same statement with the same content on the same
-// server: the difference is what the store adds. The server is this program's own and does not wait for the
-// disk, so that the disk's noise is in neither.
+// Writes of the PostgreSQL store beside pgbench, which runs the same statement with the same content on the
+// same server: the difference is what the store adds. The server is this program's own and does not wait for
+// the disk, so that the disk's noise is in neither.
 #include "bench/ratio_report.h"
 #include "standin/server/store/ChangeRecord.h"
 #include "standin/server/store/postgres/PostgresStore.h"
@@ -96,7 +96,8 @@ std::string Script()
            "SELECT answer, last AS revision FROM commit_change(1, 3, :id, 0, 16777215, NULL, "
            "1000000 + :client_id, :number, '\\x" +
            Hex(record) +
-           "', ARRAY[3], ARRAY[:id]::integer[], ARRAY[:incarnation]::bigint[], ARRAY[:revision]::bigint[], 1, "
+           "', ARRAY[3], ARRAY[:id]::integer[], ARRAY[:incarnation]::bigint[], ARRAY[:revision]::bigint[], "
+           "1, "
            "'{}', '{}', '{}', ARRAY['Job/Copies'::bytea], ARRAY[0], ARRAY[" +
            std::to_string(PARAM_INT) + "], ARRAY[:number]::bigint[], ARRAY[NULL]::bytea[]) \\gset\n";
 }
@@ -110,8 +111,8 @@ double RateOfPgbench(int clients)
     std::string const number = std::to_string(clients);
     std::string const uri = Uri() + "?options=-csearch_path%3Dcomgui";
     std::string const command =
-        std::string(COMGUI_POSTGRESQL_PROGRAMS) + "/pgbench -n -M prepared -D number=0 -c " + number + " -j " +
-        number + " -T 2 -f '" + (folder.Path() / "script").string() + "' '" + uri + "' 2>/dev/null";
+        std::string(COMGUI_POSTGRESQL_PROGRAMS) + "/pgbench -n -M prepared -D number=0 -c " + number +
+        " -j " + number + " -T 2 -f '" + (folder.Path() / "script").string() + "' '" + uri + "' 2>/dev/null";
     std::FILE* const output = popen(command.c_str(), "r");
     double rate = 0;
     for (char line[256]; output && std::fgets(line, sizeof line, output);)
@@ -138,10 +139,9 @@ BENCHMARK(Pgbench)->Arg(1)->Arg(8)->Iterations(1)->UseManualTime();
 int main(int argc, char** argv)
 {
     constexpr double MostBesidePgbench = 1 / 0.7;
-    return RunAndReport(
-        argc, argv,
-        {{"a value written, one program", "Store/1/iterations:1/manual_time",
-          "Pgbench/1/iterations:1/manual_time", MostBesidePgbench, GOAL::ELAPSED_TIME},
-         {"the same, eight programs", "Store/8/iterations:1/manual_time", "Pgbench/8/iterations:1/manual_time",
-          MostBesidePgbench, GOAL::ELAPSED_TIME}});
+    return RunAndReport(argc, argv,
+                        {{"a value written, one program", "Store/1/iterations:1/manual_time",
+                          "Pgbench/1/iterations:1/manual_time", MostBesidePgbench, GOAL::ELAPSED_TIME},
+                         {"the same, eight programs", "Store/8/iterations:1/manual_time",
+                          "Pgbench/8/iterations:1/manual_time", MostBesidePgbench, GOAL::ELAPSED_TIME}});
 }
