@@ -65,3 +65,17 @@ TEST_F(PostgresFailover, ToAStandbyThatIsNone_IsNamedAndFailsAtOnceUntilItIsProm
     EXPECT_EQ(store.Sessions().at(0).id, session);
     EXPECT_EQ(writer.Make({3, 2}).sequence, 2u);
 }
+
+// The standby has been there for long, but nobody has had the time to come back to it.
+TEST_F(PostgresFailover, IsNoReasonToBury_ForWhoOpensTheSiteAfterIt)
+{
+    PostgresOptions options = AtOnce();
+    options.settling = 5s;
+    PostgresStore store(Uri(), NoContent, options);
+    standby->Await("SELECT clock_timestamp() - pg_postmaster_start_time() > '5 s'", "t");
+    primary.Kill();
+    standby->Promote();
+    PostgresStore fresh(Uri(), NoContent, options);
+    EXPECT_EQ(fresh.Bury([](Estate const&) { ADD_FAILURE(); }), 0);
+    EXPECT_FALSE(fresh.Programs().at(0).isAlive);
+}

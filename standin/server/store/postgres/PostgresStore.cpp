@@ -123,9 +123,12 @@ void PostgresStore::Fill(Turn& turn, StoreContent const& content) const
 void PostgresStore::Register()
 {
     Turn turn(*this);
+    // The writer of the log runs since the server takes changes: since its start, a crash, or its promotion.
+    // Who may not see that counts from now.
     Result const found = turn.Run(
         "SELECT number::text, NOT EXISTS (SELECT FROM program WHERE id NOT IN (SELECT program FROM living)), "
-        "(extract(epoch FROM clock_timestamp() - pg_postmaster_start_time()) * 1000)::bigint FROM site");
+        "coalesce((SELECT extract(epoch FROM clock_timestamp() - a.backend_start) * 1000 FROM "
+        "pg_stat_activity a WHERE a.backend_type = 'walwriter'), 0)::bigint FROM site");
     m_siteNumber = found.Text(0, 0);
     m_isTidy = found.Bool(0, 1);
     m_connectedSince = Clock::now() - std::chrono::milliseconds(std::max(0LL, found.Integer(0, 2)));
