@@ -48,6 +48,14 @@ public:
         return true;
     }
 
+    long long StepsOfAll() const
+    {
+        long long all = 0;
+        for (int i = 0; i < Count(); ++i)
+            all += Writer(i).steps;
+        return all;
+    }
+
     // Waits until every writer has done so many steps more; gives up after a minute, false.
     bool AwaitSteps(long long more) const
     {
