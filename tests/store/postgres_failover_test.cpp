@@ -70,9 +70,9 @@ TEST_F(PostgresFailover, ToAStandbyThatIsNone_IsNamedAndFailsAtOnceUntilItIsProm
 TEST_F(PostgresFailover, IsNoReasonToBury_ForWhoOpensTheSiteAfterIt)
 {
     PostgresOptions options = AtOnce();
-    options.settling = 5s;
+    options.settling = 10s;
     PostgresStore store(Uri(), NoContent, options);
-    standby->Await("SELECT clock_timestamp() - pg_postmaster_start_time() > '5 s'", "t");
+    standby->Await("SELECT clock_timestamp() - pg_postmaster_start_time() > '10 s'", "t");
     primary.Kill();
     standby->Promote();
     PostgresStore fresh(Uri(), NoContent, options);
