@@ -66,12 +66,13 @@ TEST_F(PostgresFailover, ToAStandbyThatIsNone_IsNamedAndFailsAtOnceUntilItIsProm
     EXPECT_EQ(writer.Make({3, 2}).sequence, 2u);
 }
 
-// The standby has been there for long, but nobody has had the time to come back to it.
+// The standby has been there for long, but others have not had the time to come back to it. One that knows no
+// other host never does.
 TEST_F(PostgresFailover, IsNoReasonToBury_ForWhoOpensTheSiteAfterIt)
 {
     PostgresOptions options = AtOnce();
     options.settling = 10s;
-    PostgresStore store(Uri(), NoContent, options);
+    PostgresStore const store(primary.Uri(), NoContent, options);
     standby->Await("SELECT clock_timestamp() - pg_postmaster_start_time() > '10 s'", "t");
     primary.Kill();
     standby->Promote();

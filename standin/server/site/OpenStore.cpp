@@ -69,7 +69,6 @@ std::unique_ptr<SiteStore> OpenDatabase(SiteName const& name, std::function<Stor
     auto const firstInFolder = [&]
     {
         CheckIsNobodys(name.folder);
-        MakePrivateFolders({name.folder});
         return first();
     };
     auto store = std::make_unique<PostgresStore>(name.database, firstInFolder, std::move(options));

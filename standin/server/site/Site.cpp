@@ -70,6 +70,7 @@ std::unique_ptr<SiteStore> StoreOf(SiteName const& name, std::filesystem::path c
 {
     auto const first = [&folder = name.folder, &shippedSeed]
     {
+        MakePrivateFolders({folder});
         Seed const seed = SeedOfSite(folder, shippedSeed);
         SetJobFoldersAside(folder / "job");  // the jobs that they belong to are gone
         return seed.Content();
