@@ -5,6 +5,7 @@
 #include <algorithm>
 #include <cerrno>
 #include <fcntl.h>
+#include <utility>
 
 namespace standin
 {
@@ -232,6 +233,11 @@ void TransferService::Stop(std::chrono::milliseconds patience)
     m_work.notify_all();
     for (RunningTransfer& running : m_running)
         running.Cut();
-    m_done.wait_for(lock, patience, [this] { return m_running.empty(); });
+    if (!m_done.wait_for(lock, patience, [this] { return m_running.empty(); }))
+        return;
+    std::thread ending = std::exchange(m_thread, {});
+    lock.unlock();
+    if (ending.joinable())
+        ending.join();
 }
 }  // namespace standin
