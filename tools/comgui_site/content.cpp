@@ -8,7 +8,6 @@ namespace comgui_site
 {
 namespace
 {
-using standin::ParameterChange;
 using standin::SiteStore;
 using standin::Store;
 using standin::StoredValue;

@@ -3,6 +3,8 @@
 
 #include <filesystem>
 #include <string>
+#include <string_view>
+#include <tuple>
 
 namespace standin
 {
@@ -21,8 +23,10 @@ struct SiteName
 
     bool IsDatabase() const { return !database.empty(); }
 
-    friend bool operator==(SiteName const&, SiteName const&) = default;
-    friend auto operator<=>(SiteName const&, SiteName const&) = default;
+    friend bool operator<(SiteName const& left, SiteName const& right)
+    {
+        return std::tie(left.folder, left.database) < std::tie(right.folder, right.database);
+    }
 };
 
 // Whether a name of a site is that of a database.

@@ -65,7 +65,7 @@ std::string PostgresReplacement::Finish()
     m_store->Leave();
     std::string const name = m_connection->Quoted(m_options.schema);
     std::string const made = m_connection->Quoted(NewNameFor(m_options));
-    std::string const aside = m_hasOld ? FreeName() : "";
+    std::string aside = m_hasOld ? FreeName() : "";
     std::string all = "BEGIN;";
     if (m_hasOld)
         all += "UPDATE " + made + ".site SET (number, has_folder) = (SELECT number, has_folder FROM " + name +
