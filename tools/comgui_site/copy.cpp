@@ -9,6 +9,7 @@
 #include "tools/comgui_site/Trouble.h"
 #include "tools/comgui_site/Workplace.h"
 #include "tools/comgui_site/content.h"
+#include <algorithm>
 #include <fstream>
 
 namespace comgui_site
@@ -33,6 +34,15 @@ void CheckIsEmpty(path const& folder)
             !standin::IsTemporary(entry.path().filename().string(), ".copy"))
             throw Trouble(folder.string() + ": is not empty: there is " + entry.path().filename().string() +
                           " in it; name a folder of the copy's own");
+}
+
+// It would be copied into itself.
+void CheckIsOutside(path const& folder, path const& site)
+{
+    path const place = std::filesystem::weakly_canonical(folder);
+    path const around = std::filesystem::weakly_canonical(site);
+    if (std::mismatch(around.begin(), around.end(), place.begin(), place.end()).first == around.end())
+        throw Trouble(folder.string() + ": is in the folder of the first site; name one outside of it");
 }
 
 bool HasSameBytes(path const& left, path const& right)
@@ -84,12 +94,21 @@ public:
             });
     }
 
-    // To where they will be, once all of them are there.
-    void MoveTo(path const& folder) const
+    // To where they will be, once all of them are there; and back, if the site does not come to be.
+    void MoveTo(path const& folder)
     {
         for (auto const& entry : std::filesystem::directory_iterator(m_to))
+        {
             std::filesystem::rename(entry.path(), folder / entry.path().filename());
+            m_moved.push_back(entry.path().filename());
+        }
         standin::FlushFolder(folder);
+    }
+    void MoveBackFrom(path const& folder) noexcept
+    {
+        std::error_code ignored;
+        for (path const& name : m_moved)
+            std::filesystem::rename(folder / name, m_to / name, ignored);
     }
 
 private:
@@ -128,6 +147,7 @@ private:
     path const m_from;
     path const m_to;
     Copied& m_copied;
+    std::vector<path> m_moved;
 };
 
 void Compare(OpenedSite& source, NewDatabase& target)
@@ -144,6 +164,7 @@ try
     OpenedSite source(from, OpenedSite::Others::Wait);
     CheckIsAlone(source);
     CheckIsEmpty(to.folder);
+    CheckIsOutside(to.folder, from.folder);
     standin::MakePrivateFolders({to.folder});
     Workplace const workplace(to.folder / ".copy");
     path const database = workplace.Folder() / "database";
@@ -158,8 +179,16 @@ try
     files.Compare();
     target->Store().Tickets([&](auto const&, auto const&) { ++copied.tickets; });
     copied.users = target->Store().Users().size();
-    files.MoveTo(to.folder);
-    target->Finish();
+    try
+    {
+        files.MoveTo(to.folder);
+        target->Finish();
+    }
+    catch (...)
+    {
+        files.MoveBackFrom(to.folder);
+        throw;
+    }
     source.Leave();
     return copied;
 }

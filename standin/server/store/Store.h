@@ -94,7 +94,7 @@ struct Estate
     };
     ProgramId program = 0;
     std::vector<Ticket> tickets;         // that it owned
-    std::vector<std::string> partFiles;  // absolute paths, on this machine
+    std::vector<std::string> partFiles;  // absolute paths, on its machine
 };
 
 class Store

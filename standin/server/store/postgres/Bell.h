@@ -96,7 +96,7 @@ private:
     // The thread's own.
     std::unique_ptr<Connection> m_connection;
     Sequence m_rung = 0;
-    Clock::time_point m_nextRing{}, m_nextQuestion{}, m_nextLook{};
+    Clock::time_point m_nextRing{}, m_nextLook{};
     Clock::time_point m_lastAnswer{};
     std::optional<Clock::time_point> m_brokenSince;
     GrowingPause m_pause;
