@@ -6,6 +6,7 @@
 #include <condition_variable>
 #include <iostream>
 #include <mutex>
+#include <random>
 #include <sstream>
 #include <thread>
 
@@ -28,21 +29,26 @@ constexpr int RunShift = 42;
 
 void Print(std::string const& line) { std::cout << line << std::endl; }
 
-// When to do the next of so many things a second.
+// When to do the next of so many things a second on average. They come independently of each other, as those
+// of people do: at equal distances all clients would do theirs in the same moment, every time.
 class Pace
 {
 public:
-    explicit Pace(double perSecond)
-        : m_step(perSecond > 0 ? static_cast<std::int64_t>(1e9 / perSecond) : 0), m_next(Now())
+    Pace(double perSecond, int client)
+        : m_isPaced(perSecond > 0), m_distance(m_isPaced ? perSecond / 1e9 : 1),
+          m_random(static_cast<unsigned>(client)), m_next(Now())
     {
+        Done();
     }
 
-    bool IsDue() { return m_step == 0 || Now() >= m_next; }
-    void Done() { m_next += m_step; }
-    std::int64_t Next() const { return m_step == 0 ? 0 : m_next; }
+    bool IsDue() { return !m_isPaced || Now() >= m_next; }
+    void Done() { m_next += static_cast<std::int64_t>(m_distance(m_random)); }
+    std::int64_t Next() const { return m_isPaced ? m_next : 0; }
 
 private:
-    std::int64_t const m_step;
+    bool const m_isPaced;
+    std::exponential_distribution<> m_distance;  // nanoseconds
+    std::mt19937_64 m_random;
     std::int64_t m_next;
 };
 
@@ -127,8 +133,8 @@ public:
 
     void Work(std::int64_t end)
     {
-        Pace writing(m_task.changesPerSecond);
-        Pace reading(m_task.readsPerSecond);
+        Pace writing(m_task.changesPerSecond, 2 * m_task.number);
+        Pace reading(m_task.readsPerSecond, 2 * m_task.number + 1);
         while (Now() < end)
         {
             if (m_task.writes && writing.IsDue())

@@ -3,9 +3,11 @@
 #include "comgui/session/TCommandRecord.h"
 #include "standin/module/ModuleCodes.h"
 #include "standin/module/ValueWords.h"
+#include "standin/server/files/RefusableCall.h"
 #include "standin/server/files/Report.h"
 #include <algorithm>
 #include <cstring>
+#include <iterator>
 
 namespace standin
 {
@@ -58,6 +60,37 @@ int SetCallback(Container const& container, STICKET_ACCESS const* ticket)
                                              [callback, user](Notification const& notification)
                                              { Notify(callback, user, notification); });
     return registered ? MODULE_DONE : MODULE_UNKNOWN_SESSION;
+}
+
+int GetReason(STICKET_ACCESS const* ticket)
+{
+    if (!ticket)
+        return MODULE_INVALID_ARGUMENT;
+    std::string const reason = RefusableCall::TakeReason();
+    bool const isThere = !reason.empty();
+    bool const isTaken =
+        ticket->SSETPARAMETER(ticket->Instance, "Reason/Text", isThere ? PARAM_STRING : PARAM_NONE,
+                              isThere ? reason.c_str() : nullptr, -1);
+    return isTaken ? MODULE_DONE : MODULE_INVALID_ARGUMENT;
+}
+
+int GetProgress(Container const& container, STICKET_ACCESS const* ticket)
+{
+    if (!ticket)
+        return MODULE_INVALID_ARGUMENT;
+    auto const progress = container.Server().Transfers().ProgressOf(container.Session());
+    SETMULTIPAR table[3] = {};
+    long long numbers[] = {progress ? progress->done : 0, progress ? progress->size : 0};
+    char const* const keys[] = {"Transfer/Done", TransferSizeKey};
+    for (std::size_t i = 0; i < std::size(keys); ++i)
+    {
+        table[i].key = keys[i];
+        table[i].type = progress ? PARAM_INT64 : PARAM_NONE;
+        table[i].value = progress ? &numbers[i] : nullptr;
+        table[i].pos = -1;
+    }
+    bool const isTaken = ticket->SSETMULTIPAR(ticket->Instance, table) && table[0].ok && table[1].ok;
+    return isTaken ? MODULE_DONE : MODULE_INVALID_ARGUMENT;
 }
 
 TCommandRecord* RecordIn(int size, void* data)
@@ -114,15 +147,13 @@ int SetFolder(Container const& container, Session::ClientFolder which, int size,
     container.Session().SetFolder(which, folder);
     return MODULE_DONE;
 }
-}  // namespace
 
-int RunCommand(Container const& container, char const* command, int size, void* data)
+int RunSessionsCommand(Container const& container, std::string_view name, int size, void* data)
 {
-    if (!command)
-        return MODULE_INVALID_ARGUMENT;
-    std::string_view const name = command;
     if (name == "local.set.callback")
         return SetCallback(container, static_cast<STICKET_ACCESS const*>(data));
+    if (name == "local.get.progress")
+        return GetProgress(container, static_cast<STICKET_ACCESS const*>(data));
     if (name == "local.set.previewfolder")
         return SetFolder(container, Session::PreviewFolder, size, static_cast<char const*>(data));
     if (name == "local.set.thumbnailfolder")
@@ -134,5 +165,16 @@ int RunCommand(Container const& container, char const* command, int size, void* 
         return MODULE_NOT_SUPPORTED;
     TCommandRecord* const record = RecordIn(size, data);
     return record ? work(container, *record) : MODULE_INVALID_ARGUMENT;
+}
+}  // namespace
+
+int RunCommand(Container const* container, char const* command, int size, void* data)
+{
+    std::string_view const name = command ? command : "";
+    if (name == "local.get.reason")
+        return GetReason(static_cast<STICKET_ACCESS const*>(data));
+    if (!container)
+        return MODULE_UNKNOWN_SESSION;
+    return command ? RunSessionsCommand(*container, name, size, data) : MODULE_INVALID_ARGUMENT;
 }
 }  // namespace standin

@@ -12,7 +12,9 @@ template <typename Work>
 int Slot(void* instance, Work const& work) noexcept
 {
     auto* const container = static_cast<Container*>(instance);
-    return container ? Guarded<int>(0, [&] { return work(*container) ? 1 : 0; }) : 0;
+    RefusableCall call;
+    int const result = container ? Guarded<int>(0, [&] { return work(*container) ? 1 : 0; }) : 0;
+    return call.Ended(result, result != 0);
 }
 
 template <typename Work>

@@ -22,11 +22,18 @@ namespace
 constexpr unsigned LoopbackAddress = 0x7F000001;
 
 template <typename Work>
+int AnyEntry(Work const& work) noexcept
+{
+    RefusableCall call;
+    int const code = Guarded<int>(MODULE_FAILED, work);
+    return call.Ended(code, code == MODULE_DONE);
+}
+
+template <typename Work>
 int Entry(void* hInstance, Work const& work) noexcept
 {
-    return Guarded<int>(MODULE_FAILED,
-                        [&]() -> int
-                        { return Handles::Get().IsInstance(hInstance) ? work() : MODULE_UNKNOWN_INSTANCE; });
+    return AnyEntry([&]() -> int
+                    { return Handles::Get().IsInstance(hInstance) ? work() : MODULE_UNKNOWN_INSTANCE; });
 }
 
 // An entry for a session that is logged in; work gets its container.
@@ -77,14 +84,14 @@ int FindServer(char const* host, int port, OpenSite*& site)
 
 int Open(void** hInstance)
 {
-    return Guarded<int>(MODULE_FAILED,
-                        [&]() -> int
-                        {
-                            if (!hInstance)
-                                return MODULE_INVALID_ARGUMENT;
-                            *hInstance = Handles::Get().NewInstance();
-                            return MODULE_DONE;
-                        });
+    return AnyEntry(
+        [&]() -> int
+        {
+            if (!hInstance)
+                return MODULE_INVALID_ARGUMENT;
+            *hInstance = Handles::Get().NewInstance();
+            return MODULE_DONE;
+        });
 }
 
 int Initialize(void* hInstance, TLogin* login, int)
@@ -192,9 +199,8 @@ int GetTicketData(void* hInstance, void* hSession, int type, int id, int format,
 
 int SendCommand(void* hInstance, void* hSession, char const* command, int size, void* data)
 {
-    return SessionEntry(hInstance, hSession,
-                        [&](Container const& container)
-                        { return RunCommand(container, command, size, data); });
+    return Entry(hInstance,
+                 [&] { return RunCommand(Handles::Get().SessionOf(hSession), command, size, data); });
 }
 
 template <int (*Work)(Container const&, char const*, char const*)>
@@ -212,12 +218,17 @@ int SendJobFile(void* hInstance, void* hSession, TJobIdentification* record, cha
 
 STICKET_ACCESS const* CreateTicket(char const* path)
 {
-    return Guarded<STICKET_ACCESS const*>(nullptr, [path] { return LocalTickets::Get().Create(path); });
+    RefusableCall call;
+    auto const* const ticket =
+        Guarded<STICKET_ACCESS const*>(nullptr, [path] { return LocalTickets::Get().Create(path); });
+    return call.Ended(ticket, ticket != nullptr);
 }
 
 void DestroyTicket(STICKET_ACCESS const** ticket)
 {
-    Guarded<bool>(false, [ticket] { return LocalTickets::Get().Destroy(ticket), true; });
+    RefusableCall call;
+    if (!Guarded<bool>(false, [ticket] { return LocalTickets::Get().Destroy(ticket); }))
+        call.Refuse();
 }
 
 STicketFactory ticketFactory{{}, CreateTicket, DestroyTicket};

@@ -5,15 +5,18 @@
 
 #include "standin/server/files/ForkedChild.h"
 #include "standin/server/files/NotCancelled.h"
-#include <cstdio>
+#include "standin/server/files/RefusableCall.h"
+#include "standin/server/files/Report.h"
 #include <exception>
 
 namespace standin
 {
-inline void TellOfFailure(char const* reason) noexcept
+[[gnu::noinline, gnu::cold]] inline void TellOfFailure(char const* reason) noexcept
 {
     NotCancelled const here;
-    std::fprintf(stderr, "ComGUI.Bundle: a call failed%s%s\n", *reason ? ": " : "", reason);
+    RefusableRead read;
+    Report({"a call failed", *reason ? ": " : "", reason}, "ComGUI.Bundle: ");
+    read.Refuse();
 }
 
 // For reads, which have to be fast: only the feed blocks in them, and looks after that itself.

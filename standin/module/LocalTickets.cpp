@@ -46,25 +46,27 @@ STICKET_ACCESS const* LocalTickets::Create(char const* path)
     return access;
 }
 
-void LocalTickets::Destroy(STICKET_ACCESS const** ticket)
+bool LocalTickets::Destroy(STICKET_ACCESS const** ticket)
 {
     if (!ticket)
-        return;
+        return true;
     decltype(m_tickets)::node_type node;
     {
         std::lock_guard const lock(m_lock);
         node = m_tickets.extract(*ticket);
     }
     if (!node)
-        return;
+        return true;
     *ticket = nullptr;
     try
     {
         node.mapped()->Save();
+        return true;
     }
     catch (FileError const& error)
     {
         Report(error.what());
+        return false;
     }
 }
 }  // namespace standin

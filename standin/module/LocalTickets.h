@@ -19,8 +19,8 @@ public:
     STICKET_ACCESS const* Create(char const* path);
 
     // Saves and frees the ticket, and clears the caller's pointer. A ticket that cannot be saved is one line
-    // on stderr, and gone as well. Nothing happens for a pointer that is null or no ticket of these.
-    void Destroy(STICKET_ACCESS const** ticket);
+    // on stderr, and gone as well: false. Nothing happens for a pointer that is null or no ticket of these.
+    bool Destroy(STICKET_ACCESS const** ticket);
 
 private:
     std::mutex m_lock;

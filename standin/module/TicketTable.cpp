@@ -12,7 +12,9 @@ template <typename Work>
 int Slot(void* instance, Work const& work) noexcept
 {
     auto* const subject = static_cast<TicketSubject*>(instance);
-    return subject ? Guarded<int>(0, [&] { return work(*subject) ? 1 : 0; }) : 0;
+    RefusableCall call;
+    int const result = subject ? Guarded<int>(0, [&] { return work(*subject) ? 1 : 0; }) : 0;
+    return call.Ended(result, result != 0);
 }
 
 template <typename Work>

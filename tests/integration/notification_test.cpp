@@ -57,6 +57,20 @@ protected:
         return all;
     }
 
+    // Waits until the queue has one, and leaves it there.
+    static void WaitForOne()
+    {
+        auto const end = std::chrono::steady_clock::now() + std::chrono::minutes(2);
+        bool isThere = false;
+        while (!isThere && std::chrono::steady_clock::now() < end)
+        {
+            std::this_thread::yield();
+            wxCriticalSectionLocker const lock(ComGUIManager::m_csNotificationList);
+            isThere = !ComGUIManager::m_notificationList.empty();
+        }
+        EXPECT_TRUE(isThere);
+    }
+
     // The Backward session's record is the one whose id a test can see.
     void Listen(int type, std::vector<char const*> keys = {})
     {
@@ -94,6 +108,24 @@ TEST_F(Notification, OfAWrite_ArrivesInTheQueueWithItsValue)
     EXPECT_EQ(all[0]->NotifPos, -1);
     EXPECT_EQ(all[1]->NotifKey, "Test/Number");
     EXPECT_EQ(all[1]->NotifNumber, -5.0);
+}
+
+TEST_F(Notification, LeftInTheQueueAtTheLogout_IsThereForTheNextSession_ByDesign)
+{
+    Listen(3, {"Test/*"});
+    int const id = writer.iGUINotificationID;
+    WriteInt("Test/Number", 1);
+    WaitForOne();
+    Manager().DisableNotifications(&writer, 3);
+    Manager().LogoutBackward(&writer);
+
+    ASSERT_EQ(Manager().InitializeBackward(&writer, 1), 0);
+    ASSERT_EQ(Manager().LoginBackward(&writer), 0);
+    Listen(3);
+    auto const all = TakeNotifications();
+    ASSERT_EQ(all.size(), 1u);
+    EXPECT_EQ(all[0]->NotifArgB, id);
+    EXPECT_NE(writer.iGUINotificationID, id);  // so a host can tell
 }
 
 TEST_F(Notification, OfAVector_IsOneForItsKey)

@@ -1,6 +1,11 @@
 // What two sessions of one process see of each other's work, through the library and the real bundle.
 #include "tests/integration/Host.h"
 
+#include <chrono>
+#include <fstream>
+#include <future>
+#include <string>
+
 namespace
 {
 class TwoSessions : public Host
@@ -41,6 +46,34 @@ TEST_F(TwoSessions, HaveHandlesContainersAndEndPointsOfTheirOwn)
     ASSERT_NE(container, nullptr);
     EXPECT_NE(container, Manager().GetClientContainer());
     EXPECT_NE(wxString::FromUTF8(second.szLocalEndPoint), Manager().GetLocalEndPoint());
+}
+
+TEST_F(OneSession, ManagerOfItsOwn_SendsAJobOnAnotherThread)
+{
+    ASSERT_EQ(LogIn(), 0);
+    static ComGUIManager& sender =
+        *new ComGUIManager;  // to the end of the process: none gives its plug-in back
+    sender.Initialize("operator", "operator", "localhost", 50000);
+    ASSERT_EQ(sender.Login("operator", "operator", "localhost", 50000), 0);
+    EXPECT_NE(sender.GetLocalEndPoint(), Manager().GetLocalEndPoint());
+
+    auto const file = folder.Path() / "large.pdf";
+    for (int i = 0; i < 20; ++i)
+        std::ofstream(file, std::ios::app) << std::string(1'000'000, 'x');
+    auto sending = std::async(std::launch::async,
+                              [&]
+                              {
+                                  int const job = sender.PrepareJob(file.string(), 0, 0, -1, 0, 0);
+                                  return sender.UploadJob(file.string(), 0, 0, 0, 0) != 0 ? job : -1;
+                              });
+    do
+        EXPECT_EQ(WriteInt("Test/Number", 815), 1);
+    while (sending.wait_for(std::chrono::seconds(0)) != std::future_status::ready);
+    int const job = sending.get();
+    int state = -1;
+    EXPECT_EQ(Manager().GetParameter(3, job, "Job/State", PARAM_INT, &state, -1), 1);
+    EXPECT_EQ(state, 1);
+    sender.Logout();
 }
 
 TEST_F(TwoSessions, OneReadsWhatTheOtherWrote)

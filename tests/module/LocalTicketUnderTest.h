@@ -68,3 +68,14 @@ private:
     TICKET_FACTORY const& m_factory;
     STICKET_ACCESS const* m_access;
 };
+
+// What local.get.reason gives to this thread; "none" for nothing.
+inline std::string TakeReason(MODULE const& module)
+{
+    TICKET_FACTORY const factory;
+    TICKET const ticket(factory, nullptr);
+    EXPECT_EQ(module->SendCommandEntry(module.Instance(), nullptr, "local.get.reason", 0,
+                                       const_cast<STICKET_ACCESS*>(ticket.Access())),
+              0);
+    return ticket.Text("Reason/Text");
+}

@@ -32,3 +32,16 @@ std::string TextOf(PARAM_TYPE type, void const* word)
         return "of type " + std::to_string(type);
     }
 }
+
+std::vector<std::string> ContentOf(STICKET_ACCESS const* ticket)
+{
+    std::vector<std::string> content;
+    auto const add = [](void* context, char const* key, PARAM_TYPE type, void const* word, int pos)
+    {
+        static_cast<std::vector<std::string>*>(context)->push_back(
+            std::string(key) + "@" + std::to_string(pos) + "=" + TextOf(type, word));
+        return true;
+    };
+    ticket->SWALKPARAMETERS(ticket->Instance, add, &content, nullptr, 0);
+    return content;
+}

@@ -1,15 +1,19 @@
 // The module over a site in a database that cannot be reached for a while.
 #include "comgui/session/TCommandRecord.h"
 #include "standin/module/ModuleCodes.h"
+#include "standin/server/jobs/JobFolder.h"
 #include "standin/server/store/postgres/PostgresStore.h"
 #include "tests/module/ModuleUnderTest.h"
 #include "tests/module/NotificationListener.h"
+#include "tests/support/Files.h"
 #include "tests/support/PostgresCluster.h"
 #include <chrono>
+#include <csignal>
 #include <cstdlib>
 #include <cstring>
 #include <filesystem>
 #include <functional>
+#include <future>
 #include <gmock/gmock.h>
 #include <thread>
 
@@ -67,6 +71,31 @@ protected:
         return code;
     }
 
+    static std::string Database()
+    {
+        std::string const uri = std::getenv("COMGUI_SITE");
+        return uri.substr(uri.rfind('/') + 1);
+    }
+
+    // The program of another machine.
+    static std::unique_ptr<PostgresStore> Another(PostgresOptions const& options = {})
+    {
+        return std::make_unique<PostgresStore>(
+            std::getenv("COMGUI_SITE"), []() -> StoreContent { throw StoreError("no site"); }, options);
+    }
+
+    // As another program writes it.
+    static TicketChange WriteTo(Store& store, TicketAddress address, char const* key, int value)
+    {
+        auto const loaded = store.Load(address, [](auto, int, auto const&) {});
+        TicketChange change;
+        change.address = address;
+        change.incarnation = loaded->state.incarnation;
+        change.revision = loaded->state.revision;
+        change.parameters.push_back({key, -1, TicketValue::Int(value), false});
+        return change;
+    }
+
     int Read(char const* key = "Key") const { return client.Read(Job.type, Job.id, key); }
     int Write(int value) const { return client.Write(Job.type, Job.id, "Key", value); }
 
@@ -80,13 +109,11 @@ class ModuleCutOff : public LostDatabase
 protected:
     ModuleCutOff()
     {
-        std::string const uri = std::getenv("COMGUI_SITE");
-        m_database = uri.substr(uri.rfind('/') + 1);
         std::string const own = PidsOfSite();
         PostgresOptions options;
         options.limits.journalKept = 0;
-        other = std::make_unique<PostgresStore>(
-            uri, []() -> StoreContent { throw StoreError("no site"); }, options);
+        options.settling = 0s;  // it keeps nothing for the module
+        other = Another(options);
         AllowConnections(false);
         cluster.Run("SELECT pg_terminate_backend(pid, 60000) FROM unnest(ARRAY[" + own + "]) pid");
     }
@@ -94,33 +121,70 @@ protected:
 
     void AllowConnections(bool are) const
     {
-        cluster.Run("ALTER DATABASE " + m_database + " ALLOW_CONNECTIONS " + (are ? "true" : "false"));
+        cluster.Run("ALTER DATABASE " + database + " ALLOW_CONNECTIONS " + (are ? "true" : "false"));
     }
 
-    // As another program writes it.
     void WriteElsewhere(char const* key, int value)
     {
-        auto const loaded = other->Load(Job, [](auto, int, auto const&) {});
-        TicketChange change;
-        change.kind = TicketChange::Write;
-        change.address = Job;
-        change.incarnation = loaded->state.incarnation;
-        change.revision = loaded->state.revision;
-        change.parameters.push_back({key, -1, TicketValue::Int(value), false});
-        EXPECT_EQ(other->Commit(change, ++m_number).kind, CommitOutcome::Committed);
+        EXPECT_EQ(other->Commit(WriteTo(*other, Job, key, value), ++m_number).kind, CommitOutcome::Committed);
     }
 
+    std::string const uri = std::getenv("COMGUI_SITE");
+    std::string const database = uri.substr(uri.rfind('/') + 1);
     std::unique_ptr<PostgresStore> other;
 
 private:
     std::string PidsOfSite() const
     {
         return cluster.Run("SELECT string_agg(pid::text, ',') FROM pg_stat_activity WHERE datname = '" +
-                           m_database + "'");
+                           database + "'");
     }
 
-    std::string m_database;
     std::uint64_t m_number = 0;
+};
+
+// Its bell's connection stands still, which it notices after two seconds at the earliest.
+class ModuleThatHearsNothing : public LostDatabase
+{
+protected:
+    ModuleThatHearsNothing()
+    {
+        // Only the working connection has locks.
+        m_bell = static_cast<pid_t>(std::stol(
+            cluster.Run("SELECT pid FROM pg_stat_activity WHERE datname = '" + Database() +
+                        "' AND pid NOT IN (SELECT pid FROM pg_locks WHERE locktype = 'advisory')")));
+        other = Another();
+        dying = Another();
+    }
+    ~ModuleThatHearsNothing() override { LetHear(true); }
+
+    void LetHear(bool hears) const { kill(m_bell, hears ? SIGCONT : SIGSTOP); }
+
+    // The folder of a job as it is sent, with a file in it.
+    static std::filesystem::path MakeJobFolder(int id)
+    {
+        std::filesystem::path const folder =
+            std::filesystem::path(std::getenv("COMGUI_SITE_FOLDER")) / "job" / std::to_string(id);
+        std::filesystem::create_directory(folder);
+        WriteFile(folder / (std::string(".job-") + Mark), "");
+        WriteFile(folder / "a.pdf", "content");
+        return folder;
+    }
+    static TicketChange CreationOfJob(int id)
+    {
+        TicketChange creation;
+        creation.kind = TicketChange::Create;
+        creation.address = {3, id};
+        creation.parameters.push_back({JobMarkKey, -1, TicketValue::String(Mark), false});
+        return creation;
+    }
+
+    std::unique_ptr<PostgresStore> other, dying;
+
+private:
+    static constexpr char Mark[] = "0123456789abcdef";
+
+    pid_t m_bell = -1;
 };
 }  // namespace
 
@@ -148,6 +212,34 @@ TEST_F(LostDatabase, IsToldByIsAlive_WhileReadsGoOnAndWritesAreRefused)
     }
 }
 
+TEST_F(LostDatabase, IsTheReasonOfEveryCallThatItFails)
+{
+    RECORD login;
+    std::pair<std::function<bool()>, char const*> const facts[] = {
+        {[&] { return IsAlive() == MODULE_SITE_UNAVAILABLE; }, "the site's database cannot be reached"},
+        {[&] { return IsAliveByCommand() == MODULE_SITE_UNAVAILABLE; },
+         "the site's database cannot be reached"},
+        {[&] { return Write(9) == 0; }, "the server does not answer"},
+        {[&] { return module->LoginEntry(module.Instance(), &login) == MODULE_SITE_UNAVAILABLE; },
+         "the server does not answer"},
+        {[&] { return PrepareJob() == MODULE_TARGET_UNWRITABLE; }, "no ticket can be made"},
+        // Of a ticket that nobody has read before.
+        {[&] { return client.Read(12, 1, "Key") == -1; }, "the server does not answer"},
+    };
+    cluster.Stop();
+    EXPECT_TRUE(Becomes([&] { return IsAlive() == MODULE_SITE_UNAVAILABLE; }));
+    for (int round = 0; round < 2; ++round)
+        for (auto const& [isRefused, reason] : facts)
+        {
+            EXPECT_TRUE(isRefused()) << reason;
+            EXPECT_THAT(TakeReason(module), testing::HasSubstr(reason));
+        }
+    EXPECT_EQ(Read(), 5);
+    EXPECT_EQ(TakeReason(module), "none");
+    cluster.Continue();
+    EXPECT_TRUE(Becomes([&] { return Write(5) == 1; }));
+}
+
 TEST_F(LostDatabase, WhoseFilesOthersHaveElsewhere_IsNotOpened)
 {
     std::filesystem::path const known = std::getenv("COMGUI_SITE_FOLDER");
@@ -162,6 +254,27 @@ TEST_F(LostDatabase, WhoseFilesOthersHaveElsewhere_IsNotOpened)
                   "; mount them there on this machine too, or end those programs first\n");
     setenv("COMGUI_SITE_FOLDER", known.c_str(), 1);
     EXPECT_EQ(IsAlive(), 0);
+}
+
+// The break comes while a write is on its way, and takes longer than a statement may.
+TEST_F(ModuleCutOff, DuringAWrite_AnswersItWhenItsOutcomeIsKnown)
+{
+    AllowConnections(true);
+    EXPECT_TRUE(Becomes([&] { return Write(6) == 1; }));
+    SqlSession const obstacle(uri);
+    obstacle.Run("BEGIN");
+    obstacle.Run("SELECT FROM comgui.ticket FOR UPDATE");
+    auto write = std::async(std::launch::async, [&] { return Write(7); });
+    std::string const waiting =
+        "FROM pg_stat_activity WHERE wait_event_type = 'Lock' AND datname = '" + database + "'";
+    cluster.Await("SELECT count(*) " + waiting, "1");
+    AllowConnections(false);
+    cluster.Run("SELECT pg_terminate_backend(pid, 60000) " + waiting);
+    obstacle.Run("ROLLBACK");
+    EXPECT_EQ(write.wait_for(12s), std::future_status::timeout);
+    AllowConnections(true);
+    EXPECT_EQ(write.get(), 1);
+    EXPECT_EQ(Read(), 7);
 }
 
 TEST_F(ModuleCutOff, HearsWhatWasChangedMeanwhile_WhenItIsBack)
@@ -196,4 +309,31 @@ TEST_F(ModuleCutOff, LogsInAgainByItself_AsFarAsTheSiteCanSee)
     EXPECT_EQ(other->Sessions().size(), 1u);
     EXPECT_EQ(client.Logout(), 0);
     EXPECT_EQ(other->Sessions().size(), 0u);
+}
+
+TEST_F(ModuleThatHearsNothing, TakesNoJobOfOthersForThatOfTheDead_AndWritesNoOldSystemTicket)
+{
+    namespace fs = std::filesystem;
+    fs::path const stray = MakeJobFolder(1'000'000);  // is looked at last
+    dying.reset();
+    std::this_thread::sleep_for(500ms);  // it is not buried before 600 ms
+    LetHear(false);
+    int last = 100;
+    std::uint64_t number = 0;
+    for (; fs::exists(stray) && IsAlive() == 0; ++last)
+    {
+        ASSERT_EQ(other->Commit(CreationOfJob(last), ++number).kind, CommitOutcome::Committed);
+        MakeJobFolder(last);
+        std::string const key = "Written/" + std::to_string(last);
+        ASSERT_EQ(other->Commit(WriteTo(*other, SystemTicket, key.c_str(), 1), ++number).kind,
+                  CommitOutcome::Committed);
+    }
+    LetHear(true);
+    EXPECT_TRUE(Becomes([&] { return !fs::exists(stray); }));
+    for (int id = 100; id < last; ++id)
+        EXPECT_TRUE(fs::exists(stray.parent_path() / std::to_string(id) / "a.pdf")) << id;
+    // The one before was written when there was still something to sweep.
+    std::string const written = "Written/" + std::to_string(last - 2) + '"';
+    fs::path const copy = stray.parent_path().parent_path() / "tickets/SYS_0000.xml";
+    EXPECT_TRUE(Becomes([&] { return ContentOf(copy).find(written) != std::string::npos; }));
 }

@@ -76,6 +76,27 @@ protected:
     std::unique_ptr<Program> living;
     std::unique_ptr<Program> dying;
 };
+
+// The living one does not hear what is committed, as one whose bell is out of order.
+class UnheardByTheLiving : public LeftByTheDead
+{
+protected:
+    UnheardByTheLiving()
+    {
+        living->server.Stop(std::chrono::minutes(1));
+        living->Tickets().Folders();  // known before
+        testing::internal::CaptureStderr();
+        site->Fail("ChangesSince", true);
+    }
+    ~UnheardByTheLiving() override { testing::internal::GetCapturedStderr(); }
+
+    void End()
+    {
+        dying->store.Die();
+        dying.reset();
+        living->server.Tidy();
+    }
+};
 }  // namespace
 
 TEST_F(LeftByTheDead, PreparedJob_GoesWithItsFolder)
@@ -202,6 +223,38 @@ TEST_F(LeftByTheDead, TransferInTheMiddle_GoesWithItsProgram)
     Make("temp/" + part);
     Kill();
     EXPECT_FALSE(Has("temp/" + part));
+}
+
+TEST_F(UnheardByTheLiving, JobOfAnother_KeepsItsFolder)
+{
+    MemoryStore sender(site);
+    for (int const id : {77, 78})
+    {
+        TicketChange creation;
+        creation.kind = TicketChange::Create;
+        creation.address = {JobTicketType, id};
+        creation.parameters.push_back({JobMarkKey, -1, TicketValue::String("0123456789abcdef"), false});
+        ASSERT_EQ(sender.Commit(creation, static_cast<std::uint64_t>(id)).kind, CommitOutcome::Committed);
+    }
+    Make("job/77/" + OtherMark);
+    Make("job/.removed-78-0123456789abcdef/" + OtherMark);
+    Make("job/79/" + OtherMark);
+    sender.Leave();
+    End();
+    EXPECT_EQ(living->store.Programs().size(), 1u);
+    EXPECT_THAT(NamesIn(folder / "job"), ElementsAre("77", "78"));
+}
+
+TEST_F(UnheardByTheLiving, PreparedJobOfTheDead_GoesWhenItIsHeardOf)
+{
+    Prepare();
+    End();
+    EXPECT_EQ(living->store.Programs().size(), 2u);
+    site->Fail("ChangesSince", false);
+    living->server.Tidy();
+    EXPECT_EQ(living->store.Programs().size(), 1u);
+    EXPECT_THAT(Jobs(), ElementsAre(1));
+    EXPECT_THAT(NamesIn(folder / "job"), IsEmpty());
 }
 
 // The disk may be full by what is to be cleared up.

@@ -2,6 +2,7 @@
 #include "standin/server/feed/Feed.h"
 
 #include "comgui/ticket/TICKET_ID.h"
+#include "standin/server/files/RefusableCall.h"
 #include "tests/server/EditedTicket.h"
 #include "tests/server/MemoryFolder.h"
 #include "tests/server/Program.h"
@@ -303,13 +304,13 @@ TEST_F(TwoPrograms, AWriteThatChangesNothing_IsNeitherCommittedNorTold)
 
 // --- commits of which nobody knows at first whether they were made
 
-class UnknownOutcome : public TwoPrograms, public testing::WithParamInterface<bool>
+class OutcomeUnknown : public TwoPrograms, public testing::WithParamInterface<bool>
 {
 protected:
     void BeUnknownOnce() { site->AnswerUnknownOnce(GetParam()); }
 };
 
-TEST_P(UnknownOutcome, AWrite_IsMadeExactlyOnce)
+TEST_P(OutcomeUnknown, AWrite_IsMadeExactlyOnce)
 {
     EARS ears(two);
     BeUnknownOnce();
@@ -321,7 +322,7 @@ TEST_P(UnknownOutcome, AWrite_IsMadeExactlyOnce)
     EXPECT_THAT(ears.Heard(2), ElementsAre("1 3/1 V@0=7", "1 3/1 V@1=8"));
 }
 
-TEST_P(UnknownOutcome, ACreation_IsMadeExactlyOnce)
+TEST_P(OutcomeUnknown, ACreation_IsMadeExactlyOnce)
 {
     BeUnknownOnce();
     EXPECT_EQ(one.Tickets().CreateNext(one.session, 12), 1);
@@ -332,7 +333,7 @@ TEST_P(UnknownOutcome, ACreation_IsMadeExactlyOnce)
     EXPECT_TRUE(one.Create(OtherJob));
 }
 
-TEST_P(UnknownOutcome, ADeletion_IsMade)
+TEST_P(OutcomeUnknown, ADeletion_IsMade)
 {
     BeUnknownOnce();
     EXPECT_TRUE(one.Delete(Job));
@@ -340,7 +341,7 @@ TEST_P(UnknownOutcome, ADeletion_IsMade)
     EXPECT_FALSE(two.Exists(Job));
 }
 
-TEST_P(UnknownOutcome, APointer_IsThereAfterwards)
+TEST_P(OutcomeUnknown, APointer_IsThereAfterwards)
 {
     int target = 0;
     BeUnknownOnce();
@@ -378,7 +379,7 @@ TEST(UnknownOutcomeInAShortJournal, AWrite_IsMadeExactlyOnce)
     EXPECT_EQ(two.Count(Job, "V"), 1);
 }
 
-INSTANTIATE_TEST_SUITE_P(Commits, UnknownOutcome, testing::Bool(),
+INSTANTIATE_TEST_SUITE_P(Commits, OutcomeUnknown, testing::Bool(),
                          [](auto const& happened) { return happened.param ? "Made" : "NotMade"; });
 
 // --- pointers
@@ -484,6 +485,27 @@ TEST_F(TwoPrograms, WhileTheStoreFails_KnownTicketsAreReadAndNothingIsWritten)
     EXPECT_TRUE(one.Set(OtherJob, "K", 9));
     EXPECT_EQ(two.Int(OtherJob, "K"), 9);
     EXPECT_TRUE(two.Create({3, 50}));
+}
+
+// On stderr it is told once at most: the feed's thread may have told something before.
+TEST_F(TwoPrograms, EveryReadThatTheStoreFails_HasItsReason)
+{
+    site->AddTicket(OtherJob);
+    Program three(site, folder.Path());
+    EXPECT_EQ(three.Int(Job, "K"), std::nullopt);  // is known from now on, and has no such key
+    RefusableCall::TakeReason();                   // another test's
+    testing::internal::CaptureStderr();
+    site->FailAll(true);
+    for (int i = 0; i < 3; ++i)
+    {
+        EXPECT_EQ(three.Int(OtherJob, "K"), std::nullopt);
+        EXPECT_THAT(RefusableCall::TakeReason(), HasSubstr("Load was told to fail")) << i;
+    }
+    EXPECT_EQ(three.Int(Job, "K"), std::nullopt);
+    EXPECT_EQ(RefusableCall::TakeReason(), "");
+    site->FailAll(false);
+    std::string const told = testing::internal::GetCapturedStderr();
+    EXPECT_EQ(told.find("Load"), told.rfind("Load")) << told;
 }
 
 TEST_F(TwoPrograms, WhatWasCommittedBeforeTheStoreFailed_ComesWhenItWorksAgain)

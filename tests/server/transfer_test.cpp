@@ -815,6 +815,110 @@ TEST_F(LaterTransfers, Logout_CutsTransfersOfOtherThreadsToo)
     EXPECT_EQ(result, TransferCut);
 }
 
+// --- how far a transfer is
+
+class TransferProgress : public LaterTransfers
+{
+protected:
+    // "done of size", or "none".
+    std::string ProgressOf(std::string const& user)
+    {
+        auto const progress = Server().Transfers().ProgressOf(As(user));
+        return progress ? std::to_string(progress->done) + " of " + std::to_string(progress->size) : "none";
+    }
+
+    // A put of the operator's on a thread of its own.
+    std::thread Putting(std::string const& name, std::size_t size, TransferResult due = Transferred)
+    {
+        return std::thread(
+            [this, due, &session = As("operator"), from = Write(name, Bytes(size)), to = "$(TEMP)/" + name]
+            {
+                auto const direction = TransferService::Request::ToServer;
+                EXPECT_EQ(Server().Transfers().Carry(session, {direction, from, to}), due);
+            });
+    }
+};
+
+TEST_F(TransferProgress, OfALaterTransfer_IsToldWhileItCopies)
+{
+    Close();
+    EXPECT_EQ(ProgressOf("operator"), "none");
+    PutLater("operator", Write("a", Bytes(3000)), "$(TEMP)/a");
+    PutLater("operator", Write("b", Bytes(700)), "$(TEMP)/b");
+    AwaitHeld();
+    EXPECT_EQ(ProgressOf("operator"), "1 of 3000");
+    EXPECT_EQ(ProgressOf("guest"), "none");
+    Listen("operator");
+    Open();
+    Calls(2);
+    EXPECT_EQ(ProgressOf("operator"), "none");
+}
+
+TEST_F(TransferProgress, OfAFetchedFile_CountsTheSameWay)
+{
+    WriteFile(Temp("a"), Bytes(3000));
+    Close();
+    As("operator");
+    std::thread get([&] { EXPECT_EQ(Get("$(TEMP)/a", Client("a")), Transferred); });
+    AwaitHeld();
+    EXPECT_EQ(ProgressOf("operator"), "1 of 3000");
+    Open();
+    get.join();
+    EXPECT_EQ(ProgressOf("operator"), "none");
+}
+
+TEST_F(TransferProgress, OfSeveral_IsOfTheOneThatBeganFirst)
+{
+    Close();
+    std::thread one = Putting("first", 3000);
+    AwaitHeld();
+    std::thread two = Putting("second", 700);
+    AwaitHeld(2);
+    EXPECT_EQ(ProgressOf("operator"), "1 of 3000");
+    Open();
+    one.join();
+    two.join();
+}
+
+TEST_F(TransferProgress, OfAJob_CountsItsFile)
+{
+    Close();
+    std::string const file = Write("a", Bytes(3000));
+    Session& session = As("operator");
+    std::thread send([&] { EXPECT_EQ(Server().Jobs().Send(session, file, "a"), Transferred); });
+    AwaitHeld();
+    EXPECT_EQ(ProgressOf("operator"), "1 of 3000");
+    Open();
+    send.join();
+    EXPECT_EQ(ProgressOf("operator"), "none");
+}
+
+TEST_F(TransferProgress, WhileOneIsCutByALogout_NeitherWaits)
+{
+    Close();
+    std::thread put = Putting("a", 3000, TransferCut);
+    AwaitHeld();
+    Session& session = As("operator");
+    std::thread logout([&] { Server().Logout(session); });
+    while (!session.Ended())
+        std::this_thread::yield();
+    EXPECT_EQ(ProgressOf("operator"), "1 of 3000") << "while the logout waits for it";
+    Open();
+    logout.join();
+    put.join();
+    EXPECT_EQ(ProgressOf("operator"), "none");
+}
+
+TEST_F(TransferProgress, NeverGoesDown_AndEndsAtTheSize)
+{
+    std::string const file = Write("a", Bytes(5000));
+    std::vector<std::string> told;
+    Server().Transfers().Set({1000, [&] { told.push_back(ProgressOf("operator")); }});
+    EXPECT_EQ(Put(file, "$(TEMP)/a"), Transferred);
+    EXPECT_THAT(told, ElementsAre("1000 of 5000", "2000 of 5000", "3000 of 5000", "4000 of 5000",
+                                  "5000 of 5000", "5000 of 5000"));
+}
+
 TEST_F(LaterTransfers, Stop_CutsThemAll)
 {
     Close();

@@ -182,6 +182,37 @@ TEST_F(LoginByRecord, FailingWhileLoggedIn_ClearsThatFlagAlone)
     EXPECT_TRUE(IsInitialized());
 }
 
+TEST_F(LoginByRecord, Refused_TriedAgainWithTheSameRecord_KeepsItsLocalPort)
+{
+    manager.Initialize(mine, 1);
+    unsigned int const port = mine->iLocalPort;
+    ASSERT_NE(port, 0u);
+    module.results["LoginEntry"] = 32;
+    manager.Login(mine);
+    module.results.clear();
+    stracpy(mine->szPassword, "right", sizeof mine->szPassword);
+    EXPECT_EQ(manager.Login(mine), 0);
+    EXPECT_EQ(module.copy.iLocalPort, port);
+    EXPECT_STREQ(module.copy.szPassword, "right");
+    EXPECT_THAT(module.calls, ElementsAre("InitializeEntry", "LoginEntry", "LoginEntry"));
+}
+
+TEST_F(LoginByRecord, Refused_TriedAgainWithANewRecord_HasNoLocalPort_ByDesign)
+{
+    manager.Initialize(mine, 1);
+    module.results["LoginEntry"] = 32;
+    manager.Login(mine);
+    module.results.clear();
+    TLogin* const other = NewRecord();
+    EXPECT_EQ(manager.Initialize(other, 1), 0);  // is initialised already
+    EXPECT_EQ(manager.Login(other), 0);
+    EXPECT_EQ(module.login, other);
+    EXPECT_EQ(module.copy.iLocalPort, 0u);
+    EXPECT_THAT(module.calls, ElementsAre("InitializeEntry", "LoginEntry", "LoginEntry"));
+    manager.Login(own);
+    std::free(other);
+}
+
 // --- Backward --------------------------------------------------------------------------------------------
 
 TEST_F(Login, Backward_TouchesNothingOfTheImplicitSession)

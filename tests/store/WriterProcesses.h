@@ -13,12 +13,14 @@
 #include <thread>
 #include <vector>
 
-// The journal is kept, so that who was away for a moment has no gap in its feed.
+// The journal is kept short: who is away for a moment has no gap in its feed all the same. On a busy machine
+// many processes take longer to come back than the grace that programs have by default.
 inline standin::PostgresOptions OptionsOfWriters(std::string const& schema)
 {
     standin::PostgresOptions options;
     options.schema = schema;
-    options.limits.journalKept = 10'000'000;
+    options.limits.journalKept = 20;
+    options.grace = std::chrono::seconds(3);
     return options;
 }
 
@@ -27,18 +29,19 @@ class WriterProcesses
 public:
     static constexpr int EachHas = 4;  // writers
 
-    // The site is to be there already. steps: of each writer.
+    // The site is to be there already. steps: of each writer. each: writers of a process.
     WriterProcesses(int processes, std::string const& uri, standin::PostgresOptions const& options,
-                    long long steps = std::numeric_limits<long long>::max())
+                    long long steps = std::numeric_limits<long long>::max(), int each = EachHas)
+        : m_each(each)
     {
         for (int process = 0; process < processes; ++process)
             m_children.push_back(std::make_unique<ChildProcess>(
                 [this, process, uri, options, steps](ChildProcess::Report const&)
-                { Work(process * EachHas, uri, options, steps); }));
+                { Work(process * m_each, uri, options, steps); }));
     }
     ~WriterProcesses() { board->isGivenUp = board->isOver = true; }
 
-    int Count() const { return static_cast<int>(m_children.size()) * EachHas; }
+    int Count() const { return static_cast<int>(m_children.size()) * m_each; }
 
     bool HaveDone(long long steps) const
     {
@@ -90,9 +93,9 @@ private:
     {
         std::vector<std::unique_ptr<standin::PostgresStore>> stores;
         std::vector<std::thread> writers;
-        for (int i = 0; i < EachHas; ++i)
+        for (int i = 0; i < m_each; ++i)
             stores.push_back(std::make_unique<standin::PostgresStore>(uri, ContentOfWriters, options));
-        for (int i = 0; i < EachHas; ++i)
+        for (int i = 0; i < m_each; ++i)
             writers.emplace_back(
                 [&, i] { SteadyWriter(*stores[static_cast<std::size_t>(i)], *board, first + i).Run(steps); });
         for (std::thread& writer : writers)
@@ -118,5 +121,6 @@ private:
         return true;
     }
 
+    int const m_each;
     std::vector<std::unique_ptr<ChildProcess>> m_children;
 };

@@ -1,7 +1,9 @@
 // What the PostgreSQL store does when its connections break, and what becomes of its program meanwhile.
+#include "standin/server/store/postgres/Bell.h"
 #include "standin/server/store/postgres/PostgresStore.h"
 
 #include "tests/store/PostgresSite.h"
+#include "tests/support/ChildProcess.h"
 #include "tests/support/sanitizers.h"
 #include <csignal>
 #include <future>
@@ -185,6 +187,147 @@ TEST_F(PostgresBreak, InACommitThatIsMade_IsUnknownUntilItIsAskedAfter)
     EXPECT_EQ(Value(), static_cast<int>(number));
 }
 
+// For a client that is slow, or a change that is asked after.
+TEST_F(PostgresBreak, ForAMoment_KeepsTheJournalForWhoIsMissing)
+{
+    PostgresOptions options = AtOnce();
+    options.limits.journalKept = 0;
+    options.settling = 700ms;
+    auto const third = schema.Open(options);
+    for (int i = 0; i < 5; ++i)
+        otherWriter.Do(CreationOfNext(3));
+    store->Maintain(2);
+    other->Maintain(5);
+    Terminate(*store);
+    third->Maintain(5);
+    EXPECT_THAT(FeedOf(*other, 2), SizeIs(3));
+    std::this_thread::sleep_for(options.settling);
+    third->Maintain(5);
+    EXPECT_FALSE(other->ChangesSince(4, [](CommittedChange&&) { ADD_FAILURE(); }));
+}
+
+TEST_F(PostgresDeath, ByMistake_KeepsTheJournalAgainAsFarAsItIsNeeded)
+{
+    PostgresOptions options = AtOnce();
+    options.limits.journalKept = 0;
+    auto const third = schema.Open(options);
+    for (int i = 0; i < 3; ++i)
+        writer.Do(CreationOfNext(3));
+    ExpectRing(*other, 3);
+    store->Maintain(1);
+    Terminate(*store);
+    ASSERT_EQ(other->Bury(LeaveAlone), 1);
+    ASSERT_EQ(store->Programs().size(), 3u);
+    EXPECT_EQ(store->Programs()[0].heard, 1u);
+    other->Maintain(3);
+    third->Maintain(3);
+    EXPECT_THAT(FeedOf(*store, 1), SizeIs(2));
+}
+
+TEST_F(PostgresBreak, OutcomeThatNobodyAsksFor_KeepsTheJournalNoLonger)
+{
+    PostgresOptions options = AtOnce();
+    options.limits.journalKept = 0;
+    options.askingPause = 300ms;
+    auto const lazy = schema.Open(options);
+    other->Leave();
+    store->Leave();
+    Writer lazyWriter(*lazy);
+    lazyWriter.Make(Job);
+    {
+        SqlSession const obstacle(schema.cluster.Uri());
+        obstacle.Run("BEGIN");
+        obstacle.Run("LOCK TABLE " + schema.Name() + ".journal IN EXCLUSIVE MODE");
+        auto commit =
+            std::async(std::launch::async, [&] { return lazy->Commit(Creation(OtherJob), 50).kind; });
+        schema.cluster.Await("SELECT count(*) FROM pg_locks WHERE NOT granted AND relation = '" +
+                                 schema.Name() + ".journal'::regclass",
+                             "1");
+        Terminate(*lazy);
+        EXPECT_EQ(commit.get(), CommitOutcome::Unknown);
+    }
+    Sequence const newest = lazyWriter.Do(CreationOfNext(5)).sequence;
+    auto const pruned = [&]
+    {
+        lazy->Maintain(newest);
+        return schema.Run("SELECT pruned FROM S.site");
+    };
+    EXPECT_EQ(pruned(), "1");
+    std::this_thread::sleep_for(options.askingPause);
+    EXPECT_EQ(pruned(), std::to_string(newest));
+    EXPECT_THAT(ReasonOf([&] { lazy->FindCommit(50); }), testing::HasSubstr("nobody has asked for long"));
+}
+
+// The server lets everybody see a change whose wait for the standby has been broken off. If it dies then, the
+// change is gone with it.
+TEST_F(PostgresBreak, InACommitThatNoStandbyHas_IsUnknownUntilOneHasIt)
+{
+    writer.Do(Creation(Job).Put("Key", 0, 1));
+    TicketState const before = writer.State(Job);
+    pid_t const worker = std::stoi(schema.cluster.Run("SELECT pid FROM " + LocksOf(*store)));
+    std::future<std::optional<CommitOutcome>> found;
+    {
+        NoStandby const noStandby(schema.cluster);
+        auto commit = std::async(std::launch::async,
+                                 [&] { return store->Commit(WriteTo(Job, before).Put("Key", 0, 2), 50); });
+        schema.cluster.Await("SELECT wait_event FROM pg_stat_activity WHERE pid = " + std::to_string(worker),
+                             "SyncRep");
+        Terminate(*store);
+        EXPECT_EQ(commit.get().kind, CommitOutcome::Unknown);
+        EXPECT_EQ(Value(), 2);
+        found = std::async(std::launch::async, [&] { return store->FindCommit(50); });
+        EXPECT_EQ(found.wait_for(500ms), std::future_status::timeout);
+    }
+    auto const outcome = found.get();
+    ASSERT_TRUE(outcome);
+    EXPECT_EQ(outcome->sequence, 2u);
+}
+
+// The server has done it, but nobody said so.
+TEST_F(PostgresBreak, InAChangeOfAUser_RepeatsIt)
+{
+    store->PutUser({"bob", "$y$", 16, 2});
+    std::string const worker = schema.cluster.Run("SELECT pid FROM " + LocksOf(*store));
+    std::string const removing = schema.cluster.Run("SELECT pid FROM " + LocksOf(*other));
+    auto const breakIn = [this](PostgresStore& handle, std::string const& process)
+    {
+        schema.cluster.Await("SELECT wait_event FROM pg_stat_activity WHERE pid = " + process, "SyncRep");
+        Terminate(handle);
+    };
+    std::future<std::string> put;
+    std::future<bool> removed;
+    {
+        NoStandby const noStandby(schema.cluster);
+        put = std::async(std::launch::async,
+                         [&] {
+                             return ReasonOf([&] { store->PutUser({"anna", "$y$", 16, 1}); });
+                         });
+        removed = std::async(std::launch::async, [&] { return other->RemoveUser("bob"); });
+        breakIn(*store, worker);
+        breakIn(*other, removing);
+        EXPECT_EQ(put.wait_for(300ms), std::future_status::timeout);
+        EXPECT_EQ(removed.wait_for(0ms), std::future_status::timeout);
+    }
+    EXPECT_THAT(put.get(), IsEmpty());
+    EXPECT_TRUE(removed.get());
+    EXPECT_EQ(store->FindUser("anna")->ticketId, 1);
+    EXPECT_FALSE(store->FindUser("bob"));
+    EXPECT_FALSE(store->RemoveUser("bob"));
+}
+
+TEST_F(PostgresBreak, InAChangeOfAUser_ForGood_IsAnUnknownOutcome)
+{
+    NoStandby const noStandby(schema.cluster);
+    std::string const worker = schema.cluster.Run("SELECT pid FROM " + LocksOf(*store));
+    auto put = std::async(std::launch::async, [&] { store->PutUser({"anna", "$y$", 16, 1}); });
+    schema.cluster.Await("SELECT wait_event FROM pg_stat_activity WHERE pid = " + worker, "SyncRep");
+    SqlSession const vandal(schema.cluster.Uri());
+    vandal.Run("SET synchronous_commit = off");
+    vandal.Run("UPDATE " + schema.Name() + ".site SET number = gen_random_uuid()");
+    Terminate(*store);
+    EXPECT_THROW(put.get(), UnknownOutcome);
+}
+
 // The connection is lost to the program, but its server process has the commit still before it.
 TEST_F(PostgresBreak, WhoseServerProcessMayStillCommit_LeavesItUnknown)
 {
@@ -232,6 +375,76 @@ TEST_F(PostgresBreak, OutcomeOfACommit_IsFoundThoughTheJournalWasPrunedMeanwhile
     EXPECT_FALSE(store->FindCommit(writer.LastNumber() + 1));
 }
 
+// Of one that was taken for dead, and of what it may ask for alone.
+TEST_F(PostgresBreak, OutcomeOfACommit_IsFoundThoughTheProgramWasBuriedAndTheJournalPruned)
+{
+    PostgresOptions options = AtOnce();
+    options.limits.journalKept = 0;
+    auto const third = schema.Open(options);
+    writer.Make(Job);
+    store->Maintain(1);
+    writer.Make(OtherJob);
+    Terminate(*store);
+    ASSERT_EQ(other->Bury(LeaveAlone), 1);
+    other->Maintain(2);
+    third->Maintain(2);
+    EXPECT_FALSE(other->ChangesSince(0, [](CommittedChange&&) { ADD_FAILURE(); }));
+    EXPECT_EQ(schema.Run("SELECT string_agg(sequence::text, ' ') FROM S.outcome"), "2");
+    auto const found = store->FindCommit(writer.LastNumber());
+    ASSERT_TRUE(found);
+    EXPECT_EQ(found->sequence, 2u);
+    EXPECT_EQ(found->address, OtherJob);
+}
+
+TEST_F(PostgresBreak, OutcomeOfACommit_IsNotKeptForAProgramThatHasLeft)
+{
+    PostgresOptions options = AtOnce();
+    options.limits.journalKept = 0;
+    auto const third = schema.Open(options);
+    writer.Do(Creation(Job).Own(CHANGE::Owner::ThisProgram));
+    otherWriter.Make(OtherJob);
+    store->Leave();
+    other->Leave();
+    third->Maintain(2);
+    EXPECT_EQ(schema.Run("SELECT count(*) FROM S.journal"), "0");
+    EXPECT_EQ(schema.Run("SELECT count(*) FROM S.outcome"), "0");
+}
+
+// It must not pass for a change that was never made.
+TEST_F(PostgresBreak, OutcomeOfACommit_ThatIsForgotten_IsNeverDenied)
+{
+    PostgresOptions options = AtOnce();
+    options.limits.journalKept = 0;
+    auto const third = schema.Open(options);
+    writer.Do(Creation(Job).Put("Key", 0, 1));
+    TicketState const before = writer.State(Job);
+    CommitOutcome outcome;
+    {
+        SqlSession const obstacle(schema.cluster.Uri());
+        obstacle.Run("BEGIN");
+        obstacle.Run("SELECT FROM " + schema.Name() + ".newest FOR UPDATE");
+        auto commit = std::async(std::launch::async,
+                                 [&] { return store->Commit(WriteTo(Job, before).Put("Key", 0, 2), 50); });
+        schema.cluster.Await("SELECT count(*) FROM pg_stat_activity WHERE wait_event_type = 'Lock'", "1");
+        Terminate(*store);
+        outcome = commit.get();
+    }
+    ASSERT_EQ(outcome.kind, CommitOutcome::Unknown);
+    // As if it had been made, and nobody had come back for long.
+    schema.Run("INSERT INTO S.outcome SELECT id, 50, 2, 3, 1, now() - interval '31 days' FROM S.program p "
+               "WHERE p.id = " +
+               std::to_string(store->Self()));
+    otherWriter.Put(Job, "Key", 0, 3);
+    other->Maintain(2);
+    third->Maintain(2);
+    EXPECT_EQ(schema.Run("SELECT count(*) FROM S.outcome WHERE number = 50"), "0");
+    EXPECT_THAT(ReasonOf([&] { store->FindCommit(50); }),
+                testing::HasSubstr("nobody knows any more whether a change was made"));
+    EXPECT_THAT(ReasonOf([&] { store->FindCommit(50); }), testing::HasSubstr("nobody knows any more"));
+    store->Maintain(2);  // it keeps the journal for nothing
+    EXPECT_EQ(third->Programs().at(0).heard, 2u);
+}
+
 TEST_F(PostgresBreak, AgainAndAgain_LosesNothingAndMakesNothingTwice)
 {
     writer.Do(Creation(Job).Put("Key", 0, 0));
@@ -269,6 +482,35 @@ TEST_F(PostgresBreak, ByAServerThatStandsStill_EndsEveryCallAtItsLimit)
     while (!ReasonOf([&] { found = impatient->FindCommit(50); }).empty())
         ASSERT_LT(Clock::now() - start, 60s);
     EXPECT_EQ(Value(), found ? 2 : 1);
+}
+
+// --- care, which comes every moment
+
+TEST_F(PostgresBreak, OfTheStandby_KeepsNoCareWaiting)
+{
+    PostgresOptions options = Impatient();
+    options.limits.journalKept = 0;
+    auto const patient = schema.Open(options);
+    Writer patientWriter(*patient);
+    writer.Make(Job);
+    NoStandby const waiting(schema.cluster);
+    while (patientWriter.Try(CreationOfNext(3)).kind == CommitOutcome::Committed)
+        ;  // the server takes a moment to miss it
+    for (Store* const each : {store.get(), other.get(), patient.get()})
+        EXPECT_THAT(ReasonAtOnce([&] { each->Maintain(1); }), IsEmpty());
+    EXPECT_EQ(schema.Run("SELECT pruned FROM S.site"), "1");
+    EXPECT_EQ(patient->Programs().at(2).heard, 1u);
+}
+
+TEST_F(PostgresBreak, InQuietTimes_CareWritesNothing)
+{
+    writer.Make(Job);
+    store->Maintain(1);
+    auto const rows = [this]
+    { return schema.Run("SELECT s.xmin || ' ' || s.xmax || ' ' || p.xmin FROM S.site s, S.program p"); };
+    std::string const before = rows();
+    store->Maintain(1);
+    EXPECT_EQ(rows(), before);
 }
 
 // --- the bell
@@ -321,6 +563,72 @@ TEST_F(PostgresBell, OfAHandleThatEnds_RingsBeforeIt)
     writer.Make(Job);
     store.reset();
     ExpectRing(*other, 1);
+}
+
+// It has a right to connect, and to nothing else.
+TEST_F(PostgresBell, OfAStranger_IsNotBelieved)
+{
+    schema.cluster.Run("CREATE ROLE stranger LOGIN");
+    SqlSession const stranger(schema.cluster.Uri("stranger"));
+    writer.Make(Job);
+    ExpectRing(*other, 1);
+    stranger.Run("NOTIFY " + schema.Name() + ", '999999999999'");
+    stranger.Run("NOTIFY " + schema.Name() + ", 'nonsense'");
+    schema.Run("INSERT INTO S.journal VALUES (2, 0, 2, 1, 3, 1, '')");  // of which nobody rings
+    stranger.Run("NOTIFY " + schema.Name() + ", '3'");
+    ExpectRing(*other, 2);
+    ExpectRing(*store, 2);
+    otherWriter.Make(OtherJob);
+    ExpectRing(*store, 3);
+}
+
+TEST(PostgresRingPace, AllowsEightAtOnce_AndThenWaits)
+{
+    standin::postgres::RingPace pace;
+    for (int i = 0; i < 7; ++i)
+        pace.NoteRing();
+    EXPECT_LT(pace.Next(), Clock::now());
+    auto const last = Clock::now();
+    pace.NoteRing();
+    EXPECT_GT(pace.Next(), last);
+}
+
+// Each ring wakes all of them: were every program to ring for itself, a second would bring 3,000 rings.
+TEST_F(PostgresBell, OfManyWriters_IsRungForAllOfThem)
+{
+    constexpr int Writers = 6;
+    standin::postgres::Connection ear({schema.cluster.Uri(), schema.Name()}, 60s, Clock::now() + 60s);
+    ear.Execute("LISTEN " + ear.Quoted(schema.Name()), Clock::now() + 60s);
+    std::vector<std::unique_ptr<PostgresStore>> stores;
+    for (int i = 0; i < Writers; ++i)
+        stores.push_back(schema.Open());
+    auto const start = Clock::now();
+    std::atomic<Sequence> newest = 0;
+    std::vector<std::thread> threads;
+    for (auto const& each : stores)
+        threads.emplace_back(
+            [&]
+            {
+                for (Writer own(*each); Clock::now() < start + 700ms;)
+                {
+                    Sequence const made = own.Do(CreationOfNext(3)).sequence;
+                    for (Sequence known = newest; known < made && !newest.compare_exchange_weak(known, made);)
+                        ;
+                }
+            });
+    for (std::thread& thread : threads)
+        thread.join();
+    for (auto const& each : stores)
+        ExpectRing(*each, newest);
+    stores.clear();
+    auto const time = Clock::now() - start;
+
+    ear.Run("SELECT", {}, Clock::now() + 60s);  // what was rung has come with the answer
+    int rings = 0;
+    for (std::string payload; ear.TakeNotification(payload);)
+        ++rings;
+    EXPECT_GT(rings, 0);
+    EXPECT_LT(rings, 2 * (time / 2ms) + 8 * Writers);
 }
 
 // --- life and death
@@ -376,6 +684,38 @@ TEST_F(PostgresDeath, OfAConnection_LeavesAPartFileToWhoHasNotedItMeanwhile)
     EXPECT_FALSE(store->AddPartFile("/tmp/a"));
     store->RemovePartFile("/tmp/a");
     EXPECT_FALSE(store->AddPartFile("/tmp/a"));
+}
+
+TEST_F(PostgresDeath, OfAConnection_BringsNothingBackThatWasGivenUpMeanwhile)
+{
+    PostgresCluster& cluster = schema.cluster;
+    cluster.Run("CREATE ROLE away LOGIN SUPERUSER");
+    auto const away = schema.OpenAs(cluster.Uri("away"), NoContent);
+    long long const session = away->OpenSession("admin");
+    away->AddPartFile("/tmp/a");
+    cluster.LetIn("away", "reject");
+    Terminate(*away);
+    EXPECT_THROW(away->CloseSession(session), StoreError);
+    EXPECT_THROW(away->RemovePartFile("/tmp/a"), StoreError);
+    cluster.LetIn("away", "trust");
+    auto const start = Clock::now();
+    while (!ReasonOf([&] { away->Users(); }).empty())
+        ASSERT_LT(Clock::now() - start, 20s);
+    EXPECT_THAT(other->Sessions(), IsEmpty());
+    EXPECT_TRUE(other->AddPartFile("/tmp/a"));
+}
+
+// The connection is sound, so nothing else would take it away.
+TEST_F(PostgresDeath, OfASession_ThatTheServerRefuses_IsRepeated)
+{
+    long long const session = store->OpenSession("admin");
+    SqlSession const obstacle(schema.cluster.Uri());
+    obstacle.Run("ALTER TABLE " + schema.Name() + ".session RENAME TO hidden");
+    EXPECT_THROW(store->CloseSession(session), StoreError);
+    obstacle.Run("ALTER TABLE " + schema.Name() + ".hidden RENAME TO session");
+    EXPECT_THAT(other->Sessions(), SizeIs(1));
+    store->Maintain(0);
+    EXPECT_THAT(other->Sessions(), IsEmpty());
 }
 
 // As if the connection had broken between the server and the answer.
@@ -483,6 +823,63 @@ TEST_F(PostgresDeath, WhoComesBackDuringItsBurial_WaitsForItsEnd)
                   }),
               1);
     EXPECT_TRUE(isBack.get());
+}
+
+// What the parent had open the child has, too.
+TEST_F(PostgresDeath, OfAProgramThatHasForked_ShowsWhileItsChildLives)
+{
+    std::unique_ptr<PostgresStore> dying;
+    ChildProcess parent(
+        [&](ChildProcess::Report const& report)
+        {
+            dying = schema.Open();
+            pid_t const child = fork();
+            if (child == 0)
+                sleep(60);
+            report(dying->Self());
+            report(child);
+            sleep(60);
+        });
+    auto const id = parent.Next();
+    auto const child = parent.Next();
+    ASSERT_TRUE(id && child);
+    auto const isAlive = [&]
+    {
+        auto const programs = other->Programs();
+        return std::any_of(programs.begin(), programs.end(),
+                           [&](ProgramInfo const& program) { return program.id == *id && program.isAlive; });
+    };
+    EXPECT_TRUE(isAlive());
+    parent.Kill();
+    for (auto const end = Clock::now() + 10s; isAlive() && Clock::now() < end;)
+        std::this_thread::sleep_for(1ms);
+    EXPECT_FALSE(isAlive());
+    EXPECT_EQ(kill(static_cast<pid_t>(*child), SIGKILL), 0);  // it was there all the time
+    EXPECT_EQ(other->Bury(LeaveAlone), 1);
+}
+
+// What its working connection waits for keeps nobody from hearing.
+TEST_F(PostgresDeath, WhoComesBackDuringItsBurial_HearsAndRingsMeanwhile)
+{
+    auto const idle = schema.Open(PostgresOptions());
+    int buried = 0;
+    while (buried == 0)  // it may be back before
+    {
+        Terminate(*idle);
+        buried = other->Bury(
+            [&](Estate const&)
+            {
+                schema.cluster.Await("SELECT count(*) > 0 FROM pg_locks WHERE locktype = 'advisory' AND NOT "
+                                     "granted AND classid = '" +
+                                         schema.Name() + "'::regnamespace",
+                                     "t");
+                writer.Make(Job);
+                auto const start = Clock::now();
+                while (idle->Committed() < 1 && Clock::now() - start < 5s)
+                    std::this_thread::sleep_for(1ms);
+                EXPECT_EQ(idle->Committed(), 1u);
+            });
+    }
 }
 
 TEST_F(PostgresDeath, OfTheBurier_LeavesTheBurialToBeRepeated)

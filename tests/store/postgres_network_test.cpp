@@ -4,7 +4,9 @@
 #include "tests/store/PostgresSite.h"
 #include "tests/store/WriterProcesses.h"
 #include "tests/support/NetworkProxy.h"
+#include "tests/support/TemporaryFolder.h"
 #include "tests/support/sanitizers.h"
+#include <cstdlib>
 #include <future>
 #include <gmock/gmock.h>
 #include <optional>
@@ -181,7 +183,31 @@ TEST_F(PostgresNetwork, KnownToBeLost_IsLeftAtOnce)
     EXPECT_LT(Clock::now() - start, 1s);
 }
 
-// It is tried first each time, and takes its share of the time alone.
+// It is silence that counts, not the time that a large answer takes.
+TEST_F(PostgresNetwork, ThatIsSlow_LetsALargeTicketThrough)
+{
+    std::string const large(4'000'000, 'x');
+    Writer(*other).Do(Creation(Job).Put("Key", 0, Bytes(PARAM_STRING, large)));
+    proxy.Slow(20'000);  // more than two seconds for all of it, above the limit
+    EXPECT_TRUE(ValuesOf(*store, Job).at({"Key", 0}).bytes == large);
+    EXPECT_THAT(FeedOf(*store, 0), SizeIs(1));
+}
+
+TEST_F(PostgresNetwork, RefusedForLong_IsAskedAgainLessAndLess)
+{
+    schema.cluster.Run("CREATE ROLE refused LOGIN SUPERUSER");
+    auto const refused = schema.OpenAs(
+        "host=127.0.0.1 port=" + proxy.Port() + " user=refused dbname=postgres", NoContent, Brief());
+    schema.cluster.LetIn("refused", "reject");
+    int const before = proxy.Accepted();
+    schema.cluster.Run("SELECT pg_terminate_backend(pid) FROM pg_stat_activity WHERE usename = 'refused'");
+    std::this_thread::sleep_for(1500ms);
+    int const attempts = proxy.Accepted() - before;
+    EXPECT_GT(attempts, 2);
+    EXPECT_LT(attempts, 20);  // of both connections: after 50, 100, 200, 400 and 800 ms
+}
+
+// It takes its share of the time alone, and that once.
 TEST_F(PostgresNetwork, WithAHostThatIsSilent_FindsTheNext)
 {
     proxy.Lose(NetworkProxy::Both);
@@ -192,6 +218,32 @@ TEST_F(PostgresNetwork, WithAHostThatIsSilent_FindsTheNext)
     EXPECT_LT(Clock::now() - start, 5s);
     Terminate(*found);
     EXPECT_EQ(Writer(*found).Make(Job).sequence, 1u);
+    Terminate(*found);
+    EXPECT_THAT(ReasonAtOnce([&] { found->Users(); }), IsEmpty());
+
+    postgres::Target const target{"host=127.0.0.1," + schema.cluster.Folder().string() +
+                                      " port=" + proxy.Port() + ",5432 user=postgres dbname=postgres",
+                                  schema.Name()};
+    postgres::Connection(target, 1s, Clock::now() + 4s);
+    EXPECT_THAT(ReasonAtOnce([&] { postgres::Connection(target, 1s, Clock::now() + 4s); }), IsEmpty());
+}
+
+// Of a service file, whose hosts only libpq knows, and with a port that is left out.
+TEST_F(PostgresNetwork, WithASilentHostOfAService_FindsTheNext)
+{
+    TemporaryFolder const folder;
+    folder.Write("services", "[site]\nhost=127.0.0.1," + schema.cluster.Folder().string() +
+                                 "\nport=" + proxy.Port() + ",\nuser=postgres\ndbname=postgres\n");
+    setenv("PGSERVICEFILE", (folder / "services").c_str(), 1);
+    proxy.Lose(NetworkProxy::Both);
+    std::string const reason = ReasonOf(
+        [&]
+        {
+            for (std::string const uri : {"service=site", "postgresql://?service=site"})
+                postgres::Connection({uri, schema.Name()}, 1s, Clock::now() + 2s);
+        });
+    unsetenv("PGSERVICEFILE");
+    EXPECT_EQ(reason, "");
 }
 
 TEST_F(PostgresProxy, LostAgainAndAgain_LosesNothingAndMakesNothingTwice)

@@ -3,6 +3,7 @@
 
 #include "tests/store/PostgresSite.h"
 #include "tests/store/SiteStoreContract.h"
+#include "tests/support/NetworkProxy.h"
 #include <future>
 #include <gmock/gmock.h>
 
@@ -62,9 +63,12 @@ protected:
             schema.cluster.Run("DROP SCHEMA " + aside + " CASCADE");
     }
 
-    std::unique_ptr<PostgresReplacement> Begin(Old old) const
+    std::unique_ptr<PostgresReplacement> Begin(Old old) const { return Begin(old, schema.cluster.Uri()); }
+    std::unique_ptr<PostgresReplacement> Begin(Old old, std::string const& uri) const
     {
-        return std::make_unique<PostgresReplacement>(schema.cluster.Uri(), old, options);
+        auto replacement = std::make_unique<PostgresReplacement>(uri, old, options);
+        Writer(replacement->Store()).Do(Creation(Job).Put("Key", 0, 2));
+        return replacement;
     }
     std::string ReasonOfBeginning(Old old) const
     {
@@ -88,6 +92,38 @@ protected:
     }
 
     PostgresOptions options;
+};
+
+class PostgresReplacingOverANetwork : public PostgresReplacing
+{
+protected:
+    PostgresReplacingOverANetwork()
+    {
+        MakeSiteWith(1);
+        proxy.Start();
+        options.connectLimit = options.statementLimit = options.openingLimit = 3s;
+        replacement = Begin(Old::SetAside, "host=127.0.0.1 port=" + proxy.Port() + " user=postgres");
+    }
+
+    // Returns when the server works on the last step, which waits for the obstacle's end.
+    std::future<std::string> FinishUpToTheLastStep()
+    {
+        obstacle.Run("BEGIN");
+        obstacle.Run("SELECT FROM " + schema.Name() + "_new.site FOR UPDATE");
+        auto finishing = std::async(std::launch::async, [this] { return replacement->Finish(); });
+        schema.cluster.Await("SELECT count(*) FROM " + Waiting(), "1");
+        return finishing;
+    }
+
+    std::string Waiting() const
+    {
+        return "pg_stat_activity WHERE wait_event_type = 'Lock' AND query LIKE '%UPDATE \"" + schema.Name() +
+               "%'";
+    }
+
+    NetworkProxy proxy{schema.cluster.Folder() / ".s.PGSQL.5432"};
+    SqlSession const obstacle{schema.cluster.Uri()};
+    std::unique_ptr<PostgresReplacement> replacement;
 };
 }  // namespace
 
@@ -118,6 +154,23 @@ TEST_F(PostgresOpening, ThatOthersKeepTooLong_IsGivenUp)
     EXPECT_THAT(
         ReasonOf([&] { schema.Open(impatient); }),
         HasSubstr("another program has been opening the site all the time; end that, then try again"));
+}
+
+TEST_F(PostgresOpening, WaitsForAReplacementLongerThanForAnAnswer)
+{
+    schema.Open()->Leave();
+    SqlSession const replacing(schema.cluster.Uri());
+    std::string const lock = "(hashtextextended('comgui " + schema.Name() + "', 0))";
+    replacing.Run("SELECT pg_advisory_lock" + lock);
+    PostgresOptions options;
+    options.statementLimit = 500ms;
+    auto patient = std::async(std::launch::async, [&] { return schema.Open(options); });
+    EXPECT_EQ(patient.wait_for(1s), std::future_status::timeout);
+    options.openingLimit = 200ms;
+    EXPECT_THAT(ReasonOf([&] { schema.Open(options); }),
+                HasSubstr("another program is opening or replacing the site; wait until that is done"));
+    replacing.Run("SELECT pg_advisory_unlock" + lock);
+    EXPECT_NE(patient.get(), nullptr);
 }
 
 TEST_F(PostgresFolder, NumberOfTheSite_IsTheSameForAll_AndNoOthers)
@@ -153,6 +206,26 @@ TEST_F(PostgresCheck, FindsWhatSomebodyHasEditedByHand)
                             "journal: record 12 where 2 is due", HasSubstr("journal: record 12: ")));
 }
 
+// To count the rows of a large site may take longer than a statement may otherwise.
+TEST_F(PostgresCheck, TakesTheTimeThatItTakes)
+{
+    PostgresOptions impatient;
+    impatient.statementLimit = 200ms;
+    auto const handle = schema.Open(impatient);
+    SqlSession const obstacle(schema.cluster.Uri());
+    obstacle.Run("BEGIN");
+    obstacle.Run("LOCK TABLE " + schema.Name() + ".parameter");
+    auto problems = std::async(std::launch::async, [&] { return handle->Check({}); });
+    auto sizes = std::async(std::launch::async, [&] { return handle->Measure(); });
+    auto content = std::async(std::launch::async,
+                              [&] { handle->ReadContent([](TicketChange&&) {}, [](User&&) {}, {}); });
+    obstacle.Run("SELECT pg_sleep(1)");
+    obstacle.Run("ROLLBACK");
+    EXPECT_THAT(problems.get(), IsEmpty());
+    EXPECT_EQ(sizes.get().tickets, 1);
+    EXPECT_NO_THROW(content.get());
+}
+
 TEST_F(PostgresCheck, ListsAHundredProblemsAtMost)
 {
     schema.Run("INSERT INTO S.parameter SELECT 3, 9, 'Key', n, 999, 0, NULL FROM generate_series(0, 300) n");
@@ -171,7 +244,6 @@ TEST_F(PostgresReplacing, ASiteThatIsThere_IsRefusedUnlessItMayBeSetAside)
 TEST_F(PostgresReplacing, Finished_IsTheSite)
 {
     auto const replacement = Begin(Old::Forbidden);
-    Writer(replacement->Store()).Do(Creation(Job).Put("Key", 0, 2));
     replacement->Store().PutUser({"anna", "$y$", 16, 1});
     EXPECT_EQ(replacement->Finish(), "");
     EXPECT_FALSE(HasLeftovers());
@@ -190,7 +262,6 @@ TEST_F(PostgresReplacing, Finished_SetsTheOldOneAsideAndHasItsNumberAndFolder)
         store->Leave();
     }
     auto const replacement = Begin(Old::SetAside);
-    Writer(replacement->Store()).Do(Creation(Job).Put("Key", 0, 2));
     std::string const aside = replacement->Finish();
     EXPECT_THAT(aside, ContainsRegex("^" + schema.Name() + "_replaced_[0-9]{8}_[0-9]{6}_[0-9]{6}$"));
     EXPECT_EQ(Value(), 2);
@@ -203,10 +274,7 @@ TEST_F(PostgresReplacing, Finished_SetsTheOldOneAsideAndHasItsNumberAndFolder)
 TEST_F(PostgresReplacing, NotFinished_LeavesTheOldOneAndNothingElse)
 {
     MakeSiteWith(1);
-    {
-        auto const replacement = Begin(Old::SetAside);
-        Writer(replacement->Store()).Do(Creation(Job).Put("Key", 0, 2));
-    }
+    Begin(Old::SetAside);
     EXPECT_FALSE(HasLeftovers());
     EXPECT_EQ(Value(), 1);
 }
@@ -216,7 +284,6 @@ TEST_F(PostgresReplacing, AfterAKill_BeginsAnew)
     schema.cluster.Run("CREATE SCHEMA " + schema.Name() + "_new");
     schema.cluster.Run("CREATE TABLE " + schema.Name() + "_new.site (rest integer)");
     auto const replacement = Begin(Old::Forbidden);
-    Writer(replacement->Store()).Do(Creation(Job).Put("Key", 0, 2));
     replacement->Finish();
     EXPECT_EQ(Value(), 2);
 }
@@ -238,10 +305,74 @@ TEST_F(PostgresReplacing, KeepsOthersFromOpening)
                 HasSubstr("another program is opening or replacing the site"));
     auto opening = std::async(std::launch::async, [this] { return Value(); });
     EXPECT_EQ(opening.wait_for(200ms), std::future_status::timeout);
-    Writer(replacement->Store()).Do(Creation(Job).Put("Key", 0, 2));
     replacement->Finish();
     replacement.reset();
     EXPECT_EQ(opening.get(), 2);
+}
+
+// As an owner prepares one who lets the program make no schema of its own.
+TEST_F(PostgresReplacing, OfAnEmptySchema_FillsThatAndKeepsItsRights)
+{
+    schema.Run("CREATE SCHEMA " + schema.Name());
+    schema.Run("GRANT USAGE ON SCHEMA " + schema.Name() + " TO pg_monitor");
+    EXPECT_EQ(Begin(Old::Forbidden)->Finish(), "");
+    EXPECT_FALSE(HasLeftovers());
+    EXPECT_EQ(Value(), 2);
+    EXPECT_EQ(schema.Run("SELECT has_schema_privilege('pg_monitor', '" + schema.Name() + "', 'USAGE')"), "t");
+}
+
+TEST_F(PostgresReplacing, ThatFailsInItsLastStep_LeavesNothing)
+{
+    {
+        auto const replacement = Begin(Old::Forbidden);
+        schema.Run("CREATE SCHEMA " + schema.Name());
+        EXPECT_THAT(ReasonOf([&] { replacement->Finish(); }), HasSubstr("already exists"));
+    }
+    EXPECT_FALSE(HasLeftovers());
+}
+
+TEST_F(PostgresReplacing, OfASiteThatSeveralHaveOpen_NamesThemAll)
+{
+    MakeSiteWith(1);
+    auto const one = schema.Open();
+    auto const another = schema.Open();
+    std::string const who =
+        "[^ ]*postgres_store[^ ]* \\(process " + std::to_string(getpid()) + " on [^)]+\\)";
+    EXPECT_THAT(ReasonOfBeginning(Old::SetAside), ContainsRegex("in use by " + who + ", " + who + "; end"));
+}
+
+TEST_F(PostgresReplacingOverANetwork, ThatLosesTheAnswerToItsLastStep_AsksWhetherItIsDone)
+{
+    auto finishing = FinishUpToTheLastStep();
+    proxy.Lose(NetworkProxy::ToClient);
+    obstacle.Run("COMMIT");
+    schema.cluster.Await("SELECT count(*) FROM pg_namespace WHERE nspname = '" + schema.Name() + "_new'",
+                         "0");
+    proxy.CloseAll();
+    proxy.Lose(NetworkProxy::None);
+    EXPECT_THAT(finishing.get(), HasSubstr("_replaced_"));
+    EXPECT_EQ(Value(), 2);
+}
+
+TEST_F(PostgresReplacingOverANetwork, ThatBreaksInItsLastStep_LeavesTheOldOneAndNothingElse)
+{
+    auto finishing = FinishUpToTheLastStep();
+    schema.cluster.Run("SELECT pg_terminate_backend(pid, 60000) FROM " + Waiting());
+    EXPECT_THAT(ReasonOf([&] { finishing.get(); }), HasSubstr("terminating connection"));
+    obstacle.Run("COMMIT");
+    replacement.reset();
+    EXPECT_FALSE(HasLeftovers());
+    EXPECT_EQ(Value(), 1);
+}
+
+TEST_F(PostgresReplacingOverANetwork, ThatIsLostInItsLastStep_SaysThatNobodyKnows)
+{
+    auto finishing = FinishUpToTheLastStep();
+    proxy.Lose(NetworkProxy::Both);
+    EXPECT_THROW(finishing.get(), UnknownReplacement);
+    schema.cluster.Run("SELECT pg_terminate_backend(pid, 60000) FROM " + Waiting());
+    proxy.CloseAll();
+    proxy.Lose(NetworkProxy::None);
 }
 
 // --- users

@@ -3,8 +3,11 @@
 
 #include "tests/store/PostgresSite.h"
 #include "tests/support/ChildProcess.h"
+#include "tests/support/TemporaryFolder.h"
+#include <cstdlib>
 #include <future>
 #include <gmock/gmock.h>
+#include <sys/stat.h>
 #include <thread>
 
 using namespace standin;
@@ -36,6 +39,39 @@ using PostgresNewSite = PostgresSite;
 using PostgresSchemas = PostgresSite;
 using PostgresRefusal = PostgresSite;
 using PostgresContent = PostgresSite;
+
+// Of databases, as libpq's own files give them.
+class PostgresNames : public PostgresSite
+{
+protected:
+    PostgresNames()
+    {
+        setenv("PGSERVICEFILE", (m_folder / "services").c_str(), 1);
+        setenv("PGPASSFILE", (m_folder / "passwords").c_str(), 1);
+    }
+    ~PostgresNames() override
+    {
+        unsetenv("PGSERVICEFILE");
+        unsetenv("PGPASSFILE");
+    }
+
+    // A role of that name that needs a password, and the service of it.
+    void MakeService(std::string const& role, std::string const& password) const
+    {
+        schema.cluster.Run("CREATE ROLE " + role + " LOGIN PASSWORD '" + password + "'");
+        schema.cluster.Run("GRANT CREATE ON DATABASE postgres TO " + role);
+        schema.cluster.LetIn(role, "scram-sha-256");
+        m_folder.Write("services", "[press]\nhost=" + schema.cluster.Folder().string() +
+                                       "\ndbname=postgres\nuser=" + role + '\n');
+    }
+    void WritePasswords(std::string const& lines) const
+    {
+        chmod(m_folder.Write("passwords", lines).c_str(), 0600);  // or libpq does not read it
+    }
+
+private:
+    TemporaryFolder const m_folder;
+};
 }  // namespace
 
 INSTANTIATE_TEST_SUITE_P(Postgres, StoreContract, testing::Values(STORE_ENGINE{"Schema", MakeSite, true}),
@@ -127,7 +163,7 @@ TEST_F(PostgresSchemas, OfANewerVersion_IsRefusedAndLeftAsItIs)
     Writer(*schema.Open()).Make(Job);
     schema.Run("UPDATE S.site SET version = 77");
     std::string const reason = ReasonOf([this] { schema.Open(); });
-    EXPECT_THAT(reason, HasSubstr("newer version of this program (schema 77, known up to 1)"));
+    EXPECT_THAT(reason, HasSubstr("newer version of this program (schema 77, known up to 2)"));
     EXPECT_THAT(reason, Not(HasSubstr("\n")));
     EXPECT_EQ(schema.Run("SELECT version FROM S.site"), "77");
 }
@@ -147,6 +183,28 @@ TEST_F(PostgresSchemas, WithoutTheRowOfItsVersion_IsRefused)
     schema.Open();
     schema.Run("DELETE FROM S.site");
     EXPECT_THAT(ReasonOf([this] { schema.Open(); }), HasSubstr("belongs to another program"));
+}
+
+TEST_F(PostgresNames, OfAServiceFileWithAPasswordFile_AreThoseOfTheDatabase)
+{
+    MakeService("filed", "from a file");
+    WritePasswords("*:*:*:filed:from a file\n");
+    auto const store = schema.OpenAs("postgresql://?service=press", NoContent);
+    EXPECT_EQ(store->Name(), "database postgres at " + schema.cluster.Folder().string() + ":5432 as filed");
+    Terminate(*store);
+    EXPECT_EQ(Writer(*store).Make(Job).sequence, 1u);
+}
+
+TEST_F(PostgresNames, OfFilesThatAreWrong_AreRefusedWithoutThePassword)
+{
+    MakeService("misfiled", "another one");
+    WritePasswords("*:*:*:misfiled:s3cret\n");
+    std::string const reason = ReasonOfOpeningAs("postgresql://?service=press");
+    EXPECT_THAT(reason, HasSubstr("password authentication failed"));
+    EXPECT_THAT(reason, Not(HasSubstr("s3cret")));
+    EXPECT_NE(ReasonOfOpeningAs("postgresql://?service=missing"), "");
+    WritePasswords("");
+    EXPECT_THAT(ReasonOfOpeningAs("postgresql://?service=press"), HasSubstr("name a password"));
 }
 
 // --- what is refused
@@ -219,6 +277,15 @@ TEST_F(PostgresRefusal, OfAStatement_LeavesTheConnectionAsItIs)
     EXPECT_THROW(writer.Try(WriteTo(Job, writer.State(Job)).Put("Key", 5, 1)), StoreError);
     EXPECT_EQ(writer.Put(Job, "Key", 4, 1).sequence, 2u);
     EXPECT_EQ(schema.cluster.Run("SELECT pid FROM " + LocksOf(*store)), worker);
+}
+
+TEST_F(PostgresRefusal, OfAHandleThatHasLeft_HoldsNoConnection)
+{
+    schema.cluster.Run("CREATE ROLE leaver LOGIN SUPERUSER");
+    auto const store = schema.OpenAs(schema.cluster.Uri("leaver"), NoContent);
+    store->Leave();
+    schema.cluster.Await("SELECT count(*) FROM pg_stat_activity WHERE usename = 'leaver'", "0");
+    EXPECT_THAT(ReasonOf([&] { store->Users(); }), HasSubstr("has been left; open it anew"));
 }
 
 // --- what comes back
@@ -327,6 +394,26 @@ TEST_F(PostgresContent, PlansThatCross_WaitForEachOtherWithoutDeadlock)
     crossing.wait();
     EXPECT_EQ(made, 200);
     EXPECT_EQ(store->Tickets([](TicketAddress, TicketState const&) {}), 202u);
+}
+
+// As a backup does. Every commit and every read of a ticket asks for the newest number.
+TEST_F(PostgresContent, LookAtOneMoment_LeavesTheNewestChangeEasyToFind)
+{
+    schema.Open();
+    SqlSession const backup(schema.cluster.Uri()), writer(schema.cluster.Uri());
+    backup.Run("BEGIN ISOLATION LEVEL REPEATABLE READ");
+    backup.Run("SELECT count(*) FROM " + schema.Name() + ".ticket");
+    writer.Run("SET search_path = " + schema.Name());
+    writer.Run(
+        "SELECT count(commit_change(4, 3, -1, 0, 16777215, NULL, 0, n, '', '{}', '{}', '{}', '{}', 0, '{}', "
+        "'{}', '{}', '{}', '{}', '{}', '{}', '{}')) FROM generate_series(1, 10000) n");
+    std::string const plan =
+        writer.Run("EXPLAIN (ANALYZE, BUFFERS, FORMAT JSON) SELECT sequence FROM newest");
+    std::string const mark = "\"Shared Hit Blocks\": ";
+    auto const at = plan.find(mark);
+    ASSERT_NE(at, plan.npos) << plan;
+    EXPECT_LT(std::stoi(plan.substr(at + mark.size())), 30) << plan;
+    EXPECT_EQ(writer.Run("SELECT sequence FROM newest"), "10000");
 }
 
 TEST_F(PostgresContent, ChildOfFork_CannotUseTheHandleAndLeavesItToItsParent)

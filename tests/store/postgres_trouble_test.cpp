@@ -58,11 +58,13 @@ protected:
         EXPECT_THAT(reason, Not(HasSubstr("s3cret")));
     }
 
+    static constexpr int Programs = 8;  // each a process of its own
+
     WriterProcesses StartWriters(long long steps = std::numeric_limits<long long>::max()) const
     {
         auto const options = OptionsOfWriters(schema.Name());
         schema.OpenAs(schema.cluster.Uri(), ContentOfWriters, options)->Leave();
-        return {2, schema.cluster.Uri(), options, steps};
+        return {Programs, schema.cluster.Uri(), options, steps, 1};
     }
 
     void TerminateAll() const
@@ -79,8 +81,9 @@ using PostgresClocks = PostgresSite;
 
 TEST_F(PostgresTrouble, EndOfAllConnectionsEverySecond_LosesNothingAndMakesNothingTwice)
 {
-    long long const steps = WritesWanted() / (3LL * 2 * WriterProcesses::EachHas) + 1;
+    long long const steps = WritesWanted() / (3LL * Programs) + 1;
     auto const writers = StartWriters(steps);
+    ASSERT_TRUE(writers.AwaitSteps(1));  // who opens the site is not to be disturbed
     int storms = 0;
     long long stepsBefore = -1;  // on a busy machine it may take more than a second to come back
     for (auto next = Clock::now() + 1s; !writers.HaveDone(steps); std::this_thread::sleep_for(10ms))
@@ -106,11 +109,7 @@ TEST_F(PostgresTrouble, CrashOfTheServer_LosesNothingAndMakesNothingTwice)
     for (int i = 0; i < 2; ++i)
     {
         ASSERT_TRUE(writers.AwaitSteps(5));
-        kill(std::stoi(
-                 schema.cluster.Run("SELECT pid FROM pg_stat_activity WHERE backend_type = 'client backend' "
-                                    "AND pid <> pg_backend_pid() LIMIT 1")),
-             SIGKILL);
-        schema.cluster.AwaitAnswer();
+        schema.cluster.Crash();
         writers.ExpectAnswers(5s);
     }
     writers.Finish();
@@ -146,11 +145,28 @@ TEST_F(PostgresTrouble, NoConnectionLeft_IsSaidAndEndsByItself)
         reason = ReasonOf([&] { store->Users(); });  // what has just ended may still leave it a connection
     }
     ExpectReason(reason, "connection slots", "raise max_connections");
-    EXPECT_TRUE(store->IsReachable());
+    std::this_thread::sleep_for(300ms);  // a break that is shorter is nobody's concern
+    EXPECT_NE(ReasonOf([&] { store->Users(); }), "");
+    EXPECT_FALSE(store->IsReachable());
     crowd.clear();
     start = Clock::now();
     while (!ReasonOf([&] { store->Users(); }).empty())
         ASSERT_LT(Clock::now() - start, 20s);
+    EXPECT_TRUE(store->IsReachable());
+}
+
+// By a server that lets nobody in: the program makes no call just now.
+TEST_F(PostgresTrouble, RefusalOfBothConnections_IsNoticedWithoutACall_AndTheEndOfIt)
+{
+    schema.cluster.Run("CREATE ROLE unwanted LOGIN SUPERUSER");
+    auto const store = schema.OpenAs(schema.cluster.Uri("unwanted"), NoContent, PostgresOptions());
+    schema.cluster.LetIn("unwanted", "reject");
+    schema.cluster.Run("SELECT pg_terminate_backend(pid) FROM pg_stat_activity WHERE usename = 'unwanted'");
+    AwaitReach(*store, false);
+    for (auto const end = Clock::now() + 2s; Clock::now() < end; std::this_thread::sleep_for(1ms))
+        ASSERT_FALSE(store->IsReachable());
+    schema.cluster.LetIn("unwanted", "trust");
+    AwaitReach(*store, true);
 }
 
 // --- the server's disk

@@ -1,5 +1,6 @@
 #include "tests/support/NetworkProxy.h"
 
+#include <algorithm>
 #include <arpa/inet.h>
 #include <cerrno>
 #include <cstring>
@@ -72,6 +73,8 @@ void NetworkProxy::Lose(Loss loss)
     Wake();
 }
 
+void NetworkProxy::Slow(std::size_t bytes) { m_largest = std::min(bytes, LargestWaiting); }
+
 void NetworkProxy::CloseAll()
 {
     m_isClosing = true;
@@ -100,11 +103,13 @@ void NetworkProxy::Run()
         m_isClosing = false;
         int const loss = m_loss;
         std::erase_if(m_links,
-                      [loss](LINK& link)
+                      [this, loss](LINK& link)
                       {
                           return !Pass(link.client, link.server, link.toServer, (loss & ToServer) == 0) ||
                                  !Pass(link.server, link.client, link.toClient, (loss & ToClient) == 0);
                       });
+        if (m_largest != 0)
+            std::this_thread::sleep_for(std::chrono::milliseconds(10));
         Accept();
     }
 }
@@ -127,14 +132,16 @@ void NetworkProxy::AddTo(std::vector<pollfd>& waiting, LINK const& link) const
 }
 
 // False at the end of the connection.
-bool NetworkProxy::Pass(Descriptor const& from, Descriptor const& to, std::string& waiting, bool isAllowed)
+bool NetworkProxy::Pass(Descriptor const& from, Descriptor const& to, std::string& waiting,
+                        bool isAllowed) const
 {
     if (!isAllowed)
         return true;
     if (waiting.empty())
     {
         char bytes[LargestWaiting];
-        ssize_t const size = recv(from.Number(), bytes, sizeof bytes, MSG_DONTWAIT);
+        ssize_t const size =
+            recv(from.Number(), bytes, m_largest != 0 ? m_largest.load() : sizeof bytes, MSG_DONTWAIT);
         if (size == 0 || (size < 0 && errno != EAGAIN && errno != EINTR))
             return false;
         waiting.append(bytes, size < 0 ? 0 : static_cast<std::size_t>(size));
@@ -153,6 +160,7 @@ void NetworkProxy::Accept()
     Descriptor client(accept4(m_listener.Number(), nullptr, nullptr, SOCK_CLOEXEC));
     if (client.Number() < 0)
         return;
+    ++m_accepted;
     Descriptor server(socket(AF_UNIX, SOCK_STREAM | SOCK_CLOEXEC, 0));
     sockaddr_un address{};
     address.sun_family = AF_UNIX;

@@ -33,6 +33,11 @@ public:
     };
     void Lose(Loss loss);
 
+    // From now on no more than so many bytes pass in one direction in a hundredth of a second.
+    void Slow(std::size_t bytes);
+
+    int Accepted() const { return m_accepted; }  // connections so far
+
     // Ends the connections that there are, for both ends.
     void CloseAll();
 
@@ -45,14 +50,15 @@ private:
     void Run();
     void Accept();
     void AddTo(std::vector<struct pollfd>& waiting, LINK const& link) const;
-    static bool Pass(standin::Descriptor const& from, standin::Descriptor const& to, std::string& waiting,
-                     bool isAllowed);
+    bool Pass(standin::Descriptor const& from, standin::Descriptor const& to, std::string& waiting,
+              bool isAllowed) const;
     void Wake() const;
 
     std::filesystem::path const m_server;
     standin::Descriptor m_listener, m_wakingEnd, m_wokenEnd;
     std::string m_port;
-    std::atomic<int> m_loss{None};
+    std::atomic<int> m_loss{None}, m_accepted{0};
+    std::atomic<std::size_t> m_largest{0};  // 0: no limit
     std::atomic<bool> m_isClosing{false}, m_isOver{false};
     std::vector<LINK> m_links;  // the thread's own
     std::thread m_thread;

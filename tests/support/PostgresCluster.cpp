@@ -185,6 +185,28 @@ void PostgresCluster::AwaitAnswer() const
     Fail("postgres");
 }
 
+void PostgresCluster::Crash() const
+{
+    // Until the server has noticed, it still lets programs in: it has recovered when there is a successor.
+    char const* const query = "SELECT pid FROM pg_stat_activity WHERE backend_type = 'checkpointer'";
+    std::string const killed = Run(query);
+    kill(std::stoi(killed), SIGKILL);
+    for (auto const end = std::chrono::steady_clock::now() + 60s; std::chrono::steady_clock::now() < end;
+         std::this_thread::sleep_for(10ms))
+    {
+        try
+        {
+            if (std::string const now = Run(query); !now.empty() && now != killed)
+                return;
+        }
+        catch (std::runtime_error const&)
+        {
+            // It lets nobody in yet.
+        }
+    }
+    Fail("postgres");
+}
+
 void PostgresCluster::Fail(std::string const& what) const
 {
     throw std::runtime_error(what + " cannot be started: " + ContentOf(m_folder / "log"));

@@ -47,9 +47,6 @@ public:
     // Returns when the SQL answers that; throws if it has not within a minute.
     void Await(std::string const& sql, std::string const& answer) const;
 
-    // Returns when it lets programs in, as after a crash; throws if it does not within a minute.
-    void AwaitAnswer() const;
-
     // Gives a folder to the user as whom servers run.
     static void LetServerInto(std::filesystem::path const& folder);
 
@@ -65,6 +62,10 @@ public:
     // has, too.
     std::unique_ptr<PostgresCluster> MakeStandby() const;
 
+    // One of the server's processes dies, so that it ends all connections and recovers from its journal.
+    // Returns when it lets programs in again.
+    void Crash() const;
+
     // Ends the server with all its processes at one instant, for good.
     void Kill();
 
@@ -79,6 +80,7 @@ private:
     void MakeFolder();
     void Make(std::vector<std::string> const& command);
     void Start();
+    void AwaitAnswer() const;
     [[noreturn]] void Fail(std::string const& what) const;
 
     std::filesystem::path m_folder;

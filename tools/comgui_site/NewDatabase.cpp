@@ -1,9 +1,9 @@
 #include "tools/comgui_site/NewDatabase.h"
 
 #include "standin/server/store/sqlite/SqliteStore.h"
-#include "tools/comgui_site/Trouble.h"
 #include "tools/comgui_site/Workplace.h"
 #if COMGUI_HAS_POSTGRESQL
+#    include "standin/server/site/OpenStore.h"
 #    include "standin/server/store/postgres/PostgresReplacement.h"
 #endif
 
@@ -42,21 +42,38 @@ private:
 class InSchema final : public NewDatabase
 {
 public:
-    InSchema(std::string const& uri, Old old)
-        : m_replacement(uri, old == Old::SetAside ? standin::PostgresReplacement::Old::SetAside
-                                                  : standin::PostgresReplacement::Old::Forbidden)
+    InSchema(standin::SiteName const& name, Old old)
+        : m_folder(name.folder),
+          m_replacement(name.database, old == Old::SetAside ? standin::PostgresReplacement::Old::SetAside
+                                                            : standin::PostgresReplacement::Old::Forbidden)
     {
     }
 
     standin::SiteStore& Store() override { return m_replacement.Store(); }
 
+    // The folder is marked before anybody can open the site, as it may not be there where the first one does.
+    // A site that takes the place of another has the mark of that.
     std::string Finish() override
+    try
     {
+        if (!m_replacement.HasOld())
+            standin::MarkFolder(m_replacement.Store(), m_folder);
         std::string const aside = m_replacement.Finish();
         return aside.empty() ? "" : "the schema " + aside;
     }
+    catch (standin::UnknownReplacement const& unknown)
+    {
+        throw UnknownEnd(unknown.what());
+    }
+    catch (...)
+    {
+        if (!m_replacement.HasOld())
+            standin::UnmarkFolder(m_replacement.Store(), m_folder);
+        throw;
+    }
 
 private:
+    path const m_folder;
     standin::PostgresReplacement m_replacement;
 };
 #endif
@@ -66,7 +83,7 @@ std::unique_ptr<NewDatabase> NewDatabase::Begin(standin::SiteName const& name, p
 {
 #if COMGUI_HAS_POSTGRESQL
     if (name.IsDatabase())
-        return std::make_unique<InSchema>(name.database, old);
+        return std::make_unique<InSchema>(name, old);
 #endif
     if (name.IsDatabase() || old == Old::SetAside)
         throw Trouble("this program was built without PostgreSQL; build it with COMGUI_POSTGRESQL=ON");

@@ -3,10 +3,18 @@
 
 #include "standin/server/site/SiteName.h"
 #include "standin/server/store/SiteStore.h"
+#include "tools/comgui_site/Trouble.h"
 #include <memory>
 
 namespace comgui_site
 {
+// Whether the new one has its name nobody knows, so that its files must stay.
+class UnknownEnd : public Trouble
+{
+public:
+    using Trouble::Trouble;
+};
+
 class NewDatabase
 {
 public:
@@ -29,7 +37,8 @@ public:
     virtual standin::SiteStore& Store() = 0;
 
     // Ends the work on it; it is on the disk and has its name when this returns. The result: what the one
-    // before is called now; empty if there was none.
+    // before is called now; empty if there was none. Throws StoreError or Trouble; UnknownEnd if a server was
+    // lost over it for good.
     virtual std::string Finish() = 0;
 
 protected:

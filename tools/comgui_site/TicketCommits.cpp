@@ -1,10 +1,10 @@
 #include "tools/comgui_site/TicketCommits.h"
 
 #include "standin/server/site/SiteFolders.h"
+#include "standin/server/store/Outcome.h"
 #include "tools/comgui_site/Trouble.h"
 #include "tools/comgui_site/words.h"
 #include <map>
-#include <thread>
 
 namespace comgui_site
 {
@@ -19,10 +19,6 @@ using standin::TicketXml;
 namespace
 {
 constexpr std::string_view InstallFolderKey = "System/InstallFolder";  // the server's own business
-
-// So often, and with such pauses, a store is asked whether a change was made whose outcome is not known.
-constexpr int Questions = 100;
-constexpr std::chrono::milliseconds PauseBetweenQuestions(100);
 
 using Values = std::map<std::string, std::map<int, StoredValue>, std::less<>>;
 
@@ -169,17 +165,9 @@ std::optional<CommitOutcome> TicketCommits::Commit(TicketChange const& change)
 {
     std::uint64_t const number = ++m_number;
     CommitOutcome outcome = m_store.Commit(change, number);
-    for (int question = 1; outcome.kind == CommitOutcome::Unknown; ++question)
-        try
-        {
-            outcome = m_store.FindCommit(number).value_or(CommitOutcome{CommitOutcome::Conflict});
-        }
-        catch (standin::StoreError const&)
-        {
-            if (question == Questions)
-                throw;
-            std::this_thread::sleep_for(PauseBetweenQuestions);
-        }
+    if (outcome.kind == CommitOutcome::Unknown)
+        outcome = standin::AwaitOutcome(m_store, number, change.address)
+                      .value_or(CommitOutcome{CommitOutcome::Conflict});
     if (outcome.kind == CommitOutcome::NoFreeId)
         throw Trouble("no id is free among the tickets of type " + std::to_string(change.address.type) +
                       "; delete some, then try again");

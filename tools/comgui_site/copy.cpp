@@ -184,6 +184,10 @@ try
         files.MoveTo(to.folder);
         target->Finish();
     }
+    catch (UnknownEnd const& unknown)
+    {
+        throw Trouble(std::string(unknown.what()) + "; the files are in " + to.folder.string());
+    }
     catch (...)
     {
         files.MoveBackFrom(to.folder);

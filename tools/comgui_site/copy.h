@@ -16,6 +16,7 @@ struct Copied
 // Makes the second site from the first: tickets, users, and the files and folders of its folder. The second
 // is there only when all of it is, compared with the first, and on the disk; the first stays as it is. Throws
 // Trouble: if programs have the first open, if there is a second already, or if its folder is not empty; and
-// StoreError or FileError. Nothing of the second is left then.
+// StoreError or FileError. Nothing of the second is left then, unless a server was lost over the last step
+// for good: it may be there, and its files are.
 Copied CopySite(standin::SiteName const& from, standin::SiteName const& to);
 }  // namespace comgui_site

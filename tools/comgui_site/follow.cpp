@@ -3,8 +3,11 @@
 #include "tools/comgui_site/Interrupts.h"
 #include "tools/comgui_site/Trouble.h"
 #include "tools/comgui_site/info.h"
+#include <algorithm>
 #include <poll.h>
+#include <thread>
 #include <unistd.h>
+#include <utility>
 
 namespace comgui_site
 {
@@ -68,20 +71,34 @@ public:
 
     void Run()
     {
-        auto due = std::chrono::steady_clock::now();
         while (!Interrupts::HaveCome() && !IsClosed(STDOUT_FILENO))
         {
-            Print();
-            if (std::chrono::steady_clock::now() >= due)
+            try
             {
-                m_store.Maintain(m_heard);
-                due = std::chrono::steady_clock::now() + 1s;
+                Step();
+                m_isLost = false;
             }
-            m_store.WaitForChanges(m_heard, Pause);
+            catch (standin::LostStore const& loss)
+            {
+                if (!std::exchange(m_isLost, true))
+                    std::fprintf(stderr, "comgui_site: %s\n", Cleaned(loss.what()).c_str());
+                std::this_thread::sleep_for(Pause);
+            }
         }
     }
 
 private:
+    void Step()
+    {
+        Print();
+        if (std::chrono::steady_clock::now() >= m_due)
+        {
+            m_store.Maintain(m_heard);
+            m_due = std::chrono::steady_clock::now() + 1s;
+        }
+        m_store.WaitForChanges(m_heard, Pause);
+    }
+
     // One batch of changes, so that a request to end is seen between two of them.
     void Print()
     {
@@ -93,9 +110,10 @@ private:
         };
         if (!m_store.ChangesSince(m_heard, take))
         {
-            Sequence const beginning = BeginningOfJournal(m_store);
-            TellLost(m_heard + 1, beginning - 1, m_isJson, m_out);
-            m_heard = beginning - 1;
+            Sequence const last = BeginningOfJournal(m_store) - 1;
+            if (last > m_heard)  // or else the bell has yet to tell how far the site is
+                TellLost(m_heard + 1, last, m_isJson, m_out);
+            m_heard = std::max(m_heard, last);
         }
         m_out.Flush();
     }
@@ -105,6 +123,8 @@ private:
     bool const m_isJson;
     tools::Output& m_out;
     Sequence m_heard;
+    std::chrono::steady_clock::time_point m_due{};  // to say how far that is
+    bool m_isLost = false;
 };
 }  // namespace
 

@@ -28,6 +28,7 @@ Json JsonOf(standin::CommittedChange const& change, std::string const& program);
 
 // Writes the changes behind that one, or those from now on, until somebody wants the program to end or the
 // output is closed. Where the journal begins later, a line on stderr, or in JSON an object with "lost", says
-// so. Throws Trouble if there is no such change yet.
+// so. Goes on when a store is back that could not be reached; a line on stderr says that it is away. Throws
+// Trouble if there is no such change yet.
 void Follow(standin::Store& store, std::optional<standin::Sequence> since, bool isJson, tools::Output& out);
 }  // namespace comgui_site

@@ -127,7 +127,7 @@ void WriteMirror(Store& store, std::filesystem::path const& site)
     standin::Feed feed(store, nobody, nobody);
     standin::TicketWriter writer(store, feed, nobody);
     standin::TicketService tickets(feed, writer);
-    standin::SystemTicketMirror(tickets, site).Write();
+    standin::SystemTicketMirror(store, tickets, site).Write();
     feed.Stop();
 }
 }  // namespace comgui_site

@@ -166,19 +166,22 @@ private:
 
     void AddDatabase()
     {
-        CLI::App* const backup = Add(
-            m_app, "backup", "Copy the database to one file, while programs work",
-            "Tickets, users and the journal as of one moment. The file is readable by you alone, and has its "
-            "name only when\nit is whole. The folders of files, job/ among them, are not in it.",
-            RunBackup);
+        CLI::App* const backup = Add(m_app, "backup", "Copy the database to one file, while programs work",
+                                     "Tickets, users and, of a site in a folder, the journal, as of one "
+                                     "moment. The file is readable by "
+                                     "you alone, and has\nits name only when it is whole. The folders of "
+                                     "files, job/ among them, are not "
+                                     "in it.",
+                                     RunBackup);
         backup->add_option("FILE", m_request.file, "The new file");
         AddForce(backup);
         Add(m_app, "restore", "Make a backup the database of the site",
             "No program may have the site open. The file is checked first. The old database is not deleted: "
             "it "
-            "gets the name\nsite.db.replaced-DATE-TIME. A missing site is made. The folders of files stay, "
-            "but "
-            "those of jobs that are not in\nthe backup move to job.replaced-DATE-TIME/.",
+            "gets the name\nsite.db.replaced-DATE-TIME, or in a database its schema "
+            "comgui_replaced_DATE_TIME. A "
+            "missing site is made. The\nfolders of files stay, but those of jobs that are not in the backup "
+            "move to job.replaced-DATE-TIME/.",
             RunRestore)
             ->add_option("FILE", m_request.file, "A file that backup has written");
         CLI::App* const copy = Add(

@@ -354,7 +354,17 @@ void Refilled(SiteName const& name, Workplace const& workplace, std::set<std::st
     CopyContent(backup, database->Store());
     backup.Leave();
     StrayJobFolders strays(name.folder, jobs);
-    restored.setAside = database->Finish();
+    try
+    {
+        restored.setAside = database->Finish();
+    }
+    catch (UnknownEnd const& unknown)
+    {
+        auto const kept = strays.Keep();
+        throw Trouble(
+            std::string(unknown.what()) +
+            (kept.empty() ? "" : "; folders of other jobs are in " + path(kept[0]).parent_path().string()));
+    }
     restored.jobFolders = strays.Keep();
 }
 

@@ -110,6 +110,10 @@ User AddUser(Store& store, NewUser const& user, std::string const& passwordHash)
     {
         store.PutUser(made);
     }
+    catch (standin::UnknownOutcome const&)
+    {
+        throw;  // the user may be there, and then needs the ticket
+    }
     catch (standin::StoreError const&)
     {
         if (isMissing)

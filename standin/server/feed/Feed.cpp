@@ -1,6 +1,7 @@
 #include "standin/server/feed/Feed.h"
 
 #include "standin/server/files/NotCancelled.h"
+#include "standin/server/files/RefusableCall.h"
 #include "standin/server/files/Report.h"
 #include <algorithm>
 #include <cassert>
@@ -49,6 +50,8 @@ void Feed::Report(std::string const& line) noexcept
 {
     if (!m_hasReported.exchange(true))
         standin::Report(line);
+    else
+        RefusableCall::Note({line});
 }
 
 bool Feed::CatchUp() noexcept { return CatchUp(m_committed.load(std::memory_order_acquire)); }
@@ -272,6 +275,15 @@ std::optional<Store::Loaded> Feed::Read(TicketAddress address, Values& values)
 bool Feed::Load(TicketAddress address)
 {
     NotCancelled const here;
+    RefusableRead read;
+    if (LoadOrReport(address))
+        return true;
+    read.Refuse();
+    return false;
+}
+
+bool Feed::LoadOrReport(TicketAddress address)
+{
     try
     {
         for (;;)

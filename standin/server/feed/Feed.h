@@ -86,6 +86,7 @@ private:
     using Lock = std::unique_lock<std::mutex>;
 
     bool CatchUp() noexcept;
+    bool LoadOrReport(TicketAddress address);
     void Fetch(Lock& lock);
     bool ReadJournal(Sequence after, std::vector<CommittedChange>& fetched);
     void TakeFromJournal(std::vector<CommittedChange>& fetched);

@@ -1,15 +1,13 @@
 #include "standin/server/feed/TicketWriter.h"
 
+#include "standin/server/files/RefusableCall.h"
 #include "standin/server/files/Report.h"
+#include "standin/server/store/Outcome.h"
 
 namespace standin
 {
 namespace
 {
-// So often, and with such pauses, a store is asked whether a change was made whose outcome is not known.
-constexpr int Questions = 100;
-constexpr std::chrono::milliseconds PauseBetweenQuestions(100);
-
 void Refuse(std::span<TicketWrite> writes)
 {
     for (TicketWrite& write : writes)
@@ -56,7 +54,11 @@ bool TicketWriter::OnSnapshot(Ticket ticket, Plan const& plan)
             Incarnation const now =
                 snapshot ? snapshot->Which().incarnation : cache.IncarnationOf(ticket.address);
             if (now == 0 || (ticket.incarnation != 0 && now != ticket.incarnation))
+            {
+                RefusableCall::Note({"ticket ", std::to_string(ticket.address.type), "/",
+                                     std::to_string(ticket.address.id), " is not there"});
                 return false;
+            }
             if (snapshot)
                 return plan(*snapshot), true;
         }
@@ -169,7 +171,7 @@ TicketWriter::Result TicketWriter::Commit(TicketChange change, Sequence plannedA
     Feed::OwnChange own(m_feed, std::move(change));
     outcome = m_store.Commit(own.Get(), own.Number());
     if (outcome.kind == CommitOutcome::Unknown)
-        outcome = Resolved(own.Number());
+        outcome = Resolved(own);
     switch (outcome.kind)
     {
     case CommitOutcome::Committed:
@@ -192,22 +194,9 @@ void TicketWriter::TakeOverWhatHolds(TicketChange const& change)
 }
 
 // A change that turns out not to have been made counts as one that came too late: it is planned anew.
-CommitOutcome TicketWriter::Resolved(std::uint64_t number)
+CommitOutcome TicketWriter::Resolved(Feed::OwnChange const& change)
 {
-    for (int question = 1;; ++question)
-    {
-        try
-        {
-            if (auto const found = m_store.FindCommit(number))
-                return *found;
-            return {CommitOutcome::Conflict, m_feed.Heard(), {}};
-        }
-        catch (StoreError const&)
-        {
-            if (question == Questions)
-                throw;
-        }
-        std::this_thread::sleep_for(PauseBetweenQuestions);
-    }
+    auto const found = AwaitOutcome(m_store, change.Number(), change.Get().address);
+    return found.value_or(CommitOutcome{CommitOutcome::Conflict, m_feed.Heard(), {}});
 }
 }  // namespace standin

@@ -2,6 +2,9 @@
 // thread or program was faster. So what several make at once is as if one after the other had made it. A
 // change that was committed is in the cache when its call returns.
 //
+// A commit whose outcome is not known at once is asked after, for a minute if need be: so long a call may
+// take.
+//
 // For any thread, with no lock held. Failures of the store are reported on stderr, and the change fails; of
 // DeleteOrThrow they pass through.
 #pragma once
@@ -80,7 +83,7 @@ private:
     bool OnSnapshot(Ticket ticket, Plan const& plan);
     Result Commit(TicketChange change, Sequence plannedAt, CommitOutcome& outcome);
     void TakeOverWhatHolds(TicketChange const& change);
-    CommitOutcome Resolved(std::uint64_t number);
+    CommitOutcome Resolved(Feed::OwnChange const& change);
 
     Store& m_store;
     Feed& m_feed;

@@ -200,7 +200,7 @@ std::optional<JobIntake::Job> JobIntake::Claim(Session const& session, std::stri
 TransferResult JobIntake::Send(Session const& session, std::string const& clientPath, std::string const& name)
 {
     return m_transfers.Run(session,
-                           [&](RunningTransfer const& running)
+                           [&](RunningTransfer& running)
                            {
                                auto job = Claim(session, name);
                                try
@@ -263,7 +263,7 @@ void JobIntake::DropAgain()
 }
 
 void JobIntake::Receive(Session const& session, Job& job, SourceFile const& source, std::string const& name,
-                        RunningTransfer const& running)
+                        RunningTransfer& running)
 {
     job.folders = Folders();
     Descriptor const folder = MakeJobFolder(*job.folders, job.ticket.address.id, job.mark);

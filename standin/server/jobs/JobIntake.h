@@ -64,7 +64,7 @@ private:
     void ForgetGone();
     std::optional<Job> Claim(Session const& session, std::string const& name);
     void Receive(Session const& session, Job& job, SourceFile const& source, std::string const& name,
-                 RunningTransfer const& running);
+                 RunningTransfer& running);
     void Arrive(Session const& session, Job const& job, std::string const& name, long long size);
     bool MayTellOfFile(TicketWriter::Ticket const& ticket);
     void Drop(Job job);

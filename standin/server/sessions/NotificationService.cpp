@@ -1,8 +1,8 @@
 #include "standin/server/sessions/NotificationService.h"
 
 #include "comgui/ticket/TICKET_ID.h"
+#include "standin/server/files/Report.h"
 #include <algorithm>
-#include <cstdio>
 
 namespace standin
 {
@@ -240,8 +240,8 @@ void NotificationService::Post(NotificationKind kind, TicketAddress ticket,
     }
     catch (std::exception const& error)
     {
-        std::fprintf(stderr, "a notification of ticket %d/%d is lost: %s; clients should read it anew\n",
-                     ticket.type, ticket.id, error.what());
+        Report({"a notification of ticket ", std::to_string(ticket.type), "/", std::to_string(ticket.id),
+                " is lost: ", error.what(), "; clients should read it anew"});
     }
 }
 
@@ -260,7 +260,7 @@ void NotificationService::TransferHasEnded(unsigned long long session, int code,
     }
     catch (std::exception const& error)
     {
-        std::fprintf(stderr, "a notification is lost: %s\n", error.what());
+        Report({"a notification is lost: ", error.what()});
     }
 }
 
@@ -318,12 +318,12 @@ void NotificationService::Deliver(Message& message) noexcept
     }
     catch (std::exception const& error)
     {
-        std::fprintf(stderr, "notification id %d: the callback failed: %s\n", message.listener->id,
-                     error.what());
+        Report({"notification id ", std::to_string(message.listener->id),
+                ": the callback failed: ", error.what()});
     }
     catch (...)
     {
-        std::fprintf(stderr, "notification id %d: the callback failed\n", message.listener->id);
+        Report({"notification id ", std::to_string(message.listener->id), ": the callback failed"});
     }
 }
 }  // namespace standin

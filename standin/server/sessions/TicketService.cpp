@@ -1,20 +1,17 @@
 #include "standin/server/sessions/TicketService.h"
 
+#include "standin/server/files/RefusableCall.h"
+
 namespace standin
 {
-bool TicketService::MayWrite(Session const& session, TicketAddress address)
-{
-    if (session.Ended())
-        return false;
-    if (address.type == SystemTicket.type)
-        return session.IsAdministrator();
-    if (address.type == UserTicketType)
-        return session.IsAdministrator() || address.id == session.Who().ticketId;
-    return true;
-}
-
 namespace
 {
+bool OnlyForAdministrators(Session const& session, char const* what)
+{
+    RefusableCall::Note({session.Who().name, " may not ", what, ": only administrators may"});
+    return false;
+}
+
 void HandOut(KeyValues const& values, TextReader& reader)
 {
     for (TicketElement const& element : values.Elements())
@@ -25,6 +22,19 @@ void HandOut(KeyValues const& values, TextReader& reader)
         }
 }
 }  // namespace
+
+bool TicketService::MayWrite(Session const& session, TicketAddress address)
+{
+    if (session.Ended())
+        return false;
+    if (session.IsAdministrator())
+        return true;
+    if (address.type == SystemTicket.type)
+        return OnlyForAdministrators(session, "write the system's tickets");
+    if (address.type == UserTicketType && address.id != session.Who().ticketId)
+        return OnlyForAdministrators(session, "write other users' tickets");
+    return true;
+}
 
 void WalkedValues::Add(KeyValues const& values)
 {
@@ -92,10 +102,16 @@ int TicketService::CreateNext(Session const& session, int type)
 
 bool TicketService::Delete(Session const& session, TicketAddress address)
 {
-    if (address.type == SystemTicket.type || !MayWrite(session, address))
+    if (address.type == SystemTicket.type)
+    {
+        RefusableCall::Note({"the system's tickets are never deleted"});
         return false;
+    }
+    if (!MayWrite(session, address))
+        return false;
+    // A user's ticket goes with the user, and that is not the user's to decide.
     if (address.type == UserTicketType && !session.IsAdministrator())
-        return false;  // a user's ticket goes with the user, and that is not the user's to decide
+        return OnlyForAdministrators(session, "delete users' tickets");
     return m_writer.Delete({address, 0});
 }
 

@@ -86,6 +86,7 @@ public:
     bool Delete(Session const& session, TicketAddress address);
 
     void CatchUp() { m_feed.Fresh(); }  // with all that was acknowledged to anybody
+    bool CatchUp(Sequence sequence) { return m_feed.CatchUp(sequence); }
     Incarnation IncarnationOf(TicketAddress address) { return m_feed.Fresh().IncarnationOf(address); }
     int NextTicket(int type, int after) { return m_feed.Fresh().NextId(type, after); }
     int LargestId(int type) { return m_feed.Fresh().LargestId(type); }  // 0 if there is no ticket of the type

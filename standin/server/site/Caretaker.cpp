@@ -89,10 +89,16 @@ void Caretaker::Clear(Estate const& estate)
         RemovePartFile(file);
     for (Estate::Ticket const& ticket : estate.tickets)
     {
-        bool const isGone = m_writer.DeleteOrThrow({ticket.address, ticket.incarnation}) ||
-                            m_tickets.IncarnationOf(ticket.address) != ticket.incarnation;
-        if (!isGone)
-            throw StoreError("a job of a program that has died cannot be deleted yet; see the line before");
+        if (!m_writer.DeleteOrThrow({ticket.address, ticket.incarnation}) && IsStored(ticket))
+            throw StoreError("a job of a program that has died cannot be deleted yet; it is tried again by "
+                             "itself");
     }
+}
+
+// What the cache does not know it may not have heard of yet.
+bool Caretaker::IsStored(Estate::Ticket const& ticket)
+{
+    auto const found = m_store.Load(ticket.address, [](auto, int, auto const&) {});
+    return found && found->state.incarnation == ticket.incarnation;
 }
 }  // namespace standin

@@ -32,6 +32,7 @@ public:
 
 private:
     void Clear(Estate const& estate);
+    bool IsStored(Estate::Ticket const& ticket);
     void Run();
 
     Store& m_store;

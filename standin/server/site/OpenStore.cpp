@@ -52,15 +52,6 @@ void CheckFolder(PostgresStore const& store, std::filesystem::path const& folder
         RefuseFolder(store, folder, "belongs to another site, with the number " + ForMessages(number));
 }
 
-void MarkFolder(PostgresStore& store, std::filesystem::path const& folder)
-{
-    MakePrivateFolders({folder});
-    if (NumberIn(folder).empty())
-        ReplaceFile(folder / NumberFile, store.SiteNumber() + '\n', 0644);
-    CheckFolder(store, folder, NumberIn(folder));
-    store.NoteFolder();
-}
-
 std::unique_ptr<SiteStore> OpenDatabase(SiteName const& name, std::function<StoreContent()> const& first,
                                         bool keepOpening)
 {
@@ -96,6 +87,28 @@ std::unique_ptr<SiteStore> OpenDatabase(SiteName const&, std::function<StoreCont
 }
 #endif
 }  // namespace
+
+#if COMGUI_HAS_POSTGRESQL
+void MarkFolder(PostgresStore& store, std::filesystem::path const& folder)
+{
+    MakePrivateFolders({folder});
+    if (NumberIn(folder).empty())
+        ReplaceFile(folder / NumberFile, store.SiteNumber() + '\n', 0644);
+    CheckFolder(store, folder, NumberIn(folder));
+    store.NoteFolder();
+}
+
+void UnmarkFolder(PostgresStore const& store, std::filesystem::path const& folder) noexcept
+try
+{
+    if (NumberIn(folder) == store.SiteNumber())
+        std::filesystem::remove(folder / NumberFile);
+}
+catch (std::exception const&)
+{
+    // It is refused to others, with the file's name.
+}
+#endif
 
 std::unique_ptr<SiteStore> OpenStore(SiteName const& name, std::function<StoreContent()> const& first,
                                      SqliteOptions options)

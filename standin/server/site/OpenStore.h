@@ -16,4 +16,15 @@ namespace standin
 // made, as where nothing is mounted; FileError.
 std::unique_ptr<SiteStore> OpenStore(SiteName const& name, std::function<StoreContent()> const& first,
                                      SqliteOptions options = {});
+
+#if COMGUI_HAS_POSTGRESQL
+class PostgresStore;
+
+// What OpenStore does with the folder of a new site, for who makes one in another way: the folder has the
+// site's number, and the site knows that. Throws StoreError if it has another one; FileError.
+void MarkFolder(PostgresStore& store, std::filesystem::path const& folder);
+
+// If the site does not come to be.
+void UnmarkFolder(PostgresStore const& store, std::filesystem::path const& folder) noexcept;
+#endif
 }  // namespace standin

@@ -1,5 +1,6 @@
 #include "standin/server/site/Server.h"
 
+#include "standin/server/files/RefusableCall.h"
 #include "standin/server/files/Report.h"
 #include "standin/server/jobs/JobFolder.h"
 #include <thread>
@@ -8,7 +9,7 @@ namespace standin
 {
 Server::Server(Store& store, std::filesystem::path const& site, KeptTexts::Clock clock)
     : m_store(store), m_texts(std::move(clock)), m_feed(store, m_notifications, m_texts),
-      m_writer(store, m_feed, *this), m_tickets(m_feed, m_writer), m_mirror(m_tickets, site),
+      m_writer(store, m_feed, *this), m_tickets(m_feed, m_writer), m_mirror(store, m_tickets, site),
       m_transfers(store, m_tickets, m_notifications, site), m_jobs(store, m_tickets, m_writer, m_transfers),
       m_caretaker(store, m_feed, m_tickets, m_writer, m_jobs, m_mirror, site)
 {
@@ -60,6 +61,14 @@ bool Server::Logout(Session& session)
     }
     session.ReleaseTexts();
     return true;
+}
+
+bool Server::IsReachable() const noexcept
+{
+    if (m_store.IsReachable())
+        return true;
+    RefusableCall::Note({"the site's database cannot be reached"});
+    return false;
 }
 
 void Server::Stop(std::chrono::milliseconds patience)

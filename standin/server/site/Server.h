@@ -33,7 +33,7 @@ public:
     bool Logout(Session& session);
 
     // Whether the store answers: without it nothing can be written, and nobody hears of others' changes.
-    bool IsReachable() const noexcept { return m_store.IsReachable(); }
+    bool IsReachable() const noexcept;
 
     KeptTexts const& Texts() const { return m_texts; }
     TicketService& Tickets() { return m_tickets; }

@@ -25,6 +25,19 @@ bool MayHaveMark(TicketService& tickets, int id, std::string_view mark)
                                        });
     return hasMark || !isRead;
 }
+
+// The mark of a job as the store has it now; nothing if there is no such job. What others do reaches the
+// cache later where no memory is shared, and not at all while their bell cannot be heard.
+std::optional<std::string> StoredMark(Store& store, int id)
+{
+    std::string mark;
+    auto const take = [&mark](std::string_view key, int, StoredValue const& value)
+    {
+        if (key == JobMarkKey)
+            mark = value.bytes;
+    };
+    return store.Load({JobTicketType, id}, take) ? std::optional(mark) : std::nullopt;
+}
 }  // namespace
 
 std::vector<FolderFault> FaultsOf(FolderSettings const& settings)
@@ -69,11 +82,13 @@ void SweepJobFolders(Store& store, TicketService& tickets, path const& site)
             store.Sync();
         return isThere;
     };
-    SweepJobFolders(*jobs, {[&](int id) {
-                                return orIsGoneForGood(tickets.IncarnationOf({JobTicketType, id}) != 0);
-                            },
-                            [&](int id, std::string_view mark)
-                            { return orIsGoneForGood(MayHaveMark(tickets, id, mark)); }});
+    SweepJobFolders(
+        *jobs,
+        {[&](int id) {
+             return orIsGoneForGood(tickets.IncarnationOf({JobTicketType, id}) != 0 || StoredMark(store, id));
+         },
+         [&](int id, std::string_view mark)
+         { return orIsGoneForGood(MayHaveMark(tickets, id, mark) || StoredMark(store, id) == mark); }});
 }
 
 void SetJobFoldersAside(path const& jobs)

@@ -18,7 +18,7 @@ struct FolderFault
 std::vector<FolderFault> FaultsOf(FolderSettings const& settings);
 
 // Removes job folders without a job in the site's own folder for jobs, if that is where jobs are; other
-// programs may make and delete jobs meanwhile. Throws StoreError.
+// programs may make and delete jobs meanwhile, also such that this one has not heard of. Throws StoreError.
 void SweepJobFolders(Store& store, TicketService& tickets, std::filesystem::path const& site);
 
 // For a site that begins anew, alone with it: its old jobs are not lost, nor taken for those of the new

@@ -39,8 +39,9 @@ private:
 };
 }  // namespace
 
-SystemTicketMirror::SystemTicketMirror(TicketService& tickets, std::filesystem::path const& site)
-    : m_tickets(tickets), m_file(site / "tickets" / "SYS_0000.xml")
+SystemTicketMirror::SystemTicketMirror(Store& store, TicketService& tickets,
+                                       std::filesystem::path const& site)
+    : m_store(store), m_tickets(tickets), m_file(site / "tickets" / "SYS_0000.xml")
 {
 }
 
@@ -81,6 +82,10 @@ void SystemTicketMirror::WriteInTurn(std::chrono::milliseconds limit)
         std::this_thread::sleep_for(Pause);
         errno = EWOULDBLOCK;
     }
+    // Others may have written what is not heard of here yet.
+    auto const found = m_store.Load(SystemTicket, [](auto, int, auto const&) {});
+    if (found && !m_tickets.CatchUp(found->sequence))
+        throw StoreError(m_file.string() + ": is not up to date; it is written again by itself");
     TicketXml copy;
     auto const take = [&](TicketSnapshot const& ticket) { copy = TicketXml::Of(SystemTicket, ticket); };
     if (m_tickets.LookAt(SystemTicket, 0, [&](auto const& ticket) { return take(ticket), true; }))

@@ -13,7 +13,7 @@ class SystemTicketMirror
 {
 public:
     // site: the folder of the site.
-    SystemTicketMirror(TicketService& tickets, std::filesystem::path const& site);
+    SystemTicketMirror(Store& store, TicketService& tickets, std::filesystem::path const& site);
 
     // Writes the file from the newest system ticket. Programs take turns, and each reads in its turn, so what
     // the last of them leaves is no older than any change before. The file is a copy: a failure is reported
@@ -26,6 +26,7 @@ public:
 private:
     void WriteInTurn(std::chrono::milliseconds limit);
 
+    Store& m_store;
     TicketService& m_tickets;
     std::filesystem::path const m_file;
     std::mutex m_turn;  // of this program's threads

@@ -29,8 +29,29 @@ public:
     using std::runtime_error::runtime_error;
 };
 
+// The store cannot be reached, and may be a moment later.
+class LostStore : public StoreError
+{
+public:
+    using StoreError::StoreError;
+};
+
 // A record of the journal cannot be read. The tickets may be sound all the same.
 class BrokenJournal : public StoreError
+{
+public:
+    using StoreError::StoreError;
+};
+
+// This handle is of no more use, now and for ever.
+class UnusableStore : public StoreError
+{
+public:
+    using StoreError::StoreError;
+};
+
+// Whether the operation has taken effect is not known, and nobody asks after it any more.
+class UnknownOutcome : public StoreError
 {
 public:
     using StoreError::StoreError;
@@ -116,7 +137,8 @@ public:
     virtual CommitOutcome Commit(TicketChange const& change, std::uint64_t number) = 0;
 
     // Whether the change of this handle with that number was committed, and as what; nothing if it was not,
-    // and then it never will be. After Unknown only.
+    // and then it never will be. After Unknown only; who goes on asking after a failure pauses no longer than
+    // some seconds, lest the journal forget it.
     virtual std::optional<CommitOutcome> FindCommit(std::uint64_t number) = 0;
 
     // What was committed through this handle is on the disk when this returns, so that a power cut cannot

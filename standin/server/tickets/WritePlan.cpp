@@ -1,5 +1,6 @@
 #include "standin/server/tickets/WritePlan.h"
 
+#include "standin/server/files/RefusableCall.h"
 #include <algorithm>
 
 namespace standin
@@ -95,7 +96,12 @@ bool WritePlan::FoldersAllow(std::string_view key, int pos, TicketValue const& v
     FolderSettings after = *m_folders;
     after.Put(key, value.ToStored());
     if (!after.CanBeRead() && m_folders->CanBeRead())
+    {
+        RefusableCall::Note({key,
+                             ": with this value clients could not resolve the folders; let a folder begin "
+                             "only with the variable of one above it"});
         return false;
+    }
     *m_folders = std::move(after);
     return true;
 }

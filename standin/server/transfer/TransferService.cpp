@@ -36,6 +36,12 @@ void RunningTransfer::Check() const
         throw TransferError(TransferCut, "");
 }
 
+void RunningTransfer::Begin(unsigned long long turn, off_t size)
+{
+    m_turn = turn;
+    m_size = size;
+}
+
 TransferService::~TransferService()
 {
     Stop(std::chrono::hours(1));
@@ -51,12 +57,17 @@ std::filesystem::path TransferService::ClientPath(std::string text)
     return std::filesystem::absolute(text);
 }
 
-void TransferService::Copy(PartFile& target, SourceFile const& source, RunningTransfer const& running,
-                           std::function<void(off_t done)> const& told) const
+void TransferService::Copy(PartFile& target, SourceFile const& source, RunningTransfer& running,
+                           std::function<void(off_t done)> const& told)
 {
+    {
+        std::lock_guard const lock(m_lock);
+        running.Begin(++m_lastTurn, source.Size());
+    }
     target.CopyFrom(source, m_pace.piece,
                     [&](off_t done)
                     {
+                        running.Advance(done);
                         if (m_pace.after)
                             m_pace.after();
                         running.Check();
@@ -66,7 +77,7 @@ void TransferService::Copy(PartFile& target, SourceFile const& source, RunningTr
 }
 
 // Gives the size of what it has carried.
-off_t TransferService::CarryNow(Request const& request, RunningTransfer const& running)
+off_t TransferService::CarryNow(Request const& request, RunningTransfer& running)
 {
     running.Check();
     if (request.direction == Request::ToServer)
@@ -93,7 +104,20 @@ off_t TransferService::CarryNow(Request const& request, RunningTransfer const& r
 
 TransferResult TransferService::Carry(Session const& session, Request const& request)
 {
-    return Run(session, [&](RunningTransfer const& running) { CarryNow(request, running); });
+    return Run(session, [&](RunningTransfer& running) { CarryNow(request, running); });
+}
+
+std::optional<TransferService::Progress> TransferService::ProgressOf(Session const& session)
+{
+    std::lock_guard const lock(m_lock);
+    RunningTransfer const* first = nullptr;
+    for (RunningTransfer const& running : m_running)
+    {
+        bool const copies = running.Session() == session.Number() && running.Turn() != 0;
+        if (copies && (!first || running.Turn() < first->Turn()))
+            first = &running;
+    }
+    return first ? std::optional(Progress{first->Done(), first->Size()}) : std::nullopt;
 }
 
 TransferResult TransferService::Run(Session const& session,
@@ -180,7 +204,7 @@ void TransferService::Work()
         lock.unlock();
         off_t size = 0;
         TransferResult const result =
-            Finish(place, [&](RunningTransfer const& running) { size = CarryNow(waiting.request, running); });
+            Finish(place, [&](RunningTransfer& running) { size = CarryNow(waiting.request, running); });
         if (result != TransferCut)  // then nobody is there to be told
             Tell(waiting, result, size);
         lock.lock();
@@ -193,7 +217,7 @@ void TransferService::Tell(Waiting const& done, TransferResult result, off_t siz
     static Key const source = keys.Intern("Transfer/Source");
     static Key const target = keys.Intern("Transfer/Target");
     static Key const code = keys.Intern("Transfer/Code");
-    static Key const bytes = keys.Intern("Transfer/Size");
+    static Key const bytes = keys.Intern(TransferSizeKey);
     try
     {
         ChangedParameters records;

@@ -14,10 +14,13 @@
 #include <condition_variable>
 #include <deque>
 #include <list>
+#include <optional>
 #include <thread>
 
 namespace standin
 {
+inline constexpr char TransferSizeKey[] = "Transfer/Size";  // an int64, in bytes
+
 // A transfer on its way, which may be cut from outside.
 class RunningTransfer
 {
@@ -28,9 +31,19 @@ public:
     void Cut() { m_cut.store(true, std::memory_order_relaxed); }
     void Check() const;  // throws TransferError once it has been cut
 
+    // How far it is, in bytes; any thread may look. turn: in the order in which copying begins, 1 and up.
+    void Begin(unsigned long long turn, off_t size);
+    void Advance(off_t done) { m_done.store(done, std::memory_order_relaxed); }
+    unsigned long long Turn() const { return m_turn; }  // 0 before it copies
+    off_t Done() const { return m_done.load(std::memory_order_relaxed); }
+    off_t Size() const { return m_size; }
+
 private:
     unsigned long long const m_session;
     std::atomic<bool> m_cut{false};
+    std::atomic<off_t> m_done{0};
+    unsigned long long m_turn = 0;  // these two are under the lock of the service
+    off_t m_size = 0;
 };
 
 class TransferService
@@ -68,6 +81,15 @@ public:
     // wrong with the paths themselves, and an ended session, is told at once; so are too many.
     TransferResult CarryLater(Session const& session, Request request);
 
+    // Of the transfer that copies for the session now; of several, the one that began first. Nothing if none
+    // does: what waits, or is only looked at yet, does not count. Waits for no transfer.
+    struct Progress
+    {
+        off_t done;  // at most size, and never less than before
+        off_t size;
+    };
+    std::optional<Progress> ProgressOf(Session const& session);
+
     // Runs a transfer of any kind in such a way that it can be cut, and answers how it ended.
     TransferResult Run(Session const& session, std::function<void(RunningTransfer& running)> const& work);
 
@@ -90,8 +112,8 @@ public:
     void Set(PartFile::Survives what) { m_survives = what; }
 
     // What the transfer calls after a piece: checks for a cut, then told.
-    void Copy(PartFile& target, SourceFile const& source, RunningTransfer const& running,
-              std::function<void(off_t done)> const& told = {}) const;
+    void Copy(PartFile& target, SourceFile const& source, RunningTransfer& running,
+              std::function<void(off_t done)> const& told = {});
 
     static std::filesystem::path ClientPath(std::string text);  // absolute. Throws TransferError
 
@@ -105,7 +127,7 @@ private:
     using Lock = std::unique_lock<std::mutex>;
     using Place = std::list<RunningTransfer>::iterator;
 
-    off_t CarryNow(Request const& request, RunningTransfer const& running);
+    off_t CarryNow(Request const& request, RunningTransfer& running);
     TransferResult Finish(Place running, std::function<void(RunningTransfer& running)> const& work);
     bool Runs(unsigned long long session) const;
     void Work();
@@ -122,6 +144,7 @@ private:
 
     std::mutex m_lock;  // the members below
     std::list<RunningTransfer> m_running;
+    unsigned long long m_lastTurn = 0;
     std::deque<Waiting> m_waiting;
     std::condition_variable m_work;
     std::condition_variable m_done;

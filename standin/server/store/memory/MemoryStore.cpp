@@ -269,7 +269,7 @@ std::unique_lock<std::mutex> MemoryStore::Begin(char const* operation)
         throw std::logic_error("a function that takes values uses the store that hands them out");
     std::unique_lock lock(m_site->m_mutex);
     if (m_hasLeft)
-        throw StoreError("the site in memory: this program has ended; open it anew");
+        throw UnusableStore("the site in memory: this program has ended; open it anew");
     m_site->MayFail(operation);
     return lock;
 }

@@ -57,6 +57,7 @@ void Bell::Abandon() noexcept
 void Bell::Listen(std::chrono::milliseconds limit)
 {
     m_connection = std::make_unique<Connection>(m_target, m_limits.statement, Clock::now() + limit, &m_hurry);
+    m_calls.check(*m_connection);
     m_connection->Execute("SET synchronous_commit = off; LISTEN " + m_connection->Quoted(m_target.schema),
                           Clock::now() + limit);
     m_connection->OnSilence(Silence,
@@ -71,7 +72,7 @@ void Bell::Listen(std::chrono::milliseconds limit)
 
 void Bell::Run() noexcept
 {
-    while (!m_isOver)
+    while (!m_isOver && !m_reach.IsOver())
     {
         try
         {
@@ -87,13 +88,13 @@ void Bell::Run() noexcept
             PauseAfterBreak();
         }
     }
+    m_connection.reset();
 }
 
 void Bell::ListenAgain()
 {
     Listen(m_reach.IsThere() ? std::min(m_limits.connect, Silence) : m_limits.connect);
-    m_calls.heard(
-        m_connection->Run("SELECT sequence FROM newest", {}, Clock::now() + m_limits.statement).Number(0, 0));
+    LookAtJournal();
     m_reach.NoteReturn();
     m_calls.look();
 }
@@ -114,18 +115,19 @@ void Bell::NoteBreak(std::exception const& failure)
 
 void Bell::PauseAfterBreak()
 {
-    for (auto const end = Clock::now() + m_pause.Take(); !m_isOver && Clock::now() < end;)
+    for (auto const end = Clock::now() + m_pause.Take();
+         !m_isOver && !m_reach.IsOver() && Clock::now() < end;)
         Hear(end);
     m_calls.look();
 }
 
 void Bell::Serve()
 {
-    while (!m_isOver)
+    while (!m_isOver && !m_reach.IsOver())
     {
         auto const now = Clock::now();
-        bool const isAsked = m_isAsked;
-        if (isAsked && now >= m_nextRing)
+        auto const nextRing = m_isAsked ? std::max(m_nextRing, m_pace.Next()) : Clock::time_point::max();
+        if (now >= nextRing)
             SendRing();
         else if (now >= m_lastAnswer + QuestionDistance)
             Ask("SELECT", {});
@@ -135,17 +137,20 @@ void Bell::Serve()
             m_nextLook = now + m_limits.pulse;
         }
         else
-            Hear(std::min({isAsked ? m_nextRing : Clock::time_point::max(), m_lastAnswer + QuestionDistance,
-                           m_nextLook}));
+            Hear(std::min({nextRing, m_lastAnswer + QuestionDistance, m_nextLook}));
     }
-    SendRing();
+    if (!m_reach.IsOver())
+        SendRing();
 }
 
 void Bell::Ask(char const* sql, Parameters const& parameters)
 {
     m_connection->Run(sql, parameters, Clock::now() + m_limits.connect);
     m_lastAnswer = Clock::now();
+    bool const wasLost = !m_reach.IsThere();
     m_reach.NoteAnswer();
+    if (wasLost)
+        m_calls.look();
     HearRings();
 }
 
@@ -164,18 +169,39 @@ void Bell::Hear(Clock::time_point end)
     }
 }
 
+// What is rung and is not in the journal is nobody's change: it counts for nothing.
 void Bell::HearRings()
+{
+    for (Sequence rung = NewestRing(); rung != 0; rung = NewestRing())
+    {
+        if (rung > std::max<Sequence>(m_known, m_toRing))
+            LookAtJournal();
+        if (rung <= std::max<Sequence>(m_known, m_toRing))
+            m_rung = std::max(m_rung, rung);
+    }
+}
+
+// Of those that have come; 0 if none has.
+Sequence Bell::NewestRing()
 {
     Sequence newest = 0;
     for (std::string payload; m_connection->TakeNotification(payload);)
     {
+        m_pace.NoteRing();
         Sequence rung = 0;
         auto const parsed = std::from_chars(payload.data(), payload.data() + payload.size(), rung);
         if (parsed.ec == std::errc() && parsed.ptr == payload.data() + payload.size())
             newest = std::max(newest, rung);
     }
-    if (newest != 0)
-        m_calls.heard(newest);
+    return newest;
+}
+
+void Bell::LookAtJournal()
+{
+    m_known =
+        m_connection->Run("SELECT sequence FROM newest", {}, Clock::now() + m_limits.statement).Number(0, 0);
+    m_lastAnswer = Clock::now();
+    m_calls.heard(m_known);
 }
 
 void Bell::SendRing()

@@ -24,6 +24,14 @@ constexpr int Binary = 1;
 constexpr int NullSize = -1;  // of an array's element
 constexpr std::size_t LargestParameter = 0x3FFFFFFF;
 
+// A line on which bytes flow may rest so long.
+constexpr std::chrono::seconds LongestRest(5);
+
+Clock::time_point MovedOn(Clock::time_point deadline)
+{
+    return std::max(deadline, Clock::now() + LongestRest);
+}
+
 constexpr char const* LostRemedy = "check the server and the network; the program connects again by itself";
 
 void Put(std::string& out, unsigned long long number, int size)
@@ -84,6 +92,7 @@ char const* RemedyOf(std::string_view code)
         {"42501", "grant this user what the schema's owner may do"},
         {"25006", "connect to the primary server: name it too, or promote this one"},
         {"57P03", "wait until the server is up, or promote its standby"},
+        {"55P03", "see in pg_stat_activity who keeps it waiting, then try again"},
         {"57014", "see in pg_stat_activity who keeps it waiting, then try again"},
         {"40", "try again"},
         {"54", "keep a value below 1 GB"},
@@ -123,6 +132,28 @@ std::map<std::string, std::string> ValuesOf(Options const& options)
         if (option->val)
             values[option->keyword] = option->val;
     return values;
+}
+
+// With what a service file, the environment and libpq itself add to it, without a word to any host: libpq
+// looks at all values before it connects, and refuses that of sslmode.
+Options Resolved(std::string const& uri)
+{
+    Parsed(uri);
+    char const* const keywords[] = {"dbname", "sslmode", nullptr};
+    char const* const values[] = {uri.c_str(), "none of them", nullptr};
+    std::unique_ptr<PGconn, decltype(&PQfinish)> const refused(PQconnectStartParams(keywords, values, 1),
+                                                               PQfinish);
+    return Options(PQconninfo(refused.get()));
+}
+
+// Of a host for which a list of ports names none.
+std::string DefaultPort()
+{
+    Options const options(PQconndefaults());
+    for (PQconninfoOption const* option = options.get(); option && option->keyword; ++option)
+        if (option->keyword == std::string_view("port") && option->compiled)
+            return option->compiled;
+    return "5432";
 }
 
 std::vector<std::string> Split(std::string const& list)
@@ -265,22 +296,21 @@ struct Connection::Host
     std::string Place() const { return (name.empty() ? address : name) + ":" + port; }
 };
 
-Connection::Connection(Target const& target, std::chrono::milliseconds statementLimit,
-                       Clock::time_point deadline, Hurry const* hurry)
-    : m_hurry(hurry)
+Connection::Connection(Target const& target, std::chrono::milliseconds lockLimit, Clock::time_point deadline,
+                       Hurry const* hurry)
+    : m_hurry(hurry),
+      m_socket([](void const* connection) { return PQsocket(static_cast<PGconn const*>(connection)); })
 {
-    Open(target, statementLimit, deadline);
+    Open(target, lockLimit, deadline);
 }
 
 Connection::~Connection() = default;
 
 // libpq tries several hosts, too, but would wait for the first silent one until the end. What it is to leave
-// out of a list cannot be said to it, so lists with gaps are its own.
+// out of a list cannot be said to it: a list that has addresses or names for some hosts alone is its own.
 std::vector<Connection::Host> Connection::HostsOf(std::string const& uri)
 {
-    auto values = ValuesOf(Parsed(uri));
-    bool const isElsewhere = values.contains("service") && !values.contains("host");
-    values.merge(ValuesOf(Options(PQconndefaults())));
+    auto values = ValuesOf(Resolved(uri));
     auto const names = Split(values["host"]), addresses = Split(values["hostaddr"]);
     auto const ports = Split(values["port"]);
     std::size_t const count = std::max(names.size(), addresses.size());
@@ -288,41 +318,43 @@ std::vector<Connection::Host> Connection::HostsOf(std::string const& uri)
     auto const part = [&](std::vector<std::string> const& list, std::size_t i) {
         return list.size() == 1 ? list[0] : i < list.size() ? list[i] : "";
     };
-    for (std::size_t i = 0; i < count && !isElsewhere; ++i)
+    for (std::size_t i = 0; i < count; ++i)
         hosts.push_back({part(names, i), part(addresses, i), part(ports, i)});
+    for (Host& host : hosts)
+        host.port = host.port.empty() ? DefaultPort() : host.port;
     bool const isWhole = std::all_of(hosts.begin(), hosts.end(),
-                                     [&](Host const& host)
-                                     {
+                                     [&](Host const& host) {
                                          return (names.size() == 1 || !host.name.empty()) &&
-                                                (addresses.size() == 1 || !host.address.empty()) &&
-                                                !host.port.empty();
+                                                (addresses.size() == 1 || !host.address.empty());
                                      });
-    return count > 1 && isWhole && !isElsewhere ? hosts : std::vector<Host>(1);
+    return count > 1 && isWhole ? hosts : std::vector<Host>(1);
 }
 
-void Connection::Open(Target const& target, std::chrono::milliseconds statementLimit,
-                      Clock::time_point deadline)
+void Connection::Open(Target const& target, std::chrono::milliseconds lockLimit, Clock::time_point deadline)
 {
     std::vector<Host> const hosts = HostsOf(target.uri);
     std::string places, reasons, remedy;
     for (Host const& host : hosts)
         places += hosts.size() == 1 ? "" : (places.empty() ? "" : ",") + host.Place();
     bool isRefused = false;
+    std::size_t const first = *target.lastHost;
     for (std::size_t i = 0; i < hosts.size(); ++i)
     {
+        std::size_t const which = (first + i) % hosts.size();
         auto const now = Clock::now();
         auto const end = now + (deadline - now) / static_cast<int>(hosts.size() - i);
         try
         {
-            Connect(target, hosts[i], places, end);
-            SetUp(target, statementLimit, end);
+            Connect(target, hosts[which], places, end);
+            SetUp(target, lockLimit, end);
+            *target.lastHost = which;
             return;
         }
         catch (BrokenConnection const& error)
         {
             if (hosts.size() == 1)
                 throw;
-            reasons += (reasons.empty() ? "" : ", ") + hosts[i].Place() + ": " + m_reason;
+            reasons += (reasons.empty() ? "" : ", ") + hosts[which].Place() + ": " + m_reason;
             if (!isRefused)
                 remedy = m_remedy;
             isRefused = isRefused || error.IsRefusal();
@@ -360,7 +392,9 @@ void Connection::Connect(Target const& target, Host const& host, std::string con
                                   nullptr};
     m_isConnected = m_isBroken = false;
     m_prepared.clear();
+    m_socket.Set(nullptr);
     m_connection.reset(PQconnectStartParams(keywords, values, 1));
+    m_socket.Set(m_connection.get());
     if (!m_connection)
         throw BrokenConnection("no memory for a connection; end other programs, then try again");
     PQsetNoticeReceiver(
@@ -386,18 +420,20 @@ void Connection::Connect(Target const& target, Host const& host, std::string con
 // sees what others have committed meanwhile, whatever the database's default is: commits rely on that. The
 // server, too, is to notice soon when the other machine is gone: the program's death shows by that. A server
 // that does not let it write is of no use, whatever the URI asks for.
-void Connection::SetUp(Target const& target, std::chrono::milliseconds statementLimit,
-                       Clock::time_point deadline)
+// Every statement here is short and comes often: to compile it, or to plan it anew, costs more than it saves.
+void Connection::SetUp(Target const& target, std::chrono::milliseconds lockLimit, Clock::time_point deadline)
 {
-    std::string const limit = std::to_string(statementLimit.count());
+    std::string const limit = std::to_string(lockLimit.count());
     Result const row = Run(
         "SELECT pg_is_in_recovery(), current_setting('transaction_read_only')::boolean, "
         "set_config('search_path', quote_ident(convert_from($1, 'UTF8')) || ', pg_temp', false), "
-        "set_config('statement_timeout', convert_from($2, 'UTF8'), false), "
+        "set_config('lock_timeout', convert_from($2, 'UTF8'), false), "
+        "set_config('statement_timeout', '0', false), "
         "set_config('default_transaction_isolation', 'read committed', false), "
         "set_config('tcp_keepalives_idle', '5', false), set_config('tcp_keepalives_interval', '5', false), "
         "set_config('tcp_keepalives_count', '3', false), set_config('tcp_user_timeout', '20000', false), "
-        "set_config('client_min_messages', 'error', false)",
+        "set_config('client_min_messages', 'error', false), "
+        "set_config('jit', 'off', false), set_config('plan_cache_mode', 'force_generic_plan', false)",
         Parameters() << std::string_view(target.schema) << std::string_view(limit), deadline);
     if (row.Bool(0, 1))
         FailAsBroken(row.Bool(0, 0) ? "the server is a standby, which cannot be written to"
@@ -509,6 +545,9 @@ void Connection::Wait(short events, Clock::time_point deadline)
         if (WaitUntil(deadline, events))
             return;
     }
+    while (m_isWorthWaiting && m_isWorthWaiting())
+        if (WaitUntil(Clock::now() + std::chrono::milliseconds(100), events))
+            return;
     FailAsBroken("has not answered in time", LostRemedy);
 }
 
@@ -533,13 +572,14 @@ bool Connection::WaitUntil(Clock::time_point end, short events)
 }
 
 // Reads meanwhile, lest server and client wait for each other with full buffers.
-void Connection::Flush(Clock::time_point deadline)
+void Connection::Flush(Clock::time_point& deadline)
 {
     for (int left = PQflush(m_connection.get()); left != 0; left = PQflush(m_connection.get()))
     {
         if (left < 0)
             FailAsBroken();
         Wait(POLLIN | POLLOUT, deadline);
+        deadline = MovedOn(deadline);
         TakeIn();
     }
 }
@@ -554,6 +594,7 @@ Result Connection::Finish(Clock::time_point deadline)
         while (PQisBusy(m_connection.get()) != 0)
         {
             Wait(POLLIN, deadline);
+            deadline = MovedOn(deadline);
             TakeIn();
         }
         Result next(PQgetResult(m_connection.get()));

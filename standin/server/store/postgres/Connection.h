@@ -1,4 +1,5 @@
-// One connection to a PostgreSQL database, with what every use of it needs: a deadline for every call,
+// One connection to a PostgreSQL database, with what every use of it needs: a deadline for every call, which
+// moves on as long as bytes come and go, since a large answer over a slow line is no sign of trouble,
 // statements that are prepared once, parameters apart from the SQL, and failures that throw one line. For one
 // thread at a time.
 //
@@ -7,9 +8,11 @@
 // several statements could still be moved.
 #pragma once
 
+#include "standin/server/files/ForkedChild.h"
 #include "standin/server/store/Store.h"
 #include "standin/server/store/postgres/Wakeup.h"
 #include <array>
+#include <atomic>
 #include <chrono>
 #include <concepts>
 #include <cstdint>
@@ -29,11 +32,11 @@ using Clock = std::chrono::steady_clock;
 
 // The connection is of no more use. Nobody knows whether the statement that it was lost over has taken
 // effect.
-class BrokenConnection : public StoreError
+class BrokenConnection : public LostStore
 {
 public:
     explicit BrokenConnection(std::string const& line, bool isRefusal = false)
-        : StoreError(line), m_isRefusal(isRefusal)
+        : LostStore(line), m_isRefusal(isRefusal)
     {
     }
 
@@ -136,6 +139,9 @@ struct Target
 {
     std::string uri;     // or keywords and values, as libpq takes them
     std::string schema;  // in which the site is
+
+    // Which of the hosts has let a program in last; shared by all copies.
+    std::shared_ptr<std::atomic<std::size_t>> lastHost = std::make_shared<std::atomic<std::size_t>>(0);
 };
 
 // Lets a thread that is about to end cut short what connections wait for in other threads.
@@ -155,11 +161,11 @@ private:
 class Connection
 {
 public:
-    // Connects to the first of the hosts that lets it write; each gets its share of the time. Statements find
-    // what they name in the schema, and the server ends one that takes longer than statementLimit. Throws
-    // BrokenConnection, at the deadline at the latest, but for the time that the system takes to look up the
-    // name of a host. hurry lives longer.
-    Connection(Target const& target, std::chrono::milliseconds statementLimit, Clock::time_point deadline,
+    // Connects to the first of the hosts that lets it write, beginning with the last that did; each gets its
+    // share of the time. Statements find what they name in the schema, and the server ends one that waits for
+    // others for lockLimit; 0: never. Throws BrokenConnection, at the deadline at the latest, but for the
+    // time that the system takes to look up the name of a host. hurry lives longer.
+    Connection(Target const& target, std::chrono::milliseconds lockLimit, Clock::time_point deadline,
                Hurry const* hurry = nullptr);
     ~Connection();
     Connection(Connection const&) = delete;
@@ -174,6 +180,9 @@ public:
 
     // report is called when the server has been silent for so long while it is waited for; the wait goes on.
     void OnSilence(std::chrono::milliseconds time, std::function<void()> report);
+
+    // A deadline does not count as long as that holds: for who counts all that there is.
+    void WaitAsLongAs(std::function<bool()> isWorthIt) { m_isWorthWaiting = std::move(isWorthIt); }
 
     // Whether the server has not ended it, as far as it has said so. For a connection that only works.
     bool IsSound();
@@ -204,13 +213,13 @@ private:
     };
 
     static std::vector<Host> HostsOf(std::string const& uri);
-    void Open(Target const& target, std::chrono::milliseconds statementLimit, Clock::time_point deadline);
+    void Open(Target const& target, std::chrono::milliseconds lockLimit, Clock::time_point deadline);
     void Connect(Target const& target, Host const& host, std::string const& places,
                  Clock::time_point deadline);
-    void SetUp(Target const& target, std::chrono::milliseconds statementLimit, Clock::time_point deadline);
+    void SetUp(Target const& target, std::chrono::milliseconds lockLimit, Clock::time_point deadline);
     void Wait(short events, Clock::time_point deadline);
     bool WaitUntil(Clock::time_point end, short events);
-    void Flush(Clock::time_point deadline);
+    void Flush(Clock::time_point& deadline);
     Result Finish(Clock::time_point deadline);
     std::string const& Prepared(char const* sql, Parameters const& parameters, Clock::time_point deadline);
     void MustSend(int isSent);
@@ -224,7 +233,9 @@ private:
     Clock::time_point m_lastMoment = Clock::time_point::max();  // once there is hurry
     std::chrono::milliseconds m_silence{};
     std::function<void()> m_reportSilence;  // null: nobody asks for it
+    std::function<bool()> m_isWorthWaiting;
     std::unique_ptr<pg_conn, Close> m_connection;
+    KeptFromChildren m_socket;  // a program lives as long as the server sees it connected
     std::string m_name;
     std::string m_reason, m_remedy;  // of a failure
     bool m_isConnected = false;      // once

@@ -5,6 +5,7 @@
 
 namespace standin
 {
+using namespace std::chrono_literals;
 using postgres::Clock;
 using postgres::Connection;
 using postgres::Result;
@@ -127,11 +128,13 @@ private:
 };
 }  // namespace
 
+// What counts all that there is takes as long as that takes, if only the server is there.
 std::unique_ptr<Connection> PostgresStore::OwnConnection() const
 {
     CheckUsable();
-    return std::make_unique<Connection>(m_target, m_options.statementLimit,
-                                        Clock::now() + m_options.connectLimit);
+    auto connection = std::make_unique<Connection>(m_target, 0ms, Clock::now() + m_options.connectLimit);
+    connection->WaitAsLongAs([this] { return m_reach.IsThere(); });
+    return connection;
 }
 
 std::unique_ptr<SiteStore::UsersTurn> PostgresStore::TakeUsersTurn(std::chrono::milliseconds limit)

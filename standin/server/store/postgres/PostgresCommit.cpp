@@ -9,6 +9,7 @@
 namespace standin
 {
 using postgres::BrokenConnection;
+using postgres::Clock;
 using postgres::Parameters;
 using postgres::Result;
 
@@ -113,6 +114,7 @@ CommitOutcome PostgresStore::Commit(TicketChange const& change, std::uint64_t nu
     CheckUsable();
     Parameters const request = RequestOf(change, m_self, number);
     Turn turn(*this);
+    Sequence const known = m_committed;  // less than what this change gets
     try
     {
         CommitOutcome const outcome = Send(turn, request, change.address);
@@ -123,7 +125,7 @@ CommitOutcome PostgresStore::Commit(TicketChange const& change, std::uint64_t nu
     catch (BrokenConnection const&)
     {
         std::lock_guard const lock(m_unknowns);
-        m_unknown[number] = m_committed;
+        m_unknown[number] = {known, Clock::now(), true};
         return {};
     }
 }
@@ -171,19 +173,56 @@ void PostgresStore::Announce(Sequence committed)
     m_bell->Ring(committed);
 }
 
+// What is found may be on this server alone: when a break ends the wait for a standby, the server lets
+// everybody see the change. A commit behind it waits for the same standbys, so that the answer is worth as
+// much as that of the change itself would have been.
+void PostgresStore::MakeLasting(Turn& turn)
+{
+    turn.Run("SELECT pg_logical_emit_message(true, 'comgui', '')");
+}
+
 std::optional<CommitOutcome> PostgresStore::FindCommit(std::uint64_t number)
 {
+    NoteQuestion(number);
     Turn turn(*this);
-    Result const rows = turn.Run("SELECT sequence, type, id FROM journal WHERE program = $1 AND number = $2 "
-                                 "UNION ALL "
-                                 "SELECT sequence, type, id FROM outcome WHERE program = $1 AND number = $2",
-                                 Parameters() << m_self << number);
-    std::lock_guard const lock(m_unknowns);
-    m_unknown.erase(number);
-    if (rows.Rows() == 0)
+    Result const rows =
+        turn.Run("SELECT s.forgotten, c.sequence, c.type, c.id FROM site s LEFT JOIN ("
+                 "SELECT sequence, type, id FROM journal WHERE program = $1 AND number = $2 UNION ALL "
+                 "SELECT sequence, type, id FROM outcome WHERE program = $1 AND number = $2) c ON true",
+                 Parameters() << m_self << number);
+    bool const isMade = !rows.IsNull(0, 1);
+    if (isMade)
+        MakeLasting(turn);
+    NoteAnswer(number, isMade, rows.Number(0, 0));
+    if (!isMade)
         return std::nullopt;
-    Announce(rows.Number(0, 0));  // nobody has rung for it
-    return CommitOutcome{CommitOutcome::Committed, rows.Number(0, 0), {rows.Int(0, 1), rows.Int(0, 2)}};
+    Announce(rows.Number(0, 1));  // nobody has rung for it
+    return CommitOutcome{CommitOutcome::Committed, rows.Number(0, 1), {rows.Int(0, 2), rows.Int(0, 3)}};
+}
+
+void PostgresStore::NoteQuestion(std::uint64_t number)
+{
+    std::lock_guard const lock(m_unknowns);
+    auto const unknown = m_unknown.find(number);
+    if (unknown != m_unknown.end())
+        unknown->second.askedAt = Clock::now();
+}
+
+// forgotten: the newest change that the site knows nothing of any more. Throws StoreError if a change that is
+// not found may be one of those.
+void PostgresStore::NoteAnswer(std::uint64_t number, bool isMade, Sequence forgotten)
+{
+    std::lock_guard const lock(m_unknowns);
+    auto const unknown = m_unknown.find(number);
+    bool const isNoted = unknown != m_unknown.end();
+    if (!isMade && isNoted && unknown->second.known < forgotten)
+        unknown->second.isKept = false;
+    if (!isMade && (isNoted ? !unknown->second.isKept : forgotten > 0))
+        throw StoreError(m_name +
+                         ": nobody knows any more whether a change was made, since nobody has asked for "
+                         "long; look at what the ticket holds");
+    if (isNoted)
+        m_unknown.erase(unknown);
 }
 
 // The server answers a commit when it is as lasting as the server's synchronous_commit makes it: by default

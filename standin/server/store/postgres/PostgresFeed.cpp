@@ -2,6 +2,7 @@
 #include "standin/server/store/ChangeRecord.h"
 #include "standin/server/store/postgres/PostgresTurn.h"
 #include <algorithm>
+#include <utility>
 
 namespace standin
 {
@@ -82,10 +83,12 @@ void PostgresStore::WaitForChanges(Sequence heard, std::chrono::milliseconds tim
     {
         std::unique_lock lock(m_hearing);
         auto const end = Clock::now() + std::min<std::chrono::milliseconds>(time, 1h);
-        if (m_heard.wait_until(lock, end, [&] { return m_isInterrupted || m_committed > heard; }))
+        if (m_heard.wait_until(lock, end,
+                               [&] { return m_isInterrupted || m_committed > heard || m_reach.IsOver(); }))
         {
             m_isInterrupted = false;
-            return;
+            if (!m_reach.IsOver())
+                return;
         }
     }
     RaiseCommitted(Turn(*this).Run("SELECT sequence FROM newest").Number(0, 0));
@@ -98,22 +101,63 @@ void PostgresStore::Interrupt() noexcept
     m_heard.notify_all();
 }
 
+// What it does not know of its own changes it may still ask the journal for.
+Sequence PostgresStore::Needed(Sequence heard)
+{
+    auto const now = Clock::now();
+    std::lock_guard const lock(m_unknowns);
+    for (auto& [number, unknown] : m_unknown)
+    {
+        unknown.isKept = unknown.isKept && now - unknown.askedAt <= m_options.askingPause;
+        if (unknown.isKept)
+            heard = std::min(heard, unknown.known);
+    }
+    return heard;
+}
+
+// Who is missing, and has been for the settling time, which is what all have to come back after a break: as
+// far as this program has seen over the connection that it has.
+std::vector<long long> PostgresStore::Gone()
+{
+    Turn turn(*this);
+    Result const rows = turn.Run("SELECT id FROM program WHERE id NOT IN (SELECT program FROM living)");
+    auto const now = Clock::now();
+    if (std::exchange(m_goneOver, m_connected) != m_connected)
+        m_missing.clear();
+    std::map<ProgramId, Clock::time_point> missing;
+    std::vector<long long> gone;
+    for (int row = 0; row < rows.Rows(); ++row)
+    {
+        ProgramId const program = rows.Integer(row, 0);
+        auto const known = m_missing.find(program);
+        auto const since = known == m_missing.end() ? now : known->second;
+        missing.emplace(program, since);
+        if (now - since >= m_options.settling)
+            gone.push_back(program);
+    }
+    m_missing = std::move(missing);
+    return gone;
+}
+
 void PostgresStore::Maintain(Sequence heard)
 {
+    m_settled = heard;
     {
-        // What it does not know of its own changes it may still ask the journal for.
-        std::lock_guard const lock(m_unknowns);
-        for (auto const& [number, known] : m_unknown)
-            heard = std::min(heard, known);
+        Turn turn(*this);  // no change of its own is on its way meanwhile
+        turn.Run("SELECT note_heard($1, $2)", Parameters() << m_self << Needed(heard));
+        if (m_hasLeftovers)
+        {
+            m_hasLeftovers = false;  // before: what fails meanwhile is left over anew
+            PutBelongingsBack(turn.Deadline());
+        }
     }
-    Turn(*this).Run("UPDATE program SET heard = $1 WHERE id = $2 AND heard <> $1", Parameters()
-                                                                                       << heard << m_self);
     StoreLimits const& limits = m_options.limits;
+    auto const gone = Gone();
     for (int i = 0; i < PruningsAtOnce; ++i)
     {
-        Result const pruned =
-            Turn(*this).Run("SELECT prune_journal($1, $2, $3)",
-                            Parameters() << limits.journalKept << limits.journalLargest << PrunedAtOnce);
+        Result const pruned = Turn(*this).Run("SELECT prune_journal($1, $2, $3, $4)",
+                                              Parameters() << limits.journalKept << limits.journalLargest
+                                                           << PrunedAtOnce << gone);
         if (pruned.Integer(0, 0) < PrunedAtOnce)
             return;
     }

@@ -208,15 +208,38 @@ long long PostgresStore::OpenSession(std::string_view user)
         turn.Run("INSERT INTO session (program, account, since) VALUES ($1, $2, $3) RETURNING id",
                  Parameters() << m_self << user << since)
             .Integer(0, 0);
+    std::lock_guard const lock(m_belongings);
     m_sessions[id] = {std::string(user), since};
     return id;
 }
 
 void PostgresStore::CloseSession(long long session)
 {
-    Turn turn(*this);
-    turn.Run("DELETE FROM session WHERE id = $1", Parameters() << session);
-    m_sessions.erase(session);
+    TakeAway("DELETE FROM session WHERE id = $1", Parameters() << session,
+             [&] { m_sessions.erase(session); });
+}
+
+// What cannot be reached now is not to come back: it is taken away once it can be reached.
+void PostgresStore::TakeAway(char const* sql, Parameters const& parameters,
+                             std::function<void()> const& forget)
+{
+    CheckUsable();
+    try
+    {
+        Turn turn(*this);
+        {
+            std::lock_guard const lock(m_belongings);
+            forget();
+        }
+        turn.Run(sql, parameters);
+    }
+    catch (StoreError const&)
+    {
+        std::lock_guard const lock(m_belongings);
+        forget();
+        m_hasLeftovers = true;
+        throw;
+    }
 }
 
 std::vector<SessionInfo> PostgresStore::Sessions()
@@ -238,6 +261,7 @@ bool PostgresStore::AddPartFile(std::string_view path)
                  "SET program = $2 WHERE f.program = $2",
                  Parameters() << path << m_self)
             .Changes() == 1;
+    std::lock_guard const lock(m_belongings);
     if (isOurs)
         m_partFiles.emplace(path);
     return isOurs;
@@ -245,19 +269,21 @@ bool PostgresStore::AddPartFile(std::string_view path)
 
 void PostgresStore::RemovePartFile(std::string_view path)
 {
-    Turn turn(*this);
-    turn.Run("DELETE FROM part_file WHERE place(path) = place($1) AND program = $2", Parameters()
-                                                                                         << path << m_self);
-    m_partFiles.erase(std::string(path));
+    TakeAway("DELETE FROM part_file WHERE place(path) = place($1) AND program = $2",
+             Parameters() << path << m_self, [&] { m_partFiles.erase(std::string(path)); });
 }
 
 // For who has the turn. What others have forgotten with this program while it was away is there again, and
 // what a call has put there that broke before its answer is gone.
 void PostgresStore::PutBelongingsBack(Clock::time_point deadline)
 {
+    std::unique_lock lock(m_belongings);
+    auto const sessions = m_sessions;
+    auto const partFiles = m_partFiles;
+    lock.unlock();
     std::vector<long long> ids, since;
     std::vector<std::string_view> users;
-    for (auto const& [id, session] : m_sessions)
+    for (auto const& [id, session] : sessions)
     {
         ids.push_back(id);
         since.push_back(session.since);
@@ -269,7 +295,7 @@ void PostgresStore::PutBelongingsBack(Clock::time_point deadline)
                    "SELECT s.id, $1, s.account, s.since FROM unnest($2, $3, $4) AS s (id, account, since) "
                    "ON CONFLICT DO NOTHING",
                    Parameters() << m_self << ids << users << since, deadline);
-    std::vector<std::string_view> const files(m_partFiles.begin(), m_partFiles.end());
+    std::vector<std::string_view> const files(partFiles.begin(), partFiles.end());
     m_working->Run("DELETE FROM part_file WHERE program = $1 AND path <> ALL ($2)",
                    Parameters() << m_self << files, deadline);
     m_working->Run(

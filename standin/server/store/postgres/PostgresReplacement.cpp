@@ -1,9 +1,11 @@
 #include "standin/server/store/postgres/PostgresReplacement.h"
 
 #include "standin/server/store/postgres/Schema.h"
+#include <thread>
 
 namespace standin
 {
+using postgres::BrokenConnection;
 using postgres::Clock;
 using postgres::Connection;
 using postgres::Parameters;
@@ -11,6 +13,7 @@ using postgres::Parameters;
 namespace
 {
 constexpr std::chrono::seconds PatienceWithOthers(5);
+constexpr std::chrono::milliseconds PauseForServer(100);
 
 std::string NewNameFor(PostgresOptions const& options) { return options.schema + "_new"; }
 
@@ -22,16 +25,11 @@ PostgresOptions Beside(PostgresOptions options)
 }  // namespace
 
 PostgresReplacement::PostgresReplacement(std::string const& uri, Old old, PostgresOptions options)
-    : m_options(std::move(options)),
-      m_connection(std::make_unique<Connection>(postgres::Target{uri, m_options.schema},
-                                                m_options.statementLimit,
-                                                Clock::now() + m_options.connectLimit))
+    : m_uri(uri), m_options(std::move(options)), m_connection(Connected())
 {
     if (!postgres::KeepFromOpening(*m_connection, m_options.schema, Clock::now() + PatienceWithOthers))
-        throw StoreError(m_connection->Name() +
-                         ": another program is opening or replacing the site; wait until "
-                         "that is done, then try again");
-    m_hasOld = IsThere();
+        throw StoreError(m_connection->Name() + postgres::BeingOpened);
+    LookForOld();
     if (m_hasOld && old == Old::Forbidden)
         throw StoreError(m_connection->Name() + ": there is a site already; name another database");
     if (m_hasOld)
@@ -50,8 +48,9 @@ PostgresReplacement::~PostgresReplacement()
     m_store.reset();
     try
     {
-        m_connection->Execute("DROP SCHEMA " + m_connection->Quoted(NewNameFor(m_options)) + " CASCADE",
-                              Deadline());
+        if (m_connection)
+            m_connection->Execute("DROP SCHEMA " + m_connection->Quoted(NewNameFor(m_options)) + " CASCADE",
+                                  Deadline());
     }
     catch (StoreError const&)
     {
@@ -63,28 +62,114 @@ std::string PostgresReplacement::Finish()
 {
     m_store->Sync();
     m_store->Leave();
-    std::string const name = m_connection->Quoted(m_options.schema);
-    std::string const made = m_connection->Quoted(NewNameFor(m_options));
     std::string aside = m_hasOld ? FreeName() : "";
-    std::string all = "BEGIN;";
-    if (m_hasOld)
-        all += "UPDATE " + made + ".site SET (number, has_folder) = (SELECT number, has_folder FROM " + name +
-               ".site); ALTER SCHEMA " + name + " RENAME TO " + m_connection->Quoted(aside) + ';';
-    m_connection->Execute(all + "ALTER SCHEMA " + made + " RENAME TO " + name + "; COMMIT", Deadline());
+    std::string const exchange = Exchange(aside);
+    long long const site =
+        m_connection
+            ->Run("SELECT c.oid::bigint FROM pg_class c JOIN pg_namespace n ON n.oid = c.relnamespace "
+                  "WHERE n.nspname = convert_from($1, 'UTF8') AND c.relname = 'site'",
+                  Parameters() << std::string_view(NewNameFor(m_options)), Deadline())
+            .Integer(0, 0);
+    try
+    {
+        m_connection->Execute(exchange, Deadline());
+    }
+    catch (BrokenConnection const& failure)
+    {
+        MakeSure(site, failure);
+    }
     m_store.reset();
     m_connection.reset();
     return aside;
 }
 
+// Statements of one call are one transaction.
+std::string PostgresReplacement::Exchange(std::string const& aside)
+{
+    std::string const name = m_connection->Quoted(m_options.schema);
+    std::string const made = m_connection->Quoted(NewNameFor(m_options));
+    if (m_isPrepared)
+        return MoveAll(made, name);
+    std::string rename = "ALTER SCHEMA " + made + " RENAME TO " + name;
+    if (!m_hasOld)
+        return rename;
+    return "UPDATE " + made + ".site SET (number, has_folder) = (SELECT number, has_folder FROM " + name +
+           ".site); ALTER SCHEMA " + name + " RENAME TO " + m_connection->Quoted(aside) + ';' + rename;
+}
+
+// A schema that somebody has prepared keeps its owner and what it permits to whom.
+std::string PostgresReplacement::MoveAll(std::string const& made, std::string const& name)
+{
+    auto const moves =
+        m_connection->Run("SELECT 'TABLE ' || c.oid::regclass FROM pg_class c WHERE c.relkind IN ('r', 'v') "
+                          "AND c.relnamespace = convert_from($1, 'UTF8')::regnamespace "
+                          "UNION ALL SELECT 'FUNCTION ' || p.oid::regprocedure FROM pg_proc p "
+                          "WHERE p.pronamespace = convert_from($1, 'UTF8')::regnamespace",
+                          Parameters() << std::string_view(made), Deadline());
+    std::string all;
+    for (int row = 0; row < moves.Rows(); ++row)
+        all += "ALTER " + moves.Text(row, 0) + " SET SCHEMA " + name + ';';
+    return all + "DROP SCHEMA " + made;
+}
+
+// After a break in the last step. site: the table by which the new one is known in whatever schema.
+void PostgresReplacement::MakeSure(long long site, StoreError const& failure)
+{
+    std::string const name = m_connection->Name();
+    auto const end = Clock::now() + m_options.openingLimit;
+    auto isInPlace = IsInPlace(site, end);
+    for (; !isInPlace && Clock::now() < end; isInPlace = IsInPlace(site, end))
+        std::this_thread::sleep_for(PauseForServer);
+    if (isInPlace == false)
+        throw StoreError(failure);
+    if (isInPlace)
+        return;
+    m_connection.reset();
+    throw UnknownReplacement(name + ": was lost over the last step, and the new site may be in its place or "
+                                    "not; look at what is there when the server can be reached again");
+}
+
+// Over a new connection. Nothing if it cannot be said yet: who replaces a site keeps others from opening it
+// as long as the server works on that.
+std::optional<bool> PostgresReplacement::IsInPlace(long long site, Clock::time_point end)
+try
+{
+    m_connection = Connected();
+    auto const isThere = [&]
+    {
+        return m_connection
+            ->Run("SELECT EXISTS (SELECT FROM pg_class c JOIN pg_namespace n ON n.oid = c.relnamespace "
+                  "WHERE c.oid::bigint = $1 AND n.nspname = convert_from($2, 'UTF8'))",
+                  Parameters() << site << std::string_view(m_options.schema), Deadline())
+            .Bool(0, 0);
+    };
+    if (isThere())
+        return true;
+    if (!postgres::KeepFromOpening(*m_connection, m_options.schema, end))
+        return std::nullopt;
+    return isThere();
+}
+catch (BrokenConnection const&)
+{
+    return std::nullopt;
+}
+
+std::unique_ptr<Connection> PostgresReplacement::Connected() const
+{
+    return std::make_unique<Connection>(postgres::Target{m_uri, m_options.schema}, m_options.statementLimit,
+                                        Clock::now() + m_options.connectLimit);
+}
+
 Clock::time_point PostgresReplacement::Deadline() const { return Clock::now() + m_options.statementLimit; }
 
-bool PostgresReplacement::IsThere()
+void PostgresReplacement::LookForOld()
 {
-    return m_connection
-        ->Run("SELECT EXISTS (SELECT FROM pg_class c JOIN pg_namespace n ON n.oid = c.relnamespace "
-              "WHERE n.nspname = convert_from($1, 'UTF8'))",
-              Parameters() << std::string_view(m_options.schema), Deadline())
-        .Bool(0, 0);
+    auto const found = m_connection->Run(
+        "SELECT count(DISTINCT n.oid), count(c.oid) FROM pg_namespace n "
+        "LEFT JOIN pg_class c ON c.relnamespace = n.oid WHERE n.nspname = convert_from($1, 'UTF8')",
+        Parameters() << std::string_view(m_options.schema), Deadline());
+    m_hasOld = found.Integer(0, 1) > 0;
+    m_isPrepared = !m_hasOld && found.Integer(0, 0) > 0;
 }
 
 void PostgresReplacement::CheckIsNotOpen()

@@ -6,6 +6,13 @@
 
 namespace standin
 {
+// The server was lost over the last step, and whether the new site is in its place nobody knows.
+class UnknownReplacement : public StoreError
+{
+public:
+    using StoreError::StoreError;
+};
+
 class PostgresReplacement
 {
 public:
@@ -22,22 +29,32 @@ public:
     PostgresReplacement(PostgresReplacement const&) = delete;
     PostgresReplacement& operator=(PostgresReplacement const&) = delete;
 
+    bool HasOld() const { return m_hasOld; }
+
     // The new site, which has no tickets and no users yet.
     PostgresStore& Store() { return *m_store; }
 
     // Ends the work on the new one, which is the site then. The result: the schema in which the old one is
-    // now; empty if there was none.
+    // now; empty if there was none. Throws StoreError, and nothing has changed; but UnknownReplacement if the
+    // server was lost and did not come back within the limit of opening.
     std::string Finish();
 
 private:
+    std::unique_ptr<postgres::Connection> Connected() const;
     postgres::Clock::time_point Deadline() const;
-    bool IsThere();
+    void LookForOld();
     void CheckIsNotOpen();
     std::string FreeName();
+    std::string Exchange(std::string const& aside);
+    std::string MoveAll(std::string const& made, std::string const& name);
+    void MakeSure(long long site, StoreError const& failure);
+    std::optional<bool> IsInPlace(long long site, postgres::Clock::time_point end);
 
+    std::string const m_uri;
     PostgresOptions const m_options;
-    std::unique_ptr<postgres::Connection> m_connection;
+    std::unique_ptr<postgres::Connection> m_connection;  // null: of no more use
     bool m_hasOld = false;
+    bool m_isPrepared = false;  // the schema is there, and empty
     std::unique_ptr<PostgresStore> m_store;
 };
 }  // namespace standin

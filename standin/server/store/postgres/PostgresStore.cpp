@@ -1,5 +1,6 @@
 #include "standin/server/store/postgres/PostgresStore.h"
 
+#include "standin/server/store/Outcome.h"
 #include "standin/server/store/StoreRows.h"
 #include "standin/server/store/postgres/PostgresTurn.h"
 #include "standin/server/store/postgres/Schema.h"
@@ -22,11 +23,12 @@ namespace
 {
 constexpr std::chrono::milliseconds ClosingLimit = 1s;
 constexpr std::chrono::milliseconds PauseForLock = 10ms;
+constexpr std::chrono::milliseconds PauseBetweenAttempts = 100ms;
 
 // A break is not noticed by callers if the server can be had again within so long.
 constexpr std::chrono::milliseconds Patience = 300ms;
 
-// A caller waits for a connection no longer; where that takes more, the bell's thread gets it.
+// A caller waits for a connection no longer; where that takes more, the keeper's thread gets it.
 constexpr std::chrono::milliseconds CallersLimit = 2s;
 
 // The server gives a statement up before the client does, so that the connection can be kept.
@@ -47,17 +49,20 @@ PostgresStore::PostgresStore(std::string const& uri, std::function<StoreContent(
         Turn opening(*this, m_options.openingLimit);
         postgres::OpenSchema(
             opening.Connection(), m_options.schema, [&] { Fill(opening, first()); }, opening.Deadline());
+        CheckSite(opening.Connection());
         if (!TakeLock(opening.Connection(), LockOfOpening, opening.Deadline()))
             throw StoreError(
                 m_name +
                 ": another program has been opening the site all the time; end that, then try again");
         m_isOpening = true;
     }
+    m_keeper = std::make_unique<postgres::Keeper>([this] { Mend(); });
     // Listens before it looks: what is committed after the look rings.
     m_bell = std::make_unique<postgres::Bell>(
         m_target,
         postgres::Bell::Limits{m_options.connectLimit, OnServer(m_options.statementLimit), m_options.pulse},
-        postgres::Bell::Calls{[this](Sequence newest) { RaiseCommitted(newest); }, [this] { Look(); }},
+        postgres::Bell::Calls{[this](Connection& connection) { CheckSite(connection); },
+                              [this](Sequence newest) { RaiseCommitted(newest); }, [this] { Look(); }},
         m_reach, m_hurry);
     Register();
     if (!m_options.keepOpening)
@@ -90,11 +95,14 @@ PostgresStore::~PostgresStore()
     {
         if (m_bell)
             m_bell.release()->Abandon();
+        if (m_keeper)
+            m_keeper.release()->Abandon();
         if (m_working)
             m_working.release()->Abandon();
         return;
     }
     m_bell.reset();
+    m_keeper.reset();
     try
     {
         // The server notices the end of a connection a moment later, and so would who asks for the dead.
@@ -114,8 +122,8 @@ void PostgresStore::Fill(Turn& turn, StoreContent const& content) const
         if (Send(turn, RequestOf(change, 0, ++number), change.address).kind != CommitOutcome::Committed)
             throw StoreError(m_name + ": a site cannot begin with a ticket twice; correct its content");
     // Nobody has heard of the site before, so its journal begins behind what it began with.
-    turn.Run("DELETE FROM journal");
     turn.Run("UPDATE site SET pruned = (SELECT sequence FROM newest)");
+    turn.Run("DELETE FROM journal");
     for (User const& user : content.users)
         Put(turn, user);
 }
@@ -137,8 +145,9 @@ void PostgresStore::Register()
                  Parameters() << static_cast<long long>(m_process) << std::string_view(m_machine)
                               << std::string_view(m_program) << m_since);
     m_self = registered.Integer(0, 0);
-    m_committed = registered.Number(0, 1);
+    m_committed = m_settled = registered.Number(0, 1);
     m_lockClass = registered.Int(0, 2);
+    postgres::EndRegistering(turn.Connection(), m_options.schema, turn.Deadline());
 }
 
 // If the connection has broken meanwhile the lock is gone already, and another's may not be given up.
@@ -158,10 +167,36 @@ bool PostgresStore::IsForeign() const noexcept { return getpid() != m_process; }
 void PostgresStore::CheckUsable() const
 {
     if (IsForeign())
-        throw StoreError(m_name + ": was opened by the parent of this process; open it in a program that was "
-                                  "started anew");
+        throw UnusableStore(m_name + ": was opened by the parent of this process; open it in a program that "
+                                     "was started anew");
     if (m_hasLeft)
-        throw StoreError(m_name + ": has been left; open it anew");
+        throw UnusableStore(m_name + ": has been left; open it anew");
+    if (m_reach.IsOver())
+        throw UnusableStore(m_reach.Reason());
+}
+
+// On each new connection, before anything else is done there.
+void PostgresStore::CheckSite(Connection& connection)
+{
+    try
+    {
+        // What is known is looked up first: it may grow meanwhile, and the server's answer would not have it.
+        m_identity.Check(connection, m_committed, Clock::now() + m_options.statementLimit);
+    }
+    catch (UnusableStore const& error)
+    {
+        End(error.what());
+    }
+}
+
+void PostgresStore::End(std::string const& reason)
+{
+    m_reach.NoteEnd(reason);
+    {
+        std::lock_guard const lock(m_hearing);  // lest a waiter has looked and does not wait yet
+        m_heard.notify_all();
+    }
+    throw UnusableStore(reason);
 }
 
 // --- the working connection
@@ -197,7 +232,9 @@ PostgresStore::Turn::~Turn()
 {
     if (m_connection->IsBroken())
         m_store.m_brokenSince = Clock::now();
-    if (m_connection->IsBroken() || m_store.m_hasLeft)
+    else
+        m_store.m_reach.NoteService(true);
+    if (m_connection->IsBroken() || m_store.m_hasLeft || m_store.m_reach.IsOver())
         m_store.m_working.reset();
     m_store.EndTurn();
 }
@@ -215,21 +252,32 @@ void PostgresStore::CheckReach() const
         throw BrokenConnection(m_reach.Reason());
 }
 
-// In the thread of the bell. A program that makes no call just now is not to be taken for dead, and who waits
-// for a turn is not to wait for a server that is known to be lost.
+// In the thread of the bell, which waits for nothing. Who waits for a turn is not to wait for a server that
+// is known to be lost.
 void PostgresStore::Look() noexcept
+{
+    if (m_reach.IsThere())
+        return m_keeper->Wake();
+    std::lock_guard const lock(m_turns);
+    m_turnEnded.notify_all();
+    if (m_reach.IsOver() && !m_isTaken)
+        m_working.reset();
+}
+
+// In the thread of the keeper. A program that makes no call just now is not to be taken for dead.
+void PostgresStore::Mend() noexcept
 {
     {
         std::lock_guard const lock(m_turns);
-        if (!m_reach.IsThere())
-            m_turnEnded.notify_all();
         if (m_isTaken || m_hasLeft || !m_reach.IsThere())
             return;
         m_isTaken = true;
     }
     try
     {
-        if (!HasSoundConnection() && IsAttemptDue())
+        if (HasSoundConnection())
+            m_reach.NoteService(true);
+        else if (IsAttemptDue())
             Attempt(Clock::now() + m_options.statementLimit, m_options.connectLimit);
     }
     catch (std::exception const&)
@@ -269,7 +317,10 @@ void PostgresStore::ConnectAgain(Clock::time_point deadline)
     while (!m_working)
     {
         if (!IsAttemptDue() && !isNew())
+        {
+            m_reach.NoteService(false);
             throw BrokenConnection(m_failure);
+        }
         if (!IsAttemptDue())
             std::this_thread::sleep_until(std::min(m_nextAttempt, deadline));
         try
@@ -291,20 +342,44 @@ void PostgresStore::Attempt(Clock::time_point deadline, std::chrono::millisecond
     {
         m_working = std::make_unique<Connection>(m_target, OnServer(m_options.statementLimit),
                                                  std::min(deadline, Clock::now() + connectLimit), &m_hurry);
-        if (m_self != 0)
-            TakeLifeBack(deadline);
+        ComeBack(deadline);
         ++m_connected;
         m_connectedSince = Clock::now();
         m_pause.Reset();
+        m_reach.NoteService(true);
     }
     catch (StoreError const& error)
     {
         m_working.reset();
+        if (Clock::now() - m_brokenSince > Patience)
+            m_reach.NoteService(false);
         m_failure = error.what();
         m_returnsBeforeFailure = returns;
         m_nextAttempt = Clock::now() + m_pause.Take();
         throw;
     }
+}
+
+// While the site is opened it goes on to be kept from being replaced.
+void PostgresStore::ComeBack(Clock::time_point deadline)
+{
+    if (!postgres::BeginRegistering(*m_working, m_options.schema, deadline))
+        throw BrokenConnection(m_name + ": the site is being replaced; wait until that is done", true);
+    CheckSite(*m_working);
+    if (m_self == 0)
+        return;
+    bool const isAnothers =
+        m_working
+            ->Run("SELECT FROM program p WHERE p.id = $1 AND "
+                  "(p.process, p.machine, p.name, p.since) <> ($2, $3, $4, $5)",
+                  Parameters() << m_self << static_cast<long long>(m_process) << std::string_view(m_machine)
+                               << std::string_view(m_program) << m_since,
+                  deadline)
+            .Rows() != 0;
+    if (isAnothers)
+        End(m_name + ": another program has got the number of this one; start the program anew");
+    TakeLifeBack(deadline);
+    postgres::EndRegistering(*m_working, m_options.schema, deadline);
 }
 
 // The old connection, of which the server may know nothing yet, still holds the lock: when it is ours alone,
@@ -330,7 +405,7 @@ void PostgresStore::TakeLifeBack(Clock::time_point deadline)
     m_working->Run("INSERT INTO program (id, process, machine, name, since, heard) "
                    "VALUES ($1, $2, $3, $4, $5, $6) ON CONFLICT DO NOTHING",
                    Parameters() << m_self << static_cast<long long>(m_process) << std::string_view(m_machine)
-                                << std::string_view(m_program) << m_since << Committed().load(),
+                                << std::string_view(m_program) << m_since << Needed(m_settled),
                    deadline);
     PutBelongingsBack(deadline);
 }
@@ -399,10 +474,36 @@ std::vector<User> PostgresStore::UsersOf(Result const& rows)
         });
 }
 
+// Runs what may be run again, until it is known to be done or refused: when a connection breaks, the server
+// may have done it all the same. Once a new one is there, nothing of the old one is on its way any more.
+void PostgresStore::UntilKnown(std::function<void(Turn&, bool isRepeated)> const& action)
+{
+    bool isLost = false;  // an answer
+    for (auto const end = Clock::now() + OutcomeLimit;; std::this_thread::sleep_for(PauseBetweenAttempts))
+    {
+        bool isSent = false;
+        try
+        {
+            Turn turn(*this);
+            isSent = true;
+            return action(turn, isLost);
+        }
+        catch (StoreError const& error)
+        {
+            isLost = isLost || (isSent && dynamic_cast<BrokenConnection const*>(&error) != nullptr);
+            if (!isLost)
+                throw;
+            if (Clock::now() >= end || dynamic_cast<UnusableStore const*>(&error) != nullptr)
+                throw UnknownOutcome(
+                    std::string(error.what()) +
+                    "; whether a user was changed is not known: " + "look before you repeat the change");
+        }
+    }
+}
+
 void PostgresStore::PutUser(User const& user)
 {
-    Turn turn(*this);
-    Put(turn, user);
+    UntilKnown([&user](Turn& turn, bool) { Put(turn, user); });
 }
 
 void PostgresStore::Put(Turn& turn, User const& user)
@@ -416,8 +517,19 @@ void PostgresStore::Put(Turn& turn, User const& user)
 
 bool PostgresStore::RemoveUser(std::string_view name)
 {
-    return Turn(*this)
-               .Run("DELETE FROM account WHERE place(name) = place($1)", Parameters() << name)
-               .Changes() == 1;
+    bool wasThere = false;
+    UntilKnown(
+        [&](Turn& turn, bool isRepeated)
+        {
+            Parameters const user = Parameters() << name;
+            if (!isRepeated)
+                wasThere = turn.Run("SELECT FROM account WHERE place(name) = place($1)", user).Rows() == 1;
+            bool const isRemoved =
+                turn.Run("DELETE FROM account WHERE place(name) = place($1)", user).Changes() == 1;
+            wasThere = isRemoved || (isRepeated && wasThere);
+            if (wasThere && !isRemoved)
+                MakeLasting(turn);
+        });
+    return wasThere;
 }
 }  // namespace standin

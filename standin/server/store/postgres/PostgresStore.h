@@ -5,12 +5,18 @@
 // What was committed is as safe as the server's synchronous_commit makes it. Committed() follows what others
 // commit as soon as the bell rings, which takes about a millisecond.
 //
-// A call whose connection breaks throws StoreError, or answers Unknown if it is a Commit. The next one
-// connects again, and does not notice a break of some 100 ms; as long as the server is known to be out of
-// reach, calls fail at once. No call takes longer than the limits of connecting and of a statement together.
-// The thread of the bell looks after the working connection, too, so that a program is soon back that calls
-// nothing. Until it is back, others take it for dead and may bury it: it then goes on under its number with
-// its sessions and the notes of its part files, but without the tickets that it owned.
+// A call whose connection breaks throws StoreError, or answers Unknown if it is a Commit; a change of the
+// users is repeated, for a minute if need be, and throws UnknownOutcome then. The next one connects again,
+// and does not notice a break of some 100 ms; as long as the server is known to be out of reach, calls fail
+// at once. No other call takes longer than the limits of connecting and of a statement together,
+// unless bytes come and go all the time: a large ticket over a slow line takes its time. A thread of
+// its own looks after the working connection when the bell tells it to, so that a program is soon back that
+// calls nothing, and that the bell is heard meanwhile. Until it is back, others take it for dead and may bury
+// it: it then goes on under its number with its sessions and the notes of its part files, but without the
+// tickets that it owned.
+//
+// Who comes back to another site than before, or to a server that has not got all the changes that the
+// program knows of, has done there nothing but look: from then on every operation throws UnusableStore.
 //
 // In a child process that was made by fork every operation throws StoreError.
 #pragma once
@@ -21,6 +27,8 @@
 #include "standin/server/store/StoreLimits.h"
 #include "standin/server/store/postgres/Bell.h"
 #include "standin/server/store/postgres/Connection.h"
+#include "standin/server/store/postgres/Identity.h"
+#include "standin/server/store/postgres/Keeper.h"
 #include <condition_variable>
 #include <functional>
 #include <limits>
@@ -48,10 +56,14 @@ struct PostgresOptions
     // after a break of its own connection, and two rounds of who clears up.
     std::chrono::milliseconds grace{600};
 
-    // Who was not seen alive over its own connection is buried by a program only when that is older, or, if
-    // it is its first, the server has been up for longer: when that breaks down all are gone, and come back
-    // one by one.
+    // So long the journal is kept for who is missing, so that nobody's clients lose a change by a short
+    // break. Who was not seen alive over its own connection is buried by a program only when that is older,
+    // or, if it is its first, the server has been up for longer: when that breaks down all are gone, and come
+    // back one by one.
     std::chrono::milliseconds settling{10'000};
+
+    // So long after the last question for its outcome the journal is kept for a commit.
+    std::chrono::milliseconds askingPause{30'000};
 
     // How often the working connection is looked after.
     std::chrono::milliseconds pulse{250};
@@ -109,8 +121,9 @@ public:
     void NoteTidy() noexcept override { m_isTidy = true; }
     void EndOpening() override;
 
-    // The server is asked in the background; its silence is noticed after some three seconds.
-    bool IsReachable() const noexcept override { return m_reach.IsThere(); }
+    // The server is asked in the background; its silence is noticed after some three seconds. One that lets
+    // this program in no more cannot be reached either.
+    bool IsReachable() const noexcept override { return m_reach.IsServing(); }
 
     std::unique_ptr<UsersTurn> TakeUsersTurn(std::chrono::milliseconds limit) override;
     std::vector<std::string> Check(Progress const& progress) override;
@@ -137,22 +150,34 @@ private:
     bool IsForeign() const noexcept;
     void CheckUsable() const;
     void CheckReach() const;
+    void CheckSite(postgres::Connection& connection);
+    [[noreturn]] void End(std::string const& reason);
     postgres::Connection& Working(postgres::Clock::time_point deadline);
     bool HasSoundConnection();
     bool IsAttemptDue() const;
     void ConnectAgain(postgres::Clock::time_point deadline);
     void Attempt(postgres::Clock::time_point deadline, std::chrono::milliseconds connectLimit);
     void Look() noexcept;
+    void Mend() noexcept;
     void EndTurn() noexcept;
+    void ComeBack(postgres::Clock::time_point deadline);
     void TakeLifeBack(postgres::Clock::time_point deadline);
     void PutBelongingsBack(postgres::Clock::time_point deadline);
+    void UntilKnown(std::function<void(Turn&, bool isRepeated)> const& action);
+    void TakeAway(char const* sql, postgres::Parameters const& parameters,
+                  std::function<void()> const& forget);
     static void Put(Turn& turn, User const& user);
     StoredValue ValueOf(postgres::Result const& rows, int row, int column, TicketAddress address) const;
     static std::vector<User> UsersOf(postgres::Result const& rows);
     postgres::Parameters RequestOf(TicketChange const& change, ProgramId program, std::uint64_t number) const;
     static CommitOutcome Send(Turn& turn, postgres::Parameters const& request, TicketAddress address);
+    static void MakeLasting(Turn& turn);
+    void NoteQuestion(std::uint64_t number);
+    void NoteAnswer(std::uint64_t number, bool isMade, Sequence forgotten);
     void Announce(Sequence committed);
     void RaiseCommitted(Sequence newest);
+    Sequence Needed(Sequence heard);
+    std::vector<long long> Gone();
     std::vector<ProgramId> DueForBurial();
     bool BuryOne(ProgramId program, std::function<void(Estate const&)> const& clear);
     bool TakeEstate(Estate& estate);
@@ -169,6 +194,7 @@ private:
     std::string m_siteNumber;
     std::atomic<bool> m_isTidy{false};
     std::atomic<bool> m_hasLeft{false};
+    postgres::Identity m_identity;
     postgres::Reach m_reach;
     postgres::Hurry m_hurry;
 
@@ -187,7 +213,9 @@ private:
     std::string m_failure;                     // of the last attempt
     std::uint64_t m_returnsBeforeFailure = 0;  // of the server
 
-    // What to put back if this program is buried by mistake. Of who has the turn, too.
+    // What to put back if this program is buried by mistake. Added to by who has the turn.
+    std::mutex m_belongings;
+    std::atomic<bool> m_hasLeftovers{false};  // in the database, of what was taken away
     struct SESSION
     {
         std::string user;
@@ -196,12 +224,19 @@ private:
     std::map<long long, SESSION> m_sessions;
     std::set<std::string> m_partFiles;
 
+    // Of who has the turn, too.
+    std::map<ProgramId, postgres::Clock::time_point> m_missing;  // since when, for who prunes
+    std::uint64_t m_goneOver = 0;                                // which connection that was seen over
+
+    std::atomic<Sequence> m_settled{0};  // what Maintain was told last
+
     // What WaitForChanges waits for.
     std::atomic<Sequence> m_committed{0};
     std::mutex m_hearing;
     std::condition_variable m_heard;
     bool m_isInterrupted = false;
-    std::unique_ptr<postgres::Bell> m_bell;
+    std::unique_ptr<postgres::Keeper> m_keeper;
+    std::unique_ptr<postgres::Bell> m_bell;  // wakes the keeper
 
     std::mutex m_burials;
     std::set<ProgramId> m_burying;  // by threads of this handle
@@ -215,6 +250,12 @@ private:
     LOOKS m_looks{std::numeric_limits<std::uint64_t>::max(), 0, {}, {}};
 
     std::mutex m_unknowns;
-    std::map<std::uint64_t, Sequence> m_unknown;  // numbers not asked after yet, and what was known then
+    struct UNKNOWN
+    {
+        Sequence known;  // when it was sent
+        postgres::Clock::time_point askedAt;
+        bool isKept;  // by the journal
+    };
+    std::map<std::uint64_t, UNKNOWN> m_unknown;  // by number
 };
 }  // namespace standin
