@@ -13,12 +13,12 @@ else()
     set(comgui_beside $ORIGIN)
 endif()
 
-set_target_properties(comgui comgui_host PROPERTIES INSTALL_RPATH ${comgui_beside})
+set_target_properties(comgui comgui_client comgui_host PROPERTIES INSTALL_RPATH ${comgui_beside})
 set_target_properties(comgui_host PROPERTIES EXPORT_NAME host)
 set_target_properties(comgui_corefoundation PROPERTIES INSTALL_RPATH ${comgui_beside} EXPORT_NAME corefoundation)
 set_target_properties(comgui_module PROPERTIES INSTALL_RPATH ${comgui_beside}/../../..)
 
-install(TARGETS comgui comgui_host EXPORT comgui-targets
+install(TARGETS comgui comgui_client comgui_host EXPORT comgui-targets
     LIBRARY DESTINATION ${CMAKE_INSTALL_LIBDIR} FILE_SET HEADERS)
 if(APPLE)
     install(TARGETS comgui_corefoundation EXPORT comgui-targets)    # no more than the system's own
@@ -72,12 +72,13 @@ install(FILES ${PROJECT_BINARY_DIR}/comgui-config.cmake ${PROJECT_BINARY_DIR}/co
     DESTINATION ${COMGUI_PACKAGE_DIR})
 install(EXPORT comgui-targets NAMESPACE comgui:: DESTINATION ${COMGUI_PACKAGE_DIR})
 
-# wxWidgets has no pkg-config file that these could require, so they carry its flags.
-function(comgui_pkg_config name)
-    get_target_property(folders comgui_wxwidgets INTERFACE_INCLUDE_DIRECTORIES)
-    get_target_property(definitions comgui_wxwidgets INTERFACE_COMPILE_DEFINITIONS)
-    get_target_property(options comgui_wxwidgets INTERFACE_COMPILE_OPTIONS)
-    get_target_property(libraries comgui_wxwidgets INTERFACE_LINK_LIBRARIES)
+# wxWidgets has no pkg-config file that these could require, so they carry its flags: all but wxUSE_GUI, which
+# depends on whether the program has windows.
+function(comgui_pkg_config name wxwidgets)
+    get_target_property(folders ${wxwidgets} INTERFACE_INCLUDE_DIRECTORIES)
+    get_target_property(definitions ${wxwidgets} INTERFACE_COMPILE_DEFINITIONS)
+    get_target_property(options ${wxwidgets} INTERFACE_COMPILE_OPTIONS)
+    get_target_property(libraries ${wxwidgets} INTERFACE_LINK_LIBRARIES)
     list(FILTER definitions EXCLUDE REGEX "wxUSE_GUI")
     list(TRANSFORM folders PREPEND "-isystem ")
     list(TRANSFORM definitions PREPEND "-D")
@@ -85,7 +86,7 @@ function(comgui_pkg_config name)
     list(JOIN folders " " folders)
     list(JOIN definitions " " definitions)
     list(JOIN libraries " " COMGUI_PC_LIBS)
-    set(COMGUI_PC_CFLAGS "${folders} ${definitions} -DwxUSE_GUI=0 ${options}")
+    set(COMGUI_PC_CFLAGS "${folders} ${definitions} ${options}")
     file(RELATIVE_PATH COMGUI_PC_PREFIX ${CMAKE_INSTALL_FULL_LIBDIR}/pkgconfig ${CMAKE_INSTALL_PREFIX})
     string(REGEX REPLACE "/$" "" COMGUI_PC_PREFIX ${COMGUI_PC_PREFIX})
     file(RELATIVE_PATH COMGUI_PC_LIBDIR ${CMAKE_INSTALL_PREFIX} ${CMAKE_INSTALL_FULL_LIBDIR})
@@ -93,5 +94,12 @@ function(comgui_pkg_config name)
     configure_file(${PROJECT_SOURCE_DIR}/cmake/${name}.pc.in ${PROJECT_BINARY_DIR}/${name}.pc @ONLY)
     install(FILES ${PROJECT_BINARY_DIR}/${name}.pc DESTINATION ${CMAKE_INSTALL_LIBDIR}/pkgconfig)
 endfunction()
-comgui_pkg_config(comgui)
-comgui_pkg_config(comgui_host)
+comgui_pkg_config(comgui comgui_wxwidgets)
+comgui_pkg_config(comgui_host comgui_wxwidgets)
+comgui_pkg_config(comgui_client comgui_wxwidgets)
+
+# For programs with windows, where wxWidgets' GUI is there; nothing else of this build needs it.
+comgui_find_wxwidgets(comgui_wxwidgets_gui core base)
+if(TARGET comgui_wxwidgets_gui)
+    comgui_pkg_config(comgui_gui comgui_wxwidgets_gui)
+endif()

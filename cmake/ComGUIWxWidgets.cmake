@@ -3,22 +3,25 @@
 #
 # A program with windows of its own sets the property COMGUI_GUI on its target and finds the GUI libraries
 # itself; all others see wxWidgets without its GUI.
-function(comgui_find_wxwidgets)    # a function, since the host's own wxWidgets_... variables must stay
-    find_package(wxWidgets 3.1 QUIET COMPONENTS base)
+#
+# Makes the target of these libraries of wxWidgets if they are there. A function, since the host's own
+# wxWidgets_... variables must stay.
+function(comgui_find_wxwidgets target)    # comgui_find_wxwidgets(TARGET LIBRARY...)
+    find_package(wxWidgets 3.1 QUIET COMPONENTS ${ARGN})
     if(NOT wxWidgets_FOUND)
         return()
     endif()
-    add_library(comgui_wxwidgets INTERFACE IMPORTED GLOBAL)
-    target_include_directories(comgui_wxwidgets SYSTEM INTERFACE ${wxWidgets_INCLUDE_DIRS})
-    target_compile_definitions(comgui_wxwidgets INTERFACE ${wxWidgets_DEFINITIONS}
+    add_library(${target} INTERFACE IMPORTED GLOBAL)
+    target_include_directories(${target} SYSTEM INTERFACE ${wxWidgets_INCLUDE_DIRS})
+    target_compile_definitions(${target} INTERFACE ${wxWidgets_DEFINITIONS}
         $<$<NOT:$<BOOL:$<TARGET_PROPERTY:COMGUI_GUI>>>:wxUSE_GUI=0>)
-    target_compile_options(comgui_wxwidgets INTERFACE ${wxWidgets_CXX_FLAGS})
-    target_link_directories(comgui_wxwidgets INTERFACE ${wxWidgets_LIBRARY_DIRS})
-    target_link_libraries(comgui_wxwidgets INTERFACE ${wxWidgets_LIBRARIES})
+    target_compile_options(${target} INTERFACE ${wxWidgets_CXX_FLAGS})
+    target_link_directories(${target} INTERFACE ${wxWidgets_LIBRARY_DIRS})
+    target_link_libraries(${target} INTERFACE ${wxWidgets_LIBRARIES})
 endfunction()
 
 if(NOT TARGET comgui_wxwidgets)
-    comgui_find_wxwidgets()
+    comgui_find_wxwidgets(comgui_wxwidgets base)
 endif()
 # The installed package reports this in the host's own words of find_package.
 if(NOT TARGET comgui_wxwidgets AND NOT CMAKE_FIND_PACKAGE_NAME STREQUAL "comgui")

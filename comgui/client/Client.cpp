@@ -1,0 +1,451 @@
+#include "comgui/client/Client.h"
+
+#include "comgui/access/MTICKET_ADMIN.h"
+#include "comgui/client/TransferPool.h"
+#include "comgui/foundation/stracpy.h"
+#include "comgui/session/TCommandRecord.h"
+#include <algorithm>
+#include <cstdlib>
+#include <system_error>
+
+namespace comgui::detail
+{
+namespace
+{
+constexpr int Stamp = 20261122;  // the kit's mark of its sessions; the plug-in only carries it
+constexpr int NotReachable = -2005;
+constexpr std::chrono::seconds LookInterval(1);
+
+template <std::size_t Size>
+void Assign(char (&field)[Size], std::string const& text)
+{
+    stracpy(field, text.c_str(), Size);
+}
+
+std::string NameOf(Server const& server) { return server.host + ":" + std::to_string(server.port); }
+
+Outcome Check(Server const& server)
+{
+    if (server.host.empty() || server.port < 1 || server.port > 65535)
+        return Error{BadServer, NameOf(server), {}};
+    if (server.host.size() >= sizeof TLogin::szServerHost)
+        return Error{TooLong, server.host, {}};
+    return {};
+}
+
+Outcome Check(Account const& account)
+{
+    if (account.user.size() >= sizeof TLogin::szUser)
+        return Error{TooLong, account.user, {}};
+    if (account.password.size() >= sizeof TLogin::szPassword)
+        return Error{TooLong, {}, {}};
+    return {};
+}
+
+TLogin* NewRecord()
+{
+    auto* const record = static_cast<TLogin*>(std::calloc(1, sizeof(TLogin)));
+    if (!record)
+        throw std::bad_alloc();
+    record->nSize = sizeof(TLogin);
+    record->iGUINotificationID = -1;
+    return record;
+}
+
+// Whether the server answers this session.
+bool Answers(ComGUIManager& manager, TLogin& record)
+{
+    char command[] = "remote.system.isalive";
+    TCommandRecord question{};
+    question.nMagic = static_cast<unsigned int>(manager.GetEndian());
+    question.nSize = sizeof question;
+    question.iArgB = 1;
+    question.iResult = -1;
+    return manager.SendCommand(&record, command, sizeof question, &question) == 0 && question.iResult >= 0;
+}
+}  // namespace
+
+void Client::FREE::operator()(TLogin* record) const { std::free(record); }
+
+std::shared_ptr<Client> Client::Make()
+{
+    std::shared_ptr<Client> client(new Client);
+    client->m_pool = std::make_shared<TransferPool>(
+        [weak = std::weak_ptr<Client>(client)]
+        {
+            auto const owner = weak.lock();
+            return owner && owner->IsLoggedIn();
+        },
+        [weak = std::weak_ptr<Client>(client)]
+        {
+            auto const owner = weak.lock();
+            return owner ? owner->Record() : std::nullopt;
+        },
+        [weak = std::weak_ptr<EventHub>(client->m_hub)](Event const& event)
+        {
+            if (auto const hub = weak.lock())
+                hub->Publish(event);
+        });
+    return client;
+}
+
+Client::~Client() = default;
+
+Outcome Client::FindPlugIn()
+{
+    auto const found = m_helper.With([](ComGUIManager&) { return true; });
+    return found ? Outcome() : found.GetError();
+}
+
+Outcome Client::Test(Server const& server)
+{
+    if (Outcome checked = Check(server); !checked)
+        return checked;
+    auto const answer = m_tester.With(
+        [&server](ComGUIManager& manager)
+        {
+            TLogin record{};
+            record.nSize = sizeof record;
+            Assign(record.szServerHost, server.host);
+            record.iServerPort = server.port;
+            return manager.IsAlive(&record) == 0 ? Outcome()
+                                                 : Outcome(FailureOf(manager, ServerAway, NameOf(server)));
+        });
+    return answer ? *answer : answer.GetError();
+}
+
+Result<User> Client::LogIn(Server const& server, Account const& account)
+{
+    if (Outcome const checked = Check(server); !checked)
+        return checked.GetError();
+    if (Outcome const checked = Check(account); !checked)
+        return checked.GetError();
+    (void)LogOut();
+
+    std::lock_guard const lifecycle(m_lifecycle);
+    std::unique_lock lock(m_calls);
+    if (Outcome const prepared = Prepare(server); !prepared)
+        return prepared.GetError();
+    Assign(m_record->szUser, account.user);
+    Assign(m_record->szPassword, account.password);
+    if (Outcome const entered = Enter(); !entered)
+        return entered.GetError();
+    User const user{
+        m_record->szUser, {UserTickets, m_record->iClientStamp}, m_manager->IsCurrentUserAdmin(m_record)};
+    lock.unlock();
+
+    SwitchNotifications();
+    std::lock_guard const watching(m_watching);
+    m_isWatchOver = false;
+    m_nextEntry = {};
+    try
+    {
+        m_watch = std::thread([this] { Watch(); });
+    }
+    catch (std::system_error const&)
+    {
+        m_container = nullptr;
+        Leave();
+        return Error{OutOfMemory, {}, {}};
+    }
+    return user;
+}
+
+// A manager and a record for that server. Those of a login that was refused there are good for the next one:
+// with them, the local port stays.
+Outcome Client::Prepare(Server const& server)
+{
+    if (!m_manager || server.host != m_record->szServerHost || server.port != m_record->iServerPort)
+    {
+        auto opened = OpenManager();
+        if (!opened)
+            return opened.GetError();
+        m_record = nullptr;
+        m_manager = *std::move(opened);
+        m_ownRecord.reset(NewRecord());
+        m_record = m_ownRecord.get();
+        Assign(m_record->szServerHost, server.host);
+        m_record->iServerPort = server.port;
+    }
+    if (m_manager->IsAlive(m_record) != 0)
+        return FailureOf(*m_manager, ServerAway, NameOf(server));
+    if (int const code = m_manager->Initialize(m_record, Stamp); code != 0)
+        return FailureOf(*m_manager, code, NameOf(server));
+    return {};
+}
+
+// Logs in with what the record holds.
+Outcome Client::Enter()
+{
+    (void)m_ownRecord.release();  // the manager's from here on, whatever comes
+    if (int const code = m_manager->Login(m_record); code != 0)
+        return FailureOf(*m_manager, code, m_record->szUser);
+    MTICKET_ACCESS const* const container = m_manager->GetClientContainer();
+    Outcome outcome = container ? Register() : Outcome(Error{NoContainer, m_record->szUser, {}});
+    if (!outcome)
+    {
+        m_hub->EndSession();
+        m_manager->Logout(m_record);
+        return outcome;
+    }
+    m_container = container;
+    m_isServerThere = true;
+    return {};
+}
+
+// Has the plug-in call the hub.
+Outcome Client::Register()
+{
+    void* const token = m_hub->BeginSession();
+    ScratchTicket const ticket;
+    char command[] = "local.set.callback";
+    int id = -1;
+    if (!ticket)
+        return Error{OutOfMemory, {}, {}};
+    if (!ticket.Put("pGUI2Notification", reinterpret_cast<void*>(EventHub::GetCallback())) ||
+        !ticket.Put("pUser", token))
+        return Error{BadAnswer, command, {}};
+    if (int const code = m_manager->SendCommand(m_record, command, 0, ticket.Address()); code != 0)
+        return FailureOf(*m_manager, CallbackRefused, {});
+    if (!ticket.Get("iGUINotificationID", id))
+        return Error{CallbackRefused, {}, {}};
+    m_record->iGUINotificationID = id;
+    std::lock_guard const lock(m_interests);
+    m_notification = id;
+    m_enabled.clear();
+    return {};
+}
+
+Outcome Client::LogOut()
+{
+    {
+        std::lock_guard const lifecycle(m_lifecycle);
+        if (!m_container.exchange(nullptr))
+            return Error{NotLoggedIn, {}, {}};
+        m_pool->CancelAll();
+        StopWatching();
+        m_isServerThere = false;
+        Leave();
+    }
+    m_pool->WaitForAll();
+    m_hub->WaitForHandlers();
+    return {};
+}
+
+void Client::Leave()
+{
+    std::lock_guard const lock(m_calls);
+    {
+        std::lock_guard const interests(m_interests);
+        m_notification = -1;
+        m_enabled.clear();
+    }
+    m_hub->EndSession();
+    m_manager->Logout(m_record);
+    m_container = nullptr;  // the watch may have logged in anew in the middle of a logout
+    m_record->iGUINotificationID = -1;
+}
+
+void Client::End()
+{
+    (void)LogOut();
+    m_pool->Stop();
+    m_hub->Stop();
+}
+
+std::string Client::LocalEndPoint() const
+{
+    std::lock_guard const lock(m_calls);
+    return IsLoggedIn() ? m_record->szLocalEndPoint : std::string();
+}
+
+std::optional<TLogin> Client::Record() const
+{
+    std::lock_guard const lock(m_calls);
+    return IsLoggedIn() ? std::optional<TLogin>(*m_record) : std::nullopt;
+}
+
+// The size may grow between the question and the answer.
+Result<std::string> Client::TicketData(TicketAddress ticket)
+{
+    constexpr int Xml = 0;
+    constexpr int BufferTooSmall = 110;
+    std::string const name = std::to_string(ticket.type) + "/" + std::to_string(ticket.id);
+    std::lock_guard const lock(m_calls);
+    if (!IsLoggedIn())
+        return Error{NotLoggedIn, {}, {}};
+    std::string data;
+    for (int tries = 0, size = 0; tries < 8; ++tries)
+    {
+        int const code = m_manager->GetTicketData(m_record, ticket.type, ticket.id, Xml, &size, data.data());
+        bool const isTooSmall = code == BufferTooSmall && size > static_cast<int>(data.size());
+        if (code != 0 && !isTooSmall)
+            return FailureOf(*m_manager, code, name);
+        if (size < 0 || (code == 0 && size > static_cast<int>(data.size())))
+            return Error{BadAnswer, name, {}};
+        data.resize(static_cast<std::size_t>(size));
+        if (code == 0)
+            return data;
+    }
+    return Error{BadAnswer, name, {}};
+}
+
+Error Client::Failure(int code, std::string about)
+{
+    auto const reason = m_helper.With([](ComGUIManager& manager) { return TakeReason(manager); });
+    return {code, std::move(about), reason ? *reason : std::string()};
+}
+
+std::shared_ptr<Subscriber> Client::Subscribe(Interest interest, Executor executor,
+                                              Subscription::Handler handler,
+                                              std::chrono::milliseconds interval)
+{
+    auto subscriber = m_hub->Add(std::move(interest), std::move(executor), std::move(handler), interval);
+    subscriber->onEnd = [weak = weak_from_this()]
+    {
+        if (auto const client = weak.lock())
+            client->SwitchNotifications();
+    };
+    SwitchNotifications();
+    return subscriber;
+}
+
+namespace
+{
+// By ticket, or by type with TICKET_ID_ALL: the keys that somebody wants; none stands for all keys.
+std::map<TicketAddress, std::set<std::string>> UnionOf(std::vector<Interest> const& interests)
+{
+    std::map<TicketAddress, std::set<std::string>> wanted;
+    auto const add = [&wanted](TicketAddress ticket, Interest const& interest)
+    {
+        auto const [place, isNew] = wanted.try_emplace(ticket, interest.keys.begin(), interest.keys.end());
+        if (isNew)
+            return;
+        if (interest.keys.empty())
+            place->second.clear();
+        else if (!place->second.empty())
+            place->second.insert(interest.keys.begin(), interest.keys.end());
+    };
+    for (Interest const& interest : interests)
+    {
+        for (int const type : interest.types)
+            add({type, TICKET_ID_ALL}, interest);
+        for (TicketAddress const ticket : interest.tickets)
+            add(ticket, interest);
+    }
+    return wanted;
+}
+}  // namespace
+
+// Brings what the plug-in reports in line with what subscribers want. Too much does no harm: the hub looks
+// anew.
+void Client::SwitchNotifications()
+{
+    std::lock_guard const lock(m_interests);
+    MTICKET_ACCESS const* const container = Container();
+    if (!container || m_notification == -1)
+        return;
+    auto const* const admin = MTICKET_ADMIN::Of(container);
+    auto wanted = UnionOf(m_hub->Interests());
+    for (auto known = m_enabled.begin(); known != m_enabled.end();)
+    {
+        TicketAddress const address = known->first;
+        if (wanted.count(address) != 0)
+        {
+            ++known;
+            continue;
+        }
+        admin->DisableNotification(address.type, address.id, m_notification);
+        known = m_enabled.erase(known);
+        if (address.id != TICKET_ID_ALL)
+            continue;
+        // Single tickets of the type went with it.
+        known = m_enabled.erase(m_enabled.lower_bound({address.type, TICKET_ID_ALL}),
+                                m_enabled.lower_bound({address.type + 1, TICKET_ID_ALL}));
+    }
+    for (auto& [address, keys] : wanted)
+    {
+        auto const known = m_enabled.find(address);
+        if (known != m_enabled.end() && known->second == keys)
+            continue;
+        std::vector<char const*> table;
+        for (std::string const& key : keys)
+            table.push_back(key.c_str());
+        table.push_back(nullptr);
+        if (admin->EnableNotification(address.type, address.id, m_notification, table.data()))
+            m_enabled[address] = std::move(keys);
+    }
+}
+
+void Client::StopWatching()
+{
+    {
+        std::lock_guard const lock(m_watching);
+        m_isWatchOver = true;
+        m_watchEnds.notify_all();
+    }
+    if (m_watch.joinable())
+        m_watch.join();
+}
+
+// Once a second, on a thread and with a manager of its own: an answer may take long.
+void Client::Watch()
+{
+    std::unique_lock lock(m_watching);
+    while (!m_watchEnds.wait_for(lock, LookInterval, [this] { return m_isWatchOver; }))
+    {
+        lock.unlock();
+        (void)m_watcher.With(
+            [this](ComGUIManager& watcher)
+            {
+                Look(watcher);
+                return true;
+            });
+        lock.lock();
+    }
+}
+
+void Client::Look(ComGUIManager& watcher)
+{
+    auto record = Record();
+    if (!record)
+        return;
+    bool const isThere = m_isServerThere;
+    if (Answers(watcher, *record))
+    {
+        m_isServerThere = true;
+        if (!isThere)
+            m_hub->Publish(ServerBack{false});
+        return;
+    }
+    Server const server{record->szServerHost, record->iServerPort};
+    NoteLoss({ServerAway, NameOf(server), TakeReason(watcher)});
+    if (watcher.IsAlive(&*record) != NotReachable && EnterAgain())
+        m_hub->Publish(ServerBack{true});  // the server was there, and the session was not
+}
+
+void Client::NoteLoss(Error error)
+{
+    if (m_isServerThere.exchange(false))
+        m_hub->Publish(ServerLost{std::move(error)});
+}
+
+// With growing pauses: servers answer ever later whom they have refused often.
+bool Client::EnterAgain()
+{
+    constexpr std::chrono::seconds LongestPause(60);
+    auto const now = std::chrono::steady_clock::now();
+    if (now < m_nextEntry)
+        return false;
+    m_nextEntry = now + m_entryPause;
+    m_entryPause = std::min(2 * m_entryPause, LongestPause);
+    {
+        std::lock_guard const lock(m_calls);
+        if (!Enter())
+            return false;
+    }
+    m_entryPause = std::chrono::seconds(1);
+    SwitchNotifications();
+    return true;
+}
+}  // namespace comgui::detail

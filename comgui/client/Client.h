@@ -1,0 +1,107 @@
+// What a connection and its handles share: the session, and what goes on beside it. For any thread.
+//
+// Locks, in the order in which they are taken: m_lifecycle for whole logins and logouts, m_calls for the
+// manager, m_interests for what is switched on. Handlers and executors are called under none of them.
+#pragma once
+
+#include "comgui/client/Connection.h"
+#include "comgui/client/EventHub.h"
+#include "comgui/client/Manager.h"
+#include "comgui/client/SharedManager.h"
+#include "comgui/session/TLogin.h"
+#include "comgui/ticket/MTICKET_ACCESS.h"
+#include <atomic>
+#include <condition_variable>
+#include <map>
+#include <mutex>
+#include <optional>
+#include <set>
+#include <thread>
+
+namespace comgui::detail
+{
+class TransferPool;
+
+class Client : public std::enable_shared_from_this<Client>
+{
+public:
+    static std::shared_ptr<Client> Make();
+    ~Client();
+    Client(Client const&) = delete;
+    Client& operator=(Client const&) = delete;
+
+    Outcome FindPlugIn();
+    Outcome Test(Server const& server);
+    Result<User> LogIn(Server const& server, Account const& account);
+    Outcome LogOut();
+    void End();  // all of it, for good
+
+    bool IsLoggedIn() const { return Container() != nullptr; }
+    bool IsServerThere() const { return m_isServerThere; }
+    std::string LocalEndPoint() const;
+
+    // Null without a session. One that was given out is the plug-in's, and may end at any time.
+    MTICKET_ACCESS const* Container() const { return m_container.load(std::memory_order_acquire); }
+
+    // The ticket as XML.
+    Result<std::string> TicketData(TicketAddress ticket);
+
+    // A copy of the session's record; nothing without a session.
+    std::optional<TLogin> Record() const;
+
+    // With the reason for the last refusal on this thread.
+    Error Failure(int code, std::string about);
+
+    std::shared_ptr<Subscriber> Subscribe(Interest interest, Executor executor, Subscription::Handler handler,
+                                          std::chrono::milliseconds interval);
+    EventHub& Hub() { return *m_hub; }
+    TransferPool& Pool() { return *m_pool; }
+
+private:
+    Client() = default;
+
+    struct FREE
+    {
+        void operator()(TLogin* record) const;
+    };
+
+    Outcome Prepare(Server const& server);
+    Outcome Enter();
+    Outcome Register();
+    void Leave();
+    void SwitchNotifications();
+    void StopWatching();
+    void Watch();
+    void Look(ComGUIManager& watcher);
+    void NoteLoss(Error error);
+    bool EnterAgain();
+
+    std::shared_ptr<EventHub> const m_hub = std::make_shared<EventHub>();
+    std::shared_ptr<TransferPool> m_pool;
+    SharedManager m_tester;   // for servers that are only tested
+    SharedManager m_watcher;  // for the watch
+    SharedManager m_helper;   // for reasons
+    std::atomic<MTICKET_ACCESS const*> m_container{nullptr};
+    std::atomic<bool> m_isServerThere{false};
+
+    std::mutex m_lifecycle;
+
+    mutable std::mutex m_calls;                 // the members below
+    std::unique_ptr<TLogin, FREE> m_ownRecord;  // until the first login, when it becomes the manager's
+    std::unique_ptr<ComGUIManager> m_manager;
+    TLogin* m_record = nullptr;
+
+    std::mutex m_interests;  // the members below
+    std::map<TicketAddress, std::set<std::string>> m_enabled;
+    int m_notification = -1;
+
+    std::mutex m_watching;  // the members below
+    std::condition_variable m_watchEnds;
+    bool m_isWatchOver = false;
+    std::thread m_watch;
+
+    // The watch's own.
+    std::chrono::seconds m_entryPause{1};  // after a login that was refused; grows
+    std::chrono::steady_clock::time_point m_nextEntry{};
+};
+}  // namespace comgui::detail

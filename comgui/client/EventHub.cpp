@@ -1,0 +1,270 @@
+#include "comgui/client/EventHub.h"
+
+#include <algorithm>
+#include <atomic>
+#include <utility>
+
+namespace comgui::detail
+{
+namespace
+{
+// The hubs by what the plug-in was given for their sessions: a number, so that a late call finds nothing, and
+// nothing that is gone.
+class Sessions
+{
+public:
+    static Sessions& Instance()
+    {
+        static auto* const all = new Sessions;  // the plug-in may call until the very end of the process
+        return *all;
+    }
+
+    std::uintptr_t Add(std::weak_ptr<EventHub> hub)
+    {
+        std::lock_guard const lock(m_lock);
+        m_hubs[++m_newest] = std::move(hub);
+        return m_newest;
+    }
+    void Remove(std::uintptr_t session)
+    {
+        std::lock_guard const lock(m_lock);
+        m_hubs.erase(session);
+    }
+    std::shared_ptr<EventHub> Find(std::uintptr_t session)
+    {
+        std::lock_guard const lock(m_lock);
+        auto const found = m_hubs.find(session);
+        return found == m_hubs.end() ? nullptr : found->second.lock();
+    }
+
+private:
+    std::mutex m_lock;
+    std::map<std::uintptr_t, std::weak_ptr<EventHub>> m_hubs;
+    std::uintptr_t m_newest = 0;
+};
+}  // namespace
+
+EventHub::~EventHub() { Stop(); }
+
+void* EventHub::BeginSession()
+{
+    EndSession();
+    auto const session = Sessions::Instance().Add(weak_from_this());
+    std::lock_guard const lock(m_lock);
+    m_session = session;
+    return reinterpret_cast<void*>(session);
+}
+
+void EventHub::EndSession()
+{
+    std::lock_guard const lock(m_lock);
+    Sessions::Instance().Remove(std::exchange(m_session, 0));
+    ++m_epoch;
+    for (auto const& subscriber : m_subscribers)
+        subscriber->m_pending.DropTickets();
+}
+
+void EventHub::WaitForHandlers() const
+{
+    Lock lock(m_lock);
+    auto const self = std::this_thread::get_id();
+    m_handled.wait(lock,
+                   [this, self]
+                   {
+                       return std::all_of(m_subscribers.begin(), m_subscribers.end(),
+                                          [self](auto const& subscriber) {
+                                              return subscriber->m_runner == std::thread::id() ||
+                                                     subscriber->m_runner == self;
+                                          });
+                   });
+}
+
+// On a thread of the plug-in's.
+void EventHub::Notified(void* token, int kind, int id, int, int type, void* data)
+{
+    auto const session = reinterpret_cast<std::uintptr_t>(token);
+    auto const hub = Sessions::Instance().Find(session);
+    if (!hub ||
+        (kind != TicketEvent::Changed && kind != TicketEvent::Created && kind != TicketEvent::Deleted))
+        return;
+    TicketEvent event{static_cast<TicketEvent::KIND>(kind), {type, id}};
+    if (kind == TicketEvent::Changed)
+        event.keys = ChangesOf(static_cast<SETMULTIPAR const*>(data));
+    hub->Take(session, event);
+}
+
+void EventHub::Take(std::uintptr_t session, TicketEvent const& event)
+{
+    std::lock_guard const lock(m_lock);
+    if (session != m_session)
+        return;
+    for (auto const& subscriber : m_subscribers)
+        subscriber->m_pending.Add(subscriber->m_interest, event);
+    m_work.notify_all();
+}
+
+void EventHub::Publish(Event const& event)
+{
+    std::lock_guard const lock(m_lock);
+    for (auto const& subscriber : m_subscribers)
+        subscriber->m_pending.Add(subscriber->m_interest, event);
+    m_work.notify_all();
+}
+
+std::shared_ptr<Subscriber> EventHub::Add(Interest interest, Executor executor, Subscription::Handler handler,
+                                          std::chrono::milliseconds interval)
+{
+    auto subscriber = std::make_shared<Subscriber>(weak_from_this(), std::move(interest), std::move(executor),
+                                                   std::move(handler), interval);
+    std::lock_guard const lock(m_lock);
+    m_subscribers.push_back(subscriber);
+    if (!m_thread.joinable() && !m_isStopped)
+        m_thread = std::thread([this] { Run(); });
+    return subscriber;
+}
+
+void EventHub::Remove(Subscriber& subscriber)
+{
+    Lock lock(m_lock);
+    subscriber.m_isOver = true;
+    subscriber.m_pending = {};
+    m_handled.wait(lock,
+                   [&subscriber] {
+                       return subscriber.m_runner == std::thread::id() ||
+                              subscriber.m_runner == std::this_thread::get_id();
+                   });
+    m_subscribers.erase(std::remove_if(m_subscribers.begin(), m_subscribers.end(),
+                                       [&subscriber](auto const& each) { return each.get() == &subscriber; }),
+                        m_subscribers.end());
+}
+
+std::vector<Interest> EventHub::Interests() const
+{
+    std::lock_guard const lock(m_lock);
+    std::vector<Interest> interests;
+    for (auto const& subscriber : m_subscribers)
+        if (!subscriber->m_isOver)
+            interests.push_back(subscriber->m_interest);
+    return interests;
+}
+
+void EventHub::Stop()
+{
+    {
+        std::lock_guard const lock(m_lock);
+        m_isStopped = true;
+        m_work.notify_all();
+    }
+    if (!m_thread.joinable())
+        return;
+    if (m_thread.get_id() == std::this_thread::get_id())
+        m_thread.detach();  // an executor that ran its task at once, against its rule
+    else
+        m_thread.join();
+}
+
+void EventHub::Run()
+{
+    Lock lock(m_lock);
+    while (!m_isStopped)
+    {
+        auto const next = PostWhatIsDue(lock);
+        if (m_isStopped)
+            break;
+        if (next == Clock::time_point::max())
+            m_work.wait(lock);
+        else
+            m_work.wait_until(lock, next);
+    }
+}
+
+// When the next one is due. Unlocks while it posts.
+EventHub::Clock::time_point EventHub::PostWhatIsDue(Lock& lock)
+{
+    auto const now = Clock::now();
+    auto next = Clock::time_point::max();
+    std::vector<std::shared_ptr<Subscriber>> due;
+    for (auto const& subscriber : m_subscribers)
+    {
+        if (subscriber->m_isPosted || subscriber->m_isOver || subscriber->m_pending.IsEmpty())
+            continue;
+        if (subscriber->m_due > now)
+        {
+            next = std::min(next, subscriber->m_due);
+            continue;
+        }
+        subscriber->m_isPosted = true;
+        due.push_back(subscriber);
+    }
+    if (due.empty())
+        return next;
+    lock.unlock();
+    for (auto const& subscriber : due)
+        subscriber->m_executor(
+            [weak = std::weak_ptr<Subscriber>(subscriber)]
+            {
+                if (auto const target = weak.lock())
+                    target->Deliver();
+            });
+    due.clear();
+    lock.lock();
+    return now;  // look again: something may have come meanwhile
+}
+
+Subscriber::Subscriber(std::weak_ptr<EventHub> hub, Interest interest, Executor executor,
+                       Subscription::Handler handler, std::chrono::milliseconds interval)
+    : m_hub(std::move(hub)), m_interest(std::move(interest)), m_executor(std::move(executor)),
+      m_handler(std::move(handler)), m_interval(interval)
+{
+}
+
+void Subscriber::End()
+{
+    if (auto const hub = m_hub.lock())
+        hub->Remove(*this);
+    if (onEnd)
+        std::exchange(onEnd, nullptr)();
+}
+
+bool Subscriber::IsOver(std::uintptr_t epoch) const
+{
+    auto const hub = m_hub.lock();
+    if (!hub)
+        return true;
+    std::lock_guard const lock(hub->m_lock);
+    return m_isOver || hub->m_isStopped || hub->m_epoch != epoch;
+}
+
+// In the executor. What a handler throws goes to the executor.
+void Subscriber::Deliver()
+{
+    auto const hub = m_hub.lock();
+    if (!hub)
+        return;
+    struct Run
+    {
+        Subscriber& self;
+        EventHub& hub;
+        ~Run()
+        {
+            std::lock_guard const lock(hub.m_lock);
+            self.m_runner = {};
+            self.m_isPosted = false;
+            self.m_due = EventHub::Clock::now() + self.m_interval;
+            hub.m_handled.notify_all();
+            hub.m_work.notify_all();
+        }
+    };
+    EventHub::Lock lock(hub->m_lock);
+    if (m_isOver || hub->m_isStopped)
+        return;
+    auto const epoch = hub->m_epoch;
+    auto const events = m_pending.Take();
+    m_runner = std::this_thread::get_id();
+    Run const run{*this, *hub};
+    lock.unlock();
+    for (Event const& event : events)
+        if (!IsOver(epoch))
+            m_handler(event);
+}
+}  // namespace comgui::detail

@@ -1,0 +1,515 @@
+#include "comgui/client/Tickets.h"
+
+#include "comgui/access/MTICKET_READ.h"
+#include "comgui/client/Client.h"
+#include "comgui/client/SlotValue.h"
+#include "comgui/folders/clFOLDER_VARIABLES.h"
+#include <array>
+#include <deque>
+#include <limits>
+
+namespace comgui
+{
+namespace
+{
+using detail::Client;
+
+constexpr int TicketTypes = 100;
+
+std::string NameOf(TicketAddress ticket)
+{
+    return std::to_string(ticket.type) + "/" + std::to_string(ticket.id);
+}
+
+std::string NameOf(TicketAddress ticket, char const* key) { return NameOf(ticket) + " " + key; }
+
+// The container's translator; null where the plug-in has none.
+clFOLDER_VARIABLES const* FoldersOf(MTICKET_ACCESS const* container)
+{
+    clFOLDER_VARIABLES* folders = nullptr;
+    container->MOPERATION(container->Instance, TICKET_ID_NONE, TICKET_ID_NONE, MTICKET_OP_FOLDER_VARIABLES,
+                          &folders);
+    return folders;
+}
+
+bool MayBeVariable(std::string const& text) { return text.size() >= 4 && text[0] == '$' && text[1] == '('; }
+
+bool MayBeAbsolute(std::string const& text)
+{
+    return !text.empty() && (text[0] == '/' || text[0] == '\\' || (text.size() > 2 && text[1] == ':'));
+}
+
+void Resolve(clFOLDER_VARIABLES const* folders, std::string& text)
+{
+    if (folders && MayBeVariable(text))
+        text = folders->Decode(text, false);
+}
+
+// Only if it is read back as what was written.
+void MakePortable(clFOLDER_VARIABLES const* folders, std::string& text)
+{
+    if (!folders || !MayBeAbsolute(text))
+        return;
+    std::string portable = folders->Encode(text);
+    if (MayBeVariable(portable) && folders->Decode(portable, false) == text)
+        text = std::move(portable);
+}
+
+template <typename Change>
+void ForEachText(Value& value, Change const& change)
+{
+    if (auto* const text = std::get_if<std::string>(&value))
+        change(*text);
+    else if (auto* const list = std::get_if<List>(&value))
+        for (Element& element : *list)
+            ForEachText(element.value, change);
+}
+
+// A ticket that is open as long as this lives.
+class OpenedTicket
+{
+public:
+    OpenedTicket(MTICKET_ACCESS const* container, TicketAddress address)
+        : m_container(container), m_address(address)
+    {
+        container->MOPERATION(container->Instance, address.type, address.id, MTICKET_OP_OPEN, &m_ticket);
+    }
+    ~OpenedTicket()
+    {
+        bool flag = false;
+        if (m_ticket)
+            m_container->MOPERATION(m_container->Instance, m_address.type, m_address.id, MTICKET_OP_CLOSE,
+                                    &flag);
+    }
+    OpenedTicket(OpenedTicket const&) = delete;
+    OpenedTicket& operator=(OpenedTicket const&) = delete;
+
+    explicit operator bool() const { return m_ticket != nullptr; }
+
+    // Calls take(key, type, word, pos), which returns whether to go on, for each value whose key begins so.
+    template <typename Take>
+    void Walk(char const* prefix, Take take) const
+    {
+        constexpr int Everything = 8000;  // what the library asks for
+        m_ticket->SWALKPARAMETERS(
+            m_ticket->Instance,
+            [](void* context, char const* key, PARAM_TYPE type, void const* word, int pos)
+            { return !detail::IsParameter(type) || (*static_cast<Take*>(context))(key, type, word, pos); },
+            &take, prefix, Everything);
+    }
+
+private:
+    MTICKET_ACCESS const* const m_container;
+    TicketAddress const m_address;
+    STICKET_ACCESS const* m_ticket = nullptr;
+};
+
+// One value after another, in the order of a walk.
+void AddValue(Value& value, int pos, Value&& next)
+{
+    if (value.IsNone() && pos <= 0)
+        value = std::move(next);
+    else if (auto* const list = std::get_if<List>(&value))
+        list->push_back({pos, std::move(next)});
+    else
+    {
+        List all;
+        if (!value.IsNone())
+            all.push_back({0, std::move(value)});
+        all.push_back({pos, std::move(next)});
+        value = std::move(all);
+    }
+}
+
+template <typename T>
+bool Get(MTICKET_ACCESS const* container, TicketAddress ticket, char const* key, PARAM_TYPE type, T& value,
+         int pos)
+{
+    return container->MGETPARAMETER(container->Instance, ticket.type, ticket.id, key, type, &value, pos) != 0;
+}
+
+template <typename T>
+Value Scalar(MTICKET_ACCESS const* container, TicketAddress ticket, char const* key, int pos)
+{
+    T value{};
+    return Get(container, ticket, key, GetParamType<T>(), value, pos) ? Value(value) : Value();
+}
+
+// A single value of that type; none if it is gone meanwhile.
+Value ReadScalar(MTICKET_ACCESS const* container, TicketAddress ticket, char const* key, PARAM_TYPE type,
+                 int pos)
+{
+    switch (type)
+    {
+    case PARAM_INT:
+        return Scalar<int>(container, ticket, key, pos);
+    case PARAM_DOUBLE:
+        return Scalar<double>(container, ticket, key, pos);
+    case PARAM_INT64:
+        return Scalar<long long>(container, ticket, key, pos);
+    case PARAM_UNSIGNED:
+        return Scalar<unsigned int>(container, ticket, key, pos);
+    case PARAM_UNSIGNED64:
+        return Scalar<unsigned long long>(container, ticket, key, pos);
+    case PARAM_POINTER:
+    {
+        Pointer value;
+        return Get(container, ticket, key, PARAM_POINTER, value.address, pos) ? Value(value) : Value();
+    }
+    case PARAM_STRING:
+    {
+        char const* text = nullptr;
+        return Get(container, ticket, key, PARAM_STRING, text, pos) ? Value(std::string(text ? text : ""))
+                                                                    : Value();
+    }
+    case PARAM_BINSTRING:
+    {
+        BIN_STRING bytes;
+        return Get(container, ticket, key, PARAM_BINSTRING, bytes, pos)
+                   ? detail::ValueOf(PARAM_BINSTRING, &bytes)
+                   : Value();
+    }
+    default:
+        return {};
+    }
+}
+
+Error MissingValue(Client& client, MTICKET_ACCESS const* container, TicketAddress ticket, char const* key)
+{
+    return OpenedTicket(container, ticket) ? client.Failure(NoSuchKey, NameOf(ticket, key))
+                                           : client.Failure(NoSuchTicket, NameOf(ticket));
+}
+
+// Whatever lies there, as stored.
+Result<Value> ReadStored(Client& client, MTICKET_ACCESS const* container, TicketAddress ticket,
+                         char const* key, int pos)
+{
+    int type = PARAM_NONE;
+    if (!Get(container, ticket, key, PARAM_NONE, type, pos) || type == PARAM_NONE)
+        return MissingValue(client, container, ticket, key);
+    Value value;
+    if (type != PARAM_COUNT)
+        value = ReadScalar(container, ticket, key, static_cast<PARAM_TYPE>(type), pos);
+    else if (OpenedTicket const opened(container, ticket); opened)
+        opened.Walk(key,
+                    [&value, key](char const* name, PARAM_TYPE each, void const* word, int place)
+                    {
+                        if (std::string_view(name) == key)
+                            AddValue(value, place, detail::ValueOf(each, word));
+                        return true;
+                    });
+    if (value.IsNone())
+        return MissingValue(client, container, ticket, key);  // deleted meanwhile
+    return value;
+}
+
+// A table of writes, with what its records point at.
+class WriteTable
+{
+public:
+    explicit WriteTable(clFOLDER_VARIABLES const* folders) : m_folders(folders) {}
+
+    // Adds what the value comes to; false if no ticket can hold it, and then nothing.
+    bool Add(char const* key, Value const& value, int pos)
+    {
+        auto const* const list = std::get_if<List>(&value);
+        if (!list)
+        {
+            AddRecord(key, value, pos);
+            return true;
+        }
+        if (pos != WholeKey)
+            return false;
+        int last = -1;
+        for (Element const& element : *list)
+            if (element.value.IsList() || element.value.IsNone() ||
+                std::exchange(last, element.pos) >= element.pos)
+                return false;
+        // A write at -1 begins the key anew; without a first value, a deletion does.
+        bool const beginsWithFirst = !list->empty() && list->front().pos == 0;
+        if (!beginsWithFirst)
+            AddRecord(key, Value(), WholeKey);
+        for (Element const& element : *list)
+            AddRecord(key, element.value, element.pos == 0 ? WholeKey : element.pos);
+        return true;
+    }
+
+    // The records, ended by one without a key; as long as nothing is added.
+    SETMULTIPAR* Records()
+    {
+        m_records.push_back({});
+        return m_records.data();
+    }
+    std::size_t Size() const { return m_records.size(); }
+    bool IsOk(std::size_t begin, std::size_t end) const
+    {
+        while (begin < end && detail::IsOk(m_records[begin]))
+            ++begin;
+        return begin == end;
+    }
+
+private:
+    void AddRecord(char const* key, Value const& value, int pos)
+    {
+        Value const* kept = &value;
+        if (auto const* const text = std::get_if<std::string>(&value);
+            text && m_folders && MayBeAbsolute(*text))
+        {
+            std::string portable = *text;
+            MakePortable(m_folders, portable);
+            kept = &m_texts.emplace_back(std::move(portable));
+        }
+        SETMULTIPAR record{};
+        record.key = key;
+        record.type = kept->Type();
+        record.value = detail::WordOf(*kept, m_bytes.emplace_back());
+        record.pos = pos;
+        m_records.push_back(record);
+    }
+
+    clFOLDER_VARIABLES const* const m_folders;
+    std::vector<SETMULTIPAR> m_records;
+    std::deque<Value> m_texts;
+    std::deque<BIN_STRING> m_bytes;
+};
+
+Error NotLoggedInError() { return {NotLoggedIn, {}, {}}; }
+
+Error RefusedWrite(Client& client, MTICKET_ACCESS const* container, TicketAddress ticket, char const* key)
+{
+    Error error = client.Failure(WriteRefused, NameOf(ticket, key));  // first: it is of the last refusal
+    if (!OpenedTicket(container, ticket))
+        return {NoSuchTicket, NameOf(ticket), {}};
+    return error;
+}
+
+bool AddTicket(void* tickets, int type, int id, STICKET_ACCESS const*)
+{
+    static_cast<std::vector<TicketAddress>*>(tickets)->push_back({type, id});
+    return true;
+}
+
+bool NoteTicket(void* isThere, int, int, STICKET_ACCESS const*)
+{
+    *static_cast<bool*>(isThere) = true;
+    return false;
+}
+}  // namespace
+
+Result<std::vector<int>> Tickets::Types() const
+{
+    MTICKET_ACCESS const* const container = m_client->Container();
+    if (!container)
+        return NotLoggedInError();
+    std::vector<int> types;
+    for (int type = 0; type < TicketTypes; ++type)
+    {
+        bool isThere = false;
+        container->MWALKTICKETS(container->Instance, NoteTicket, &isThere, type);
+        if (isThere)
+            types.push_back(type);
+    }
+    return types;
+}
+
+Result<std::vector<TicketAddress>> Tickets::List(int type) const
+{
+    MTICKET_ACCESS const* const container = m_client->Container();
+    if (!container)
+        return NotLoggedInError();
+    std::vector<TicketAddress> tickets;
+    container->MWALKTICKETS(container->Instance, AddTicket, &tickets, type);
+    return tickets;
+}
+
+Result<TicketAddress> Tickets::Create(int type) const
+{
+    MTICKET_ACCESS const* const container = m_client->Container();
+    if (!container)
+        return NotLoggedInError();
+    int id = TICKET_ID_NONE;
+    if (!container->MOPERATION(container->Instance, type, TICKET_ID_NEXT, MTICKET_OP_CREATE_NEXT, &id) ||
+        id < 0)
+        return m_client->Failure(CreateRefused, std::to_string(type));
+    return TicketAddress{type, id};
+}
+
+Outcome Tickets::Delete(TicketAddress ticket) const
+{
+    MTICKET_ACCESS const* const container = m_client->Container();
+    if (!container)
+        return NotLoggedInError();
+    if (container->MOPERATION(container->Instance, ticket.type, ticket.id, MTICKET_OP_DELETE, nullptr))
+        return {};
+    Error error = m_client->Failure(DeleteRefused, NameOf(ticket));
+    if (!Exists(ticket))
+        return Error{NoSuchTicket, NameOf(ticket), {}};
+    return error;
+}
+
+bool Tickets::Exists(TicketAddress ticket) const
+{
+    MTICKET_ACCESS const* const container = m_client->Container();
+    return container && OpenedTicket(container, ticket);
+}
+
+Result<std::vector<KeyInfo>> Tickets::Keys(TicketAddress ticket) const
+{
+    MTICKET_ACCESS const* const container = m_client->Container();
+    if (!container)
+        return NotLoggedInError();
+    OpenedTicket const opened(container, ticket);
+    if (!opened)
+        return m_client->Failure(NoSuchTicket, NameOf(ticket));
+    std::vector<KeyInfo> keys;
+    opened.Walk("",
+                [&keys](char const* key, PARAM_TYPE type, void const*, int pos)
+                {
+                    if (keys.empty() || keys.back().key != key)
+                        keys.push_back({key, type, PARAM_NONE, 0});
+                    KeyInfo& info = keys.back();
+                    if (++info.count == 2 || pos > 0)
+                    {
+                        info.elementType = info.type == PARAM_COUNT ? info.elementType : info.type;
+                        info.type = PARAM_COUNT;
+                    }
+                    return true;
+                });
+    return keys;
+}
+
+Result<Snapshot> Tickets::ReadAll(TicketAddress ticket, Paths paths) const
+{
+    MTICKET_ACCESS const* const container = m_client->Container();
+    if (!container)
+        return NotLoggedInError();
+    OpenedTicket const opened(container, ticket);
+    if (!opened)
+        return m_client->Failure(NoSuchTicket, NameOf(ticket));
+    std::vector<SnapshotEntry> entries;
+    opened.Walk("",
+                [&entries](char const* key, PARAM_TYPE type, void const* word, int pos)
+                {
+                    if (entries.empty() || entries.back().key != key)
+                        entries.push_back({key, {}});
+                    AddValue(entries.back().value, pos, detail::ValueOf(type, word));
+                    return true;
+                });
+    if (paths == Paths::Resolved)
+        for (auto const* const folders = FoldersOf(container); SnapshotEntry & entry : entries)
+            ForEachText(entry.value, [folders](std::string& text) { Resolve(folders, text); });
+    return Snapshot(std::move(entries));
+}
+
+Result<Value> Tickets::Read(TicketAddress ticket, KeyName key, int pos, Paths paths) const
+{
+    MTICKET_ACCESS const* const container = m_client->Container();
+    if (!container)
+        return NotLoggedInError();
+    Result<Value> value = ReadStored(*m_client, container, ticket, key, pos);
+    if (value && paths == Paths::Resolved)
+        ForEachText(*value, [folders = FoldersOf(container)](std::string& text) { Resolve(folders, text); });
+    return value;
+}
+
+template <typename T>
+Result<T> Tickets::ReadAs(TicketAddress ticket, KeyName key, int pos) const
+{
+    MTICKET_ACCESS const* const container = m_client->Container();
+    if (!container)
+        return NotLoggedInError();
+    if constexpr (std::is_arithmetic_v<T>)
+    {
+        T value{};
+        if (Get(container, ticket, key, GetParamType<T>(), value, pos))
+            return value;
+    }
+    Result<Value> const value = Read(ticket, key, pos);
+    if (!value)
+        return value.GetError();
+    Result<T> as = As<T>(*value);
+    return as ? as : Error{as.GetError().code, NameOf(ticket, key), {}};
+}
+
+Outcome Tickets::Write(TicketAddress ticket, KeyName key, Value const& value, int pos, Paths paths) const
+{
+    MTICKET_ACCESS const* const container = m_client->Container();
+    if (!container)
+        return NotLoggedInError();
+    WriteTable table(paths == Paths::Resolved ? FoldersOf(container) : nullptr);
+    if (!table.Add(key, value, pos))
+        return Error{NotWritable, NameOf(ticket, key), {}};
+    std::size_t const size = table.Size();
+    container->MSETMULTIPAR(container->Instance, ticket.type, ticket.id, table.Records());
+    return table.IsOk(0, size) ? Outcome() : RefusedWrite(*m_client, container, ticket, key);
+}
+
+Outcome Tickets::WriteText(TicketAddress ticket, KeyName key, std::string_view text, int pos) const
+{
+    MTICKET_ACCESS const* const container = m_client->Container();
+    if (!container)
+        return NotLoggedInError();
+    Result<Value> const before = ReadStored(*m_client, container, ticket, key, pos);
+    if (!before)
+        return before.GetError();
+    auto const* const list = std::get_if<comgui::List>(&*before);
+    PARAM_TYPE const elementType = list && !list->empty() ? list->front().value.Type() : PARAM_STRING;
+    Result<Value> const value = FromText(text, before->Type(), elementType);
+    if (!value)
+        return Error{value.GetError().code, NameOf(ticket, key), {}};
+    return Write(ticket, key, *value, pos);
+}
+
+std::vector<Outcome> Tickets::WriteAll(TicketAddress ticket, std::vector<KeyValue> const& values,
+                                       Paths paths) const
+{
+    MTICKET_ACCESS const* const container = m_client->Container();
+    if (!container)
+        return std::vector<Outcome>(values.size(), Outcome(NotLoggedInError()));
+    WriteTable table(paths == Paths::Resolved ? FoldersOf(container) : nullptr);
+    std::vector<std::size_t> ends;
+    std::vector<Outcome> outcomes(values.size());
+    for (std::size_t i = 0; i < values.size(); ++i)
+    {
+        if (!table.Add(values[i].key.c_str(), values[i].value, WholeKey))
+            outcomes[i] = Error{NotWritable, NameOf(ticket, values[i].key.c_str()), {}};
+        ends.push_back(table.Size());
+    }
+    container->MSETMULTIPAR(container->Instance, ticket.type, ticket.id, table.Records());
+    std::size_t begin = 0;
+    for (std::size_t i = 0; i < values.size(); begin = ends[i++])
+        if (outcomes[i] && !table.IsOk(begin, ends[i]))
+            outcomes[i] = RefusedWrite(*m_client, container, ticket, values[i].key.c_str());
+    return outcomes;
+}
+
+Result<std::string> Tickets::ToXml(TicketAddress ticket) const { return m_client->TicketData(ticket); }
+
+std::string Tickets::Resolved(std::string text) const
+{
+    if (MTICKET_ACCESS const* const container = m_client->Container())
+        Resolve(FoldersOf(container), text);
+    return text;
+}
+
+std::string Tickets::Portable(std::string text) const
+{
+    if (MTICKET_ACCESS const* const container = m_client->Container())
+        MakePortable(FoldersOf(container), text);
+    return text;
+}
+
+// NOLINTBEGIN(bugprone-macro-parentheses): T is a type
+#define COMGUI_CLIENT_READ(T)                                                                                \
+    template COMGUI_EXPORT Result<T> Tickets::ReadAs(TicketAddress, KeyName, int) const;                     \
+    template COMGUI_EXPORT Result<std::vector<T>> Tickets::ReadAs(TicketAddress, KeyName, int) const;
+COMGUI_CLIENT_READ(int)
+COMGUI_CLIENT_READ(double)
+COMGUI_CLIENT_READ(std::string)
+COMGUI_CLIENT_READ(Bytes)
+COMGUI_CLIENT_READ(long long)
+COMGUI_CLIENT_READ(unsigned int)
+COMGUI_CLIENT_READ(unsigned long long)
+#undef COMGUI_CLIENT_READ
+// NOLINTEND(bugprone-macro-parentheses)
+}  // namespace comgui

@@ -1,0 +1,363 @@
+#include "comgui/client/Value.h"
+
+#include <charconv>
+#include <cmath>
+#include <limits>
+#include <optional>
+#include <type_traits>
+
+namespace comgui
+{
+namespace
+{
+template <typename T>
+constexpr bool IsNumber =
+    std::is_same_v<T, int> || std::is_same_v<T, double> || std::is_same_v<T, long long> ||
+    std::is_same_v<T, unsigned int> || std::is_same_v<T, unsigned long long>;
+
+template <typename T>
+std::string NumberText(T number)
+{
+    char digits[32];
+    return {digits, std::to_chars(digits, std::end(digits), number).ptr};
+}
+
+std::string HexText(std::string_view bytes)
+{
+    constexpr char Digits[] = "0123456789abcdef";
+    std::string text;
+    for (char const c : bytes)
+    {
+        auto const byte = static_cast<unsigned char>(c);
+        text += {Digits[byte >> 4], Digits[byte & 15]};
+    }
+    return text;
+}
+
+bool NeedsQuotes(std::string_view text)
+{
+    return text.empty() || text.find_first_of(",\"") != text.npos || text.front() == ' ' ||
+           text.back() == ' ';
+}
+
+std::string Quoted(std::string_view text)
+{
+    std::string quoted = "\"";
+    for (char const c : text)
+        quoted += c == '"' ? std::string("\"\"") : std::string(1, c);
+    return quoted + '"';
+}
+
+std::string ListText(List const& list)
+{
+    std::string all;
+    int next = 0;
+    for (Element const& element : list)
+    {
+        for (; next < element.pos; ++next)
+            all += next == 0 ? "" : ", ";  // a gap
+        all += next++ == 0 ? "" : ", ";
+        std::string const text = ToText(element.value);
+        bool const isText = element.value.Type() == PARAM_STRING;
+        all += text.empty() || (isText && NeedsQuotes(text)) ? Quoted(text) : text;
+    }
+    return all;
+}
+
+std::string_view Trimmed(std::string_view text)
+{
+    auto const begin = text.find_first_not_of(' ');
+    return begin == text.npos ? std::string_view()
+                              : text.substr(begin, text.find_last_not_of(' ') - begin + 1);
+}
+
+Error Failure(ERROR_CODE code, std::string_view about) { return {code, std::string(about), {}}; }
+
+template <typename T>
+Result<Value> NumberFrom(std::string_view text)
+{
+    std::string_view digits = Trimmed(text);
+    if (digits.size() > 1 && digits[0] == '+' && digits[1] != '-')
+        digits.remove_prefix(1);
+    T number{};
+    auto const [end, error] = std::from_chars(digits.data(), digits.data() + digits.size(), number);
+    if (error == std::errc::result_out_of_range)
+        return Failure(OutOfRange, text);
+    if (error != std::errc() || end != digits.data() + digits.size())
+    {
+        // A negative number is one, though not of a type without a sign.
+        long long negative = 0;
+        bool const isNegative = std::is_unsigned_v<T> && digits.size() > 1 && digits[0] == '-' &&
+                                std::from_chars(digits.data(), digits.data() + digits.size(), negative).ptr ==
+                                    digits.data() + digits.size();
+        return Failure(isNegative ? OutOfRange : NotANumber, text);
+    }
+    return Value(number);
+}
+
+std::optional<unsigned char> DigitOf(char c)
+{
+    if (c >= '0' && c <= '9')
+        return static_cast<unsigned char>(c - '0');
+    c = static_cast<char>(c | 0x20);
+    if (c >= 'a' && c <= 'f')
+        return static_cast<unsigned char>(c - 'a' + 10);
+    return std::nullopt;
+}
+
+Result<Value> BytesFrom(std::string_view text)
+{
+    std::string_view const digits = Trimmed(text);
+    Bytes bytes;
+    for (std::size_t i = 0; i < digits.size(); i += 2)
+    {
+        auto const high = DigitOf(digits[i]);
+        auto const low = i + 1 < digits.size() ? DigitOf(digits[i + 1]) : std::nullopt;
+        if (!high || !low)
+            return Failure(NotANumber, text);
+        bytes.bytes += static_cast<char>(*high << 4 | *low);
+    }
+    return Value(std::move(bytes));
+}
+
+// One field of a list: what stands between two commas, and whether it was in quotes.
+struct Field
+{
+    std::string text;
+    bool isQuoted = false;
+};
+
+// Takes the field at the beginning of rest, with the comma behind it.
+Result<Field> TakeField(std::string_view& rest)
+{
+    std::string_view const whole = rest;
+    while (!rest.empty() && rest[0] == ' ')
+        rest.remove_prefix(1);
+    Field field;
+    if (rest.empty() || rest[0] != '"')
+    {
+        auto const comma = std::min(rest.find(','), rest.size());
+        field.text = Trimmed(rest.substr(0, comma));
+        rest.remove_prefix(comma);
+        return field.text.find('"') == std::string::npos ? Result<Field>(field) : Failure(BadList, whole);
+    }
+    field.isQuoted = true;
+    for (rest.remove_prefix(1);; rest.remove_prefix(1))
+    {
+        if (rest.empty())
+            return Failure(BadList, whole);
+        if (rest[0] == '"')
+        {
+            rest.remove_prefix(1);
+            if (rest.empty() || rest[0] != '"')
+                break;
+        }
+        field.text += rest[0];
+    }
+    while (!rest.empty() && rest[0] == ' ')
+        rest.remove_prefix(1);
+    return rest.empty() || rest[0] == ',' ? Result<Field>(field) : Failure(BadList, whole);
+}
+
+Result<Value> ListFrom(std::string_view text, PARAM_TYPE elementType)
+{
+    List list;
+    std::string_view rest = text;
+    for (int pos = 0; !Trimmed(rest).empty() || pos > 0; ++pos)
+    {
+        Result<Field> const field = TakeField(rest);
+        if (!field)
+            return field.GetError();
+        if (field->isQuoted || !field->text.empty())
+        {
+            Result<Value> value = FromText(field->text, elementType);
+            if (!value)
+                return value;
+            list.push_back({pos, *std::move(value)});
+        }
+        if (rest.empty())
+            break;
+        rest.remove_prefix(1);  // the comma
+    }
+    return Value(std::move(list));
+}
+
+// The number as a To, if it is one; compared without a conversion that could be undefined.
+template <typename To, typename From>
+std::optional<To> Exactly(From from)
+{
+    if constexpr (std::is_same_v<From, double> && std::is_same_v<To, double>)
+        return from;
+    else if constexpr (std::is_same_v<From, double>)
+    {
+        constexpr double Beyond = 2.0 * static_cast<double>(To{1} << (std::numeric_limits<To>::digits - 1));
+        constexpr double Lowest = std::is_signed_v<To> ? -Beyond : 0;
+        if (!(from >= Lowest && from < Beyond) || std::trunc(from) != from)
+            return std::nullopt;
+        return static_cast<To>(from);
+    }
+    else if constexpr (std::is_same_v<To, double>)
+    {
+        auto const to = static_cast<double>(from);
+        return Exactly<From>(to) == from ? std::optional<To>(to) : std::nullopt;
+    }
+    else
+    {
+        auto const to = static_cast<To>(from);
+        bool const isSame = static_cast<From>(to) == from && (to < To{}) == (from < From{});
+        return isSame ? std::optional<To>(to) : std::nullopt;
+    }
+}
+
+template <typename T>
+Result<T> Converted(Value const& value)
+{
+    return std::visit(
+        [&value](auto const& held) -> Result<T>
+        {
+            using Held = std::decay_t<decltype(held)>;
+            if constexpr (std::is_same_v<T, std::string>)
+                return ToText(value);
+            else if constexpr (std::is_same_v<Held, T>)
+                return held;
+            else if constexpr (IsNumber<Held> && IsNumber<T>)
+            {
+                if (auto const number = Exactly<T>(held))
+                    return *number;
+                return Failure(OutOfRange, ToText(value));
+            }
+            else
+                return Failure(WrongType, ToText(value));
+        },
+        static_cast<Value::variant const&>(value));
+}
+
+template <typename T>
+Result<std::vector<T>> AllOf(List const& list)
+{
+    std::vector<T> all;
+    for (Element const& element : list)
+    {
+        if (element.pos != static_cast<int>(all.size()))
+            return Failure(WrongType, ListText(list));
+        Result<T> one = As<T>(element.value);
+        if (!one)
+            return one.GetError();
+        all.push_back(*std::move(one));
+    }
+    return all;
+}
+}  // namespace
+
+bool operator==(Pointer left, Pointer right) { return left.address == right.address; }
+bool operator==(Bytes const& left, Bytes const& right) { return left.bytes == right.bytes; }
+bool operator==(Element const& left, Element const& right)
+{
+    return left.pos == right.pos && left.value == right.value;
+}
+
+bool operator==(Value const& left, Value const& right)
+{
+    if (left.Type() == PARAM_DOUBLE && right.Type() == PARAM_DOUBLE && std::isnan(std::get<double>(left)))
+        return std::isnan(std::get<double>(right));
+    return static_cast<Value::variant const&>(left) == static_cast<Value::variant const&>(right);
+}
+
+char const* NameOf(PARAM_TYPE type)
+{
+    static constexpr char const* Names[] = {"none",  "pointer", "int",   "double",   "text",
+                                            "bytes", "list",    "int64", "unsigned", "unsigned64"};
+    return type >= PARAM_NONE && type <= PARAM_UNSIGNED64 ? Names[type] : "unknown";
+}
+
+template <typename T>
+List MakeList(std::vector<T> const& values)
+{
+    List list;
+    for (T const& value : values)
+        list.push_back({static_cast<int>(list.size()), Value(value)});
+    return list;
+}
+
+std::string ToText(Value const& value)
+{
+    return std::visit(
+        [](auto const& held) -> std::string
+        {
+            using Held = std::decay_t<decltype(held)>;
+            if constexpr (IsNumber<Held>)
+                return NumberText(held);
+            else if constexpr (std::is_same_v<Held, std::string>)
+                return held;
+            else if constexpr (std::is_same_v<Held, Bytes>)
+                return HexText(held.bytes);
+            else if constexpr (std::is_same_v<Held, List>)
+                return ListText(held);
+            else if constexpr (std::is_same_v<Held, Pointer>)
+            {
+                char digits[32];
+                auto const address = reinterpret_cast<std::uintptr_t>(held.address);
+                return std::string("0x").append(digits,
+                                                std::to_chars(digits, std::end(digits), address, 16).ptr);
+            }
+            else
+                return {};
+        },
+        static_cast<Value::variant const&>(value));
+}
+
+Result<Value> FromText(std::string_view text, PARAM_TYPE type, PARAM_TYPE elementType)
+{
+    switch (type)
+    {
+    case PARAM_INT:
+        return NumberFrom<int>(text);
+    case PARAM_DOUBLE:
+        return NumberFrom<double>(text);
+    case PARAM_STRING:
+        return Value(std::string(text));
+    case PARAM_BINSTRING:
+        return BytesFrom(text);
+    case PARAM_INT64:
+        return NumberFrom<long long>(text);
+    case PARAM_UNSIGNED:
+        return NumberFrom<unsigned int>(text);
+    case PARAM_UNSIGNED64:
+        return NumberFrom<unsigned long long>(text);
+    case PARAM_COUNT:
+        return elementType == PARAM_COUNT ? Result<Value>(Failure(WrongType, text))
+                                          : ListFrom(text, elementType);
+    default:
+        return Failure(WrongType, text);
+    }
+}
+
+template <typename T>
+Result<T> As(Value const& value)
+{
+    if constexpr (std::is_same_v<T, std::string> || std::is_same_v<T, Bytes> || IsNumber<T>)
+        return Converted<T>(value);
+    else if (auto const* const list = std::get_if<List>(&value))
+        return AllOf<typename T::value_type>(*list);
+    else
+    {
+        Result<typename T::value_type> one = As<typename T::value_type>(value);
+        return one ? Result<T>(T{*std::move(one)}) : Result<T>(one.GetError());
+    }
+}
+
+// NOLINTBEGIN(bugprone-macro-parentheses): T is a type
+#define COMGUI_CLIENT_VALUE(T)                                                                               \
+    template COMGUI_EXPORT List MakeList(std::vector<T> const&);                                             \
+    template COMGUI_EXPORT Result<T> As(Value const&);                                                       \
+    template COMGUI_EXPORT Result<std::vector<T>> As(Value const&);
+COMGUI_CLIENT_VALUE(int)
+COMGUI_CLIENT_VALUE(double)
+COMGUI_CLIENT_VALUE(std::string)
+COMGUI_CLIENT_VALUE(Bytes)
+COMGUI_CLIENT_VALUE(long long)
+COMGUI_CLIENT_VALUE(unsigned int)
+COMGUI_CLIENT_VALUE(unsigned long long)
+#undef COMGUI_CLIENT_VALUE
+// NOLINTEND(bugprone-macro-parentheses)
+}  // namespace comgui

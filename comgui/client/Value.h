@@ -1,0 +1,80 @@
+// Values of tickets, each as what it is. Plain values with no ties to a server.
+//
+// The alternatives of Value lie in the order of PARAM_TYPE, so that a value's index is its type on the wire.
+#pragma once
+
+#include "comgui/client/Result.h"
+#include "comgui/ticket/PARAM_TYPE.h"
+#include <string>
+#include <string_view>
+#include <variant>
+#include <vector>
+
+namespace comgui
+{
+// An address that means something only in the process it comes from.
+struct Pointer
+{
+    void* address = nullptr;
+};
+
+// Bytes of any kind, zeros included.
+struct Bytes
+{
+    std::string bytes;
+};
+
+struct Element;
+
+// Several values under one key, by ascending position. A position without an element is a gap.
+using List = std::vector<Element>;
+
+// std::monostate: no value.
+class COMGUI_EXPORT Value : public std::variant<std::monostate, Pointer, int, double, std::string, Bytes,
+                                                List, long long, unsigned int, unsigned long long>
+{
+public:
+    using variant::variant;
+
+    PARAM_TYPE Type() const { return static_cast<PARAM_TYPE>(index()); }  // PARAM_COUNT: a list
+    bool IsNone() const { return Type() == PARAM_NONE; }
+    bool IsList() const { return Type() == PARAM_COUNT; }
+};
+
+struct Element
+{
+    int pos;
+    Value value;
+};
+
+COMGUI_EXPORT bool operator==(Pointer left, Pointer right);
+COMGUI_EXPORT bool operator==(Bytes const& left, Bytes const& right);
+COMGUI_EXPORT bool operator==(Element const& left, Element const& right);
+
+// Equal values of one type; a double that is no number equals itself, so that a snapshot equals its copy.
+COMGUI_EXPORT bool operator==(Value const& left, Value const& right);
+inline bool operator!=(Value const& left, Value const& right) { return !(left == right); }
+
+// "int", "double", "text", "bytes", "int64", "unsigned", "unsigned64", "pointer", "list", "none".
+COMGUI_EXPORT char const* NameOf(PARAM_TYPE type);
+
+// The values at positions 0, 1, 2 ... T: any that As gives, but a vector.
+template <typename T>
+List MakeList(std::vector<T> const& values);
+
+// As text, UTF-8, that FromText reads back without loss. Numbers in the C locale, doubles in the shortest
+// form; bytes as hexadecimal digits in pairs; a list with ", " between its values, texts with a comma, a
+// quote or spaces at an end in quotes, and nothing for a gap; no value is the empty text.
+COMGUI_EXPORT std::string ToText(Value const& value);
+
+// The value of that type that a user has typed. For PARAM_COUNT the elements get the type elementType; the
+// empty text is the list without elements. Errors: NotANumber, OutOfRange, BadList, WrongType.
+COMGUI_EXPORT Result<Value> FromText(std::string_view text, PARAM_TYPE type,
+                                     PARAM_TYPE elementType = PARAM_STRING);
+
+// The value as a T: int, double, std::string, Bytes, long long, unsigned int, unsigned long long, or a
+// std::vector of one of them. Numbers change their type if that loses nothing; a std::string is ToText of any
+// value; a list without gaps becomes a vector, a single value a vector of one. Errors: WrongType, OutOfRange.
+template <typename T>
+Result<T> As(Value const& value);
+}  // namespace comgui

@@ -1,0 +1,93 @@
+#include "tests/client/TroubledPlugIn.h"
+
+#include "comgui/session/ComGUIModuleInterface.h"
+#include <CoreFoundation/CoreFoundation.h>
+#include <chrono>
+#include <cstring>
+#include <dlfcn.h>
+#include <string_view>
+#include <thread>
+
+extern "C"
+{
+    __attribute__((visibility("default"))) TROUBLE TroubledPlugInOrders;
+    __attribute__((visibility("default"))) void* TroubledPlugInFactory(CFAllocatorRef, CFUUIDRef);
+}
+
+namespace
+{
+TROUBLE& trouble = TroubledPlugInOrders;
+
+ComGUIModuleInterface real;
+ComGUIModuleInterface table;
+ComGUIModuleInterface* interface = &table;
+
+int QueryInterface(void*, COMGUI_UUID, void** out)
+{
+    *out = &interface;
+    return 0;
+}
+unsigned int Release(void*) { return 1; }
+
+int IsAlive(void* hInstance, char const* host, int port)
+{
+    return trouble.serverIsAway ? 105 : real.IsAliveEntry(hInstance, host, port);
+}
+
+int Login(void* hInstance, TLogin* login)
+{
+    std::this_thread::sleep_for(std::chrono::milliseconds(trouble.loginTakes));
+    if (trouble.loginsAreRefused)
+        return 42;
+    int const code = real.LoginEntry(hInstance, login);
+    if (code == 0)
+        trouble.sessionIsGone = false;
+    return code;
+}
+
+MTICKET_ACCESS const* GetClientContainer(void* hInstance, void* hSession)
+{
+    return trouble.hasNoContainer ? nullptr : real.GetClientContainerEntry(hInstance, hSession);
+}
+
+int SendCommand(void* hInstance, void* hSession, char const* command, int size, void* data)
+{
+    std::string_view const name = command;
+    if (name == "remote.system.isalive" && trouble.serverIsAway)
+        return 106;
+    if (name == "remote.system.isalive" && trouble.sessionIsGone)
+        return 103;
+    if (name == "local.set.callback" && trouble.refusesCallbacks)
+        return 101;
+    if (name.substr(0, 10) == "local.get." && trouble.knowsNoNewCommands)
+        return 111;
+    return real.SendCommandEntry(hInstance, hSession, command, size, data);
+}
+
+bool LoadReal(CFAllocatorRef allocator, CFUUIDRef type)
+{
+    void* const module = dlopen(COMGUI_REAL_MODULE, RTLD_NOW | RTLD_LOCAL);
+    auto const factory =
+        module ? reinterpret_cast<void* (*)(CFAllocatorRef, CFUUIDRef)>(dlsym(module, COMGUI_REAL_FACTORY))
+               : nullptr;
+    void* const instance = factory ? factory(allocator, type) : nullptr;
+    if (!instance)
+        return false;
+    // The plug-in's interface is its instance, too: the first word points at the table.
+    std::memcpy(&real, *static_cast<void**>(instance), sizeof real);
+    table = real;
+    table.QueryInterface = QueryInterface;
+    table.Release = Release;
+    table.IsAliveEntry = IsAlive;
+    table.LoginEntry = Login;
+    table.GetClientContainerEntry = GetClientContainer;
+    table.SendCommandEntry = SendCommand;
+    return true;
+}
+}  // namespace
+
+void* TroubledPlugInFactory(CFAllocatorRef allocator, CFUUIDRef type)
+{
+    static bool const isLoaded = LoadReal(allocator, type);
+    return isLoaded ? &interface : nullptr;
+}

@@ -1,0 +1,313 @@
+// Events as subscribers hear them.
+#include "tests/client/Client.h"
+
+#include <algorithm>
+#include <atomic>
+#include <chrono>
+#include <future>
+#include <gmock/gmock.h>
+#include <thread>
+
+using namespace comgui;
+using namespace std::chrono_literals;
+using testing::ElementsAre;
+using testing::IsEmpty;
+
+namespace
+{
+class EventsOfAClient : public Client
+{
+protected:
+    EventsOfAClient() { LogIn(); }
+
+    // Short words for events, "created 3/1", in the order of their arrival.
+    Subscription Listen(Interest interest, std::chrono::milliseconds interval = 1ms)
+    {
+        return connection.Subscribe(
+            std::move(interest), queue.GetExecutor(),
+            [this](Event const& event) { heard.push_back(WordsOf(event)); }, interval);
+    }
+
+    // Runs the queue until there are so many events, and a while longer, for one too many.
+    void Hear(std::size_t count)
+    {
+        for (auto const end = Clock::now() + 20s; heard.size() < count && Clock::now() < end;)
+            queue.RunFor(5ms);
+        queue.RunFor(50ms);
+    }
+
+    static std::string WordsOf(Event const& event)
+    {
+        return std::visit(
+            [](auto const& what) -> std::string
+            {
+                using What = std::decay_t<decltype(what)>;
+                if constexpr (std::is_same_v<What, TicketCreated>)
+                    return "created " + NameOf(what.ticket);
+                else if constexpr (std::is_same_v<What, TicketDeleted>)
+                    return "deleted " + NameOf(what.ticket);
+                else if constexpr (std::is_same_v<What, ManyTicketsChanged>)
+                    return "many " + std::to_string(what.type);
+                else if constexpr (std::is_same_v<What, ServerLost>)
+                    return "lost";
+                else if constexpr (std::is_same_v<What, ServerBack>)
+                    return what.isNewSession ? "back anew" : "back";
+                else if constexpr (std::is_same_v<What, TransferProgressed>)
+                    return "progress";
+                else if constexpr (std::is_same_v<What, TransferEnded>)
+                    return "ended";
+                else
+                {
+                    std::string words = "changed " + NameOf(what.ticket) + (what.isWhole ? " whole" : "");
+                    for (KeyChange const& change : what.keys)
+                        words += " " + change.key + "=" + (change.value ? ToText(*change.value) : "?");
+                    return words;
+                }
+            },
+            event);
+    }
+
+    static std::string NameOf(TicketAddress ticket)
+    {
+        return std::to_string(ticket.type) + "/" + std::to_string(ticket.id);
+    }
+
+    using Clock = std::chrono::steady_clock;
+    TaskQueue queue;
+    std::vector<std::string> heard;
+};
+}  // namespace
+
+TEST_F(EventsOfAClient, ComeForATicketsWholeLife)
+{
+    auto const subscription = Listen(Interest::InTypes({JobTickets}), 0ms);
+    TicketAddress const job = NewTicket();
+    Hear(1);
+    ASSERT_TRUE(tickets.Write(job, "Job/Copies", 3));
+    Hear(2);
+    ASSERT_TRUE(tickets.Write(job, "Job/Copies", Value()));
+    Hear(3);
+    ASSERT_TRUE(tickets.Delete(job));
+    Hear(4);
+    std::string const name = NameOf(job);
+    EXPECT_THAT(heard, ElementsAre("created " + name, "changed " + name + " Job/Copies=3",
+                                   "changed " + name + " Job/Copies=", "deleted " + name));
+}
+
+TEST_F(EventsOfAClient, CarryWholeLists_ButNotTheirParts)
+{
+    TicketAddress const job = NewTicket();
+    auto const subscription = Listen(Interest::InTickets({job}), 0ms);
+    ASSERT_TRUE(tickets.Write(job, "List", MakeList<int>({1, 2, 3})));
+    Hear(1);
+    ASSERT_TRUE(tickets.Write(job, "List", 9, 1));
+    Hear(2);
+    EXPECT_THAT(
+        heard, ElementsAre("changed " + NameOf(job) + " List=1, 2, 3", "changed " + NameOf(job) + " List=?"));
+}
+
+TEST_F(EventsOfAClient, AreThoseOfTheInterest)
+{
+    TicketAddress const job = NewTicket();
+    TicketAddress const other = NewTicket();
+    auto const subscription = Listen(Interest::InTickets({job}, {"Job/State", "Page/*"}));
+    for (TicketAddress const ticket : {other, job})
+        (void)tickets.WriteAll(ticket, {{"Job/Copies", 1}, {"Job/State", 2}, {"Page/1", 3}, {"Page", 4}});
+    Hear(1);
+    EXPECT_THAT(heard, ElementsAre("changed " + NameOf(job) + " Job/State=2 Page/1=3"));
+}
+
+TEST_F(EventsOfAClient, OfTwoSubscriptions_GoToBoth_AndEachKeyOnceToEach)
+{
+    TicketAddress const job = NewTicket();
+    std::vector<std::string> second;
+    auto const one = Listen(Interest::InTypes({JobTickets}, {"A"}));
+    auto const both = connection.Subscribe(
+        {{JobTickets}, {job}, {}, false}, queue.GetExecutor(),
+        [&second](Event const& event) { second.push_back(WordsOf(event)); }, 1ms);
+    (void)tickets.WriteAll(job, {{"A", 1}, {"B", 2}});
+    Hear(1);
+    EXPECT_THAT(heard, ElementsAre("changed " + NameOf(job) + " A=1"));
+    EXPECT_THAT(second, ElementsAre("changed " + NameOf(job) + " A=1 B=2"));
+}
+
+TEST_F(EventsOfAClient, GoOn_WhenAnotherSubscriptionEnds)
+{
+    TicketAddress const job = NewTicket();
+    auto const stays = Listen(Interest::InTickets({job}));
+    {
+        auto const ends = Listen(Interest::InTypes({JobTickets}));
+    }
+    ASSERT_TRUE(tickets.Write(job, "A", 1));
+    Hear(1);
+    EXPECT_THAT(heard, ElementsAre("changed " + NameOf(job) + " A=1"));
+}
+
+TEST_F(EventsOfAClient, OfABurst_ArePutTogether)
+{
+    TicketAddress const job = NewTicket();
+    auto const subscription = Listen(Interest::InTickets({job}), 20ms);
+    for (int i = 1; i <= 2000; ++i)
+        ASSERT_TRUE(tickets.Write(job, i % 2 == 0 ? "Even" : "Odd", i));
+    std::string const last = "changed " + NameOf(job) + " Even=2000 Odd=1999";
+    Hear(1);
+    EXPECT_LT(heard.size(), 100u);
+    ASSERT_FALSE(heard.empty());
+    EXPECT_EQ(heard.back(), last);
+}
+
+TEST_F(EventsOfAClient, OfAHandlerThatIsBusy_Wait)
+{
+    TicketAddress const job = NewTicket();
+    auto const subscription = Listen(Interest::InTickets({job}), 0ms);
+    for (int i = 1; i <= 100; ++i)
+        ASSERT_TRUE(tickets.Write(job, "A", i));
+    std::this_thread::sleep_for(50ms);  // the queue has one task by now
+    Hear(1);
+    EXPECT_EQ(heard.back(), "changed " + NameOf(job) + " A=100");
+    EXPECT_LE(heard.size(), 2u);
+}
+
+// --- the end of subscriptions
+
+TEST_F(EventsOfAClient, AfterTheEndOfASubscription_DoNotCome)
+{
+    TicketAddress const job = NewTicket();
+    auto subscription = Listen(Interest::InTickets({job}), 0ms);
+    ASSERT_TRUE(tickets.Write(job, "A", 1));
+    std::this_thread::sleep_for(50ms);  // posted, but not run
+    subscription.End();
+    ASSERT_TRUE(tickets.Write(job, "A", 2));
+    queue.RunFor(100ms);
+    EXPECT_THAT(heard, IsEmpty());
+}
+
+TEST_F(EventsOfAClient, EndOfASubscription_WaitsForItsHandler)
+{
+    TicketAddress const job = NewTicket();
+    std::promise<void> begun;
+    std::atomic<bool> isDone = false;
+    auto subscription = connection.Subscribe(Interest::InTickets({job}), queue.GetExecutor(),
+                                             [&](Event const&)
+                                             {
+                                                 begun.set_value();
+                                                 std::this_thread::sleep_for(100ms);
+                                                 isDone = true;
+                                             });
+    std::thread runner([this] { queue.Run(); });
+    ASSERT_TRUE(tickets.Write(job, "A", 1));
+    begun.get_future().wait();
+    subscription.End();
+    EXPECT_TRUE(isDone);
+    queue.Stop();
+    runner.join();
+}
+
+TEST_F(EventsOfAClient, Subscription_MayEndInItsOwnHandler)
+{
+    TicketAddress const job = NewTicket();
+    Subscription subscription;
+    int calls = 0;
+    subscription = connection.Subscribe(
+        Interest::InTickets({job}), queue.GetExecutor(),
+        [&](Event const&)
+        {
+            ++calls;
+            subscription.End();
+        },
+        0ms);
+    ASSERT_TRUE(tickets.Write(job, "A", 1));
+    queue.RunFor(100ms);
+    ASSERT_TRUE(tickets.Write(job, "A", 2));
+    queue.RunFor(100ms);
+    EXPECT_EQ(calls, 1);
+}
+
+TEST_F(EventsOfAClient, Handler_MayLogOut)
+{
+    TicketAddress const job = NewTicket();
+    Outcome loggedOut = Error{};
+    auto const subscription = connection.Subscribe(
+        Interest::InTickets({job}), queue.GetExecutor(),
+        [&](Event const&) { loggedOut = connection.LogOut(); }, 0ms);
+    ASSERT_TRUE(tickets.Write(job, "A", 1));
+    for (auto const end = Clock::now() + 20s; !loggedOut && Clock::now() < end;)
+        queue.RunFor(10ms);
+    EXPECT_TRUE(loggedOut);
+}
+
+// --- sessions
+
+TEST_F(EventsOfAClient, OfAnOldSession_NeverArrive_AndTheInterestLasts)
+{
+    TicketAddress const job = NewTicket();
+    auto const subscription = Listen(Interest::InTickets({job}), 0ms);
+    ASSERT_TRUE(tickets.Write(job, "A", 1));
+    std::this_thread::sleep_for(50ms);
+    ASSERT_TRUE(connection.LogOut());
+    LogIn();
+    queue.RunFor(100ms);
+    EXPECT_THAT(heard, IsEmpty());
+    ASSERT_TRUE(tickets.Write(job, "A", 2));
+    Hear(1);
+    EXPECT_THAT(heard, ElementsAre("changed " + NameOf(job) + " A=2"));
+}
+
+TEST_F(EventsOfAClient, BeforeALogin_CanBeSubscribedTo)
+{
+    TicketAddress const job = NewTicket();
+    ASSERT_TRUE(connection.LogOut());
+    auto const subscription = Listen(Interest::InTickets({job}));
+    LogIn();
+    ASSERT_TRUE(tickets.Write(job, "A", 3));
+    Hear(1);
+    EXPECT_THAT(heard, ElementsAre("changed " + NameOf(job) + " A=3"));
+}
+
+TEST_F(EventsOfAClient, OfAnotherConnection_AreHeard)
+{
+    TicketAddress const job = NewTicket();
+    auto const subscription = Listen(Interest::InTickets({job}));
+    Connection other;
+    ASSERT_TRUE(other.LogIn(Here(), Admin()));
+    ASSERT_TRUE(other.GetTickets().Write(job, "A", 4));
+    Hear(1);
+    EXPECT_THAT(heard, ElementsAre("changed " + NameOf(job) + " A=4"));
+}
+
+// --- executors
+
+TEST_F(EventsOfAClient, Queue_ThatIsGone_TakesNothing)
+{
+    TicketAddress const job = NewTicket();
+    auto gone = std::make_unique<TaskQueue>();
+    auto const subscription = connection.Subscribe(
+        Interest::InTickets({job}), gone->GetExecutor(), [](Event const&) { FAIL(); }, 0ms);
+    gone.reset();
+    ASSERT_TRUE(tickets.Write(job, "A", 1));
+    queue.RunFor(50ms);
+}
+
+TEST(TaskQueue, RunsTasksInTheirOrder_UntilStopped)
+{
+    TaskQueue queue;
+    std::string order;
+    auto const post = queue.GetExecutor();
+    post([&] { order += "a"; });
+    post(
+        [&]
+        {
+            order += "b";
+            post(
+                [&]
+                {
+                    order += "c";
+                    queue.Stop();
+                });
+        });
+    queue.Run();
+    EXPECT_EQ(order, "abc");
+    post([&] { order += "d"; });
+    queue.RunFor(1ms);
+    EXPECT_EQ(order, "abcd");
+}

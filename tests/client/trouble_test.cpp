@@ -1,0 +1,211 @@
+// What the kit makes of a plug-in and a server that do not do as they should.
+#include "tests/client/Client.h"
+
+#include "comgui/comgui.h"
+#include "tests/client/TroubledPlugIn.h"
+#include "tests/support/BundleOnDisk.h"
+#include <chrono>
+#include <dlfcn.h>
+#include <gmock/gmock.h>
+#include <memory>
+
+using namespace comgui;
+using namespace std::chrono_literals;
+using testing::ElementsAre;
+using testing::HasSubstr;
+using testing::IsEmpty;
+
+namespace
+{
+class TroubledClient : public Client
+{
+protected:
+    TroubledClient() : bundle(folder.Path())
+    {
+        bundle.LinkExecutable(COMGUI_TROUBLED_PLUGIN);
+        bundle.AddFactory(COMGUI_PLUGIN_TYPE_UUID, "11111111-2222-3333-4444-555555555555",
+                          "TroubledPlugInFactory");
+        UtilityObjects::SetPlugInsFolder(folder.Path().native());
+        std::destroy_at(&trouble);  // orders of a test before, in the same process
+        std::construct_at(&trouble);
+    }
+
+    // Words for what happens at the server until there are so many.
+    std::vector<std::string> Hear(std::size_t count)
+    {
+        for (auto const end = Clock::now() + 20s; heard.size() < count && Clock::now() < end;)
+            queue.RunFor(5ms);
+        return heard;
+    }
+
+    Subscription Listen()
+    {
+        return connection.Subscribe({}, queue.GetExecutor(),
+                                    [this](Event const& event)
+                                    {
+                                        if (auto const* const lost = std::get_if<ServerLost>(&event))
+                                            heard.push_back("lost: " + lost->error.Text());
+                                        else if (auto const* const back = std::get_if<ServerBack>(&event))
+                                            heard.push_back(back->isNewSession ? "back anew" : "back");
+                                    });
+    }
+
+    using Clock = std::chrono::steady_clock;
+    BundleOnDisk bundle;
+    TROUBLE& trouble = *static_cast<TROUBLE*>(
+        dlsym(dlopen(COMGUI_TROUBLED_PLUGIN, RTLD_NOW | RTLD_LOCAL), "TroubledPlugInOrders"));
+    TaskQueue queue;
+    std::vector<std::string> heard;
+};
+}  // namespace
+
+TEST_F(TroubledClient, ServerThatIsLost_AndBack_IsAnEvent)
+{
+    LogIn();
+    auto const subscription = Listen();
+    trouble.serverIsAway = true;
+    EXPECT_THAT(Hear(1), ElementsAre("lost: localhost:50000: no server answers"));
+    EXPECT_FALSE(connection.IsServerThere());
+    EXPECT_TRUE(connection.IsLoggedIn());
+    trouble.serverIsAway = false;
+    EXPECT_EQ(Hear(2).back(), "back");
+    EXPECT_TRUE(connection.IsServerThere());
+}
+
+// As docs/client-kit.md shows it.
+TEST_F(TroubledClient, SnippetOfTheLossOfAServer_ShowsIt)
+{
+    std::vector<std::string> shown;
+    auto const Show = [&shown](std::string const& text) { shown.push_back(text); };
+    auto const readAnew = [&Show] { Show("read anew"); };
+    // [server-lost]
+    auto const subscription =
+        connection.Subscribe({}, queue.GetExecutor(),
+                             [&](Event const& event)
+                             {
+                                 if (auto const* const lost = std::get_if<ServerLost>(&event))
+                                     Show(lost->error.Text());  // "localhost:50000: no server answers"
+                                 else if (auto const* const back = std::get_if<ServerBack>(&event))
+                                 {
+                                     Show("The server is back");
+                                     if (back->isNewSession)
+                                         readAnew();
+                                 }
+                             });
+    // [/server-lost]
+    LogIn();
+    auto const hear = [&](std::size_t count)
+    {
+        for (auto const end = Clock::now() + 20s; shown.size() < count && Clock::now() < end;)
+            queue.RunFor(5ms);
+    };
+    trouble.serverIsAway = true;
+    hear(1);
+    trouble.serverIsAway = false;
+    hear(2);
+    EXPECT_THAT(shown, ElementsAre("localhost:50000: no server answers", "The server is back"));
+    trouble.sessionIsGone = true;
+    hear(5);
+    EXPECT_EQ(shown.back(), "read anew");
+}
+
+TEST_F(TroubledClient, SessionThatIsGone_IsReplaced_AndSubscriptionsGoOn)
+{
+    LogIn();
+    auto const subscription = Listen();
+    trouble.sessionIsGone = true;
+    EXPECT_THAT(Hear(2), ElementsAre(HasSubstr("lost"), "back anew"));
+    int changes = 0;
+    TicketAddress const job = NewTicket();
+    auto const hears = connection.Subscribe(
+        Interest::InTickets({job}), queue.GetExecutor(),
+        [&](Event const& event) { changes += std::holds_alternative<TicketChanged>(event) ? 1 : 0; });
+    ASSERT_TRUE(tickets.Write(job, "A", 1));
+    for (auto const end = Clock::now() + 20s; changes == 0 && Clock::now() < end;)
+        queue.RunFor(5ms);
+    EXPECT_EQ(changes, 1);
+    EXPECT_TRUE(connection.LogOut());
+}
+
+TEST_F(TroubledClient, LogoutWhileTheSessionIsReplaced_LeavesNone)
+{
+    LogIn();
+    auto const subscription = Listen();
+    trouble.loginTakes = 500;
+    trouble.sessionIsGone = true;
+    ASSERT_THAT(Hear(1), ElementsAre(HasSubstr("lost")));  // the new login is under way
+    ASSERT_TRUE(connection.LogOut());
+    EXPECT_FALSE(connection.IsLoggedIn());
+    EXPECT_EQ(CodeOf(tickets.List(SystemTickets)), NotLoggedIn);
+    trouble.loginTakes = 0;
+}
+
+TEST_F(TroubledClient, SessionThatCannotBeReplaced_IsLost_UntilItCan)
+{
+    LogIn();
+    auto const subscription = Listen();
+    trouble.loginsAreRefused = true;
+    trouble.sessionIsGone = true;
+    EXPECT_THAT(Hear(1), ElementsAre(HasSubstr("lost")));
+    queue.RunFor(1500ms);
+    EXPECT_EQ(heard.size(), 1u);
+    trouble.loginsAreRefused = false;
+    EXPECT_THAT(Hear(2), ElementsAre(HasSubstr("lost"), "back anew"));
+}
+
+TEST_F(TroubledClient, LoginWithoutAServer_IsAFailure_AndALaterOneWorks)
+{
+    trouble.serverIsAway = true;
+    EXPECT_EQ(CodeOf(connection.LogIn(Here(), Admin())), ServerAway);
+    trouble.serverIsAway = false;
+    LogIn();
+}
+
+TEST_F(TroubledClient, SessionWithoutTickets_IsAFailure_AndLeavesNoSession)
+{
+    trouble.hasNoContainer = true;
+    EXPECT_EQ(CodeOf(connection.LogIn(Here(), Admin())), NoContainer);
+    EXPECT_FALSE(connection.IsLoggedIn());
+    trouble.hasNoContainer = false;
+    LogIn();
+    EXPECT_EQ(connection.LocalEndPoint(), "127.0.0.1:50106");
+}
+
+TEST_F(TroubledClient, CallbackThatIsRefused_IsAFailure)
+{
+    trouble.refusesCallbacks = true;
+    EXPECT_EQ(CodeOf(connection.LogIn(Here(), Admin())), CallbackRefused);
+    EXPECT_FALSE(connection.IsLoggedIn());
+}
+
+TEST_F(TroubledClient, CodeOfAForeignPlugIn_HasAText)
+{
+    trouble.loginsAreRefused = true;
+    trouble.knowsNoNewCommands = true;
+    EXPECT_EQ(connection.LogIn(Here(), Admin()).GetError().Text(), "admin: the server refuses, with code 42");
+}
+
+TEST_F(TroubledClient, PlugInWithoutProgress_StillCarriesFiles)
+{
+    trouble.knowsNoNewCommands = true;
+    LogIn();
+    auto const transfer = connection.GetTransfers().Put(folder.Write("a", "four").string(), "$(TEMP)/a");
+    EXPECT_TRUE(transfer.Wait());
+    EXPECT_EQ(transfer.Progress().done, 4);
+}
+
+TEST_F(TroubledClient, PlugInThatIsNotThere_IsAFailure_UntilItIs)
+{
+    UtilityObjects::SetPlugInsFolder((folder / "nowhere").native());
+    testing::internal::CaptureStderr();
+    Outcome const missing = connection.FindPlugIn();
+    testing::internal::GetCapturedStderr();
+    ASSERT_EQ(CodeOf(missing), NoPlugIn);
+    EXPECT_THAT(missing.GetError().about, HasSubstr("nowhere/ComGUI.Bundle"));
+    testing::internal::CaptureStderr();
+    EXPECT_EQ(CodeOf(connection.LogIn(Here(), Admin())), NoPlugIn);
+    testing::internal::GetCapturedStderr();
+    UtilityObjects::SetPlugInsFolder(folder.Path().native());
+    EXPECT_TRUE(connection.FindPlugIn());
+    LogIn();
+}
