@@ -1,5 +1,6 @@
-#include "examples/FormCommands.h"
+#include "FormCommands.h"
 
+#include "Shown.h"
 #include <algorithm>
 #include <cstdio>
 #include <cstdlib>
@@ -29,7 +30,11 @@ void Print(std::string const& line)
         std::quick_exit(Trouble);
 }
 
-std::string Raw(Json const& value) { return value.is_string() ? value.get<std::string>() : Line(value); }
+// A text without the quotes and backslashes of JSON.
+std::string Plain(Json const& value)
+{
+    return value.is_string() ? Shown(value.get_ref<std::string const&>()) : Line(value);
+}
 
 void ListType(SESSION const& session, int type, Json& all)
 {
@@ -81,11 +86,11 @@ void PrintFields(Json const& fields)
 {
     std::size_t widest = 0;
     for (Json const& field : fields)
-        widest = std::max(widest, Shown(Raw(field["key"])).size());
+        widest = std::max(widest, Plain(field["key"]).size());
     for (Json const& field : fields)
     {
-        std::string key = Shown(Raw(field["key"]));
-        std::string type = field.contains("of") ? Raw(field["of"]) + " list" : Raw(field["type"]);
+        std::string key = Plain(field["key"]);
+        std::string type = field.contains("of") ? Plain(field["of"]) + " list" : Plain(field["type"]);
         key.resize(widest, ' ');
         type.resize(std::max<std::size_t>(type.size(), 15), ' ');
         Print(Bold(key) + "  " + Dim(type) + "  " + Line(field["value"]));
@@ -115,21 +120,13 @@ void Get(SESSION const& session, OPTIONS const& options)
     FIELD const field = form.Field(options.key);
     Json const value = options.pos == WholeKey ? form.Value(field) : form.Value(field, options.pos);
     if (options.json || !value.is_array())
-        return Print(options.json ? Line(value) : Raw(value));
+        return Print(options.json ? Line(value) : Plain(value));
     for (Json const& element : value)
-        Print(element.is_null() ? "" : Raw(element));
+        Print(element.is_null() ? "" : Plain(element));
 }
 
 namespace
 {
-std::pair<std::string, std::string> SplitField(std::string const& field)
-{
-    std::size_t const equals = field.find('=');
-    if (equals == std::string::npos || equals == 0)
-        throw Refusal(Quoted(field) + " is not KEY=VALUE");
-    return {field.substr(0, equals), field.substr(equals + 1)};
-}
-
 // The type for a new value: the one that was asked for, or the one that is there.
 PARAM_TYPE TypeFor(TicketForm const& form, std::string const& key, OPTIONS const& options, bool isList)
 {

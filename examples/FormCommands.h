@@ -1,8 +1,8 @@
 // What ticket_form can do once it is logged in, one function a command. A Refusal tells what cannot be done.
 #pragma once
 
-#include "examples/ServerSession.h"
-#include "examples/TicketForm.h"
+#include "ServerSession.h"
+#include "TicketForm.h"
 #include <string>
 #include <vector>
 

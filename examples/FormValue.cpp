@@ -1,5 +1,6 @@
-#include "examples/FormValue.h"
+#include "FormValue.h"
 
+#include "Shown.h"
 #include <algorithm>
 #include <cctype>
 #include <charconv>
@@ -7,13 +8,7 @@
 #include <cstdlib>
 #include <limits>
 
-std::string Quoted(std::string text)
-{
-    bool const isUtf8 = text.empty() || !wxString::FromUTF8(text.c_str()).empty();
-    std::replace_if(
-        text.begin(), text.end(), [=](unsigned char c) { return c < ' ' || (c > '~' && !isUtf8); }, '?');
-    return "\"" + text + "\"";
-}
+std::string Quoted(std::string const& text) { return "\"" + Shown(text) + "\""; }
 
 namespace
 {
@@ -169,6 +164,14 @@ void AddValue(SETMULTIPAR_LIST& list, std::string const& key, PARAM_TYPE type, s
     default:
         Refuse(key, type, text);
     }
+}
+
+std::pair<std::string, std::string> SplitField(std::string const& field)
+{
+    std::size_t const equals = field.find('=');
+    if (equals == std::string::npos || equals == 0)
+        throw Refusal(Quoted(field) + " is not KEY=VALUE");
+    return {field.substr(0, equals), field.substr(equals + 1)};
 }
 
 std::vector<std::string> SplitList(std::string const& key, std::string const& text)

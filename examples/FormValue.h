@@ -4,6 +4,7 @@
 #include <comgui/comgui.h>
 #include <stdexcept>
 #include <string>
+#include <utility>
 #include <vector>
 
 // What was asked for cannot be: no such ticket or key, a value that does not fit, a write that was refused.
@@ -12,8 +13,8 @@ struct Refusal : std::runtime_error
     using std::runtime_error::runtime_error;
 };
 
-// In quotes, and as it can stand within a line.
-std::string Quoted(std::string text);
+// As Shown has it, in quotes.
+std::string Quoted(std::string const& text);
 
 // "int", "double", "text" and so on; of types that cannot be written here, too.
 char const* NameOf(int type);
@@ -27,6 +28,9 @@ std::string WhatItTakes(PARAM_TYPE type);
 // Adds the value of a key; throws a Refusal if the text is none of the type.
 void AddValue(SETMULTIPAR_LIST& list, std::string const& key, PARAM_TYPE type, std::string const& text,
               int pos);
+
+// Key and value; throws a Refusal if there is no = or no key.
+std::pair<std::string, std::string> SplitField(std::string const& field);
 
 // The values between the commas. Quotes around a value keep its commas; a quote within them is written twice.
 // The empty text is the list without values. Throws a Refusal, which names the key, for a quote that stands

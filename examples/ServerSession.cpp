@@ -1,8 +1,10 @@
-#include "examples/ServerSession.h"
+#include "ServerSession.h"
 
+#include "Shown.h"
 #include <algorithm>
 #include <atomic>
 #include <cerrno>
+#include <charconv>
 #include <cstdio>
 #include <cstdlib>
 #include <cstring>
@@ -116,12 +118,39 @@ std::optional<int> ParseCommandLine(wxCmdLineParser& parser)
     return FlushOutput() ? Good : Trouble;
 }
 
+std::optional<int> WholeNumber(std::string const& text, int least, int largest)
+{
+    int number = 0;
+    auto const [end, error] = std::from_chars(text.data(), text.data() + text.size(), number);
+    if (error != std::errc() || end != text.data() + text.size() || number < least || number > largest)
+        return std::nullopt;
+    return number;
+}
+
+std::string NumberFrom(int least, int largest, std::string const& given)
+{
+    return "a whole number from " + std::to_string(least) + " to " + std::to_string(largest) + ", not \"" +
+           given + "\"";
+}
+
+bool TakeNumber(wxCmdLineParser const& parser, char const* option, int& value, int least, int largest)
+{
+    wxString given;
+    if (!parser.Found(option, &given))
+        return true;
+    std::string const text = given.utf8_string();
+    auto const number = WholeNumber(text, least, largest);
+    value = number.value_or(value);
+    return number || Fail(std::string("--") + option + " takes " + NumberFrom(least, largest, text) + "; " +
+                          ProgramName + " --help tells how");
+}
+
 void SERVER::AddOptions(wxCmdLineParser& parser)
 {
     parser.AddOption("u", "user", "log in as this user (admin)");
     parser.AddOption("p", "password", "with this password (admin)");
     parser.AddOption("s", "server", "at this host (localhost)");
-    parser.AddOption("o", "port", "and port (50000)", wxCMD_LINE_VAL_NUMBER);
+    parser.AddOption("o", "port", "and port (50000)");
 }
 
 bool SERVER::TakeOptions(wxCmdLineParser const& parser)
@@ -129,15 +158,7 @@ bool SERVER::TakeOptions(wxCmdLineParser const& parser)
     parser.Found("user", &user);
     parser.Found("password", &password);
     parser.Found("server", &host);
-    parser.Found("port", &port);
-    return (port >= 1 && port <= 65535) || Fail("a port is a number from 1 to 65535");
-}
-
-std::string Shown(std::string text)
-{
-    std::replace_if(
-        text.begin(), text.end(), [](unsigned char c) { return c < ' ' || c == 0x7F; }, '?');
-    return text;
+    return TakeNumber(parser, "port", port, LeastPort, LargestPort);
 }
 
 bool Fail(std::string const& what)
@@ -170,9 +191,8 @@ bool IsPlugInThere()
         return true;
     wxString path;
     UtilityObjects::GetPlugInsPath(path, L"" COMGUI_BUNDLE_NAME);
-    std::fprintf(stderr, "%s: cannot open the communication plug-in %s: build or install it there\n",
-                 ProgramName, path.utf8_string().c_str());
-    return false;
+    return Fail("cannot open the communication plug-in " + path.utf8_string() +
+                ": build or install it there");
 }
 
 TLogin* NewRecord(char const* user, char const* password, SERVER const& server)
@@ -185,7 +205,7 @@ TLogin* NewRecord(char const* user, char const* password, SERVER const& server)
     stracpy(login->szUser, user, sizeof login->szUser);
     stracpy(login->szPassword, password, sizeof login->szPassword);
     stracpy(login->szServerHost, server.host.utf8_str(), sizeof login->szServerHost);
-    login->iServerPort = static_cast<int>(server.port);
+    login->iServerPort = server.port;
     return login;
 }
 
@@ -241,7 +261,7 @@ EventReceiver::EventReceiver(std::function<void(ServerNotificationEvent const&)>
     if (m_thread->Run() == wxTHREAD_NO_ERROR)
         return;
     Fail("cannot start a thread to hear events with");  // and would wait for its end for ever
-    std::exit(1);
+    std::exit(Trouble);
 }
 
 EventReceiver::~EventReceiver()

@@ -24,6 +24,20 @@ enum STATUS
 // program's name. Nothing if the program shall go on, or the status with which to end at once.
 std::optional<int> ParseCommandLine(wxCmdLineParser& parser);
 
+// The number that a text is: digits, with a sign only if it is negative. Nothing if it is none, or not in the
+// range.
+std::optional<int> WholeNumber(std::string const& text, int least, int largest);
+
+// What a number that was asked for must be, as the end of a sentence.
+std::string NumberFrom(int least, int largest, std::string const& given);
+
+// Takes the number of an option without a type, which keeps its value unless it was given. False, and says
+// why, if it is not in the range.
+bool TakeNumber(wxCmdLineParser const& parser, char const* option, int& value, int least, int largest);
+
+constexpr int LeastPort = 1;
+constexpr int LargestPort = 65535;
+
 // Where the server is, and as whom to log in.
 struct SERVER
 {
@@ -33,13 +47,11 @@ struct SERVER
     wxString user = "admin";
     wxString password = "admin";
     wxString host = "localhost";
-    long port = 50000;
+    int port = 50000;
 };
 
-// A text as it can stand within a line and on a terminal.
-std::string Shown(std::string text);
-
-// Says on stderr what went wrong, with the plug-in's code where it was the plug-in; always false.
+// Says on stderr what went wrong, on one line and harmless on a terminal, with the plug-in's code where it
+// was the plug-in; always false.
 bool Fail(std::string const& what);
 bool Fail(std::string const& what, int code);
 

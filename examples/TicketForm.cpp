@@ -1,5 +1,6 @@
-#include "examples/TicketForm.h"
+#include "TicketForm.h"
 
+#include "Shown.h"
 #include <algorithm>
 #include <set>
 
@@ -27,7 +28,10 @@ bool AddKey(void* keys, char const* key, PARAM_TYPE, void const*, int)
 }
 }  // namespace
 
-std::string Line(Json const& value) { return value.dump(-1, ' ', false, Json::error_handler_t::replace); }
+std::string Line(Json const& value)
+{
+    return Shown(value.dump(-1, ' ', false, Json::error_handler_t::replace));
+}
 
 TicketForm::TicketForm(ComGUIManager& manager, MTICKET_ACCESS const* container, int type, int id)
     : m_manager(manager), m_container(container), m_type(type), m_id(id),

@@ -3,7 +3,7 @@
 // Refusal.
 #pragma once
 
-#include "examples/FormValue.h"
+#include "FormValue.h"
 #include <nlohmann/json.hpp>
 #include <string>
 #include <vector>
@@ -11,7 +11,7 @@
 // A value, null where there is none; of a list all of its values.
 using Json = nlohmann::ordered_json;
 
-// As JSON on one line, whatever bytes the texts have.
+// As JSON on one line, harmless on a terminal, whatever bytes the texts have.
 std::string Line(Json const& value);
 
 struct FIELD

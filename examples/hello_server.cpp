@@ -11,9 +11,9 @@ int main()
     if (manager->Login("operator", "operator", "localhost", 50000) != 0)
         return 1;
 
-    char const* name = nullptr;  // the text belongs to the plug-in
-    if (manager->GetSystemTicketParamForKey("System/Name", PARAM_STRING, &name, -1) != 0)
-        std::printf("Logged in to %s\n", name);
+    int port = 0;
+    if (manager->GetSystemTicketParamForKey("System/MasterSOAPPort", PARAM_INT, &port, -1) != 0)
+        std::printf("Logged in to the server at port %d\n", port);
 
     int const copies = 25;
     manager->SetParameter(3, 1, "Job/Copies", PARAM_INT, &copies, -1);  // the ticket of job 1

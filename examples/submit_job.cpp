@@ -1,6 +1,7 @@
 // Sends files to a server as print jobs: announces each one, uploads it, shows how far it has come, waits
 // until the server says that the job is in, and prints its ticket.
-#include "examples/ServerSession.h"
+#include "ServerSession.h"
+#include "Shown.h"
 
 #include <algorithm>
 #include <cerrno>
@@ -23,6 +24,7 @@ char const ProgramName[] = "submit_job";
 namespace
 {
 constexpr int JobType = 3;
+constexpr int QueueType = 7;
 constexpr int ParameterChange = 1;  // the kind of such a notification
 constexpr int JobIsIn = 1;          // "Job/State" of a job whose file is there
 constexpr char const* EveryKey[] = {nullptr};
@@ -31,8 +33,8 @@ constexpr std::chrono::seconds EventsArriveWithin(10);
 struct OPTIONS
 {
     SERVER server;
-    long copies = 0;                 // 0: the job's ticket says nothing of copies
-    long queue = 0;                  // id of the queue's ticket; 0: none
+    int copies = 0;                  // 0: the job's ticket says nothing of copies
+    int queue = 0;                   // id of the queue's ticket; 0: none
     std::vector<std::string> files;  // UTF-8
 };
 
@@ -51,24 +53,18 @@ std::optional<int> Parse(int argc, char** argv, OPTIONS& options)
 
     wxCmdLineParser parser(argc, arguments.data());
     parser.SetLogo("Sends files to a server as print jobs.\n"
-                   "Exit status: 0 all of them are there; 1 one is not; 2 a wrong command line, no server, "
-                   "no login,\nor the output cannot be written.");
+                   "Exit status: 0 all of them are there; 1 one is not, or there is no such queue; 2 a wrong "
+                   "command line,\nno server, no login, or the output cannot be written.");
     parser.AddSwitch("h", "help", "show this text", wxCMD_LINE_OPTION_HELP);
     SERVER::AddOptions(parser);
-    parser.AddOption("c", "copies", "print so many copies", wxCMD_LINE_VAL_NUMBER);
-    parser.AddOption("q", "queue", "put the jobs into the queue of that number", wxCMD_LINE_VAL_NUMBER);
+    parser.AddOption("c", "copies", "print so many copies (0: as the server sees fit)");
+    parser.AddOption("q", "queue", "put the jobs into the queue of that number (0: into none)");
     parser.AddParam("FILE", wxCMD_LINE_VAL_STRING, wxCMD_LINE_PARAM_MULTIPLE);
     if (auto const status = ParseCommandLine(parser))
         return status;
-    if (!options.server.TakeOptions(parser))
+    if (!options.server.TakeOptions(parser) || !TakeNumber(parser, "copies", options.copies, 0, INT_MAX) ||
+        !TakeNumber(parser, "queue", options.queue, 0, INT_MAX))
         return Trouble;
-    parser.Found("copies", &options.copies);
-    parser.Found("queue", &options.queue);
-    if (std::min(options.copies, options.queue) < 0 || std::max(options.copies, options.queue) > INT_MAX)
-    {
-        Fail("the numbers of copies and of the queue are 0 or more");
-        return Trouble;
-    }
     for (std::size_t i = 0; i < parser.GetParamCount(); ++i)
         options.files.push_back(parser.GetParam(i).utf8_string());
     return std::nullopt;
@@ -198,7 +194,7 @@ bool PrintParameter(void* ticket, char const* key, PARAM_TYPE type, void const* 
     else if (type == PARAM_STRING)
         text =
             static_cast<STICKET_READ const*>(ticket)->Decode(static_cast<char const*>(value)).utf8_string();
-    std::printf("    %-36s %s\n", key, Shown(text).c_str());
+    std::printf("    %-36s %s\n", Shown(key).c_str(), Shown(text).c_str());
     return true;
 }
 
@@ -229,8 +225,7 @@ bool Submit(ComGUIManager& manager, OPTIONS const& options, std::string const& f
     if (auto const why = WhyNoJob(file, size))
         return Refuse(file, *why);
     // What the numbers say is the server's matter: here the queue and the copies.
-    int const job =
-        manager.PrepareJob(file, static_cast<int>(options.queue), 0, -1, static_cast<int>(options.copies), 0);
+    int const job = manager.PrepareJob(file, options.queue, 0, -1, options.copies, 0);
     if (job < 0)
         return Refuse(file, manager.IsServerOnline() ? "the server does not take a job of this name"
                                                      : "the server does not answer any more");
@@ -246,6 +241,21 @@ bool Submit(ComGUIManager& manager, OPTIONS const& options, std::string const& f
     PrintTicket(manager.GetClientContainer(), job);
     FlushOutput();
     return true;
+}
+
+// Whether the jobs can be put where they shall; a server may drop the number of a queue that it does not
+// have.
+bool IsQueueThere(ComGUIManager& manager, int queue)
+{
+    std::vector<int> ids;
+    MTICKET_READ::Of(manager.GetClientContainer())->GetTickets(QueueType, ids);
+    if (queue == 0 || std::find(ids.begin(), ids.end(), queue) != ids.end())
+        return true;
+    std::string known;
+    for (int const id : ids)
+        known += (known.empty() ? "" : ", ") + std::to_string(id);
+    return Fail("there is no queue " + std::to_string(queue) + "; there are " +
+                (known.empty() ? "none" : known));
 }
 
 // All files are tried, whatever becomes of one, or of the output.
@@ -291,7 +301,7 @@ int main(int argc, char** argv)
     TLogin* const login = NewRecord(server.user.utf8_str(), server.password.utf8_str(), server);
     if (!LogIn(*manager, login))
         return Trouble;
-    int const status = SubmitAll(*manager, login, options);
+    int const status = IsQueueThere(*manager, options.queue) ? SubmitAll(*manager, login, options) : Refused;
     manager->Logout();  // and no Uninitialize, which waits: the process ends here anyway
     return status;
 }

@@ -1,6 +1,6 @@
 // Shows and edits the tickets of a server in a terminal, as a form of a graphical client would. The command
 // line; the commands stand in a file of their own.
-#include "examples/FormCommands.h"
+#include "FormCommands.h"
 #include <CLI/CLI.hpp>
 #include <algorithm>
 #include <climits>
@@ -17,6 +17,46 @@ namespace
 constexpr int LargestPosition = 0xFFFFFF;
 constexpr int LargestId = 0xFFFFFF;
 
+// Decimal as people write it; CLI11 itself takes 010 for eight.
+CLI::Validator NumberIn(int least, int largest)
+{
+    return {[=](std::string& text)
+            {
+                auto const number = WholeNumber(text, least, largest);
+                if (!number)
+                    return NumberFrom(least, largest, text);
+                text = std::to_string(*number);
+                return std::string();
+            },
+            std::to_string(least) + " to " + std::to_string(largest)};
+}
+
+void CheckField(std::string const& text) { SplitField(text); }
+
+void CheckListField(std::string const& text)
+{
+    auto const [key, value] = SplitField(text);
+    SplitList(key, value);
+}
+
+// What is wrong whatever the server has is found before it is asked.
+CLI::Validator Checked(void (*check)(std::string const&))
+{
+    return {[=](std::string const& text)
+            {
+                try
+                {
+                    check(text);
+                    return std::string();
+                }
+                catch (Refusal const& refusal)
+                {
+                    return std::string(refusal.what());
+                }
+            },
+            ""};
+}
+
 class CommandLine
 {
 public:
@@ -31,7 +71,7 @@ public:
         m_app.add_option("-s,--server", m_options.host, "At this host")->capture_default_str();
         m_app.add_option("-o,--port", m_options.port, "And port")
             ->capture_default_str()
-            ->check(CLI::Range(1, 65535));
+            ->transform(NumberIn(LeastPort, LargestPort));
         m_app.add_flag("-j,--json", m_options.json, "Print JSON");
         m_app.footer(
             "A ticket is a TYPE and an ID, as 3 1 for job 1; types are 0 the system, 2 devices, 3 jobs, 7 "
@@ -53,10 +93,8 @@ public:
         m_app.parse(argc, argv);
         if (m_run)
             return std::nullopt;
-        std::fprintf(stderr,
-                     "%s: the command is missing (list, keys, get, set, set-list, delete or watch); "
-                     "ticket_form --help tells how\n",
-                     ProgramName);
+        Fail("the command is missing (list, keys, get, set, set-list, delete or watch); ticket_form --help "
+             "tells how");
         return Trouble;
     }
     catch (CLI::ParseError const& e)
@@ -68,7 +106,7 @@ public:
         }
         std::string text = e.what();
         std::replace(text.begin(), text.end(), '\n', ' ');
-        std::fprintf(stderr, "%s: %s; ticket_form --help tells how\n", ProgramName, text.c_str());
+        Fail(text + "; ticket_form --help tells how");
         return Trouble;
     }
 
@@ -89,12 +127,12 @@ private:
     CLI::Option* AddType(CLI::App* command)
     {
         return command->add_option("TYPE", m_options.type, "Type of ticket")
-            ->check(CLI::Range(0, TicketTypes - 1));
+            ->transform(NumberIn(0, TicketTypes - 1));
     }
 
     CLI::Option* AddId(CLI::App* command)
     {
-        return command->add_option("ID", m_options.id, "Its number")->check(CLI::Range(0, LargestId));
+        return command->add_option("ID", m_options.id, "Its number")->transform(NumberIn(0, LargestId));
     }
 
     void AddTicket(CLI::App* command)
@@ -105,7 +143,7 @@ private:
 
     void AddPosition(CLI::App* command, char const* description)
     {
-        command->add_option("--pos", m_options.pos, description)->check(CLI::Range(0, LargestPosition));
+        command->add_option("--pos", m_options.pos, description)->transform(NumberIn(0, LargestPosition));
     }
 
     void AddReading()
@@ -116,22 +154,25 @@ private:
                                           "Values are shown as JSON; null is a gap in a list.", Keys);
         AddTicket(keys);
         keys->add_option("PREFIX", m_options.key, "Only the keys that begin so");
-        CLI::App* const get =
-            AddCommand("get", "Print the value of a key",
-                       "A text is printed as it is, a list as one line a value, an empty one "
-                       "for a gap.\nFolders come as paths, without $(VARIABLE).",
-                       Get);
+        CLI::App* const get = AddCommand(
+            "get", "Print the value of a key",
+            "A text is printed without quotes, a list as one line a value, an empty one for a "
+            "gap.\nControl characters become \\n, \\t, \\x1B and so on; from --json a program gets "
+            "the text itself.\nFolders come as paths, without $(VARIABLE).",
+            Get);
         AddTicket(get);
         get->add_option("KEY", m_options.key, "As keys shows it")->required();
         AddPosition(get, "Only the value at this position of a list, from 0 up");
     }
 
-    void AddFields(CLI::App* command, char const* description)
+    void AddFields(CLI::App* command, char const* description, void (*check)(std::string const&))
     {
         AddTicket(command);
-        command->add_option("KEY=VALUE", m_options.fields, description)->required();
-        command->add_option("-t,--type", m_options.typeName,
-                            "int, double, text, int64, unsigned or unsigned64, for new keys or another type");
+        command->add_option("KEY=VALUE", m_options.fields, description)->required()->check(Checked(check));
+        command
+            ->add_option("-t,--type", m_options.typeName,
+                         "int, double, text, int64, unsigned or unsigned64, for new keys or another type")
+            ->check(Checked([](std::string const& name) { TypeOf(name); }));
     }
 
     void AddWriting()
@@ -139,7 +180,7 @@ private:
         CLI::App* const set = AddCommand(
             "set", "Write values, each by the type that its key has",
             "All values are checked before one is written. A key that is not there yet needs --type.", Set);
-        AddFields(set, "What to write");
+        AddFields(set, "What to write", CheckField);
         AddPosition(set, "Write this position of a list, from 0 up");
         AddFields(
             AddCommand("set-list", "Write whole lists",
@@ -147,7 +188,7 @@ private:
                        "Quotes keep\ncommas: KEY='a,\"b,c\"' are two values; a quote within quotes is "
                        "written twice.",
                        SetList),
-            "The key, and its values with commas between them");
+            "The key, and its values with commas between them", CheckListField);
         CLI::App* const remove =
             AddCommand("delete", "Delete a key, or one value of a list",
                        "Within a list a gap stays; at its end the list gets shorter.", Delete);
@@ -171,7 +212,7 @@ private:
         AddType(watch)->required();
         CLI::Option* const id = AddId(watch);
         watch->add_option("-n,--events", m_options.events, "End after so many; 0 is no limit")
-            ->check(CLI::Range(0, INT_MAX));
+            ->transform(NumberIn(0, INT_MAX));
         watch->add_flag("-e,--edit", m_options.edit, "Write lines KEY=VALUE of standard input meanwhile")
             ->needs(id);
     }
@@ -226,6 +267,6 @@ try
 }
 catch (std::exception const& e)
 {
-    std::fprintf(stderr, "ticket_form: %s\n", e.what());
+    Fail(e.what());
     return Trouble;
 }

@@ -1,9 +1,11 @@
 // Watches a server: logs in, asks to be told of all changes, prints each event as it comes, and leaves in
 // good order on Ctrl-C. With --busy a second session changes tickets meanwhile, so that there is something
 // to see.
-#include "examples/ServerSession.h"
+#include "ServerSession.h"
+#include "Shown.h"
 
 #include <chrono>
+#include <climits>
 #include <condition_variable>
 #include <cstdio>
 #include <cstdlib>
@@ -27,7 +29,7 @@ constexpr char const* EveryKey[] = {nullptr};
 struct OPTIONS
 {
     SERVER server;
-    long events = 0;  // leave after so many; 0: on Ctrl-C only
+    int events = 0;  // leave after so many; 0: on Ctrl-C only
     bool busy = false;
 };
 
@@ -41,18 +43,12 @@ std::optional<int> Parse(int argc, char** argv, OPTIONS& options)
     parser.AddSwitch("h", "help", "show this text", wxCMD_LINE_OPTION_HELP);
     parser.AddSwitch("b", "busy", "change tickets meanwhile, in a second session (as operator)");
     SERVER::AddOptions(parser);
-    parser.AddOption("n", "events", "leave after so many events", wxCMD_LINE_VAL_NUMBER);
+    parser.AddOption("n", "events", "leave after so many events (0: no limit)");
     if (auto const status = ParseCommandLine(parser))
         return status;
-    if (!options.server.TakeOptions(parser))
+    if (!options.server.TakeOptions(parser) || !TakeNumber(parser, "events", options.events, 0, INT_MAX))
         return Trouble;
-    parser.Found("events", &options.events);
     options.busy = parser.Found("busy");
-    if (options.events < 0)
-    {
-        Fail("the number of events is 0 (no limit) or more");
-        return Trouble;
-    }
     return std::nullopt;
 }
 
@@ -67,7 +63,7 @@ std::string ValueOf(NotifData const& data)
     case PARAM_DOUBLE:
         return wxString::Format("%g", data.NotifNumber).utf8_string();
     case PARAM_STRING:
-        return "\"" + data.NotifText.utf8_string() + "\"";
+        return "\"" + Shown(data.NotifText.utf8_string()) + "\"";
     case PARAM_COUNT:
         return "(several values)";
     default:
@@ -79,7 +75,7 @@ std::string ValueOf(NotifData const& data)
 class Printer
 {
 public:
-    explicit Printer(long limit) : m_limit(limit) {}
+    explicit Printer(int limit) : m_limit(limit) {}
 
     void Print(ServerNotificationEvent const& event)
     {
@@ -88,7 +84,7 @@ public:
         NotifData const& data = event.GetNotifData();
         std::printf("%s  event %d  ticket %d/%d  %s %s\n",
                     wxDateTime::UNow().Format("%H:%M:%S.%l").utf8_string().c_str(), event.GetId(),
-                    data.NotifCode, data.NotifArgA, data.NotifKey.utf8_string().c_str(),
+                    data.NotifCode, data.NotifArgA, Shown(data.NotifKey.utf8_string()).c_str(),
                     ValueOf(data).c_str());
         bool const isWritten = FlushOutput();
         m_isOver = ++m_printed == m_limit || !isWritten;
@@ -97,8 +93,8 @@ public:
     }
 
 private:
-    long const m_limit;
-    long m_printed = 0;
+    int const m_limit;
+    int m_printed = 0;
     bool m_isOver = false;
 };
 
@@ -201,8 +197,8 @@ int Watch(ComGUIManager& manager, TLogin* login, OPTIONS const& options, EndSign
     bool const started = !options.busy || busy.Start();
     if (started)
     {
-        std::printf("Watching %s as %s; Ctrl-C ends it.\n", options.server.host.utf8_string().c_str(),
-                    manager.GetCurrentlyLoggedUser().utf8_string().c_str());
+        std::printf("Watching %s as %s; Ctrl-C ends it.\n", Shown(options.server.host.utf8_string()).c_str(),
+                    Shown(manager.GetCurrentlyLoggedUser().utf8_string()).c_str());
         if (FlushOutput())
             end.Wait();
     }
