@@ -6,6 +6,7 @@
 #include "comgui/client/Event.h"
 #include "comgui/client/EventNumbers.h"
 #include "comgui/client/Executor.h"
+#include "comgui/client/LiveTicket.h"
 #include "comgui/client/Result.h"
 #include "comgui/client/Snapshot.h"
 #include "comgui/client/Subscription.h"
@@ -15,3 +16,4 @@
 #include "comgui/client/TransferProgress.h"
 #include "comgui/client/Transfers.h"
 #include "comgui/client/Value.h"
+#include "comgui/client/Worker.h"

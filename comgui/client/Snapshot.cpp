@@ -1,9 +1,21 @@
 #include "comgui/client/Snapshot.h"
 
 #include <algorithm>
+#include <utility>
 
 namespace comgui
 {
+namespace
+{
+// Of the first entry whose key is not less.
+template <typename Entries>
+auto PlaceOf(Entries& entries, std::string_view key)
+{
+    return std::lower_bound(entries.begin(), entries.end(), key,
+                            [](auto const& entry, auto name) { return entry.key < name; });
+}
+}  // namespace
+
 Snapshot::Snapshot(std::vector<SnapshotEntry> entries) : m_entries(std::move(entries))
 {
     auto const byKey = [](auto const& left, auto const& right) { return left.key < right.key; };
@@ -13,9 +25,28 @@ Snapshot::Snapshot(std::vector<SnapshotEntry> entries) : m_entries(std::move(ent
 
 Value const* Snapshot::Find(std::string_view key) const
 {
-    auto const found = std::lower_bound(m_entries.begin(), m_entries.end(), key,
-                                        [](auto const& entry, auto name) { return entry.key < name; });
-    return found != m_entries.end() && found->key == key ? &found->value : nullptr;
+    auto const place = PlaceOf(m_entries, key);
+    return place != m_entries.end() && place->key == key ? &place->value : nullptr;
+}
+
+std::optional<SnapshotDifference> Snapshot::Set(std::string key, Value value)
+{
+    auto const place = PlaceOf(m_entries, key);
+    bool const isNew = place == m_entries.end() || place->key != key;
+    if (isNew ? value.IsNone() : value == place->value)
+        return std::nullopt;
+    SnapshotDifference difference{key, std::nullopt, std::nullopt};
+    if (!value.IsNone())
+        difference.after = value;
+    if (isNew)
+        m_entries.insert(place, {std::move(key), std::move(value)});
+    else
+    {
+        difference.before = std::exchange(place->value, std::move(value));
+        if (!difference.after)
+            m_entries.erase(place);
+    }
+    return difference;
 }
 
 std::vector<SnapshotDifference> Difference(Snapshot const& before, Snapshot const& after)

@@ -15,6 +15,11 @@ struct SnapshotEntry
     Value value;
 };
 
+inline bool operator==(SnapshotEntry const& left, SnapshotEntry const& right)
+{
+    return left.key == right.key && left.value == right.value;
+}
+
 // What differs: before is empty where the key is new, after where it is gone.
 struct SnapshotDifference
 {
@@ -34,9 +39,18 @@ public:
 
     Value const* Find(std::string_view key) const;  // null: not there
 
+    // std::monostate: it goes. What differs now; nothing if it was so before.
+    std::optional<SnapshotDifference> Set(std::string key, Value value);
+
 private:
     std::vector<SnapshotEntry> m_entries;
 };
+
+inline bool operator==(Snapshot const& left, Snapshot const& right)
+{
+    return left.Entries() == right.Entries();
+}
+inline bool operator!=(Snapshot const& left, Snapshot const& right) { return !(left == right); }
 
 // By key, bytewise.
 COMGUI_EXPORT std::vector<SnapshotDifference> Difference(Snapshot const& before, Snapshot const& after);

@@ -27,6 +27,13 @@ struct Interest
     {
         return {{}, std::move(tickets), std::move(keys), false};
     }
+    static Interest InAllTypes(std::vector<std::string> keys = {})
+    {
+        Interest interest{{}, {}, std::move(keys), false};
+        for (int type = 0; type < TicketTypes; ++type)
+            interest.types.push_back(type);
+        return interest;
+    }
     static Interest InServer() { return {}; }
     static Interest InTransfers() { return {{}, {}, {}, true}; }
 

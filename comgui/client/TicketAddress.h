@@ -5,7 +5,7 @@
 
 namespace comgui
 {
-// The ticket types that the plug-in of this package has. Others may exist: 0 to 99.
+// The ticket types that the plug-in of this package has. Others may exist.
 enum TICKET_TYPE : int
 {
     SystemTickets = 0,
@@ -15,6 +15,8 @@ enum TICKET_TYPE : int
     PaperTickets = 12,
     UserTickets = 17,
 };
+
+constexpr int TicketTypes = 100;  // 0 to 99
 
 struct TicketAddress
 {

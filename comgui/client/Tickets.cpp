@@ -14,8 +14,6 @@ namespace
 {
 using detail::Client;
 
-constexpr int TicketTypes = 100;
-
 std::string NameOf(TicketAddress ticket)
 {
     return std::to_string(ticket.type) + "/" + std::to_string(ticket.id);
