@@ -53,13 +53,10 @@ KeyGrid::KeyGrid(wxWindow* parent) : wxDataViewListCtrl(parent, wxID_ANY)
     Bind(wxEVT_DATAVIEW_ITEM_EDITING_DONE, &KeyGrid::EndEdit, this);
 }
 
-void KeyGrid::ShowTicket(comgui::Snapshot const& ticket)
+void KeyGrid::Clear()
 {
-    for (std::string const& key : std::vector<std::string>(m_keys))
-        if (!ticket.Find(key))
-            Set(key, {});
-    for (comgui::SnapshotEntry const& entry : ticket.Entries())
-        Set(entry.key, entry.value);
+    DeleteAllItems();
+    m_keys.clear();
 }
 
 void KeyGrid::Set(std::string const& key, comgui::Value const& value)

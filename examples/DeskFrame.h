@@ -35,9 +35,8 @@ public:
     // The user has typed that. The old value is shown until Set.
     std::function<void(std::string const& key, std::string const& text)> onEdit;
 
-    // Both touch only the rows that differ. std::monostate: none any more.
-    void ShowTicket(comgui::Snapshot const& ticket);
-    void Set(std::string const& key, comgui::Value const& value);
+    void Set(std::string const& key, comgui::Value const& value);  // std::monostate: it goes
+    void Clear();
 
 private:
     void EndEdit(wxDataViewEvent& event);

@@ -1,12 +1,11 @@
 // A window on a server's tickets, on the client kit: the way to begin for an author of graphical clients.
 //
-// Two threads: the window's, and a worker's for calls that may take long. What the worker has found is handed
-// back to the window's thread, as events are, so the window needs no lock.
+// Calls that may take long are a worker's. What it has found is handed back to the window's thread, as events
+// are, so the window needs no lock.
 #include "DeskFrame.h"
 
 #include <algorithm>
 #include <iostream>
-#include <thread>
 #include <wx/app.h>
 #include <wx/filedlg.h>
 
@@ -17,33 +16,21 @@ class Window : public DeskFrame
 public:
     explicit Window(DESK_OPTIONS const& options) : DeskFrame(options)
     {
-        m_tree->onChoose = [this](TicketAddress ticket) { ShowTicket(ticket); };
+        m_tree->onChoose = [this](TicketAddress ticket) { Follow(ticket); };
         m_grid->onEdit = [this](auto const& key, auto const& text) { Write(key, text); };
         m_send->Bind(wxEVT_BUTTON, [this](auto&) { SendJob(); });
         m_cancel->Bind(wxEVT_BUTTON, [this](auto&) { m_job->Cancel(); });
         m_listing.Bind(wxEVT_TIMER, [this](auto&) { ShowTickets(); });
         // Before the login: the interest lasts through logins and losses of the server.
-        Interest interest = Interest::InTypes(
-            {SystemTickets, DeviceTickets, JobTickets, QueueTickets, PaperTickets, UserTickets});
+        Interest interest = Interest::InAllTypes();
         interest.transfers = true;
         m_events = m_connection.Subscribe(std::move(interest), m_here,
                                           [this](Event const& event)
                                           { std::visit([this](auto const& what) { Take(what); }, event); });
         CallAfter([this] { m_options.account.password.empty() ? AskForAccount("") : LogIn(); });
     }
-    ~Window() override
-    {
-        m_queue.Stop();
-        m_worker.join();
-    }
 
 private:
-    // The worker does the work, then the window takes its result.
-    template <typename Work, typename Then>
-    void Do(Work work, Then then)
-    {
-        m_queue.GetExecutor()([this, work, then] { m_here([then, result = work()] { then(result); }); });
-    }
     template <typename T>
     bool IsGood(Result<T> const& result)
     {
@@ -63,14 +50,15 @@ private:
     void LogIn()
     {
         Say("Logging in ...");
-        Do([this, options = m_options] { return m_connection.LogIn(options.server, options.account); },
-           [this](Result<User> const& user)
-           {
-               if (!IsGood(user))
-                   return AskForAccount(user.GetError().Text());
-               Say("Logged in: " + user->name);
-               ShowTickets();
-           });
+        m_worker.Do([this, options = m_options]
+                    { return m_connection.LogIn(options.server, options.account); },
+                    [this](Result<User> const& user)
+                    {
+                        if (!IsGood(user))
+                            return AskForAccount(user.GetError().Text());
+                        Say("Logged in: " + user->name);
+                        ShowTickets();
+                    });
     }
 
     void ShowTickets()
@@ -83,31 +71,36 @@ private:
                     all.push_back(ticket);
             return all;
         };
-        Do(read, [this](std::vector<TicketAddress> const& all) { m_tree->ShowTickets(all, m_ticket); });
+        m_worker.Do(read,
+                    [this](std::vector<TicketAddress> const& all)
+                    {
+                        m_tree->ShowTickets(all, m_live ? m_live->Address() : TicketAddress());
+                        Trace("Tickets: " + std::to_string(all.size()));
+                    });
     }
-    // What comes while the ticket is read may be newer than what was read, so it waits.
-    void ShowTicket(TicketAddress ticket)
+    void Follow(TicketAddress ticket)
     {
-        m_ticket = ticket;
-        m_late.emplace();
-        int const number = ++m_readings;
-        Do([tickets = m_tickets, ticket] { return tickets.ReadAll(ticket, Paths::AsStored); },
-           [this, number](Result<Snapshot> const& snapshot)
-           {
-               if (number != m_readings)
-                   return;  // a later one is on its way
-               m_grid->ShowTicket(IsGood(snapshot) ? *snapshot : Snapshot());
-               Trace("The ticket is shown");
-               auto const late = std::exchange(m_late, std::nullopt);
-               for (TicketChanged const& change : *late)
-                   Take(change);
-           });
+        if (m_live && m_live->Address() == ticket)
+            return;
+        m_grid->Clear();
+        m_live.emplace(m_connection, m_worker, ticket,
+                       [this](TicketUpdate const& update)
+                       {
+                           if (IsGood(update.outcome) && update.differences.empty())
+                               Say("The ticket is empty");
+                           for (SnapshotDifference const& difference : update.differences)
+                           {
+                               Value const value = difference.after.value_or(Value());
+                               m_grid->Set(difference.key, value);
+                               Trace(difference.key + " = " + ToText(value));
+                           }
+                       });
     }
     void Write(std::string const& key, std::string const& text)
     {
-        Do([tickets = m_tickets, ticket = m_ticket, key, text]
-           { return tickets.WriteText(ticket, key, text); },
-           [this](Outcome const& outcome) { IsGood(outcome) ? Say("Written") : void(); });
+        m_worker.Do([tickets = m_tickets, ticket = m_live->Address(), key, text]
+                    { return tickets.WriteText(ticket, key, text); },
+                    [this](Outcome const& outcome) { IsGood(outcome) ? Say("Written") : void(); });
     }
     void SendJob()
     {
@@ -123,23 +116,7 @@ private:
     void Take(TicketCreated) { m_listing.StartOnce(200); }
     void Take(TicketDeleted) { m_listing.StartOnce(200); }
     void Take(ManyTicketsChanged) { m_listing.StartOnce(200); }
-    void Take(TicketChanged const& change)
-    {
-        if (change.ticket != m_ticket)
-            return;
-        if (m_late)
-            return m_late->push_back(change);
-        bool isPartial = change.isWhole;
-        for (auto const& [key, value] : change.keys)
-        {
-            isPartial = isPartial || !value;
-            if (value)
-                m_grid->Set(key, *value);
-            Trace(key + " = " + ToText(value.value_or(Value())));
-        }
-        if (isPartial)
-            ShowTicket(m_ticket);
-    }
+    void Take(TicketChanged const&) {}  // that of the live ticket comes to it
     void Take(TransferProgressed const& transfer)
     {
         long long const total = std::max(transfer.progress.total.value_or(1), 1LL);
@@ -163,14 +140,11 @@ private:
     Executor const m_here = OnThreadOf(*this);
     Connection m_connection;
     Tickets const m_tickets = m_connection.GetTickets();
+    Worker const m_worker{m_here};
     Subscription m_events;
-    int m_readings = 0;
-    TicketAddress m_ticket{};                          // that is shown
-    std::optional<std::vector<TicketChanged>> m_late;  // while it is read
+    std::optional<LiveTicket> m_live;  // that is shown
     std::optional<Transfer> m_job;
     wxTimer m_listing;
-    TaskQueue m_queue;
-    std::thread m_worker{[this] { m_queue.Run(); }};
 };
 
 class SmallDesk : public wxApp
