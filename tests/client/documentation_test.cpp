@@ -2,6 +2,7 @@
 #include "tests/client/Client.h"
 
 #include "tests/support/Files.h"
+#include <algorithm>
 #include <atomic>
 #include <chrono>
 #include <fstream>
@@ -244,6 +245,36 @@ TEST_F(SnippetsOfTheClientKit, HearOfChanges_WithoutAWindow)
     isHeard = true;
     other.join();
     EXPECT_THAT(shown, ElementsAre(StartsWith("Job/State is ")));
+}
+
+TEST_F(SnippetsOfTheClientKit, FollowATicket)
+{
+    TicketAddress const job = Job();
+    TaskQueue queue;
+    // [follow]
+    Worker const worker(queue.GetExecutor());  // in a window: OnThreadOf(*this)
+    LiveTicket const live(connection, worker, job,
+                          [](TicketUpdate const& update)  // on the thread that runs the queue
+                          {
+                              if (!update.outcome)
+                                  Show(update.outcome.GetError().Text());  // "3/7: there is no such ticket"
+                              for (auto const& [key, was, is] : update.differences)
+                                  Show(key + ": " + (is ? ToText(*is) : "gone"));
+                          });
+    // [/follow]
+    auto const await = [&queue](std::string const& text)
+    {
+        for (auto const end = Clock::now() + 20s;
+             std::find(shown.begin(), shown.end(), text) == shown.end() && Clock::now() < end;)
+            queue.RunFor(5ms);
+        return shown.back() == text;
+    };
+    ASSERT_TRUE(await("Job/Separations: Cyan, \"Gold, matt\""));
+    EXPECT_EQ(shown.size(), 4u);
+    ASSERT_TRUE(tickets.Write(job, "Job/Copies", 13));
+    EXPECT_TRUE(await("Job/Copies: 13"));
+    ASSERT_TRUE(tickets.Write(job, "Job/Copies", Value()));
+    EXPECT_TRUE(await("Job/Copies: gone"));
 }
 
 TEST_F(SnippetsOfTheClientKit, SendAJob)
