@@ -164,10 +164,11 @@ TEST_F(PostgresOpening, WaitsForAReplacementLongerThanForAnAnswer)
     replacing.Run("SELECT pg_advisory_lock" + lock);
     PostgresOptions options;
     options.statementLimit = 500ms;
+    PostgresOptions impatient = options;
+    impatient.openingLimit = 200ms;
     auto patient = std::async(std::launch::async, [&] { return schema.Open(options); });
     EXPECT_EQ(patient.wait_for(1s), std::future_status::timeout);
-    options.openingLimit = 200ms;
-    EXPECT_THAT(ReasonOf([&] { schema.Open(options); }),
+    EXPECT_THAT(ReasonOf([&] { schema.Open(impatient); }),
                 HasSubstr("another program is opening or replacing the site; wait until that is done"));
     replacing.Run("SELECT pg_advisory_unlock" + lock);
     EXPECT_NE(patient.get(), nullptr);
