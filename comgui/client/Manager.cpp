@@ -2,13 +2,17 @@
 
 #include "comgui/host/UtilityObjects.h"
 #include "comgui/session/ComGUIGlobals.h"
-#include "comgui/session/LocalTicket.h"
+#include <atomic>
 #include <mutex>
 
 namespace comgui::detail
 {
 namespace
 {
+// Every manager that is made writes the library's own pointer anew, without a lock: no one else may look at
+// it meanwhile.
+std::atomic<STicketFactory*> ticketFactory{nullptr};
+
 Error NoPlugInThere()
 {
     wxString path;
@@ -39,14 +43,24 @@ Result<std::unique_ptr<ComGUIManager>> OpenManager()
         first = std::make_unique<ComGUIManager>();
         if (!hSTicketInstance)
             return NoPlugInThere();
+        ticketFactory = hSTicketInstance;
     }
     if (!CanOpenPlugIn(*first))
         return NoPlugInThere();
     return std::make_unique<ComGUIManager>();
 }
 
-ScratchTicket::ScratchTicket() : m_ticket(CreateTicket(nullptr)) {}
-ScratchTicket::~ScratchTicket() { DestroyTicket(m_ticket); }
+ScratchTicket::ScratchTicket()
+{
+    if (STicketFactory* const factory = ticketFactory)
+        m_ticket = factory->CreateTicket(nullptr);
+}
+
+ScratchTicket::~ScratchTicket()
+{
+    if (STicketFactory* const factory = ticketFactory)
+        factory->DestroyTicket(&m_ticket);
+}
 
 bool ScratchTicket::Put(char const* key, void* pointer) const
 {

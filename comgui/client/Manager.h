@@ -33,7 +33,7 @@ public:
     }
 
 private:
-    STICKET_ACCESS const* m_ticket;
+    STICKET_ACCESS const* m_ticket = nullptr;
 };
 
 // The plug-in's own words for what it has just refused on this thread; empty if it has none. UTF-8.
