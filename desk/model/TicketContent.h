@@ -8,6 +8,7 @@
 #include <map>
 #include <string>
 #include <string_view>
+#include <tuple>
 #include <utility>
 #include <vector>
 
@@ -21,6 +22,10 @@ constexpr int LargestPosition = 0xFFFFFF;                       // of a value in
 class TicketContent
 {
 public:
+    TicketContent() = default;
+    TicketContent(TicketContent const&) = delete;
+    TicketContent& operator=(TicketContent const&) = delete;
+
     // Whether a key is one that a ticket may have.
     static bool IsKey(std::string_view key)
     {
@@ -32,9 +37,14 @@ public:
     {
         constexpr std::size_t Node = 160;  // of a value in its map
         m_size += Node + bytes;
-        auto const [values, isNew] = m_keys.try_emplace(key);
-        m_size += isNew ? Node + key.size() : 0;
-        values->second.insert_or_assign(pos, std::move(value));
+        if (m_last == m_keys.end() || m_last->first != key)
+        {
+            bool isNew = false;
+            std::tie(m_last, isNew) = m_keys.try_emplace(key);
+            m_size += isNew ? Node + key.size() : 0;
+        }
+        // Nearly always the last position so far, which is quick.
+        m_last->second.insert_or_assign(m_last->second.end(), pos, std::move(value));
         return m_size <= LargestContent;
     }
 
@@ -43,6 +53,7 @@ public:
     {
         std::vector<comgui::SnapshotEntry> entries;
         entries.reserve(m_keys.size());
+        m_last = m_keys.end();
         while (!m_keys.empty())
         {
             auto node = m_keys.extract(m_keys.begin());
@@ -63,7 +74,10 @@ private:
         return list;
     }
 
-    std::map<std::string, std::map<int, comgui::Value>> m_keys;
+    using Keys = std::map<std::string, std::map<int, comgui::Value>>;
+
+    Keys m_keys;
+    Keys::iterator m_last = m_keys.end();  // the key of the value before
     std::size_t m_size = 0;
 };
 }  // namespace desk

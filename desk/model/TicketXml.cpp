@@ -163,6 +163,16 @@ private:
         }
     }
 
+    // White space is none; the line is that of what comes behind it.
+    void RefuseText(pugi::xml_node node) const
+    {
+        if (!IsText(node) || Trimmed(node.value()).empty())
+            return;
+        std::size_t const begin = static_cast<std::size_t>(std::max<std::ptrdiff_t>(node.offset_debug(), 0));
+        std::size_t const text = std::min(m_xml.find_first_not_of(WhiteSpace, begin), m_xml.size());
+        FailAtLine(FileTrouble::StrayText, LineOf(static_cast<std::ptrdiff_t>(text)), Trimmed(node.value()));
+    }
+
     pugi::xml_node Root() const
     {
         pugi::xml_node root;
@@ -170,8 +180,7 @@ private:
         {
             if (child.type() == pugi::node_doctype)
                 Fail(FileTrouble::DocumentType, child, child.value());
-            if (IsText(child) && !Trimmed(child.value()).empty())
-                Fail(FileTrouble::StrayText, child, Trimmed(child.value()));
+            RefuseText(child);
             if (child.type() != pugi::node_element)
                 continue;
             if (root || child.name() != std::string_view("ticket"))
@@ -191,8 +200,7 @@ private:
         {
             if (child.type() == pugi::node_doctype)
                 Fail(FileTrouble::DocumentType, child, child.value());
-            if (IsText(child) && !Trimmed(child.value()).empty())
-                Fail(FileTrouble::StrayText, child, Trimmed(child.value()));
+            RefuseText(child);
             if (child.type() == pugi::node_element && child.name() != name)
                 Fail(FileTrouble::UnknownElement, child, child.name());
             if (child.type() == pugi::node_element)
