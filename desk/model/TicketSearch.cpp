@@ -5,7 +5,8 @@
 
 namespace desk
 {
-TicketSearch::TicketSearch(SearchQuery query, std::vector<comgui::TicketAddress> tickets, SearchReader reader)
+TicketSearch::TicketSearch(SearchQuery const& query, std::vector<comgui::TicketAddress> tickets,
+                           SearchReader reader)
     : m_text(query.text), m_where(query.where), m_tickets(std::move(tickets)), m_reader(std::move(reader))
 {
     if (m_text.IsEmpty())

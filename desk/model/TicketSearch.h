@@ -62,7 +62,7 @@ using SearchReader = std::function<comgui::Result<comgui::Snapshot>(comgui::Tick
 class TicketSearch
 {
 public:
-    TicketSearch(SearchQuery query, std::vector<comgui::TicketAddress> tickets, SearchReader reader);
+    TicketSearch(SearchQuery const& query, std::vector<comgui::TicketAddress> tickets, SearchReader reader);
 
     // Looks at so many tickets, at least one. After the last, and once cancelled, it reads nothing.
     SearchBatch Step(std::size_t tickets);

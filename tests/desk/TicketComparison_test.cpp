@@ -1,6 +1,10 @@
 #include "desk/model/TicketComparison.h"
 
+#include <algorithm>
+#include <chrono>
 #include <gtest/gtest.h>
+#include <map>
+#include <numeric>
 #include <random>
 #include <stdexcept>
 
@@ -234,4 +238,34 @@ TEST(TicketComparison, HundredThousandKeys_TakeAsManyChanges)
     EXPECT_EQ(comparison.Row(99998).key, "Key/1099999");
     comparison.Show(RowFilter::All);
     EXPECT_EQ(comparison.Rows(), 100000U);
+}
+
+TEST(TicketComparison, HundredThousandNewKeysInAnyOrder_TakeTheirPlaces)
+{
+    std::vector<int> numbers(100000);
+    std::iota(numbers.begin(), numbers.end(), 0);
+    std::shuffle(numbers.begin(), numbers.end(), std::mt19937(5));
+    TicketComparison comparison{Snapshot(), Snapshot()};
+    auto const begin = std::chrono::steady_clock::now();
+    for (int const number : numbers)
+        comparison.Update(Side::Left, "Key/" + std::to_string(1000000 + number), number);
+    EXPECT_LT(std::chrono::steady_clock::now() - begin,
+              std::chrono::seconds(20));  // a few without sanitizers
+    ASSERT_EQ(comparison.Rows(), 100000U);
+    for (std::size_t row = 0; row < comparison.Rows(); ++row)
+        ASSERT_EQ(*comparison.Row(row).left, Value(static_cast<int>(row)));
+}
+
+TEST(TicketComparison, HundredThousandChangesAtOnce_TakeTheirPlaces)
+{
+    std::vector<KeyValue> changes;
+    Snapshot const ticket = Large(100000);
+    for (auto const& [key, value] : ticket.Entries())
+        changes.push_back({key, value});
+    std::shuffle(changes.begin(), changes.end(), std::mt19937(5));
+    TicketComparison comparison(ticket, Snapshot());
+    comparison.UpdateAll(Side::Right, changes);
+    EXPECT_EQ(comparison.Rows(), 100000U);
+    EXPECT_EQ(comparison.Count(RowState::Equal), 100000U);
+    EXPECT_EQ(ShownOf(comparison, RowFilter::Differences), "");
 }

@@ -177,7 +177,7 @@ INSTANTIATE_TEST_SUITE_P(
         WRONG_FACT{"Nothing", "<!-- nothing -->", FileTrouble::NotATicket, 1},
         WRONG_FACT{"AnotherRoot", "\n<site version='1'/>", FileTrouble::NotATicket, 2},
         WRONG_FACT{"TwoRoots", Ticket("") + "<ticket version='1'/>", FileTrouble::NotATicket, 3},
-        WRONG_FACT{"TextBehind", Ticket("") + "x", FileTrouble::StrayText, 2},
+        WRONG_FACT{"TextBehind", Ticket("") + "x", FileTrouble::StrayText, 3},
         WRONG_FACT{"NoVersion", "<ticket/>", FileTrouble::MissingAttribute, 1},
         WRONG_FACT{"NewerVersion", "<ticket version='2'/>", FileTrouble::UnknownVersion, 1},
         WRONG_FACT{"TypeWithoutId", "<ticket version='1' type='3'/>", FileTrouble::MissingAttribute, 1},
