@@ -1,8 +1,8 @@
 #include "desk/model/TicketFile.h"
 
 #include "comgui/stream/MTICKET_BINSTREAM.h"
+#include "desk/model/FileContent.h"
 #include "desk/model/SavedFile.h"
-#include "desk/model/TicketContent.h"
 #include "desk/model/TicketStream.h"
 
 namespace desk

@@ -2,7 +2,7 @@
 
 #include "comgui/stream/STICKET_BINSTREAM.h"
 #include "comgui/ticket/BIN_STRING.h"
-#include "desk/model/TicketContent.h"
+#include "desk/model/FileContent.h"
 #include <algorithm>
 #include <cstdint>
 #include <cstring>
@@ -182,7 +182,7 @@ private:
     {
         if (m_pos < -1 || m_pos > LargestPosition)
             Fail(FileTrouble::BadPosition, std::to_string(m_pos));
-        if (!TicketContent::IsKey(m_key))
+        if (!FileContent::IsKey(m_key))
             Fail(FileTrouble::BadKey, m_key.substr(0, 40));
         if (!m_content.Put(m_key, std::max(m_pos, 0), std::move(value), bytes))
             Fail(FileTrouble::TooLarge);
@@ -197,7 +197,7 @@ private:
     std::string m_key;
     std::size_t m_copied = 0;  // bytes of all keys
     int m_pos = -1;
-    TicketContent m_content;
+    FileContent m_content;
 };
 
 // Writes values as a walk over a ticket delivers them: a value alone stands at position 0.
@@ -207,7 +207,7 @@ public:
     void Write(std::string const& key, Value const& value)
     {
         auto const* const list = std::get_if<comgui::List>(&value);
-        if (!TicketContent::IsKey(key))
+        if (!FileContent::IsKey(key))
             return;
         if (!list)
             return WriteOne(key, 0, value);

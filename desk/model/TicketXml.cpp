@@ -1,7 +1,7 @@
 #include "desk/model/TicketXml.h"
 
 #include "comgui/client/Text.h"
-#include "desk/model/TicketContent.h"
+#include "desk/model/FileContent.h"
 #include <algorithm>
 #include <charconv>
 #include <initializer_list>
@@ -297,7 +297,7 @@ private:
         std::string key = Attribute(node, "key");
         if (IsBase64(node, "key-encoding"))
             key = Decoded(node, key);
-        if (!TicketContent::IsKey(key))
+        if (!FileContent::IsKey(key))
             Fail(FileTrouble::BadKey, node, key);
         return key;
     }
@@ -369,7 +369,7 @@ private:
     std::string_view const m_xml;
     std::string const& m_file;
     pugi::xml_document m_document;
-    TicketContent m_content;
+    FileContent m_content;
 };
 }  // namespace
 

@@ -19,12 +19,12 @@ constexpr std::size_t LargestContent = std::size_t{512} << 20;  // bytes in memo
 constexpr std::size_t LongestKey = std::size_t{64} << 10;       // bytes
 constexpr int LargestPosition = 0xFFFFFF;                       // of a value in a list
 
-class TicketContent
+class FileContent
 {
 public:
-    TicketContent() = default;
-    TicketContent(TicketContent const&) = delete;
-    TicketContent& operator=(TicketContent const&) = delete;
+    FileContent() = default;
+    FileContent(FileContent const&) = delete;
+    FileContent& operator=(FileContent const&) = delete;
 
     // Whether a key is one that a ticket may have.
     static bool IsKey(std::string_view key)

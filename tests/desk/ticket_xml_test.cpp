@@ -1,6 +1,6 @@
 #include "desk/model/TicketXml.h"
 
-#include "desk/model/TicketContent.h"
+#include "desk/model/FileContent.h"
 #include "standin/server/tickets/TicketXml.h"
 #include "tests/desk/FileFacts.h"
 #include "tests/support/HexText.h"

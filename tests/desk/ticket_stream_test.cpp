@@ -2,7 +2,7 @@
 
 #include "comgui/stream/STICKET_BINSTREAM.h"
 #include "comgui/ticket/BIN_STRING.h"
-#include "desk/model/TicketContent.h"
+#include "desk/model/FileContent.h"
 #include "tests/desk/FileFacts.h"
 #include "tests/support/HexText.h"
 #include "tests/support/TicketFake.h"

@@ -1,0 +1,54 @@
+#include "desk/model/SearchRun.h"
+
+namespace desk
+{
+namespace
+{
+constexpr std::size_t TicketsInAStep = 50;
+}
+
+struct SearchRun::STATE : std::enable_shared_from_this<STATE>
+{
+    STATE(comgui::Worker const& of, SearchQuery query, std::vector<comgui::TicketAddress> const& all,
+          SearchReader reader, Handler found)
+        : worker(of), search(std::move(query), all, std::move(reader)), handler(std::move(found))
+    {
+    }
+
+    void Go()
+    {
+        worker.Do([self = shared_from_this()] { return self->search.Step(TicketsInAStep); },
+                  [weak = weak_from_this()](SearchBatch const& batch)
+                  {
+                      auto const self = weak.lock();
+                      if (!self || self->isOver)
+                          return;
+                      if (batch.state == SearchState::Running)
+                          self->Go();
+                      self->handler(batch);
+                  });
+    }
+
+    comgui::Worker const& worker;
+    TicketSearch search;
+    Handler const handler;
+    bool isOver = false;
+};
+
+SearchRun::SearchRun(comgui::Worker const& worker, comgui::Tickets const& tickets, SearchQuery query,
+                     std::vector<comgui::TicketAddress> const& all, Handler handler)
+    : m_state(std::make_shared<STATE>(
+          worker, std::move(query), all,
+          [tickets](comgui::TicketAddress ticket)
+          { return tickets.ReadAll(ticket, comgui::Paths::AsStored); },
+          std::move(handler)))
+{
+    m_state->Go();
+}
+
+SearchRun::~SearchRun()
+{
+    m_state->isOver = true;
+    m_state->search.Cancel();
+}
+}  // namespace desk

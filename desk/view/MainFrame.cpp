@@ -1,0 +1,487 @@
+#include "desk/view/MainFrame.h"
+
+#include "desk/model/DisplayText.h"
+#include "desk/model/ServerName.h"
+#include "desk/model/TicketName.h"
+#include "desk/view/CompareFrame.h"
+#include "desk/view/EventsPane.h"
+#include "desk/view/InkBars.h"
+#include "desk/view/JobsPane.h"
+#include "desk/view/KeysPane.h"
+#include "desk/view/LoginDialog.h"
+#include "desk/view/NewKeyDialog.h"
+#include "desk/view/TicketFiles.h"
+#include "desk/view/TicketsPane.h"
+#include <algorithm>
+#include <chrono>
+#include <comgui/client/Text.h>
+#include <wx/infobar.h>
+#include <wx/menu.h>
+#include <wx/msgdlg.h>
+#include <wx/notebook.h>
+#include <wx/numdlg.h>
+#include <wx/sizer.h>
+#include <wx/splitter.h>
+#include <wx/textdlg.h>
+
+namespace desk
+{
+namespace
+{
+constexpr int RepaintPause = 50;           // milliseconds; however many events come meanwhile
+constexpr std::size_t MostFound = 10'000;  // tickets; a wider search helps nobody
+constexpr char WindowName[] = "MainWindow";
+
+wxString NameOf(comgui::TicketAddress ticket) { return wxString::Format("%d/%d", ticket.type, ticket.id); }
+}  // namespace
+
+MainFrame::MainFrame()
+    : wxFrame(nullptr, wxID_ANY, _("Ticket desk")), m_here(comgui::OnThreadOf(*this)), m_session(m_here),
+      m_titles(m_session.Tickets(), m_session.Worker()), m_editor(m_session.Tickets(), m_session.Worker())
+{
+    SetName("desk");
+    SetSize(FromDIP(wxSize(1200, 800)));
+    MakePanes();
+    MakeMenus();
+    CreateStatusBar();
+    Connect();
+    m_settings.Restore(*this, WindowName);
+    Take(DeskSession::State::LoggedOut, {});
+}
+
+MainFrame::~MainFrame() { m_settings.Keep(*this, WindowName); }
+
+void MainFrame::MakePanes()
+{
+    m_info = new wxInfoBar(this);
+    auto* const whole =
+        new wxSplitterWindow(this, wxID_ANY, wxDefaultPosition, wxDefaultSize, wxSP_LIVE_UPDATE);
+    m_tickets = new TicketsPane(whole, m_index, [this](auto ticket) { return m_titles.TitleOf(ticket); });
+    auto* const right =
+        new wxSplitterWindow(whole, wxID_ANY, wxDefaultPosition, wxDefaultSize, wxSP_LIVE_UPDATE);
+    m_middle = new wxSplitterWindow(right, wxID_ANY, wxDefaultPosition, wxDefaultSize, wxSP_LIVE_UPDATE);
+    m_keys = new KeysPane(m_middle);
+    m_inks = new InkBars(m_middle);
+    m_below = new wxNotebook(right, wxID_ANY);
+    m_events = new EventsPane(m_below);
+    m_transfers = new JobsPane(m_below, m_jobs);
+    m_below->AddPage(m_events, _("Events"));
+    m_below->AddPage(m_transfers, _("Jobs"));
+    for (wxSplitterWindow* const each : {whole, right, m_middle})
+        each->SetMinimumPaneSize(FromDIP(120));
+    whole->SplitVertically(m_tickets, right, FromDIP(320));
+    right->SplitHorizontally(m_middle, m_below, FromDIP(460));
+    right->SetSashGravity(0.7);
+    m_middle->SetSashGravity(1);
+    m_inks->Hide();
+    m_middle->Initialize(m_keys);
+
+    auto* const all = new wxBoxSizer(wxVERTICAL);
+    all->Add(m_info, wxSizerFlags().Expand());
+    all->Add(whole, wxSizerFlags(1).Expand());
+    SetSizer(all);
+}
+
+void MainFrame::MakeMenus()
+{
+    auto* const bar = new wxMenuBar;
+    auto const add = [this](wxMenu* menu, wxString const& text, auto action, int id = wxID_ANY)
+    {
+        wxMenuItem* const item = menu->Append(id, text);
+        Bind(
+            wxEVT_MENU, [action](auto&) { action(); }, item->GetId());
+    };
+    auto* const server = new wxMenu;
+    add(server, _("Log &in ...\tCtrl+L"), [this] { AskForLogin(); });
+    add(server, _("Log &out"), [this] { LogOut(); });
+    server->AppendSeparator();
+    add(server, _("&Send jobs ...\tCtrl+J"), [this] { m_transfers->Send(); });
+    server->AppendSeparator();
+    add(
+        server, _("&Quit\tCtrl+Q"), [this] { Close(); }, wxID_EXIT);
+    bar->Append(server, _("&Server"));
+
+    auto* const ticket = new wxMenu;
+    add(ticket, _("&New ticket ...\tCtrl+T"), [this] { NewTicket(); });
+    add(ticket, _("&Delete the ticket"), [this] { DeleteTicket(); });
+    ticket->AppendSeparator();
+    add(ticket, _("&Export ...\tCtrl+E"), [this] { Export(); });
+    add(ticket, _("&Import ...\tCtrl+I"), [this] { Import(); });
+    add(ticket, _("&Compare with ...\tCtrl+D"), [this] { Compare(); });
+    bar->Append(ticket, _("&Ticket"));
+
+    auto* const edit = new wxMenu;
+    add(
+        edit, _("&Undo\tCtrl+Z"), [this] { m_editor.Undo(); }, wxID_UNDO);
+    add(
+        edit, _("&Redo\tCtrl+Shift+Z"), [this] { m_editor.Redo(); }, wxID_REDO);
+    edit->AppendSeparator();
+    add(edit, _("&Edit the value\tF2"), [this] { m_keys->EditChosen(); });
+    add(edit, _("&New key ...\tCtrl+N"), [this] { NewKey(); });
+    add(edit, _("&Delete the key\tCtrl+Delete"), [this] { DeleteKey(); });
+    edit->AppendSeparator();
+    add(edit, _("&Search tickets\tCtrl+F"), [this] { m_tickets->FocusSearch(); });
+    add(edit, _("&Filter keys\tCtrl+K"), [this] { m_keys->FocusFilter(); });
+    bar->Append(edit, _("&Edit"));
+
+    auto* const view = new wxMenu;
+    add(view, _("&Open all branches\tCtrl++"), [this] { m_keys->OpenAll(); });
+    add(view, _("&Close all branches\tCtrl+-"), [this] { m_keys->CloseAll(); });
+    view->AppendSeparator();
+    add(view, _("&Events\tCtrl+1"), [this] { m_below->SetSelection(0); });
+    add(view, _("&Jobs\tCtrl+2"), [this] { m_below->SetSelection(1); });
+    add(view, _("&Pause events\tCtrl+P"), [this] { m_events->TogglePause(); });
+    add(view, _("Forget all &events"), [this] { m_events->Clear(); });
+    add(view, _("&Read all anew\tF5"), [this] { m_session.ListAll(); });
+    view->AppendSeparator();
+    add(view, _("&Next pane\tF6"), [this] { FocusNextPane(); });
+    bar->Append(view, _("&View"));
+    SetMenuBar(bar);
+}
+
+void MainFrame::Connect()
+{
+    m_session.onState = [this](DeskSession::State state, comgui::Error const& error) { Take(state, error); };
+    m_session.onEvent = [this](comgui::Event const& event) { Take(event); };
+    m_session.onProblem = [this](comgui::Error const& error) { Complain(comgui::ToWx(error.Text())); };
+    m_session.onList = [this](int type, std::vector<int> const& ids)
+    {
+        if (ids.empty() && m_index.Count(type) == 0)
+            return;
+        m_index.Show(type, ids);
+        m_tickets->TicketsChanged(type);
+    };
+    m_session.onTicket = [this](comgui::TicketAddress ticket, bool isThere)
+    {
+        if (auto const index = isThere ? m_index.Add(ticket) : m_index.Remove(ticket))
+            isThere ? m_tickets->Added(ticket, *index) : m_tickets->Removed(ticket, *index);
+    };
+    m_titles.onAsked = [this] { m_repaint.IsRunning() ? false : m_repaint.StartOnce(RepaintPause); };
+    m_titles.onTitles = [this] { m_tickets->TitlesChanged(); };
+    m_editor.onWritten = [this](auto ticket, auto const& key)
+    { Say(wxString::Format(_("%s %s is written"), NameOf(ticket), comgui::ToWx(DisplayText(key)))); };
+    m_editor.onRefused = [this](auto ticket, auto const& key, comgui::Error const& error)
+    {
+        if (m_live && m_live->Address() == ticket)
+            m_keys->Explain(key, comgui::ToWx(error.Text()));
+        Say(comgui::ToWx(error.Text()));
+    };
+    m_editor.onForeign = [this](std::vector<EditWrite> const& foreign)
+    { return IsForeignOverwritten(foreign); };
+    m_editor.onHistory = [this]
+    {
+        GetMenuBar()->Enable(wxID_UNDO, m_editor.CanUndo());
+        GetMenuBar()->Enable(wxID_REDO, m_editor.CanRedo());
+    };
+    m_editor.onHistory();
+    m_tickets->onChoose = [this](comgui::TicketAddress ticket) { ShowTicket(ticket); };
+    m_tickets->onSearch = [this](std::string const& text) { Search(text); };
+    m_keys->onEdit = [this](std::string const& key, std::string const& text)
+    {
+        if (m_live)
+            m_editor.WriteText(m_live->Address(), key, text);
+    };
+    m_events->onChoose = [this](comgui::TicketAddress ticket, std::string const& key)
+    {
+        m_tickets->Choose(ticket);
+        m_keys->Choose(key);
+    };
+    m_transfers->onSend = [this](auto const& files, auto const& options) { Send(files, options); };
+    m_transfers->onCancel = [this](JobRow const& row)
+    {
+        for (comgui::Transfer transfer : m_session.Connection().GetTransfers().Running())
+            if (transfer.Number() == row.transfer)
+                transfer.Cancel();
+    };
+    m_transfers->onOpen = [this](int job) { m_tickets->Choose({comgui::JobTickets, job}); };
+    m_transfers->queues = [this] { return Queues(); };
+    m_repaint.Bind(wxEVT_TIMER, [this](auto&) { Repaint(); });
+}
+
+// The session
+
+void MainFrame::AskForLogin(std::string const& why)
+{
+    LoginDialog dialog(this, m_session.Connection(), m_session.Worker(), m_settings.Servers(),
+                       m_settings.User());
+    if (!why.empty())
+        dialog.Explain(why);
+    if (dialog.ShowModal() == wxID_OK)
+        LoggedIn(dialog.Server(), dialog.User().name);
+}
+
+void MainFrame::LogIn(comgui::Server const& server, comgui::Account const& account)
+{
+    Say(_("Logging in ..."));
+    m_session.Worker().Do([this, server, account] { return m_session.Connection().LogIn(server, account); },
+                          [this, server](comgui::Result<comgui::User> const& user)
+                          { user ? LoggedIn(server, user->name) : AskForLogin(user.GetError().Text()); });
+}
+
+void MainFrame::LoggedIn(comgui::Server const& server, std::string const& user)
+{
+    m_settings.Remember(TextOf(server), user);
+    m_server = comgui::ToWx(user + " @ " + TextOf(server));
+    ForgetTickets();
+    m_session.LoggedIn();
+    Say(wxString::Format(_("Logged in: %s"), comgui::ToWx(user)));
+}
+
+void MainFrame::LogOut()
+{
+    ForgetTickets();
+    m_session.LogOut();
+    Say(_("Logged out"));
+}
+
+void MainFrame::ForgetTickets()
+{
+    m_search.reset();
+    m_live.reset();
+    m_titles.Clear();
+    m_editor.Clear();
+    m_index.Clear();
+    m_jobs.Clear();
+    m_tickets->Clear();
+    m_keys->ShowTicket({});
+    m_transfers->Take(JobBoard::Change::Rows);
+}
+
+void MainFrame::Take(DeskSession::State state, comgui::Error const& error)
+{
+    bool const isIn = state != DeskSession::State::LoggedOut;
+    SetTitle(isIn ? m_server + " - " + _("Ticket desk") : _("Ticket desk"));
+    m_transfers->Enable(isIn);
+    if (state == DeskSession::State::Lost)
+        m_info->ShowMessage(comgui::ToWx(error.Text()) + ". " + _("Trying again ..."), wxICON_ERROR);
+    else
+        m_info->Dismiss();
+}
+
+void MainFrame::Take(comgui::Event const& event)
+{
+    m_events->Take(event);
+    m_titles.Take(event);
+    std::visit([this](auto const& what) { TakeJobs(what); }, event);
+    if (!m_repaint.IsRunning())
+        m_repaint.StartOnce(RepaintPause);
+}
+
+void MainFrame::Repaint()
+{
+    m_titles.Read();
+    m_events->Repaint();
+}
+
+void MainFrame::TakeJobs(comgui::TransferProgressed const& event)
+{
+    m_transfers->Take(m_jobs.Take(event, Now()));
+}
+
+void MainFrame::TakeJobs(comgui::TransferEnded const& event)
+{
+    m_transfers->Take(m_jobs.Take(event, Now()));
+    if (!event.outcome && event.outcome.GetError().code != comgui::Cancelled)
+        Say(comgui::ToWx(event.outcome.GetError().Text()));
+}
+
+void MainFrame::TakeJobs(comgui::TicketChanged const& event)
+{
+    if (event.ticket.type == comgui::JobTickets)
+        for (comgui::KeyChange const& change : event.keys)
+            m_transfers->Take(m_jobs.TakeJob(event.ticket.id, change, Now()));
+}
+
+void MainFrame::TakeJobs(comgui::TicketDeleted const& event)
+{
+    if (event.ticket.type == comgui::JobTickets)
+        m_transfers->Take(m_jobs.RemoveJob(event.ticket.id));
+}
+
+std::vector<JobQueue> MainFrame::Queues()
+{
+    std::vector<JobQueue> queues;
+    for (std::size_t i = 0; i < m_index.Count(comgui::QueueTickets); ++i)
+    {
+        comgui::TicketAddress const queue = *m_index.At(comgui::QueueTickets, i);
+        queues.push_back({queue.id, m_titles.TitleOf(queue)});
+    }
+    return queues;
+}
+
+// Tickets
+
+void MainFrame::ShowTicket(comgui::TicketAddress ticket)
+{
+    if (m_live && m_live->Address() == ticket)
+        return;
+    m_keys->ShowTicket(NameOfType(ticket.type) + " " + NameOf(ticket));
+    m_events->ShowOnly(ticket);
+    m_live.emplace(m_session.Connection(), m_session.Worker(), ticket,
+                   [this](comgui::TicketUpdate const& update) { Take(update); });
+}
+
+void MainFrame::Take(comgui::TicketUpdate const& update)
+{
+    if (!update.outcome)
+        Say(comgui::ToWx(update.outcome.GetError().Text()));
+    m_keys->Take(m_live->Now(), update.differences);
+    m_coverage.Take(m_live->Now());
+    m_inks->Take(m_coverage);
+    bool const hasInks = !m_coverage.Inks().empty();
+    if (hasInks && !m_middle->IsSplit())
+        m_middle->SplitVertically(m_keys, m_inks, -FromDIP(260));
+    else if (!hasInks && m_middle->IsSplit())
+        m_middle->Unsplit(m_inks);
+}
+
+void MainFrame::NewTicket()
+{
+    long const type = wxGetNumberFromUser({}, _("Type of the ticket, 0 to 99:"), _("New ticket"),
+                                          m_live ? m_live->Address().type : comgui::JobTickets, 0,
+                                          comgui::TicketTypes - 1, this);
+    if (type < 0)
+        return;
+    m_session.Worker().Do([tickets = m_session.Tickets(), type]
+                          { return tickets.Create(static_cast<int>(type)); },
+                          [this](comgui::Result<comgui::TicketAddress> const& ticket)
+                          {
+                              if (!ticket)
+                                  return Complain(comgui::ToWx(ticket.GetError().Text()));
+                              m_session.Made(*ticket);
+                              m_tickets->Choose(*ticket);
+                          });
+}
+
+void MainFrame::DeleteTicket()
+{
+    if (!m_live)
+        return;
+    comgui::TicketAddress const ticket = m_live->Address();
+    if (wxMessageBox(
+            wxString::Format(_("Delete ticket %s with all its keys? This cannot be undone."), NameOf(ticket)),
+            _("Delete the ticket"), wxYES_NO | wxNO_DEFAULT | wxICON_QUESTION, this) != wxYES)
+        return;
+    m_session.Worker().Do([tickets = m_session.Tickets(), ticket] { return tickets.Delete(ticket); },
+                          [this, ticket](comgui::Outcome const& outcome)
+                          {
+                              outcome ? Say(wxString::Format(_("%s is deleted"), NameOf(ticket)))
+                                      : Complain(comgui::ToWx(outcome.GetError().Text()));
+                          });
+}
+
+void MainFrame::NewKey()
+{
+    if (!m_live)
+        return;
+    NewKeyDialog dialog(this, m_keys->ChosenKey().value_or(""));
+    if (dialog.ShowModal() == wxID_OK)
+        m_editor.Write(m_live->Address(), dialog.Key(), dialog.Value());
+}
+
+void MainFrame::DeleteKey()
+{
+    if (auto const key = m_keys->ChosenKey(); key && m_live)
+        m_editor.Write(m_live->Address(), *key, {});
+}
+
+void MainFrame::Export()
+{
+    if (m_live)
+        ExportTicket(this, m_session.Tickets(), m_session.Worker(), m_live->Address(),
+                     [this](wxString const& text) { Complain(text); });
+}
+
+void MainFrame::Import()
+{
+    ImportTicket(
+        this, m_session.Tickets(), m_session.Worker(), m_live ? m_live->Address().type : comgui::JobTickets,
+        [this](comgui::TicketAddress ticket)
+        {
+            m_session.Made(ticket);
+            m_tickets->Choose(ticket);
+        },
+        [this](wxString const& text) { Complain(text); });
+}
+
+void MainFrame::Compare()
+{
+    if (!m_live)
+        return;
+    comgui::TicketAddress const left = m_live->Address();
+    wxTextEntryDialog dialog(this, _("The other ticket, by its number or as type/number:"),
+                             wxString::Format(_("Compare %s"), NameOf(left)));
+    if (dialog.ShowModal() != wxID_OK)
+        return;
+    auto const right = TicketFromText(comgui::ToUtf8(dialog.GetValue()), left.type);
+    if (!right)
+        return Complain(_("This is no ticket: a number, or a type, a slash and a number."));
+    (new CompareFrame(this, m_session.Connection(), m_session.Worker(), left, *right))->Show();
+}
+
+void MainFrame::Search(std::string const& text)
+{
+    m_search.reset();
+    if (text.empty())
+        return m_tickets->EndSearch();
+    std::vector<comgui::TicketAddress> all;
+    for (int const type : m_index.Types())
+        for (std::size_t i = 0; i < m_index.Count(type); ++i)
+            all.push_back(*m_index.At(type, i));
+    m_found.clear();
+    m_tickets->ShowFound(m_found, _("Searching ..."));
+    m_search.emplace(m_session.Worker(), m_session.Tickets(), SearchQuery{text}, all,
+                     [this](SearchBatch const& batch)
+                     {
+                         for (SearchMatch const& match : batch.matches)
+                             if (m_found.size() < MostFound)
+                                 m_found.push_back(match.ticket);
+                         m_tickets->ShowFound(m_found,
+                                              wxString::Format(_("%zu found, %zu of %zu looked at"),
+                                                               m_found.size(), batch.done, batch.total));
+                     });
+}
+
+void MainFrame::Send(std::vector<std::string> const& files, comgui::JobOptions const& options)
+{
+    m_below->SetSelection(1);
+    for (std::string const& file : files)
+        m_jobs.Add(m_session.Connection().GetTransfers().SendJob(file, options), Now());
+    m_transfers->Take(JobBoard::Change::Rows);
+}
+
+bool MainFrame::IsForeignOverwritten(std::vector<EditWrite> const& foreign)
+{
+    wxString const key = comgui::ToWx(DisplayText(foreign[0].key));
+    return wxMessageBox(
+               wxString::Format(_("%s has been changed by somebody else since: it is %s now. Overwrite it?"),
+                                key, comgui::ToWx(DisplayTextOf(foreign[0].present))),
+               _("Undo"), wxYES_NO | wxNO_DEFAULT | wxICON_QUESTION, this) == wxYES;
+}
+
+// Messages
+
+void MainFrame::Say(wxString const& text) { SetStatusText(text); }
+
+void MainFrame::Complain(wxString const& text)
+{
+    SetStatusText(text);
+    m_info->ShowMessage(text, wxICON_INFORMATION);
+}
+
+void MainFrame::FocusNextPane()
+{
+    wxWindow* const panes[] = {m_tickets, m_keys, m_below};
+    wxWindow const* const focus = FindFocus();
+    auto const* const current = std::find_if(
+        std::begin(panes), std::end(panes),
+        [focus](wxWindow const* pane) { return focus && pane->IsDescendant(const_cast<wxWindow*>(focus)); });
+    std::size_t const next = current == std::end(panes) ? 0 : (current - panes + 1) % std::size(panes);
+    panes[next]->SetFocus();
+}
+
+double MainFrame::Now()
+{
+    return std::chrono::duration<double>(std::chrono::steady_clock::now().time_since_epoch()).count();
+}
+}  // namespace desk

@@ -1,0 +1,34 @@
+// Asks for a new key of a ticket: its name, its type and its value.
+#pragma once
+
+#include <comgui/client.h>
+#include <string>
+#include <wx/dialog.h>
+
+class wxChoice;
+class wxStaticText;
+class wxTextCtrl;
+
+namespace desk
+{
+class NewKeyDialog : public wxDialog
+{
+public:
+    // beside: a key whose branch the new one is likely to belong to; may be empty.
+    NewKeyDialog(wxWindow* parent, std::string const& beside);
+
+    // After ShowModal has returned wxID_OK.
+    std::string const& Key() const { return m_key; }
+    comgui::Value const& Value() const { return m_value; }
+
+private:
+    void Accept();
+
+    std::string m_key;
+    comgui::Value m_value;
+    wxTextCtrl* m_name;
+    wxChoice* m_type;
+    wxTextCtrl* m_text;
+    wxStaticText* m_message;
+};
+}  // namespace desk

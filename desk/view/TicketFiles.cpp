@@ -1,0 +1,152 @@
+#include "desk/view/TicketFiles.h"
+
+#include "desk/model/SavedFile.h"
+#include "desk/model/TicketFile.h"
+#include "desk/model/TicketStream.h"
+#include "desk/view/FaultText.h"
+#include <comgui/client/Text.h>
+#include <variant>
+#include <wx/filedlg.h>
+#include <wx/intl.h>
+
+namespace desk
+{
+namespace
+{
+// Why it came to nothing, as the worker's thread has found it; the sentence is made by the window's.
+using Trouble = std::variant<std::monostate, FileFault, comgui::Error>;
+
+wxString TextOf(Trouble const& trouble)
+{
+    if (auto const* const fault = std::get_if<FileFault>(&trouble))
+        return desk::TextOf(*fault);
+    auto const* const error = std::get_if<comgui::Error>(&trouble);
+    return error ? comgui::ToWx(error->Text()) : wxString();
+}
+
+struct Exported
+{
+    Trouble trouble;
+    std::size_t keys = 0;
+    std::vector<FileLoss> losses;
+};
+
+std::variant<std::string, Trouble> BytesOf(comgui::Tickets const& tickets, comgui::TicketAddress ticket,
+                                           comgui::Snapshot const& content, bool isStream)
+{
+    if (isStream)
+    {
+        auto stream = StreamOf(content);
+        if (auto* const fault = std::get_if<FileFault>(&stream))
+            return Trouble(std::move(*fault));
+        return std::get<std::string>(std::move(stream));
+    }
+    auto xml = tickets.ToXml(ticket);
+    if (!xml)
+        return Trouble(xml.GetError());
+    return *std::move(xml);
+}
+
+Exported Export(comgui::Tickets const& tickets, comgui::TicketAddress ticket, std::string const& file)
+{
+    auto const content = tickets.ReadAll(ticket, comgui::Paths::AsStored);
+    if (!content)
+        return {content.GetError(), 0, {}};
+    auto const made = BytesOf(tickets, ticket, *content, file.ends_with(".stream"));
+    if (auto const* const trouble = std::get_if<Trouble>(&made))
+        return {*trouble, 0, {}};
+    std::string const& bytes = std::get<std::string>(made);
+    if (auto const fault = SaveFile(file, bytes))
+        return {*fault, 0, {}};
+    auto losses = LossesOf(*content, bytes);
+    if (auto const* const fault = std::get_if<FileFault>(&losses))
+        return {*fault, 0, {}};
+    return {{}, content->Entries().size(), std::get<std::vector<FileLoss>>(std::move(losses))};
+}
+
+wxString SentenceOf(Exported const& done)
+{
+    if (done.trouble.index() != 0)
+        return TextOf(done.trouble);
+    if (done.losses.empty())
+        return wxString::Format(wxPLURAL("Exported: %zu key", "Exported: %zu keys", done.keys), done.keys);
+    return wxString::Format(_("Exported, but the file does not hold all of it as it is: %s and %zu more"),
+                            comgui::ToWx(done.losses[0].key), done.losses.size() - 1);
+}
+
+struct Imported
+{
+    Trouble trouble;
+    comgui::TicketAddress ticket;
+    std::size_t keys = 0;
+    std::size_t refused = 0;
+    std::string refusedKey;  // the first
+};
+
+Imported Import(comgui::Tickets const& tickets, int type, std::string const& file)
+{
+    auto const read = ImportTicket(file);
+    if (auto const* const fault = std::get_if<FileFault>(&read))
+        return {*fault, {}, 0, 0, {}};
+    std::vector<comgui::KeyValue> values;
+    for (comgui::SnapshotEntry const& entry : std::get<TicketOfFile>(read).ticket.Entries())
+        values.push_back({entry.key, entry.value});
+    auto const ticket = tickets.Create(type);
+    if (!ticket)
+        return {ticket.GetError(), {}, 0, 0, {}};
+    Imported done{{}, *ticket, 0, 0, {}};
+    auto const outcomes = tickets.WriteAll(*ticket, values, comgui::Paths::AsStored);
+    for (std::size_t i = 0; i < outcomes.size(); ++i)
+        if (outcomes[i])
+            ++done.keys;
+        else if (done.refused++ == 0)
+            done.refusedKey = values[i].key;
+    return done;
+}
+
+wxString SentenceOf(Imported const& done)
+{
+    if (done.trouble.index() != 0)
+        return TextOf(done.trouble);
+    if (done.refused == 0)
+        return wxString::Format(wxPLURAL("Imported: %zu key", "Imported: %zu keys", done.keys), done.keys);
+    return wxString::Format(_("Imported, but %zu keys were refused, the first of them %s"), done.refused,
+                            comgui::ToWx(done.refusedKey));
+}
+
+wxString Wildcard()
+{
+    return _("Ticket as XML") + " (*.xml)|*.xml|" + _("Ticket stream") + " (*.stream)|*.stream";
+}
+}  // namespace
+
+void ExportTicket(wxWindow* parent, comgui::Tickets const& tickets, comgui::Worker const& worker,
+                  comgui::TicketAddress ticket, Said said)
+{
+    wxFileDialog dialog(parent, _("Export the ticket"), {},
+                        wxString::Format("%d-%d.xml", ticket.type, ticket.id), Wildcard(),
+                        wxFD_SAVE | wxFD_OVERWRITE_PROMPT);
+    if (dialog.ShowModal() != wxID_OK)
+        return;
+    worker.Do([tickets, ticket, file = comgui::ToUtf8(dialog.GetPath())]
+              { return Export(tickets, ticket, file); },
+              [said = std::move(said)](Exported const& done) { said(SentenceOf(done)); });
+}
+
+void ImportTicket(wxWindow* parent, comgui::Tickets const& tickets, comgui::Worker const& worker, int type,
+                  std::function<void(comgui::TicketAddress)> made, Said said)
+{
+    wxFileDialog dialog(parent, _("Import a ticket"), {}, {}, Wildcard() + "|" + _("All files") + "|*",
+                        wxFD_OPEN | wxFD_FILE_MUST_EXIST);
+    if (dialog.ShowModal() != wxID_OK)
+        return;
+    worker.Do([tickets, type, file = comgui::ToUtf8(dialog.GetPath())]
+              { return Import(tickets, type, file); },
+              [made = std::move(made), said = std::move(said)](Imported const& done)
+              {
+                  if (done.trouble.index() == 0)
+                      made(done.ticket);
+                  said(SentenceOf(done));
+              });
+}
+}  // namespace desk

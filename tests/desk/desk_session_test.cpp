@@ -1,0 +1,119 @@
+// What the desk does at a server, without any window.
+#include "desk/model/DeskSession.h"
+
+#include "tests/client/Client.h"
+#include <algorithm>
+#include <gmock/gmock.h>
+#include <map>
+#include <set>
+#include <thread>
+
+using namespace desk;
+using namespace std::chrono_literals;
+using testing::Contains;
+using testing::ElementsAre;
+using testing::IsEmpty;
+using testing::Pair;
+using testing::SizeIs;
+
+namespace
+{
+class SessionOfTheDesk : public Client
+{
+protected:
+    SessionOfTheDesk()
+    {
+        session.onState = [this](DeskSession::State state, comgui::Error const&) { states.push_back(state); };
+        session.onList = [this](int type, std::vector<int> const& ids) { lists[type] = ids; };
+        session.onTicket = [this](comgui::TicketAddress ticket, bool isThere)
+        { isThere ? static_cast<void>(known.insert(ticket)) : static_cast<void>(known.erase(ticket)); };
+        session.onEvent = [this](comgui::Event const& event) { events.push_back(event); };
+        session.onProblem = [this](comgui::Error const& error) { problems.push_back(error.code); };
+    }
+
+    template <typename Condition>
+    bool Await(Condition condition)
+    {
+        for (auto const end = std::chrono::steady_clock::now() + 20s;
+             !condition() && std::chrono::steady_clock::now() < end;)
+            queue.RunFor(5ms);
+        return condition();
+    }
+    void Enter()
+    {
+        ASSERT_TRUE(session.Connection().LogIn(Here(), Admin()));
+        session.LoggedIn();
+        ASSERT_TRUE(Await([this] { return lists.size() == comgui::TicketTypes; }));
+    }
+
+    comgui::TaskQueue queue;
+    DeskSession session{queue.GetExecutor()};
+    std::vector<DeskSession::State> states;
+    std::map<int, std::vector<int>> lists;
+    std::set<comgui::TicketAddress> known;  // of which it was told that they have come
+    std::vector<comgui::Event> events;
+    std::vector<int> problems;
+};
+}  // namespace
+
+TEST_F(SessionOfTheDesk, ListsEveryTypeAfterTheLogin)
+{
+    Enter();
+    EXPECT_THAT(states, ElementsAre(DeskSession::State::LoggedIn));
+    EXPECT_THAT(lists, Contains(Pair(comgui::SystemTickets, ElementsAre(0))));
+    EXPECT_THAT(lists, Contains(Pair(comgui::UserTickets,
+                                     SizeIs(session.Tickets().List(comgui::UserTickets)->size()))));
+    EXPECT_THAT(lists, Contains(Pair(99, IsEmpty())));
+}
+
+TEST_F(SessionOfTheDesk, HearsWhatOthersDo)
+{
+    Enter();
+    LogIn();
+    comgui::TicketAddress const job = NewTicket();
+    ASSERT_TRUE(Await([this] { return !events.empty(); }));
+    auto const* const created = std::get_if<comgui::TicketCreated>(&events[0]);
+    ASSERT_NE(created, nullptr);
+    EXPECT_EQ(created->ticket, job);
+    EXPECT_THAT(known, ElementsAre(job));
+    ASSERT_TRUE(tickets.Delete(job));
+    EXPECT_TRUE(Await([this] { return known.empty(); }));
+}
+
+// Each list is older than what is heard while it is made.
+TEST_F(SessionOfTheDesk, TellsOnceMoreWhatHasComeWhileItListed)
+{
+    Enter();
+    LogIn();
+    session.onList = [this](int, std::vector<int> const&) { known.clear(); };  // as if it named none
+    comgui::TicketAddress const job = NewTicket();
+    session.List(comgui::JobTickets);
+    std::this_thread::sleep_for(200ms);  // so that the event lies before the list, or behind it
+    EXPECT_TRUE(Await([&] { return known.count(job) == 1; }));
+    queue.RunFor(100ms);
+    EXPECT_THAT(known, ElementsAre(job));
+}
+
+TEST_F(SessionOfTheDesk, ListsATypeAnew)
+{
+    Enter();
+    comgui::TicketAddress const job = *session.Tickets().Create(comgui::JobTickets);
+    session.List(comgui::JobTickets);
+    auto const& jobs = lists[comgui::JobTickets];
+    EXPECT_TRUE(Await([&] { return std::count(jobs.begin(), jobs.end(), job.id) == 1; }));
+}
+
+TEST_F(SessionOfTheDesk, WithoutALogin_TellsThatThereIsNone)
+{
+    session.ListAll();
+    EXPECT_TRUE(Await([this] { return !problems.empty(); }));
+    EXPECT_THAT(problems, ElementsAre(comgui::NotLoggedIn));
+}
+
+TEST_F(SessionOfTheDesk, AfterTheLogout_IsLoggedOut)
+{
+    Enter();
+    session.LogOut();
+    EXPECT_THAT(states, ElementsAre(DeskSession::State::LoggedIn, DeskSession::State::LoggedOut));
+    EXPECT_TRUE(Await([this] { return !session.Connection().IsLoggedIn(); }));
+}
