@@ -45,7 +45,7 @@ void KeyOutline::Show(std::vector<std::string_view> const& keys)
     m_rows = ShownBelow(Root);
 }
 
-RowChange KeyOutline::Insert(std::string_view key)
+OutlineChange KeyOutline::Insert(std::string_view key)
 {
     bool const isWanted = IsWanted(std::string(key));
     INDEX const node = FindOrMake(key);
@@ -55,12 +55,12 @@ RowChange KeyOutline::Insert(std::string_view key)
     return SetWanted(node, isWanted);
 }
 
-RowChange KeyOutline::Remove(std::string_view key)
+OutlineChange KeyOutline::Remove(std::string_view key)
 {
     INDEX const node = Find(key);
     if (node == None || !m_nodes[node].isKey)
         return {};
-    RowChange const change = SetWanted(node, false);
+    OutlineChange const change = SetWanted(node, false);
     m_nodes[node].isKey = false;
     --m_keyCount;
     DropUnused(node);
@@ -76,7 +76,7 @@ void KeyOutline::SetFilter(Filter filter)
     m_rows = ShownBelow(Root);
 }
 
-RowChange KeyOutline::Recheck(std::string_view key)
+OutlineChange KeyOutline::Recheck(std::string_view key)
 {
     INDEX const node = Find(key);
     if (node == None || !m_nodes[node].isKey)
@@ -108,7 +108,7 @@ std::optional<std::size_t> KeyOutline::ParentRow(std::size_t row) const
     return parent == Root ? std::nullopt : std::optional(PlaceOf(parent));
 }
 
-RowChange KeyOutline::Open(std::size_t row)
+OutlineChange KeyOutline::Open(std::size_t row)
 {
     INDEX const node = m_rows[row];
     if (!IsBranch(node) || IsOpen(node))
@@ -117,7 +117,7 @@ RowChange KeyOutline::Open(std::size_t row)
     return AddRowsBelow(node, row);
 }
 
-RowChange KeyOutline::Close(std::size_t row)
+OutlineChange KeyOutline::Close(std::size_t row)
 {
     INDEX const node = m_rows[row];
     if (!IsBranch(node) || !IsOpen(node))
@@ -126,9 +126,9 @@ RowChange KeyOutline::Close(std::size_t row)
     return RemoveRows(row + 1, EndOf(row));
 }
 
-RowChange KeyOutline::Toggle(std::size_t row) { return IsOpen(m_rows[row]) ? Close(row) : Open(row); }
+OutlineChange KeyOutline::Toggle(std::size_t row) { return IsOpen(m_rows[row]) ? Close(row) : Open(row); }
 
-RowChange KeyOutline::Reveal(std::string_view path)
+OutlineChange KeyOutline::Reveal(std::string_view path)
 {
     INDEX const node = Find(path);
     if (node == None || m_nodes[node].matches == 0)
@@ -140,7 +140,7 @@ RowChange KeyOutline::Reveal(std::string_view path)
             SetOpen(above, true);
             top = above;
         }
-    return top == None ? RowChange{} : AddRowsBelow(top, PlaceOf(top));
+    return top == None ? OutlineChange{} : AddRowsBelow(top, PlaceOf(top));
 }
 
 void KeyOutline::OpenAll() { SetAllOpen(true); }
@@ -335,7 +335,7 @@ std::size_t KeyOutline::EndOf(std::size_t row) const
     return row;
 }
 
-RowChange KeyOutline::SetWanted(INDEX node, bool isWanted)
+OutlineChange KeyOutline::SetWanted(INDEX node, bool isWanted)
 {
     if (std::exchange(m_nodes[node].isWanted, isWanted) == isWanted)
         return {};
@@ -352,22 +352,22 @@ RowChange KeyOutline::SetWanted(INDEX node, bool isWanted)
     return isWanted ? AddRowsOf(top) : RemoveRows(place, EndOf(place));
 }
 
-RowChange KeyOutline::AddRowsOf(INDEX top)
+OutlineChange KeyOutline::AddRowsOf(INDEX top)
 {
     std::size_t const row = PlaceOf(top);
     m_rows.insert(m_rows.begin() + static_cast<std::ptrdiff_t>(row), top);
-    RowChange const below = IsOpen(top) ? AddRowsBelow(top, row) : RowChange{};
+    OutlineChange const below = IsOpen(top) ? AddRowsBelow(top, row) : OutlineChange{};
     return {row, 0, below.added + 1};
 }
 
-RowChange KeyOutline::AddRowsBelow(INDEX node, std::size_t row)
+OutlineChange KeyOutline::AddRowsBelow(INDEX node, std::size_t row)
 {
     auto const rows = ShownBelow(node);
     m_rows.insert(m_rows.begin() + static_cast<std::ptrdiff_t>(row) + 1, rows.begin(), rows.end());
     return {row + 1, 0, rows.size()};
 }
 
-RowChange KeyOutline::RemoveRows(std::size_t first, std::size_t end)
+OutlineChange KeyOutline::RemoveRows(std::size_t first, std::size_t end)
 {
     m_rows.erase(m_rows.begin() + static_cast<std::ptrdiff_t>(first),
                  m_rows.begin() + static_cast<std::ptrdiff_t>(end));

@@ -25,7 +25,7 @@ struct OutlineRow
 };
 
 // What a list must be told: from that row on, so many went, then so many came in their place.
-struct RowChange
+struct OutlineChange
 {
     std::size_t row = 0;
     std::size_t removed = 0;
@@ -48,8 +48,8 @@ public:
 
     // One key comes or goes; O(rows), and O(keys beside it). No change of rows if it only makes a branch a
     // key, or a key that is a branch no key any more.
-    RowChange Insert(std::string_view key);
-    RowChange Remove(std::string_view key);
+    OutlineChange Insert(std::string_view key);
+    OutlineChange Remove(std::string_view key);
 
     // Only keys that the filter wants, with the branches above them; an empty function: all. While a filter
     // is there, branches are open until they are closed; without it they are as they were before.
@@ -57,7 +57,7 @@ public:
     bool IsFiltered() const { return static_cast<bool>(m_filter); }
 
     // Asks the filter about that key once more, since its value has changed.
-    RowChange Recheck(std::string_view key);
+    OutlineChange Recheck(std::string_view key);
 
     std::size_t RowCount() const { return m_rows.size(); }
     std::size_t KeyCount() const { return m_keyCount; }
@@ -71,10 +71,10 @@ public:
     std::optional<std::size_t> ParentRow(std::size_t row) const;  // nothing at the left edge
 
     // O(rows). Nothing changes in a row that is no branch.
-    RowChange Open(std::size_t row);
-    RowChange Close(std::size_t row);
-    RowChange Toggle(std::size_t row);
-    RowChange Reveal(std::string_view path);  // opens every branch above it
+    OutlineChange Open(std::size_t row);
+    OutlineChange Close(std::size_t row);
+    OutlineChange Toggle(std::size_t row);
+    OutlineChange Reveal(std::string_view path);  // opens every branch above it
 
     void OpenAll();
     void CloseAll();
@@ -123,10 +123,10 @@ private:
     std::size_t PlaceOf(INDEX node) const;  // of its row, or where that would be
     std::size_t EndOf(std::size_t row) const;
 
-    RowChange SetWanted(INDEX node, bool isWanted);
-    RowChange AddRowsOf(INDEX top);
-    RowChange AddRowsBelow(INDEX node, std::size_t row);
-    RowChange RemoveRows(std::size_t first, std::size_t end);
+    OutlineChange SetWanted(INDEX node, bool isWanted);
+    OutlineChange AddRowsOf(INDEX top);
+    OutlineChange AddRowsBelow(INDEX node, std::size_t row);
+    OutlineChange RemoveRows(std::size_t first, std::size_t end);
     void CountMatches();
     void Prune();
 

@@ -69,7 +69,8 @@ wxString SentenceOf(Exported const& done)
     if (done.trouble.index() != 0)
         return TextOf(done.trouble);
     if (done.losses.empty())
-        return wxString::Format(wxPLURAL("Exported: %zu key", "Exported: %zu keys", done.keys), done.keys);
+        return wxString::Format(
+            wxPLURAL("Exported: %zu key", "Exported: %zu keys", static_cast<unsigned>(done.keys)), done.keys);
     return wxString::Format(_("Exported, but the file does not hold all of it as it is: %s and %zu more"),
                             comgui::ToWx(done.losses[0].key), done.losses.size() - 1);
 }
@@ -109,7 +110,8 @@ wxString SentenceOf(Imported const& done)
     if (done.trouble.index() != 0)
         return TextOf(done.trouble);
     if (done.refused == 0)
-        return wxString::Format(wxPLURAL("Imported: %zu key", "Imported: %zu keys", done.keys), done.keys);
+        return wxString::Format(
+            wxPLURAL("Imported: %zu key", "Imported: %zu keys", static_cast<unsigned>(done.keys)), done.keys);
     return wxString::Format(_("Imported, but %zu keys were refused, the first of them %s"), done.refused,
                             comgui::ToWx(done.refusedKey));
 }

@@ -42,7 +42,7 @@ KeyOutline AllOpen(std::vector<std::string_view> const& keys)
 }
 
 // What a list makes of a change; it must end with the rows that the outline has.
-void Follow(Rows& rows, RowChange change, KeyOutline const& outline)
+void Follow(Rows& rows, OutlineChange change, KeyOutline const& outline)
 {
     auto const first = rows.begin() + static_cast<std::ptrdiff_t>(change.row);
     rows.erase(first, first + static_cast<std::ptrdiff_t>(change.removed));
