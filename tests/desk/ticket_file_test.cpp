@@ -3,6 +3,7 @@
 #include "desk/model/SavedFile.h"
 #include "desk/model/FileContent.h"
 #include "desk/model/TicketStream.h"
+#include "tests/client/Client.h"
 #include "tests/desk/FileFacts.h"
 #include "tests/support/HexText.h"
 #include "tests/support/TemporaryFolder.h"
@@ -169,4 +170,28 @@ TEST(TicketLosses, OfWhatOnlyTheFileHas_AreAdded)
 TEST(TicketLosses, OfAStreamWithoutBytes_IsThatItCannotBeRead)
 {
     EXPECT_EQ(TroubleOf(LossesOf(Snapshot(), Stream({}))), FileTrouble::Empty);
+}
+
+using TicketOfAServer = Client;
+
+TEST_F(TicketOfAServer, AsXml_LosesNothing)
+{
+    LogIn();
+    TicketAddress const ticket = NewTicket();
+    std::vector<KeyValue> values{{"A/Path", "$(JOB)/7/page.pdf"}, {"A/Unsigned", 7U}, {"A/Whole", 3.0}};
+    Snapshot const plain = PlainTicket();
+    for (auto const& [key, value] : plain.Entries())
+        if (value != Value(Bytes{}))  // the server takes no bytes without any
+            values.push_back({key, value});
+    for (Outcome const& outcome : tickets.WriteAll(ticket, values, Paths::AsStored))
+        ASSERT_TRUE(outcome) << outcome.GetError().Text();
+    Snapshot const stored = *tickets.ReadAll(ticket, Paths::AsStored);
+    ASSERT_EQ(stored.Entries().size(), values.size());
+
+    std::string const xml = *tickets.ToXml(ticket);
+    auto const losses = LossesOf(stored, xml);
+    ASSERT_EQ(TroubleOf(losses), std::nullopt) << FaultOf(losses).detail;
+    for (FileLoss const& loss : std::get<std::vector<FileLoss>>(losses))
+        ADD_FAILURE() << loss.key;
+    EXPECT_EQ(std::get<TicketOfFile>(TicketOfBytes(xml, "ticket.xml")).address, ticket);
 }
