@@ -82,8 +82,8 @@ NiceScale::NiceScale(double low, double high, int pixels, int room, Quantity qua
     m_digits = DigitsOf(step);
     double const first = std::floor(low / m_unit / step + Finest);
     double const last = std::max(std::ceil(high / m_unit / step - Finest), first + 1);
-    for (double tick = first; tick <= last; ++tick)
-        m_ticks.push_back(tick * step * m_unit);
+    for (int i = 0; i <= static_cast<int>(last - first); ++i)
+        m_ticks.push_back((first + i) * step * m_unit);
 }
 
 ScaledNumber NiceScale::Label(double tick) const

@@ -1,6 +1,7 @@
 #include "desk/view/ChartPainter.h"
 
 #include <algorithm>
+#include <cmath>
 #include <wx/arrstr.h>
 #include <wx/brush.h>
 #include <wx/pen.h>
@@ -22,6 +23,7 @@ ChartPainter::ChartPainter(wxGraphicsContext& context, wxSize size, ChartPalette
     double descent = 0;
     double leading = 0;
     m_context.GetTextExtent("Ag", &width, &m_lineHeight, &descent, &leading);
+    m_context.EnableOffset(false);  // places here are the middles of pixels where it matters
     m_context.Clip(0, 0, m_width, m_height);
     Box(Area(), palette.back);
 }
@@ -59,9 +61,13 @@ void ChartPainter::Box(wxRect2DDouble box, Rgb fill, std::optional<Rgb> outline)
     m_context.DrawRectangle(box.m_x + 0.5, box.m_y + 0.5, box.m_width - 1, box.m_height - 1);
 }
 
-void ChartPainter::Line(wxPoint2DDouble from, wxPoint2DDouble to, Rgb colour, double width)
+void ChartPainter::Line(wxPoint2DDouble from, wxPoint2DDouble to, Rgb colour)
 {
-    Curve({from, to}, colour, width);
+    if (from.m_x == to.m_x)
+        from.m_x = to.m_x = std::floor(from.m_x) + 0.5;
+    if (from.m_y == to.m_y)
+        from.m_y = to.m_y = std::floor(from.m_y) + 0.5;
+    Curve({from, to}, colour, 1);
 }
 
 wxGraphicsPath ChartPainter::PathOf(std::vector<wxPoint2DDouble> const& points) const

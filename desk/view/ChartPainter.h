@@ -32,7 +32,7 @@ public:
     double WidthOf(wxString const& text) const;
 
     void Box(wxRect2DDouble box, Rgb fill, std::optional<Rgb> outline = {});
-    void Line(wxPoint2DDouble from, wxPoint2DDouble to, Rgb colour, double width = 1);
+    void Line(wxPoint2DDouble from, wxPoint2DDouble to, Rgb colour);  // sharp if it is level or upright
     void Curve(std::vector<wxPoint2DDouble> const& points, Rgb colour, double width);
 
     // strength: 1 covers what lies below, 0 leaves it.

@@ -58,7 +58,8 @@ void ChartWindow::Paint(wxGraphicsContext& context, wxSize size, ChartPalette co
 
 wxBitmap ChartWindow::Picture(wxSize size, ChartPalette const& palette, bool isFocused) const
 {
-    wxBitmap picture(size, 24);
+    wxBitmap picture;
+    picture.Create(size, 24);
     wxMemoryDC dc(picture);
     std::unique_ptr<wxGraphicsContext> const context(wxGraphicsContext::Create(dc));
     if (context)

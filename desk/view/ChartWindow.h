@@ -19,6 +19,9 @@ public:
     // What the window shows at that size, whether it is visible or not.
     wxBitmap Picture(wxSize size, ChartPalette const& palette, bool isFocused = false) const;
 
+    // The same, into the corner of something larger.
+    void Paint(wxGraphicsContext& context, wxSize size, ChartPalette const& palette, bool isFocused) const;
+
     // Whether begin is on the right; as the parent says, unless changed.
     bool IsMirrored() const { return m_isMirrored; }
     void SetMirrored(bool isMirrored);
@@ -30,8 +33,6 @@ protected:
     void Changed();  // paints anew
 
 private:
-    void Paint(wxGraphicsContext& context, wxSize size, ChartPalette const& palette, bool isFocused) const;
-
     bool m_isMirrored;
 };
 }  // namespace desk

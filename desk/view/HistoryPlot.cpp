@@ -110,8 +110,9 @@ wxRect2DDouble HistoryPlot::DrawHeading(ChartPainter& painter) const
     for (std::size_t i = 0; i < m_lines.size(); ++i)
     {
         PlotLine const& line = m_lines[i];
-        wxString const text =
-            line.series.IsEmpty() ? line.name : line.name + ": " + line.text(line.series.Last());
+        wxString const last = line.series.IsEmpty() ? wxString() : line.text(line.series.Last());
+        wxString const whole = last.empty() ? line.name : line.name + ": " + last;
+        wxString const text = last.empty() || painter.WidthOf(whole) <= width ? whole : last;
         painter.Text(text, {area.m_x + width * static_cast<double>(i), area.m_y, width, painter.LineHeight()},
                      i == 0 ? TextSide::Begin : TextSide::End, painter.Palette().lines[i]);
     }

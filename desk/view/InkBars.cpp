@@ -1,9 +1,8 @@
 #include "desk/view/InkBars.h"
 
-#include "desk/model/DisplayText.h"
 #include "desk/view/NumberText.h"
+#include "desk/view/ShownText.h"
 #include <algorithm>
-#include <comgui/client/Text.h>
 #include <wx/intl.h>
 
 namespace desk
@@ -25,8 +24,8 @@ void InkBars::Take(InkCoverage const& coverage)
     m_greatest = 100;
     for (Ink const& ink : coverage.Inks())
     {
-        m_bars.push_back({comgui::ToWx(DisplayText(ink.name, NameLength)), PercentText(ink.coverage),
-                          ink.coverage, ink.colour});
+        m_bars.push_back(
+            {ShownText(ink.name, NameLength), PercentText(ink.coverage), ink.coverage, ink.colour});
         m_greatest = std::max(m_greatest, ink.coverage);
     }
     m_total = PercentText(coverage.Total());

@@ -1,6 +1,6 @@
 #include "desk/view/JobOptionsDialog.h"
 
-#include "desk/model/DisplayText.h"
+#include "desk/view/ShownText.h"
 #include <comgui/client/Text.h>
 #include <wx/choice.h>
 #include <wx/filename.h>
@@ -53,7 +53,7 @@ JobOptionsDialog::JobOptionsDialog(wxWindow* parent, std::vector<std::string> co
     m_queue->SetName("queue");
     m_queue->Append(_("As the server chooses"));
     for (JobQueue const& queue : m_queues)
-        m_queue->Append(comgui::ToWx(DisplayText(queue.name, QueueName)));
+        m_queue->Append(ShownText(queue.name, QueueName));
     m_queue->SetSelection(0);
     m_copies->SetName("copies");
 

@@ -1,8 +1,8 @@
 #include "desk/view/JobsPane.h"
 
-#include "desk/model/DisplayText.h"
 #include "desk/view/HistoryPlot.h"
 #include "desk/view/NumberText.h"
+#include "desk/view/ShownText.h"
 #include <comgui/client/Text.h>
 #include <wx/button.h>
 #include <wx/dnd.h>
@@ -62,13 +62,13 @@ wxString StateText(JobRow const& row)
     case JobState::Cancelled:
         return _("Cancelled");
     default:
-        return wxString::Format(_("Failed: %s"), comgui::ToWx(DisplayText(row.error.Text())));
+        return wxString::Format(_("Failed: %s"), ShownText(row.error.Text()));
     }
 }
 
 wxString RefusalText(RefusedPath const& path)
 {
-    wxString const name = comgui::ToWx(DisplayText(path.path, NameLength));
+    wxString const name = ShownText(path.path, NameLength);
     switch (path.why)
     {
     case Refusal::Folder:
@@ -108,6 +108,7 @@ JobsPane::JobsPane(wxWindow* parent, JobBoard const& board)
     // A dialog within the drop would keep the program waiting that files come from.
     SetDropTarget(new FileDrop([this](std::vector<std::string> const& paths)
                                { CallAfter([this, paths] { Send(paths); }); }));
+    m_haveRowsChanged = true;
     ShowBoard();
 }
 
@@ -166,15 +167,14 @@ void JobsPane::Arrange()
     SetSizer(all);
 }
 
-unsigned JobsPane::RowCount() const { return static_cast<unsigned>(m_board.Count()); }
-
 wxVariant JobsPane::Cell(unsigned index, unsigned column) const
 {
-    JobRow const& row = m_board.At(index);
+    JobRow const none;
+    JobRow const& row = index < m_board.Count() ? m_board.At(index) : none;  // has just gone
     switch (column)
     {
     case NameColumn:
-        return comgui::ToWx(DisplayText(row.name, NameLength));
+        return ShownText(row.name, NameLength);
     case ProgressColumn:
         return static_cast<long>(row.percent.value_or(0));
     case StateColumn:
@@ -202,6 +202,7 @@ void JobsPane::ShowBoard()
         m_haveRowsChanged = false;
         auto const chosen = m_chosen;  // rows move, what is chosen stays
         m_list->UnselectAll();
+        m_count = static_cast<unsigned>(m_board.Count());
         m_list->Reset();
         if (chosen && m_board.Find(*chosen))
             Choose(*chosen);

@@ -57,7 +57,7 @@ private:
         RestColumn,
     };
 
-    unsigned RowCount() const override;
+    unsigned RowCount() const override { return m_count; }
     wxVariant Cell(unsigned row, unsigned column) const override;
 
     void MakeList();
@@ -68,6 +68,7 @@ private:
     wxString NoteOn(std::vector<RefusedPath> const& refused) const;
 
     JobBoard const& m_board;
+    unsigned m_count = 0;  // of rows that the list knows of; the board may be ahead of it
     std::optional<RowNumber> m_chosen;
     bool m_haveRowsChanged = false;
     wxTimer m_repaint;

@@ -31,6 +31,7 @@ bool Contains(std::string_view text, std::string const& part) { return TextMatch
 KeysPane::KeysPane(wxWindow* parent) : wxPanel(parent)
 {
     m_heading = new wxStaticText(this, wxID_ANY, {});
+    m_heading->SetName("heading");
     m_heading->SetFont(m_heading->GetFont().Bold());
     m_filter = new wxSearchCtrl(this, wxID_ANY);
     m_filter->SetName("filter of keys");

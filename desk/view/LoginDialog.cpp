@@ -29,6 +29,8 @@ LoginDialog::LoginDialog(wxWindow* parent, comgui::Connection& connection, comgu
     m_test = new wxButton(this, wxID_ANY, _("&Test"));
     m_logIn = new wxButton(this, wxID_OK, _("&Log in"));
     m_message = new wxStaticText(this, wxID_ANY, {});
+    SetName("login");
+    m_message->SetName("message");
     m_serverField->SetName("server");
     m_userField->SetName("user");
     m_passwordField->SetName("password");

@@ -54,6 +54,7 @@ MainFrame::~MainFrame() { m_settings.Keep(*this, WindowName); }
 void MainFrame::MakePanes()
 {
     m_info = new wxInfoBar(this);
+    m_info->SetName("info");
     auto* const whole =
         new wxSplitterWindow(this, wxID_ANY, wxDefaultPosition, wxDefaultSize, wxSP_LIVE_UPDATE);
     m_tickets = new TicketsPane(whole, m_index, [this](auto ticket) { return m_titles.TitleOf(ticket); });
@@ -70,7 +71,7 @@ void MainFrame::MakePanes()
     for (wxSplitterWindow* const each : {whole, right, m_middle})
         each->SetMinimumPaneSize(FromDIP(120));
     whole->SplitVertically(m_tickets, right, FromDIP(320));
-    right->SplitHorizontally(m_middle, m_below, FromDIP(460));
+    right->SplitHorizontally(m_middle, m_below, -FromDIP(260));
     right->SetSashGravity(0.7);
     m_middle->SetSashGravity(1);
     m_inks->Hide();
@@ -189,9 +190,8 @@ void MainFrame::Connect()
     m_transfers->onSend = [this](auto const& files, auto const& options) { Send(files, options); };
     m_transfers->onCancel = [this](JobRow const& row)
     {
-        for (comgui::Transfer transfer : m_session.Connection().GetTransfers().Running())
-            if (transfer.Number() == row.transfer)
-                transfer.Cancel();
+        if (auto const sent = m_sent.find(row.transfer.value_or(0)); sent != m_sent.end())
+            sent->second.Cancel();
     };
     m_transfers->onOpen = [this](int job) { m_tickets->Choose({comgui::JobTickets, job}); };
     m_transfers->queues = [this] { return Queues(); };
@@ -242,6 +242,7 @@ void MainFrame::ForgetTickets()
     m_editor.Clear();
     m_index.Clear();
     m_jobs.Clear();
+    m_sent.clear();
     m_tickets->Clear();
     m_keys->ShowTicket({});
     m_transfers->Take(JobBoard::Change::Rows);
@@ -276,11 +277,15 @@ void MainFrame::Repaint()
 void MainFrame::TakeJobs(comgui::TransferProgressed const& event)
 {
     m_transfers->Take(m_jobs.Take(event, Now()));
+    auto const sent = m_sent.find(event.transfer);
+    if (auto const job = sent == m_sent.end() ? std::nullopt : sent->second.Job())
+        m_transfers->Take(m_jobs.Identify(event.transfer, *job));
 }
 
 void MainFrame::TakeJobs(comgui::TransferEnded const& event)
 {
     m_transfers->Take(m_jobs.Take(event, Now()));
+    m_sent.erase(event.transfer);
     if (!event.outcome && event.outcome.GetError().code != comgui::Cancelled)
         Say(comgui::ToWx(event.outcome.GetError().Text()));
 }
@@ -446,8 +451,11 @@ void MainFrame::Send(std::vector<std::string> const& files, comgui::JobOptions c
 {
     m_below->SetSelection(1);
     for (std::string const& file : files)
-        m_jobs.Add(m_session.Connection().GetTransfers().SendJob(file, options), Now());
-    m_transfers->Take(JobBoard::Change::Rows);
+    {
+        comgui::Transfer const transfer = m_session.Connection().GetTransfers().SendJob(file, options);
+        m_transfers->Take(m_jobs.Add(transfer, Now()));
+        m_sent.insert_or_assign(transfer.Number(), transfer);
+    }
 }
 
 bool MainFrame::IsForeignOverwritten(std::vector<EditWrite> const& foreign)

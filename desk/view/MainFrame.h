@@ -10,6 +10,7 @@
 #include "desk/model/TitleReader.h"
 #include "desk/view/JobOptionsDialog.h"
 #include "desk/view/Settings.h"
+#include <map>
 #include <optional>
 #include <string>
 #include <vector>
@@ -82,6 +83,7 @@ private:
     Settings m_settings;
     TicketIndex m_index;
     JobBoard m_jobs;
+    std::map<int, comgui::Transfer> m_sent;  // on their way, by number
     InkCoverage m_coverage;
     comgui::Executor const m_here;
     DeskSession m_session;

@@ -13,8 +13,8 @@ namespace desk
 namespace
 {
 // Those that somebody can type; a list is one of texts.
-constexpr PARAM_TYPE Types[] = {PARAM_STRING,   PARAM_INT,    PARAM_DOUBLE, PARAM_INT64,
-                                PARAM_UNSIGNED, PARAM_UNSIGNED64, PARAM_BINSTRING,  PARAM_COUNT};
+constexpr PARAM_TYPE Types[] = {PARAM_STRING,   PARAM_INT,        PARAM_DOUBLE,    PARAM_INT64,
+                                PARAM_UNSIGNED, PARAM_UNSIGNED64, PARAM_BINSTRING, PARAM_COUNT};
 }  // namespace
 
 NewKeyDialog::NewKeyDialog(wxWindow* parent, std::string const& beside)

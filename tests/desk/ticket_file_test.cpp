@@ -1,7 +1,7 @@
 #include "desk/model/TicketFile.h"
 
-#include "desk/model/SavedFile.h"
 #include "desk/model/FileContent.h"
+#include "desk/model/SavedFile.h"
 #include "desk/model/TicketStream.h"
 #include "tests/client/Client.h"
 #include "tests/desk/FileFacts.h"

@@ -1,0 +1,77 @@
+// A search beside whatever else the worker has to do.
+#include "desk/model/SearchRun.h"
+
+#include "tests/client/Client.h"
+#include <algorithm>
+#include <gmock/gmock.h>
+
+using namespace desk;
+using namespace std::chrono_literals;
+using testing::ElementsAre;
+using testing::IsEmpty;
+
+namespace
+{
+class SearchAtAServer : public Client
+{
+protected:
+    SearchAtAServer()
+    {
+        LogIn();
+        for (int i = 0; i < 120; ++i)
+            jobs.push_back(NewTicket());
+        EXPECT_TRUE(tickets.Write(jobs[7], "Job/Note", "find me"));
+        EXPECT_TRUE(tickets.Write(jobs[110], "Job/Find Me", 1));
+    }
+
+    std::unique_ptr<SearchRun> Search(std::string const& text)
+    {
+        return std::make_unique<SearchRun>(worker, tickets, SearchQuery{text}, jobs,
+                                           [this](SearchBatch const& batch)
+                                           {
+                                               last = batch;
+                                               for (SearchMatch const& match : batch.matches)
+                                                   found.push_back(match.ticket);
+                                           });
+    }
+    void AwaitEnd()
+    {
+        for (auto const end = std::chrono::steady_clock::now() + 20s;
+             last.state == SearchState::Running && std::chrono::steady_clock::now() < end;)
+            queue.RunFor(2ms);
+    }
+
+    comgui::TaskQueue queue;
+    comgui::Worker const worker{queue.GetExecutor()};
+    std::vector<comgui::TicketAddress> jobs;
+    std::vector<comgui::TicketAddress> found;
+    SearchBatch last;
+};
+}  // namespace
+
+TEST_F(SearchAtAServer, FindsKeysAndValues)
+{
+    auto const search = Search("find me");
+    AwaitEnd();
+    EXPECT_THAT(found, ElementsAre(jobs[7], jobs[110]));
+    EXPECT_EQ(last.state, SearchState::Finished);
+    EXPECT_EQ(last.done, jobs.size());
+}
+
+TEST_F(SearchAtAServer, LetsOtherWorkInBetween)
+{
+    auto const search = Search("find me");
+    std::optional<std::size_t> doneThen;
+    worker.Do([] {}, [&] { doneThen = last.done; });
+    AwaitEnd();
+    ASSERT_TRUE(doneThen);
+    EXPECT_LT(*doneThen, jobs.size());
+}
+
+TEST_F(SearchAtAServer, AtItsEnd_TellsNothing)
+{
+    Search("find me").reset();
+    queue.RunFor(200ms);
+    EXPECT_THAT(found, IsEmpty());
+    EXPECT_EQ(last.total, 0u);
+}
