@@ -7,6 +7,7 @@
 #include <array>
 #include <deque>
 #include <limits>
+#include <optional>
 
 namespace comgui
 {
@@ -84,16 +85,20 @@ public:
 
     explicit operator bool() const { return m_ticket != nullptr; }
 
-    // Calls take(key, type, word, pos), which returns whether to go on, for each value whose key begins so.
+    // Calls take(key, type, word, pos) for each value whose key begins so. Whether the plug-in has walked.
     template <typename Take>
-    void Walk(char const* prefix, Take take) const
+    bool Walk(char const* prefix, Take& take) const
     {
         constexpr int Everything = 8000;  // what the library asks for
-        m_ticket->SWALKPARAMETERS(
-            m_ticket->Instance,
-            [](void* context, char const* key, PARAM_TYPE type, void const* word, int pos)
-            { return !detail::IsParameter(type) || (*static_cast<Take*>(context))(key, type, word, pos); },
-            &take, prefix, Everything);
+        return m_ticket->SWALKPARAMETERS(
+                   m_ticket->Instance,
+                   [](void* context, char const* key, PARAM_TYPE type, void const* word, int pos)
+                   {
+                       if (detail::IsParameter(type))
+                           (*static_cast<Take*>(context))(key, type, word, pos);
+                       return true;
+                   },
+                   &take, prefix, Everything) != 0;
     }
 
 private:
@@ -101,6 +106,65 @@ private:
     TicketAddress const m_address;
     STICKET_ACCESS const* m_ticket = nullptr;
 };
+
+Error NotLoggedInError() { return {NotLoggedIn, {}, {}}; }
+
+bool NoteTicket(void* isThere, int, int, STICKET_ACCESS const*)
+{
+    *static_cast<bool*>(isThere) = true;
+    return false;
+}
+
+// Whether a walk over the tickets of that type begins; isThere: whether there are any.
+bool Walks(MTICKET_ACCESS const* container, int type, bool& isThere)
+{
+    return container->MWALKTICKETS(container->Instance, NoteTicket, &isThere, type) != 0 || isThere;
+}
+
+// Why the container's session cannot be asked any more, if so. Slots answer alike for what is not there and
+// after the end of their session; a walk that the end cuts even answers that it has walked.
+std::optional<Error> EndOf(Client const& client, MTICKET_ACCESS const* container)
+{
+    MTICKET_ACCESS const* const now = client.Container();
+    if (!now)
+        return NotLoggedInError();
+    bool isThere = false;
+    if (now != container || !Walks(container, SystemTickets, isThere))
+        return Error{ServerAway, {}, {}};
+    return std::nullopt;
+}
+
+// What a refused call has failed for: the end of the session or its server, which matters more, or that
+// error.
+Error CauseOf(Client const& client, MTICKET_ACCESS const* container, Error error)
+{
+    if (auto end = EndOf(client, container))
+        return *std::move(end);
+    return client.IsServerThere() ? error : Error{ServerAway, {}, {}};
+}
+
+Error MissingTicket(Client& client, MTICKET_ACCESS const* container, TicketAddress ticket)
+{
+    return CauseOf(client, container, client.Failure(NoSuchTicket, NameOf(ticket)));
+}
+
+// Walks over a ticket that nobody has opened yet: see OpenedTicket. A success: over all of it.
+template <typename Take>
+Outcome WalkTicket(Client& client, MTICKET_ACCESS const* container, TicketAddress ticket, char const* prefix,
+                   Take take)
+{
+    OpenedTicket const opened(container, ticket);
+    if (!opened)
+        return MissingTicket(client, container, ticket);
+    bool const hasWalked = opened.Walk(prefix, take);
+    Error const refused = hasWalked ? Error() : client.Failure(BadAnswer, NameOf(ticket));
+    if (auto end = EndOf(client, container))
+        return *std::move(end);
+    if (hasWalked)
+        return {};
+    // Deleted meanwhile, or refused.
+    return OpenedTicket(container, ticket) ? refused : MissingTicket(client, container, ticket);
+}
 
 // One value after another, in the order of a walk.
 void AddValue(Value& value, int pos, Value&& next)
@@ -174,8 +238,9 @@ Value ReadScalar(MTICKET_ACCESS const* container, TicketAddress ticket, char con
 
 Error MissingValue(Client& client, MTICKET_ACCESS const* container, TicketAddress ticket, char const* key)
 {
-    return OpenedTicket(container, ticket) ? client.Failure(NoSuchKey, NameOf(ticket, key))
-                                           : client.Failure(NoSuchTicket, NameOf(ticket));
+    if (!OpenedTicket(container, ticket))
+        return MissingTicket(client, container, ticket);
+    return CauseOf(client, container, client.Failure(NoSuchKey, NameOf(ticket, key)));
 }
 
 // Whatever lies there, as stored.
@@ -188,14 +253,15 @@ Result<Value> ReadStored(Client& client, MTICKET_ACCESS const* container, Ticket
     Value value;
     if (type != PARAM_COUNT)
         value = ReadScalar(container, ticket, key, static_cast<PARAM_TYPE>(type), pos);
-    else if (OpenedTicket const opened(container, ticket); opened)
-        opened.Walk(key,
-                    [&value, key](char const* name, PARAM_TYPE each, void const* word, int place)
-                    {
-                        if (std::string_view(name) == key)
-                            AddValue(value, place, detail::ValueOf(each, word));
-                        return true;
-                    });
+    else if (Outcome const walked =
+                 WalkTicket(client, container, ticket, key,
+                            [&value, key](char const* name, PARAM_TYPE each, void const* word, int place)
+                            {
+                                if (std::string_view(name) == key)
+                                    AddValue(value, place, detail::ValueOf(each, word));
+                            });
+             !walked)
+        return walked.GetError();
     if (value.IsNone())
         return MissingValue(client, container, ticket, key);  // deleted meanwhile
     return value;
@@ -271,26 +337,18 @@ private:
     std::deque<BIN_STRING> m_bytes;
 };
 
-Error NotLoggedInError() { return {NotLoggedIn, {}, {}}; }
-
 Error RefusedWrite(Client& client, MTICKET_ACCESS const* container, TicketAddress ticket, char const* key)
 {
     Error error = client.Failure(WriteRefused, NameOf(ticket, key));  // first: it is of the last refusal
     if (!OpenedTicket(container, ticket))
-        return {NoSuchTicket, NameOf(ticket), {}};
-    return error;
+        return MissingTicket(client, container, ticket);
+    return CauseOf(client, container, std::move(error));
 }
 
 bool AddTicket(void* tickets, int type, int id, STICKET_ACCESS const*)
 {
     static_cast<std::vector<TicketAddress>*>(tickets)->push_back({type, id});
     return true;
-}
-
-bool NoteTicket(void* isThere, int, int, STICKET_ACCESS const*)
-{
-    *static_cast<bool*>(isThere) = true;
-    return false;
 }
 }  // namespace
 
@@ -303,10 +361,12 @@ Result<std::vector<int>> Tickets::Types() const
     for (int type = 0; type < TicketTypes; ++type)
     {
         bool isThere = false;
-        container->MWALKTICKETS(container->Instance, NoteTicket, &isThere, type);
+        Walks(container, type, isThere);
         if (isThere)
             types.push_back(type);
     }
+    if (auto end = EndOf(*m_client, container))
+        return *std::move(end);
     return types;
 }
 
@@ -316,7 +376,9 @@ Result<std::vector<TicketAddress>> Tickets::List(int type) const
     if (!container)
         return NotLoggedInError();
     std::vector<TicketAddress> tickets;
-    container->MWALKTICKETS(container->Instance, AddTicket, &tickets, type);
+    container->MWALKTICKETS(container->Instance, AddTicket, &tickets, type);  // refused: no such type
+    if (auto end = EndOf(*m_client, container))
+        return *std::move(end);
     return tickets;
 }
 
@@ -328,7 +390,7 @@ Result<TicketAddress> Tickets::Create(int type) const
     int id = TICKET_ID_NONE;
     if (!container->MOPERATION(container->Instance, type, TICKET_ID_NEXT, MTICKET_OP_CREATE_NEXT, &id) ||
         id < 0)
-        return m_client->Failure(CreateRefused, std::to_string(type));
+        return CauseOf(*m_client, container, m_client->Failure(CreateRefused, std::to_string(type)));
     return TicketAddress{type, id};
 }
 
@@ -340,9 +402,9 @@ Outcome Tickets::Delete(TicketAddress ticket) const
     if (container->MOPERATION(container->Instance, ticket.type, ticket.id, MTICKET_OP_DELETE, nullptr))
         return {};
     Error error = m_client->Failure(DeleteRefused, NameOf(ticket));
-    if (!Exists(ticket))
-        return Error{NoSuchTicket, NameOf(ticket), {}};
-    return error;
+    if (!OpenedTicket(container, ticket))
+        return MissingTicket(*m_client, container, ticket);
+    return CauseOf(*m_client, container, std::move(error));
 }
 
 bool Tickets::Exists(TicketAddress ticket) const
@@ -356,24 +418,20 @@ Result<std::vector<KeyInfo>> Tickets::Keys(TicketAddress ticket) const
     MTICKET_ACCESS const* const container = m_client->Container();
     if (!container)
         return NotLoggedInError();
-    OpenedTicket const opened(container, ticket);
-    if (!opened)
-        return m_client->Failure(NoSuchTicket, NameOf(ticket));
     std::vector<KeyInfo> keys;
-    opened.Walk("",
-                [&keys](char const* key, PARAM_TYPE type, void const*, int pos)
-                {
-                    if (keys.empty() || keys.back().key != key)
-                        keys.push_back({key, type, PARAM_NONE, 0});
-                    KeyInfo& info = keys.back();
-                    if (++info.count == 2 || pos > 0)
-                    {
-                        info.elementType = info.type == PARAM_COUNT ? info.elementType : info.type;
-                        info.type = PARAM_COUNT;
-                    }
-                    return true;
-                });
-    return keys;
+    auto const take = [&keys](char const* key, PARAM_TYPE type, void const*, int pos)
+    {
+        if (keys.empty() || keys.back().key != key)
+            keys.push_back({key, type, PARAM_NONE, 0});
+        KeyInfo& info = keys.back();
+        if (++info.count == 2 || pos > 0)
+        {
+            info.elementType = info.type == PARAM_COUNT ? info.elementType : info.type;
+            info.type = PARAM_COUNT;
+        }
+    };
+    Outcome const walked = WalkTicket(*m_client, container, ticket, "", take);
+    return walked ? Result<std::vector<KeyInfo>>(std::move(keys)) : walked.GetError();
 }
 
 Result<Snapshot> Tickets::ReadAll(TicketAddress ticket, Paths paths) const
@@ -381,18 +439,15 @@ Result<Snapshot> Tickets::ReadAll(TicketAddress ticket, Paths paths) const
     MTICKET_ACCESS const* const container = m_client->Container();
     if (!container)
         return NotLoggedInError();
-    OpenedTicket const opened(container, ticket);
-    if (!opened)
-        return m_client->Failure(NoSuchTicket, NameOf(ticket));
     std::vector<SnapshotEntry> entries;
-    opened.Walk("",
-                [&entries](char const* key, PARAM_TYPE type, void const* word, int pos)
-                {
-                    if (entries.empty() || entries.back().key != key)
-                        entries.push_back({key, {}});
-                    AddValue(entries.back().value, pos, detail::ValueOf(type, word));
-                    return true;
-                });
+    auto const take = [&entries](char const* key, PARAM_TYPE type, void const* word, int pos)
+    {
+        if (entries.empty() || entries.back().key != key)
+            entries.push_back({key, {}});
+        AddValue(entries.back().value, pos, detail::ValueOf(type, word));
+    };
+    if (Outcome const walked = WalkTicket(*m_client, container, ticket, "", take); !walked)
+        return walked.GetError();
     if (paths == Paths::Resolved)
         for (auto const* const folders = FoldersOf(container); SnapshotEntry & entry : entries)
             ForEachText(entry.value, [folders](std::string& text) { Resolve(folders, text); });

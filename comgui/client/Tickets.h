@@ -1,6 +1,7 @@
 // Reads and writes the tickets of a connection's session. A handle: copies are the same. For any thread,
-// several at once. Without a session every operation answers NotLoggedIn; a read that is under way during a
-// logout fails or gives what was there before.
+// several at once. Without a session every operation answers NotLoggedIn, and ServerAway where the session is
+// lost or replaced; a read that is under way during a logout fails or gives what was there before, as a
+// whole.
 #pragma once
 
 #include "comgui/client/Snapshot.h"

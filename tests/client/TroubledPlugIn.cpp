@@ -47,7 +47,9 @@ int Login(void* hInstance, TLogin* login)
 
 MTICKET_ACCESS const* GetClientContainer(void* hInstance, void* hSession)
 {
-    return trouble.hasNoContainer ? nullptr : real.GetClientContainerEntry(hInstance, hSession);
+    return trouble.hasNoContainer
+               ? nullptr
+               : Troubled(real.GetClientContainerEntry(hInstance, hSession), trouble.tickets);
 }
 
 int SendCommand(void* hInstance, void* hSession, char const* command, int size, void* data)

@@ -2,6 +2,7 @@
 // front of it; it lives in a bundle of the test's, and its orders are looked up there by name.
 #pragma once
 
+#include "tests/client/TroubledTickets.h"
 #include <atomic>
 
 struct TROUBLE
@@ -12,5 +13,6 @@ struct TROUBLE
     std::atomic<int> loginTakes{0};             // milliseconds more
     std::atomic<bool> hasNoContainer{false};
     std::atomic<bool> refusesCallbacks{false};
+    TICKET_TROUBLE tickets{};
     std::atomic<bool> knowsNoNewCommands{false};  // those that only the package's own plug-in has
 };

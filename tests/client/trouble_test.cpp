@@ -1,63 +1,13 @@
 // What the kit makes of a plug-in and a server that do not do as they should.
-#include "tests/client/Client.h"
+#include "tests/client/TroubledClient.h"
 
-#include "comgui/comgui.h"
-#include "tests/client/TroubledPlugIn.h"
-#include "tests/support/BundleOnDisk.h"
-#include <chrono>
-#include <dlfcn.h>
 #include <gmock/gmock.h>
-#include <memory>
 
 using namespace comgui;
 using namespace std::chrono_literals;
 using testing::ElementsAre;
 using testing::HasSubstr;
 using testing::IsEmpty;
-
-namespace
-{
-class TroubledClient : public Client
-{
-protected:
-    TroubledClient() : bundle(folder.Path())
-    {
-        bundle.LinkExecutable(COMGUI_TROUBLED_PLUGIN);
-        bundle.AddFactory(COMGUI_PLUGIN_TYPE_UUID, "11111111-2222-3333-4444-555555555555",
-                          "TroubledPlugInFactory");
-        UtilityObjects::SetPlugInsFolder(folder.Path().native());
-        std::destroy_at(&trouble);  // orders of a test before, in the same process
-        std::construct_at(&trouble);
-    }
-
-    // Words for what happens at the server until there are so many.
-    std::vector<std::string> Hear(std::size_t count)
-    {
-        for (auto const end = Clock::now() + 20s; heard.size() < count && Clock::now() < end;)
-            queue.RunFor(5ms);
-        return heard;
-    }
-
-    Subscription Listen()
-    {
-        return connection.Subscribe({}, queue.GetExecutor(),
-                                    [this](Event const& event)
-                                    {
-                                        if (auto const* const lost = std::get_if<ServerLost>(&event))
-                                            heard.push_back("lost: " + lost->error.Text());
-                                        else if (auto const* const back = std::get_if<ServerBack>(&event))
-                                            heard.push_back(back->isNewSession ? "back anew" : "back");
-                                    });
-    }
-
-    using Clock = std::chrono::steady_clock;
-    BundleOnDisk bundle;
-    TROUBLE& trouble = *static_cast<TROUBLE*>(
-        dlsym(dlopen(COMGUI_TROUBLED_PLUGIN, RTLD_NOW | RTLD_LOCAL), "TroubledPlugInOrders"));
-    TaskQueue queue;
-    std::vector<std::string> heard;
-};
-}  // namespace
 
 TEST_F(TroubledClient, ServerThatIsLost_AndBack_IsAnEvent)
 {

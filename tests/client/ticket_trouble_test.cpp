@@ -1,0 +1,73 @@
+// What the kit makes of tickets that a plug-in does not give as it should.
+#include "tests/client/TroubledClient.h"
+
+#include <gmock/gmock.h>
+
+using namespace comgui;
+using namespace std::chrono_literals;
+using testing::ElementsAre;
+
+namespace
+{
+class TroubledTicket : public TroubledClient
+{
+protected:
+    TroubledTicket()
+    {
+        LogIn();
+        (void)tickets.WriteAll(job, {{"A", 1}, {"B", MakeList<int>({1, 2})}, {"C", "text"}});
+    }
+
+    TICKET_TROUBLE& orders = trouble.tickets;
+    TicketAddress job{JobTickets, 1};
+};
+}  // namespace
+
+// --- walks that end early
+
+TEST_F(TroubledTicket, WalkThatIsRefused_IsAFailure)
+{
+    auto const all = [this]
+    {
+        return std::vector{CodeOf(tickets.ReadAll(job)), CodeOf(tickets.Keys(job)),
+                           CodeOf(tickets.Read(job, "B"))};
+    };
+    ASSERT_THAT(all(), ElementsAre(0, 0, 0));
+    orders.refusedWalks = 3;
+    EXPECT_THAT(all(), ElementsAre(BadAnswer, BadAnswer, BadAnswer));
+}
+
+TEST_F(TroubledTicket, TicketThatIsDeletedWhileItIsOpened_IsNoEmptyOne)
+{
+    orders.afterOpening = [this] { ASSERT_TRUE(tickets.Delete(job)); };
+    EXPECT_EQ(CodeOf(tickets.ReadAll(job)), NoSuchTicket);
+    EXPECT_FALSE(orders.afterOpening);
+}
+
+TEST_F(TroubledTicket, WalkThatALogoutCuts_IsAFailure)
+{
+    orders.afterFirstValue = [this] { ASSERT_TRUE(connection.LogOut()); };
+    EXPECT_EQ(CodeOf(tickets.ReadAll(job)), NotLoggedIn);
+    LogIn();
+    orders.afterFirstValue = [this] { ASSERT_TRUE(connection.LogOut()); };
+    EXPECT_EQ(CodeOf(tickets.Keys(job)), NotLoggedIn);
+}
+
+TEST_F(TroubledTicket, WalkThatTheEndOfTheSessionCuts_IsAFailure)
+{
+    orders.afterFirstValue = [this] { orders.sessionIsOver = true; };
+    EXPECT_EQ(CodeOf(tickets.ReadAll(job)), ServerAway);
+}
+
+TEST_F(TroubledTicket, OfASessionThatIsOver_IsNeitherEmptyNorMissing)
+{
+    orders.sessionIsOver = true;
+    EXPECT_EQ(CodeOf(tickets.Types()), ServerAway);
+    EXPECT_EQ(CodeOf(tickets.List(JobTickets)), ServerAway);
+    EXPECT_EQ(CodeOf(tickets.Keys(job)), ServerAway);
+    EXPECT_EQ(CodeOf(tickets.ReadAll(job)), ServerAway);
+    EXPECT_EQ(CodeOf(tickets.Read(job, "A")), ServerAway);
+    EXPECT_EQ(CodeOf(tickets.ReadAs<int>(job, "A")), ServerAway);
+    EXPECT_EQ(CodeOf(tickets.Create(JobTickets)), ServerAway);
+    EXPECT_EQ(CodeOf(tickets.Delete(job)), ServerAway);
+}
