@@ -244,9 +244,12 @@ Error MissingValue(Client& client, MTICKET_ACCESS const* container, TicketAddres
 }
 
 // Whatever lies there, as stored.
-Result<Value> ReadStored(Client& client, MTICKET_ACCESS const* container, TicketAddress ticket,
-                         char const* key, int pos)
+Result<Value> ReadStored(Client& client, MTICKET_ACCESS const* container, TicketAddress ticket, KeyName name,
+                         int pos)
 {
+    char const* const key = name;
+    if (!name.IsValid())
+        return Error{NoSuchKey, NameOf(ticket, key), {}};
     int type = PARAM_NONE;
     if (!Get(container, ticket, key, PARAM_NONE, type, pos) || type == PARAM_NONE)
         return MissingValue(client, container, ticket, key);
@@ -255,9 +258,9 @@ Result<Value> ReadStored(Client& client, MTICKET_ACCESS const* container, Ticket
         value = ReadScalar(container, ticket, key, static_cast<PARAM_TYPE>(type), pos);
     else if (Outcome const walked =
                  WalkTicket(client, container, ticket, key,
-                            [&value, key](char const* name, PARAM_TYPE each, void const* word, int place)
+                            [&value, key](char const* found, PARAM_TYPE each, void const* word, int place)
                             {
-                                if (std::string_view(name) == key)
+                                if (std::string_view(found) == key)
                                     AddValue(value, place, detail::ValueOf(each, word));
                             });
              !walked)
@@ -274,9 +277,11 @@ public:
     explicit WriteTable(clFOLDER_VARIABLES const* folders) : m_folders(folders) {}
 
     // Adds what the value comes to; false if no ticket can hold it, and then nothing.
-    bool Add(char const* key, Value const& value, int pos)
+    bool Add(KeyName key, Value const& value, int pos)
     {
         auto const* const list = std::get_if<List>(&value);
+        if (!key.IsValid() || IsCut(value))
+            return false;
         if (!list)
         {
             AddRecord(key, value, pos);
@@ -286,7 +291,7 @@ public:
             return false;
         int last = -1;
         for (Element const& element : *list)
-            if (element.value.IsList() || element.value.IsNone() ||
+            if (element.value.IsList() || element.value.IsNone() || IsCut(element.value) ||
                 std::exchange(last, element.pos) >= element.pos)
                 return false;
         // A write at -1 begins the key anew; without a first value, a deletion does.
@@ -313,6 +318,13 @@ public:
     }
 
 private:
+    // Whether a ticket would keep the text only to its first zero byte.
+    static bool IsCut(Value const& value)
+    {
+        auto const* const text = std::get_if<std::string>(&value);
+        return text && text->find('\0') != std::string::npos;
+    }
+
     void AddRecord(char const* key, Value const& value, int pos)
     {
         Value const* kept = &value;
@@ -474,7 +486,7 @@ Result<T> Tickets::ReadAs(TicketAddress ticket, KeyName key, int pos) const
     if constexpr (std::is_arithmetic_v<T>)
     {
         T value{};
-        if (Get(container, ticket, key, GetParamType<T>(), value, pos))
+        if (key.IsValid() && Get(container, ticket, key, GetParamType<T>(), value, pos))
             return value;
     }
     Result<Value> const value = Read(ticket, key, pos);
@@ -524,7 +536,7 @@ std::vector<Outcome> Tickets::WriteAll(TicketAddress ticket, std::vector<KeyValu
     std::vector<Outcome> outcomes(values.size());
     for (std::size_t i = 0; i < values.size(); ++i)
     {
-        if (!table.Add(values[i].key.c_str(), values[i].value, WholeKey))
+        if (!table.Add(values[i].key, values[i].value, WholeKey))
             outcomes[i] = Error{NotWritable, NameOf(ticket, values[i].key.c_str()), {}};
         ends.push_back(table.Size());
     }

@@ -19,16 +19,22 @@ namespace detail
 class Client;
 }
 
-// The name of a key, UTF-8; refers to the text that it is made from.
+// The name of a key, UTF-8; refers to the text that it is made from. Keys end at a zero byte, so a text with
+// one is the name of none.
 class KeyName
 {
 public:
-    KeyName(char const* text) : m_text(text) {}
-    KeyName(std::string const& text) : m_text(text.c_str()) {}
-    operator char const*() const { return m_text; }
+    KeyName(char const* text) noexcept : m_text(text) {}
+    KeyName(std::string const& text) noexcept
+        : m_text(text.c_str()), m_isValid(text.find('\0') == std::string::npos)
+    {
+    }
+    operator char const*() const noexcept { return m_text; }
+    bool IsValid() const noexcept { return m_isValid; }
 
 private:
     char const* m_text;
+    bool m_isValid = true;
 };
 
 constexpr int WholeKey = -1;  // as a position
@@ -81,7 +87,8 @@ public:
     Result<T> ReadAs(TicketAddress ticket, KeyName key, int pos = WholeKey) const;
 
     // Replaces the key, or one value of a list; std::monostate deletes. The type is the value's, whatever the
-    // key had. Errors: NoSuchTicket, NotWritable, WriteRefused.
+    // key had. NotWritable: see ERROR_CODE; also a text or key with a zero byte. Errors: also NoSuchTicket,
+    // WriteRefused.
     Outcome Write(TicketAddress ticket, KeyName key, Value const& value, int pos = WholeKey,
                   Paths paths = Paths::Resolved) const;
 

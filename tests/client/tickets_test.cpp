@@ -261,3 +261,27 @@ TEST_F(TicketsOfAClient, Xml_IsThatOfATicketFile)
     ASSERT_TRUE(tickets.Write(ticket, "Key", "some text"));
     EXPECT_THAT(*tickets.ToXml(ticket), testing::AllOf(HasSubstr("<ticket"), HasSubstr("some text")));
 }
+
+TEST_F(TicketsOfAClient, TextWithAZeroByte_IsNoText)
+{
+    TicketAddress const ticket = NewTicket();
+    std::string const text("a\0b", 3);
+    EXPECT_EQ(CodeOf(tickets.Write(ticket, "Key", text)), NotWritable);
+    EXPECT_EQ(CodeOf(tickets.Write(ticket, "Key", MakeList<std::string>({"a", text}))), NotWritable);
+    EXPECT_EQ(CodeOf(tickets.Write(ticket, "Key", text, 0)), NotWritable);
+    EXPECT_EQ(CodeOf(tickets.Read(ticket, "Key")), NoSuchKey);
+    EXPECT_TRUE(tickets.Write(ticket, "Key", Bytes{text}));
+}
+
+TEST_F(TicketsOfAClient, KeyWithAZeroByte_IsNoKey)
+{
+    TicketAddress const ticket = NewTicket();
+    std::string const key("a\0b", 3);
+    ASSERT_TRUE(tickets.Write(ticket, "a", 1));
+    EXPECT_EQ(CodeOf(tickets.Write(ticket, key, 2)), NotWritable);
+    EXPECT_EQ(CodeOf(tickets.WriteAll(ticket, {{key, 2}}).at(0)), NotWritable);
+    EXPECT_EQ(CodeOf(tickets.WriteText(ticket, key, "2")), NoSuchKey);
+    EXPECT_EQ(CodeOf(tickets.Read(ticket, key)), NoSuchKey);
+    EXPECT_EQ(CodeOf(tickets.ReadAs<int>(ticket, key)), NoSuchKey);
+    EXPECT_EQ(*tickets.ReadAs<int>(ticket, "a"), 1);
+}
