@@ -190,6 +190,21 @@ bool Get(MTICKET_ACCESS const* container, TicketAddress ticket, char const* key,
     return container->MGETPARAMETER(container->Instance, ticket.type, ticket.id, key, type, &value, pos) != 0;
 }
 
+// A number of just that type. The read of a list as a whole gives its first value, so the type is asked for
+// in the same call.
+template <typename T>
+bool GetNumber(MTICKET_ACCESS const* container, TicketAddress ticket, char const* key, T& value, int pos)
+{
+    if (pos != WholeKey)
+        return Get(container, ticket, key, GetParamType<T>(), value, pos);
+    int type = PARAM_NONE;
+    GETMULTIPAR table[] = {{key, PARAM_NONE, 0, &type, WholeKey, false, {}},
+                           {key, GetParamType<T>(), 0, &value, WholeKey, false, {}},
+                           {}};
+    container->MGETMULTIPAR(container->Instance, ticket.type, ticket.id, table);
+    return detail::IsOk(table[0]) && detail::IsOk(table[1]) && type == GetParamType<T>();
+}
+
 template <typename T>
 Value Scalar(MTICKET_ACCESS const* container, TicketAddress ticket, char const* key, int pos)
 {
@@ -486,7 +501,7 @@ Result<T> Tickets::ReadAs(TicketAddress ticket, KeyName key, int pos) const
     if constexpr (std::is_arithmetic_v<T>)
     {
         T value{};
-        if (key.IsValid() && Get(container, ticket, key, GetParamType<T>(), value, pos))
+        if (key.IsValid() && GetNumber(container, ticket, key, value, pos))
             return value;
     }
     Result<Value> const value = Read(ticket, key, pos);

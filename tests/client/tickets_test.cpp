@@ -285,3 +285,23 @@ TEST_F(TicketsOfAClient, KeyWithAZeroByte_IsNoKey)
     EXPECT_EQ(CodeOf(tickets.ReadAs<int>(ticket, key)), NoSuchKey);
     EXPECT_EQ(*tickets.ReadAs<int>(ticket, "a"), 1);
 }
+
+TEST_F(TicketsOfAClient, ListReadAsANumber_IsOfTheWrongType)
+{
+    TicketAddress const ticket = NewTicket();
+    auto const isWrong = [&](auto number)
+    {
+        using T = decltype(number);
+        ASSERT_TRUE(tickets.Write(ticket, "List", MakeList<T>({T{7}, T{8}})));
+        EXPECT_EQ(CodeOf(tickets.ReadAs<T>(ticket, "List")), WrongType);
+        EXPECT_EQ(*tickets.ReadAs<T>(ticket, "List", 0), T{7});
+        EXPECT_EQ(*tickets.ReadAs<T>(ticket, "List", 1), T{8});
+        ASSERT_TRUE(tickets.Write(ticket, "One", Value(T{9})));
+        EXPECT_EQ(*tickets.ReadAs<T>(ticket, "One"), T{9});
+    };
+    isWrong(1);
+    isWrong(1.0);
+    isWrong(1LL);
+    isWrong(1U);
+    isWrong(1ULL);
+}
