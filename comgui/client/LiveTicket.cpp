@@ -76,6 +76,8 @@ struct LiveTicket::STATE : std::enable_shared_from_this<STATE>
     {
         Snapshot before = read ? std::exchange(m_now, *read) : std::exchange(m_now, {});
         Keys const unknown = read ? Apply(std::exchange(m_late, {})).unknown : Keys();
+        if (!read && !m_late.empty())
+            m_isStale = true;  // it has changed since, so it may be there again
         m_late.clear();
         Continue(unknown);
         Tell(read ? Outcome() : Outcome(read.GetError()), Difference(before, m_now));
@@ -144,6 +146,8 @@ struct LiveTicket::STATE : std::enable_shared_from_this<STATE>
             m_late.insert(m_late.end(), change.keys.begin(), change.keys.end());
         else if (m_told == 0)
             TakeAll(change.keys);
+        else
+            Read();  // a change needs a ticket that it is one of
     }
     void Heard(TicketCreated) { Read(); }
     void Heard(TicketDeleted) { Read(); }

@@ -26,7 +26,8 @@ public:
     using Handler = std::function<void(TicketUpdate const&)>;
 
     // worker: where it is read; it must live longer, as must the connection. A ticket that is not there yet,
-    // or gone, is waited for. Folder paths are as stored. Throws as Connection::Subscribe.
+    // or gone, is waited for; one that could not be read is read again
+    // when it changes. Folder paths are as stored. Throws as Connection::Subscribe.
     LiveTicket(Connection& connection, Worker const& worker, TicketAddress ticket, Handler handler);
 
     // No call of the handler comes any more.

@@ -71,3 +71,25 @@ TEST_F(TroubledTicket, OfASessionThatIsOver_IsNeitherEmptyNorMissing)
     EXPECT_EQ(CodeOf(tickets.Create(JobTickets)), ServerAway);
     EXPECT_EQ(CodeOf(tickets.Delete(job)), ServerAway);
 }
+
+// --- following
+
+TEST_F(TroubledTicket, FollowedOneThatCouldNotBeRead_IsReadAtTheNextChange)
+{
+    Worker const worker(queue.GetExecutor());
+    std::vector<int> told;
+    orders.refusedWalks = 1;
+    LiveTicket const live(connection, worker, job,
+                          [&](TicketUpdate const& update) { told.push_back(CodeOf(update.outcome)); });
+    auto const hear = [&](std::size_t count)
+    {
+        for (auto const end = Clock::now() + 5s; told.size() < count && Clock::now() < end;)
+            queue.RunFor(5ms);
+    };
+    hear(1);
+    ASSERT_THAT(told, ElementsAre(BadAnswer));
+    ASSERT_TRUE(tickets.Write(job, "A", 2));
+    hear(2);
+    EXPECT_THAT(told, ElementsAre(BadAnswer, 0));
+    EXPECT_EQ(live.Now(), *tickets.ReadAll(job));
+}
