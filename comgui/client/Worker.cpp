@@ -10,10 +10,20 @@ struct Worker::STATE
     std::atomic<bool> isOver{false};
 };
 
+// The results know the state only as long as it lives: the work in its queue holds them.
 Worker::Worker(Executor results)
     : m_state(std::make_shared<STATE>()),
-      m_results([state = m_state, results = std::move(results)](std::function<void()> task)
-                { results([state, task = std::move(task)] { state->isOver ? void() : task(); }); }),
+      m_results(
+          [weak = std::weak_ptr<STATE>(m_state), results = std::move(results)](std::function<void()> task)
+          {
+              results(
+                  [weak, task = std::move(task)]
+                  {
+                      auto const state = weak.lock();
+                      if (state && !state->isOver)
+                          task();
+                  });
+          }),
       m_work(m_state->queue.GetExecutor()), m_thread([state = m_state] { state->queue.Run(); })
 {
 }

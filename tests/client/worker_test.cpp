@@ -128,3 +128,29 @@ TEST_F(WorkerOfAClient, MayBeEndedByAResult)
     ASSERT_TRUE(Await([this] { return !taken.empty(); }));
     EXPECT_FALSE(worker);
 }
+
+TEST_F(WorkerOfAClient, AtItsEnd_FreesTheWorkThatWaits)
+{
+    auto const captured = std::make_shared<int>(1);
+    std::promise<void> begun, goOn;
+    auto worker = std::make_optional<Worker>(queue.GetExecutor());
+    worker->Do(
+        [&]
+        {
+            begun.set_value();
+            goOn.get_future().wait();
+        },
+        [] {});
+    begun.get_future().wait();
+    worker->Do([captured] {}, [captured] {});
+    ASSERT_GT(captured.use_count(), 1);
+    std::thread helper(
+        [&goOn]
+        {
+            std::this_thread::sleep_for(20ms);
+            goOn.set_value();
+        });
+    worker.reset();
+    helper.join();
+    EXPECT_EQ(captured.use_count(), 1);
+}
