@@ -34,10 +34,14 @@ std::string HexText(std::string_view bytes)
     return text;
 }
 
+// Gaps are shown by their commas. One that is longer is shown by the position of the value behind it, as one
+// comma for each of 16,777,215 positions would make a giant text.
+constexpr int LongestGap = 16;
+
 bool NeedsQuotes(std::string_view text)
 {
-    return text.empty() || text.find_first_of(",\"") != text.npos || text.front() == ' ' ||
-           text.back() == ' ';
+    return text.empty() || text.front() == '[' || text.find_first_of(",\"") != text.npos ||
+           text.front() == ' ' || text.back() == ' ';
 }
 
 std::string Quoted(std::string_view text)
@@ -51,12 +55,16 @@ std::string Quoted(std::string_view text)
 std::string ListText(List const& list)
 {
     std::string all;
-    int next = 0;
+    long long next = 0;
     for (Element const& element : list)
     {
-        for (; next < element.pos; ++next)
+        bool const isFar = element.pos - next > LongestGap;
+        for (; !isFar && next < element.pos; ++next)
             all += next == 0 ? "" : ", ";  // a gap
-        all += next++ == 0 ? "" : ", ";
+        all += all.empty() && (isFar || next == 0) ? "" : ", ";
+        if (isFar)
+            all += '[' + std::to_string(element.pos) + "] ";
+        next = element.pos + 1LL;
         std::string const text = ToText(element.value);
         bool const isText = element.value.Type() == PARAM_STRING;
         all += text.empty() || (isText && NeedsQuotes(text)) ? Quoted(text) : text;
@@ -159,12 +167,39 @@ Result<Field> TakeField(std::string_view& rest)
     return rest.empty() || rest[0] == ',' ? Result<Field>(field) : Failure(BadList, whole);
 }
 
+// Takes "[123]" from the beginning of rest, if a value follows, as the position of that.
+// Without it pos is left as it is.
+Outcome TakePosition(std::string_view& rest, long long& pos)
+{
+    auto const begin = std::min(rest.find_first_not_of(' '), rest.size());
+    auto const end = rest.find(']', begin);
+    if (end == rest.npos || rest[begin] != '[')
+        return {};
+    std::string_view const digits = rest.substr(begin + 1, end - begin - 1);
+    std::string_view const value = Trimmed(rest.substr(end + 1));
+    if (digits.empty() || digits.find_first_not_of("0123456789") != digits.npos || value.empty() ||
+        value.front() == ',')
+        return {};
+    int given = 0;
+    if (std::from_chars(digits.data(), digits.data() + digits.size(), given).ec != std::errc())
+        return Failure(OutOfRange, rest);
+    if (given < pos)
+        return Failure(BadList, rest);
+    pos = given;
+    rest.remove_prefix(end + 1);
+    return {};
+}
+
 Result<Value> ListFrom(std::string_view text, PARAM_TYPE elementType)
 {
     List list;
     std::string_view rest = text;
-    for (int pos = 0; !Trimmed(rest).empty() || pos > 0; ++pos)
+    for (long long pos = 0; !Trimmed(rest).empty() || pos > 0; ++pos)
     {
+        if (Outcome const taken = TakePosition(rest, pos); !taken)
+            return taken.GetError();
+        if (pos > std::numeric_limits<int>::max())
+            return Failure(OutOfRange, text);
         Result<Field> const field = TakeField(rest);
         if (!field)
             return field.GetError();
@@ -173,7 +208,7 @@ Result<Value> ListFrom(std::string_view text, PARAM_TYPE elementType)
             Result<Value> value = FromText(field->text, elementType);
             if (!value)
                 return value;
-            list.push_back({pos, *std::move(value)});
+            list.push_back({static_cast<int>(pos), *std::move(value)});
         }
         if (rest.empty())
             break;

@@ -64,7 +64,8 @@ List MakeList(std::vector<T> const& values);
 
 // As text, UTF-8, that FromText reads back without loss. Numbers in the C locale, doubles in the shortest
 // form; bytes as hexadecimal digits in pairs; a list with ", " between its values, texts with a comma, a
-// quote or spaces at an end in quotes, and nothing for a gap; no value is the empty text.
+// quote, spaces at an end or a bracket at the beginning in quotes, and nothing for a gap; behind a gap of
+// more than 16 positions "[123] " before the value, its position; no value is the empty text.
 COMGUI_EXPORT std::string ToText(Value const& value);
 
 // The value of that type that a user has typed. For PARAM_COUNT the elements get the type elementType; the

@@ -176,3 +176,30 @@ TEST(ValueAs, Vector_IsAListWithoutGaps_OrASingleValue)
     EXPECT_EQ(CodeOf(As<std::vector<int>>(Value(MakeList<std::string>({"a"})))), WrongType);
     EXPECT_EQ(CodeOf(As<int>(Value(MakeList<int>({4})))), WrongType);
 }
+
+TEST(ValueText, OfAFarPosition_IsShort)
+{
+    List const far{{16777215, 7}};
+    EXPECT_EQ(ToText(far), "[16777215] 7");
+    EXPECT_EQ(*FromText("[16777215] 7", PARAM_COUNT, PARAM_INT), Value(far));
+    List const last{{0, 1}, {std::numeric_limits<int>::max(), 2}};
+    EXPECT_EQ(ToText(last), "1, [2147483647] 2");
+    EXPECT_EQ(*FromText(ToText(last), PARAM_COUNT, PARAM_INT), Value(last));
+}
+
+TEST(ValueText, OfTextsLikeAPosition_IsReadBack)
+{
+    List const texts{{0, "[99] a"}, {99, "b, c"}, {100, "[1]"}, {101, "[x"}};
+    EXPECT_EQ(ToText(texts), "\"[99] a\", [99] \"b, c\", \"[1]\", \"[x\"");
+    EXPECT_EQ(*FromText(ToText(texts), PARAM_COUNT), Value(texts));
+    EXPECT_EQ(*FromText("[x, [], [1 a, [9]", PARAM_COUNT),
+              Value(MakeList<std::string>({"[x", "[]", "[1 a", "[9]"})));
+}
+
+TEST(ValueFromText, PositionThatDoesNotAscend_IsABadList)
+{
+    EXPECT_EQ(CodeOf(FromText("1, 2, [1] 3", PARAM_COUNT, PARAM_INT)), BadList);
+    EXPECT_EQ(CodeOf(FromText("[5] 1, [5] 3", PARAM_COUNT, PARAM_INT)), BadList);
+    EXPECT_EQ(CodeOf(FromText("[2147483648] 1", PARAM_COUNT, PARAM_INT)), OutOfRange);
+    EXPECT_EQ(CodeOf(FromText("[2147483647] 1, 2", PARAM_COUNT, PARAM_INT)), OutOfRange);
+}
