@@ -532,9 +532,7 @@ Outcome Tickets::WriteText(TicketAddress ticket, KeyName key, std::string_view t
     Result<Value> const before = ReadStored(*m_client, container, ticket, key, pos);
     if (!before)
         return before.GetError();
-    auto const* const list = std::get_if<comgui::List>(&*before);
-    PARAM_TYPE const elementType = list && !list->empty() ? list->front().value.Type() : PARAM_STRING;
-    Result<Value> const value = FromText(text, before->Type(), elementType);
+    Result<Value> const value = FromText(text, *before);
     if (!value)
         return Error{value.GetError().code, NameOf(ticket, key), {}};
     return Write(ticket, key, *value, pos);

@@ -92,8 +92,8 @@ public:
     Outcome Write(TicketAddress ticket, KeyName key, Value const& value, int pos = WholeKey,
                   Paths paths = Paths::Resolved) const;
 
-    // What a user has typed, by the type that the key has: see FromText. Errors: also NoSuchKey, NotANumber,
-    // OutOfRange, BadList; then nothing is written.
+    // What a user has typed, by the type that each value has: see FromText. Errors: also NoSuchKey,
+    // NotANumber, OutOfRange, BadList; then nothing is written.
     Outcome WriteText(TicketAddress ticket, KeyName key, std::string_view text, int pos = WholeKey) const;
 
     // Many keys in one table; the outcome of each. The server takes it as one change.

@@ -1,7 +1,9 @@
 #include "comgui/client/Value.h"
 
+#include <algorithm>
 #include <charconv>
 #include <cmath>
+#include <iterator>
 #include <limits>
 #include <optional>
 #include <type_traits>
@@ -190,7 +192,9 @@ Outcome TakePosition(std::string_view& rest, long long& pos)
     return {};
 }
 
-Result<Value> ListFrom(std::string_view text, PARAM_TYPE elementType)
+// from(text, pos): the value of the field at that position.
+template <typename From>
+Result<Value> ListFrom(std::string_view text, From from)
 {
     List list;
     std::string_view rest = text;
@@ -205,7 +209,7 @@ Result<Value> ListFrom(std::string_view text, PARAM_TYPE elementType)
             return field.GetError();
         if (field->isQuoted || !field->text.empty())
         {
-            Result<Value> value = FromText(field->text, elementType);
+            Result<Value> value = from(field->text, static_cast<int>(pos));
             if (!value)
                 return value;
             list.push_back({static_cast<int>(pos), *std::move(value)});
@@ -361,10 +365,27 @@ Result<Value> FromText(std::string_view text, PARAM_TYPE type, PARAM_TYPE elemen
         return NumberFrom<unsigned long long>(text);
     case PARAM_COUNT:
         return elementType == PARAM_COUNT ? Result<Value>(Failure(WrongType, text))
-                                          : ListFrom(text, elementType);
+                                          : ListFrom(text, [elementType](std::string_view field, int)
+                                                     { return FromText(field, elementType); });
     default:
         return Failure(WrongType, text);
     }
+}
+
+Result<Value> FromText(std::string_view text, Value const& before)
+{
+    if (before.Type() == PARAM_POINTER)
+        return text == ToText(before) ? Result<Value>(before) : Failure(WrongType, text);
+    auto const* const list = std::get_if<List>(&before);
+    if (!list || list->empty())
+        return FromText(text, before.Type());
+    auto const from = [list](std::string_view field, int pos)
+    {
+        auto const behind = std::upper_bound(list->begin(), list->end(), pos,
+                                             [](int at, Element const& element) { return at < element.pos; });
+        return FromText(field, behind == list->begin() ? behind->value : std::prev(behind)->value);
+    };
+    return ListFrom(text, from);
 }
 
 template <typename T>

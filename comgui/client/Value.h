@@ -62,16 +62,22 @@ COMGUI_EXPORT char const* NameOf(PARAM_TYPE type);
 template <typename T>
 List MakeList(std::vector<T> const& values);
 
-// As text, UTF-8, that FromText reads back without loss. Numbers in the C locale, doubles in the shortest
-// form; bytes as hexadecimal digits in pairs; a list with ", " between its values, texts with a comma, a
-// quote, spaces at an end or a bracket at the beginning in quotes, and nothing for a gap; behind a gap of
-// more than 16 positions "[123] " before the value, its position; no value is the empty text.
+// As text, UTF-8, that FromText reads back without loss, given the value or its type. Numbers in the C
+// locale, doubles in the shortest form; bytes as hexadecimal digits in pairs; a list with ", " between its
+// values, texts with a comma, a quote, spaces at an end or a bracket at the beginning in quotes, and nothing
+// for a gap; behind a gap of more than 16 positions "[123] " before the value, its position; no value is the
+// empty text.
 COMGUI_EXPORT std::string ToText(Value const& value);
 
 // The value of that type that a user has typed. For PARAM_COUNT the elements get the type elementType; the
 // empty text is the list without elements. Errors: NotANumber, OutOfRange, BadList, WrongType.
 COMGUI_EXPORT Result<Value> FromText(std::string_view text, PARAM_TYPE type,
                                      PARAM_TYPE elementType = PARAM_STRING);
+
+// What a user has made of before's text. Each position of a list gets the type of its value before, a new one
+// that of the value in front of it; so a mixed list keeps its types, which its text does not show. A pointer
+// is read back from its own text only: it is WrongType to change one.
+COMGUI_EXPORT Result<Value> FromText(std::string_view text, Value const& before);
 
 // The value as a T: int, double, std::string, Bytes, long long, unsigned int, unsigned long long, or a
 // std::vector of one of them. Numbers change their type if that loses nothing; a std::string is ToText of any

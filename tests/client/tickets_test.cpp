@@ -305,3 +305,29 @@ TEST_F(TicketsOfAClient, ListReadAsANumber_IsOfTheWrongType)
     isWrong(1U);
     isWrong(1ULL);
 }
+
+TEST_F(TicketsOfAClient, ShownText_IsWrittenBackAsWhatWasThere)
+{
+    TicketAddress const ticket = NewTicket();
+    for (Value const& value : {Value(List{{0, 0.5}, {1, 3}}), Value(List{{0, 1}, {1, "two"}}),
+                               Value(List{{0, Bytes{"\x01"}}, {4, 2ULL}}), Value(Pointer{&errno}),
+                               Value(List{{0, Pointer{&errno}}, {1, "0x1"}})})
+    {
+        ASSERT_TRUE(tickets.Write(ticket, "Key", value));
+        EXPECT_TRUE(tickets.WriteText(ticket, "Key", TextOf(ticket, "Key"))) << ToText(value);
+        EXPECT_EQ(*tickets.Read(ticket, "Key"), value);
+    }
+    EXPECT_EQ(CodeOf(tickets.WriteText(ticket, "Key", "0x2, 0x1")), WrongType);
+}
+
+TEST_F(TicketsOfAClient, NewPositionOfATypedList_HasTheTypeBeforeIt)
+{
+    TicketAddress const ticket = NewTicket();
+    ASSERT_TRUE(tickets.Write(ticket, "Key", List{{0, 0.5}, {1, 3}}));
+    ASSERT_TRUE(tickets.WriteText(ticket, "Key", "1, 4, 5"));
+    EXPECT_EQ(*tickets.Read(ticket, "Key"), Value(List{{0, 1.0}, {1, 4}, {2, 5}}));
+    EXPECT_EQ(CodeOf(tickets.WriteText(ticket, "Key", "1, 4.5")), NotANumber);
+    ASSERT_TRUE(tickets.Write(ticket, "Key", List{{2, 0.5}, {3, 3}}));
+    ASSERT_TRUE(tickets.WriteText(ticket, "Key", "1, , 2, 3"));
+    EXPECT_EQ(*tickets.Read(ticket, "Key"), Value(List{{0, 1.0}, {2, 2.0}, {3, 3}}));
+}
