@@ -105,6 +105,11 @@ int Get(void* instance, int type, int id, char const* key, PARAM_TYPE what, void
         std::exchange(trouble->afterTypeQuery, nullptr)();
     return result;
 }
+
+int GetTable(void* instance, int type, int id, GETMULTIPAR* table)
+{
+    return trouble->sessionIsOver ? 0 : real.MGETMULTIPAR(instance, type, id, table);
+}
 }  // namespace
 
 MTICKET_ACCESS const* Troubled(MTICKET_ACCESS const* container, TICKET_TROUBLE& orders)
@@ -116,6 +121,7 @@ MTICKET_ACCESS const* Troubled(MTICKET_ACCESS const* container, TICKET_TROUBLE& 
     real = *container;
     MTICKET_ACCESS& troubled = containers.emplace_back(real);
     troubled.MGETPARAMETER = Get;
+    troubled.MGETMULTIPAR = GetTable;
     troubled.MWALKTICKETS = WalkTickets;
     troubled.MOPERATION = Operation;
     return &troubled;

@@ -91,5 +91,5 @@ TEST_F(TroubledTicket, FollowedOneThatCouldNotBeRead_IsReadAtTheNextChange)
     ASSERT_TRUE(tickets.Write(job, "A", 2));
     hear(2);
     EXPECT_THAT(told, ElementsAre(BadAnswer, 0));
-    EXPECT_EQ(live.Now(), *tickets.ReadAll(job));
+    EXPECT_EQ(live.Now(), *tickets.ReadAll(job, Paths::AsStored));
 }
