@@ -41,6 +41,15 @@ std::size_t SizeOf(std::optional<Value> const& value)
             size += sizeof element + SizeOf(element.value);
     return size;
 }
+
+// A key without what its value points at: most changes are of numbers, which are nothing but that.
+std::size_t SizeOf(std::string const& key)
+{
+    constexpr std::size_t Node =
+        4 * sizeof(void*) + sizeof(std::pair<std::string const, std::optional<Value>>);
+    constexpr std::size_t Inside = 15;  // a text that needs no memory of its own
+    return Node + (key.size() > Inside ? key.size() + 1 : 0);
+}
 }  // namespace
 
 // A run of records with one key pointer is one change of that key. One that begins with -1 carries the whole
@@ -104,13 +113,19 @@ void PendingEvents::AddChange(TICKET& ticket, KeyChange const& change)
 {
     if (ticket.isWhole)
         return;
-    if (ticket.keys.size() >= MostKeysOfATicket && ticket.keys.count(change.key) == 0)
+    auto place = ticket.keys.find(change.key);
+    if (place == ticket.keys.end())
     {
-        DropKeys(ticket);
-        ticket.isWhole = true;
-        return;
+        if (ticket.keys.size() >= MostKeysOfATicket || m_bytes + SizeOf(change.key) > MostBytes)
+        {
+            DropKeys(ticket);
+            ticket.isWhole = true;
+            return;
+        }
+        place = ticket.keys.try_emplace(change.key).first;
+        m_bytes += SizeOf(change.key);
     }
-    std::optional<Value>& value = ticket.keys[change.key];
+    std::optional<Value>& value = place->second;
     m_bytes -= SizeOf(value);
     value = m_bytes + SizeOf(change.value) <= MostBytes ? change.value : std::nullopt;
     m_bytes += SizeOf(value);
@@ -119,7 +134,7 @@ void PendingEvents::AddChange(TICKET& ticket, KeyChange const& change)
 void PendingEvents::DropKeys(TICKET& ticket)
 {
     for (auto const& [key, value] : ticket.keys)
-        m_bytes -= SizeOf(value);
+        m_bytes -= SizeOf(key) + SizeOf(value);
     ticket.keys.clear();
     ticket.isWhole = false;
 }
@@ -189,8 +204,12 @@ std::vector<Event> PendingEvents::Take()
         if (!ticket.isWhole && ticket.keys.empty())
             continue;
         TicketChanged changed{ticket.address, {}, ticket.isWhole};
-        for (auto& [key, value] : ticket.keys)
-            changed.keys.push_back({key, std::move(value)});
+        changed.keys.reserve(ticket.keys.size());
+        while (!ticket.keys.empty())  // one by one: nothing is there twice
+        {
+            auto node = ticket.keys.extract(ticket.keys.begin());
+            changed.keys.push_back({std::move(node.key()), std::move(node.mapped())});
+        }
         events.emplace_back(std::move(changed));
     }
     for (int const type : m_crowds)

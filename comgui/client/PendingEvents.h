@@ -36,7 +36,7 @@ public:
     // With more than this the rest is reported as a whole.
     static constexpr std::size_t MostKeysOfATicket = 1000;
     static constexpr std::size_t MostTickets = 10000;
-    static constexpr std::size_t MostBytes = std::size_t{16} << 20;  // of values
+    static constexpr std::size_t MostBytes = std::size_t{16} << 20;  // of keys and values
 
     void Add(Interest const& interest, TicketEvent const& event);
     void Add(Interest const& interest, Event const& event);  // of the server and of transfers
@@ -55,8 +55,6 @@ private:
         bool isCreated = false;  // then
         bool isWhole = false;
         std::map<std::string, std::optional<Value>> keys{};  // at last
-
-        bool IsNothing() const { return !isDeleted && !isCreated && !isWhole && keys.empty(); }
     };
 
     void AddChange(TICKET& ticket, KeyChange const& change);

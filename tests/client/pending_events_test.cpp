@@ -1,6 +1,8 @@
 // What waits for a subscriber, merged.
 #include "comgui/client/PendingEvents.h"
 
+#include "tests/support/Allocations.h"
+#include <algorithm>
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
@@ -184,4 +186,44 @@ TEST(ChangesOfRecords, OfOneKey_AreOneChange)
     EXPECT_EQ(changes[1].value, Value());
     EXPECT_FALSE(changes[2].value);
     EXPECT_THAT(ChangesOf(nullptr), SizeIs(0));
+}
+
+// Measured at the heap: what an event comes to there is more than its texts.
+TEST_F(PendingEventsOf, ManySmallKeysOfManyTickets_TakeLittleMemory)
+{
+    constexpr std::size_t Most = std::size_t{32} << 20;
+    std::size_t const before = LiveBytes();
+    for (int id = 0; id < 1000; ++id)
+        for (int key = 0; key < 1000; ++key)
+            Change({3, id}, "Some/Folder/Of/Keys/" + std::to_string(key), Value(key));
+    EXPECT_GT(LiveBytes() - before, Most / 8);
+    EXPECT_LT(LiveBytes() - before, Most);
+    auto const events = pending.Take();
+    EXPECT_LT(LiveBytes() - before, Most);
+    ASSERT_THAT(events, SizeIs(1000));
+    EXPECT_THAT(std::get<TicketChanged>(events.front()).keys, SizeIs(1000));
+    EXPECT_TRUE(std::get<TicketChanged>(events.back()).isWhole);
+}
+
+TEST_F(PendingEventsOf, DroppedTickets_GiveTheirMemoryBack)
+{
+    auto const fill = [this]
+    {
+        for (int id = 0; id < 300; ++id)
+            for (int key = 0; key < 1000; ++key)
+                Change({3, id}, std::to_string(key), Value(key));
+    };
+    auto const wholeOnes = [this]
+    {
+        auto const events = pending.Take();
+        return std::count_if(events.begin(), events.end(),
+                             [](Event const& event) { return std::get<TicketChanged>(event).isWhole; });
+    };
+    fill();
+    pending.DropTickets();
+    fill();
+    auto const first = wholeOnes();
+    EXPECT_GT(first, 0);
+    fill();
+    EXPECT_EQ(wholeOnes(), first);
 }

@@ -3,11 +3,13 @@
 #include "tests/support/FreedMemory.h"
 #include <atomic>
 #include <cstdlib>
+#include <malloc.h>
 #include <new>
 
 namespace
 {
 std::atomic<long> live = 0;
+std::atomic<std::size_t> liveBytes = 0;
 std::atomic<int> failIn = -1;
 std::atomic<bool> hasFailed = false;
 
@@ -25,7 +27,10 @@ void* Allocated(std::size_t size, std::size_t alignment = Usual) noexcept
                             ? std::malloc(room)
                             : std::aligned_alloc(alignment, (room + alignment - 1) / alignment * alignment);
     if (block)
+    {
         ++live;
+        liveBytes += malloc_usable_size(block);
+    }
     return block;
 }
 
@@ -40,7 +45,10 @@ void* AllocatedOrThrown(std::size_t size, std::size_t alignment = Usual)
 void Freed(void* block) noexcept
 {
     if (block)
+    {
         --live;
+        liveBytes -= malloc_usable_size(block);
+    }
     Spoil(block);
     std::free(block);
 }
@@ -81,6 +89,8 @@ void operator delete(void* block, std::align_val_t, std::nothrow_t const&) noexc
 void operator delete[](void* block, std::align_val_t, std::nothrow_t const&) noexcept { Freed(block); }
 
 long LiveAllocations() { return live; }
+
+std::size_t LiveBytes() { return liveBytes; }
 
 FailingAllocation::FailingAllocation(int n)
 {

@@ -3,10 +3,14 @@
 // gets another content, so that whoever still reads it finds out.
 #pragma once
 
+#include <cstddef>
 #include <gtest/gtest.h>
 
 // Blocks from operator new that are not given back yet.
 long LiveAllocations();
+
+// What these blocks hold, in bytes, with what the heap rounds up.
+std::size_t LiveBytes();
 
 // While it lives the nth allocation from its making on throws std::bad_alloc, 0 being the next.
 class FailingAllocation
