@@ -54,10 +54,11 @@ void TaskQueue::RunUntil(std::chrono::steady_clock::time_point end)
             return;
         if (std::exchange(state->isStopped, false))
             return;
-        auto const task = std::move(state->tasks.front());
+        auto task = std::move(state->tasks.front());
         state->tasks.pop_front();
         lock.unlock();
         task();
+        task = nullptr;  // what it holds may post when it goes
         lock.lock();
         if (std::chrono::steady_clock::now() >= end)
             return;
