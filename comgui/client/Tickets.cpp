@@ -364,12 +364,21 @@ private:
     std::deque<BIN_STRING> m_bytes;
 };
 
-Error RefusedWrite(Client& client, MTICKET_ACCESS const* container, TicketAddress ticket, char const* key)
+// Of a write that the plug-in has just refused.
+Error RefusedWrite(Client& client, MTICKET_ACCESS const* container, TicketAddress ticket)
 {
-    Error error = client.Failure(WriteRefused, NameOf(ticket, key));  // first: it is of the last refusal
+    Error error = client.Failure(WriteRefused, NameOf(ticket));  // first: it is of the last refusal
     if (!OpenedTicket(container, ticket))
         return MissingTicket(client, container, ticket);
     return CauseOf(client, container, std::move(error));
+}
+
+// The same error, about that key where it is about one.
+Error About(TicketAddress ticket, char const* key, Error error)
+{
+    if (error.code == WriteRefused)
+        error.about = NameOf(ticket, key);
+    return error;
 }
 
 bool AddTicket(void* tickets, int type, int id, STICKET_ACCESS const*)
@@ -521,7 +530,7 @@ Outcome Tickets::Write(TicketAddress ticket, KeyName key, Value const& value, in
         return Error{NotWritable, NameOf(ticket, key), {}};
     std::size_t const size = table.Size();
     container->MSETMULTIPAR(container->Instance, ticket.type, ticket.id, table.Records());
-    return table.IsOk(0, size) ? Outcome() : RefusedWrite(*m_client, container, ticket, key);
+    return table.IsOk(0, size) ? Outcome() : About(ticket, key, RefusedWrite(*m_client, container, ticket));
 }
 
 Outcome Tickets::WriteText(TicketAddress ticket, KeyName key, std::string_view text, int pos) const
@@ -553,11 +562,20 @@ std::vector<Outcome> Tickets::WriteAll(TicketAddress ticket, std::vector<KeyValu
             outcomes[i] = Error{NotWritable, NameOf(ticket, values[i].key.c_str()), {}};
         ends.push_back(table.Size());
     }
-    container->MSETMULTIPAR(container->Instance, ticket.type, ticket.id, table.Records());
+    bool const hasWritten =
+        container->MSETMULTIPAR(container->Instance, ticket.type, ticket.id, table.Records()) != 0;
+    std::optional<Error> refused;
     std::size_t begin = 0;
     for (std::size_t i = 0; i < values.size(); begin = ends[i++])
-        if (outcomes[i] && !table.IsOk(begin, ends[i]))
-            outcomes[i] = RefusedWrite(*m_client, container, ticket, values[i].key.c_str());
+    {
+        if (!outcomes[i] || table.IsOk(begin, ends[i]))
+            continue;
+        if (!refused)
+            refused = RefusedWrite(*m_client, container, ticket);
+        outcomes[i] = About(ticket, values[i].key.c_str(), *refused);
+        if (hasWritten)
+            refused->reason.clear();  // there is one for the call, not one for each key
+    }
     return outcomes;
 }
 

@@ -331,3 +331,25 @@ TEST_F(TicketsOfAClient, NewPositionOfATypedList_HasTheTypeBeforeIt)
     ASSERT_TRUE(tickets.WriteText(ticket, "Key", "1, , 2, 3"));
     EXPECT_EQ(*tickets.Read(ticket, "Key"), Value(List{{0, 1.0}, {2, 2.0}, {3, 3}}));
 }
+
+TEST_F(TicketsOfAClient, TableThatIsRefused_HasTheReasonAtEachKey)
+{
+    ASSERT_TRUE(connection.LogIn(Here(), Operator()));
+    auto const outcomes = tickets.WriteAll(System, {{"System/A", 1}, {"System/B", 2}, {"System/C", 3}});
+    ASSERT_EQ(outcomes.size(), 3u);
+    for (Outcome const& outcome : outcomes)
+    {
+        ASSERT_EQ(CodeOf(outcome), WriteRefused);
+        EXPECT_NE(outcome.GetError().reason, "");
+        EXPECT_EQ(outcome.GetError().reason, outcomes[0].GetError().reason);
+    }
+    EXPECT_EQ(outcomes[1].GetError().about, "0/0 System/B");
+}
+
+TEST_F(TicketsOfAClient, TableForATicketThatIsNotThere_IsRefusedForThat)
+{
+    TicketAddress const ticket = NewTicket();
+    ASSERT_TRUE(tickets.Delete(ticket));
+    for (Outcome const& outcome : tickets.WriteAll(ticket, {{"A", 1}, {"B", 2}}))
+        EXPECT_EQ(CodeOf(outcome), NoSuchTicket);
+}
