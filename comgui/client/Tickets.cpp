@@ -7,6 +7,7 @@
 #include <array>
 #include <deque>
 #include <limits>
+#include <new>
 #include <optional>
 
 namespace comgui
@@ -64,6 +65,29 @@ void ForEachText(Value& value, Change const& change)
             ForEachText(element.value, change);
 }
 
+// Ids and positions have 24 bits: a walk that gives more never ends.
+constexpr std::size_t MostNumbers = std::size_t{1} << 24;
+
+// What the task has thrown, as a code; 0 if nothing. For tasks that a plug-in calls: what they throw must not
+// pass through its code, which was compiled elsewhere.
+template <typename Task>
+int CodeOf(Task const& task) noexcept
+{
+    try
+    {
+        task();
+        return 0;
+    }
+    catch (std::bad_alloc const&)
+    {
+        return OutOfMemory;
+    }
+    catch (...)
+    {
+        return BadAnswer;  // such as bytes of a size that no text can have
+    }
+}
+
 // A ticket that is open as long as this lives.
 class OpenedTicket
 {
@@ -85,20 +109,31 @@ public:
 
     explicit operator bool() const { return m_ticket != nullptr; }
 
-    // Calls take(key, type, word, pos) for each value whose key begins so. Whether the plug-in has walked.
+    // Calls take(key, type, word, pos) for each value whose key begins so. 0 if the plug-in has walked.
     template <typename Take>
-    bool Walk(char const* prefix, Take& take) const
+    int Walk(char const* prefix, Take& take) const
     {
+        struct WALK
+        {
+            Take& take;
+            std::size_t values = 0;
+            int code = 0;
+        };
+        WALK walk{take};
         constexpr int Everything = 8000;  // what the library asks for
-        return m_ticket->SWALKPARAMETERS(
-                   m_ticket->Instance,
-                   [](void* context, char const* key, PARAM_TYPE type, void const* word, int pos)
-                   {
-                       if (detail::IsParameter(type))
-                           (*static_cast<Take*>(context))(key, type, word, pos);
-                       return true;
-                   },
-                   &take, prefix, Everything) != 0;
+        int const hasWalked = m_ticket->SWALKPARAMETERS(
+            m_ticket->Instance,
+            [](void* context, char const* key, PARAM_TYPE type, void const* word, int pos)
+            {
+                auto& all = *static_cast<WALK*>(context);
+                if (detail::IsParameter(type))
+                    all.code = CodeOf([&] { all.take(key, type, word, pos); });
+                if (++all.values > MostNumbers)
+                    all.code = BadAnswer;
+                return all.code == 0;
+            },
+            &walk, prefix, Everything);
+        return hasWalked || walk.code != 0 ? walk.code : BadAnswer;
     }
 
 private:
@@ -156,11 +191,11 @@ Outcome WalkTicket(Client& client, MTICKET_ACCESS const* container, TicketAddres
     OpenedTicket const opened(container, ticket);
     if (!opened)
         return MissingTicket(client, container, ticket);
-    bool const hasWalked = opened.Walk(prefix, take);
-    Error const refused = hasWalked ? Error() : client.Failure(BadAnswer, NameOf(ticket));
+    int const code = opened.Walk(prefix, take);
+    Error const refused = code == 0 ? Error() : client.Failure(code, NameOf(ticket));
     if (auto end = EndOf(client, container))
         return *std::move(end);
-    if (hasWalked)
+    if (code == 0)
         return {};
     // Deleted meanwhile, or refused.
     return OpenedTicket(container, ticket) ? refused : MissingTicket(client, container, ticket);
@@ -258,31 +293,41 @@ Error MissingValue(Client& client, MTICKET_ACCESS const* container, TicketAddres
     return CauseOf(client, container, client.Failure(NoSuchKey, NameOf(ticket, key)));
 }
 
-// Whatever lies there, as stored.
+// What lies there, as stored, if it is of that type; none if it is not, or not any more.
+Result<Value> ReadTyped(Client& client, MTICKET_ACCESS const* container, TicketAddress ticket,
+                        char const* key, PARAM_TYPE type, int pos)
+{
+    if (type != PARAM_COUNT)
+        return ReadScalar(container, ticket, key, type, pos);
+    Value value;
+    auto const take = [&value, key](char const* found, PARAM_TYPE each, void const* word, int place)
+    {
+        if (std::string_view(found) == key)
+            AddValue(value, place, detail::ValueOf(each, word));
+    };
+    Outcome const walked = WalkTicket(client, container, ticket, key, take);
+    return walked ? Result<Value>(std::move(value)) : walked.GetError();
+}
+
+// Whatever lies there, as stored. Another client may change the type between the question and the read, so
+// a read that finds nothing asks again.
 Result<Value> ReadStored(Client& client, MTICKET_ACCESS const* container, TicketAddress ticket, KeyName name,
                          int pos)
 {
+    constexpr int MostTries = 8;
     char const* const key = name;
     if (!name.IsValid())
         return Error{NoSuchKey, NameOf(ticket, key), {}};
-    int type = PARAM_NONE;
-    if (!Get(container, ticket, key, PARAM_NONE, type, pos) || type == PARAM_NONE)
-        return MissingValue(client, container, ticket, key);
-    Value value;
-    if (type != PARAM_COUNT)
-        value = ReadScalar(container, ticket, key, static_cast<PARAM_TYPE>(type), pos);
-    else if (Outcome const walked =
-                 WalkTicket(client, container, ticket, key,
-                            [&value, key](char const* found, PARAM_TYPE each, void const* word, int place)
-                            {
-                                if (std::string_view(found) == key)
-                                    AddValue(value, place, detail::ValueOf(each, word));
-                            });
-             !walked)
-        return walked.GetError();
-    if (value.IsNone())
-        return MissingValue(client, container, ticket, key);  // deleted meanwhile
-    return value;
+    for (int tries = 0; tries < MostTries; ++tries)
+    {
+        int type = PARAM_NONE;
+        if (!Get(container, ticket, key, PARAM_NONE, type, pos) || type == PARAM_NONE)
+            break;
+        Result<Value> value = ReadTyped(client, container, ticket, key, static_cast<PARAM_TYPE>(type), pos);
+        if (!value || !value->IsNone())
+            return value;
+    }
+    return MissingValue(client, container, ticket, key);
 }
 
 // A table of writes, with what its records point at.
@@ -381,10 +426,19 @@ Error About(TicketAddress ticket, char const* key, Error error)
     return error;
 }
 
-bool AddTicket(void* tickets, int type, int id, STICKET_ACCESS const*)
+struct Listing
 {
-    static_cast<std::vector<TicketAddress>*>(tickets)->push_back({type, id});
-    return true;
+    std::vector<TicketAddress> tickets;
+    int code = 0;
+};
+
+bool AddTicket(void* context, int type, int id, STICKET_ACCESS const*)
+{
+    auto& listing = *static_cast<Listing*>(context);
+    listing.code = CodeOf([&listing, type, id] { listing.tickets.push_back({type, id}); });
+    if (listing.tickets.size() > MostNumbers)
+        listing.code = BadAnswer;
+    return listing.code == 0;
 }
 }  // namespace
 
@@ -411,11 +465,13 @@ Result<std::vector<TicketAddress>> Tickets::List(int type) const
     MTICKET_ACCESS const* const container = m_client->Container();
     if (!container)
         return NotLoggedInError();
-    std::vector<TicketAddress> tickets;
-    container->MWALKTICKETS(container->Instance, AddTicket, &tickets, type);  // refused: no such type
+    Listing listing;
+    container->MWALKTICKETS(container->Instance, AddTicket, &listing, type);  // refused: no such type
     if (auto end = EndOf(*m_client, container))
         return *std::move(end);
-    return tickets;
+    if (listing.code != 0)
+        return Error{listing.code, std::to_string(type), {}};
+    return std::move(listing.tickets);
 }
 
 Result<TicketAddress> Tickets::Create(int type) const

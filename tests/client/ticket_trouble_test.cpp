@@ -93,3 +93,37 @@ TEST_F(TroubledTicket, FollowedOneThatCouldNotBeRead_IsReadAtTheNextChange)
     EXPECT_THAT(told, ElementsAre(BadAnswer, 0));
     EXPECT_EQ(live.Now(), *tickets.ReadAll(job, Paths::AsStored));
 }
+
+TEST_F(TroubledTicket, BytesThatNoMemoryHolds_AreABadAnswer)
+{
+    orders.bytesAreEndless = true;
+    EXPECT_EQ(CodeOf(tickets.ReadAll(job)), BadAnswer);
+    orders.bytesAreEndless = false;
+    EXPECT_TRUE(tickets.ReadAll(job));
+}
+
+// --- nonsense
+
+TEST_F(TroubledTicket, WalkWithoutAnEnd_IsEnded)
+{
+    orders.walksNeverEnd = true;
+    EXPECT_EQ(CodeOf(tickets.List(JobTickets)), BadAnswer);
+    EXPECT_EQ(CodeOf(tickets.Keys(job)), BadAnswer);
+}
+
+TEST_F(TroubledTicket, ValueThatGetsAnotherTypeWhileItIsRead_IsRead)
+{
+    orders.afterTypeQuery = [this] { ASSERT_TRUE(tickets.Write(job, "A", "one")); };
+    EXPECT_EQ(*tickets.Read(job, "A"), Value("one"));
+    orders.afterTypeQuery = [this] { ASSERT_TRUE(tickets.Write(job, "A", MakeList<int>({1, 2}))); };
+    EXPECT_EQ(*tickets.Read(job, "A"), Value(MakeList<int>({1, 2})));
+}
+
+TEST_F(TroubledTicket, TextThatIsNull_IsEmpty)
+{
+    orders.textsAreNull = true;
+    EXPECT_EQ(*tickets.Read(job, "C"), Value(""));
+    EXPECT_EQ(*tickets.ReadAs<std::string>(job, "C"), "");
+    EXPECT_EQ(*tickets.ReadAll(job)->Find("C"), Value(""));
+    EXPECT_EQ(*tickets.ReadAll(job)->Find("A"), Value(1));
+}
