@@ -8,6 +8,8 @@ Value ValueOf(PARAM_TYPE type, void const* word)
 {
     if (type == PARAM_POINTER)
         return Pointer{const_cast<void*>(word)};
+    if (type == PARAM_STRING && !word)
+        return std::string();  // as everywhere in the library
     if (!word)
         return {};
     switch (type)

@@ -7,7 +7,8 @@
 namespace comgui::detail
 {
 // A copy of what the value word of a write, of a walk or of a notification says. None for PARAM_NONE and
-// PARAM_COUNT, for a null word of a type that needs one, and for an unknown type.
+// PARAM_COUNT, for a null word of a type that needs one, and for an unknown type; a null text is the empty
+// one.
 Value ValueOf(PARAM_TYPE type, void const* word);
 
 // The value word of a write of a single value. It, and what it points at, lives as long as both arguments.
