@@ -15,8 +15,8 @@ public:
     Result(T value) : m_outcome(std::in_place_index<0>, std::move(value)) {}
     Result(Error error) : m_outcome(std::in_place_index<1>, std::move(error)) {}
 
-    bool IsGood() const { return m_outcome.index() == 0; }
-    explicit operator bool() const { return IsGood(); }
+    bool IsGood() const noexcept { return m_outcome.index() == 0; }
+    explicit operator bool() const noexcept { return IsGood(); }
 
     // Throws std::bad_variant_access after a failure.
     T& operator*() & { return std::get<0>(m_outcome); }
@@ -25,7 +25,8 @@ public:
     T* operator->() { return &**this; }
     T const* operator->() const { return &**this; }
 
-    T ValueOr(T other) const { return IsGood() ? std::get<0>(m_outcome) : std::move(other); }
+    T ValueOr(T other) const& { return IsGood() ? std::get<0>(m_outcome) : std::move(other); }
+    T ValueOr(T other) && { return std::move(IsGood() ? std::get<0>(m_outcome) : other); }
 
     // Throws std::bad_variant_access after a success.
     Error const& GetError() const { return std::get<1>(m_outcome); }
@@ -42,8 +43,8 @@ public:
     Result() = default;
     Result(Error error) : m_error(std::move(error)) {}
 
-    bool IsGood() const { return !m_error; }
-    explicit operator bool() const { return IsGood(); }
+    bool IsGood() const noexcept { return !m_error; }
+    explicit operator bool() const noexcept { return IsGood(); }
 
     // Throws std::bad_optional_access after a success.
     Error const& GetError() const { return m_error.value(); }

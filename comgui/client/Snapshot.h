@@ -35,7 +35,7 @@ public:
     explicit Snapshot(std::vector<SnapshotEntry> entries);  // in any order, each key once
 
     // By key, bytewise.
-    std::vector<SnapshotEntry> const& Entries() const { return m_entries; }
+    std::vector<SnapshotEntry> const& Entries() const noexcept { return m_entries; }
 
     Value const* Find(std::string_view key) const;  // null: not there
 

@@ -225,6 +225,12 @@ bool Get(MTICKET_ACCESS const* container, TicketAddress ticket, char const* key,
     return container->MGETPARAMETER(container->Instance, ticket.type, ticket.id, key, type, &value, pos) != 0;
 }
 
+// The type that slots know for a T: a long is one of the others, under another name.
+template <typename T>
+using SlotNumber =
+    std::conditional_t<std::is_same_v<T, long>, long long,
+                       std::conditional_t<std::is_same_v<T, unsigned long>, unsigned long long, T>>;
+
 // A number of just that type. The read of a list as a whole gives its first value, so the type is asked for
 // in the same call.
 template <typename T>
@@ -558,16 +564,16 @@ Result<Value> Tickets::Read(TicketAddress ticket, KeyName key, int pos, Paths pa
 }
 
 template <typename T>
-Result<T> Tickets::ReadAs(TicketAddress ticket, KeyName key, int pos) const
+Result<detail::Readable<T>> Tickets::ReadAs(TicketAddress ticket, KeyName key, int pos) const
 {
     MTICKET_ACCESS const* const container = m_client->Container();
     if (!container)
         return NotLoggedInError();
     if constexpr (std::is_arithmetic_v<T>)
     {
-        T value{};
-        if (key.IsValid() && GetNumber(container, ticket, key, value, pos))
-            return value;
+        SlotNumber<T> value{};
+        if (sizeof value == sizeof(T) && key.IsValid() && GetNumber(container, ticket, key, value, pos))
+            return static_cast<T>(value);
     }
     Result<Value> const value = Read(ticket, key, pos);
     if (!value)
@@ -653,12 +659,16 @@ std::string Tickets::Portable(std::string text) const
 
 // NOLINTBEGIN(bugprone-macro-parentheses): T is a type
 #define COMGUI_CLIENT_READ(T)                                                                                \
-    template COMGUI_EXPORT Result<T> Tickets::ReadAs(TicketAddress, KeyName, int) const;                     \
-    template COMGUI_EXPORT Result<std::vector<T>> Tickets::ReadAs(TicketAddress, KeyName, int) const;
+    template COMGUI_EXPORT Result<T> Tickets::ReadAs<T>(TicketAddress, KeyName, int) const;                  \
+    template COMGUI_EXPORT Result<std::vector<T>> Tickets::ReadAs<std::vector<T>>(TicketAddress, KeyName,    \
+                                                                                  int) const;
 COMGUI_CLIENT_READ(int)
 COMGUI_CLIENT_READ(double)
 COMGUI_CLIENT_READ(std::string)
 COMGUI_CLIENT_READ(Bytes)
+COMGUI_CLIENT_READ(Pointer)
+COMGUI_CLIENT_READ(long)
+COMGUI_CLIENT_READ(unsigned long)
 COMGUI_CLIENT_READ(long long)
 COMGUI_CLIENT_READ(unsigned int)
 COMGUI_CLIENT_READ(unsigned long long)

@@ -19,8 +19,8 @@ namespace detail
 class Client;
 }
 
-// The name of a key, UTF-8; refers to the text that it is made from. Keys end at a zero byte, so a text with
-// one is the name of none.
+// The name of a key, UTF-8; refers to the text that it is made from, but for a std::string_view. Keys end at
+// a zero byte, so a text with one is the name of none.
 class KeyName
 {
 public:
@@ -29,11 +29,17 @@ public:
         : m_text(text.c_str()), m_isValid(text.find('\0') == std::string::npos)
     {
     }
-    operator char const*() const noexcept { return m_text; }
+    KeyName(std::string_view text)
+        : m_copy(text), m_isCopied(true), m_isValid(text.find('\0') == std::string_view::npos)
+    {
+    }
+    operator char const*() const noexcept { return m_isCopied ? m_copy.c_str() : m_text; }
     bool IsValid() const noexcept { return m_isValid; }
 
 private:
-    char const* m_text;
+    char const* m_text = nullptr;
+    std::string m_copy;  // a view need not end at a zero byte
+    bool m_isCopied = false;
     bool m_isValid = true;
 };
 
@@ -81,10 +87,9 @@ public:
     Result<Value> Read(TicketAddress ticket, KeyName key, int pos = WholeKey,
                        Paths paths = Paths::Resolved) const;
 
-    // As Value.h's As: int, double, std::string, Bytes, long long, unsigned int, unsigned long long, or a
-    // std::vector of one of them. Errors: also WrongType, OutOfRange.
+    // As Value.h's As, with its types. Errors: also WrongType, OutOfRange.
     template <typename T>
-    Result<T> ReadAs(TicketAddress ticket, KeyName key, int pos = WholeKey) const;
+    Result<detail::Readable<T>> ReadAs(TicketAddress ticket, KeyName key, int pos = WholeKey) const;
 
     // Replaces the key, or one value of a list; std::monostate deletes. The type is the value's, whatever the
     // key had. NotWritable: see ERROR_CODE; also a text or key with a zero byte. Errors: also NoSuchTicket,

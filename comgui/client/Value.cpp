@@ -14,8 +14,7 @@ namespace
 {
 template <typename T>
 constexpr bool IsNumber =
-    std::is_same_v<T, int> || std::is_same_v<T, double> || std::is_same_v<T, long long> ||
-    std::is_same_v<T, unsigned int> || std::is_same_v<T, unsigned long long>;
+    detail::IsOneOf<T, int, double, long, unsigned long, long long, unsigned int, unsigned long long>;
 
 template <typename T>
 std::string NumberText(T number)
@@ -309,15 +308,6 @@ char const* NameOf(PARAM_TYPE type)
     return type >= PARAM_NONE && type <= PARAM_UNSIGNED64 ? Names[type] : "unknown";
 }
 
-template <typename T>
-List MakeList(std::vector<T> const& values)
-{
-    List list;
-    for (T const& value : values)
-        list.push_back({static_cast<int>(list.size()), Value(value)});
-    return list;
-}
-
 std::string ToText(Value const& value)
 {
     return std::visit(
@@ -389,10 +379,12 @@ Result<Value> FromText(std::string_view text, Value const& before)
 }
 
 template <typename T>
-Result<T> As(Value const& value)
+Result<detail::Readable<T>> As(Value const& value)
 {
-    if constexpr (std::is_same_v<T, std::string> || std::is_same_v<T, Bytes> || IsNumber<T>)
+    if constexpr (detail::IsOneValue<T>)
         return Converted<T>(value);
+    else if (value.IsNone())
+        return Failure(WrongType, {});
     else if (auto const* const list = std::get_if<List>(&value))
         return AllOf<typename T::value_type>(*list);
     else
@@ -404,13 +396,15 @@ Result<T> As(Value const& value)
 
 // NOLINTBEGIN(bugprone-macro-parentheses): T is a type
 #define COMGUI_CLIENT_VALUE(T)                                                                               \
-    template COMGUI_EXPORT List MakeList(std::vector<T> const&);                                             \
-    template COMGUI_EXPORT Result<T> As(Value const&);                                                       \
-    template COMGUI_EXPORT Result<std::vector<T>> As(Value const&);
+    template COMGUI_EXPORT Result<T> As<T>(Value const&);                                                    \
+    template COMGUI_EXPORT Result<std::vector<T>> As<std::vector<T>>(Value const&);
 COMGUI_CLIENT_VALUE(int)
 COMGUI_CLIENT_VALUE(double)
 COMGUI_CLIENT_VALUE(std::string)
 COMGUI_CLIENT_VALUE(Bytes)
+COMGUI_CLIENT_VALUE(Pointer)
+COMGUI_CLIENT_VALUE(long)
+COMGUI_CLIENT_VALUE(unsigned long)
 COMGUI_CLIENT_VALUE(long long)
 COMGUI_CLIENT_VALUE(unsigned int)
 COMGUI_CLIENT_VALUE(unsigned long long)

@@ -7,6 +7,7 @@
 #include "comgui/ticket/PARAM_TYPE.h"
 #include <string>
 #include <string_view>
+#include <type_traits>
 #include <variant>
 #include <vector>
 
@@ -35,10 +36,13 @@ class COMGUI_EXPORT Value : public std::variant<std::monostate, Pointer, int, do
 {
 public:
     using variant::variant;
+    Value(std::string_view text) : variant(std::string(text)) {}
+    Value(long number) noexcept : variant(static_cast<long long>(number)) {}
+    Value(unsigned long number) noexcept : variant(static_cast<unsigned long long>(number)) {}
 
-    PARAM_TYPE Type() const { return static_cast<PARAM_TYPE>(index()); }  // PARAM_COUNT: a list
-    bool IsNone() const { return Type() == PARAM_NONE; }
-    bool IsList() const { return Type() == PARAM_COUNT; }
+    PARAM_TYPE Type() const noexcept { return static_cast<PARAM_TYPE>(index()); }  // PARAM_COUNT: a list
+    bool IsNone() const noexcept { return Type() == PARAM_NONE; }
+    bool IsList() const noexcept { return Type() == PARAM_COUNT; }
 };
 
 struct Element
@@ -58,9 +62,47 @@ inline bool operator!=(Value const& left, Value const& right) { return !(left ==
 // "int", "double", "text", "bytes", "int64", "unsigned", "unsigned64", "pointer", "list", "none".
 COMGUI_EXPORT char const* NameOf(PARAM_TYPE type);
 
+namespace detail
+{
+template <typename T, typename... Types>
+constexpr bool IsOneOf = (std::is_same_v<T, Types> || ...);
+
+template <typename T>
+constexpr bool IsOneValue = IsOneOf<T, int, double, std::string, Bytes, Pointer, long, unsigned long,
+                                    long long, unsigned int, unsigned long long>;
+
+template <typename T>
+struct READABLE
+{
+    static constexpr bool IsIt = IsOneValue<T>;
+};
+template <typename T>
+struct READABLE<std::vector<T>>
+{
+    static constexpr bool IsIt = IsOneValue<T>;
+};
+
+// T, if values can be read as that.
+template <typename T>
+struct READ_TYPE
+{
+    static_assert(READABLE<T>::IsIt, "As and ReadAs give the types that the comment of As names, no others");
+    using Type = T;
+};
+template <typename T>
+using Readable = typename READ_TYPE<T>::Type;
+}  // namespace detail
+
 // The values at positions 0, 1, 2 ... T: any that As gives, but a vector.
 template <typename T>
-List MakeList(std::vector<T> const& values);
+List MakeList(std::vector<T> const& values)
+{
+    static_assert(detail::IsOneValue<T>, "a list holds values of the types that As gives, but a vector");
+    List list;
+    for (T const& value : values)
+        list.push_back({static_cast<int>(list.size()), Value(value)});
+    return list;
+}
 
 // As text, UTF-8, that FromText reads back without loss, given the value or its type. Numbers in the C
 // locale, doubles in the shortest form; bytes as hexadecimal digits in pairs; a list with ", " between its
@@ -79,9 +121,10 @@ COMGUI_EXPORT Result<Value> FromText(std::string_view text, PARAM_TYPE type,
 // is read back from its own text only: it is WrongType to change one.
 COMGUI_EXPORT Result<Value> FromText(std::string_view text, Value const& before);
 
-// The value as a T: int, double, std::string, Bytes, long long, unsigned int, unsigned long long, or a
-// std::vector of one of them. Numbers change their type if that loses nothing; a std::string is ToText of any
-// value; a list without gaps becomes a vector, a single value a vector of one. Errors: WrongType, OutOfRange.
+// The value as a T: int, double, std::string, Bytes, Pointer, long and long long (so std::int64_t), unsigned
+// int, unsigned long and unsigned long long, or a std::vector of one of them. Numbers change their type if
+// that loses nothing; a std::string is ToText of any value; a list without gaps becomes a vector, a single
+// value a vector of one, no value none. Errors: WrongType, OutOfRange.
 template <typename T>
-Result<T> As(Value const& value);
+Result<detail::Readable<T>> As(Value const& value);
 }  // namespace comgui

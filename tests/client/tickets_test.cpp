@@ -304,6 +304,19 @@ TEST_F(TicketsOfAClient, ListReadAsANumber_IsOfTheWrongType)
     isWrong(1LL);
     isWrong(1U);
     isWrong(1ULL);
+    isWrong(1L);
+    isWrong(1UL);
+}
+
+TEST_F(TicketsOfAClient, KeyAndValue_MayBePartsOfTexts)
+{
+    TicketAddress const ticket = NewTicket();
+    std::string_view const both = "Some/Key=a text";
+    ASSERT_TRUE(tickets.Write(ticket, both.substr(0, 8), both.substr(9)));
+    EXPECT_EQ(*tickets.ReadAs<std::string>(ticket, "Some/Key"), "a text");
+    EXPECT_EQ(*tickets.Read(ticket, both.substr(0, 8)), Value("a text"));
+    ASSERT_TRUE(tickets.Write(ticket, "Here", Pointer{&errno}));
+    EXPECT_EQ(tickets.ReadAs<Pointer>(ticket, "Here")->address, &errno);
 }
 
 TEST_F(TicketsOfAClient, ShownText_IsWrittenBackAsWhatWasThere)

@@ -2,8 +2,10 @@
 #include "comgui/client/Value.h"
 
 #include <cmath>
+#include <cstdint>
 #include <gtest/gtest.h>
 #include <limits>
+#include <memory>
 
 using namespace comgui;
 
@@ -202,4 +204,39 @@ TEST(ValueFromText, PositionThatDoesNotAscend_IsABadList)
     EXPECT_EQ(CodeOf(FromText("[5] 1, [5] 3", PARAM_COUNT, PARAM_INT)), BadList);
     EXPECT_EQ(CodeOf(FromText("[2147483648] 1", PARAM_COUNT, PARAM_INT)), OutOfRange);
     EXPECT_EQ(CodeOf(FromText("[2147483647] 1, 2", PARAM_COUNT, PARAM_INT)), OutOfRange);
+}
+
+TEST(ValueAs, EveryInteger_OfTheLanguage)
+{
+    EXPECT_EQ(*As<std::int64_t>(Value(SmallestInt64)), SmallestInt64);
+    EXPECT_EQ(*As<std::uint64_t>(Value(7)), 7U);
+    EXPECT_EQ(*As<long>(Value(7)), 7);
+    EXPECT_EQ(*As<std::size_t>(Value(7.0)), 7U);
+    EXPECT_EQ(CodeOf(As<unsigned long>(Value(-1))), OutOfRange);
+    EXPECT_EQ(*As<std::vector<long>>(Value(MakeList<int>({1, 2}))), (std::vector{1L, 2L}));
+    EXPECT_EQ(Value(1L).Type(), PARAM_INT64);
+    EXPECT_EQ(MakeList<unsigned long>({1})[0].value, Value(1ULL));
+}
+
+TEST(ValueAs, Pointer_IsOne)
+{
+    int here = 0;
+    EXPECT_EQ(As<Pointer>(Value(Pointer{&here}))->address, &here);
+    EXPECT_EQ(MakeList<Pointer>({Pointer{&here}})[0].value, Value(Pointer{&here}));
+    EXPECT_EQ(CodeOf(As<Pointer>(Value(1))), WrongType);
+}
+
+TEST(ValueAs, NoValue_IsNoVectorOfOne)
+{
+    EXPECT_EQ(CodeOf(As<std::vector<std::string>>(Value())), WrongType);
+    EXPECT_EQ(CodeOf(As<std::vector<int>>(Value())), WrongType);
+}
+
+TEST(Value, TakesAPartOfAText) { EXPECT_EQ(Value(std::string_view("a text").substr(2)), Value("text")); }
+
+TEST(ResultOfACall, ThatIsATemporary_GivesItsValueAway)
+{
+    using Only = std::unique_ptr<int>;
+    EXPECT_EQ(*Result<Only>(std::make_unique<int>(3)).ValueOr(nullptr), 3);
+    EXPECT_EQ(*Result<Only>(Error{}).ValueOr(std::make_unique<int>(4)), 4);
 }
