@@ -20,6 +20,7 @@ set_target_properties(comgui_module PROPERTIES INSTALL_RPATH ${comgui_beside}/..
 
 install(TARGETS comgui comgui_client comgui_host EXPORT comgui-targets
     LIBRARY DESTINATION ${CMAKE_INSTALL_LIBDIR} FILE_SET HEADERS)
+install(FILES comgui/client/comgui.pot DESTINATION ${CMAKE_INSTALL_DATADIR}/comgui)    # for translators
 if(APPLE)
     install(TARGETS comgui_corefoundation EXPORT comgui-targets)    # no more than the system's own
 else()
