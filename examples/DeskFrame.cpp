@@ -90,7 +90,10 @@ void KeyGrid::EndEdit(wxDataViewEvent& event)
     if (event.IsEditCancelled() || row == wxNOT_FOUND)
         return;
     event.Veto();
-    onEdit(m_keys[static_cast<std::size_t>(row)], comgui::ToUtf8(event.GetValue().GetString()));
+    // What is shown need not be all that is there: bytes that are no text are shown as a mark for them.
+    wxString const text = event.GetValue().GetString();
+    if (text != GetTextValue(static_cast<unsigned int>(row), 2))
+        onEdit(m_keys[static_cast<std::size_t>(row)], comgui::ToUtf8(text));
 }
 
 void DESK_OPTIONS::AddTo(wxCmdLineParser& parser)
@@ -119,7 +122,7 @@ std::optional<DESK_OPTIONS> DESK_OPTIONS::Take(wxCmdLineParser& parser)
     options.account = {comgui::ToUtf8(user), comgui::ToUtf8(password)};
     options.server.host = comgui::ToUtf8(server.BeforeFirst(':'));
     long port = options.server.port;
-    if (server.Contains(":") && !server.AfterFirst(':').ToLong(&port))
+    if (server.Contains(":") && (!server.AfterFirst(':').ToLong(&port) || port < 1 || port > 65535))
         port = 0;  // which the kit refuses
     options.server.port = static_cast<int>(port);
     return options;
