@@ -120,9 +120,15 @@ Result<User> Client::LogIn(Server const& server, Account const& account)
         return checked.GetError();
     if (Outcome const checked = Check(account); !checked)
         return checked.GetError();
-    (void)LogOut();
-
-    std::lock_guard const lifecycle(m_lifecycle);
+    // The end of a session waits for its handlers, and they may log out: so not in one hold of the lock with
+    // the login, and another thread may have logged in between.
+    std::unique_lock lifecycle(m_lifecycle);
+    while (IsLoggedIn())
+    {
+        lifecycle.unlock();
+        (void)LogOut();
+        lifecycle.lock();
+    }
     std::unique_lock lock(m_calls);
     if (Outcome const prepared = Prepare(server); !prepared)
         return prepared.GetError();

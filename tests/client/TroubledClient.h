@@ -10,11 +10,14 @@
 #include <dlfcn.h>
 #include <memory>
 #include <string>
+#include <thread>
 #include <vector>
 
 class TroubledClient : public Client
 {
 protected:
+    using Clock = std::chrono::steady_clock;
+
     TroubledClient() : bundle(folder.Path())
     {
         bundle.LinkExecutable(COMGUI_TROUBLED_PLUGIN);
@@ -23,6 +26,14 @@ protected:
         UtilityObjects::SetPlugInsFolder(folder.Path().native());
         std::destroy_at(&trouble);  // orders of a test before, in the same process
         std::construct_at(&trouble);
+    }
+
+    template <typename IsThere>
+    static void Await(IsThere const& isThere)
+    {
+        for (auto const end = Clock::now() + std::chrono::seconds(20); !isThere() && Clock::now() < end;)
+            std::this_thread::sleep_for(std::chrono::milliseconds(1));
+        ASSERT_TRUE(isThere());
     }
 
     // Words for what happens at the server until there are so many.
@@ -47,7 +58,6 @@ protected:
                                     });
     }
 
-    using Clock = std::chrono::steady_clock;
     BundleOnDisk bundle;
     TROUBLE& trouble = *static_cast<TROUBLE*>(
         dlsym(dlopen(COMGUI_TROUBLED_PLUGIN, RTLD_NOW | RTLD_LOCAL), "TroubledPlugInOrders"));

@@ -5,6 +5,8 @@
 #include <chrono>
 #include <cstring>
 #include <dlfcn.h>
+#include <mutex>
+#include <set>
 #include <string_view>
 #include <thread>
 
@@ -34,15 +36,59 @@ int IsAlive(void* hInstance, char const* host, int port)
     return trouble.serverIsAway ? 105 : real.IsAliveEntry(hInstance, host, port);
 }
 
+void Take(std::atomic<int> const& time) { std::this_thread::sleep_for(std::chrono::milliseconds(time)); }
+
+// The sessions that have ended.
+std::mutex endedLock;
+std::set<void*> ended;
+
+bool HasEnded(void* hSession)
+{
+    std::lock_guard const lock(endedLock);
+    return ended.count(hSession) != 0;
+}
+
 int Login(void* hInstance, TLogin* login)
 {
-    std::this_thread::sleep_for(std::chrono::milliseconds(trouble.loginTakes));
+    trouble.newest = login;
+    Take(trouble.loginTakes);
     if (trouble.loginsAreRefused)
         return 42;
     int const code = real.LoginEntry(hInstance, login);
     if (code == 0)
+    {
         trouble.sessionIsGone = false;
+        ++trouble.logins;
+        std::lock_guard const lock(endedLock);
+        ended.erase(login->hSession);
+    }
     return code;
+}
+
+int Logout(void* hInstance, void* hSession)
+{
+    Take(trouble.logoutTakes);
+    ++trouble.logouts;
+    {
+        std::lock_guard const lock(endedLock);
+        ended.insert(hSession);
+    }
+    return real.LogoutEntry(hInstance, hSession);
+}
+
+int PutFileSync(void* hInstance, void* hSession, char* source, char* target)
+{
+    ++trouble.puts;
+    for (int time = 0; time < trouble.putTakes && !HasEnded(hSession); ++time)
+        std::this_thread::sleep_for(std::chrono::milliseconds(1));
+    return real.PutFileSyncEntry(hInstance, hSession, source, target);
+}
+
+int GetTicketData(void* hInstance, void* hSession, int type, int id, int form, int* size, void* data)
+{
+    ++trouble.ticketData;
+    Take(trouble.ticketDataTakes);
+    return real.GetTicketDataEntry(hInstance, hSession, type, id, form, size, data);
 }
 
 MTICKET_ACCESS const* GetClientContainer(void* hInstance, void* hSession)
@@ -55,6 +101,16 @@ MTICKET_ACCESS const* GetClientContainer(void* hInstance, void* hSession)
 int SendCommand(void* hInstance, void* hSession, char const* command, int size, void* data)
 {
     std::string_view const name = command;
+    if (name == "remote.system.isalive")
+    {
+        ++trouble.questions;
+        Take(trouble.questionTakes);
+    }
+    if (name == "local.get.progress")
+    {
+        ++trouble.progress;
+        Take(trouble.progressTakes);
+    }
     if (name == "remote.system.isalive" && trouble.serverIsAway)
         return 106;
     if (name == "remote.system.isalive" && trouble.sessionIsGone)
@@ -82,6 +138,9 @@ bool LoadReal(CFAllocatorRef allocator, CFUUIDRef type)
     table.Release = Release;
     table.IsAliveEntry = IsAlive;
     table.LoginEntry = Login;
+    table.LogoutEntry = Logout;
+    table.PutFileSyncEntry = PutFileSync;
+    table.GetTicketDataEntry = GetTicketData;
     table.GetClientContainerEntry = GetClientContainer;
     table.SendCommandEntry = SendCommand;
     return true;

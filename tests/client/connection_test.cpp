@@ -132,6 +132,26 @@ TEST_F(ConnectionOfAClient, SiteThatCannotBeOpened_GivesThePlugInsReason)
     EXPECT_THAT(line, HasSubstr(tested.GetError().reason));
 }
 
+TEST_F(ConnectionOfAClient, LoginsAndLogouts_MayComeFromManyThreads)
+{
+    std::vector<std::thread> threads;
+    for (int i = 0; i < 8; ++i)
+        threads.emplace_back(
+            [this, i]
+            {
+                for (int n = 0; n < 20; ++n)
+                    if (i % 4 == 0)
+                        (void)connection.LogOut();
+                    else
+                        EXPECT_TRUE(connection.LogIn(Here(), Admin()));
+            });
+    for (std::thread& thread : threads)
+        thread.join();
+    (void)connection.LogOut();
+    LogIn();
+    EXPECT_EQ(connection.LocalEndPoint(), "127.0.0.1:50106");
+}
+
 TEST_F(ConnectionOfAClient, Operations_MayComeFromManyThreads)
 {
     LogIn();

@@ -2,6 +2,8 @@
 #include "tests/client/TroubledClient.h"
 
 #include <gmock/gmock.h>
+#include <memory>
+#include <thread>
 
 using namespace comgui;
 using namespace std::chrono_literals;
