@@ -119,7 +119,7 @@ std::shared_ptr<Subscriber> EventHub::Add(Interest interest, Executor executor, 
     std::lock_guard const lock(m_lock);
     m_subscribers.push_back(subscriber);
     if (!m_thread.joinable() && !m_isStopped)
-        m_thread = std::thread([this] { Run(); });
+        m_thread = std::thread([self = shared_from_this()] { self->Run(); });
     return subscriber;
 }
 
@@ -128,14 +128,23 @@ void EventHub::Remove(Subscriber& subscriber)
     Lock lock(m_lock);
     subscriber.m_isOver = true;
     subscriber.m_pending = {};
-    m_handled.wait(lock,
-                   [&subscriber] {
-                       return subscriber.m_runner == std::thread::id() ||
-                              subscriber.m_runner == std::this_thread::get_id();
-                   });
+    m_handled.wait(lock, [this, &subscriber] { return !IsCalledByAnother(subscriber); });
     m_subscribers.erase(std::remove_if(m_subscribers.begin(), m_subscribers.end(),
                                        [&subscriber](auto const& each) { return each.get() == &subscriber; }),
                         m_subscribers.end());
+    if (subscriber.m_runner != std::thread::id() || m_posting == &subscriber)
+        return;  // one of them is what calls this
+    Executor const executor = std::exchange(subscriber.m_executor, nullptr);
+    Subscription::Handler const handler = std::exchange(subscriber.m_handler, nullptr);
+    lock.unlock();  // what the caller has bound to them ends here, on his thread, and under no lock
+}
+
+// Whether its handler or its executor runs on another thread than this one.
+bool EventHub::IsCalledByAnother(Subscriber const& subscriber) const
+{
+    auto const self = std::this_thread::get_id();
+    return (subscriber.m_runner != std::thread::id() && subscriber.m_runner != self) ||
+           (m_posting == &subscriber && m_poster != self);
 }
 
 std::vector<Interest> EventHub::Interests() const
@@ -189,26 +198,38 @@ EventHub::Clock::time_point EventHub::PostWhatIsDue(Lock& lock)
         if (subscriber->m_isPosted || subscriber->m_isOver || subscriber->m_pending.IsEmpty())
             continue;
         if (subscriber->m_due > now)
-        {
             next = std::min(next, subscriber->m_due);
-            continue;
-        }
-        subscriber->m_isPosted = true;
-        due.push_back(subscriber);
+        else
+            due.push_back(subscriber);
     }
     if (due.empty())
         return next;
-    lock.unlock();
-    for (auto const& subscriber : due)
-        subscriber->m_executor(
-            [weak = std::weak_ptr<Subscriber>(subscriber)]
-            {
-                if (auto const target = weak.lock())
-                    target->Deliver();
-            });
-    due.clear();
-    lock.lock();
+    for (auto& subscriber : due)
+        Post(std::move(subscriber), lock);
     return now;  // look again: something may have come meanwhile
+}
+
+// The end of the subscription waits until its executor has returned: what the executor uses may go then.
+void EventHub::Post(std::shared_ptr<Subscriber> subscriber, Lock& lock)
+{
+    if (subscriber->m_isOver || m_isStopped)
+        return;
+    subscriber->m_isPosted = true;
+    m_posting = subscriber.get();
+    m_poster = std::this_thread::get_id();
+    lock.unlock();
+    subscriber->m_executor(
+        [weak = std::weak_ptr<Subscriber>(subscriber)]
+        {
+            if (auto const target = weak.lock())
+                target->Deliver();
+        });
+    lock.lock();
+    m_posting = nullptr;
+    m_handled.notify_all();
+    lock.unlock();
+    subscriber.reset();  // the last one, if the executor itself has ended the subscription
+    lock.lock();
 }
 
 Subscriber::Subscriber(std::weak_ptr<EventHub> hub, Interest interest, Executor executor,

@@ -55,6 +55,8 @@ private:
     void Take(std::uintptr_t session, TicketEvent const& event);
     void Run();
     Clock::time_point PostWhatIsDue(Lock& lock);
+    void Post(std::shared_ptr<Subscriber> subscriber, Lock& lock);
+    bool IsCalledByAnother(Subscriber const& subscriber) const;
 
     mutable std::mutex m_lock;
     std::vector<std::shared_ptr<Subscriber>> m_subscribers;
@@ -63,7 +65,9 @@ private:
     std::condition_variable m_work;
     mutable std::condition_variable m_handled;
     bool m_isStopped = false;
-    std::thread m_thread;  // begun with the first subscriber
+    Subscriber const* m_posting = nullptr;  // whose executor is being called
+    std::thread::id m_poster{};             // by this thread
+    std::thread m_thread;                   // begun with the first subscriber
 };
 
 // One subscription. All of it is guarded by the hub's lock, but for what never changes.
@@ -87,8 +91,8 @@ private:
 
     std::weak_ptr<EventHub> const m_hub;
     Interest const m_interest;
-    Executor const m_executor;
-    Subscription::Handler const m_handler;
+    Executor m_executor;  // both until the subscription ends
+    Subscription::Handler m_handler;
     std::chrono::milliseconds const m_interval;
 
     PendingEvents m_pending;

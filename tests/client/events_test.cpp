@@ -203,6 +203,28 @@ TEST_F(EventsOfAClient, EndOfASubscription_WaitsForItsHandler)
     runner.join();
 }
 
+TEST_F(EventsOfAClient, EndOfASubscription_WaitsForItsExecutor_AndFreesItsHandler)
+{
+    TicketAddress const job = NewTicket();
+    std::promise<void> begun;
+    std::atomic<bool> isDone = false;
+    auto const held = std::make_shared<int>(1);
+    auto subscription = connection.Subscribe(
+        Interest::InTickets({job}),
+        [&](auto const&)
+        {
+            begun.set_value();
+            std::this_thread::sleep_for(100ms);
+            isDone = true;
+        },
+        [held](Event const&) {}, 0ms);
+    ASSERT_TRUE(tickets.Write(job, "A", 1));
+    begun.get_future().wait();
+    subscription.End();
+    EXPECT_TRUE(isDone);
+    EXPECT_EQ(held.use_count(), 1);
+}
+
 TEST_F(EventsOfAClient, Subscription_MayEndInItsOwnHandler)
 {
     TicketAddress const job = NewTicket();
