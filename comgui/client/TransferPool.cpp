@@ -80,6 +80,9 @@ public:
         m_isIn = false;
     }
 
+    // Another has ended the session: its handle is worth nothing now, or stands for another session.
+    void Lose() { m_isIn = false; }
+
     bool IsIn() const { return m_isIn; }
     TLogin const& Record() const { return *m_record; }
 
@@ -187,8 +190,11 @@ void TransferPool::Work()
         bool const wasIn = lane.IsIn();
         lock.unlock();
         Outcome outcome = Carry(lane, task);
+        if (TakeSessionBack(*task))
+            lane.Lose();
+        else if (!outcome)
+            lane.Leave();  // a prepared job that failed goes with its session
         lock.lock();
-        task->session.reset();
         m_busy += (lane.IsIn() ? 1 : 0) - (wasIn ? 1 : 0);
         if (!outcome && task->isCancelled)
             outcome = Error{Cancelled, task->source, {}};
@@ -218,10 +224,17 @@ Outcome TransferPool::Carry(Lane& lane, Task const& task)
         std::lock_guard const lock(m_lock);
         task->job = *job;
     }
-    Outcome outcome = lane.Carry(*task);
-    if (!outcome)
-        lane.Leave();  // a prepared job goes with its session, and one that was cancelled has none any more
-    return outcome;
+    return lane.Carry(*task);
+}
+
+// From now on the task's session is not cut any more. Waits for a cut that has begun, and says whether there
+// was one: then nothing else may use the session, even if the transfer was faster.
+bool TransferPool::TakeSessionBack(TransferTask& task)
+{
+    Lock lock(m_lock);
+    m_over.wait(lock, [&task] { return !task.isBeingCut; });
+    task.session.reset();
+    return task.isCut;
 }
 
 // With the end of a transfer goes all that waits for it.
@@ -336,21 +349,26 @@ void TransferPool::Attend()
                 continue;
             TLogin const session = *task->session;
             bool const isCancelled = task->isCancelled;
-            if (isCancelled)
-                task->session.reset();  // once is enough
+            task->isBeingCut = isCancelled;
             lock.unlock();
-            if (isCancelled)
-                CutShort(session);
-            else
+            bool const isCut = isCancelled && CutShort(session);
+            if (!isCancelled)
                 AskForProgress(task, session);
             lock.lock();
+            if (!isCancelled)
+                continue;
+            task->isBeingCut = false;
+            task->isCut = isCut;
+            task->session.reset();  // once is enough
+            m_over.notify_all();
         }
     }
 }
 
-void TransferPool::CutShort(TLogin session)
+bool TransferPool::CutShort(TLogin session)
 {
-    (void)m_control.With([&session](ComGUIManager& manager) { return manager.Logout(&session); });
+    auto const code = m_control.With([&session](ComGUIManager& manager) { return manager.Logout(&session); });
+    return code.operator bool();
 }
 
 // A plug-in that does not know the question leaves the progress as it is.

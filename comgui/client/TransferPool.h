@@ -39,6 +39,8 @@ public:
     // Guarded by the pool's lock.
     std::optional<TLogin> session{};  // while the plug-in may be at work for it
     bool isCancelled = false;
+    bool isBeingCut = false;           // its session is being ended
+    bool isCut = false;                // its session has been ended
     std::optional<Outcome> outcome{};  // at the end
     std::optional<int> job{};
     TransferProgress progress{};
@@ -83,9 +85,10 @@ private:
     void StartThreads();
     void Work();
     Outcome Carry(Lane& lane, Task const& task);
+    bool TakeSessionBack(TransferTask& task);
     void Finish(Task const& task, Outcome outcome, Lock& lock);
     void Attend();
-    void CutShort(TLogin session);
+    bool CutShort(TLogin session);
     void AskForProgress(Task const& task, TLogin session);
     void NoteProgress(TransferTask& task, long long done, long long total);
 

@@ -161,3 +161,20 @@ TEST_F(TroubledClient, PlugInThatIsNotThere_IsAFailure_UntilItIs)
     EXPECT_TRUE(connection.FindPlugIn());
     LogIn();
 }
+
+// The cut of a transfer takes longer than the transfer itself.
+TEST_F(TroubledClient, CancelOfOneTransfer_LeavesTheOthersAlone)
+{
+    LogIn();
+    trouble.putTakes = 50;
+    trouble.logoutTakes = 100;
+    std::vector<Transfer> all;
+    for (int i = 0; i < 16; ++i)
+        all.push_back(connection.GetTransfers().Put(folder.Write(std::to_string(i), "content").string(),
+                                                    "$(TEMP)/" + std::to_string(i)));
+    Await([this] { return trouble.puts >= 4; });
+    all[0].Cancel();
+    all[1].Cancel();
+    for (std::size_t i = 2; i < all.size(); ++i)
+        EXPECT_TRUE(all[i].Wait()) << i << ": " << all[i].Wait().GetError().Text();
+}
