@@ -247,13 +247,26 @@ void Subscriber::End()
         std::exchange(onEnd, nullptr)();
 }
 
-bool Subscriber::IsOver(std::uintptr_t epoch) const
+bool Subscriber::IsOver() const
 {
     auto const hub = m_hub.lock();
     if (!hub)
         return true;
     std::lock_guard const lock(hub->m_lock);
-    return m_isOver || hub->m_isStopped || hub->m_epoch != epoch;
+    return m_isOver || hub->m_isStopped;
+}
+
+// Whether the event belongs to a session that has ended since. Those of transfers and of the server do not.
+bool Subscriber::IsOld(Event const& event, std::uintptr_t epoch) const
+{
+    bool const isOfASession =
+        std::holds_alternative<TicketChanged>(event) || std::holds_alternative<TicketCreated>(event) ||
+        std::holds_alternative<TicketDeleted>(event) || std::holds_alternative<ManyTicketsChanged>(event);
+    auto const hub = m_hub.lock();
+    if (!isOfASession || !hub)
+        return isOfASession;
+    std::lock_guard const lock(hub->m_lock);
+    return hub->m_epoch != epoch;
 }
 
 // In the executor. What a handler throws goes to the executor.
@@ -285,7 +298,7 @@ void Subscriber::Deliver()
     Run const run{*this, *hub};
     lock.unlock();
     for (Event const& event : events)
-        if (!IsOver(epoch))
+        if (!IsOver() && !IsOld(event, epoch))
             m_handler(event);
 }
 }  // namespace comgui::detail

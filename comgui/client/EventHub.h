@@ -87,7 +87,8 @@ private:
     friend class EventHub;
 
     void Deliver();
-    bool IsOver(std::uintptr_t epoch) const;
+    bool IsOver() const;
+    bool IsOld(Event const& event, std::uintptr_t epoch) const;
 
     std::weak_ptr<EventHub> const m_hub;
     Interest const m_interest;

@@ -275,6 +275,34 @@ TEST_F(EventsOfAClient, OfAnOldSession_NeverArrive_AndTheInterestLasts)
     EXPECT_THAT(heard, ElementsAre("changed " + NameOf(job) + " A=2"));
 }
 
+// The first event of a batch ends the session, or begins another.
+TEST_F(EventsOfAClient, OfTransfers_AreHeard_WhenASessionEndsAmongThem)
+{
+    for (bool const logsInAnew : {false, true})
+    {
+        LogIn();
+        heard.clear();
+        TicketAddress const first = NewTicket();
+        TicketAddress const second = NewTicket();
+        auto const subscription = connection.Subscribe({{}, {first, second}, {}, true}, queue.GetExecutor(),
+                                                       [&](Event const& event)
+                                                       {
+                                                           if (heard.empty())
+                                                               (void)connection.LogOut();
+                                                           if (heard.empty() && logsInAnew)
+                                                               LogIn();
+                                                           if (WordsOf(event) != "progress")
+                                                               heard.push_back(WordsOf(event));
+                                                       });
+        ASSERT_TRUE(tickets.Write(first, "A", 1));
+        ASSERT_TRUE(tickets.Write(second, "A", 2));
+        ASSERT_TRUE(connection.GetTransfers().Put(folder.Write("a", "b").string(), "$(TEMP)/a").Wait());
+        std::this_thread::sleep_for(50ms);  // the queue has its task by now
+        Hear(2);
+        EXPECT_THAT(heard, ElementsAre("changed " + NameOf(first) + " A=1", "ended"));
+    }
+}
+
 TEST_F(EventsOfAClient, BeforeALogin_CanBeSubscribedTo)
 {
     TicketAddress const job = NewTicket();
