@@ -246,7 +246,7 @@ void Client::Leave()
         m_notification = -1;
         m_enabled.clear();
     }
-    m_hub->EndSession();
+    m_hub->LeaveServer();
     m_manager->Logout(m_record);
     m_container = nullptr;  // the watch may have logged in anew in the middle of a logout
     m_record->iGUINotificationID = -1;

@@ -64,6 +64,15 @@ void EventHub::EndSession()
         subscriber->m_pending.DropTickets();
 }
 
+void EventHub::LeaveServer()
+{
+    EndSession();
+    std::lock_guard const lock(m_lock);
+    ++m_visit;
+    for (auto const& subscriber : m_subscribers)
+        subscriber->m_pending.DropServer();
+}
+
 void EventHub::WaitForHandlers() const
 {
     Lock lock(m_lock);
@@ -256,17 +265,18 @@ bool Subscriber::IsOver() const
     return m_isOver || hub->m_isStopped;
 }
 
-// Whether the event belongs to a session that has ended since. Those of transfers and of the server do not.
-bool Subscriber::IsOld(Event const& event, std::uintptr_t epoch) const
+// Whether the event belongs to a session or a stay at a server that has ended since.
+bool Subscriber::IsOld(Event const& event, std::uintptr_t epoch, std::uintptr_t visit) const
 {
-    bool const isOfASession =
-        std::holds_alternative<TicketChanged>(event) || std::holds_alternative<TicketCreated>(event) ||
-        std::holds_alternative<TicketDeleted>(event) || std::holds_alternative<ManyTicketsChanged>(event);
+    bool const isOfAServer =
+        std::holds_alternative<ServerLost>(event) || std::holds_alternative<ServerBack>(event);
+    bool const isOfATransfer =
+        std::holds_alternative<TransferProgressed>(event) || std::holds_alternative<TransferEnded>(event);
     auto const hub = m_hub.lock();
-    if (!isOfASession || !hub)
-        return isOfASession;
+    if (isOfATransfer || !hub)
+        return !isOfATransfer;
     std::lock_guard const lock(hub->m_lock);
-    return hub->m_epoch != epoch;
+    return isOfAServer ? hub->m_visit != visit : hub->m_epoch != epoch;
 }
 
 // In the executor. What a handler throws goes to the executor.
@@ -293,12 +303,13 @@ void Subscriber::Deliver()
     if (m_isOver || hub->m_isStopped)
         return;
     auto const epoch = hub->m_epoch;
+    auto const visit = hub->m_visit;
     auto const events = m_pending.Take();
     m_runner = std::this_thread::get_id();
     Run const run{*this, *hub};
     lock.unlock();
     for (Event const& event : events)
-        if (!IsOver() && !IsOld(event, epoch))
+        if (!IsOver() && !IsOld(event, epoch, visit))
             m_handler(event);
 }
 }  // namespace comgui::detail

@@ -31,6 +31,9 @@ public:
     void* BeginSession();
     void EndSession();
 
+    // EndSession for good: the loss and the return of the server are not delivered any more either.
+    void LeaveServer();
+
     // When it returns, no handler runs that was called for a session that has ended, unless it is the one
     // that calls this.
     void WaitForHandlers() const;
@@ -62,6 +65,7 @@ private:
     std::vector<std::shared_ptr<Subscriber>> m_subscribers;
     std::uintptr_t m_session = 0;  // 0: none
     std::uintptr_t m_epoch = 0;    // goes up with every session
+    std::uintptr_t m_visit = 0;    // goes up when a server is left
     std::condition_variable m_work;
     mutable std::condition_variable m_handled;
     bool m_isStopped = false;
@@ -88,7 +92,7 @@ private:
 
     void Deliver();
     bool IsOver() const;
-    bool IsOld(Event const& event, std::uintptr_t epoch) const;
+    bool IsOld(Event const& event, std::uintptr_t epoch, std::uintptr_t visit) const;
 
     std::weak_ptr<EventHub> const m_hub;
     Interest const m_interest;

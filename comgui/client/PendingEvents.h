@@ -43,6 +43,7 @@ public:
 
     bool IsEmpty() const;
     void DropTickets();
+    void DropServer() { m_server.clear(), m_isNewSession = false; }
 
     // Everything, in this order: the server, the tickets, by their first change, the transfers.
     std::vector<Event> Take();

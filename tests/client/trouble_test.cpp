@@ -162,6 +162,19 @@ TEST_F(TroubledClient, PlugInThatIsNotThere_IsAFailure_UntilItIs)
     LogIn();
 }
 
+TEST_F(TroubledClient, LossInAnOldSession_IsNotHeardInTheNextOne)
+{
+    LogIn();
+    auto const subscription = Listen();
+    trouble.serverIsAway = true;
+    Await([this] { return !connection.IsServerThere(); });
+    ASSERT_TRUE(connection.LogOut());
+    trouble.serverIsAway = false;
+    LogIn();
+    queue.RunFor(100ms);
+    EXPECT_THAT(heard, IsEmpty());
+}
+
 // The cut of a transfer takes longer than the transfer itself.
 TEST_F(TroubledClient, CancelOfOneTransfer_LeavesTheOthersAlone)
 {
