@@ -173,6 +173,7 @@ void EventHub::Stop()
         m_isStopped = true;
         m_work.notify_all();
     }
+    WaitForHandlers();
     if (!m_thread.joinable())
         return;
     if (m_thread.get_id() == std::this_thread::get_id())

@@ -46,7 +46,8 @@ public:
     // To all subscribers, or to those that want transfers.
     void Publish(Event const& event);
 
-    // Begins no delivery any more. When it returns, the hub's thread is over.
+    // Begins no delivery any more. When it returns, the hub's thread is over, and no handler runs, unless it
+    // is the one that calls this.
     void Stop();
 
 private:

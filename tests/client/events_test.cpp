@@ -225,6 +225,30 @@ TEST_F(EventsOfAClient, EndOfASubscription_WaitsForItsExecutor_AndFreesItsHandle
     EXPECT_EQ(held.use_count(), 1);
 }
 
+TEST_F(EventsOfAClient, EndOfAConnection_WaitsForHandlers_AlsoWhenLoggedOut)
+{
+    auto other = std::make_unique<Connection>();
+    ASSERT_TRUE(other->LogIn(Here(), Admin()));
+    TicketAddress const job = NewTicket();
+    std::promise<void> begun;
+    std::atomic<bool> isDone = false;
+    auto const subscription = other->Subscribe(Interest::InTickets({job}), queue.GetExecutor(),
+                                               [&](Event const&)
+                                               {
+                                                   (void)other->LogOut();
+                                                   begun.set_value();
+                                                   std::this_thread::sleep_for(100ms);
+                                                   isDone = true;
+                                               });
+    std::thread runner([this] { queue.Run(); });
+    ASSERT_TRUE(tickets.Write(job, "A", 1));
+    begun.get_future().wait();
+    other.reset();
+    EXPECT_TRUE(isDone);
+    queue.Stop();
+    runner.join();
+}
+
 TEST_F(EventsOfAClient, Subscription_MayEndInItsOwnHandler)
 {
     TicketAddress const job = NewTicket();
