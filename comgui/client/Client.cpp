@@ -134,7 +134,7 @@ Result<User> Client::LogIn(Server const& server, Account const& account)
         return prepared.GetError();
     Assign(m_record->szUser, account.user);
     Assign(m_record->szPassword, account.password);
-    if (Outcome const entered = Enter(); !entered)
+    if (Outcome const entered = Enter(*m_manager); !entered)
         return entered.GetError();
     User const user{
         m_record->szUser, {UserTickets, m_record->iClientStamp}, m_manager->IsCurrentUserAdmin(m_record)};
@@ -180,21 +180,25 @@ Outcome Client::Prepare(Server const& server)
     return {};
 }
 
-// Logs in with what the record holds.
-Outcome Client::Enter()
+// Logs in with what the record holds. Without success there is no new session: ender ends it.
+Outcome Client::Enter(ComGUIManager& ender)
 {
     (void)m_ownRecord.release();  // the manager's from here on, whatever comes
     if (int const code = m_manager->Login(m_record); code != 0)
         return FailureOf(*m_manager, code, m_record->szUser);
     MTICKET_ACCESS const* const container = m_manager->GetClientContainer();
-    Outcome outcome = container ? Register() : Outcome(Error{NoContainer, m_record->szUser, {}});
+    Outcome const outcome = container ? Register() : Outcome(Error{NoContainer, m_record->szUser, {}});
     if (!outcome)
     {
         m_hub->EndSession();
-        m_manager->Logout(m_record);
+        ender.Logout(m_record);
         return outcome;
     }
+    // Together: the number is worth something to this container alone.
+    std::lock_guard const lock(m_interests);
     m_container = container;
+    m_notification = m_record->iGUINotificationID;
+    m_enabled.clear();
     m_isServerThere = true;
     return {};
 }
@@ -216,9 +220,6 @@ Outcome Client::Register()
     if (!ticket.Get("iGUINotificationID", id))
         return Error{CallbackRefused, {}, {}};
     m_record->iGUINotificationID = id;
-    std::lock_guard const lock(m_interests);
-    m_notification = id;
-    m_enabled.clear();
     return {};
 }
 
@@ -426,7 +427,7 @@ void Client::Look(ComGUIManager& watcher)
     }
     Server const server{record->szServerHost, record->iServerPort};
     NoteLoss({ServerAway, NameOf(server), TakeReason(watcher)});
-    if (watcher.IsAlive(&*record) != NotReachable && EnterAgain())
+    if (watcher.IsAlive(&*record) != NotReachable && EnterAgain(watcher))
         m_hub->Publish(ServerBack{true});  // the server was there, and the session was not
 }
 
@@ -436,8 +437,10 @@ void Client::NoteLoss(Error error)
         m_hub->Publish(ServerLost{std::move(error)});
 }
 
-// With growing pauses: servers answer ever later whom they have refused often.
-bool Client::EnterAgain()
+// With growing pauses: servers answer ever later whom they have refused often. The old session ends when
+// there is a new one, since tickets may still be read in it, and through the watcher, since a logout by the
+// manager gives the local port away.
+bool Client::EnterAgain(ComGUIManager& watcher)
 {
     constexpr std::chrono::seconds LongestPause(60);
     auto const now = std::chrono::steady_clock::now();
@@ -447,8 +450,13 @@ bool Client::EnterAgain()
     m_entryPause = std::min(2 * m_entryPause, LongestPause);
     {
         std::lock_guard const lock(m_calls);
-        if (!Enter())
+        TLogin old = *m_record;
+        if (!Enter(watcher))
+        {
+            *m_record = old;
             return false;
+        }
+        watcher.Logout(&old);
     }
     m_entryPause = std::chrono::seconds(1);
     SwitchNotifications();

@@ -66,7 +66,7 @@ private:
     };
 
     Outcome Prepare(Server const& server);
-    Outcome Enter();
+    Outcome Enter(ComGUIManager& ender);
     Outcome Register();
     void Leave();
     void SwitchNotifications();
@@ -74,7 +74,7 @@ private:
     void Watch();
     void Look(ComGUIManager& watcher);
     void NoteLoss(Error error);
-    bool EnterAgain();
+    bool EnterAgain(ComGUIManager& watcher);
 
     std::shared_ptr<EventHub> const m_hub = std::make_shared<EventHub>();
     std::shared_ptr<TransferPool> m_pool;

@@ -191,3 +191,30 @@ TEST_F(TroubledClient, CancelOfOneTransfer_LeavesTheOthersAlone)
     for (std::size_t i = 2; i < all.size(); ++i)
         EXPECT_TRUE(all[i].Wait()) << i << ": " << all[i].Wait().GetError().Text();
 }
+
+TEST_F(TroubledClient, EverySession_EndsOnce_AlsoOneThatIsReplaced)
+{
+    LogIn();
+    auto const subscription = Listen();
+    trouble.sessionIsGone = true;
+    ASSERT_THAT(Hear(2), ElementsAre(HasSubstr("lost"), "back anew"));
+    ASSERT_TRUE(connection.LogOut());
+    EXPECT_EQ(trouble.logins, 2);
+    EXPECT_EQ(trouble.logouts, 2);
+    LogIn();
+    EXPECT_EQ(connection.LocalEndPoint(), "127.0.0.1:50106");
+}
+
+TEST_F(TroubledClient, SessionThatIsReplacedByOneWithoutTickets_EndsOnce)
+{
+    LogIn();
+    auto const subscription = Listen();
+    trouble.hasNoContainer = true;
+    trouble.sessionIsGone = true;
+    Await([this] { return trouble.logins == 2; });
+    ASSERT_TRUE(connection.LogOut());
+    EXPECT_EQ(trouble.logins, trouble.logouts);
+    trouble.hasNoContainer = false;
+    LogIn();
+    EXPECT_EQ(connection.LocalEndPoint(), "127.0.0.1:50106");
+}
