@@ -129,6 +129,10 @@ Result<User> Client::LogIn(Server const& server, Account const& account)
         (void)LogOut();
         lifecycle.lock();
     }
+    {
+        std::lock_guard const watching(m_watching);
+        m_isWatchOver = false;
+    }
     std::unique_lock lock(m_calls);
     if (Outcome const prepared = Prepare(server); !prepared)
         return prepared.GetError();
@@ -141,8 +145,6 @@ Result<User> Client::LogIn(Server const& server, Account const& account)
     lock.unlock();
 
     SwitchNotifications();
-    std::lock_guard const watching(m_watching);
-    m_isWatchOver = false;
     m_nextEntry = {};
     try
     {
@@ -187,7 +189,11 @@ Outcome Client::Enter(ComGUIManager& ender)
     if (int const code = m_manager->Login(m_record); code != 0)
         return FailureOf(*m_manager, code, m_record->szUser);
     MTICKET_ACCESS const* const container = m_manager->GetClientContainer();
-    Outcome const outcome = container ? Register() : Outcome(Error{NoContainer, m_record->szUser, {}});
+    Outcome outcome = container ? Outcome() : Outcome(Error{NoContainer, m_record->szUser, {}});
+    if (outcome && IsWatchOver())
+        outcome = Error{Cancelled, m_record->szUser, {}};
+    if (outcome)
+        outcome = Register();
     if (!outcome)
     {
         m_hub->EndSession();
@@ -200,6 +206,8 @@ Outcome Client::Enter(ComGUIManager& ender)
     m_notification = m_record->iGUINotificationID;
     m_enabled.clear();
     m_isServerThere = true;
+    std::lock_guard const copying(m_copying);
+    m_copy = *m_record;
     return {};
 }
 
@@ -251,6 +259,8 @@ void Client::Leave()
     m_manager->Logout(m_record);
     m_container = nullptr;  // the watch may have logged in anew in the middle of a logout
     m_record->iGUINotificationID = -1;
+    std::lock_guard const copying(m_copying);
+    m_copy.reset();
 }
 
 void Client::End()
@@ -262,32 +272,31 @@ void Client::End()
 
 std::string Client::LocalEndPoint() const
 {
-    std::lock_guard const lock(m_calls);
-    return IsLoggedIn() ? m_record->szLocalEndPoint : std::string();
+    auto const record = Record();
+    return record ? record->szLocalEndPoint : std::string();
 }
 
 std::optional<TLogin> Client::Record() const
 {
-    std::lock_guard const lock(m_calls);
-    return IsLoggedIn() ? std::optional<TLogin>(*m_record) : std::nullopt;
+    std::lock_guard const lock(m_copying);
+    return IsLoggedIn() ? m_copy : std::nullopt;
 }
 
+namespace
+{
 // The size may grow between the question and the answer.
-Result<std::string> Client::TicketData(TicketAddress ticket)
+Result<std::string> XmlOf(ComGUIManager& manager, TLogin& record, TicketAddress ticket)
 {
     constexpr int Xml = 0;
     constexpr int BufferTooSmall = 110;
     std::string const name = std::to_string(ticket.type) + "/" + std::to_string(ticket.id);
-    std::lock_guard const lock(m_calls);
-    if (!IsLoggedIn())
-        return Error{NotLoggedIn, {}, {}};
     std::string data;
     for (int tries = 0, size = 0; tries < 8; ++tries)
     {
-        int const code = m_manager->GetTicketData(m_record, ticket.type, ticket.id, Xml, &size, data.data());
+        int const code = manager.GetTicketData(&record, ticket.type, ticket.id, Xml, &size, data.data());
         bool const isTooSmall = code == BufferTooSmall && size > static_cast<int>(data.size());
         if (code != 0 && !isTooSmall)
-            return FailureOf(*m_manager, code, name);
+            return FailureOf(manager, code, name);
         if (size < 0 || (code == 0 && size > static_cast<int>(data.size())))
             return Error{BadAnswer, name, {}};
         data.resize(static_cast<std::size_t>(size));
@@ -295,6 +304,21 @@ Result<std::string> Client::TicketData(TicketAddress ticket)
             return data;
     }
     return Error{BadAnswer, name, {}};
+}
+}  // namespace
+
+// With a manager of its own: the plug-in may take long, and neither the watch nor a logout waits for it.
+Result<std::string> Client::TicketData(TicketAddress ticket)
+{
+    auto record = Record();
+    if (!record)
+        return Error{NotLoggedIn, {}, {}};
+    auto data = m_writer.With([&](ComGUIManager& manager) { return XmlOf(manager, *record, ticket); });
+    if (!data)
+        return data.GetError();
+    if (!*data && !IsLoggedIn())
+        return Error{NotLoggedIn, {}, {}};
+    return *std::move(data);
 }
 
 Error Client::Failure(int code, std::string about)
@@ -375,6 +399,8 @@ void Client::SwitchNotifications()
         auto const known = m_enabled.find(address);
         if (known != m_enabled.end() && known->second == keys)
             continue;
+        if (IsWatchOver())
+            return;  // a logout
         std::vector<char const*> table;
         for (std::string const& key : keys)
             table.push_back(key.c_str());
@@ -395,6 +421,12 @@ void Client::StopWatching()
         m_watch.join();
 }
 
+bool Client::IsWatchOver() const
+{
+    std::lock_guard const lock(m_watching);
+    return m_isWatchOver;
+}
+
 // Once a second, on a thread and with a manager of its own: an answer may take long.
 void Client::Watch()
 {
@@ -412,13 +444,17 @@ void Client::Watch()
     }
 }
 
+// The end of the watch waits for one call of the plug-in at most: hence the many questions.
 void Client::Look(ComGUIManager& watcher)
 {
     auto record = Record();
     if (!record)
         return;
     bool const isThere = m_isServerThere;
-    if (Answers(watcher, *record))
+    bool const answers = Answers(watcher, *record);
+    if (IsWatchOver())
+        return;
+    if (answers)
     {
         m_isServerThere = true;
         if (!isThere)
@@ -427,7 +463,8 @@ void Client::Look(ComGUIManager& watcher)
     }
     Server const server{record->szServerHost, record->iServerPort};
     NoteLoss({ServerAway, NameOf(server), TakeReason(watcher)});
-    if (watcher.IsAlive(&*record) != NotReachable && EnterAgain(watcher))
+    bool const isReachable = watcher.IsAlive(&*record) != NotReachable;
+    if (isReachable && !IsWatchOver() && EnterAgain(watcher))
         m_hub->Publish(ServerBack{true});  // the server was there, and the session was not
 }
 

@@ -1,7 +1,8 @@
 // What a connection and its handles share: the session, and what goes on beside it. For any thread.
 //
 // Locks, in the order in which they are taken: m_lifecycle for whole logins and logouts, m_calls for the
-// manager, m_interests for what is switched on. Handlers and executors are called under none of them.
+// manager, m_interests for what is switched on, m_copying and m_watching. Handlers and executors are called
+// under none of them.
 #pragma once
 
 #include "comgui/client/Connection.h"
@@ -71,6 +72,7 @@ private:
     void Leave();
     void SwitchNotifications();
     void StopWatching();
+    bool IsWatchOver() const;
     void Watch();
     void Look(ComGUIManager& watcher);
     void NoteLoss(Error error);
@@ -81,6 +83,7 @@ private:
     SharedManager m_tester;   // for servers that are only tested
     SharedManager m_watcher;  // for the watch
     SharedManager m_helper;   // for reasons
+    SharedManager m_writer;   // for tickets as XML
     std::atomic<MTICKET_ACCESS const*> m_container{nullptr};
     std::atomic<bool> m_isServerThere{false};
 
@@ -91,11 +94,14 @@ private:
     std::unique_ptr<ComGUIManager> m_manager;
     TLogin* m_record = nullptr;
 
+    mutable std::mutex m_copying;    // the member below
+    std::optional<TLogin> m_copy{};  // of the session's record, for those who must not wait for a login
+
     std::mutex m_interests;  // the members below
     std::map<TicketAddress, std::set<std::string>> m_enabled;
     int m_notification = -1;
 
-    std::mutex m_watching;  // the members below
+    mutable std::mutex m_watching;  // the members below
     std::condition_variable m_watchEnds;
     bool m_isWatchOver = false;
     std::thread m_watch;

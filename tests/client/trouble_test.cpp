@@ -218,3 +218,35 @@ TEST_F(TroubledClient, SessionThatIsReplacedByOneWithoutTickets_EndsOnce)
     LogIn();
     EXPECT_EQ(connection.LocalEndPoint(), "127.0.0.1:50106");
 }
+
+// The watch asks once a second. What it does when its question is answered is not waited for.
+TEST_F(TroubledClient, EndOfASession_WaitsForOneCallOfTheWatchAtMost)
+{
+    LogIn();
+    trouble.questionTakes = 500;
+    trouble.loginTakes = 5000;
+    trouble.sessionIsGone = true;
+    Await([this] { return trouble.questions > 0; });
+    auto const start = Clock::now();
+    ASSERT_TRUE(connection.LogOut());
+    EXPECT_LT(Clock::now() - start, 3s);
+    EXPECT_EQ(trouble.logins, 1);
+    trouble.loginTakes = 0;
+}
+
+TEST_F(TroubledClient, SlowTicketAsXml_HoldsNothingUp)
+{
+    LogIn();
+    auto const subscription = Listen();
+    trouble.ticketDataTakes = 4000;
+    std::thread asks([this] { (void)tickets.ToXml(System); });
+    Await([this] { return trouble.ticketData > 0; });
+    auto const start = Clock::now();
+    EXPECT_EQ(connection.LocalEndPoint(), "127.0.0.1:50106");
+    trouble.serverIsAway = true;
+    EXPECT_THAT(Hear(1), ElementsAre(HasSubstr("lost")));
+    EXPECT_TRUE(connection.LogOut());
+    EXPECT_LT(Clock::now() - start, 3s);
+    trouble.ticketDataTakes = 0;
+    asks.join();
+}
