@@ -375,6 +375,24 @@ TEST_F(PostgresBreak, OutcomeOfACommit_IsFoundThoughTheJournalWasPrunedMeanwhile
     EXPECT_FALSE(store->FindCommit(writer.LastNumber() + 1));
 }
 
+// Nobody waits for it any more, though it is there, as it is for one that has just come back.
+TEST_F(PostgresBreak, OutcomeOfACommit_IsFoundThoughTheJournalHasLeftTheLivingProgramBehind)
+{
+    PostgresOptions options = AtOnce();
+    options.limits.journalKept = 0;
+    options.limits.journalLargest = 1;
+    auto const third = schema.Open(options);
+    writer.Make(Job);
+    for (int i = 0; i < 3; ++i)
+        otherWriter.Do(CreationOfNext(3));
+    third->Maintain(4);
+    EXPECT_FALSE(other->ChangesSince(0, [](CommittedChange&&) { ADD_FAILURE(); }));
+    auto const found = store->FindCommit(writer.LastNumber());
+    ASSERT_TRUE(found);
+    EXPECT_EQ(found->sequence, 1u);
+    EXPECT_EQ(found->address, Job);
+}
+
 // Of one that was taken for dead, and of what it may ask for alone.
 TEST_F(PostgresBreak, OutcomeOfACommit_IsFoundThoughTheProgramWasBuriedAndTheJournalPruned)
 {

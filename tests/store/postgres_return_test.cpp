@@ -265,6 +265,20 @@ TEST_F(PostgresReturn, ToASiteOfTheFirstVersion_IsAsToANewOne)
     reopened->Maintain(1);
 }
 
+// Whose pruning forgot what the living might still ask for.
+TEST_F(PostgresReturn, ToASiteOfTheSecondVersion_MendsItsPruning)
+{
+    store->Leave();
+    schema.Run("CREATE OR REPLACE FUNCTION S.prune_journal(kept bigint, largest bigint, at_once bigint, gone "
+               "bigint[]) RETURNS bigint LANGUAGE sql AS 'SELECT 0::bigint'");
+    schema.Run("UPDATE S.site SET version = 2");
+    options.limits.journalKept = 0;
+    auto const reopened = schema.Open(options);
+    Writer(*reopened).Make(Job);
+    reopened->Maintain(1);
+    EXPECT_EQ(schema.Run("SELECT pruned FROM S.site"), "1");
+}
+
 // --- opening
 
 TEST_F(PostgresReturn, OfAReplacement_FindsWhoHasBegunToOpenTheSite)

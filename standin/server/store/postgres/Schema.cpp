@@ -246,18 +246,20 @@ constexpr char const* CommitChange = R"(
 // Comes every moment, so that it neither locks nor writes if nothing is due, and waits for no disk and no
 // standby: it is repeated if it is lost.
 //
-// One program prunes at a time. gone: programs for which nothing is kept unless they live. What an
-// unreachable program has committed is kept for a month, so that it finds out when it is back.
+// One program prunes at a time. gone: programs for which nothing is kept unless they live. What a program has
+// committed that is not known to have heard of it is kept for a month, so that it finds out when it asks:
+// whether it lives just now does not matter, for one that was away may be back at any moment, and the journal
+// leaves the living behind, too, if they are slow.
 constexpr char const* Maintenance = R"(
     DROP FUNCTION IF EXISTS prune_journal(bigint, bigint, bigint);
 
-    CREATE FUNCTION note_heard(self bigint, sequence bigint) RETURNS void LANGUAGE plpgsql AS $$
+    CREATE OR REPLACE FUNCTION note_heard(self bigint, sequence bigint) RETURNS void LANGUAGE plpgsql AS $$
     BEGIN
         SET LOCAL synchronous_commit = off;
         UPDATE program p SET heard = sequence WHERE p.id = self AND p.heard <> sequence;
     END $$;
 
-    CREATE FUNCTION due_for_pruning(kept bigint, largest bigint, at_once bigint, gone bigint[],
+    CREATE OR REPLACE FUNCTION due_for_pruning(kept bigint, largest bigint, at_once bigint, gone bigint[],
             OUT before bigint, OUT up_to bigint)
         LANGUAGE plpgsql AS $$
     DECLARE
@@ -270,8 +272,8 @@ constexpr char const* Maintenance = R"(
         up_to := least(greatest(up_to, last - largest), before + at_once);
     END $$;
 
-    CREATE FUNCTION prune_journal(kept bigint, largest bigint, at_once bigint, gone bigint[]) RETURNS bigint
-        LANGUAGE plpgsql AS $$
+    CREATE OR REPLACE FUNCTION prune_journal(kept bigint, largest bigint, at_once bigint, gone bigint[])
+        RETURNS bigint LANGUAGE plpgsql AS $$
     DECLARE
         before bigint;
         up_to bigint;
@@ -290,7 +292,6 @@ constexpr char const* Maintenance = R"(
             SELECT j.program, j.number, j.sequence, j.type, j.id FROM journal j
             JOIN program p ON p.id = j.program
             WHERE j.sequence > before AND j.sequence <= up_to AND j.sequence > p.heard
-                AND p.id NOT IN (SELECT l.program FROM living l)
             ON CONFLICT DO NOTHING;
         DELETE FROM journal j WHERE j.sequence > before AND j.sequence <= up_to;
         WITH dropped AS (DELETE FROM outcome o WHERE o.since < now() - interval '30 days' RETURNING o.sequence)
@@ -321,7 +322,7 @@ constexpr char const* Eras = R"(
 )";
 
 // The step to version n + 1 stands at n.
-constexpr std::initializer_list<char const*> Steps[] = {{Tables, Life, CommitChange}, {Eras, Maintenance}};
+constexpr std::initializer_list<char const*> Steps[] = {{Tables, Life, CommitChange}, {Eras}, {Maintenance}};
 constexpr int Version = static_cast<int>(std::size(Steps));
 
 // Rolled back at its end unless committed; if even that fails, whoever has the connection drops it.
