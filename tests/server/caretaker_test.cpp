@@ -142,6 +142,37 @@ TEST_F(LeftByTheDead, PreparedJobOfALivingProgram_Stays)
     EXPECT_THAT(Jobs(), ElementsAre(1, id));
 }
 
+// By its own program, which was away only, and has come back in the middle of the burial.
+TEST_F(LeftByTheDead, PreparedJobThatIsSentDuringTheBurial_StaysWithItsFolder)
+{
+    Prepare();
+    int const sent = Prepare();
+    Make("job/" + std::to_string(sent) + "/whole.pdf");
+    living->server.Stop(std::chrono::minutes(1));
+    testing::internal::CaptureStderr();
+    dying->store.Die();
+    dying.reset();
+    MemoryStore sender(site);
+    site->Interject(
+        [&]
+        {
+            TicketChange sending;
+            sending.address = {JobTicketType, sent};
+            auto const loaded = sender.Load(sending.address, [](auto, int, auto const&) {});
+            sending.incarnation = loaded->state.incarnation;
+            sending.revision = loaded->state.revision;
+            sending.owner = TicketChange::Owner::Nobody;
+            EXPECT_EQ(sender.Commit(sending, 1).kind, CommitOutcome::Committed);
+        });
+    living->server.Tidy();
+    EXPECT_EQ(living->store.Programs().size(), 3u);
+    living->server.Tidy();
+    EXPECT_EQ(living->store.Programs().size(), 2u);
+    testing::internal::GetCapturedStderr();
+    EXPECT_THAT(Jobs(), ElementsAre(1, sent));
+    EXPECT_TRUE(Has("job/" + std::to_string(sent) + "/whole.pdf"));
+}
+
 TEST_F(LeftByTheDead, JobFolderWithoutATicket_Goes_AndOthersStay)
 {
     for (std::string const name :

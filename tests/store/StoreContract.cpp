@@ -1226,6 +1226,18 @@ TEST_P(StoreContract, Bury_HandsOverWhatTheDeadHasLeft)
     EXPECT_THAT(estate.partFiles, ElementsAre("/tmp/other"));
 }
 
+TEST_P(StoreContract, Bury_GivesTheRevisionThatATicketHas)
+{
+    writer->Do(Creation(Job).Own(CHANGE::Owner::ThisProgram));
+    writer->Put(Job, "A", 0, 1);
+    store.reset();
+    Estate estate;
+    EXPECT_EQ(other->Bury([&estate](Estate const& left) { estate = left; }), 1);
+    ASSERT_EQ(estate.tickets.size(), 1u);
+    EXPECT_EQ(estate.tickets[0].incarnation, 1u);
+    EXPECT_EQ(estate.tickets[0].revision, 2u);
+}
+
 TEST_P(StoreContract, Bury_LetsTheStoreBeUsed)
 {
     writer->Do(Creation(Job).Own(CHANGE::Owner::ThisProgram));

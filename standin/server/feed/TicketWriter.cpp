@@ -138,7 +138,7 @@ bool TicketWriter::Delete(Ticket ticket)
     return UntilDone([&] { return DeleteOrThrow(ticket) ? Result::Done : Result::Failed; });
 }
 
-bool TicketWriter::DeleteOrThrow(Ticket ticket)
+bool TicketWriter::DeleteOrThrow(Ticket ticket, Sequence revision)
 {
     return UntilDoneOrThrow(
         [&]
@@ -155,7 +155,7 @@ bool TicketWriter::DeleteOrThrow(Ticket ticket)
                                                 change.revision = snapshot.Which().revision;
                                                 whenDeleted = m_after.WhenDeleted(ticket.address, snapshot);
                                             });
-            if (!isThere)
+            if (!isThere || (revision != TicketChange::AnyRevision && change.revision != revision))
                 return Result::Failed;
             CommitOutcome outcome;
             Result const result = Commit(std::move(change), plannedAt, outcome);

@@ -65,8 +65,9 @@ public:
     // False for a ticket that is missing.
     bool Delete(Ticket ticket);
 
-    // The same for who tries again and again: what the store throws passes through.
-    bool DeleteOrThrow(Ticket ticket);
+    // The same for who tries again and again: what the store throws passes through. revision: of the last
+    // change that the ticket may have had; false if it is another one here.
+    bool DeleteOrThrow(Ticket ticket, Sequence revision = TicketChange::AnyRevision);
 
 private:
     enum class Result

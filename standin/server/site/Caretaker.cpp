@@ -82,6 +82,8 @@ void Caretaker::Tidy() noexcept
         });
 }
 
+// The right to bury the program may be lost in the middle of it, and the program may come back then and send
+// its jobs: so nothing goes that has changed since the estate was listed, and the next burial looks again.
 void Caretaker::Clear(Estate const& estate)
 {
     m_hasBuried = true;
@@ -89,7 +91,8 @@ void Caretaker::Clear(Estate const& estate)
         RemovePartFile(file);
     for (Estate::Ticket const& ticket : estate.tickets)
     {
-        if (!m_writer.DeleteOrThrow({ticket.address, ticket.incarnation}) && IsStored(ticket))
+        if (!m_writer.DeleteOrThrow({ticket.address, ticket.incarnation}, ticket.revision) &&
+            IsStored(ticket))
             throw StoreError("a job of a program that has died cannot be deleted yet; it is tried again by "
                              "itself");
     }

@@ -112,6 +112,7 @@ struct Estate
     {
         TicketAddress address;
         Incarnation incarnation;
+        Sequence revision;  // with which the program owned it: with another one it may be somebody's again
     };
     ProgramId program = 0;
     std::vector<Ticket> tickets;         // that it owned

@@ -462,7 +462,7 @@ ProgramId MemoryStore::NextToBury(ProgramId after, Estate& estate)
     estate.program = found->first;
     for (auto const& [address, ticket] : m_site->m_tickets)
         if (ticket.owner == estate.program)
-            estate.tickets.push_back({address, ticket.state.incarnation});
+            estate.tickets.push_back({address, ticket.state.incarnation, ticket.state.revision});
     for (auto const& [path, program] : m_site->m_partFiles)
         if (program == estate.program)
             estate.partFiles.push_back(path);

@@ -179,10 +179,12 @@ bool PostgresStore::TakeEstate(Estate& estate)
     if (turn.Run("SELECT FROM program WHERE id = $1", id).Rows() == 0)
         return false;
     Result const tickets =
-        turn.Run("SELECT type, id, incarnation FROM ticket WHERE owner = $1 AND owner <> 0", id);
+        turn.Run("SELECT type, id, incarnation, revision FROM ticket WHERE owner = $1 AND owner <> 0", id);
     estate.tickets = tickets.Each(
-        [&tickets](int row) {
-            return Estate::Ticket{{tickets.Int(row, 0), tickets.Int(row, 1)}, tickets.Number(row, 2)};
+        [&tickets](int row)
+        {
+            return Estate::Ticket{
+                {tickets.Int(row, 0), tickets.Int(row, 1)}, tickets.Number(row, 2), tickets.Number(row, 3)};
         });
     Result const files = turn.Run("SELECT path FROM part_file WHERE program = $1", id);
     estate.partFiles = files.Each([&files](int row) { return files.Text(row, 0); });

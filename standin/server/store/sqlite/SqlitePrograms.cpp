@@ -107,7 +107,7 @@ bool SqliteStore::TakeEstate(Estate& estate)
     Reading const reading(*this);
     Database::Statement const program = database.Prepare("SELECT 1 FROM program WHERE id = ?");
     Database::Statement const tickets =
-        database.Prepare("SELECT type, id, incarnation FROM ticket WHERE owner = ? AND owner <> 0");
+        database.Prepare("SELECT type, id, incarnation, revision FROM ticket WHERE owner = ? AND owner <> 0");
     Database::Statement const partFiles = database.Prepare("SELECT path FROM part_file WHERE program = ?");
     Database::Run programRun(database, program);
     programRun << id;
@@ -116,7 +116,8 @@ bool SqliteStore::TakeEstate(Estate& estate)
     Database::Run ticketRun(database, tickets);
     ticketRun << id;
     while (ticketRun.Step())
-        estate.tickets.push_back({{ticketRun.Int(0), ticketRun.Int(1)}, ticketRun.Number(2)});
+        estate.tickets.push_back(
+            {{ticketRun.Int(0), ticketRun.Int(1)}, ticketRun.Number(2), ticketRun.Number(3)});
     Database::Run fileRun(database, partFiles);
     fileRun << id;
     while (fileRun.Step())
