@@ -3,9 +3,11 @@
 
 #include "tests/store/PostgresSite.h"
 #include "tests/store/SiteStoreContract.h"
+#include "tests/support/ChildProcess.h"
 #include "tests/support/NetworkProxy.h"
 #include <future>
 #include <gmock/gmock.h>
+#include <unistd.h>
 
 using namespace standin;
 using namespace std::chrono_literals;
@@ -282,11 +284,37 @@ TEST_F(PostgresReplacing, NotFinished_LeavesTheOldOneAndNothingElse)
 
 TEST_F(PostgresReplacing, AfterAKill_BeginsAnew)
 {
-    schema.cluster.Run("CREATE SCHEMA " + schema.Name() + "_new");
-    schema.cluster.Run("CREATE TABLE " + schema.Name() + "_new.site (rest integer)");
+    ChildProcess killed(
+        [this](ChildProcess::Report const& report)
+        {
+            auto const begun = Begin(Old::Forbidden);
+            report(1);
+            sleep(60);
+        });
+    ASSERT_EQ(killed.Next(), 1);
+    killed.Kill();
+    ASSERT_TRUE(HasLeftovers());
     auto const replacement = Begin(Old::Forbidden);
     replacement->Finish();
     EXPECT_EQ(Value(), 2);
+}
+
+// As any owner of the database may have made one.
+TEST_F(PostgresReplacing, WhoseSchemaHasTheNameOfAnothers_IsRefusedAndLeavesThat)
+{
+    schema.cluster.Run("CREATE SCHEMA " + schema.Name() + "_new");
+    schema.cluster.Run("CREATE TABLE " + schema.Name() + "_new.site (rest integer)");
+    EXPECT_THAT(ReasonOfBeginning(Old::Forbidden),
+                HasSubstr("its schema " + schema.Name() + "_new belongs to another program"));
+    EXPECT_EQ(schema.cluster.Run("SELECT count(*) FROM " + schema.Name() + "_new.site"), "0");
+}
+
+// By it the next one would take the site itself for what a kill has left.
+TEST_F(PostgresReplacing, Finished_BearsNoMark)
+{
+    Begin(Old::Forbidden)->Finish();
+    EXPECT_EQ(schema.Run("SELECT obj_description('" + schema.Name() + "'::regnamespace, 'pg_namespace')"),
+              "");
 }
 
 TEST_F(PostgresReplacing, OfASiteThatIsOpen_IsRefusedWithTheNameOfWhoHasIt)

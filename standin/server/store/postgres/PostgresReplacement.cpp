@@ -15,6 +15,10 @@ namespace
 constexpr std::chrono::seconds PatienceWithOthers(5);
 constexpr std::chrono::milliseconds PauseForServer(100);
 
+// The comment of a schema in which a new site is being made. Who finds one may drop it: two who make one at a
+// time are kept apart, so somebody was killed.
+constexpr std::string_view Mark = "a site that is being made";
+
 std::string NewNameFor(PostgresOptions const& options) { return options.schema + "_new"; }
 
 PostgresOptions Beside(PostgresOptions options)
@@ -34,11 +38,18 @@ PostgresReplacement::PostgresReplacement(std::string const& uri, Old old, Postgr
         throw StoreError(m_connection->Name() + ": there is a site already; name another database");
     if (m_hasOld)
         CheckIsNotOpen();
-    // Of somebody who was killed: two at a time are kept apart above.
-    m_connection->Execute("DROP SCHEMA IF EXISTS " + m_connection->Quoted(NewNameFor(m_options)) + " CASCADE",
-                          Deadline());
-    m_store = std::make_unique<PostgresStore>(
-        uri, [] { return StoreContent(); }, Beside(m_options));
+    DropUnfinished();
+    MakeMarkedSchema();
+    try
+    {
+        m_store = std::make_unique<PostgresStore>(
+            uri, [] { return StoreContent(); }, Beside(m_options));
+    }
+    catch (...)
+    {
+        DropAfterFailure();
+        throw;
+    }
 }
 
 PostgresReplacement::~PostgresReplacement()
@@ -46,13 +57,42 @@ PostgresReplacement::~PostgresReplacement()
     if (!m_store)
         return;
     m_store.reset();
+    DropAfterFailure();
+}
+
+// Statements of one call are one transaction.
+void PostgresReplacement::MakeMarkedSchema()
+{
+    std::string const name = m_connection->Quoted(NewNameFor(m_options));
+    m_connection->Execute("CREATE SCHEMA " + name + "; COMMENT ON SCHEMA " + name + " IS '" +
+                              std::string(Mark) + '\'',
+                          Deadline());
+}
+
+// Whoever's it was. Throws StoreError if the schema is no unfinished site.
+void PostgresReplacement::DropUnfinished()
+{
+    std::string const name = NewNameFor(m_options);
+    auto const found = m_connection->Run(
+        "SELECT coalesce(obj_description(oid, 'pg_namespace') = convert_from($2, 'UTF8'), false) "
+        "FROM pg_namespace WHERE nspname = convert_from($1, 'UTF8')",
+        Parameters() << std::string_view(name) << Mark, Deadline());
+    if (found.Rows() == 0)
+        return;
+    if (!found.Bool(0, 0))
+        throw StoreError(m_connection->Name() + ": its schema " + name +
+                         " belongs to another program; rename that, then try again");
+    m_connection->Execute("DROP SCHEMA " + m_connection->Quoted(name) + " CASCADE", Deadline());
+}
+
+void PostgresReplacement::DropAfterFailure() noexcept
+{
     try
     {
         if (m_connection)
-            m_connection->Execute("DROP SCHEMA " + m_connection->Quoted(NewNameFor(m_options)) + " CASCADE",
-                                  Deadline());
+            DropUnfinished();
     }
-    catch (StoreError const&)
+    catch (std::exception const&)
     {
         // The next one drops it.
     }
@@ -90,7 +130,8 @@ std::string PostgresReplacement::Exchange(std::string const& aside)
     std::string const made = m_connection->Quoted(NewNameFor(m_options));
     if (m_isPrepared)
         return MoveAll(made, name);
-    std::string rename = "ALTER SCHEMA " + made + " RENAME TO " + name;
+    std::string rename =
+        "COMMENT ON SCHEMA " + made + " IS NULL; ALTER SCHEMA " + made + " RENAME TO " + name;
     if (!m_hasOld)
         return rename;
     return "UPDATE " + made + ".site SET (number, has_folder) = (SELECT number, has_folder FROM " + name +

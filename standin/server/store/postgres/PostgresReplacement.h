@@ -23,7 +23,8 @@ public:
     };
 
     // Begins it. Until it is finished, or the object goes, nobody can open the site that is there. Throws
-    // StoreError: also if programs have that open.
+    // StoreError: also if programs have that open, or if the name that is needed meanwhile, with _new at its
+    // end, is another schema's.
     PostgresReplacement(std::string const& uri, Old old, PostgresOptions options = {});
     ~PostgresReplacement();  // nothing of it is left unless it was finished
     PostgresReplacement(PostgresReplacement const&) = delete;
@@ -44,6 +45,9 @@ private:
     postgres::Clock::time_point Deadline() const;
     void LookForOld();
     void CheckIsNotOpen();
+    void MakeMarkedSchema();
+    void DropUnfinished();
+    void DropAfterFailure() noexcept;
     std::string FreeName();
     std::string Exchange(std::string const& aside);
     std::string MoveAll(std::string const& made, std::string const& name);
