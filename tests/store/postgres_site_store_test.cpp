@@ -37,8 +37,21 @@ private:
 std::unique_ptr<LastingSite> MakeSite() { return std::make_unique<SiteInASchema>(); }
 
 using PostgresOpening = PostgresSite;
-using PostgresUsers = PostgresSite;
 using PostgresFolder = PostgresSite;
+
+class PostgresUsers : public PostgresSite
+{
+protected:
+    // Ends the connection of who has the turn to change users.
+    std::string TerminateTurn() const
+    {
+        return schema.cluster.Run(
+            "SELECT pg_terminate_backend(pid, 60000) FROM pg_locks WHERE locktype = "
+            "'advisory' AND granted AND objsubid = 2 AND objid = 2147483648 AND classid "
+            "= '" +
+            schema.Name() + "'::regnamespace");
+    }
+};
 
 class PostgresCheck : public PostgresSite
 {
@@ -410,4 +423,43 @@ TEST_F(PostgresUsers, TurnThatIsFree_NeedsNoPatience)
 {
     auto const store = schema.Open();
     EXPECT_NE(store->TakeUsersTurn(0ms), nullptr);
+}
+
+// Others may have taken it meanwhile and looked at the users as they were, or changed them.
+TEST_F(PostgresUsers, TurnThatEndsWithItsConnection_LetsNothingBeChangedUnderIt)
+{
+    auto const store = schema.Open();
+    auto const other = schema.Open();
+    store->PutUser({"anna", "$y$", 16, 1});
+    store->PutUser({"bob", "$y$", 16, 2});
+    auto turn = store->TakeUsersTurn(10s);
+    ASSERT_NE(turn, nullptr);
+    store->PutUser({"carl", "$y$", 1, 3});
+    ASSERT_EQ(TerminateTurn(), "t");
+    auto const next = other->TakeUsersTurn(10s);
+    ASSERT_NE(next, nullptr);
+    EXPECT_TRUE(other->RemoveUser("bob"));
+    EXPECT_THAT(ReasonOf([&] { store->RemoveUser("anna"); }), HasSubstr("the turn to change users"));
+    EXPECT_THROW(store->PutUser({"dora", "$y$", 1, 4}), StoreError);
+    EXPECT_EQ(other->Users().size(), 2u);
+    turn.reset();
+    EXPECT_TRUE(store->RemoveUser("carl"));
+}
+
+TEST_F(PostgresUsers, ChangeWhoseTurnBreaksUnderIt_IsAnUnknownOutcomeAndNotRepeated)
+{
+    auto const store = schema.Open();
+    store->PutUser({"anna", "$y$", 16, 1});
+    auto const turn = store->TakeUsersTurn(10s);
+    SqlSession const obstacle(schema.cluster.Uri());
+    obstacle.Run("BEGIN");
+    obstacle.Run("LOCK TABLE " + schema.Name() + ".account IN EXCLUSIVE MODE");
+    auto removing = std::async(std::launch::async, [&] { store->RemoveUser("anna"); });
+    schema.cluster.Await("SELECT count(*) FROM pg_locks WHERE NOT granted AND relation = '" + schema.Name() +
+                             ".account'::regclass",
+                         "1");
+    EXPECT_EQ(TerminateTurn(), "t");
+    obstacle.Run("COMMIT");
+    EXPECT_THROW(removing.get(), UnknownOutcome);
+    EXPECT_TRUE(store->FindUser("anna"));
 }

@@ -121,10 +121,10 @@ private:
 class TurnOfConnection final : public SiteStore::UsersTurn
 {
 public:
-    explicit TurnOfConnection(std::unique_ptr<Connection> connection) : m_connection(std::move(connection)) {}
+    explicit TurnOfConnection(std::shared_ptr<void> turn) : m_turn(std::move(turn)) {}
 
 private:
-    std::unique_ptr<Connection> const m_connection;
+    std::shared_ptr<void> const m_turn;
 };
 }  // namespace
 
@@ -140,8 +140,17 @@ std::unique_ptr<Connection> PostgresStore::OwnConnection() const
 std::unique_ptr<SiteStore::UsersTurn> PostgresStore::TakeUsersTurn(std::chrono::milliseconds limit)
 {
     auto connection = OwnConnection();
-    bool const isOurs = TakeLock(*connection, LockOfUsers, Clock::now() + limit);
-    return isOurs ? std::make_unique<TurnOfConnection>(std::move(connection)) : nullptr;
+    if (!TakeLock(*connection, LockOfUsers, Clock::now() + limit))
+        return nullptr;
+    connection->WaitAsLongAs(nullptr);  // a change has its limit
+    auto const turn = std::make_shared<USERS_TURN>();
+    turn->connection = std::move(connection);
+    std::lock_guard const lock(m_usersTurns);
+    // The lock of an object that is still there has gone: nothing is to be changed for that one under this.
+    if (!m_usersTurn.expired())
+        return nullptr;
+    m_usersTurn = turn;
+    return std::make_unique<TurnOfConnection>(turn);
 }
 
 std::vector<std::string> PostgresStore::Check(Progress const& progress)

@@ -176,9 +176,9 @@ void PostgresStore::Announce(Sequence committed)
 // What is found may be on this server alone: when a break ends the wait for a standby, the server lets
 // everybody see the change. A commit behind it waits for the same standbys, so that the answer is worth as
 // much as that of the change itself would have been.
-void PostgresStore::MakeLasting(Turn& turn)
+void PostgresStore::MakeLasting(postgres::Connection& connection, Clock::time_point deadline)
 {
-    turn.Run("SELECT pg_logical_emit_message(true, 'comgui', '')");
+    connection.Run("SELECT pg_logical_emit_message(true, 'comgui', '')", {}, deadline);
 }
 
 std::optional<CommitOutcome> PostgresStore::FindCommit(std::uint64_t number)
@@ -192,7 +192,7 @@ std::optional<CommitOutcome> PostgresStore::FindCommit(std::uint64_t number)
                  Parameters() << m_self << number);
     bool const isMade = !rows.IsNull(0, 1);
     if (isMade)
-        MakeLasting(turn);
+        MakeLasting(turn.Connection(), turn.Deadline());
     NoteAnswer(number, isMade, rows.Number(0, 0));
     if (!isMade)
         return std::nullopt;

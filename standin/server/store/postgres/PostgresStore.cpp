@@ -31,6 +31,12 @@ constexpr std::chrono::milliseconds Patience = 300ms;
 // A caller waits for a connection no longer; where that takes more, the keeper's thread gets it.
 constexpr std::chrono::milliseconds CallersLimit = 2s;
 
+[[noreturn]] void FailAsUnknown(StoreError const& reason)
+{
+    throw UnknownOutcome(std::string(reason.what()) +
+                         "; whether a user was changed is not known: look before you repeat the change");
+}
+
 // The server gives a statement up before the client does, so that the connection can be kept.
 std::chrono::milliseconds OnServer(std::chrono::milliseconds limit) { return limit - limit / 10; }
 }  // namespace
@@ -125,7 +131,7 @@ void PostgresStore::Fill(Turn& turn, StoreContent const& content) const
     turn.Run("UPDATE site SET pruned = (SELECT sequence FROM newest)");
     turn.Run("DELETE FROM journal");
     for (User const& user : content.users)
-        Put(turn, user);
+        Put(turn.Connection(), turn.Deadline(), user);
 }
 
 void PostgresStore::Register()
@@ -474,9 +480,39 @@ std::vector<User> PostgresStore::UsersOf(Result const& rows)
         });
 }
 
+void PostgresStore::ChangeUsers(ChangeOfUsers const& change)
+{
+    std::unique_lock lock(m_usersTurns);
+    auto const turn = m_usersTurn.lock();
+    lock.unlock();
+    if (turn)
+        ChangeInTurn(*turn, change);
+    else
+        UntilKnown(change);
+}
+
+// Not again after a break: others may have taken the turn since, and what was looked at is not so any more.
+void PostgresStore::ChangeInTurn(USERS_TURN& turn, ChangeOfUsers const& change)
+{
+    CheckUsable();
+    std::lock_guard const lock(turn.lock);
+    if (!turn.connection->IsSound())
+        throw BrokenConnection(m_name +
+                               ": the turn to change users has ended with its connection, and nothing "
+                               "was changed; try again");
+    try
+    {
+        change(*turn.connection, Clock::now() + OutcomeLimit, false);
+    }
+    catch (BrokenConnection const& error)
+    {
+        FailAsUnknown(error);
+    }
+}
+
 // Runs what may be run again, until it is known to be done or refused: when a connection breaks, the server
 // may have done it all the same. Once a new one is there, nothing of the old one is on its way any more.
-void PostgresStore::UntilKnown(std::function<void(Turn&, bool isRepeated)> const& action)
+void PostgresStore::UntilKnown(ChangeOfUsers const& change)
 {
     bool isLost = false;  // an answer
     for (auto const end = Clock::now() + OutcomeLimit;; std::this_thread::sleep_for(PauseBetweenAttempts))
@@ -486,7 +522,7 @@ void PostgresStore::UntilKnown(std::function<void(Turn&, bool isRepeated)> const
         {
             Turn turn(*this);
             isSent = true;
-            return action(turn, isLost);
+            return change(turn.Connection(), turn.Deadline(), isLost);
         }
         catch (StoreError const& error)
         {
@@ -494,41 +530,43 @@ void PostgresStore::UntilKnown(std::function<void(Turn&, bool isRepeated)> const
             if (!isLost)
                 throw;
             if (Clock::now() >= end || dynamic_cast<UnusableStore const*>(&error) != nullptr)
-                throw UnknownOutcome(
-                    std::string(error.what()) +
-                    "; whether a user was changed is not known: " + "look before you repeat the change");
+                FailAsUnknown(error);
         }
     }
 }
 
 void PostgresStore::PutUser(User const& user)
 {
-    UntilKnown([&user](Turn& turn, bool) { Put(turn, user); });
+    ChangeUsers([&user](Connection& connection, Clock::time_point deadline, bool)
+                { Put(connection, deadline, user); });
 }
 
-void PostgresStore::Put(Turn& turn, User const& user)
+void PostgresStore::Put(Connection& connection, Clock::time_point deadline, User const& user)
 {
-    turn.Run("INSERT INTO account VALUES ($1, $2, $3, $4) ON CONFLICT (place(name)) DO UPDATE "
-             "SET password_hash = excluded.password_hash, role = excluded.role, "
-             "ticket_id = excluded.ticket_id",
-             Parameters() << std::string_view(user.name) << std::string_view(user.passwordHash) << user.role
-                          << user.ticketId);
+    connection.Run("INSERT INTO account VALUES ($1, $2, $3, $4) ON CONFLICT (place(name)) DO UPDATE "
+                   "SET password_hash = excluded.password_hash, role = excluded.role, "
+                   "ticket_id = excluded.ticket_id",
+                   Parameters() << std::string_view(user.name) << std::string_view(user.passwordHash)
+                                << user.role << user.ticketId,
+                   deadline);
 }
 
 bool PostgresStore::RemoveUser(std::string_view name)
 {
     bool wasThere = false;
-    UntilKnown(
-        [&](Turn& turn, bool isRepeated)
+    ChangeUsers(
+        [&](Connection& connection, Clock::time_point deadline, bool isRepeated)
         {
             Parameters const user = Parameters() << name;
             if (!isRepeated)
-                wasThere = turn.Run("SELECT FROM account WHERE place(name) = place($1)", user).Rows() == 1;
+                wasThere = connection.Run("SELECT FROM account WHERE place(name) = place($1)", user, deadline)
+                               .Rows() == 1;
             bool const isRemoved =
-                turn.Run("DELETE FROM account WHERE place(name) = place($1)", user).Changes() == 1;
+                connection.Run("DELETE FROM account WHERE place(name) = place($1)", user, deadline)
+                    .Changes() == 1;
             wasThere = isRemoved || (isRepeated && wasThere);
             if (wasThere && !isRemoved)
-                MakeLasting(turn);
+                MakeLasting(connection, deadline);
         });
     return wasThere;
 }

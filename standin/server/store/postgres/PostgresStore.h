@@ -6,14 +6,14 @@
 // commit as soon as the bell rings, which takes about a millisecond.
 //
 // A call whose connection breaks throws StoreError, or answers Unknown if it is a Commit; a change of the
-// users is repeated, for a minute if need be, and throws UnknownOutcome then. The next one connects again,
-// and does not notice a break of some 100 ms; as long as the server is known to be out of reach, calls fail
-// at once. No other call takes longer than the limits of connecting and of a statement together,
-// unless bytes come and go all the time: a large ticket over a slow line takes its time. A thread of
-// its own looks after the working connection when the bell tells it to, so that a program is soon back that
-// calls nothing, and that the bell is heard meanwhile. Until it is back, others take it for dead and may bury
-// it: it then goes on under its number with its sessions and the notes of its part files, but without the
-// tickets that it owned.
+// users is repeated, for a minute if need be, and throws UnknownOutcome then: at once if it was made in a
+// turn of the users, which is over then. The next one connects again, and does not notice a break of some 100
+// ms; as long as the server is known to be out of reach, calls fail at once. No other call takes longer than
+// the limits of connecting and of a statement together, unless bytes come and go all the time: a large ticket
+// over a slow line takes its time. A thread of its own looks after the working connection when the bell tells
+// it to, so that a program is soon back that calls nothing, and that the bell is heard meanwhile. Until it is
+// back, others take it for dead and may bury it: it then goes on under its number with its sessions and the
+// notes of its part files, but without the tickets that it owned.
 //
 // Who comes back to another site than before, or to a server that has not got all the changes that the
 // program knows of, has done there nothing but look: from then on every operation throws UnusableStore.
@@ -143,6 +143,14 @@ private:
     class Turn;    // with the working connection
     class Burial;  // the right to bury a program
 
+    // The right to change users after a look at them. Its lock is that connection's, and what is changed as
+    // long as this handle has the turn is changed over it: so that nothing is when the lock has gone.
+    struct USERS_TURN
+    {
+        std::mutex lock;
+        std::unique_ptr<postgres::Connection> connection;
+    };
+
     void Fill(Turn& turn, StoreContent const& content) const;
     void Register();
     bool TakeLock(postgres::Connection& connection, int lock, postgres::Clock::time_point deadline) const;
@@ -163,15 +171,19 @@ private:
     void ComeBack(postgres::Clock::time_point deadline);
     void TakeLifeBack(postgres::Clock::time_point deadline);
     void PutBelongingsBack(postgres::Clock::time_point deadline);
-    void UntilKnown(std::function<void(Turn&, bool isRepeated)> const& action);
+    using ChangeOfUsers =
+        std::function<void(postgres::Connection&, postgres::Clock::time_point deadline, bool isRepeated)>;
+    void ChangeUsers(ChangeOfUsers const& change);
+    void ChangeInTurn(USERS_TURN& turn, ChangeOfUsers const& change);
+    void UntilKnown(ChangeOfUsers const& change);
     void TakeAway(char const* sql, postgres::Parameters const& parameters,
                   std::function<void()> const& forget);
-    static void Put(Turn& turn, User const& user);
+    static void Put(postgres::Connection& connection, postgres::Clock::time_point deadline, User const& user);
     StoredValue ValueOf(postgres::Result const& rows, int row, int column, TicketAddress address) const;
     static std::vector<User> UsersOf(postgres::Result const& rows);
     postgres::Parameters RequestOf(TicketChange const& change, ProgramId program, std::uint64_t number) const;
     static CommitOutcome Send(Turn& turn, postgres::Parameters const& request, TicketAddress address);
-    static void MakeLasting(Turn& turn);
+    static void MakeLasting(postgres::Connection& connection, postgres::Clock::time_point deadline);
     void NoteQuestion(std::uint64_t number);
     void NoteAnswer(std::uint64_t number, bool isMade, Sequence forgotten);
     void Announce(Sequence committed);
@@ -212,6 +224,9 @@ private:
     postgres::Clock::time_point m_nextAttempt{};
     std::string m_failure;                     // of the last attempt
     std::uint64_t m_returnsBeforeFailure = 0;  // of the server
+
+    std::mutex m_usersTurns;
+    std::weak_ptr<USERS_TURN> m_usersTurn;  // gone: this handle has none
 
     // What to put back if this program is buried by mistake. Added to by who has the turn.
     std::mutex m_belongings;
