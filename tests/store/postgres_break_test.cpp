@@ -730,6 +730,7 @@ TEST_F(PostgresDeath, OfASession_ThatTheServerRefuses_IsRepeated)
     SqlSession const obstacle(schema.cluster.Uri());
     obstacle.Run("ALTER TABLE " + schema.Name() + ".session RENAME TO hidden");
     EXPECT_THROW(store->CloseSession(session), StoreError);
+    EXPECT_THROW(store->Maintain(0), StoreError);
     obstacle.Run("ALTER TABLE " + schema.Name() + ".hidden RENAME TO session");
     EXPECT_THAT(other->Sessions(), SizeIs(1));
     store->Maintain(0);

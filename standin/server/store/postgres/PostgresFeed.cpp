@@ -148,7 +148,15 @@ void PostgresStore::Maintain(Sequence heard)
         if (m_hasLeftovers)
         {
             m_hasLeftovers = false;  // before: what fails meanwhile is left over anew
-            PutBelongingsBack(turn.Deadline());
+            try
+            {
+                PutBelongingsBack(turn.Deadline());
+            }
+            catch (...)
+            {
+                m_hasLeftovers = true;
+                throw;
+            }
         }
     }
     StoreLimits const& limits = m_options.limits;
