@@ -502,6 +502,22 @@ TEST_F(PostgresBreak, ByAServerThatStandsStill_EndsEveryCallAtItsLimit)
     EXPECT_EQ(Value(), found ? 2 : 1);
 }
 
+// What is looked at first on a new connection waits for somebody: within the limit of the call, not its own.
+TEST_F(PostgresBreak, ThatIsMendedInACall_EndsTheCallAtItsLimit)
+{
+    PostgresOptions options = AtOnce();
+    options.statementLimit = 4s;
+    auto const leaving = schema.Open(options);
+    SqlSession const obstacle(schema.cluster.Uri());
+    obstacle.Run("BEGIN");
+    obstacle.Run("LOCK TABLE " + schema.Name() + ".era");
+    Terminate(*leaving);
+    auto const start = Clock::now();
+    EXPECT_THROW(leaving->Leave(), StoreError);
+    EXPECT_LT(Clock::now() - start, 2s);
+    obstacle.Run("ROLLBACK");
+}
+
 // --- care, which comes every moment
 
 TEST_F(PostgresBreak, OfTheStandby_KeepsNoCareWaiting)

@@ -55,7 +55,7 @@ PostgresStore::PostgresStore(std::string const& uri, std::function<StoreContent(
         Turn opening(*this, m_options.openingLimit);
         postgres::OpenSchema(
             opening.Connection(), m_options.schema, [&] { Fill(opening, first()); }, opening.Deadline());
-        CheckSite(opening.Connection());
+        CheckSite(opening.Connection(), opening.Deadline());
         if (!TakeLock(opening.Connection(), LockOfOpening, opening.Deadline()))
             throw StoreError(
                 m_name +
@@ -67,7 +67,8 @@ PostgresStore::PostgresStore(std::string const& uri, std::function<StoreContent(
     m_bell = std::make_unique<postgres::Bell>(
         m_target,
         postgres::Bell::Limits{m_options.connectLimit, OnServer(m_options.statementLimit), m_options.pulse},
-        postgres::Bell::Calls{[this](Connection& connection) { CheckSite(connection); },
+        postgres::Bell::Calls{[this](Connection& connection)
+                              { CheckSite(connection, Clock::now() + m_options.statementLimit); },
                               [this](Sequence newest) { RaiseCommitted(newest); }, [this] { Look(); }},
         m_reach, m_hurry);
     Register();
@@ -182,12 +183,12 @@ void PostgresStore::CheckUsable() const
 }
 
 // On each new connection, before anything else is done there.
-void PostgresStore::CheckSite(Connection& connection)
+void PostgresStore::CheckSite(Connection& connection, Clock::time_point deadline)
 {
     try
     {
         // What is known is looked up first: it may grow meanwhile, and the server's answer would not have it.
-        m_identity.Check(connection, m_committed, Clock::now() + m_options.statementLimit);
+        m_identity.Check(connection, m_committed, deadline);
     }
     catch (UnusableStore const& error)
     {
@@ -371,7 +372,7 @@ void PostgresStore::ComeBack(Clock::time_point deadline)
 {
     if (!postgres::BeginRegistering(*m_working, m_options.schema, deadline))
         throw BrokenConnection(m_name + ": the site is being replaced; wait until that is done", true);
-    CheckSite(*m_working);
+    CheckSite(*m_working, deadline);
     if (m_self == 0)
         return;
     bool const isAnothers =

@@ -158,7 +158,7 @@ private:
     bool IsForeign() const noexcept;
     void CheckUsable() const;
     void CheckReach() const;
-    void CheckSite(postgres::Connection& connection);
+    void CheckSite(postgres::Connection& connection, postgres::Clock::time_point deadline);
     [[noreturn]] void End(std::string const& reason);
     postgres::Connection& Working(postgres::Clock::time_point deadline);
     bool HasSoundConnection();
