@@ -182,6 +182,24 @@ TEST_F(PostgresReturn, ToASiteOfAnotherNumber_IsTheEnd)
     ExpectEnd(*store, "another site has taken the place");
 }
 
+// Those of the tools come over connections of their own, each of which may be the first to another server.
+TEST_F(PostgresReturn, ToASiteOfAnotherNumber_IsTheEnd_ForACallOnAConnectionOfItsOwn)
+{
+    store->Leave();
+    std::function<void(PostgresStore&)> const calls[] = {
+        [](PostgresStore& handle) { handle.ReadContent([](TicketChange&&) {}, [](User&&) {}, {}); },
+        [](PostgresStore& handle) { handle.Check({}); },
+        [](PostgresStore& handle) { handle.Measure(); },
+        [](PostgresStore& handle) { handle.TakeUsersTurn(0ms); },
+    };
+    for (auto const& call : calls)
+    {
+        auto const handle = schema.Open();
+        schema.Run("UPDATE S.site SET number = gen_random_uuid()");
+        EXPECT_THAT(ReasonOf([&] { call(*handle); }), HasSubstr("another site has taken the place"));
+    }
+}
+
 TEST_F(PostgresReturn, EndsAWaitThatRuns)
 {
     auto waiting = std::async(std::launch::async, [&]

@@ -129,10 +129,11 @@ private:
 }  // namespace
 
 // What counts all that there is takes as long as that takes, if only the server is there.
-std::unique_ptr<Connection> PostgresStore::OwnConnection() const
+std::unique_ptr<Connection> PostgresStore::OwnConnection()
 {
     CheckUsable();
     auto connection = std::make_unique<Connection>(m_target, 0ms, Clock::now() + m_options.connectLimit);
+    CheckSite(*connection, Clock::now() + m_options.statementLimit);
     connection->WaitAsLongAs([this] { return m_reach.IsThere(); });
     return connection;
 }

@@ -154,7 +154,7 @@ private:
     void Fill(Turn& turn, StoreContent const& content) const;
     void Register();
     bool TakeLock(postgres::Connection& connection, int lock, postgres::Clock::time_point deadline) const;
-    std::unique_ptr<postgres::Connection> OwnConnection() const;
+    std::unique_ptr<postgres::Connection> OwnConnection();
     bool IsForeign() const noexcept;
     void CheckUsable() const;
     void CheckReach() const;
