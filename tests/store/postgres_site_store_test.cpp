@@ -287,6 +287,26 @@ TEST_F(PostgresReplacing, Finished_SetsTheOldOneAsideAndHasItsNumberAndFolder)
     EXPECT_TRUE(store->HasFolder());
 }
 
+TEST_F(PostgresReplacing, Finished_LetsInWhoWasLetInBefore_AndGivesNobodyMore)
+{
+    MakeSiteWith(1);
+    std::string const name = schema.Name();
+    schema.Run("CREATE ROLE presser LOGIN");
+    schema.Run("CREATE ROLE shop");
+    schema.Run("GRANT USAGE ON SCHEMA " + name + " TO presser");
+    schema.Run("GRANT SELECT, INSERT, UPDATE, DELETE ON ALL TABLES IN SCHEMA " + name + " TO presser");
+    schema.Run("REVOKE DELETE ON S.account FROM presser");
+    schema.Run("REVOKE EXECUTE ON FUNCTION S.leave_site FROM public");
+    schema.Run("ALTER TABLE S.era OWNER TO shop");
+    ASSERT_EQ(ReasonOfOpeningAs(schema.cluster.Uri("presser")), "");
+    EXPECT_NE(Begin(Old::SetAside)->Finish(), "");
+    EXPECT_EQ(ReasonOfOpeningAs(schema.cluster.Uri("presser")), "");
+    EXPECT_EQ(schema.Run("SELECT has_table_privilege('presser', 'S.account', 'DELETE')"), "f");
+    EXPECT_EQ(schema.Run("SELECT has_function_privilege('presser', 'S.leave_site(bigint)', 'EXECUTE')"), "f");
+    EXPECT_EQ(schema.Run("SELECT relowner::regrole FROM pg_class WHERE oid = 'S.era'::regclass"), "shop");
+    EXPECT_EQ(Value(), 2);
+}
+
 TEST_F(PostgresReplacing, NotFinished_LeavesTheOldOneAndNothingElse)
 {
     MakeSiteWith(1);

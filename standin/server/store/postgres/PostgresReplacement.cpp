@@ -19,6 +19,36 @@ constexpr std::chrono::milliseconds PauseForServer(100);
 // time are kept apart, so somebody was killed.
 constexpr std::string_view Mark = "a site that is being made";
 
+// What permits in the second schema what the first one permits to whom, and makes it the same owners': the
+// statements, in order. Sequences go with their tables' owners. Nobody is permitted anything yet in a schema
+// that was just made, but for what the server permits everybody.
+constexpr char const* SelectRights = R"(
+    WITH old AS (SELECT * FROM pg_namespace WHERE nspname = convert_from($1, 'UTF8')),
+    new AS (SELECT * FROM pg_namespace WHERE nspname = convert_from($2, 'UTF8')),
+    pair AS (
+        SELECT 'SCHEMA ' || new.oid::regnamespace AS what, old.nspowner AS owner, new.nspowner AS maker,
+            old.nspacl AS rights, true AS has_owner FROM old, new
+        UNION ALL
+        SELECT CASE o.relkind WHEN 'S' THEN 'SEQUENCE ' ELSE 'TABLE ' END || n.oid::regclass, o.relowner,
+            n.relowner, o.relacl, o.relkind <> 'S'
+            FROM old, new, pg_class o JOIN pg_class n USING (relname, relkind)
+            WHERE o.relnamespace = old.oid AND n.relnamespace = new.oid AND relkind IN ('r', 'v', 'S')
+        UNION ALL
+        SELECT 'FUNCTION ' || n.oid::regprocedure, o.proowner, n.proowner, o.proacl, true
+            FROM old, new, pg_proc o JOIN pg_proc n USING (proname, proargtypes)
+            WHERE o.pronamespace = old.oid AND n.pronamespace = new.oid)
+    SELECT 1 AS place, 'ALTER ' || what || ' OWNER TO ' || owner::regrole AS statement FROM pair
+        WHERE owner <> maker AND has_owner
+    UNION ALL
+    SELECT 2, 'REVOKE ALL ON ' || what || ' FROM PUBLIC' FROM pair WHERE rights IS NOT NULL
+    UNION ALL
+    SELECT 3, 'GRANT ' || g.privilege_type || ' ON ' || what || ' TO ' ||
+            CASE g.grantee WHEN 0 THEN 'PUBLIC' ELSE g.grantee::regrole::text END ||
+            CASE WHEN g.is_grantable THEN ' WITH GRANT OPTION' ELSE '' END
+        FROM pair, aclexplode(rights) g
+    ORDER BY place
+)";
+
 std::string NewNameFor(PostgresOptions const& options) { return options.schema + "_new"; }
 
 PostgresOptions Beside(PostgresOptions options)
@@ -135,7 +165,21 @@ std::string PostgresReplacement::Exchange(std::string const& aside)
     if (!m_hasOld)
         return rename;
     return "UPDATE " + made + ".site SET (number, has_folder) = (SELECT number, has_folder FROM " + name +
-           ".site); ALTER SCHEMA " + name + " RENAME TO " + m_connection->Quoted(aside) + ';' + rename;
+           ".site);" + Rights() + "ALTER SCHEMA " + name + " RENAME TO " + m_connection->Quoted(aside) + ';' +
+           rename;
+}
+
+// Who could open the site can open it afterwards.
+std::string PostgresReplacement::Rights()
+{
+    std::string const made = NewNameFor(m_options);
+    auto const rights = m_connection->Run(
+        SelectRights, Parameters() << std::string_view(m_options.schema) << std::string_view(made),
+        Deadline());
+    std::string all;
+    for (int row = 0; row < rights.Rows(); ++row)
+        all += rights.Text(row, 1) + ';';
+    return all;
 }
 
 // A schema that somebody has prepared keeps its owner and what it permits to whom.

@@ -19,7 +19,7 @@ public:
     enum class Old
     {
         Forbidden,  // a site that is there already is an error
-        SetAside,   // it gets another name, and the new one has its number
+        SetAside,   // it gets another name, and the new one has its number, its owners and what they permit
     };
 
     // Begins it. Until it is finished, or the object goes, nobody can open the site that is there. Throws
@@ -49,6 +49,7 @@ private:
     void DropUnfinished();
     void DropAfterFailure() noexcept;
     std::string FreeName();
+    std::string Rights();
     std::string Exchange(std::string const& aside);
     std::string MoveAll(std::string const& made, std::string const& name);
     void MakeSure(long long site, StoreError const& failure);
