@@ -5,6 +5,7 @@
 #include "tests/store/SiteStoreContract.h"
 #include "tests/support/ChildProcess.h"
 #include "tests/support/NetworkProxy.h"
+#include <atomic>
 #include <future>
 #include <gmock/gmock.h>
 #include <unistd.h>
@@ -157,6 +158,32 @@ TEST_F(PostgresOpening, ThatIsKept_EndsWithTheConnection_AndIsNotTakenFromTheNex
     EXPECT_EQ(third.wait_for(100ms), std::future_status::timeout);
     second->EndOpening();
     EXPECT_NE(third.get(), nullptr);
+}
+
+// The threads of a handle may be at work while what it begins with fails.
+TEST_F(PostgresOpening, ThatBreaksAtAnyInstant_FailsInOrder)
+{
+    schema.Open()->Leave();
+    std::atomic<bool> isOver{false};
+    auto const breaking =
+        std::async(std::launch::async,
+                   [&]
+                   {
+                       SqlSession const vandal(schema.cluster.Uri());
+                       std::string const lives = "(SELECT DISTINCT pid FROM " + schema.Name() + ".living) l";
+                       while (!isOver)
+                           vandal.Run("SELECT count(pg_terminate_backend(l.pid)) FROM " + lives);
+                   });
+    PostgresOptions options;
+    options.pulse = 1ms;
+    int failed = 0;
+    for (auto const end = std::chrono::steady_clock::now() + 20s;
+         failed < 5 && std::chrono::steady_clock::now() < end;)
+        failed += ReasonOf([&] { schema.Open(options); }).empty() ? 0 : 1;
+    isOver = true;
+    breaking.wait();
+    EXPECT_EQ(failed, 5);
+    EXPECT_NO_THROW(schema.Open()->Leave());
 }
 
 TEST_F(PostgresOpening, ThatOthersKeepTooLong_IsGivenUp)

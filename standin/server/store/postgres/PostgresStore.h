@@ -250,8 +250,6 @@ private:
     std::mutex m_hearing;
     std::condition_variable m_heard;
     bool m_isInterrupted = false;
-    std::unique_ptr<postgres::Keeper> m_keeper;
-    std::unique_ptr<postgres::Bell> m_bell;  // wakes the keeper
 
     std::mutex m_burials;
     std::set<ProgramId> m_burying;  // by threads of this handle
@@ -272,5 +270,9 @@ private:
         bool isKept;  // by the journal
     };
     std::map<std::uint64_t, UNKNOWN> m_unknown;  // by number
+
+    // Last, since their threads use the other members: they have to end first, also if a constructor fails.
+    std::unique_ptr<postgres::Keeper> m_keeper;
+    std::unique_ptr<postgres::Bell> m_bell;  // wakes the keeper
 };
 }  // namespace standin
