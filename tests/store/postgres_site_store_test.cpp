@@ -460,8 +460,33 @@ TEST_F(PostgresReplacingOverANetwork, ThatIsLostInItsLastStep_SaysThatNobodyKnow
     proxy.Lose(NetworkProxy::Both);
     EXPECT_THROW(finishing.get(), UnknownReplacement);
     schema.cluster.Run("SELECT pg_terminate_backend(pid, 60000) FROM " + Waiting());
+    obstacle.Run("COMMIT");
     proxy.CloseAll();
     proxy.Lose(NetworkProxy::None);
+    replacement.reset();
+    EXPECT_FALSE(HasLeftovers());
+    EXPECT_EQ(Value(), 1);
+}
+
+TEST_F(PostgresReplacingOverANetwork, ThatBreaksBeforeItsLastStep_LeavesTheOldOneAndNothingElse)
+{
+    proxy.CloseAll();
+    EXPECT_NE(ReasonOf([&] { replacement->Finish(); }), "");
+    ASSERT_TRUE(HasLeftovers());
+    replacement.reset();
+    EXPECT_FALSE(HasLeftovers());
+    EXPECT_EQ(Value(), 1);
+}
+
+// What it finds is not its own any more.
+TEST_F(PostgresReplacingOverANetwork, ThatBreaks_LeavesWhatAnotherHasBegunSince)
+{
+    proxy.CloseAll();
+    auto const next = Begin(Old::SetAside);
+    replacement.reset();
+    EXPECT_TRUE(HasLeftovers());
+    next->Finish();
+    EXPECT_EQ(Value(), 2);
 }
 
 // --- users

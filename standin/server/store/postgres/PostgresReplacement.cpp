@@ -115,12 +115,20 @@ void PostgresReplacement::DropUnfinished()
     m_connection->Execute("DROP SCHEMA " + m_connection->Quoted(name) + " CASCADE", Deadline());
 }
 
+// The connection may be what has failed, and with it went what keeps others away: somebody else may have
+// begun another one since.
 void PostgresReplacement::DropAfterFailure() noexcept
 {
     try
     {
-        if (m_connection)
-            DropUnfinished();
+        if (!m_connection || !m_connection->IsSound())
+        {
+            m_connection = Connected();
+            if (!postgres::KeepFromOpening(*m_connection, m_options.schema,
+                                           Clock::now() + PatienceWithOthers))
+                return;
+        }
+        DropUnfinished();
     }
     catch (std::exception const&)
     {

@@ -26,7 +26,9 @@ public:
     // StoreError: also if programs have that open, or if the name that is needed meanwhile, with _new at its
     // end, is another schema's.
     PostgresReplacement(std::string const& uri, Old old, PostgresOptions options = {});
-    ~PostgresReplacement();  // nothing of it is left unless it was finished
+    // Nothing of it is left unless it was finished, or the server cannot be reached: then the next one drops
+    // what is.
+    ~PostgresReplacement();
     PostgresReplacement(PostgresReplacement const&) = delete;
     PostgresReplacement& operator=(PostgresReplacement const&) = delete;
 
