@@ -1,5 +1,6 @@
 // What the PostgreSQL store does when its connections break, and what becomes of its program meanwhile.
 #include "standin/server/store/postgres/Bell.h"
+#include "standin/server/store/postgres/Keeper.h"
 #include "standin/server/store/postgres/PostgresStore.h"
 
 #include "tests/store/PostgresSite.h"
@@ -625,6 +626,30 @@ TEST(PostgresRingPace, AllowsEightAtOnce_AndThenWaits)
     EXPECT_LT(pace.Next(), Clock::now());
     pace.NoteRing();
     EXPECT_GE(pace.Next(), first + 16ms);
+}
+
+TEST(PostgresKeeper, WokenDuringItsTask_DoesItOnceMore)
+{
+    std::promise<void> begun, woken;
+    std::atomic<int> done{0};
+    postgres::Keeper keeper(
+        [&]
+        {
+            if (done == 0)
+            {
+                begun.set_value();
+                woken.get_future().wait();
+            }
+            ++done;
+        });
+    keeper.Wake();
+    begun.get_future().wait();
+    keeper.Wake();
+    keeper.Wake();
+    woken.set_value();
+    for (auto const end = Clock::now() + 10s; done < 2 && Clock::now() < end;)
+        std::this_thread::sleep_for(1ms);
+    EXPECT_EQ(done, 2);
 }
 
 // Each ring wakes all of them: were every program to ring for itself, a second would bring 3,000 rings.
