@@ -207,6 +207,30 @@ TEST_F(PostgresNetwork, RefusedForLong_IsAskedAgainLessAndLess)
     EXPECT_LT(attempts, 20);  // of both connections: after 50, 100, 200, 400 and 800 ms
 }
 
+// A statement is prepared on its way to be run.
+TEST_F(PostgresProxy, OfAStatement_IsCrossedOnceEachWay_AlsoTheFirstTime)
+{
+    proxy.Start();
+    postgres::Connection connection({Uri(), schema.Name()}, 60s, Clock::now() + 60s);
+    char const* const sql = "SELECT $1::integer / $2::integer";
+    auto const run = [&](int divisor)
+    { return connection.Run(sql, postgres::Parameters() << 6 << divisor, Clock::now() + 60s); };
+    int turns = proxy.Turns();
+    EXPECT_EQ(run(3).Integer(0, 0), 2);
+    EXPECT_EQ(proxy.Turns(), ++turns);
+    EXPECT_EQ(run(2).Integer(0, 0), 3);
+    EXPECT_EQ(proxy.Turns(), ++turns);
+    char const* const failing = "SELECT 1 / $1::integer";
+    EXPECT_THROW(connection.Run(failing, postgres::Parameters() << 0, Clock::now() + 60s), StoreError);
+    EXPECT_EQ(proxy.Turns(), ++turns);
+    EXPECT_EQ(connection.Run(failing, postgres::Parameters() << 1, Clock::now() + 60s).Integer(0, 0), 1);
+    EXPECT_EQ(proxy.Turns(), ++turns);
+    char const* const wrong = "SELECT nothing";
+    EXPECT_THROW(connection.Run(wrong, {}, Clock::now() + 60s), postgres::RefusedStatement);
+    EXPECT_THROW(connection.Run(wrong, {}, Clock::now() + 60s), postgres::RefusedStatement);
+    EXPECT_EQ(run(1).Integer(0, 0), 6);
+}
+
 // It takes its share of the time alone, and that once.
 TEST_F(PostgresNetwork, WithAHostThatIsSilent_FindsTheNext)
 {

@@ -105,6 +105,7 @@ void NetworkProxy::Run()
         std::erase_if(m_links,
                       [this, loss](LINK& link)
                       {
+                          CountTurn(link);
                           return !Pass(link.client, link.server, link.toServer, (loss & ToServer) == 0) ||
                                  !Pass(link.server, link.client, link.toClient, (loss & ToClient) == 0);
                       });
@@ -129,6 +130,19 @@ void NetworkProxy::AddTo(std::vector<pollfd>& waiting, LINK const& link) const
         add(link.client, link.server, link.toServer);
     if ((loss & ToClient) == 0)
         add(link.server, link.client, link.toClient);
+}
+
+// By what there is to be read, before it is passed on.
+void NetworkProxy::CountTurn(LINK& link)
+{
+    pollfd ends[] = {{link.client.Number(), POLLIN, 0}, {link.server.Number(), POLLIN, 0}};
+    poll(ends, 2, 0);
+    if (link.isClientsTurn && (ends[0].revents & POLLIN) != 0)
+        ++m_turns;
+    if ((ends[0].revents & POLLIN) != 0)
+        link.isClientsTurn = false;
+    if ((ends[1].revents & POLLIN) != 0)
+        link.isClientsTurn = true;
 }
 
 // False at the end of the connection.
@@ -166,5 +180,5 @@ void NetworkProxy::Accept()
     address.sun_family = AF_UNIX;
     std::strncpy(address.sun_path, m_server.c_str(), sizeof address.sun_path - 1);
     if (connect(server.Number(), Plain(address), sizeof address) == 0)
-        m_links.push_back({std::move(client), std::move(server), {}, {}});
+        m_links.push_back({std::move(client), std::move(server), {}, {}, true});
 }

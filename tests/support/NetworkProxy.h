@@ -38,6 +38,10 @@ public:
 
     int Accepted() const { return m_accepted; }  // connections so far
 
+    // How often so far a client has sent something after the server had: round trips, if each waits for the
+    // other.
+    int Turns() const { return m_turns; }
+
     // Ends the connections that there are, for both ends.
     void CloseAll();
 
@@ -46,10 +50,12 @@ private:
     {
         standin::Descriptor client, server;
         std::string toServer, toClient;  // not written yet
+        bool isClientsTurn = true;       // the server was the last to send something
     };
     void Run();
     void Accept();
     void AddTo(std::vector<struct pollfd>& waiting, LINK const& link) const;
+    void CountTurn(LINK& link);
     bool Pass(standin::Descriptor const& from, standin::Descriptor const& to, std::string& waiting,
               bool isAllowed) const;
     void Wake() const;
@@ -57,7 +63,7 @@ private:
     std::filesystem::path const m_server;
     standin::Descriptor m_listener, m_wakingEnd, m_wokenEnd;
     std::string m_port;
-    std::atomic<int> m_loss{None}, m_accepted{0};
+    std::atomic<int> m_loss{None}, m_accepted{0}, m_turns{0};
     std::atomic<std::size_t> m_largest{0};  // 0: no limit
     std::atomic<bool> m_isClosing{false}, m_isOver{false};
     std::vector<LINK> m_links;  // the thread's own

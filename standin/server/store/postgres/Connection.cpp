@@ -78,6 +78,12 @@ bool EndsConnection(std::string_view code)
     return code.starts_with("08") || code == "57P01" || code == "57P02" || code == "57P03" || code == "57P05";
 }
 
+std::string_view CodeOf(pg_result const* result)
+{
+    char const* const field = PQresultErrorField(result, PG_DIAG_SQLSTATE);
+    return field == nullptr ? "" : field;
+}
+
 char const* RemedyOf(std::string_view code)
 {
     struct REMEDY
@@ -441,45 +447,80 @@ void Connection::SetUp(Target const& target, std::chrono::milliseconds lockLimit
                      RemedyOf("25006"));
 }
 
-Result Connection::Run(char const* sql, Parameters const& parameters, Clock::time_point deadline)
+// Of a statement that is sent.
+struct Connection::Arguments
 {
-    std::string const& name = Prepared(sql, parameters, deadline);
+    std::vector<unsigned> types;
     std::vector<char const*> values;
-    std::vector<int> sizes;
+    std::vector<int> sizes, formats;
+};
+
+Connection::Arguments Connection::ArgumentsOf(Parameters const& parameters) const
+{
+    Arguments arguments;
     for (Parameters::Value const& value : parameters.m_values)
     {
         std::string_view const bytes = value.isOurs ? std::string_view(value.own) : value.bytes;
         if (bytes.size() > LargestParameter)
             throw StoreError(m_name + ": a value is too large for it; " + RemedyOf("54"));
-        values.push_back(value.isNull ? nullptr : bytes.data() == nullptr ? "" : bytes.data());
-        sizes.push_back(static_cast<int>(bytes.size()));
+        arguments.types.push_back(value.type);
+        arguments.values.push_back(value.isNull ? nullptr : bytes.data() == nullptr ? "" : bytes.data());
+        arguments.sizes.push_back(static_cast<int>(bytes.size()));
+        arguments.formats.push_back(Binary);
     }
-    std::vector<int> const formats(values.size(), Binary);
-    MustSend(PQsendQueryPrepared(m_connection.get(), name.c_str(), static_cast<int>(values.size()),
-                                 values.data(), sizes.data(), formats.data(), Binary));
-    return Finish(deadline);
+    return arguments;
+}
+
+Result Connection::Run(char const* sql, Parameters const& parameters, Clock::time_point deadline)
+{
+    Arguments const arguments = ArgumentsOf(parameters);
+    auto const known = m_prepared.find(sql);
+    if (known == m_prepared.end())
+        return PrepareAndRun(sql, arguments, deadline);
+    Send(known->second, arguments);
+    Flush(deadline);
+    Result result = LastResult(deadline);
+    Check(result.m_result.get());
+    return result;
+}
+
+// Both on one way to the server: else the first use of a statement takes two round trips.
+Result Connection::PrepareAndRun(char const* sql, Arguments const& arguments, Clock::time_point deadline)
+{
+    std::string const name = "s" + std::to_string(m_prepared.size());
+    MustSend(PQenterPipelineMode(m_connection.get()));
+    MustSend(PQsendPrepare(m_connection.get(), name.c_str(), sql, static_cast<int>(arguments.types.size()),
+                           arguments.types.data()));
+    Send(name, arguments);
+    MustSend(PQpipelineSync(m_connection.get()));
+    Flush(deadline);
+    Result const prepared = LastResult(deadline);
+    CheckIsConnected(prepared.m_result.get());
+    Result result = LastResult(deadline);
+    CheckIsConnected(result.m_result.get());
+    AwaitResult(deadline);
+    Result const end(PQgetResult(m_connection.get()));
+    if (PQresultStatus(end.m_result.get()) != PGRES_PIPELINE_SYNC)
+        FailAsBroken();
+    MustSend(PQexitPipelineMode(m_connection.get()));
+    Check(prepared.m_result.get());
+    m_prepared[sql] = name;
+    Check(result.m_result.get());
+    return result;
+}
+
+void Connection::Send(std::string const& statement, Arguments const& arguments)
+{
+    MustSend(PQsendQueryPrepared(m_connection.get(), statement.c_str(),
+                                 static_cast<int>(arguments.values.size()), arguments.values.data(),
+                                 arguments.sizes.data(), arguments.formats.data(), Binary));
 }
 
 void Connection::Execute(std::string const& sql, Clock::time_point deadline)
 {
     MustSend(PQsendQuery(m_connection.get(), sql.c_str()));
-    Finish(deadline);
-}
-
-std::string const& Connection::Prepared(char const* sql, Parameters const& parameters,
-                                        Clock::time_point deadline)
-{
-    auto const known = m_prepared.find(sql);
-    if (known != m_prepared.end())
-        return known->second;
-    std::string const name = "s" + std::to_string(m_prepared.size());
-    std::vector<Oid> types;
-    for (Parameters::Value const& value : parameters.m_values)
-        types.push_back(value.type);
-    MustSend(
-        PQsendPrepare(m_connection.get(), name.c_str(), sql, static_cast<int>(types.size()), types.data()));
-    Finish(deadline);
-    return m_prepared[sql] = name;
+    Flush(deadline);
+    Check(LastResult(deadline).m_result.get());
 }
 
 bool Connection::IsSound()
@@ -584,26 +625,28 @@ void Connection::Flush(Clock::time_point& deadline)
     }
 }
 
-// The result of what was sent last, up to the end of it.
-Result Connection::Finish(Clock::time_point deadline)
+// Of the statement that is answered next, after all that comes before it.
+Result Connection::LastResult(Clock::time_point& deadline)
 {
-    Flush(deadline);
     Result last(nullptr);
     for (;;)
     {
-        while (PQisBusy(m_connection.get()) != 0)
-        {
-            Wait(POLLIN, deadline);
-            deadline = MovedOn(deadline);
-            TakeIn();
-        }
+        AwaitResult(deadline);
         Result next(PQgetResult(m_connection.get()));
         if (!next.m_result)
-            break;
+            return last;
         last = std::move(next);
     }
-    Check(last.m_result.get());
-    return last;
+}
+
+void Connection::AwaitResult(Clock::time_point& deadline)
+{
+    while (PQisBusy(m_connection.get()) != 0)
+    {
+        Wait(POLLIN, deadline);
+        deadline = MovedOn(deadline);
+        TakeIn();
+    }
 }
 
 void Connection::MustSend(int isSent)
@@ -614,18 +657,21 @@ void Connection::MustSend(int isSent)
 
 void Connection::Check(pg_result const* result)
 {
-    if (PQstatus(m_connection.get()) == CONNECTION_BAD || result == nullptr)
-        FailAsBroken();
+    CheckIsConnected(result);
     ExecStatusType const status = PQresultStatus(result);
     if (status == PGRES_COMMAND_OK || status == PGRES_TUPLES_OK)
         return;
-    char const* const field = PQresultErrorField(result, PG_DIAG_SQLSTATE);
-    std::string_view const code = field == nullptr ? "" : field;
-    if (EndsConnection(code))
-        FailAsBroken();
     char const* const reason = PQresultErrorField(result, PG_DIAG_MESSAGE_PRIMARY);
+    std::string_view const code = CodeOf(result);
     throw RefusedStatement(
         m_name + ": " + OneLine(reason == nullptr ? "no reason" : reason) + "; " + RemedyOf(code), code);
+}
+
+// A result may be the server's last word.
+void Connection::CheckIsConnected(pg_result const* result)
+{
+    if (PQstatus(m_connection.get()) == CONNECTION_BAD || result == nullptr || EndsConnection(CodeOf(result)))
+        FailAsBroken();
 }
 
 void Connection::FailAsBroken() { FailAsBroken(OneLine(PQerrorMessage(m_connection.get())), LostRemedy); }

@@ -171,8 +171,9 @@ public:
     Connection(Connection const&) = delete;
     Connection& operator=(Connection const&) = delete;
 
-    // One statement, which is prepared at its first use; sql is a literal. Throws RefusedStatement, or
-    // BrokenConnection: also at the deadline, since what the server does then is unknown.
+    // One statement, in one round trip; it is prepared at its first use; sql is a literal. Throws
+    // RefusedStatement, or BrokenConnection: also at the deadline, since what the server does then is
+    // unknown.
     Result Run(char const* sql, Parameters const& parameters, Clock::time_point deadline);
 
     // Statements without parameters or results.
@@ -207,6 +208,7 @@ public:
 
 private:
     struct Host;
+    struct Arguments;
     struct Close
     {
         void operator()(pg_conn* connection) const noexcept;
@@ -220,10 +222,14 @@ private:
     void Wait(short events, Clock::time_point deadline);
     bool WaitUntil(Clock::time_point end, short events);
     void Flush(Clock::time_point& deadline);
-    Result Finish(Clock::time_point deadline);
-    std::string const& Prepared(char const* sql, Parameters const& parameters, Clock::time_point deadline);
+    Arguments ArgumentsOf(Parameters const& parameters) const;
+    Result PrepareAndRun(char const* sql, Arguments const& arguments, Clock::time_point deadline);
+    void Send(std::string const& statement, Arguments const& arguments);
+    Result LastResult(Clock::time_point& deadline);
+    void AwaitResult(Clock::time_point& deadline);
     void MustSend(int isSent);
     void Check(pg_result const* result);
+    void CheckIsConnected(pg_result const* result);
     [[noreturn]] void FailAsBroken(std::string const& reason, std::string const& remedy,
                                    bool isRefusal = false);
     [[noreturn]] void FailAsUnconnected();
