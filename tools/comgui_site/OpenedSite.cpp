@@ -17,6 +17,7 @@ namespace
     if (name.IsDatabase())
         throw MissingSite(
             "no site is in the database; name the one that has it, or start a program that makes it");
+    standin::CheckIsNoDatabases(name.folder);
     throw MissingSite(name.folder.string() +
                       ": no site is there; name the folder of one, or start a program that makes it");
 }

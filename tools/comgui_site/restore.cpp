@@ -2,6 +2,7 @@
 #include "standin/server/files/Descriptor.h"
 #include "standin/server/files/SiteFiles.h"
 #include "standin/server/jobs/JobIntake.h"
+#include "standin/server/site/OpenStore.h"
 #include "standin/server/store/sqlite/Database.h"
 #include "standin/server/store/sqlite/LockFile.h"
 #include "standin/server/store/sqlite/SqliteStore.h"
@@ -374,6 +375,7 @@ try
 {
     if (!name.IsDatabase())
     {
+        standin::CheckIsNoDatabases(name.folder);
         Alone const alone(name.folder);
         return;
     }

@@ -11,8 +11,8 @@ namespace standin
 {
 namespace
 {
-#if COMGUI_HAS_POSTGRESQL
 constexpr char NumberFile[] = "site.number";
+#if COMGUI_HAS_POSTGRESQL
 constexpr std::size_t LongestNumber = 100;
 
 // The number in the folder; empty if there is none.
@@ -88,6 +88,16 @@ std::unique_ptr<SiteStore> OpenDatabase(SiteName const&, std::function<StoreCont
 #endif
 }  // namespace
 
+// A new site would take the jobs in the folder for leftovers.
+void CheckIsNoDatabases(std::filesystem::path const& folder)
+{
+    std::error_code ignored;  // who cannot look cannot open the site either, and says why then
+    if (std::filesystem::exists(folder / NumberFile, ignored) &&
+        std::filesystem::status(folder / "site.db", ignored).type() == std::filesystem::file_type::not_found)
+        throw StoreError(folder.string() + ": belongs to a site in a database, as there is " + NumberFile +
+                         " and no site.db in it; name the database, and this folder in COMGUI_SITE_FOLDER");
+}
+
 #if COMGUI_HAS_POSTGRESQL
 void MarkFolder(PostgresStore& store, std::filesystem::path const& folder)
 {
@@ -115,6 +125,7 @@ std::unique_ptr<SiteStore> OpenStore(SiteName const& name, std::function<StoreCo
 {
     if (name.IsDatabase())
         return OpenDatabase(name, first, options.keepOpening);
+    CheckIsNoDatabases(name.folder);
     return std::make_unique<SqliteStore>(name.folder, first, std::move(options));
 }
 }  // namespace standin

@@ -13,9 +13,13 @@ namespace standin
 //
 // The folder of a database's files is made with a new site and bears the site's number from then on. Throws
 // StoreError for a folder that is another site's, or that has no number and therefore is not the one that was
-// made, as where nothing is mounted; FileError.
+// made, as where nothing is mounted, and for one of a database's files that is named as a site itself;
+// FileError.
 std::unique_ptr<SiteStore> OpenStore(SiteName const& name, std::function<StoreContent()> const& first,
                                      SqliteOptions options = {});
+
+// Throws StoreError for a folder that has the files of a site in a database: for who is to make a site there.
+void CheckIsNoDatabases(std::filesystem::path const& folder);
 
 #if COMGUI_HAS_POSTGRESQL
 class PostgresStore;
