@@ -352,6 +352,16 @@ TEST_P(OutcomeUnknown, APointer_IsThereAfterwards)
     EXPECT_EQ(two.Int(Job, "K"), 7);
 }
 
+TEST_P(OutcomeUnknown, AWrite_LeavesThePointersOfTheTicket)
+{
+    int target = 0;
+    EXPECT_TRUE(one.Set(Job, "P", PARAM_POINTER, &target));
+    BeUnknownOnce();
+    EXPECT_TRUE(one.Set(Job, "K", 7));
+    EXPECT_TRUE(site->HasFailed());
+    EXPECT_EQ(one.Pointer(Job, "P"), &target);
+}
+
 // However much happens before the answer, and however eagerly the journal is pruned.
 TEST(UnknownOutcomeInAShortJournal, AWrite_IsMadeExactlyOnce)
 {
@@ -853,6 +863,33 @@ private:
     int m_newest = 100;
 };
 }  // namespace
+
+TEST_F(PrunedJournal, ATicketThatIsTakenOverAnew_IsThereAllTheTime)
+{
+    std::atomic<bool> isOver{false};
+    std::thread reader(
+        [&]
+        {
+            while (!isOver && feed->Fresh().IncarnationOf(Job) != 0)
+                ;
+            EXPECT_NE(feed->Fresh().IncarnationOf(Job), 0u);
+            EXPECT_TRUE(isOver);
+        });
+    for (int i = 0; i < 20'000; ++i)
+        feed->Reload(Job);
+    isOver = true;
+    reader.join();
+}
+
+TEST_F(PrunedJournal, ATicketThatCannotBeTakenOver_StaysAsItIs)
+{
+    program.Set(Job, "K", 7);
+    site->Fail("ChangesSince", true);
+    feed->Reload(Job);
+    EXPECT_NE(feed->Fresh().IncarnationOf(Job), 0u);
+    site->Fail("ChangesSince", false);
+    ExpectCacheToBe(ContentOf(store));
+}
 
 TEST_F(PrunedJournal, AFeedThatFellBehind_TellsExactlyTheDifference)
 {

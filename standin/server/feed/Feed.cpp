@@ -312,6 +312,7 @@ bool Feed::LoadOrReport(TicketAddress address)
     }
 }
 
+// A ticket that is there is never hidden from the readers, who take no lock.
 void Feed::Reload(TicketAddress address)
 {
     for (;;)
@@ -325,8 +326,9 @@ void Feed::Reload(TicketAddress address)
         bool const isOvertaken = m_heard.load(std::memory_order_relaxed) > seen;
         if (isOvertaken)
             continue;
-        m_cache.Forget(address);
-        if (!loaded || !isHeard)
+        if (!loaded)
+            return m_cache.Forget(address);
+        if (!isHeard)
             return;
         m_cache.Note(address, loaded->state);
         m_cache.Publish(address, loaded->state, values);

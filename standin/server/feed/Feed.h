@@ -46,7 +46,8 @@ public:
     bool Load(TicketAddress address);
 
     // For a ticket whose cache contradicts the store although everything was heard: somebody has edited the
-    // store by hand, past the journal. Takes over what is there; nobody is notified. Throws StoreError.
+    // store by hand, past the journal. Takes over what is there, without the ticket's pointers; nobody is
+    // notified. Throws StoreError.
     void Reload(TicketAddress address);
 
     // Everything up to that change is in the cache when this returns true. False if the store fails.

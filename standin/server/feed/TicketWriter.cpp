@@ -165,13 +165,19 @@ bool TicketWriter::DeleteOrThrow(Ticket ticket, Sequence revision)
         });
 }
 
-// plannedAt: what had been heard before the change was planned.
+// plannedAt: what had been heard before the change was planned. One whose answer was lost and that was not
+// made is no conflict: what it was planned on may hold as before.
 TicketWriter::Result TicketWriter::Commit(TicketChange change, Sequence plannedAt, CommitOutcome& outcome)
 {
     Feed::OwnChange own(m_feed, std::move(change));
     outcome = m_store.Commit(own.Get(), own.Number());
     if (outcome.kind == CommitOutcome::Unknown)
-        outcome = Resolved(own);
+    {
+        auto const found = AwaitOutcome(m_store, own.Number(), own.Get().address);
+        if (!found)
+            return Result::Again;
+        outcome = *found;
+    }
     switch (outcome.kind)
     {
     case CommitOutcome::Committed:
@@ -191,12 +197,5 @@ void TicketWriter::TakeOverWhatHolds(TicketChange const& change)
     m_feed.Reload(change.address);
     for (TicketChange::Basis const& other : change.others)
         m_feed.Reload(other.address);
-}
-
-// A change that turns out not to have been made counts as one that came too late: it is planned anew.
-CommitOutcome TicketWriter::Resolved(Feed::OwnChange const& change)
-{
-    auto const found = AwaitOutcome(m_store, change.Number(), change.Get().address);
-    return found.value_or(CommitOutcome{CommitOutcome::Conflict, m_feed.Heard(), {}});
 }
 }  // namespace standin

@@ -84,7 +84,6 @@ private:
     bool OnSnapshot(Ticket ticket, Plan const& plan);
     Result Commit(TicketChange change, Sequence plannedAt, CommitOutcome& outcome);
     void TakeOverWhatHolds(TicketChange const& change);
-    CommitOutcome Resolved(Feed::OwnChange const& change);
 
     Store& m_store;
     Feed& m_feed;
