@@ -160,9 +160,12 @@ std::shared_ptr<TransferTask> TransferPool::Begin(TransferTask::KIND kind, std::
 void TransferPool::StartThreads()
 {
     if (m_threads.empty())
-        m_threads.emplace_back([this] { Attend(); });
+    {
+        m_threads.emplace_back([this] { CutCancelled(); });
+        m_threads.emplace_back([this] { AskForAll(); });
+    }
     std::size_t const due = std::min<std::size_t>(Lanes, m_running.size() + m_waiting.size());
-    while (m_threads.size() < 1 + due)
+    while (m_threads.size() < 2 + due)
         m_threads.emplace_back([this] { Work(); });
 }
 
@@ -214,7 +217,7 @@ Outcome TransferPool::Carry(Lane& lane, Task const& task)
         if (task->isCancelled)
             return Error{Cancelled, task->source, {}};
         task->session = lane.Record();
-        m_attention.notify_all();
+        m_ask.notify_all();
     }
     if (task->kind == TransferTask::Job)
     {
@@ -253,6 +256,7 @@ void TransferPool::Finish(Task const& task, Outcome outcome, Lock& lock)
         task->job.reset();
     task->outcome = outcome;
     m_over.notify_all();
+    m_cut.notify_all();
     TransferEnded const event{task->number, std::move(outcome), task->job};
     lock.unlock();
     m_publish(event);
@@ -269,7 +273,7 @@ void TransferPool::Cancel(TransferTask& task)
                                       [&task](Task const& each) { return each.get() == &task; });
     if (waiting != m_waiting.end())
         Finish(Task(*waiting), Error{Cancelled, task.source, {}}, lock);
-    m_attention.notify_all();
+    m_cut.notify_all();
 }
 
 void TransferPool::CancelAll()
@@ -292,7 +296,8 @@ void TransferPool::Stop()
     }
     CancelAll();
     m_work.notify_all();
-    m_attention.notify_all();
+    m_ask.notify_all();
+    m_cut.notify_all();
     for (std::thread& thread : m_threads)
         thread.join();
     m_threads.clear();
@@ -320,54 +325,61 @@ std::optional<Outcome> TransferPool::WaitFor(TransferTask const& task,
     return task.outcome;
 }
 
-// A thread of its own looks after those that run: cuts the cancelled short, and asks how far the others are.
-void TransferPool::Attend()
+// On a thread and with a manager of their own, so that they wait for no answer: the ends of those that are
+// cancelled.
+void TransferPool::CutCancelled()
 {
+    auto const isDue = [](Task const& task) { return task->isCancelled && task->session; };
     Lock lock(m_lock);
-    auto next = Clock::now();
     while (true)
     {
-        auto const isDue = [this]
-        {
-            return m_isStopped ||
-                   std::any_of(m_running.begin(), m_running.end(),
-                               [](Task const& task) { return task->isCancelled && task->session; });
-        };
-        if (m_running.empty() && !m_isStopped)
-            m_attention.wait(lock);
-        else
-            m_attention.wait_until(lock, next, isDue);
-        if (m_isStopped && m_running.empty())
+        auto const due = std::find_if(m_running.begin(), m_running.end(), isDue);
+        if (due != m_running.end())
+            Cut(*Task(*due), lock);
+        else if (m_isStopped && m_running.empty())
             return;
+        else
+            m_cut.wait(lock);
+    }
+}
 
-        bool const asks = Clock::now() >= next;
-        if (asks)
-            next = Clock::now() + ProgressInterval;
+void TransferPool::Cut(TransferTask& task, Lock& lock)
+{
+    TLogin const session = *task.session;
+    task.session.reset();  // once is enough
+    task.isBeingCut = true;
+    lock.unlock();
+    bool const isCut = CutShort(session);
+    lock.lock();
+    task.isBeingCut = false;
+    task.isCut = isCut;
+    m_over.notify_all();
+}
+
+// Another thread asks how far the others are.
+void TransferPool::AskForAll()
+{
+    Lock lock(m_lock);
+    while (true)
+    {
+        m_ask.wait(lock, [this] { return m_isStopped || !m_running.empty(); });
         for (Task const& task : std::vector<Task>(m_running))
         {
-            if (!task->session || (!task->isCancelled && !asks))
+            if (!task->session || task->isCancelled)
                 continue;
             TLogin const session = *task->session;
-            bool const isCancelled = task->isCancelled;
-            task->isBeingCut = isCancelled;
             lock.unlock();
-            bool const isCut = isCancelled && CutShort(session);
-            if (!isCancelled)
-                AskForProgress(task, session);
+            AskForProgress(task, session);
             lock.lock();
-            if (!isCancelled)
-                continue;
-            task->isBeingCut = false;
-            task->isCut = isCut;
-            task->session.reset();  // once is enough
-            m_over.notify_all();
         }
+        if (m_ask.wait_for(lock, ProgressInterval, [this] { return m_isStopped; }))
+            return;
     }
 }
 
 bool TransferPool::CutShort(TLogin session)
 {
-    auto const code = m_control.With([&session](ComGUIManager& manager) { return manager.Logout(&session); });
+    auto const code = m_cutter.With([&session](ComGUIManager& manager) { return manager.Logout(&session); });
     return code.operator bool();
 }
 
@@ -377,7 +389,7 @@ void TransferPool::AskForProgress(Task const& task, TLogin session)
     char command[] = "local.get.progress";
     long long done = 0;
     long long total = 0;
-    auto const isKnown = m_control.With(
+    auto const isKnown = m_asker.With(
         [&](ComGUIManager& manager)
         {
             ScratchTicket const answer;

@@ -87,7 +87,9 @@ private:
     Outcome Carry(Lane& lane, Task const& task);
     bool TakeSessionBack(TransferTask& task);
     void Finish(Task const& task, Outcome outcome, Lock& lock);
-    void Attend();
+    void CutCancelled();
+    void Cut(TransferTask& task, Lock& lock);
+    void AskForAll();
     bool CutShort(TLogin session);
     void AskForProgress(Task const& task, TLogin session);
     void NoteProgress(TransferTask& task, long long done, long long total);
@@ -95,12 +97,13 @@ private:
     std::function<bool()> const m_isLoggedIn;
     std::function<std::optional<TLogin>()> const m_getRecord;
     std::function<void(Event const&)> const m_publish;
-    SharedManager m_control;  // for questions about transfers, and to end their sessions
+    SharedManager m_cutter;  // ends sessions
+    SharedManager m_asker;   // for questions about transfers
 
     mutable std::mutex m_lock;  // the members below
     std::deque<Task> m_waiting;
     std::vector<Task> m_running;
-    std::condition_variable m_work, m_attention, m_over;
+    std::condition_variable m_work, m_cut, m_ask, m_over;
     int m_busy = 0;  // workers that hold a session
     bool m_isStopped = false;
     std::vector<std::thread> m_threads;

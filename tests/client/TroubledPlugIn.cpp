@@ -51,6 +51,7 @@ bool HasEnded(void* hSession)
 int Login(void* hInstance, TLogin* login)
 {
     trouble.newest = login;
+    ++trouble.tries;
     Take(trouble.loginTakes);
     if (trouble.loginsAreRefused)
         return 42;
@@ -98,6 +99,16 @@ MTICKET_ACCESS const* GetClientContainer(void* hInstance, void* hSession)
                : Troubled(real.GetClientContainerEntry(hInstance, hSession), trouble.tickets);
 }
 
+int AnswerProgress(void* data)
+{
+    auto const* const ticket = static_cast<STICKET_ACCESS const*>(data);
+    long long const done = 1LL * trouble.progress * trouble.progressGrows;
+    long long const size = 1000000;
+    ticket->SSETPARAMETER(ticket->Instance, "Transfer/Done", GetParamType<long long>(), &done, -1);
+    ticket->SSETPARAMETER(ticket->Instance, "Transfer/Size", GetParamType<long long>(), &size, -1);
+    return 0;
+}
+
 int SendCommand(void* hInstance, void* hSession, char const* command, int size, void* data)
 {
     std::string_view const name = command;
@@ -110,6 +121,8 @@ int SendCommand(void* hInstance, void* hSession, char const* command, int size, 
     {
         ++trouble.progress;
         Take(trouble.progressTakes);
+        if (trouble.progressGrows != 0)
+            return AnswerProgress(data);
     }
     if (name == "remote.system.isalive" && trouble.serverIsAway)
         return 106;

@@ -16,6 +16,7 @@ struct TROUBLE
     std::atomic<int> questionTakes{0};          // whether the session is alive
     std::atomic<int> putTakes{0};               // unless its session ends
     std::atomic<int> progressTakes{0};
+    std::atomic<int> progressGrows{0};  // by so many bytes of a million with each question; 0: the real one
     std::atomic<int> ticketDataTakes{0};
     std::atomic<bool> hasNoContainer{false};
     std::atomic<bool> refusesCallbacks{false};
@@ -23,6 +24,7 @@ struct TROUBLE
     std::atomic<bool> knowsNoNewCommands{false};  // those that only the package's own plug-in has
 
     // What happened.
+    std::atomic<int> tries{0};   // logins, good or not
     std::atomic<int> logins{0};  // good ones
     std::atomic<int> logouts{0};
     std::atomic<int> questions{0};         // begun

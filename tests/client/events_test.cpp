@@ -1,12 +1,16 @@
 // Events as subscribers hear them.
 #include "tests/client/Client.h"
 
+#include "tests/client/NoThreads.h"
 #include <algorithm>
 #include <atomic>
 #include <chrono>
 #include <future>
 #include <gmock/gmock.h>
+#include <stdexcept>
+#include <system_error>
 #include <thread>
+#include <utility>
 
 using namespace comgui;
 using namespace std::chrono_literals;

@@ -1,6 +1,7 @@
 // Jobs and files on their way.
 #include "tests/client/Client.h"
 
+#include "tests/client/NoThreads.h"
 #include "tests/support/Files.h"
 #include <chrono>
 #include <filesystem>

@@ -1,6 +1,8 @@
 // What the kit makes of a plug-in and a server that do not do as they should.
 #include "tests/client/TroubledClient.h"
 
+#include <algorithm>
+#include <chrono>
 #include <gmock/gmock.h>
 #include <memory>
 #include <thread>
@@ -190,6 +192,20 @@ TEST_F(TroubledClient, CancelOfOneTransfer_LeavesTheOthersAlone)
     all[1].Cancel();
     for (std::size_t i = 2; i < all.size(); ++i)
         EXPECT_TRUE(all[i].Wait()) << i << ": " << all[i].Wait().GetError().Text();
+}
+
+TEST_F(TroubledClient, CancelOfATransfer_WaitsForNoQuestionAboutProgress)
+{
+    LogIn();
+    trouble.putTakes = 10000;
+    trouble.progressTakes = 2000;
+    auto put = connection.GetTransfers().Put(folder.Write("a", "content").string(), "$(TEMP)/a");
+    Await([this] { return trouble.progress > 0; });
+    put.Cancel();
+    auto const outcome = put.WaitFor(1s);  // a tenth of a second on a machine that is not busy
+    ASSERT_TRUE(outcome);
+    EXPECT_EQ(CodeOf(*outcome), Cancelled);
+    trouble.progressTakes = 0;
 }
 
 TEST_F(TroubledClient, EverySession_EndsOnce_AlsoOneThatIsReplaced)
