@@ -126,9 +126,9 @@ std::shared_ptr<Subscriber> EventHub::Add(Interest interest, Executor executor, 
     auto subscriber = std::make_shared<Subscriber>(weak_from_this(), std::move(interest), std::move(executor),
                                                    std::move(handler), interval);
     std::lock_guard const lock(m_lock);
-    m_subscribers.push_back(subscriber);
     if (!m_thread.joinable() && !m_isStopped)
-        m_thread = std::thread([self = shared_from_this()] { self->Run(); });
+        m_thread = std::thread([self = shared_from_this()] { self->Run(); });  // first, since it may throw
+    m_subscribers.push_back(subscriber);
     return subscriber;
 }
 

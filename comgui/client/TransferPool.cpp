@@ -8,6 +8,7 @@
 #include <cmath>
 #include <cstdlib>
 #include <sys/stat.h>
+#include <system_error>
 
 namespace comgui::detail
 {
@@ -150,23 +151,33 @@ std::shared_ptr<TransferTask> TransferPool::Begin(TransferTask::KIND kind, std::
         Finish(task, Error{NotLoggedIn, task->source, {}}, lock);
         return task;
     }
+    if (!StartThreads(m_running.size() + m_waiting.size() + 1))
+    {
+        Finish(task, Error{OutOfMemory, task->source, {}}, lock);
+        return task;
+    }
     m_waiting.push_back(task);
-    StartThreads();
     m_work.notify_one();
     return task;
 }
 
-// As many as are needed, at most.
-void TransferPool::StartThreads()
+// As many as so many tasks need, at most. Whether there is one that works: then all of them get their turn.
+bool TransferPool::StartThreads(std::size_t tasks)
 {
-    if (m_threads.empty())
+    constexpr std::size_t Others = 2;
+    try
     {
-        m_threads.emplace_back([this] { CutCancelled(); });
-        m_threads.emplace_back([this] { AskForAll(); });
+        if (m_threads.empty())
+            m_threads.emplace_back([this] { CutCancelled(); });
+        if (m_threads.size() < Others)
+            m_threads.emplace_back([this] { AskForAll(); });
+        while (m_threads.size() < Others + std::min<std::size_t>(Lanes, tasks))
+            m_threads.emplace_back([this] { Work(); });
     }
-    std::size_t const due = std::min<std::size_t>(Lanes, m_running.size() + m_waiting.size());
-    while (m_threads.size() < 2 + due)
-        m_threads.emplace_back([this] { Work(); });
+    catch (std::system_error const&)
+    {
+    }
+    return m_threads.size() > Others;
 }
 
 void TransferPool::Work()

@@ -82,7 +82,7 @@ private:
     using Task = std::shared_ptr<TransferTask>;
     class Lane;
 
-    void StartThreads();
+    bool StartThreads(std::size_t tasks);
     void Work();
     Outcome Carry(Lane& lane, Task const& task);
     bool TakeSessionBack(TransferTask& task);

@@ -229,6 +229,20 @@ TEST_F(EventsOfAClient, EndOfASubscription_WaitsForItsExecutor_AndFreesItsHandle
     EXPECT_EQ(held.use_count(), 1);
 }
 
+TEST_F(EventsOfAClient, SubscriptionWithoutAThread_Throws_AndIsNone)
+{
+    Connection fresh;
+    auto const held = std::make_shared<int>(1);
+    auto const subscribe = [&]
+    { return fresh.Subscribe(Interest::InServer(), queue.GetExecutor(), [held](Event const&) {}); };
+    {
+        NoThreads const none;
+        EXPECT_THROW((void)subscribe(), std::system_error);
+    }
+    EXPECT_EQ(held.use_count(), 1);
+    EXPECT_NO_THROW((void)subscribe());
+}
+
 TEST_F(EventsOfAClient, EndOfAConnection_WaitsForHandlers_AlsoWhenLoggedOut)
 {
     auto other = std::make_unique<Connection>();

@@ -88,6 +88,17 @@ TEST_F(TransfersOfAClient, Failure_HasCodeFileAndReason)
     EXPECT_EQ(*tickets.List(JobTickets), before);
 }
 
+TEST_F(TransfersOfAClient, WithoutThreads_Fail_AndDoNotRunLater)
+{
+    auto const file = folder.Write("here", "content").string();
+    {
+        NoThreads const none;
+        EXPECT_EQ(CodeOf(transfers.Put(file, "$(TEMP)/refused").Wait()), OutOfMemory);
+    }
+    EXPECT_TRUE(transfers.Put(file, "$(TEMP)/later").Wait());
+    EXPECT_THAT(NamesIn(Site("temp")), ElementsAre("later"));
+}
+
 TEST_F(TransfersOfAClient, Progress_NeverGoesBack_AndOtherCallsGoOn)
 {
     auto const transfer = transfers.Put(LargeFile(), "$(TEMP)/large");
