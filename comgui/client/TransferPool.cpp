@@ -1,6 +1,7 @@
 #include "comgui/client/TransferPool.h"
 
-#include "comgui/foundation/stracpy.h"
+#include "comgui/access/MTICKET_ADMIN.h"
+#include "comgui/access/MTICKET_READ.h"
 #include "comgui/session/TCommandRecord.h"
 #include "comgui/session/TJobIdentification.h"
 #include <algorithm>
@@ -90,6 +91,8 @@ public:
     // Error: the plug-in's.
     Result<int> Announce(TransferTask const& task)
     {
+        if (Outcome const checked = Check(task.options); !checked)
+            return checked.GetError();
         char command[] = "remote.job.prepare";
         TCommandRecord record{};
         record.nMagic = static_cast<unsigned int>(m_manager->GetEndian());
@@ -126,6 +129,23 @@ public:
     }
 
 private:
+    // The plug-in drops a queue that is not there, and then the job is good.
+    Outcome Check(JobOptions const& options) const
+    {
+        if (options.copies.value_or(1) < 1)
+            return Error{OutOfRange, std::to_string(*options.copies), {}};
+        if (!options.queue)
+            return {};
+        MTICKET_ACCESS const* const container = m_manager->GetClientContainer();
+        if (!container)
+            return Error{NoContainer, m_record->szUser, {}};
+        if (!MTICKET_READ::Of(container)->OpenTicket(QueueTickets, *options.queue))
+            return Error{
+                NoSuchTicket, std::to_string(QueueTickets) + "/" + std::to_string(*options.queue), {}};
+        MTICKET_ADMIN::Of(container)->CloseTicket(QueueTickets, *options.queue, false);
+        return {};
+    }
+
     std::unique_ptr<ComGUIManager> m_manager;
     TLogin* m_record = nullptr;  // the manager's since the first login
     bool m_isIn = false;
@@ -208,7 +228,10 @@ void TransferPool::Work()
             lane.Lose();
         else if (!outcome)
             lane.Leave();  // a prepared job that failed goes with its session
+        auto const fetched = task->kind == TransferTask::Get && outcome ? SizeOf(task->target) : std::nullopt;
         lock.lock();
+        if (fetched)
+            task->progress.total = fetched;
         m_busy += (lane.IsIn() ? 1 : 0) - (wasIn ? 1 : 0);
         if (!outcome && task->isCancelled)
             outcome = Error{Cancelled, task->source, {}};
@@ -409,15 +432,11 @@ void TransferPool::AskForProgress(Task const& task, TLogin session)
         });
     if (!isKnown || !*isKnown)
         return;
-    TransferProgressed event{task->number, {}};
-    {
-        std::lock_guard const lock(m_lock);
-        if (task->outcome || (done == task->progress.done && total == task->progress.total))
-            return;
-        NoteProgress(*task, done, total);
-        event.progress = task->progress;
-    }
-    m_publish(event);
+    std::lock_guard const lock(m_lock);
+    if (task->outcome || (done == task->progress.done && total == task->progress.total))
+        return;
+    NoteProgress(*task, done, total);
+    m_publish(TransferProgressed{task->number, task->progress});  // under the lock: before the end
 }
 
 void TransferPool::NoteProgress(TransferTask& task, long long done, long long total)

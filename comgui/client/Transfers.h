@@ -21,9 +21,9 @@ class TransferTask;
 
 struct JobOptions
 {
-    std::string name{};          // that the server gives the file; empty: as on this side. UTF-8
-    std::optional<int> queue{};  // id of a ticket of type 7
-    std::optional<int> copies{};
+    std::string name{};           // that the server gives the file; empty: as on this side. UTF-8
+    std::optional<int> queue{};   // id of a ticket of type 7
+    std::optional<int> copies{};  // 1 and up
 };
 
 // One transfer. A handle: copies are the same, and the transfer goes on without any. For any thread.
@@ -41,7 +41,8 @@ public:
     // nor at the server. If it has just arrived, it stays. Does not wait.
     void Cancel();
 
-    // Waits for the end. Errors: Cancelled, NotLoggedIn, NoSuchFile, the plug-in's.
+    // Waits for the end. Errors: Cancelled, NotLoggedIn, OutOfMemory, of a job NoSuchTicket (its queue) and
+    // OutOfRange (its copies), the plug-in's.
     Outcome Wait() const;
     std::optional<Outcome> WaitFor(std::chrono::milliseconds time) const;  // nothing: not over yet
 

@@ -99,6 +99,35 @@ TEST_F(TransfersOfAClient, WithoutThreads_Fail_AndDoNotRunLater)
     EXPECT_THAT(NamesIn(Site("temp")), ElementsAre("later"));
 }
 
+TEST_F(TransfersOfAClient, QuickFetch_EndsWithTheSizeOfItsFile)
+{
+    auto const file = folder.Write("here", std::string(100000, 'x')).string();
+    ASSERT_TRUE(transfers.Put(file, "$(TEMP)/there").Wait());
+    auto const get = transfers.Get("$(TEMP)/there", (folder / "back").string());
+    ASSERT_TRUE(get.Wait());
+    EXPECT_EQ(get.Progress().done, 100000);
+    EXPECT_EQ(get.Progress().total, 100000);
+}
+
+TEST_F(TransfersOfAClient, JobForAQueueThatIsNotThere_IsAFailure)
+{
+    auto const before = *tickets.List(JobTickets);
+    auto const file = folder.Write("page.pdf", "content").string();
+    auto const outcome = transfers.SendJob(file, {"", 77, std::nullopt}).Wait();
+    ASSERT_EQ(CodeOf(outcome), NoSuchTicket);
+    EXPECT_EQ(outcome.GetError().about, "7/77");
+    EXPECT_EQ(CodeOf(transfers.SendJob(file, {"", std::nullopt, 0}).Wait()), OutOfRange);
+    EXPECT_EQ(CodeOf(transfers.SendJob(file, {"", std::nullopt, -3}).Wait()), OutOfRange);
+    EXPECT_EQ(*tickets.List(JobTickets), before);
+}
+
+TEST_F(TransfersOfAClient, JobForAQueue_ArrivesInIt)
+{
+    TicketAddress const queue = NewTicket(QueueTickets);
+    auto const file = folder.Write("page.pdf", "content").string();
+    EXPECT_TRUE(transfers.SendJob(file, {"", queue.id, 1}).Wait());
+}
+
 TEST_F(TransfersOfAClient, Progress_NeverGoesBack_AndOtherCallsGoOn)
 {
     auto const transfer = transfers.Put(LargeFile(), "$(TEMP)/large");

@@ -266,3 +266,30 @@ TEST_F(TroubledClient, SlowTicketAsXml_HoldsNothingUp)
     trouble.ticketDataTakes = 0;
     asks.join();
 }
+
+TEST_F(TroubledClient, Progress_HasRateAndRest_AndNoneComesAfterTheEnd)
+{
+    LogIn();
+    std::vector<std::string> events;
+    auto const subscription = connection.Subscribe(
+        Interest::InTransfers(), queue.GetExecutor(),
+        [&events](Event const& event)
+        { events.push_back(std::holds_alternative<TransferEnded>(event) ? "end" : "progress"); },
+        0ms);
+    trouble.putTakes = 10000;
+    trouble.progressGrows = 1000;
+    auto put = connection.GetTransfers().Put(folder.Write("a", "content").string(), "$(TEMP)/a");
+    Await([&put] { return put.Progress().rest.has_value(); });
+    queue.RunFor(50ms);
+    TransferProgress const progress = put.Progress();
+    EXPECT_GT(progress.rate, 100);
+    EXPECT_LT(progress.rate, 20000);  // ten questions a second
+    auto const left = static_cast<double>(1000000 - progress.done);
+    EXPECT_NEAR(static_cast<double>(progress.rest->count()), left / progress.rate, 1);
+    put.Cancel();
+    (void)put.Wait();
+    queue.RunFor(300ms);
+    ASSERT_GE(events.size(), 2u);
+    EXPECT_EQ(std::count(events.begin(), events.end(), "end"), 1);
+    EXPECT_EQ(events.back(), "end");
+}
