@@ -79,7 +79,7 @@ std::shared_ptr<Client> Client::Make()
         [weak = std::weak_ptr<Client>(client)]
         {
             auto const owner = weak.lock();
-            return owner ? owner->Record() : std::nullopt;
+            return owner ? owner->RecordWithPassword() : std::nullopt;
         },
         [weak = std::weak_ptr<EventHub>(client->m_hub)](Event const& event)
         {
@@ -139,7 +139,10 @@ Result<User> Client::LogIn(Server const& server, Account const& account)
     Assign(m_record->szUser, account.user);
     Assign(m_record->szPassword, account.password);
     if (Outcome const entered = Enter(*m_manager); !entered)
+    {
+        ForgetPassword(*m_record);
         return entered.GetError();
+    }
     User const user{
         m_record->szUser, {UserTickets, m_record->iClientStamp}, m_manager->IsCurrentUserAdmin(m_record)};
     lock.unlock();
@@ -259,7 +262,10 @@ void Client::Leave()
     m_manager->Logout(m_record);
     m_container = nullptr;  // the watch may have logged in anew in the middle of a logout
     m_record->iGUINotificationID = -1;
+    ForgetPassword(*m_record);
     std::lock_guard const copying(m_copying);
+    if (m_copy)
+        ForgetPassword(*m_copy);
     m_copy.reset();
 }
 
@@ -277,6 +283,14 @@ std::string Client::LocalEndPoint() const
 }
 
 std::optional<TLogin> Client::Record() const
+{
+    auto record = RecordWithPassword();
+    if (record)
+        ForgetPassword(*record);
+    return record;
+}
+
+std::optional<TLogin> Client::RecordWithPassword() const
 {
     std::lock_guard const lock(m_copying);
     return IsLoggedIn() ? m_copy : std::nullopt;
@@ -488,12 +502,14 @@ bool Client::EnterAgain(ComGUIManager& watcher)
     {
         std::lock_guard const lock(m_calls);
         TLogin old = *m_record;
-        if (!Enter(watcher))
-        {
+        bool const isIn = Enter(watcher).operator bool();
+        if (isIn)
+            watcher.Logout(&old);
+        else
             *m_record = old;
+        ForgetPassword(old);
+        if (!isIn)
             return false;
-        }
-        watcher.Logout(&old);
     }
     m_entryPause = std::chrono::seconds(1);
     SwitchNotifications();

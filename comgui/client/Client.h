@@ -47,8 +47,9 @@ public:
     // The ticket as XML.
     Result<std::string> TicketData(TicketAddress ticket);
 
-    // A copy of the session's record; nothing without a session.
+    // A copy of the session's record, without its password; nothing without a session.
     std::optional<TLogin> Record() const;
+    std::optional<TLogin> RecordWithPassword() const;  // whoever asks forgets it when it has served
 
     // With the reason for the last refusal on this thread.
     Error Failure(int code, std::string about);

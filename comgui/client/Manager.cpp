@@ -50,6 +50,12 @@ Result<std::unique_ptr<ComGUIManager>> OpenManager()
     return std::make_unique<ComGUIManager>();
 }
 
+void ForgetPassword(TLogin& record)
+{
+    for (char volatile& letter : record.szPassword)
+        letter = 0;
+}
+
 ScratchTicket::ScratchTicket()
 {
     if (STicketFactory* const factory = ticketFactory)

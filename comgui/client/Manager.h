@@ -13,6 +13,9 @@ namespace comgui::detail
 // first time. For any thread. Error: NoPlugIn.
 Result<std::unique_ptr<ComGUIManager>> OpenManager();
 
+// Overwrites the password, also where the compiler sees nobody read it afterwards.
+void ForgetPassword(TLogin& record);
+
 // A ticket in memory, from the plug-in's factory; null without memory.
 class ScratchTicket
 {

@@ -71,6 +71,7 @@ public:
         m_record->hSession = nullptr;
         m_record->iGUINotificationID = -1;
         int const code = m_manager->Login(m_record);
+        ForgetPassword(*m_record);  // it has served: each login gets a new record
         m_isIn = code == 0;
         return m_isIn ? Outcome() : FailureOf(*m_manager, code, m_record->szUser);
     }
@@ -241,10 +242,12 @@ void TransferPool::Work()
 
 Outcome TransferPool::Carry(Lane& lane, Task const& task)
 {
-    auto const record = m_getRecord();
+    auto record = m_getRecord();
     if (!record)
         return Error{NotLoggedIn, task->source, {}};
-    if (Outcome entered = lane.Enter(*record); !entered)
+    Outcome entered = lane.Enter(*record);
+    ForgetPassword(*record);
+    if (!entered)
         return entered;
     {
         std::lock_guard const lock(m_lock);

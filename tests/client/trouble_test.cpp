@@ -267,6 +267,22 @@ TEST_F(TroubledClient, SlowTicketAsXml_HoldsNothingUp)
     asks.join();
 }
 
+TEST_F(TroubledClient, Password_IsForgotten_AfterARefusalAndALogout)
+{
+    trouble.loginsAreRefused = true;
+    ASSERT_FALSE(connection.LogIn(Here(), Admin()));
+    EXPECT_STREQ(trouble.newest.load()->szPassword, "");
+    trouble.loginsAreRefused = false;
+    LogIn();
+    TLogin const* const session = trouble.newest;
+    EXPECT_STREQ(session->szPassword, "admin");  // to log in again after a loss
+    ASSERT_TRUE(connection.GetTransfers().Put(folder.Write("a", "b").string(), "$(TEMP)/a").Wait());
+    ASSERT_NE(trouble.newest, session);
+    ASSERT_TRUE(connection.LogOut());
+    EXPECT_STREQ(session->szPassword, "");
+    EXPECT_STREQ(trouble.newest.load()->szPassword, "");
+}
+
 TEST_F(TroubledClient, Progress_HasRateAndRest_AndNoneComesAfterTheEnd)
 {
     LogIn();
