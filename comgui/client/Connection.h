@@ -81,6 +81,7 @@ public:
     // Before a login, too: the interest lasts through logouts. Changes that come faster than the handler is
     // called are merged: by key for each ticket, the latest value counts. interval: the least time between
     // two deliveries, for instance between two repaints; the first event after a pause comes at once.
+    // What the handler throws reaches whoever runs the executor's tasks; later events still come.
     // Asks the plug-in to report it, and so does the end of the subscription. Throws std::system_error if the
     // kit cannot start its thread.
     [[nodiscard]] Subscription Subscribe(Interest interest, Executor executor, Subscription::Handler handler,

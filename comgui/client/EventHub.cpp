@@ -205,7 +205,7 @@ EventHub::Clock::time_point EventHub::PostWhatIsDue(Lock& lock)
     std::vector<std::shared_ptr<Subscriber>> due;
     for (auto const& subscriber : m_subscribers)
     {
-        if (subscriber->m_isPosted || subscriber->m_isOver || subscriber->m_pending.IsEmpty())
+        if (subscriber->m_isPosted || subscriber->m_isOver || subscriber->HasNothing())
             continue;
         if (subscriber->m_due > now)
             next = std::min(next, subscriber->m_due);
@@ -267,7 +267,7 @@ bool Subscriber::IsOver() const
 }
 
 // Whether the event belongs to a session or a stay at a server that has ended since.
-bool Subscriber::IsOld(Event const& event, std::uintptr_t epoch, std::uintptr_t visit) const
+bool Subscriber::IsOld(Event const& event, Batch const& batch) const
 {
     bool const isOfAServer =
         std::holds_alternative<ServerLost>(event) || std::holds_alternative<ServerBack>(event);
@@ -277,10 +277,10 @@ bool Subscriber::IsOld(Event const& event, std::uintptr_t epoch, std::uintptr_t 
     if (isOfATransfer || !hub)
         return !isOfATransfer;
     std::lock_guard const lock(hub->m_lock);
-    return isOfAServer ? hub->m_visit != visit : hub->m_epoch != epoch;
+    return isOfAServer ? hub->m_visit != batch.visit : hub->m_epoch != batch.epoch;
 }
 
-// In the executor. What a handler throws goes to the executor.
+// In the executor. What a handler throws goes to the executor, and the rest of the batch is delivered next.
 void Subscriber::Deliver()
 {
     auto const hub = m_hub.lock();
@@ -303,14 +303,13 @@ void Subscriber::Deliver()
     EventHub::Lock lock(hub->m_lock);
     if (m_isOver || hub->m_isStopped)
         return;
-    auto const epoch = hub->m_epoch;
-    auto const visit = hub->m_visit;
-    auto const events = m_pending.Take();
+    if (m_batch.IsEmpty())
+        m_batch = {hub->m_epoch, hub->m_visit, m_pending.Take()};
     m_runner = std::this_thread::get_id();
     Run const run{*this, *hub};
     lock.unlock();
-    for (Event const& event : events)
-        if (!IsOver() && !IsOld(event, epoch, visit))
+    while (!m_batch.IsEmpty() && !IsOver())
+        if (Event const& event = m_batch.events[m_batch.next++]; !IsOld(event, m_batch))
             m_handler(event);
 }
 }  // namespace comgui::detail

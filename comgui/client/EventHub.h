@@ -91,9 +91,21 @@ public:
 private:
     friend class EventHub;
 
+    // Taken for delivery. For the thread that delivers, while m_isPosted.
+    struct Batch
+    {
+        std::uintptr_t epoch = 0;
+        std::uintptr_t visit = 0;
+        std::vector<Event> events{};
+        std::size_t next = 0;
+
+        bool IsEmpty() const { return next == events.size(); }
+    };
+
     void Deliver();
+    bool HasNothing() const { return m_pending.IsEmpty() && m_batch.IsEmpty(); }
     bool IsOver() const;
-    bool IsOld(Event const& event, std::uintptr_t epoch, std::uintptr_t visit) const;
+    bool IsOld(Event const& event, Batch const& batch) const;
 
     std::weak_ptr<EventHub> const m_hub;
     Interest const m_interest;
@@ -102,6 +114,7 @@ private:
     std::chrono::milliseconds const m_interval;
 
     PendingEvents m_pending;
+    Batch m_batch;
     EventHub::Clock::time_point m_due{};
     bool m_isPosted = false;
     bool m_isOver = false;

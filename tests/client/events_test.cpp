@@ -243,6 +243,26 @@ TEST_F(EventsOfAClient, SubscriptionWithoutAThread_Throws_AndIsNone)
     EXPECT_NO_THROW((void)subscribe());
 }
 
+TEST_F(EventsOfAClient, AfterOneThatTheHandlerThrowsAt_StillCome)
+{
+    TicketAddress const first = NewTicket();
+    TicketAddress const second = NewTicket();
+    bool hasThrown = false;
+    auto const subscription = connection.Subscribe(Interest::InTickets({first, second}), queue.GetExecutor(),
+                                                   [&](Event const& event)
+                                                   {
+                                                       if (!std::exchange(hasThrown, true))
+                                                           throw std::runtime_error("of the handler");
+                                                       heard.push_back(WordsOf(event));
+                                                   });
+    ASSERT_TRUE(tickets.Write(first, "A", 1));
+    ASSERT_TRUE(tickets.Write(second, "A", 2));
+    std::this_thread::sleep_for(50ms);  // both are in one batch
+    EXPECT_THROW(queue.RunFor(1s), std::runtime_error);
+    Hear(1);
+    EXPECT_THAT(heard, ElementsAre("changed " + NameOf(second) + " A=2"));
+}
+
 TEST_F(EventsOfAClient, EndOfAConnection_WaitsForHandlers_AlsoWhenLoggedOut)
 {
     auto other = std::make_unique<Connection>();
