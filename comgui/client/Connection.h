@@ -7,7 +7,8 @@
 //
 // Every operation may be called from any thread, also from handlers of events, and blocks as long as the
 // plug-in takes to answer; reads and writes of tickets do not wait for a login or logout. Several
-// connections, also to different servers, do not affect each other.
+// connections, also to different servers, do not affect each other. Threads do not survive a fork: the child
+// may only call exec or _exit, and must not use or destroy a connection of its parent.
 #pragma once
 
 #include "comgui/client/Subscription.h"
