@@ -53,7 +53,7 @@ TLogin* NewRecord()
 }
 
 // Whether the server answers this session.
-bool Answers(ComGUIManager& manager, TLogin& record)
+Outcome Ask(ComGUIManager& manager, TLogin& record)
 {
     char command[] = "remote.system.isalive";
     TCommandRecord question{};
@@ -61,7 +61,10 @@ bool Answers(ComGUIManager& manager, TLogin& record)
     question.nSize = sizeof question;
     question.iArgB = 1;
     question.iResult = -1;
-    return manager.SendCommand(&record, command, sizeof question, &question) == 0 && question.iResult >= 0;
+    std::string const server = NameOf({record.szServerHost, record.iServerPort});
+    if (int const code = manager.SendCommand(&record, command, sizeof question, &question); code != 0)
+        return FailureOf(manager, code, server);
+    return question.iResult >= 0 ? Outcome() : Outcome(Error{ServerAway, server, {}});
 }
 }  // namespace
 
@@ -465,54 +468,68 @@ void Client::Look(ComGUIManager& watcher)
     if (!record)
         return;
     bool const isThere = m_isServerThere;
-    bool const answers = Answers(watcher, *record);
+    Outcome const answer = Ask(watcher, *record);
     if (IsWatchOver())
         return;
-    if (answers)
+    if (answer)
     {
         m_isServerThere = true;
         if (!isThere)
             m_hub->Publish(ServerBack{false});
         return;
     }
-    Server const server{record->szServerHost, record->iServerPort};
-    NoteLoss({ServerAway, NameOf(server), TakeReason(watcher)});
+    Error const& error = answer.GetError();
     bool const isReachable = watcher.IsAlive(&*record) != NotReachable;
-    if (isReachable && !IsWatchOver() && EnterAgain(watcher))
+    if (IsWatchOver())
+        return;
+    NoteLoss(isReachable ? error : Error{ServerAway, error.about, error.reason});
+    auto const entered = isReachable ? EnterAgain(watcher) : std::nullopt;
+    if (entered && *entered)
         m_hub->Publish(ServerBack{true});  // the server was there, and the session was not
+    else if (entered && !IsWatchOver())
+        NoteRefusal(entered->GetError());
 }
 
 void Client::NoteLoss(Error error)
 {
-    if (m_isServerThere.exchange(false))
+    if (!m_isServerThere.exchange(false))
+        return;
+    m_loss = error.code;
+    m_hub->Publish(ServerLost{std::move(error)});
+}
+
+// Why the session is not back yet, once.
+void Client::NoteRefusal(Error error)
+{
+    if (std::exchange(m_loss, error.code) != error.code)
         m_hub->Publish(ServerLost{std::move(error)});
 }
 
 // With growing pauses: servers answer ever later whom they have refused often. The old session ends when
 // there is a new one, since tickets may still be read in it, and through the watcher, since a logout by the
 // manager gives the local port away.
-bool Client::EnterAgain(ComGUIManager& watcher)
+std::optional<Outcome> Client::EnterAgain(ComGUIManager& watcher)
 {
     constexpr std::chrono::seconds LongestPause(60);
     auto const now = std::chrono::steady_clock::now();
     if (now < m_nextEntry)
-        return false;
+        return std::nullopt;
     m_nextEntry = now + m_entryPause;
     m_entryPause = std::min(2 * m_entryPause, LongestPause);
     {
         std::lock_guard const lock(m_calls);
         TLogin old = *m_record;
-        bool const isIn = Enter(watcher).operator bool();
-        if (isIn)
+        Outcome entered = Enter(watcher);
+        if (entered)
             watcher.Logout(&old);
         else
             *m_record = old;
         ForgetPassword(old);
-        if (!isIn)
-            return false;
+        if (!entered)
+            return entered;
     }
     m_entryPause = std::chrono::seconds(1);
     SwitchNotifications();
-    return true;
+    return Outcome();
 }
 }  // namespace comgui::detail

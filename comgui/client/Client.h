@@ -77,7 +77,8 @@ private:
     void Watch();
     void Look(ComGUIManager& watcher);
     void NoteLoss(Error error);
-    bool EnterAgain(ComGUIManager& watcher);
+    void NoteRefusal(Error error);
+    std::optional<Outcome> EnterAgain(ComGUIManager& watcher);
 
     std::shared_ptr<EventHub> const m_hub = std::make_shared<EventHub>();
     std::shared_ptr<TransferPool> m_pool;
@@ -108,6 +109,7 @@ private:
     std::thread m_watch;
 
     // The watch's own.
+    int m_loss = 0;                        // the code of the last loss that was reported
     std::chrono::seconds m_entryPause{1};  // after a login that was refused; grows
     std::chrono::steady_clock::time_point m_nextEntry{};
 };

@@ -59,7 +59,8 @@ struct TransferEnded
     std::optional<int> job;  // its ticket's id, if a job was sent
 };
 
-// The server does not answer any more. Reads may still work; writes fail.
+// The server does not answer any more, or not this session. Reads may still work; writes fail. Once more,
+// with the reason, if a new session is refused.
 struct ServerLost
 {
     Error error;

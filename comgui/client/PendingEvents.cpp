@@ -172,6 +172,9 @@ void PendingEvents::Add(Interest const& interest, Event const& event)
 // At most one loss and one return: those in between say no more, but that there was a new session.
 void PendingEvents::AddServerEvent(Event const& event)
 {
+    if (!m_server.empty() && m_server.back().index() == event.index() &&
+        std::holds_alternative<ServerLost>(event))
+        m_server.pop_back();  // the same loss, with another reason
     m_server.push_back(event);
     if (auto* const back = std::get_if<ServerBack>(&m_server.back()))
         back->isNewSession = m_isNewSession = m_isNewSession || back->isNewSession;
