@@ -152,6 +152,7 @@ Result<User> Client::LogIn(Server const& server, Account const& account)
 
     SwitchNotifications();
     m_nextEntry = {};
+    m_entryPause = std::chrono::seconds(1);
     try
     {
         m_watch = std::thread([this] { Watch(); });

@@ -311,3 +311,24 @@ TEST_F(TroubledClient, Progress_HasRateAndRest_AndNoneComesAfterTheEnd)
     EXPECT_EQ(std::count(events.begin(), events.end(), "end"), 1);
     EXPECT_EQ(events.back(), "end");
 }
+
+TEST_F(TroubledClient, SessionThatIsLostAgain_IsReplacedAsSoonAsTheFirstTime)
+{
+    LogIn();
+    auto const subscription = Listen();
+    trouble.loginsAreRefused = true;
+    trouble.sessionIsGone = true;
+    Await([this] { return trouble.tries == 4; });  // with growing pauses
+    ASSERT_TRUE(connection.LogOut());
+    trouble.loginsAreRefused = false;
+    LogIn();
+    heard.clear();
+    trouble.loginsAreRefused = true;
+    trouble.sessionIsGone = true;
+    Await([this] { return trouble.tries == 6; });
+    trouble.loginsAreRefused = false;
+    auto const start = Clock::now();
+    for (heard.clear(); heard.empty() || heard.back() != "back anew";)
+        ASSERT_FALSE(Hear(heard.size() + 1).empty());
+    EXPECT_LT(Clock::now() - start, 6s);
+}
