@@ -98,11 +98,13 @@ TEST_F(TroubledClient, SessionThatCannotBeReplaced_IsLost_WithTheReason_UntilItC
 {
     LogIn();
     auto const subscription = Listen();
+    trouble.loginTakes = 500;  // else both may be merged
     trouble.loginsAreRefused = true;
     trouble.sessionIsGone = true;
     auto const lost = ElementsAre("lost: localhost:50000: the session has ended",
                                   "lost: admin: the server refuses, with code 42");
     EXPECT_THAT(Hear(2), lost);
+    trouble.loginTakes = 0;
     queue.RunFor(1500ms);
     EXPECT_THAT(heard, lost);  // once
     trouble.loginsAreRefused = false;
