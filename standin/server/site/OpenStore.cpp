@@ -52,14 +52,30 @@ void CheckFolder(PostgresStore const& store, std::filesystem::path const& folder
         RefuseFolder(store, folder, "belongs to another site, with the number " + ForMessages(number));
 }
 
+// For who did not make the site, while the one who did has not marked its folder and may have died before it
+// could: that has put the seed there.
+void CheckIsUnmarked(PostgresStore const& store, std::filesystem::path const& folder)
+{
+    std::error_code error;
+    if (std::filesystem::exists(folder / "site.db"))
+        RefuseFolder(store, folder, "belongs to another site, as there is site.db in it");
+    bool const isEmpty = std::filesystem::is_empty(folder, error);
+    if (error || isEmpty)
+        RefuseFolder(store, folder,
+                     std::string("is not the folder of the site's files, as ") +
+                         (error ? "it cannot be looked into" : "nothing is in it"));
+}
+
 std::unique_ptr<SiteStore> OpenDatabase(SiteName const& name, std::function<StoreContent()> const& first,
                                         bool keepOpening)
 {
     PostgresOptions options;
     options.keepOpening = true;
+    bool isNew = false;
     auto const firstInFolder = [&]
     {
         CheckIsNobodys(name.folder);
+        isNew = true;
         return first();
     };
     auto store = std::make_unique<PostgresStore>(name.database, firstInFolder, std::move(options));
@@ -68,7 +84,11 @@ std::unique_ptr<SiteStore> OpenDatabase(SiteName const& name, std::function<Stor
         if (store->HasFolder())
             CheckFolder(*store, name.folder, NumberIn(name.folder));
         else
+        {
+            if (!isNew && NumberIn(name.folder).empty())
+                CheckIsUnmarked(*store, name.folder);
             MarkFolder(*store, name.folder);
+        }
         if (!keepOpening)
             store->EndOpening();
     }
