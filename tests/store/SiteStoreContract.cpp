@@ -63,6 +63,15 @@ TEST_P(SiteStoreContract, EndOpening_OfWhatIsNotKept_LeavesAnothersAlone)
     EXPECT_NE(other.get(), nullptr);
 }
 
+TEST_P(SiteStoreContract, Opening_IsKeptUntilItEnds)
+{
+    EXPECT_FALSE(Open()->KeepsOpening());
+    auto const keeper = Open(true);
+    EXPECT_TRUE(keeper->KeepsOpening());
+    keeper->EndOpening();
+    EXPECT_FALSE(keeper->KeepsOpening());
+}
+
 TEST_P(SiteStoreContract, Tidiness_LastsWhileEverybodyLeavesInOrder)
 {
     auto store = Open();

@@ -152,7 +152,9 @@ TEST_F(PostgresOpening, ThatIsKept_EndsWithTheConnection_AndIsNotTakenFromTheNex
     keeping.keepOpening = true;
     auto const first = schema.Open(keeping);
     ASSERT_TRUE(Terminate(*first));
+    EXPECT_FALSE(first->KeepsOpening());
     auto const second = schema.Open(keeping);
+    EXPECT_FALSE(first->KeepsOpening());
     first->EndOpening();
     auto third = std::async(std::launch::async, [this] { return schema.Open(); });
     EXPECT_EQ(third.wait_for(100ms), std::future_status::timeout);

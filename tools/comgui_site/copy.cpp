@@ -156,6 +156,24 @@ void Compare(OpenedSite& source, NewDatabase& target)
     if (!differences.empty())
         throw Trouble("the copy differs: " + differences[0] + "; check the first site, then try again");
 }
+
+standin::Sequence NewestChange(OpenedSite& site)
+{
+    return site.Store().Tickets([](auto const&, auto const&) {});
+}
+
+// A connection that broke meanwhile has let others in, and who was thought dead may have come back.
+void CheckWasHeld(OpenedSite& source, standin::Sequence newest)
+{
+    if (!source.Store().KeepsOpening())
+        throw Trouble(source.Store().Name() +
+                      ": the connection broke, so that others could open the site while "
+                      "it was copied; see that nobody does, then try again");
+    CheckIsAlone(source);
+    if (NewestChange(source) != newest)
+        throw Trouble(source.Store().Name() +
+                      ": was changed while it was copied; end what writes to it, then try again");
+}
 }  // namespace
 
 Copied CopySite(standin::SiteName const& from, standin::SiteName const& to)
@@ -163,6 +181,7 @@ try
 {
     OpenedSite source(from, OpenedSite::Others::Wait);
     CheckIsAlone(source);
+    standin::Sequence const newest = NewestChange(source);
     CheckIsEmpty(to.folder);
     CheckIsOutside(to.folder, from.folder);
     standin::MakePrivateFolders({to.folder});
@@ -179,6 +198,7 @@ try
     files.Compare();
     target->Store().Tickets([&](auto const&, auto const&) { ++copied.tickets; });
     copied.users = target->Store().Users().size();
+    CheckWasHeld(source, newest);
     try
     {
         files.MoveTo(to.folder);

@@ -24,6 +24,9 @@ public:
     // If it was opened so that others who open it wait: lets them. May be called always.
     virtual void EndOpening() = 0;
 
+    // Whether others who open it wait, as they have all the time: a connection that breaks lets them.
+    virtual bool KeepsOpening() = 0;
+
     // --- while it is open
 
     // For who looks at several users and changes some of them then: others who take the turn wait until the

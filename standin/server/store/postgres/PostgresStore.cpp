@@ -165,6 +165,17 @@ void PostgresStore::EndOpening()
         Turn(*this).Run("SELECT pg_advisory_unlock($1, $2)", Parameters() << m_lockClass << LockOfOpening);
 }
 
+bool PostgresStore::KeepsOpening()
+{
+    std::lock_guard const lock(m_opening);
+    return m_isOpening && Turn(*this)
+                                  .Run("SELECT FROM pg_locks WHERE locktype = 'advisory' AND granted AND "
+                                       "pid = pg_backend_pid() AND classid = $1::oid AND objid = $2::oid "
+                                       "AND objsubid = 2",
+                                       Parameters() << m_lockClass << LockOfOpening)
+                                  .Rows() == 1;
+}
+
 bool PostgresStore::HasFolder() { return Turn(*this).Run("SELECT has_folder FROM site").Bool(0, 0); }
 
 void PostgresStore::NoteFolder() { Turn(*this).Run("UPDATE site SET has_folder = true"); }

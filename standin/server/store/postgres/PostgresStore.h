@@ -120,6 +120,7 @@ public:
     bool IsTidy() const noexcept override { return m_isTidy; }
     void NoteTidy() noexcept override { m_isTidy = true; }
     void EndOpening() override;
+    bool KeepsOpening() override;
 
     // The server is asked in the background; its silence is noticed after some three seconds. One that lets
     // this program in no more cannot be reached either.

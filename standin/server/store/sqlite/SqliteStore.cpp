@@ -214,6 +214,12 @@ void SqliteStore::EndOpening()
         m_lock->Unlock(LockFile::Opening);
 }
 
+bool SqliteStore::KeepsOpening()
+{
+    std::lock_guard const lock(m_opening);
+    return m_isOpening;
+}
+
 std::unique_ptr<SiteStore::UsersTurn> SqliteStore::TakeUsersTurn(std::chrono::milliseconds limit)
 {
     struct Turn : UsersTurn

@@ -104,6 +104,7 @@ public:
     bool IsTidy() const noexcept override { return m_page->IsTidy(); }
     void NoteTidy() noexcept override { m_page->NoteTidy(); }
     void EndOpening() override;
+    bool KeepsOpening() override;
     std::unique_ptr<UsersTurn> TakeUsersTurn(std::chrono::milliseconds limit) override;
 
     // Looks at every page, too. Takes about two seconds for 300 MB.
