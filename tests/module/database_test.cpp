@@ -7,6 +7,8 @@
 #include "tests/module/NotificationListener.h"
 #include "tests/support/Files.h"
 #include "tests/support/PostgresCluster.h"
+#include <algorithm>
+#include <atomic>
 #include <chrono>
 #include <csignal>
 #include <cstdlib>
@@ -210,6 +212,52 @@ TEST_F(LostDatabase, IsToldByIsAlive_WhileReadsGoOnAndWritesAreRefused)
         EXPECT_TRUE(Becomes([&] { return Write(6 + round) == 1; }));
         EXPECT_EQ(Read(), 6 + round);
     }
+}
+
+// It is lost while the module fetches what another program has just written.
+TEST_F(LostDatabase, AmongManyChanges_HoldsUpNeitherReadsNorIsAliveForLong)
+{
+    auto const other = Another();
+    std::atomic<bool> isOver{false};
+    std::thread writer(
+        [&]
+        {
+            for (std::uint64_t number = 1; !isOver; ++number)
+                try
+                {
+                    other->Commit(WriteTo(*other, Job, "Key", 5), number);
+                }
+                catch (StoreError const&)
+                {
+                    std::this_thread::sleep_for(10ms);
+                }
+        });
+    std::chrono::steady_clock::duration longest{};
+    auto const measure = [&](auto const& call)
+    {
+        auto const begun = std::chrono::steady_clock::now();
+        EXPECT_TRUE(call());
+        longest = std::max(longest, std::chrono::steady_clock::now() - begun);
+    };
+    for (int round = 0; round < 3; ++round)
+    {
+        auto const work = std::chrono::steady_clock::now() + 200ms;
+        for (bool isStopped = false; !isStopped || IsAlive() == 0;)
+        {
+            if (!isStopped && std::chrono::steady_clock::now() > work)
+            {
+                cluster.Stop();
+                isStopped = true;
+            }
+            measure([&] { return Read() == 5; });
+            measure([&] { return IsAlive() == 0 || isStopped; });
+        }
+        cluster.Continue();
+        EXPECT_TRUE(Becomes([&] { return IsAlive() == 0; }));
+    }
+    isOver = true;
+    writer.join();
+    EXPECT_LT(longest, 6s);
 }
 
 TEST_F(LostDatabase, IsTheReasonOfEveryCallThatItFails)

@@ -10,6 +10,7 @@
 #include "tests/support/sanitizers.h"
 #include <condition_variable>
 #include <fstream>
+#include <future>
 #include <gmock/gmock.h>
 #include <random>
 #include <thread>
@@ -391,6 +392,30 @@ TEST(UnknownOutcomeInAShortJournal, AWrite_IsMadeExactlyOnce)
 
 INSTANTIATE_TEST_SUITE_P(Commits, OutcomeUnknown, testing::Bool(),
                          [](auto const& happened) { return happened.param ? "Made" : "NotMade"; });
+
+// A change with a pointer comes from its writer's hand alone, who waits for the store.
+TEST_F(TwoPrograms, ReadsBehindAChangeInDoubt_GoOnOnceTheStoreIsOutOfReach)
+{
+    int target = 0;
+    EXPECT_TRUE(one.Set(Job, "K", 1));
+    EXPECT_TRUE(two.Set(Job, "K", 2));
+    EXPECT_EQ(one.Int(Job, "K"), 2);
+    site->Fail("FindCommit", true);
+    site->AnswerUnknownOnce(true);
+    auto write = std::async(std::launch::async, [&] { return one.Set(Job, "P", PARAM_POINTER, &target); });
+    while (!site->HasFailed())
+        std::this_thread::sleep_for(std::chrono::milliseconds(1));
+    EXPECT_TRUE(two.Set(Job, "K", 3));
+    auto read = std::async(std::launch::async, [&] { return one.Int(Job, "K"); });
+    EXPECT_EQ(read.wait_for(std::chrono::milliseconds(300)), std::future_status::timeout);
+    site->BeUnreachable(true);
+    EXPECT_EQ(read.wait_for(std::chrono::seconds(10)), std::future_status::ready);
+    site->Fail("FindCommit", false);
+    EXPECT_EQ(read.get(), 2);
+    EXPECT_TRUE(write.get());
+    site->BeUnreachable(false);
+    EXPECT_EQ(one.Int(Job, "K"), 3);
+}
 
 // --- pointers
 

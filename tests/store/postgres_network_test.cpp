@@ -163,6 +163,20 @@ TEST_F(PostgresNetwork, LostDuringACall_EndsTheWaitOfOthers)
     proxy.Lose(NetworkProxy::None);
 }
 
+TEST_F(PostgresNetwork, LostDuringACall_EndsItWhenTheLossIsFound)
+{
+    PostgresOptions options = Brief();
+    options.statementLimit = 60s;
+    auto const patient = schema.OpenAs(Uri(), NoContent, options);
+    proxy.Lose(NetworkProxy::Both);
+    auto const start = Clock::now();
+    EXPECT_THAT(ReasonOf([&] { patient->Users(); }), HasSubstr("the server does not answer"));
+    EXPECT_LT(Clock::now() - start, 15s);
+    proxy.Lose(NetworkProxy::None);
+    AwaitReach(*patient, true);
+    EXPECT_THAT(ReasonOf([&] { patient->Users(); }), IsEmpty());
+}
+
 TEST_F(PostgresNetwork, Lost_IsLeftWithinASecond)
 {
     proxy.Lose(NetworkProxy::Both);

@@ -16,6 +16,9 @@ constexpr std::chrono::milliseconds SlowPoll(500);
 // To a listener that has no room.
 constexpr std::chrono::milliseconds QuickPoll(5);
 
+// Who waits for what another thread fetches finds out so often whether that can still come.
+constexpr std::chrono::milliseconds LookForLoss(100);
+
 bool HasPointers(TicketChange const& change)
 {
     return std::any_of(change.parameters.begin(), change.parameters.end(),
@@ -66,8 +69,10 @@ bool Feed::CatchUp(Sequence sequence) noexcept
         {
             Sequence const before = m_heard.load(std::memory_order_relaxed);
             bool const isComing = m_isFetching || m_awaited == before + 1;
+            if (isComing && !m_store.IsReachable())
+                return false;
             if (isComing)
-                m_progress.wait(lock);
+                m_progress.wait_for(lock, LookForLoss);
             else
                 Fetch(lock);
             if (!isComing && m_awaited == 0 && m_heard.load(std::memory_order_relaxed) == before)

@@ -28,12 +28,13 @@ public:
     void PutUser(User const& user);
 
     // Faults. All of them hold for every handle.
-    void FailAll(bool fail);                       // every operation throws StoreError
-    void FailOperation(int which);                 // that operation from now on throws, 1 for the next; once
-    void Fail(char const* operation, bool fail);   // that one throws StoreError, named as in Store
-    void BreakJournal();                           // its newest record cannot be read any more
-    void AnswerUnknownOnce(bool andCommit);        // the next Commit, which happens or does not
-    bool HasFailed() const;                        // the fault that was ordered last has shown
+    void FailAll(bool fail);                      // every operation throws StoreError
+    void FailOperation(int which);                // that operation from now on throws, 1 for the next; once
+    void Fail(char const* operation, bool fail);  // that one throws StoreError, named as in Store
+    void BeUnreachable(bool is) { m_isUnreachable = is; }  // as far as IsReachable says
+    void BreakJournal();                                   // its newest record cannot be read any more
+    void AnswerUnknownOnce(bool andCommit);                // the next Commit, which happens or does not
+    bool HasFailed() const;                                // the fault that was ordered last has shown
     void Interject(std::function<void()> action);  // runs once, when the next Commit begins; may use handles
     void InterjectBehind(std::function<void()> action);  // the same when one was made and is not answered yet
 
@@ -91,6 +92,7 @@ private:
     ProgramId m_lastProgram = 0;
     long long m_lastSession = 0;
 
+    std::atomic<bool> m_isUnreachable = false;
     bool m_failAll = false;
     int m_failIn = 0;  // 0: no failure is due
     enum class Unknown
@@ -123,6 +125,7 @@ public:
     CommitOutcome Commit(TicketChange const& change, std::uint64_t number) override;
     std::optional<CommitOutcome> FindCommit(std::uint64_t number) override;
     void Sync() override;
+    bool IsReachable() const noexcept override { return !m_site->m_isUnreachable; }
     std::atomic<Sequence> const& Committed() const noexcept override;
     Sequence Tickets(std::function<void(TicketAddress, TicketState const&)> const& take) override;
     std::optional<Loaded>

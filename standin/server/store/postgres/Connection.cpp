@@ -24,6 +24,9 @@ constexpr int Binary = 1;
 constexpr int NullSize = -1;  // of an array's element
 constexpr std::size_t LargestParameter = 0x3FFFFFFF;
 
+// How often is asked whether a wait is still worth while.
+constexpr std::chrono::milliseconds Step(100);
+
 // A line on which bytes flow may rest so long.
 constexpr std::chrono::seconds LongestRest(5);
 
@@ -578,7 +581,7 @@ void Connection::OnSilence(std::chrono::milliseconds time, std::function<void()>
 void Connection::Wait(short events, Clock::time_point deadline)
 {
     auto const silent = m_reportSilence ? Clock::now() + m_silence : deadline;
-    if (WaitUntil(std::min(silent, deadline), events))
+    if (m_isLost ? WaitInSteps(deadline, events) : WaitUntil(std::min(silent, deadline), events))
         return;
     if (silent < deadline)
     {
@@ -587,9 +590,21 @@ void Connection::Wait(short events, Clock::time_point deadline)
             return;
     }
     while (m_isWorthWaiting && m_isWorthWaiting())
-        if (WaitUntil(Clock::now() + std::chrono::milliseconds(100), events))
+        if (WaitUntil(Clock::now() + Step, events))
             return;
     FailAsBroken("has not answered in time", LostRemedy);
+}
+
+bool Connection::WaitInSteps(Clock::time_point end, short events)
+{
+    while (Clock::now() < std::min(end, m_lastMoment))
+    {
+        if (WaitUntil(std::min(end, Clock::now() + Step), events))
+            return true;
+        if (m_isLost())
+            FailAsBroken("the server does not answer", LostRemedy);
+    }
+    return WaitUntil(end, events);
 }
 
 bool Connection::WaitUntil(Clock::time_point end, short events)

@@ -185,6 +185,9 @@ public:
     // A deadline does not count as long as that holds: for who counts all that there is.
     void WaitAsLongAs(std::function<bool()> isWorthIt) { m_isWorthWaiting = std::move(isWorthIt); }
 
+    // Once that holds nobody waits any more, whatever the deadline.
+    void GiveUpWhen(std::function<bool()> isLost) { m_isLost = std::move(isLost); }
+
     // Whether the server has not ended it, as far as it has said so. For a connection that only works.
     bool IsSound();
 
@@ -221,6 +224,7 @@ private:
     void SetUp(Target const& target, std::chrono::milliseconds lockLimit, Clock::time_point deadline);
     void Wait(short events, Clock::time_point deadline);
     bool WaitUntil(Clock::time_point end, short events);
+    bool WaitInSteps(Clock::time_point end, short events);
     void Flush(Clock::time_point& deadline);
     Arguments ArgumentsOf(Parameters const& parameters) const;
     Result PrepareAndRun(char const* sql, Arguments const& arguments, Clock::time_point deadline);
@@ -240,6 +244,7 @@ private:
     std::chrono::milliseconds m_silence{};
     std::function<void()> m_reportSilence;  // null: nobody asks for it
     std::function<bool()> m_isWorthWaiting;
+    std::function<bool()> m_isLost;  // null: nobody says so
     std::unique_ptr<pg_conn, Close> m_connection;
     KeptFromChildren m_socket;  // a program lives as long as the server sees it connected
     std::string m_name;

@@ -48,8 +48,7 @@ PostgresStore::PostgresStore(std::string const& uri, std::function<StoreContent(
     : m_target{uri, options.schema}, m_options(std::move(options)), m_process(getpid()),
       m_machine(MachineName()), m_program(ProgramName()), m_since(std::time(nullptr))
 {
-    m_working = std::make_unique<Connection>(m_target, OnServer(m_options.statementLimit),
-                                             Clock::now() + m_options.connectLimit, &m_hurry);
+    m_working = NewConnection(Clock::now() + m_options.connectLimit);
     m_name = m_working->Name();
     {
         Turn opening(*this, m_options.openingLimit);
@@ -323,6 +322,15 @@ bool PostgresStore::HasSoundConnection()
     return m_working != nullptr;
 }
 
+// The bell notices sooner that the server is lost than a statement's limit is over.
+std::unique_ptr<Connection> PostgresStore::NewConnection(Clock::time_point deadline)
+{
+    auto connection =
+        std::make_unique<Connection>(m_target, OnServer(m_options.statementLimit), deadline, &m_hurry);
+    connection->GiveUpWhen([this] { return !m_reach.IsThere(); });
+    return connection;
+}
+
 bool PostgresStore::IsAttemptDue() const
 {
     return Clock::now() >= m_nextAttempt || m_reach.Returns() != m_returnsBeforeFailure;
@@ -358,8 +366,7 @@ void PostgresStore::Attempt(Clock::time_point deadline, std::chrono::millisecond
     auto const returns = m_reach.Returns();
     try
     {
-        m_working = std::make_unique<Connection>(m_target, OnServer(m_options.statementLimit),
-                                                 std::min(deadline, Clock::now() + connectLimit), &m_hurry);
+        m_working = NewConnection(std::min(deadline, Clock::now() + connectLimit));
         ComeBack(deadline);
         ++m_connected;
         m_connectedSince = Clock::now();

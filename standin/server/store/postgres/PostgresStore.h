@@ -8,12 +8,12 @@
 // A call whose connection breaks throws StoreError, or answers Unknown if it is a Commit; a change of the
 // users is repeated, for a minute if need be, and throws UnknownOutcome then: at once if it was made in a
 // turn of the users, which is over then. The next one connects again, and does not notice a break of some 100
-// ms; as long as the server is known to be out of reach, calls fail at once. No other call takes longer than
-// the limits of connecting and of a statement together, unless bytes come and go all the time: a large ticket
-// over a slow line takes its time. A thread of its own looks after the working connection when the bell tells
-// it to, so that a program is soon back that calls nothing, and that the bell is heard meanwhile. Until it is
-// back, others take it for dead and may bury it: it then goes on under its number with its sessions and the
-// notes of its part files, but without the tickets that it owned.
+// ms; as long as the server is known to be out of reach, calls fail at once, and those end that wait for it.
+// No other call takes longer than the limits of connecting and of a statement together, unless bytes come and
+// go all the time: a large ticket over a slow line takes its time. A thread of its own looks after the working
+// connection when the bell tells it to, so that a program is soon back that calls nothing, and that the bell is
+// heard meanwhile. Until it is back, others take it for dead and may bury it: it then goes on under its number
+// with its sessions and the notes of its part files, but without the tickets that it owned.
 //
 // Who comes back to another site than before, or to a server that has not got all the changes that the
 // program knows of, has done there nothing but look: from then on every operation throws UnusableStore.
@@ -163,6 +163,7 @@ private:
     [[noreturn]] void End(std::string const& reason);
     postgres::Connection& Working(postgres::Clock::time_point deadline);
     bool HasSoundConnection();
+    std::unique_ptr<postgres::Connection> NewConnection(postgres::Clock::time_point deadline);
     bool IsAttemptDue() const;
     void ConnectAgain(postgres::Clock::time_point deadline);
     void Attempt(postgres::Clock::time_point deadline, std::chrono::milliseconds connectLimit);
