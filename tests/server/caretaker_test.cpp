@@ -9,6 +9,7 @@
 #include "tests/support/Files.h"
 #include <algorithm>
 #include <atomic>
+#include <future>
 #include <gmock/gmock.h>
 #include <thread>
 
@@ -254,6 +255,23 @@ TEST_F(LeftByTheDead, TransferInTheMiddle_GoesWithItsProgram)
     Make("temp/" + part);
     Kill();
     EXPECT_FALSE(Has("temp/" + part));
+}
+
+// The store is lost when the living one deletes a job, and does not come back before its end.
+TEST_F(LeftByTheDead, PreparedJob_WhoseDeletionIsInDoubt_HoldsUpNoEnd)
+{
+    Prepare();
+    testing::internal::CaptureStderr();
+    site->Fail("FindCommit", true);
+    site->AnswerUnknownOnce(false);
+    dying->store.Die();
+    while (!site->HasFailed())
+        std::this_thread::sleep_for(std::chrono::milliseconds(1));
+    auto end = std::async(std::launch::async, [&] { living->server.Stop(std::chrono::minutes(1)); });
+    EXPECT_EQ(end.wait_for(std::chrono::seconds(10)), std::future_status::ready);
+    site->Fail("FindCommit", false);
+    end.get();
+    testing::internal::GetCapturedStderr();
 }
 
 TEST_F(UnheardByTheLiving, JobOfAnother_KeepsItsFolder)

@@ -68,6 +68,21 @@ TEST_F(AwaitedOutcome, ThatIsNotKnownInTime_IsSaid)
                 HasSubstr("whether a ticket of type 3 was made is not known"));
 }
 
+TEST_F(AwaitedOutcome, IsNotAskedForAgainAtTheEnd)
+{
+    Lose(Creation(Job), true);
+    site->Fail("FindCommit", true);
+    std::atomic<bool> hasEnded{false};
+    auto found = std::async(std::launch::async,
+                            [&] { return AwaitOutcome(store, writer.LastNumber(), Job, 60s, &hasEnded); });
+    EXPECT_EQ(found.wait_for(300ms), std::future_status::timeout);
+    hasEnded = true;
+    EXPECT_EQ(found.wait_for(10s), std::future_status::ready);
+    EXPECT_THROW(found.get(), UnknownOutcome);
+    site->Fail("FindCommit", false);
+    EXPECT_EQ(AwaitOutcome(store, writer.LastNumber(), Job, 60s, &hasEnded)->sequence, 1u);
+}
+
 TEST_F(AwaitedOutcome, OfAStoreThatIsOfNoMoreUse_IsSaidAtOnce)
 {
     Lose(Creation(Job), true);

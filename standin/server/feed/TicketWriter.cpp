@@ -173,7 +173,7 @@ TicketWriter::Result TicketWriter::Commit(TicketChange change, Sequence plannedA
     outcome = m_store.Commit(own.Get(), own.Number());
     if (outcome.kind == CommitOutcome::Unknown)
     {
-        auto const found = AwaitOutcome(m_store, own.Number(), own.Get().address);
+        auto const found = AwaitOutcome(m_store, own.Number(), own.Get().address, OutcomeLimit, &m_isStopped);
         if (!found)
             return Result::Again;
         outcome = *found;

@@ -69,6 +69,10 @@ public:
     // change that the ticket may have had; false if it is another one here.
     bool DeleteOrThrow(Ticket ticket, Sequence revision = TicketChange::AnyRevision);
 
+    // For the end of the process: from now on nobody waits for a store that does not answer what has become
+    // of a change.
+    void Stop() noexcept { m_isStopped = true; }
+
 private:
     enum class Result
     {
@@ -88,5 +92,6 @@ private:
     Store& m_store;
     Feed& m_feed;
     AfterChange& m_after;
+    std::atomic<bool> m_isStopped{false};
 };
 }  // namespace standin

@@ -75,6 +75,7 @@ void Server::Stop(std::chrono::milliseconds patience)
 {
     m_transfers.Stop(patience);
     m_notifications.Stop(patience);
+    m_writer.Stop();  // lest the caretaker waits for a store that is lost
     m_caretaker.Stop();
     m_feed.Stop();
 }

@@ -20,7 +20,7 @@ UnknownOutcome NotKnown(StoreError const& reason, TicketAddress changed)
 }  // namespace
 
 std::optional<CommitOutcome> AwaitOutcome(Store& store, std::uint64_t number, TicketAddress changed,
-                                          std::chrono::milliseconds limit)
+                                          std::chrono::milliseconds limit, std::atomic<bool> const* hasEnded)
 {
     for (auto const end = std::chrono::steady_clock::now() + limit;;)
     {
@@ -34,7 +34,7 @@ std::optional<CommitOutcome> AwaitOutcome(Store& store, std::uint64_t number, Ti
         }
         catch (StoreError const& error)
         {
-            if (std::chrono::steady_clock::now() >= end)
+            if (std::chrono::steady_clock::now() >= end || (hasEnded && *hasEnded))
                 throw NotKnown(error, changed);
         }
         std::this_thread::sleep_for(PauseBetweenQuestions);

@@ -9,8 +9,9 @@ namespace standin
 constexpr std::chrono::seconds OutcomeLimit(60);
 
 // Asks after a commit of the store that has answered Unknown until that is known; nothing if it was not made.
-// Throws UnknownOutcome, with what was changed in its words, when the time is over or the store of no more
-// use.
+// Throws UnknownOutcome, with what was changed in its words, when the time is over, the store of no more use,
+// or hasEnded true and the store does not answer.
 std::optional<CommitOutcome> AwaitOutcome(Store& store, std::uint64_t number, TicketAddress changed,
-                                          std::chrono::milliseconds limit = OutcomeLimit);
+                                          std::chrono::milliseconds limit = OutcomeLimit,
+                                          std::atomic<bool> const* hasEnded = nullptr);
 }  // namespace standin
