@@ -174,6 +174,19 @@ TEST_F(PostgresReturn, UnderANumberThatIsAnothers_IsTheEnd)
     ExpectEnd(*store, "another program has got the number of this one");
 }
 
+TEST_F(PostgresReturn, OfADumpUnderASoundConnection_IsTheEnd)
+{
+    PostgresSchema const restored;
+    MakeTickets(*restored.Open(), 20);
+    MakeTickets(*store, 5);
+    store->Maintain(5);
+    schema.Run("DROP SCHEMA " + schema.Name() + " CASCADE");
+    schema.Run("ALTER SCHEMA " + restored.Name() + " RENAME TO " + schema.Name());
+    EXPECT_THROW(store->Maintain(5), UnusableStore);
+    ExpectEnd(*store, "another site has taken the place of the one that this program has open");
+    EXPECT_THAT(AddressesIn(*schema.Open()), SizeIs(20));
+}
+
 // What somebody has put in its place by hand.
 TEST_F(PostgresReturn, ToASiteOfAnotherNumber_IsTheEnd)
 {

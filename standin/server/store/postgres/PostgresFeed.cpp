@@ -144,7 +144,15 @@ void PostgresStore::Maintain(Sequence heard)
     m_settled = heard;
     {
         Turn turn(*this);  // no change of its own is on its way meanwhile
-        turn.Run("SELECT note_heard($1, $2)", Parameters() << m_self << Needed(heard));
+        // A sound connection finds by its name what somebody has restored in the place of a schema that he
+        // dropped, of which this program knows nothing.
+        bool const isOurs = turn.Run("SELECT note_heard($1, $2) FROM site WHERE lock_class() = $3",
+                                     Parameters() << m_self << Needed(heard) << m_lockClass)
+                                .Rows() == 1;
+        if (!isOurs)
+            End(m_name +
+                ": another site has taken the place of the one that this program has open; start the "
+                "program anew");
         if (m_hasLeftovers)
         {
             m_hasLeftovers = false;  // before: what fails meanwhile is left over anew
