@@ -26,7 +26,6 @@ public:
     bool OnInit() override
     {
         SetAppName("ticket_desk");
-        SetAppDisplayName("Ticket desk");
         wxCmdLineParser parser(argc, argv);
         AddOptions(parser);
         if (parser.Parse() != 0)
@@ -34,6 +33,7 @@ public:
         wxString language;
         parser.Found("language", &language);
         Translate(language);
+        SetAppDisplayName(_("Ticket desk"));
         auto* const frame = new desk::MainFrame;
         frame->Show();
         frame->CallAfter([this, frame, server = ServerOf(parser), account = AccountOf(parser)]
@@ -62,7 +62,7 @@ private:
     {
         auto const server = desk::ServerFromText(name.empty() ? "localhost" : comgui::ToUtf8(name));
         if (!server)
-            frame.AskForLogin(comgui::ToUtf8(name) + ": no server");
+            frame.AskForLogin(comgui::ToUtf8(wxString::Format(_("%s: no server"), name)));
         else if (account.password.empty())
             frame.AskForLogin();
         else

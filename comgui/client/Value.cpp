@@ -7,6 +7,7 @@
 #include <limits>
 #include <optional>
 #include <type_traits>
+#include <wx/translation.h>
 
 namespace comgui
 {
@@ -303,9 +304,12 @@ bool operator==(Value const& left, Value const& right)
 
 char const* NameOf(PARAM_TYPE type)
 {
-    static constexpr char const* Names[] = {"none",  "pointer", "int",   "double",   "text",
-                                            "bytes", "list",    "int64", "unsigned", "unsigned64"};
-    return type >= PARAM_NONE && type <= PARAM_UNSIGNED64 ? Names[type] : "unknown";
+    // wxTRANSLATE marks them for the catalogues.
+    static constexpr char const* Names[] = {
+        wxTRANSLATE("none"),     wxTRANSLATE("pointer"),   wxTRANSLATE("int"),  wxTRANSLATE("double"),
+        wxTRANSLATE("text"),     wxTRANSLATE("bytes"),     wxTRANSLATE("list"), wxTRANSLATE("int64"),
+        wxTRANSLATE("unsigned"), wxTRANSLATE("unsigned64")};
+    return type >= PARAM_NONE && type <= PARAM_UNSIGNED64 ? Names[type] : wxTRANSLATE("unknown");
 }
 
 std::string ToText(Value const& value)

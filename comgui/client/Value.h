@@ -60,6 +60,7 @@ COMGUI_EXPORT bool operator==(Value const& left, Value const& right);
 inline bool operator!=(Value const& left, Value const& right) { return !(left == right); }
 
 // "int", "double", "text", "bytes", "int64", "unsigned", "unsigned64", "pointer", "list", "none".
+// Always English; wxGetTranslation(NameOf(type), "comgui") is in the user's language.
 COMGUI_EXPORT char const* NameOf(PARAM_TYPE type);
 
 namespace detail

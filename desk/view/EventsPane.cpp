@@ -2,6 +2,7 @@
 
 #include "desk/model/DisplayText.h"
 #include "desk/model/TextMatch.h"
+#include "desk/view/NumberText.h"
 #include "desk/view/Theme.h"
 #include <comgui/client/Text.h>
 #include <wx/datetime.h>
@@ -30,10 +31,14 @@ wxString TicketOf(EventRow const& row)
 wxString TextOf(EventRow const& row)
 {
     if (row.kind == EventKind::MoreKeys)
-        return wxString::Format(_("and %lld more keys"), row.count);
+        return wxString::Format(wxPLURAL("and %lld more key", "and %lld more keys", PluralOf(row.count)),
+                                row.count);
     if (row.kind == EventKind::TransferProgressed)
-        return row.total ? wxString::Format(_("%lld of %lld bytes"), row.count, *row.total)
-                         : wxString::Format(_("%lld bytes"), row.count);
+        return row.total
+                   ? wxString::Format(
+                         wxPLURAL("%lld of %lld byte", "%lld of %lld bytes", PluralOf(*row.total)), row.count,
+                         *row.total)
+                   : wxString::Format(wxPLURAL("%lld byte", "%lld bytes", PluralOf(row.count)), row.count);
     if (row.kind == EventKind::TransferEnded && row.job)
         return wxString::Format(_("job %d"), *row.job);
     return comgui::ToWx(row.text);

@@ -45,7 +45,7 @@ wxString HistoryPlot::GetLabel() const
     wxString words;
     for (PlotLine const& line : m_lines)
         if (!line.series.IsEmpty())
-            words += wxString::Format(_("%s: now %s, least %s, most %s; "), line.name,
+            words += wxString::Format(_("%s: now %s, least %s, most %s") + "; ", line.name,
                                       line.text(line.series.Last()), line.text(line.series.Lowest()),
                                       line.text(line.series.Highest()));
     auto const [begin, end] = Times();

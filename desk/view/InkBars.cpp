@@ -37,10 +37,10 @@ wxString InkBars::GetLabel() const
 {
     if (m_bars.empty())
         return _("No ink coverage is known");
-    wxString words = _("Ink coverage");
+    wxString inks;
     for (BAR const& bar : m_bars)
-        words += wxString::Format(m_bars.data() == &bar ? ": %s %s" : ", %s %s", bar.name, bar.value);
-    return words + "; " + wxString::Format(_("total %s"), m_total);
+        inks += wxString::Format(m_bars.data() == &bar ? "%s %s" : ", %s %s", bar.name, bar.value);
+    return wxString::Format(_("Ink coverage: %s; total %s"), inks, m_total);
 }
 
 wxSize InkBars::DoGetBestClientSize() const
@@ -69,8 +69,11 @@ void InkBars::Draw(ChartPainter& painter) const
         DrawRow(painter, m_bars[i],
                 {area.m_x, area.m_y + height * static_cast<double>(i), area.m_width, height}, nameWidth);
 
-    wxString const total = shown == m_bars.size() ? wxString(_("Total"))
-                                                  : wxString::Format(_("Total of %zu inks"), m_bars.size());
+    wxString const total =
+        shown == m_bars.size()
+            ? wxString(_("Total"))
+            : wxString::Format(wxPLURAL("Total of %zu ink", "Total of %zu inks", PluralOf(m_bars.size())),
+                               m_bars.size());
     wxRect2DDouble const last(area.m_x, area.m_y + height * static_cast<double>(shown), area.m_width, height);
     double const valueWidth = painter.WidthOf(m_total);
     painter.Text(m_total, last, TextSide::End, painter.Palette().text);

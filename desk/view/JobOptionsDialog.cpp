@@ -1,5 +1,6 @@
 #include "desk/view/JobOptionsDialog.h"
 
+#include "desk/view/NumberText.h"
 #include "desk/view/ShownText.h"
 #include <comgui/client/Text.h>
 #include <wx/choice.h>
@@ -35,9 +36,12 @@ JobOptionsDialog::JobOptionsDialog(wxWindow* parent, std::vector<std::string> co
         grid->Add(control, wxSizerFlags(1).Expand());
         return control;
     };
-    wxString const name = files.size() == 1
-                              ? wxFileName(comgui::ToWx(files[0])).GetFullName()
-                              : wxString::Format(_("%zu files, each with its name"), files.size());
+    wxString const name =
+        files.size() == 1
+            ? wxFileName(comgui::ToWx(files[0])).GetFullName()
+            : wxString::Format(
+                  wxPLURAL("%zu file with its name", "%zu files, each with its name", PluralOf(files.size())),
+                  files.size());
     m_name = add(_("&Name:"), [&] { return new wxTextCtrl(this, wxID_ANY, name); });
     m_queue = add(_("&Queue:"), [&] { return new wxChoice(this, wxID_ANY); });
     m_copies = add(_("&Copies:"),

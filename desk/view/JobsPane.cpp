@@ -257,9 +257,12 @@ wxString JobsPane::NoteOn(std::vector<RefusedPath> const& refused) const
     if (refused.empty())
         return {};
     wxString const first = RefusalText(refused.front());
-    return refused.size() == 1
-               ? first
-               : first + " " + wxString::Format(_("%zu others cannot be sent either."), refused.size() - 1);
+    std::size_t const others = refused.size() - 1;
+    if (others == 0)
+        return first;
+    return wxString::Format(wxPLURAL("%s %zu other cannot be sent either.",
+                                     "%s %zu others cannot be sent either.", PluralOf(others)),
+                            first, others);
 }
 
 void JobsPane::Cancel()

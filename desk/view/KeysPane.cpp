@@ -22,7 +22,7 @@ constexpr int FadingStep = 100;           // milliseconds
 
 wxString NameOfType(comgui::Value const& value)
 {
-    return wxGetTranslation(comgui::ToWx(comgui::NameOf(value.Type())));
+    return wxGetTranslation(comgui::NameOf(value.Type()), "comgui");
 }
 
 bool Contains(std::string_view text, std::string const& part) { return TextMatch(part).IsIn(text); }

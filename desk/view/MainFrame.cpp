@@ -10,6 +10,7 @@
 #include "desk/view/KeysPane.h"
 #include "desk/view/LoginDialog.h"
 #include "desk/view/NewKeyDialog.h"
+#include "desk/view/ShownText.h"
 #include "desk/view/TicketFiles.h"
 #include "desk/view/TicketsPane.h"
 #include <algorithm>
@@ -132,7 +133,7 @@ void MainFrame::MakeMenus()
     add(view, _("&Events\tCtrl+1"), [this] { m_below->SetSelection(0); });
     add(view, _("&Jobs\tCtrl+2"), [this] { m_below->SetSelection(1); });
     add(view, _("&Pause events\tCtrl+P"), [this] { m_events->TogglePause(); });
-    add(view, _("Forget all &events"), [this] { m_events->Clear(); });
+    add(view, _("Forget &all events"), [this] { m_events->Clear(); });
     add(view, _("&Read all anew\tF5"), [this] { m_session.ListAll(); });
     view->AppendSeparator();
     add(view, _("&Next pane\tF6"), [this] { FocusNextPane(); });
@@ -254,7 +255,8 @@ void MainFrame::Take(DeskSession::State state, comgui::Error const& error)
     SetTitle(isIn ? m_server + " - " + _("Ticket desk") : _("Ticket desk"));
     m_transfers->Enable(isIn);
     if (state == DeskSession::State::Lost)
-        m_info->ShowMessage(comgui::ToWx(error.Text()) + ". " + _("Trying again ..."), wxICON_ERROR);
+        m_info->ShowMessage(wxString::Format(_("%s. Trying again ..."), ShownText(error.Text())),
+                            wxICON_ERROR);
     else
         m_info->Dismiss();
 }

@@ -27,7 +27,7 @@ NewKeyDialog::NewKeyDialog(wxWindow* parent, std::string const& beside)
     m_type = new wxChoice(this, wxID_ANY);
     m_type->SetName("type");
     for (PARAM_TYPE const type : Types)
-        m_type->Append(wxGetTranslation(comgui::NameOf(type)));
+        m_type->Append(wxGetTranslation(comgui::NameOf(type), "comgui"));
     m_type->SetSelection(0);
     m_text = new wxTextCtrl(this, wxID_ANY);
     m_text->SetName("value");

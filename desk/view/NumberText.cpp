@@ -41,6 +41,12 @@ wxString PercentText(double percent)
     return wxString::Format(_("%s %%"), wxNumberFormatter::ToString(percent, 1));
 }
 
+unsigned PluralOf(std::uint64_t count)
+{
+    constexpr std::uint64_t Digits = 1'000'000;
+    return static_cast<unsigned>(count < Digits ? count : Digits + count % Digits);
+}
+
 wxString TimeText(double seconds)
 {
     int const whole = static_cast<int>(std::clamp(seconds, 0.0, Longest));

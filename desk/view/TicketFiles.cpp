@@ -4,6 +4,8 @@
 #include "desk/model/TicketFile.h"
 #include "desk/model/TicketStream.h"
 #include "desk/view/FaultText.h"
+#include "desk/view/NumberText.h"
+#include "desk/view/ShownText.h"
 #include <comgui/client/Text.h>
 #include <variant>
 #include <wx/filedlg.h>
@@ -69,10 +71,17 @@ wxString SentenceOf(Exported const& done)
     if (done.trouble.index() != 0)
         return TextOf(done.trouble);
     if (done.losses.empty())
-        return wxString::Format(
-            wxPLURAL("Exported: %zu key", "Exported: %zu keys", static_cast<unsigned>(done.keys)), done.keys);
-    return wxString::Format(_("Exported, but the file does not hold all of it as it is: %s and %zu more"),
-                            comgui::ToWx(done.losses[0].key), done.losses.size() - 1);
+        return wxString::Format(wxPLURAL("Exported: %zu key", "Exported: %zu keys", PluralOf(done.keys)),
+                                done.keys);
+    wxString const first = ShownText(done.losses[0].key);
+    std::size_t const others = done.losses.size() - 1;
+    if (others == 0)
+        return wxString::Format(_("Exported, but the file does not hold all of it as it is: %s"), first);
+    return wxString::Format(
+        wxPLURAL("Exported, but the file does not hold all of it as it is: %s and %zu more",
+                 "Exported, but the file does not hold all of it as it is: %s and %zu more",
+                 PluralOf(others)),
+        first, others);
 }
 
 struct Imported
@@ -110,10 +119,12 @@ wxString SentenceOf(Imported const& done)
     if (done.trouble.index() != 0)
         return TextOf(done.trouble);
     if (done.refused == 0)
-        return wxString::Format(
-            wxPLURAL("Imported: %zu key", "Imported: %zu keys", static_cast<unsigned>(done.keys)), done.keys);
-    return wxString::Format(_("Imported, but %zu keys were refused, the first of them %s"), done.refused,
-                            comgui::ToWx(done.refusedKey));
+        return wxString::Format(wxPLURAL("Imported: %zu key", "Imported: %zu keys", PluralOf(done.keys)),
+                                done.keys);
+    return wxString::Format(wxPLURAL("Imported, but %zu key was refused: %s",
+                                     "Imported, but %zu keys were refused, the first of them %s",
+                                     PluralOf(done.refused)),
+                            done.refused, ShownText(done.refusedKey));
 }
 
 wxString Wildcard()

@@ -1,10 +1,12 @@
 // Failures as values.
 #include "comgui/client/Result.h"
+#include "comgui/client/Value.h"
 
 #include <cstdint>
 #include <fstream>
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
+#include <wx/translation.h>
 #include <iterator>
 #include <vector>
 #include <wx/arrstr.h>
@@ -144,3 +146,44 @@ TEST(ErrorTexts, AreAllInTheTemplateForTranslators)
     EXPECT_THAT(all, HasSubstr("msgid \"the server refuses, with code %d\"\n"));
     EXPECT_THAT(all, testing::Not(HasSubstr("msgid \"a text that no error has\"\n")));
 }
+
+#ifdef COMGUI_CATALOGUES
+class Language : public testing::TestWithParam<char const*>
+{
+protected:
+    void SetUp() override
+    {
+        wxFileTranslationsLoader::AddCatalogLookupPathPrefix(COMGUI_CATALOGUES);
+        auto* const translations = new wxTranslations;
+        wxTranslations::Set(translations);
+        translations->SetLanguage(wxString(GetParam()));
+        ASSERT_TRUE(translations->AddCatalog("comgui"));
+    }
+    void TearDown() override { wxTranslations::Set(nullptr); }
+};
+
+using German = Language;
+
+TEST_P(German, Text_OfAnError_IsTranslated_ButNotItsOtherParts)
+{
+    EXPECT_EQ((Error{107, "admin", {}}).Text(), "admin: Benutzer oder Passwort falsch");
+    EXPECT_EQ((Error{106, {}, "disk full"}).Text(), "der Server kommt nicht an seine Daten (disk full)");
+    EXPECT_EQ((Error{777, {}, {}}).Text(), "der Server lehnt ab, mit Code 777");
+}
+
+TEST_P(German, NamesOfTypes_AreTranslatedByTheProgram)
+{
+    EXPECT_STREQ(NameOf(PARAM_COUNT), "list");
+    EXPECT_EQ(wxGetTranslation(NameOf(PARAM_COUNT), "comgui"), "Liste");
+}
+
+INSTANTIATE_TEST_SUITE_P(Catalogue, German, testing::Values("de"));
+
+TEST_P(Language, HasEachErrorText)
+{
+    for (ERROR_TEXT const* known = ErrorTexts(); known->text; ++known)
+        EXPECT_NE((Error{known->code, {}, {}}).Text(), known->text) << known->code;
+}
+
+INSTANTIATE_TEST_SUITE_P(Catalogues, Language, testing::Values("de", "fr", "ja"));
+#endif
