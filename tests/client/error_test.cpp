@@ -6,7 +6,6 @@
 #include <fstream>
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
-#include <wx/translation.h>
 #include <iterator>
 #include <vector>
 #include <wx/arrstr.h>

@@ -10,10 +10,10 @@
 // turn of the users, which is over then. The next one connects again, and does not notice a break of some 100
 // ms; as long as the server is known to be out of reach, calls fail at once, and those end that wait for it.
 // No other call takes longer than the limits of connecting and of a statement together, unless bytes come and
-// go all the time: a large ticket over a slow line takes its time. A thread of its own looks after the working
-// connection when the bell tells it to, so that a program is soon back that calls nothing, and that the bell is
-// heard meanwhile. Until it is back, others take it for dead and may bury it: it then goes on under its number
-// with its sessions and the notes of its part files, but without the tickets that it owned.
+// go all the time: a large ticket over a slow line takes its time. A thread of its own looks after the
+// working connection when the bell tells it to, so that a program is soon back that calls nothing, and that
+// the bell is heard meanwhile. Until it is back, others take it for dead and may bury it: it then goes on
+// under its number with its sessions and the notes of its part files, but without the tickets that it owned.
 //
 // Who comes back to another site than before, or to a server that has not got all the changes that the
 // program knows of, has done there nothing but look: from then on every operation throws UnusableStore.
