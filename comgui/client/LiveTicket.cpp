@@ -138,16 +138,15 @@ struct LiveTicket::STATE : std::enable_shared_from_this<STATE>
 
     void Heard(TicketChanged const& change)
     {
-        if (change.isWhole)
+        // After a failed read, too: a change needs a ticket that it is one of.
+        if (change.isWhole || (!m_isReading && m_told != 0))
             Read();
         else if (m_isReading && m_late.size() + change.keys.size() > MostLate)
             m_isStale = true;
         else if (m_isReading)
             m_late.insert(m_late.end(), change.keys.begin(), change.keys.end());
-        else if (m_told == 0)
-            TakeAll(change.keys);
         else
-            Read();  // a change needs a ticket that it is one of
+            TakeAll(change.keys);
     }
     void Heard(TicketCreated) { Read(); }
     void Heard(TicketDeleted) { Read(); }

@@ -175,7 +175,9 @@ Error CauseOf(Client const& client, MTICKET_ACCESS const* container, Error error
 {
     if (auto end = EndOf(client, container))
         return *std::move(end);
-    return client.IsServerThere() ? error : Error{ServerAway, {}, {}};
+    if (!client.IsServerThere())
+        return {ServerAway, {}, {}};
+    return error;
 }
 
 Error MissingTicket(Client& client, MTICKET_ACCESS const* container, TicketAddress ticket)
@@ -317,8 +319,8 @@ Result<Value> ReadTyped(Client& client, MTICKET_ACCESS const* container, TicketA
 
 // Whatever lies there, as stored. Another client may change the type between the question and the read, so
 // a read that finds nothing asks again.
-Result<Value> ReadStored(Client& client, MTICKET_ACCESS const* container, TicketAddress ticket, KeyName name,
-                         int pos)
+Result<Value> ReadStored(Client& client, MTICKET_ACCESS const* container, TicketAddress ticket,
+                         KeyName const& name, int pos)
 {
     constexpr int MostTries = 8;
     char const* const key = name;
@@ -343,7 +345,7 @@ public:
     explicit WriteTable(clFOLDER_VARIABLES const* folders) : m_folders(folders) {}
 
     // Adds what the value comes to; false if no ticket can hold it, and then nothing.
-    bool Add(KeyName key, Value const& value, int pos)
+    bool Add(KeyName const& key, Value const& value, int pos)
     {
         auto const* const list = std::get_if<List>(&value);
         if (!key.IsValid() || IsCut(value))
@@ -552,7 +554,7 @@ Result<Snapshot> Tickets::ReadAll(TicketAddress ticket, Paths paths) const
     return Snapshot(std::move(entries));
 }
 
-Result<Value> Tickets::Read(TicketAddress ticket, KeyName key, int pos, Paths paths) const
+Result<Value> Tickets::Read(TicketAddress ticket, KeyName const& key, int pos, Paths paths) const
 {
     MTICKET_ACCESS const* const container = m_client->Container();
     if (!container)
@@ -564,7 +566,7 @@ Result<Value> Tickets::Read(TicketAddress ticket, KeyName key, int pos, Paths pa
 }
 
 template <typename T>
-Result<detail::Readable<T>> Tickets::ReadAs(TicketAddress ticket, KeyName key, int pos) const
+Result<detail::Readable<T>> Tickets::ReadAs(TicketAddress ticket, KeyName const& key, int pos) const
 {
     MTICKET_ACCESS const* const container = m_client->Container();
     if (!container)
@@ -582,7 +584,8 @@ Result<detail::Readable<T>> Tickets::ReadAs(TicketAddress ticket, KeyName key, i
     return as ? as : Error{as.GetError().code, NameOf(ticket, key), {}};
 }
 
-Outcome Tickets::Write(TicketAddress ticket, KeyName key, Value const& value, int pos, Paths paths) const
+Outcome Tickets::Write(TicketAddress ticket, KeyName const& key, Value const& value, int pos,
+                       Paths paths) const
 {
     MTICKET_ACCESS const* const container = m_client->Container();
     if (!container)
@@ -595,7 +598,7 @@ Outcome Tickets::Write(TicketAddress ticket, KeyName key, Value const& value, in
     return table.IsOk(0, size) ? Outcome() : About(ticket, key, RefusedWrite(*m_client, container, ticket));
 }
 
-Outcome Tickets::WriteText(TicketAddress ticket, KeyName key, std::string_view text, int pos) const
+Outcome Tickets::WriteText(TicketAddress ticket, KeyName const& key, std::string_view text, int pos) const
 {
     MTICKET_ACCESS const* const container = m_client->Container();
     if (!container)
@@ -659,9 +662,9 @@ std::string Tickets::Portable(std::string text) const
 
 // NOLINTBEGIN(bugprone-macro-parentheses): T is a type
 #define COMGUI_CLIENT_READ(T)                                                                                \
-    template COMGUI_EXPORT Result<T> Tickets::ReadAs<T>(TicketAddress, KeyName, int) const;                  \
-    template COMGUI_EXPORT Result<std::vector<T>> Tickets::ReadAs<std::vector<T>>(TicketAddress, KeyName,    \
-                                                                                  int) const;
+    template COMGUI_EXPORT Result<T> Tickets::ReadAs<T>(TicketAddress, KeyName const&, int) const;           \
+    template COMGUI_EXPORT Result<std::vector<T>> Tickets::ReadAs<std::vector<T>>(                           \
+        TicketAddress, KeyName const&, int) const;
 COMGUI_CLIENT_READ(int)
 COMGUI_CLIENT_READ(double)
 COMGUI_CLIENT_READ(std::string)

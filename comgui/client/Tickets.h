@@ -84,22 +84,23 @@ public:
     Result<Snapshot> ReadAll(TicketAddress ticket, Paths paths = Paths::Resolved) const;
 
     // pos: WholeKey, or 0 and up one value of a list. Errors: NoSuchTicket, NoSuchKey.
-    Result<Value> Read(TicketAddress ticket, KeyName key, int pos = WholeKey,
+    Result<Value> Read(TicketAddress ticket, KeyName const& key, int pos = WholeKey,
                        Paths paths = Paths::Resolved) const;
 
     // As Value.h's As, with its types. Errors: also WrongType, OutOfRange.
     template <typename T>
-    Result<detail::Readable<T>> ReadAs(TicketAddress ticket, KeyName key, int pos = WholeKey) const;
+    Result<detail::Readable<T>> ReadAs(TicketAddress ticket, KeyName const& key, int pos = WholeKey) const;
 
     // Replaces the key, or one value of a list; std::monostate deletes. The type is the value's, whatever the
     // key had. NotWritable: see ERROR_CODE; also a text or key with a zero byte. Errors: also NoSuchTicket,
     // WriteRefused.
-    Outcome Write(TicketAddress ticket, KeyName key, Value const& value, int pos = WholeKey,
+    Outcome Write(TicketAddress ticket, KeyName const& key, Value const& value, int pos = WholeKey,
                   Paths paths = Paths::Resolved) const;
 
     // What a user has typed, by the type that each value has: see FromText. Errors: also NoSuchKey,
     // NotANumber, OutOfRange, BadList; then nothing is written.
-    Outcome WriteText(TicketAddress ticket, KeyName key, std::string_view text, int pos = WholeKey) const;
+    Outcome WriteText(TicketAddress ticket, KeyName const& key, std::string_view text,
+                      int pos = WholeKey) const;
 
     // Many keys in one table; the outcome of each. The server takes it as one change.
     std::vector<Outcome> WriteAll(TicketAddress ticket, std::vector<KeyValue> const& values,

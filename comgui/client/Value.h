@@ -36,9 +36,9 @@ class COMGUI_EXPORT Value : public std::variant<std::monostate, Pointer, int, do
 {
 public:
     using variant::variant;
-    Value(std::string_view text) : variant(std::string(text)) {}
-    Value(long number) noexcept : variant(static_cast<long long>(number)) {}
-    Value(unsigned long number) noexcept : variant(static_cast<unsigned long long>(number)) {}
+    Value(std::string_view text);
+    Value(long number) noexcept;
+    Value(unsigned long number) noexcept;
 
     PARAM_TYPE Type() const noexcept { return static_cast<PARAM_TYPE>(index()); }  // PARAM_COUNT: a list
     bool IsNone() const noexcept { return Type() == PARAM_NONE; }
@@ -50,6 +50,11 @@ struct Element
     int pos;
     Value value;
 };
+
+// Here, where a list's elements are complete.
+inline Value::Value(std::string_view text) : variant(std::string(text)) {}
+inline Value::Value(long number) noexcept : variant(static_cast<long long>(number)) {}
+inline Value::Value(unsigned long number) noexcept : variant(static_cast<unsigned long long>(number)) {}
 
 COMGUI_EXPORT bool operator==(Pointer left, Pointer right);
 COMGUI_EXPORT bool operator==(Bytes const& left, Bytes const& right);
