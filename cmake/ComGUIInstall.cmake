@@ -20,7 +20,6 @@ set_target_properties(comgui_module PROPERTIES INSTALL_RPATH ${comgui_beside}/..
 
 install(TARGETS comgui comgui_client comgui_host EXPORT comgui-targets
     LIBRARY DESTINATION ${CMAKE_INSTALL_LIBDIR} FILE_SET HEADERS)
-install(FILES comgui/client/comgui.pot DESTINATION ${CMAKE_INSTALL_DATADIR}/comgui)    # for translators
 if(APPLE)
     install(TARGETS comgui_corefoundation EXPORT comgui-targets)    # no more than the system's own
 else()
@@ -40,6 +39,11 @@ if(COMGUI_TOOLS)
     file(RELATIVE_PATH comgui_libraries ${CMAKE_INSTALL_FULL_BINDIR} ${CMAKE_INSTALL_FULL_LIBDIR})
     set_target_properties(ticketstream comgui_site PROPERTIES INSTALL_RPATH ${comgui_beside}/${comgui_libraries})
     install(TARGETS ticketstream comgui_site RUNTIME DESTINATION ${CMAKE_INSTALL_BINDIR})
+endif()
+if(TARGET ticket_desk)
+    file(RELATIVE_PATH comgui_libraries ${CMAKE_INSTALL_FULL_BINDIR} ${CMAKE_INSTALL_FULL_LIBDIR})
+    set_target_properties(ticket_desk PROPERTIES INSTALL_RPATH ${comgui_beside}/${comgui_libraries})
+    install(TARGETS ticket_desk RUNTIME DESTINATION ${CMAKE_INSTALL_BINDIR})
 endif()
 
 # What a consumer's wxWidgets and standard library must have in common with those of this build.

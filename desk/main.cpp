@@ -1,5 +1,6 @@
 // ticket_desk: a window on the tickets of a print server.
 #include "desk/model/ServerName.h"
+#include "desk/model/TicketName.h"
 #include "desk/view/MainFrame.h"
 #include <comgui/client/Text.h>
 #include <iostream>
@@ -17,6 +18,7 @@ void AddOptions(wxCmdLineParser& parser)
     parser.AddOption("", "server", "log in there at once, HOST or HOST:PORT");
     parser.AddOption("", "user", "who logs in (admin)");
     parser.AddOption("", "password", "with it; without one the desk asks");
+    parser.AddOption("", "ticket", "show it at once, as TYPE/ID: 3/1 is job 1");
     parser.AddOption("", "language", "of the window, as de, fr or ja; else that of the system");
 }
 
@@ -35,6 +37,10 @@ public:
         Translate(language);
         SetAppDisplayName(_("Ticket desk"));
         auto* const frame = new desk::MainFrame;
+        wxString ticket;
+        parser.Found("ticket", &ticket);
+        if (auto const first = desk::TicketFromText(comgui::ToUtf8(ticket), comgui::JobTickets))
+            frame->ShowFirst(*first);
         frame->Show();
         frame->CallAfter([this, frame, server = ServerOf(parser), account = AccountOf(parser)]
                          { Begin(*frame, server, account); });

@@ -103,11 +103,29 @@ std::optional<Rgb> ColourOf(comgui::Value const& value)
 void InkCoverage::Take(comgui::Snapshot const& ticket)
 {
     m_parts.clear();
+    TakeLists(ticket);
     auto const& entries = ticket.Entries();
     auto entry = std::ranges::lower_bound(entries, Prefix, {}, &comgui::SnapshotEntry::key);
     for (; entry != entries.end() && entry->key.starts_with(Prefix); ++entry)
         Set(entry->key, entry->value);
     Arrange();
+}
+
+void InkCoverage::TakeLists(comgui::Snapshot const& ticket)
+{
+    comgui::Value const* const names = ticket.Find("Job/Separations");
+    comgui::Value const* const shares = ticket.Find("Job/InkCoverage");
+    if (!names || !shares || !names->IsList() || !shares->IsList())
+        return;
+    auto const& inks = std::get<comgui::List>(*names);
+    for (comgui::Element const& share : std::get<comgui::List>(*shares))
+    {
+        auto const ink = std::ranges::find(inks, share.pos, &comgui::Element::pos);
+        auto const* const name = ink == inks.end() ? nullptr : std::get_if<std::string>(&ink->value);
+        auto const* const part = std::get_if<double>(&share.value);
+        if (name && part)
+            Set(std::string(Prefix) + *name + "/Coverage", *part * 100);
+    }
 }
 
 InkCoverage::Answer InkCoverage::Take(comgui::KeyChange const& change)

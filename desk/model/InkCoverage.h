@@ -5,6 +5,9 @@
 //   is
 //                             applied several times
 //   "Job/Inks/NAME/Colour"    a text, "#RRGGBB"; may be missing
+// Or, as two lists of the same positions; what the keys above say counts more:
+//   "Job/Separations"         texts: the names
+//   "Job/InkCoverage"         doubles: shares of the sheet, 0 to 1; up to 10
 // NAME has 1 to 200 bytes and no slash. Anything else is as if it were not there: a coverage that is
 // negative, above 1000, not a number or a text; a colour of another form. An ink without a coverage is no
 // ink.
@@ -41,7 +44,7 @@ public:
     };
 
     void Take(comgui::Snapshot const& ticket);  // instead of all before
-    Answer Take(comgui::KeyChange const& change);
+    Answer Take(comgui::KeyChange const& change);  // of keys; lists come with a snapshot only
 
     // Process inks first, in the order of printing: Cyan, Magenta, Yellow, Black, Orange, Green, Violet,
     // White, Varnish, in any letter case; then the others by name, bytewise. Valid until the next Take.
@@ -56,6 +59,7 @@ private:
         std::optional<Rgb> colour;
     };
 
+    void TakeLists(comgui::Snapshot const& ticket);
     bool Set(std::string_view key, comgui::Value const& value);
     void Arrange();
 

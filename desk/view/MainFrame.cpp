@@ -152,6 +152,8 @@ void MainFrame::Connect()
             return;
         m_index.Show(type, ids);
         m_tickets->TicketsChanged(type);
+        if (m_first && m_index.IndexOf(*m_first))
+            m_tickets->Choose(*std::exchange(m_first, std::nullopt));
     };
     m_session.onTicket = [this](comgui::TicketAddress ticket, bool isThere)
     {

@@ -41,6 +41,9 @@ public:
     // At once, without a question unless it is refused.
     void LogIn(comgui::Server const& server, comgui::Account const& account);
 
+    // Chosen as soon as there is a login and the ticket is listed.
+    void ShowFirst(comgui::TicketAddress ticket) { m_first = ticket; }
+
 private:
     void MakePanes();
     void MakeMenus();
@@ -92,6 +95,7 @@ private:
     std::optional<SearchRun> m_search;
     std::optional<comgui::LiveTicket> m_live;  // that is shown
     std::vector<comgui::TicketAddress> m_found;
+    std::optional<comgui::TicketAddress> m_first;  // to be chosen once it is listed
     wxTimer m_repaint;
     wxString m_server;  // and user, as the title says them
     wxInfoBar* m_info;

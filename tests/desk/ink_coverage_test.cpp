@@ -47,6 +47,28 @@ class ColourOfValue : public testing::TestWithParam<ColourFact>
 constexpr Rgb Grey{128, 128, 128};
 }  // namespace
 
+TEST(InkCoverage, MayBeTwoLists)
+{
+    comgui::Value const names(comgui::MakeList<std::string>({"Cyan", "Gold", "a/b"}));
+    auto const coverage = Of({{"Job/InkCoverage", comgui::MakeList<double>({0.25, 0.5, 0.5, 0.5})},
+                              {"Job/Inks/Gold/Coverage", 7},
+                              {"Job/Separations", names}});
+    ASSERT_EQ(NamesOf(coverage), (std::vector<std::string>{"Cyan", "Gold"}));
+    EXPECT_EQ(coverage.Inks()[0].coverage, 25);
+    EXPECT_EQ(coverage.Inks()[1].coverage, 7);  // the key counts more
+}
+
+TEST(InkCoverage, OfListsThatAreNone_IsNone)
+{
+    comgui::Value const names(comgui::MakeList<std::string>({"Cyan"}));
+    EXPECT_TRUE(Of({{"Job/InkCoverage", 0.5}, {"Job/Separations", names}}).Inks().empty());
+    EXPECT_TRUE(Of({{"Job/Separations", names}}).Inks().empty());
+    EXPECT_TRUE(
+        Of({{"Job/InkCoverage", comgui::MakeList<int>({1})}, {"Job/Separations", names}}).Inks().empty());
+    EXPECT_TRUE(
+        Of({{"Job/InkCoverage", comgui::MakeList<double>({-1})}, {"Job/Separations", names}}).Inks().empty());
+}
+
 TEST(InkCoverage, ProcessInksComeInTheOrderOfPrintingThenSpotInks)
 {
     auto const coverage = Of({{"Job/Inks/Black/Coverage", 4},

@@ -271,6 +271,13 @@ TEST_F(WindowOfTheDesk, SaysWhyAValueIsRefused)
     EXPECT_EQ(ValueOf("Copies"), "3");
 }
 
+TEST_F(WindowOfTheDesk, ShowsTheTicketThatItWasBegunWith)
+{
+    frame->ShowFirst(System);
+    frame->LogIn(Here(), Admin());
+    EXPECT_TRUE(Await([this] { return heading() == "System 0/0" && keys.Count() > 0; }));
+}
+
 TEST_F(WindowOfTheDesk, FindsTickets)
 {
     Enter();
