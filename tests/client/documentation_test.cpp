@@ -8,6 +8,7 @@
 #include <fstream>
 #include <gmock/gmock.h>
 #include <thread>
+#include <wx/app.h>
 #include <wx/event.h>
 #include <wx/init.h>
 
@@ -207,12 +208,12 @@ TEST_F(SnippetsOfTheClientKit, HearOfChanges_InAWindow)
 {
     wxInitializer const wxWidgets;
     TicketAddress const job = Job();
-    JobPanel panel(connection);
+    JobPanel const panel(connection);
     ASSERT_TRUE(tickets.Write(job, "Job/Copies", 13));
     WaitFor(1,
-            [&panel]
+            []
             {
-                panel.ProcessPendingEvents();
+                wxTheApp->ProcessPendingEvents();  // a handler's own is only for one that has some
                 std::this_thread::sleep_for(1ms);
             });
     EXPECT_THAT(shown, ElementsAre("Job/Copies is now 13"));
