@@ -43,7 +43,7 @@ public:
         ToBeRead,  // the change has no value: read the key, and tell it again
     };
 
-    void Take(comgui::Snapshot const& ticket);  // instead of all before
+    void Take(comgui::Snapshot const& ticket);     // instead of all before
     Answer Take(comgui::KeyChange const& change);  // of keys; lists come with a snapshot only
 
     // Process inks first, in the order of printing: Cyan, Magenta, Yellow, Black, Orange, Green, Violet,
