@@ -42,7 +42,7 @@ public:
         if (auto const first = desk::TicketFromText(comgui::ToUtf8(ticket), comgui::JobTickets))
             frame->ShowFirst(*first);
         frame->Show();
-        frame->CallAfter([this, frame, server = ServerOf(parser), account = AccountOf(parser)]
+        frame->CallAfter([frame, server = ServerOf(parser), account = AccountOf(parser)]
                          { Begin(*frame, server, account); });
         return true;
     }
