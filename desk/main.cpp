@@ -22,6 +22,8 @@ void AddOptions(wxCmdLineParser& parser)
     parser.AddOption("", "language", "of the window, as de, fr or ja; else that of the system");
 }
 
+}  // namespace
+
 class TicketDesk : public wxApp
 {
 public:
@@ -89,7 +91,6 @@ private:
             translations->AddCatalog(domain);
     }
 };
-}  // namespace
 
 wxIMPLEMENT_APP_NO_MAIN(TicketDesk);
 

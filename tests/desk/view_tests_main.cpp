@@ -3,8 +3,6 @@
 #include <wx/app.h>
 #include <wx/evtloop.h>
 
-namespace
-{
 class App : public wxApp
 {
 public:
@@ -16,7 +14,6 @@ public:
         return RUN_ALL_TESTS();
     }
 };
-}  // namespace
 
 wxIMPLEMENT_APP_NO_MAIN(App);
 
