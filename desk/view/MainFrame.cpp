@@ -50,7 +50,12 @@ MainFrame::MainFrame()
     Take(DeskSession::State::LoggedOut, {});
 }
 
-MainFrame::~MainFrame() { m_settings.Keep(*this, WindowName); }
+// Panes look at the models to their end.
+MainFrame::~MainFrame()
+{
+    m_settings.Keep(*this, WindowName);
+    DestroyChildren();
+}
 
 void MainFrame::MakePanes()
 {
