@@ -4,6 +4,7 @@
 #include "desk/model/TextMatch.h"
 #include "desk/view/NumberText.h"
 #include "desk/view/Theme.h"
+#include <algorithm>
 #include <comgui/client/Text.h>
 #include <wx/datetime.h>
 #include <wx/intl.h>
@@ -28,17 +29,18 @@ wxString TicketOf(EventRow const& row)
     return row.id ? wxString::Format("%d/%d", *row.type, *row.id) : wxString::Format("%d/*", *row.type);
 }
 
+unsigned FormOf(long long count) { return PluralOf(static_cast<std::uint64_t>(std::max(count, 0LL))); }
+
 wxString TextOf(EventRow const& row)
 {
     if (row.kind == EventKind::MoreKeys)
-        return wxString::Format(wxPLURAL("and %lld more key", "and %lld more keys", PluralOf(row.count)),
+        return wxString::Format(wxPLURAL("and %lld more key", "and %lld more keys", FormOf(row.count)),
                                 row.count);
     if (row.kind == EventKind::TransferProgressed)
         return row.total
-                   ? wxString::Format(
-                         wxPLURAL("%lld of %lld byte", "%lld of %lld bytes", PluralOf(*row.total)), row.count,
-                         *row.total)
-                   : wxString::Format(wxPLURAL("%lld byte", "%lld bytes", PluralOf(row.count)), row.count);
+                   ? wxString::Format(wxPLURAL("%lld of %lld byte", "%lld of %lld bytes", FormOf(*row.total)),
+                                      row.count, *row.total)
+                   : wxString::Format(wxPLURAL("%lld byte", "%lld bytes", FormOf(row.count)), row.count);
     if (row.kind == EventKind::TransferEnded && row.job)
         return wxString::Format(_("job %d"), *row.job);
     return comgui::ToWx(row.text);

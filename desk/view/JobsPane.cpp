@@ -222,7 +222,7 @@ void JobsPane::Choose(RowNumber number)
     if (!index)
         return;
     m_chosen = number;
-    m_list->Select(static_cast<unsigned>(*index));
+    m_list->SelectRow(static_cast<unsigned>(*index));
     ShowChosen();
 }
 

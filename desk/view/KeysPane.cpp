@@ -137,7 +137,7 @@ void KeysPane::Choose(std::string const& key)
 {
     Replace(m_outline.Reveal(key));
     if (auto const row = m_outline.RowOf(key))
-        m_list->Select(static_cast<unsigned>(*row));
+        m_list->SelectRow(static_cast<unsigned>(*row));
 }
 
 void KeysPane::EditChosen()
@@ -232,9 +232,9 @@ void KeysPane::Move(wxKeyEvent& event)
     if (shown.isBranch && shown.isOpen != isRight)
         return Toggle(*row);
     if (isRight && shown.isBranch)
-        m_list->Select(*row + 1);
+        m_list->SelectRow(*row + 1);
     else if (auto const parent = m_outline.ParentRow(*row); !isRight && parent)
-        m_list->Select(static_cast<unsigned>(*parent));
+        m_list->SelectRow(static_cast<unsigned>(*parent));
 }
 
 void KeysPane::Fade()

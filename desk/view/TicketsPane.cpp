@@ -176,7 +176,7 @@ void TicketsPane::Choose(comgui::TicketAddress ticket)
         ChooseType(ticket.type);
     m_chosen = ticket;
     if (auto const row = RowOf(ticket))
-        m_tickets->Select(*row);
+        m_tickets->SelectRow(*row);
     onChoose(ticket);
 }
 
@@ -196,7 +196,7 @@ void TicketsPane::SelectType()
     auto const place = std::find(m_shownTypes.begin(), m_shownTypes.end(), *m_type);
     auto const row = static_cast<unsigned>(place - m_shownTypes.begin());
     if (place != m_shownTypes.end() && m_types->Selected() != row)
-        m_types->Select(row);
+        m_types->SelectRow(row);
 }
 
 // The chosen ticket stays chosen, wherever it is now.
@@ -205,7 +205,7 @@ void TicketsPane::ResetTickets()
     m_tickets->UnselectAll();
     m_tickets->Reset();
     if (auto const row = m_chosen ? RowOf(*m_chosen) : std::nullopt)
-        m_tickets->Select(*row);
+        m_tickets->SelectRow(*row);
 }
 
 comgui::TicketAddress TicketsPane::TicketAt(unsigned row) const

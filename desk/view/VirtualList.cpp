@@ -66,7 +66,7 @@ void VirtualList::Reset()
     auto const selected = Selected();
     m_model->Reset(m_source.RowCount());
     if (selected && *selected < m_source.RowCount())
-        Select(*selected);
+        SelectRow(*selected);
 }
 
 void VirtualList::RowChanged(unsigned row) { m_model->RowChanged(row); }
@@ -95,10 +95,10 @@ std::optional<unsigned> VirtualList::Selected() const
     return item.IsOk() ? std::optional(m_model->GetRow(item)) : std::nullopt;
 }
 
-void VirtualList::Select(unsigned row)
+void VirtualList::SelectRow(unsigned row)
 {
     UnselectAll();
-    wxDataViewCtrl::Select(ItemOf(row));
+    Select(ItemOf(row));
     SetCurrentItem(ItemOf(row));
     EnsureVisible(ItemOf(row));
 }

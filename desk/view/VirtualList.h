@@ -50,7 +50,7 @@ public:
 
     unsigned RowOf(wxDataViewItem const& item) const;
     std::optional<unsigned> Selected() const;
-    void Select(unsigned row);
+    void SelectRow(unsigned row);
     void ShowRow(unsigned row);  // scrolls to it
     void StartEditing(unsigned row, unsigned column);
     wxRect CellOf(unsigned row, unsigned column) const;

@@ -83,7 +83,7 @@ public:
     }
     void Select(unsigned row) const
     {
-        m_list->Select(row);
+        m_list->SelectRow(row);
         wxDataViewEvent event(wxEVT_DATAVIEW_SELECTION_CHANGED, m_list, Model().GetItem(row));
         m_list->ProcessWindowEvent(event);
     }
