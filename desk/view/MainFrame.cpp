@@ -493,7 +493,8 @@ void MainFrame::FocusNextPane()
     auto const* const current = std::find_if(
         std::begin(panes), std::end(panes),
         [focus](wxWindow const* pane) { return focus && pane->IsDescendant(const_cast<wxWindow*>(focus)); });
-    std::size_t const next = current == std::end(panes) ? 0 : (current - panes + 1) % std::size(panes);
+    std::size_t const next =
+        current == std::end(panes) ? 0 : static_cast<std::size_t>(current - panes + 1) % std::size(panes);
     panes[next]->SetFocus();
 }
 
