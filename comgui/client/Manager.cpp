@@ -43,11 +43,12 @@ Result<std::unique_ptr<ComGUIManager>> OpenManager()
         first = std::make_unique<ComGUIManager>();
         if (!hSTicketInstance)
             return NoPlugInThere();
-        ticketFactory = hSTicketInstance;
     }
     if (!CanOpenPlugIn(*first))
         return NoPlugInThere();
-    return std::make_unique<ComGUIManager>();
+    auto manager = std::make_unique<ComGUIManager>();
+    ticketFactory = hSTicketInstance;
+    return manager;
 }
 
 void ForgetPassword(TLogin& record)
