@@ -17,6 +17,7 @@ using Clock = std::chrono::steady_clock;
 
 constexpr std::size_t NameLength = 400;   // characters in a cell
 constexpr std::size_t ValueLength = 300;  // likewise
+constexpr std::size_t FewKeys = 100;      // shown with all branches open
 constexpr std::size_t ManyChanges = 200;  // taken as a whole
 constexpr int FadingStep = 100;           // milliseconds
 
@@ -94,6 +95,8 @@ void KeysPane::Take(comgui::Snapshot const& ticket,
     {
         m_content.Show(ticket, now);
         m_outline.Show(m_content.Keys());
+        if (m_isNew && m_content.Size() <= FewKeys)
+            m_outline.OpenAll();
         m_list->Reset();
         m_isNew = false;
     }

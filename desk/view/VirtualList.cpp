@@ -85,7 +85,17 @@ void VirtualList::RowsReplaced(std::size_t row, std::size_t removed, std::size_t
         RowInserted(first + static_cast<unsigned>(i));
 }
 
-void VirtualList::RowsLookDifferent() { Refresh(); }
+// wxGTK asks for cells again only where it is told that a row has changed.
+void VirtualList::RowsLookDifferent()
+{
+    wxDataViewItem const top = GetTopItem();
+    if (!top.IsOk())
+        return;
+    unsigned const first = m_model->GetRow(top);
+    unsigned const end = std::min(m_source.RowCount(), first + static_cast<unsigned>(GetCountPerPage()) + 2);
+    for (unsigned row = first; row < end; ++row)
+        RowChanged(row);
+}
 
 unsigned VirtualList::RowOf(wxDataViewItem const& item) const { return m_model->GetRow(item); }
 

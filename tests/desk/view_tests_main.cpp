@@ -20,5 +20,5 @@ wxIMPLEMENT_APP_NO_MAIN(App);
 int main(int argc, char** argv)
 {
     testing::InitGoogleTest(&argc, argv);
-    return wxEntry(argc, argv);
+    return testing::GTEST_FLAG(list_tests) ? RUN_ALL_TESTS() : wxEntry(argc, argv);
 }
