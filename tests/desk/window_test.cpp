@@ -11,6 +11,7 @@
 #include <algorithm>
 #include <chrono>
 #include <dlfcn.h>
+#include <filesystem>
 #include <fstream>
 #include <gmock/gmock.h>
 #include <wx/app.h>
@@ -312,26 +313,29 @@ TEST_F(WindowOfTheDesk, SendsAJob_AndCancelsAnother)
 {
     Enter();
     std::string const small = folder.Write("small.pdf", std::string(1000, 'x')).string();
-    std::ofstream(folder / "large.pdf").seekp(2'000'000'000) << "x";
+    {
+        std::ofstream large(folder / "large", std::ios::binary);
+        for (int megabytes = 0; megabytes < 300; ++megabytes)
+            large << std::string(1 << 20, 'x');
+    }
     auto* const pane = dynamic_cast<JobsPane*>(Find<wxWindow>("jobs")->GetParent());
     ASSERT_NE(pane, nullptr);
     pane->askOptions = [](auto const&) { return comgui::JobOptions(); };
     pane->Send({small});
     EXPECT_TRUE(Await([this] { return jobs.RowOf(2, "Arrived").has_value(); }));
-    for (int tries = 0; tries < 20 && !jobs.RowOf(2, "Cancelled"); ++tries)
+    for (int tries = 0; tries < 20 && !jobs.RowOf(2, "Cancelled"); ++tries)  // some may be faster
     {
-        unsigned const before = jobs.Count();
-        pane->Send({(folder / "large.pdf").string()});
-        ASSERT_TRUE(Await([&] { return jobs.Count() > before; }));
-        auto const underWay = [this]
-        {
-            auto const row = jobs.RowOf(2, "Sending");
-            return row ? row : jobs.RowOf(2, "Waiting");
-        };
-        if (auto const row = underWay())
-            jobs.Select(*row);
+        std::string const name = "large" + std::to_string(tries) + ".pdf";
+        std::filesystem::create_hard_link(folder / "large", folder / name);
+        pane->Send({(folder / name).string()});
+        ASSERT_TRUE(Await([&] { return Choose(jobs, 0, name); }));
         pane->Cancel();
-        ASSERT_TRUE(Await([&] { return !underWay(); })) << testing::PrintToString(jobs.Column(2));
+        auto const isOver = [&]
+        {
+            std::string const state = jobs.Cell(*jobs.RowOf(0, name), 2);
+            return state == "Cancelled" || state == "Arrived";
+        };
+        ASSERT_TRUE(Await(isOver));
     }
     EXPECT_TRUE(jobs.RowOf(2, "Cancelled")) << testing::PrintToString(jobs.Column(2));
 }
