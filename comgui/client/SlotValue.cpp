@@ -1,5 +1,7 @@
 #include "comgui/client/SlotValue.h"
 
+#include <new>
+
 #include <type_traits>
 
 namespace comgui::detail
@@ -23,6 +25,8 @@ Value ValueOf(PARAM_TYPE type, void const* word)
     case PARAM_BINSTRING:
     {
         auto const& bytes = *static_cast<BIN_STRING const*>(word);
+        if (bytes.size > std::string().max_size())
+            throw std::bad_alloc();  // nor may its end be computed
         return bytes.data ? Bytes{{static_cast<char const*>(bytes.data), bytes.size}} : Bytes{};
     }
     case PARAM_INT64:
