@@ -1,7 +1,6 @@
 #include "comgui/client/SlotValue.h"
 
-#include <new>
-
+#include <stdexcept>
 #include <type_traits>
 
 namespace comgui::detail
@@ -26,7 +25,7 @@ Value ValueOf(PARAM_TYPE type, void const* word)
     {
         auto const& bytes = *static_cast<BIN_STRING const*>(word);
         if (bytes.size > std::string().max_size())
-            throw std::bad_alloc();  // nor may its end be computed
+            throw std::length_error("a value");  // before its end is computed, which is past all memory
         return bytes.data ? Bytes{{static_cast<char const*>(bytes.data), bytes.size}} : Bytes{};
     }
     case PARAM_INT64:
