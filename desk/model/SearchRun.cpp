@@ -9,9 +9,9 @@ constexpr std::size_t TicketsInAStep = 50;
 
 struct SearchRun::STATE : std::enable_shared_from_this<STATE>
 {
-    STATE(comgui::Worker const& of, SearchQuery query, std::vector<comgui::TicketAddress> const& all,
+    STATE(comgui::Worker const& of, SearchQuery const& query, std::vector<comgui::TicketAddress> const& all,
           SearchReader reader, Handler found)
-        : worker(of), search(std::move(query), all, std::move(reader)), handler(std::move(found))
+        : worker(of), search(query, all, std::move(reader)), handler(std::move(found))
     {
     }
 
@@ -35,7 +35,7 @@ struct SearchRun::STATE : std::enable_shared_from_this<STATE>
     bool isOver = false;
 };
 
-SearchRun::SearchRun(comgui::Worker const& worker, comgui::Tickets const& tickets, SearchQuery query,
+SearchRun::SearchRun(comgui::Worker const& worker, comgui::Tickets const& tickets, SearchQuery const& query,
                      std::vector<comgui::TicketAddress> const& all, Handler handler)
     : m_state(std::make_shared<STATE>(
           worker, std::move(query), all,

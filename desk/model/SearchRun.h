@@ -15,7 +15,7 @@ public:
     using Handler = std::function<void(SearchBatch const&)>;
 
     // The handler is called on the thread of the worker's results. The worker outlives the run.
-    SearchRun(comgui::Worker const& worker, comgui::Tickets const& tickets, SearchQuery query,
+    SearchRun(comgui::Worker const& worker, comgui::Tickets const& tickets, SearchQuery const& query,
               std::vector<comgui::TicketAddress> const& all, Handler handler);
     ~SearchRun();  // no call of the handler comes any more
     SearchRun(SearchRun const&) = delete;

@@ -110,6 +110,7 @@ void TicketEditor::WriteStep(std::vector<EditWrite> const& writes)
     auto const write = [tickets = m_tickets, writes]
     {
         std::vector<comgui::Outcome> outcomes;
+        outcomes.reserve(writes.size());
         for (EditWrite const& each : writes)
             outcomes.push_back(
                 tickets.Write(each.ticket, each.key, each.value, comgui::WholeKey, comgui::Paths::AsStored));
@@ -119,6 +120,7 @@ void TicketEditor::WriteStep(std::vector<EditWrite> const& writes)
              [this, writes](std::vector<comgui::Outcome> const& outcomes)
              {
                  std::vector<bool> written;
+                 written.reserve(outcomes.size());
                  for (comgui::Outcome const& outcome : outcomes)
                      written.push_back(outcome.IsGood());
                  m_history.Settle(written);
