@@ -38,7 +38,7 @@ struct SearchRun::STATE : std::enable_shared_from_this<STATE>
 SearchRun::SearchRun(comgui::Worker const& worker, comgui::Tickets const& tickets, SearchQuery const& query,
                      std::vector<comgui::TicketAddress> const& all, Handler handler)
     : m_state(std::make_shared<STATE>(
-          worker, std::move(query), all,
+          worker, query, all,
           [tickets](comgui::TicketAddress ticket)
           { return tickets.ReadAll(ticket, comgui::Paths::AsStored); },
           std::move(handler)))
