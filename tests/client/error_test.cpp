@@ -9,6 +9,7 @@
 #include <iterator>
 #include <vector>
 #include <wx/arrstr.h>
+#include <wx/init.h>
 #include <wx/translation.h>
 
 using namespace comgui;
@@ -152,13 +153,21 @@ class Language : public testing::TestWithParam<char const*>
 protected:
     void SetUp() override
     {
-        wxFileTranslationsLoader::AddCatalogLookupPathPrefix(COMGUI_CATALOGUES);
+        wxString const catalogues = COMGUI_CATALOGUES;
+        wxString const language = GetParam();
+        // [translations]
+        wxFileTranslationsLoader::AddCatalogLookupPathPrefix(catalogues);  // the folder share/locale
         auto* const translations = new wxTranslations;
         wxTranslations::Set(translations);
-        translations->SetLanguage(wxString(GetParam()));
-        ASSERT_TRUE(translations->AddCatalog("comgui"));
+        translations->SetLanguage(language);  // "de"; without this call: what the system is set to
+        translations->AddCatalog("comgui");
+        // [/translations]
+        ASSERT_TRUE(translations->IsLoaded("comgui"));
     }
     void TearDown() override { wxTranslations::Set(nullptr); }
+
+private:
+    wxInitializer m_wxWidgets;  // catalogues are looked for beside the program, which wxWidgets has to know
 };
 
 using German = Language;
