@@ -1,6 +1,5 @@
 #include "comgui/client/Client.h"
 
-#include "comgui/access/MTICKET_ADMIN.h"
 #include "comgui/client/TransferPool.h"
 #include "comgui/foundation/stracpy.h"
 #include "comgui/session/TCommandRecord.h"
@@ -15,6 +14,7 @@ namespace
 constexpr int Stamp = 20261122;  // the kit's mark of its sessions; the plug-in only carries it
 constexpr int NotReachable = -2005;
 constexpr std::chrono::seconds LookInterval(1);
+constexpr std::chrono::milliseconds SwitchPatience(250);  // about what a user does not notice
 
 template <std::size_t Size>
 void Assign(char (&field)[Size], std::string const& text)
@@ -150,7 +150,7 @@ Result<User> Client::LogIn(Server const& server, Account const& account)
         m_record->szUser, {UserTickets, m_record->iClientStamp}, m_manager->IsCurrentUserAdmin(m_record)};
     lock.unlock();
 
-    SwitchNotifications();
+    m_switch.Switch();
     m_nextEntry = {};
     m_entryPause = std::chrono::seconds(1);
     try
@@ -207,11 +207,8 @@ Outcome Client::Enter(ComGUIManager& ender)
         ender.Logout(m_record);
         return outcome;
     }
-    // Together: the number is worth something to this container alone.
-    std::lock_guard const lock(m_interests);
+    m_switch.BeginSession(container, m_record->iGUINotificationID);
     m_container = container;
-    m_notification = m_record->iGUINotificationID;
-    m_enabled.clear();
     m_isServerThere = true;
     std::lock_guard const copying(m_copying);
     m_copy = *m_record;
@@ -257,11 +254,7 @@ Outcome Client::LogOut()
 void Client::Leave()
 {
     std::lock_guard const lock(m_calls);
-    {
-        std::lock_guard const interests(m_interests);
-        m_notification = -1;
-        m_enabled.clear();
-    }
+    m_switch.EndSession();
     m_hub->LeaveServer();
     m_manager->Logout(m_record);
     m_container = nullptr;  // the watch may have logged in anew in the middle of a logout
@@ -276,6 +269,7 @@ void Client::Leave()
 void Client::End()
 {
     (void)LogOut();
+    m_switch.Stop();
     m_pool->Stop();
     m_hub->Stop();
 }
@@ -353,79 +347,10 @@ std::shared_ptr<Subscriber> Client::Subscribe(Interest interest, Executor execut
     subscriber->onEnd = [weak = weak_from_this()]
     {
         if (auto const client = weak.lock())
-            client->SwitchNotifications();
+            client->m_switch.SwitchAside(std::chrono::milliseconds(0));
     };
-    SwitchNotifications();
+    m_switch.SwitchAside(SwitchPatience);
     return subscriber;
-}
-
-namespace
-{
-// By ticket, or by type with TICKET_ID_ALL: the keys that somebody wants; none stands for all keys.
-std::map<TicketAddress, std::set<std::string>> UnionOf(std::vector<Interest> const& interests)
-{
-    std::map<TicketAddress, std::set<std::string>> wanted;
-    auto const add = [&wanted](TicketAddress ticket, Interest const& interest)
-    {
-        auto const [place, isNew] = wanted.try_emplace(ticket, interest.keys.begin(), interest.keys.end());
-        if (isNew)
-            return;
-        if (interest.keys.empty())
-            place->second.clear();
-        else if (!place->second.empty())
-            place->second.insert(interest.keys.begin(), interest.keys.end());
-    };
-    for (Interest const& interest : interests)
-    {
-        for (int const type : interest.types)
-            add({type, TICKET_ID_ALL}, interest);
-        for (TicketAddress const ticket : interest.tickets)
-            add(ticket, interest);
-    }
-    return wanted;
-}
-}  // namespace
-
-// Brings what the plug-in reports in line with what subscribers want. Too much does no harm: the hub looks
-// anew.
-void Client::SwitchNotifications()
-{
-    std::lock_guard const lock(m_interests);
-    MTICKET_ACCESS const* const container = Container();
-    if (!container || m_notification == -1)
-        return;
-    auto const* const admin = MTICKET_ADMIN::Of(container);
-    auto wanted = UnionOf(m_hub->Interests());
-    for (auto known = m_enabled.begin(); known != m_enabled.end();)
-    {
-        TicketAddress const address = known->first;
-        if (wanted.count(address) != 0)
-        {
-            ++known;
-            continue;
-        }
-        admin->DisableNotification(address.type, address.id, m_notification);
-        known = m_enabled.erase(known);
-        if (address.id != TICKET_ID_ALL)
-            continue;
-        // Single tickets of the type went with it.
-        known = m_enabled.erase(m_enabled.lower_bound({address.type, TICKET_ID_ALL}),
-                                m_enabled.lower_bound({address.type + 1, TICKET_ID_ALL}));
-    }
-    for (auto& [address, keys] : wanted)
-    {
-        auto const known = m_enabled.find(address);
-        if (known != m_enabled.end() && known->second == keys)
-            continue;
-        if (IsWatchOver())
-            return;  // a logout
-        std::vector<char const*> table;
-        for (std::string const& key : keys)
-            table.push_back(key.c_str());
-        table.push_back(nullptr);
-        if (admin->EnableNotification(address.type, address.id, m_notification, table.data()))
-            m_enabled[address] = std::move(keys);
-    }
 }
 
 void Client::StopWatching()
@@ -435,6 +360,7 @@ void Client::StopWatching()
         m_isWatchOver = true;
         m_watchEnds.notify_all();
     }
+    m_switch.Interrupt();
     if (m_watch.joinable())
         m_watch.join();
 }
@@ -530,7 +456,8 @@ std::optional<Outcome> Client::EnterAgain(ComGUIManager& watcher)
             return entered;
     }
     m_entryPause = std::chrono::seconds(1);
-    SwitchNotifications();
+    if (!IsWatchOver())  // else a logout waits
+        m_switch.Switch();
     return Outcome();
 }
 }  // namespace comgui::detail

@@ -1,22 +1,21 @@
 // What a connection and its handles share: the session, and what goes on beside it. For any thread.
 //
 // Locks, in the order in which they are taken: m_lifecycle for whole logins and logouts, m_calls for the
-// manager, m_interests for what is switched on, m_copying and m_watching. Handlers and executors are called
+// manager, those of m_switch, m_copying and m_watching. Handlers and executors are called
 // under none of them.
 #pragma once
 
 #include "comgui/client/Connection.h"
 #include "comgui/client/EventHub.h"
 #include "comgui/client/Manager.h"
+#include "comgui/client/NotificationSwitch.h"
 #include "comgui/client/SharedManager.h"
 #include "comgui/session/TLogin.h"
 #include "comgui/ticket/MTICKET_ACCESS.h"
 #include <atomic>
 #include <condition_variable>
-#include <map>
 #include <mutex>
 #include <optional>
-#include <set>
 #include <thread>
 
 namespace comgui::detail
@@ -71,7 +70,6 @@ private:
     Outcome Enter(ComGUIManager& ender);
     Outcome Register();
     void Leave();
-    void SwitchNotifications();
     void StopWatching();
     bool IsWatchOver() const;
     void Watch();
@@ -82,6 +80,7 @@ private:
 
     std::shared_ptr<EventHub> const m_hub = std::make_shared<EventHub>();
     std::shared_ptr<TransferPool> m_pool;
+    NotificationSwitch m_switch{*m_hub};
     SharedManager m_tester;   // for servers that are only tested
     SharedManager m_watcher;  // for the watch
     SharedManager m_helper;   // for reasons
@@ -98,10 +97,6 @@ private:
 
     mutable std::mutex m_copying;    // the member below
     std::optional<TLogin> m_copy{};  // of the session's record, for those who must not wait for a login
-
-    std::mutex m_interests;  // the members below
-    std::map<TicketAddress, std::set<std::string>> m_enabled;
-    int m_notification = -1;
 
     mutable std::mutex m_watching;  // the members below
     std::condition_variable m_watchEnds;

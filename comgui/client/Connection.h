@@ -83,8 +83,10 @@ public:
     // called are merged: by key for each ticket, the latest value counts. interval: the least time between
     // two deliveries, for instance between two repaints; the first event after a pause comes at once.
     // What the handler throws reaches whoever runs the executor's tasks; later events still come.
-    // Asks the plug-in to report it, and so does the end of the subscription. Throws std::system_error if the
-    // kit cannot start its thread.
+    // The plug-in is asked to report it on a thread of the kit's, and waited for, but no longer than a
+    // quarter of a second. One that takes longer costs no change: as soon as it reports, a TicketChanged with
+    // isWhole comes for each ticket of the interest, and a ManyTicketsChanged for each type. Throws
+    // std::system_error if the kit cannot start its threads.
     [[nodiscard]] Subscription Subscribe(Interest interest, Executor executor, Subscription::Handler handler,
                                          std::chrono::milliseconds interval = std::chrono::milliseconds(20));
 

@@ -120,6 +120,15 @@ void EventHub::Publish(Event const& event)
     m_work.notify_all();
 }
 
+void EventHub::PublishUnheard(std::set<TicketAddress> const& tickets)
+{
+    std::lock_guard const lock(m_lock);
+    for (auto const& subscriber : m_subscribers)
+        for (TicketAddress const ticket : tickets)
+            subscriber->m_pending.AddUnheard(subscriber->m_interest, ticket);
+    m_work.notify_all();
+}
+
 std::shared_ptr<Subscriber> EventHub::Add(Interest interest, Executor executor, Subscription::Handler handler,
                                           std::chrono::milliseconds interval)
 {

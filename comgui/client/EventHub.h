@@ -12,6 +12,7 @@
 #include <condition_variable>
 #include <map>
 #include <mutex>
+#include <set>
 #include <thread>
 
 namespace comgui::detail
@@ -45,6 +46,9 @@ public:
 
     // To all subscribers, or to those that want transfers.
     void Publish(Event const& event);
+
+    // These tickets, or types by TICKET_ID_ALL, may have changed unheard: told to those that want them.
+    void PublishUnheard(std::set<TicketAddress> const& tickets);
 
     // Begins no delivery any more. When it returns, the hub's thread is over, and no handler runs, unless it
     // is the one that calls this.

@@ -1,6 +1,7 @@
 #include "comgui/client/PendingEvents.h"
 
 #include "comgui/client/SlotValue.h"
+#include "comgui/ticket/TICKET_ID.h"
 #include <algorithm>
 
 namespace comgui::detail
@@ -15,10 +16,15 @@ bool Matches(std::string_view key, std::string_view pattern)
     return key.substr(0, pattern.size()) == pattern;
 }
 
+template <typename Element>
+bool Contains(std::vector<Element> const& elements, Element const& element)
+{
+    return std::find(elements.begin(), elements.end(), element) != elements.end();
+}
+
 bool Wants(Interest const& interest, TicketAddress ticket)
 {
-    return std::find(interest.types.begin(), interest.types.end(), ticket.type) != interest.types.end() ||
-           std::find(interest.tickets.begin(), interest.tickets.end(), ticket) != interest.tickets.end();
+    return Contains(interest.types, ticket.type) || Contains(interest.tickets, ticket);
 }
 
 bool Wants(Interest const& interest, std::string_view key)
@@ -82,12 +88,10 @@ std::vector<KeyChange> ChangesOf(SETMULTIPAR const* records)
 
 void PendingEvents::Add(Interest const& interest, TicketEvent const& event)
 {
-    if (!Wants(interest, event.ticket) || m_crowds.count(event.ticket.type) != 0)
+    TICKET* const place = Wants(interest, event.ticket) ? Place(event.ticket) : nullptr;
+    if (!place)
         return;
-    auto const [place, isNew] = m_places.try_emplace(event.ticket, m_tickets.size());
-    if (isNew)
-        m_tickets.push_back({event.ticket});
-    TICKET& ticket = m_tickets[place->second];
+    TICKET& ticket = *place;
     switch (event.kind)
     {
     case TicketEvent::Changed:
@@ -107,6 +111,30 @@ void PendingEvents::Add(Interest const& interest, TicketEvent const& event)
     }
     if (m_tickets.size() > MostTickets)
         Collapse(event.ticket.type);
+}
+
+void PendingEvents::AddUnheard(Interest const& interest, TicketAddress ticket)
+{
+    if (ticket.id == TICKET_ID_ALL)
+    {
+        if (Contains(interest.types, ticket.type))
+            Collapse(ticket.type);
+    }
+    else if (TICKET* const place = Contains(interest.tickets, ticket) ? Place(ticket) : nullptr)
+    {
+        DropKeys(*place);
+        place->isWhole = true;
+    }
+}
+
+PendingEvents::TICKET* PendingEvents::Place(TicketAddress ticket)
+{
+    if (m_crowds.count(ticket.type) != 0)
+        return nullptr;
+    auto const [place, isNew] = m_places.try_emplace(ticket, m_tickets.size());
+    if (isNew)
+        m_tickets.push_back({ticket});
+    return &m_tickets[place->second];
 }
 
 void PendingEvents::AddChange(TICKET& ticket, KeyChange const& change)

@@ -41,6 +41,9 @@ public:
     void Add(Interest const& interest, TicketEvent const& event);
     void Add(Interest const& interest, Event const& event);  // of the server and of transfers
 
+    // Something may have happened to the ticket, or to any of the type: TICKET_ID_ALL.
+    void AddUnheard(Interest const& interest, TicketAddress ticket);
+
     bool IsEmpty() const;
     void DropTickets();
     void DropServer() { m_server.clear(), m_isNewSession = false; }
@@ -58,6 +61,7 @@ private:
         std::map<std::string, std::optional<Value>> keys{};  // at last
     };
 
+    TICKET* Place(TicketAddress ticket);  // null: in a crowd
     void AddChange(TICKET& ticket, KeyChange const& change);
     void DropKeys(TICKET& ticket);
     void Collapse(int type);

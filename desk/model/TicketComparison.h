@@ -75,8 +75,8 @@ public:
 
     std::size_t Count(RowState state) const { return m_counts[static_cast<std::size_t>(state)]; }
 
-    // One side has changed; none: it lacks the key from now on. Takes O(log n), and moves addresses of rows
-    // where one comes or goes.
+    // One side has changed; none: it lacks the key from now on. Found in O(log n); where a row comes or
+    // goes, the pointers to those behind it move.
     RowChange Update(Side side, std::string_view key, std::optional<comgui::Value> value);
 
     // Many changes of one side at once; std::monostate: it lacks the key. All rows that are shown may change.

@@ -1,9 +1,11 @@
 #include "tests/client/TroubledTickets.h"
 
 #include "comgui/ticket/BIN_STRING.h"
+#include <chrono>
 #include <deque>
 #include <limits>
 #include <mutex>
+#include <thread>
 #include <utility>
 
 namespace
@@ -110,6 +112,16 @@ int GetTable(void* instance, int type, int id, GETMULTIPAR* table)
 {
     return trouble->sessionIsOver ? 0 : real.MGETMULTIPAR(instance, type, id, table);
 }
+
+int SwitchNotification(void* instance, int type, int id, int notification, bool isOn, char const* const* keys)
+{
+    ++trouble->switchesBegun;
+    for (int i = 0; trouble->switchingStands && i < 20000; ++i)
+        std::this_thread::sleep_for(std::chrono::milliseconds(1));
+    int const result = real.MENDISNOTIF(instance, type, id, notification, isOn, keys);
+    ++trouble->switchesDone;
+    return result;
+}
 }  // namespace
 
 MTICKET_ACCESS const* Troubled(MTICKET_ACCESS const* container, TICKET_TROUBLE& orders)
@@ -124,5 +136,6 @@ MTICKET_ACCESS const* Troubled(MTICKET_ACCESS const* container, TICKET_TROUBLE& 
     troubled.MGETMULTIPAR = GetTable;
     troubled.MWALKTICKETS = WalkTickets;
     troubled.MOPERATION = Operation;
+    troubled.MENDISNOTIF = SwitchNotification;
     return &troubled;
 }

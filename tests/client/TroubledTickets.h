@@ -14,9 +14,14 @@ struct TICKET_TROUBLE
     std::atomic<bool> walksNeverEnd{false};    // over tickets and keys, until the action ends them
     std::atomic<bool> bytesAreEndless{false};  // of the walks over keys: one value more of an impossible size
     std::atomic<bool> textsAreNull{false};     // in reads and in walks over keys
+    std::atomic<bool> switchingStands{false};  // of notifications: until that ends, or for twenty seconds
     std::function<void()> afterOpening{};      // of a ticket; once
     std::function<void()> afterFirstValue{};   // of a walk over keys, which breaks off then, as a success
     std::function<void()> afterTypeQuery{};    // of a read; once
+
+    // What happened.
+    std::atomic<int> switchesBegun{0};
+    std::atomic<int> switchesDone{0};
 };
 
 // That container with what the orders put in front of it; null for null.

@@ -140,11 +140,25 @@ TEST_F(EventsOfAClient, GoOn_WhenAnotherSubscriptionEnds)
     TicketAddress const job = NewTicket();
     auto const stays = Listen(Interest::InTickets({job}));
     {
-        auto const ends = Listen(Interest::InTypes({JobTickets}));
+        auto const ends = Listen(Interest::InTickets({System}));
     }
     ASSERT_TRUE(tickets.Write(job, "A", 1));
     Hear(1);
     EXPECT_THAT(heard, ElementsAre("changed " + NameOf(job) + " A=1"));
+}
+
+// To the plug-in the single tickets end with their type: for a moment nothing is heard of them.
+TEST_F(EventsOfAClient, GoOn_WhenASubscriptionToTheWholeTypeEnds)
+{
+    TicketAddress const job = NewTicket();
+    auto const stays = Listen(Interest::InTickets({job}));
+    {
+        auto const ends = Listen(Interest::InTypes({JobTickets}));
+    }
+    Hear(1);
+    ASSERT_TRUE(tickets.Write(job, "A", 1));
+    Hear(2);
+    EXPECT_THAT(heard, ElementsAre("changed " + NameOf(job) + " whole", "changed " + NameOf(job) + " A=1"));
 }
 
 TEST_F(EventsOfAClient, OfABurst_ArePutTogether)

@@ -1,6 +1,7 @@
 // What waits for a subscriber, merged.
 #include "comgui/client/PendingEvents.h"
 
+#include "comgui/ticket/TICKET_ID.h"
 #include "tests/support/Allocations.h"
 #include <algorithm>
 #include <gmock/gmock.h>
@@ -129,6 +130,35 @@ TEST_F(PendingEventsOf, TooManyTickets_AreTheirType)
     EXPECT_EQ(Taken(), "A=1 many3 ");
     Change(Job, "A", Value(5));
     EXPECT_EQ(Taken(), "A=5 ");
+}
+
+TEST_F(PendingEventsOf, TypeThatWasUnheard_IsToBeListedAnew)
+{
+    Change(Job, "A", 1);
+    Change({7, 1}, "B", 2);
+    pending.AddUnheard(interest, {3, TICKET_ID_ALL});
+    pending.AddUnheard(interest, {4, TICKET_ID_ALL});  // of no interest
+    Change(Job, "C", 3);
+    EXPECT_EQ(Taken(), "B=2 many3 ");
+}
+
+TEST_F(PendingEventsOf, TicketThatWasUnheard_IsToBeReadAnew)
+{
+    interest.tickets = {{5, 1}};
+    Create({5, 1});
+    Change({5, 1}, "A", 1);
+    pending.AddUnheard(interest, {5, 1});
+    pending.AddUnheard(interest, Job);  // of interest by its type only
+    Change({5, 1}, "B", 2);
+    EXPECT_EQ(Taken(), "C whole ");
+}
+
+TEST_F(PendingEventsOf, TicketThatWasUnheard_IsPartOfItsType)
+{
+    interest.tickets = {Job};
+    pending.AddUnheard(interest, {3, TICKET_ID_ALL});
+    pending.AddUnheard(interest, Job);
+    EXPECT_EQ(Taken(), "many3 ");
 }
 
 TEST_F(PendingEventsOf, TooManyBytes_AreLeftOut)

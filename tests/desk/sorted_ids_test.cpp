@@ -1,7 +1,6 @@
 #include "desk/model/SortedIds.h"
 
 #include <algorithm>
-#include <chrono>
 #include <gtest/gtest.h>
 #include <limits>
 #include <random>
@@ -109,14 +108,11 @@ TEST(SortedIds, ErasedToTheLast_IsEmpty)
     EXPECT_EQ(ids.Insert(1), 0U);
 }
 
-TEST(SortedIds, HundredThousandOneByOne_AreQuick)
+TEST(SortedIds, HundredThousandOneByOne_TakeTheirPlaces)
 {
     auto const all = Shuffled(100000);
-    auto const begin = std::chrono::steady_clock::now();
     SortedIds ids;
     for (int const id : all)
         ids.Insert(id);
-    auto const took = std::chrono::steady_clock::now() - begin;
     ExpectSame(ids, std::set<int>(all.begin(), all.end()));
-    EXPECT_LT(took, std::chrono::seconds(2));  // a tenth of that without sanitizers; quadratic is minutes
 }

@@ -105,9 +105,16 @@ void NetworkProxy::Run()
         std::erase_if(m_links,
                       [this, loss](LINK& link)
                       {
-                          CountTurn(link);
-                          return !Pass(link.client, link.server, link.toServer, (loss & ToServer) == 0) ||
-                                 !Pass(link.server, link.client, link.toClient, (loss & ToClient) == 0);
+                          auto const fromClient = [&]
+                          {
+                              m_turns += link.isClientsTurn ? 1 : 0;
+                              link.isClientsTurn = false;
+                          };
+                          auto const fromServer = [&] { link.isClientsTurn = true; };
+                          return ((loss & ToServer) == 0 &&
+                                  !Pass(link.client, link.server, link.toServer, fromClient)) ||
+                                 ((loss & ToClient) == 0 &&
+                                  !Pass(link.server, link.client, link.toClient, fromServer));
                       });
         if (m_largest != 0)
             std::this_thread::sleep_for(std::chrono::milliseconds(10));
@@ -132,25 +139,11 @@ void NetworkProxy::AddTo(std::vector<pollfd>& waiting, LINK const& link) const
         add(link.server, link.client, link.toClient);
 }
 
-// By what there is to be read, before it is passed on.
-void NetworkProxy::CountTurn(LINK& link)
-{
-    pollfd ends[] = {{link.client.Number(), POLLIN, 0}, {link.server.Number(), POLLIN, 0}};
-    poll(ends, 2, 0);
-    if (link.isClientsTurn && (ends[0].revents & POLLIN) != 0)
-        ++m_turns;
-    if ((ends[0].revents & POLLIN) != 0)
-        link.isClientsTurn = false;
-    if ((ends[1].revents & POLLIN) != 0)
-        link.isClientsTurn = true;
-}
-
-// False at the end of the connection.
+// False at the end of the connection. Says what it takes before it passes it on.
+template <typename Taken>
 bool NetworkProxy::Pass(Descriptor const& from, Descriptor const& to, std::string& waiting,
-                        bool isAllowed) const
+                        Taken const& taken) const
 {
-    if (!isAllowed)
-        return true;
     if (waiting.empty())
     {
         char bytes[LargestWaiting];
@@ -158,10 +151,11 @@ bool NetworkProxy::Pass(Descriptor const& from, Descriptor const& to, std::strin
             recv(from.Number(), bytes, m_largest != 0 ? m_largest.load() : sizeof bytes, MSG_DONTWAIT);
         if (size == 0 || (size < 0 && errno != EAGAIN && errno != EINTR))
             return false;
-        waiting.append(bytes, size < 0 ? 0 : static_cast<std::size_t>(size));
+        if (size < 0)
+            return true;
+        taken();
+        waiting.append(bytes, static_cast<std::size_t>(size));
     }
-    if (waiting.empty())
-        return true;
     ssize_t const size = send(to.Number(), waiting.data(), waiting.size(), MSG_DONTWAIT | MSG_NOSIGNAL);
     if (size > 0)
         waiting.erase(0, static_cast<std::size_t>(size));

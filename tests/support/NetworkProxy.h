@@ -55,9 +55,9 @@ private:
     void Run();
     void Accept();
     void AddTo(std::vector<struct pollfd>& waiting, LINK const& link) const;
-    void CountTurn(LINK& link);
+    template <typename Taken>
     bool Pass(standin::Descriptor const& from, standin::Descriptor const& to, std::string& waiting,
-              bool isAllowed) const;
+              Taken const& taken) const;
     void Wake() const;
 
     std::filesystem::path const m_server;

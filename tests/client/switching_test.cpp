@@ -1,0 +1,152 @@
+// Subscriptions at a plug-in that takes its time to switch notifications on and off.
+#include "tests/client/TroubledClient.h"
+
+#include <gmock/gmock.h>
+
+using namespace comgui;
+using namespace std::chrono_literals;
+using testing::ElementsAre;
+using testing::IsEmpty;
+using testing::UnorderedElementsAre;
+
+namespace
+{
+class SlowSwitching : public TroubledClient
+{
+protected:
+    SlowSwitching()
+    {
+        LogIn();
+        job = NewTicket();
+    }
+    ~SlowSwitching() override { trouble.tickets.switchingStands = false; }
+
+    Subscription Subscribe(Interest interest)
+    {
+        return connection.Subscribe(std::move(interest), queue.GetExecutor(),
+                                    [this](Event const& event) { changes.push_back(WordFor(event)); });
+    }
+
+    static std::string WordFor(Event const& event)
+    {
+        if (auto const* const many = std::get_if<ManyTicketsChanged>(&event))
+            return "type " + std::to_string(many->type);
+        if (std::holds_alternative<TicketCreated>(event))
+            return "created";
+        auto const* const changed = std::get_if<TicketChanged>(&event);
+        if (!changed)
+            return "another";
+        return changed->isWhole ? "whole ticket" : changed->keys.at(0).key;
+    }
+
+    std::vector<std::string> const& Changes(std::size_t count)
+    {
+        for (auto const end = Clock::now() + 20s; changes.size() < count && Clock::now() < end;)
+            queue.RunFor(5ms);
+        queue.RunFor(100ms);  // for one too many
+        return changes;
+    }
+
+    TicketAddress job{};
+    std::vector<std::string> changes;
+};
+}  // namespace
+
+TEST_F(SlowSwitching, HoldsNoSubscriberUp_AndNoChangeGoesUnnoticed)
+{
+    trouble.tickets.switchingStands = true;
+    auto const subscription = Subscribe(Interest::InTickets({job}));
+    EXPECT_EQ(trouble.tickets.switchesBegun, 1);
+    EXPECT_EQ(trouble.tickets.switchesDone, 0);
+    ASSERT_TRUE(tickets.Write(job, "A", 1));
+    EXPECT_THAT(Changes(0), IsEmpty());
+    trouble.tickets.switchingStands = false;
+    EXPECT_THAT(Changes(1), ElementsAre("whole ticket"));
+    ASSERT_TRUE(tickets.Write(job, "B", 1));
+    EXPECT_THAT(Changes(2), ElementsAre("whole ticket", "B"));
+}
+
+TEST_F(SlowSwitching, OfATypeIsToldAsManyTickets)
+{
+    trouble.tickets.switchingStands = true;
+    auto const subscription = Subscribe(Interest::InTypes({JobTickets, SystemTickets}));
+    trouble.tickets.switchingStands = false;
+    EXPECT_THAT(Changes(2), UnorderedElementsAre("type " + std::to_string(JobTickets),
+                                                 "type " + std::to_string(SystemTickets)));
+    ASSERT_TRUE(tickets.Write(job, "A", 1));
+    EXPECT_EQ(Changes(3).back(), "A");
+}
+
+TEST_F(SlowSwitching, IsNotToldToWhoHasWaitedForIt)
+{
+    auto const first = Subscribe(Interest::InTickets({job}));
+    EXPECT_THAT(Changes(0), IsEmpty());
+    EXPECT_EQ(trouble.tickets.switchesDone, 1);
+    trouble.tickets.switchingStands = true;
+    auto const second = Subscribe(Interest::InTypes({SystemTickets}));
+    trouble.tickets.switchingStands = false;
+    EXPECT_THAT(Changes(1), ElementsAre("type " + std::to_string(SystemTickets)));
+}
+
+// Both wait behind the same call.
+TEST_F(SlowSwitching, IsToldToAllWhoHaveNotWaitedForIt)
+{
+    TicketAddress const other = NewTicket();
+    trouble.tickets.switchingStands = true;
+    auto const first = Subscribe(Interest::InTickets({job}));
+    auto const second = Subscribe(Interest::InTickets({other}));
+    ASSERT_TRUE(tickets.Write(other, "A", 1));
+    EXPECT_EQ(trouble.tickets.switchesBegun, 1);
+    trouble.tickets.switchingStands = false;
+    EXPECT_THAT(Changes(2), ElementsAre("whole ticket", "whole ticket"));
+}
+
+TEST_F(SlowSwitching, HoldsNoEndOfASubscriptionUp)
+{
+    auto subscription = Subscribe(Interest::InTickets({job}));
+    trouble.tickets.switchingStands = true;
+    subscription.End();
+    EXPECT_EQ(trouble.tickets.switchesDone, 1);  // on
+    ASSERT_TRUE(tickets.Write(job, "A", 1));
+    trouble.tickets.switchingStands = false;
+    Await([this] { return trouble.tickets.switchesDone == 2; });
+    EXPECT_THAT(Changes(0), IsEmpty());
+}
+
+// One call at most.
+TEST_F(SlowSwitching, HoldsALogoutUpForOneCallOnly)
+{
+    trouble.tickets.switchingStands = true;
+    auto const subscription = Subscribe(Interest::InAllTypes());
+    std::thread leaves([this] { EXPECT_TRUE(connection.LogOut()); });
+    Await([this] { return !connection.IsLoggedIn(); });
+    std::this_thread::sleep_for(100ms);
+    trouble.tickets.switchingStands = false;
+    leaves.join();
+    EXPECT_EQ(trouble.tickets.switchesBegun, 1);
+    EXPECT_THAT(Changes(0), IsEmpty());
+    LogIn();
+    EXPECT_EQ(trouble.tickets.switchesDone, 1 + TicketTypes);
+}
+
+TEST_F(SlowSwitching, IsCaughtUpWithByALiveTicket)
+{
+    ASSERT_TRUE(tickets.Write(job, "A", 1));
+    trouble.tickets.switchingStands = true;
+    Worker const worker(queue.GetExecutor());
+    LiveTicket const live(connection, worker, job, [](TicketUpdate const&) {});
+    auto const shows = [&](Value const& value)
+    {
+        auto const now = live.Now().Find("A");
+        return now && *now == value;
+    };
+    for (auto const end = Clock::now() + 20s; !shows(1) && Clock::now() < end;)
+        queue.RunFor(5ms);
+    ASSERT_TRUE(tickets.Write(job, "A", 2));
+    queue.RunFor(100ms);
+    EXPECT_TRUE(shows(1));
+    trouble.tickets.switchingStands = false;
+    for (auto const end = Clock::now() + 20s; !shows(2) && Clock::now() < end;)
+        queue.RunFor(5ms);
+    EXPECT_TRUE(shows(2));
+}
