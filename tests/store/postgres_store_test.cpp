@@ -396,6 +396,24 @@ TEST_F(PostgresContent, PlansThatCross_WaitForEachOtherWithoutDeadlock)
     EXPECT_EQ(store->Tickets([](TicketAddress, TicketState const&) {}), 202u);
 }
 
+TEST_F(PostgresContent, PlanOfSeveralTickets_LocksTheFirstOfThemFirst)
+{
+    auto const store = schema.Open();
+    Writer writer(*store);
+    writer.Make(Job);
+    writer.Make(OtherJob);
+    SqlSession const obstacle(schema.cluster.Uri());
+    obstacle.Run("BEGIN");
+    obstacle.Run("SELECT FROM " + schema.Name() + ".ticket WHERE type = 3 AND id = 2 FOR UPDATE");
+    auto commit = std::async(
+        std::launch::async, [&]
+        { return writer.Try(WriteTo(OtherJob, writer.State(OtherJob)).On(Job, writer.State(Job))).kind; });
+    schema.cluster.Await("SELECT count(*) FROM pg_locks WHERE NOT granted", "1");
+    EXPECT_ANY_THROW(schema.Run("SELECT FROM S.ticket WHERE type = 3 AND id = 1 FOR UPDATE NOWAIT"));
+    obstacle.Run("ROLLBACK");
+    EXPECT_EQ(commit.get(), CommitOutcome::Committed);
+}
+
 // As a backup does. Every commit and every read of a ticket asks for the newest number.
 TEST_F(PostgresContent, LookAtOneMoment_LeavesTheNewestChangeEasyToFind)
 {
