@@ -14,7 +14,6 @@ namespace
 constexpr int Stamp = 20261122;  // the kit's mark of its sessions; the plug-in only carries it
 constexpr int NotReachable = -2005;
 constexpr std::chrono::seconds LookInterval(1);
-constexpr std::chrono::milliseconds SwitchPatience(250);  // about what a user does not notice
 
 template <std::size_t Size>
 void Assign(char (&field)[Size], std::string const& text)
@@ -150,7 +149,7 @@ Result<User> Client::LogIn(Server const& server, Account const& account)
         m_record->szUser, {UserTickets, m_record->iClientStamp}, m_manager->IsCurrentUserAdmin(m_record)};
     lock.unlock();
 
-    m_switch.Switch();
+    m_switch.Await(m_switch.Ask(), SwitchPatience);
     m_nextEntry = {};
     m_entryPause = std::chrono::seconds(1);
     try
@@ -339,18 +338,17 @@ Error Client::Failure(int code, std::string about)
     return {code, std::move(about), reason ? *reason : std::string()};
 }
 
-std::shared_ptr<Subscriber> Client::Subscribe(Interest interest, Executor executor,
-                                              Subscription::Handler handler,
-                                              std::chrono::milliseconds interval)
+Client::SUBSCRIBED Client::Subscribe(Interest interest, Executor executor, Subscription::Handler handler,
+                                     std::chrono::milliseconds interval)
 {
+    m_switch.Start();  // first, since it may throw
     auto subscriber = m_hub->Add(std::move(interest), std::move(executor), std::move(handler), interval);
     subscriber->onEnd = [weak = weak_from_this()]
     {
         if (auto const client = weak.lock())
-            client->m_switch.SwitchAside(std::chrono::milliseconds(0));
+            client->m_switch.Ask();
     };
-    m_switch.SwitchAside(SwitchPatience);
-    return subscriber;
+    return {std::move(subscriber), m_switch.Ask()};
 }
 
 void Client::StopWatching()
@@ -456,8 +454,7 @@ std::optional<Outcome> Client::EnterAgain(ComGUIManager& watcher)
             return entered;
     }
     m_entryPause = std::chrono::seconds(1);
-    if (!IsWatchOver())  // else a logout waits
-        m_switch.Switch();
+    m_switch.Await(m_switch.Ask(), SwitchPatience);
     return Outcome();
 }
 }  // namespace comgui::detail

@@ -53,12 +53,22 @@ public:
     // With the reason for the last refusal on this thread.
     Error Failure(int code, std::string about);
 
-    std::shared_ptr<Subscriber> Subscribe(Interest interest, Executor executor, Subscription::Handler handler,
-                                          std::chrono::milliseconds interval);
+    struct SUBSCRIBED
+    {
+        std::shared_ptr<Subscriber> subscriber;
+        std::uint64_t turn;  // to wait for until the plug-in reports
+    };
+    SUBSCRIBED Subscribe(Interest interest, Executor executor, Subscription::Handler handler,
+                         std::chrono::milliseconds interval);
+
+    // Waits until the plug-in reports what was wanted at that turn, or for a quarter of a second.
+    void AwaitReports(std::uint64_t turn) { m_switch.Await(turn, SwitchPatience); }
     EventHub& Hub() { return *m_hub; }
     TransferPool& Pool() { return *m_pool; }
 
 private:
+    static constexpr std::chrono::milliseconds SwitchPatience{250};  // about what a user does not notice
+
     Client() = default;
 
     struct FREE

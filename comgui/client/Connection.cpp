@@ -25,8 +25,10 @@ Transfers Connection::GetTransfers() const { return Transfers(m_client); }
 Subscription Connection::Subscribe(Interest interest, Executor executor, Subscription::Handler handler,
                                    std::chrono::milliseconds interval)
 {
-    return Subscription(
-        m_client->Subscribe(std::move(interest), std::move(executor), std::move(handler), interval));
+    auto [subscriber, turn] =
+        m_client->Subscribe(std::move(interest), std::move(executor), std::move(handler), interval);
+    m_client->AwaitReports(turn);
+    return Subscription(std::move(subscriber));
 }
 
 Subscription::Subscription(std::shared_ptr<detail::Subscriber> subscriber)

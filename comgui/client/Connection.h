@@ -91,6 +91,8 @@ public:
                                          std::chrono::milliseconds interval = std::chrono::milliseconds(20));
 
 private:
+    friend class LiveTicket;  // has its worker wait
+
     std::shared_ptr<detail::Client> m_client;
 };
 }  // namespace comgui

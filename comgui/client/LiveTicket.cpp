@@ -1,5 +1,6 @@
 #include "comgui/client/LiveTicket.h"
 
+#include "comgui/client/Client.h"
 #include <map>
 #include <utility>
 
@@ -9,7 +10,8 @@ namespace
 {
 using Keys = std::vector<std::string>;
 
-constexpr std::size_t MostLate = 100'000;  // changes that wait for a slow reading
+constexpr std::chrono::milliseconds Interval(20);  // between two looks at what has changed
+constexpr std::size_t MostLate = 100'000;          // changes that wait for a slow reading
 
 // A change more of a key that may have changed before.
 void Add(std::map<std::string, SnapshotDifference>& differences, SnapshotDifference next)
@@ -172,13 +174,23 @@ struct LiveTicket::STATE : std::enable_shared_from_this<STATE>
 LiveTicket::LiveTicket(Connection& connection, Worker const& worker, TicketAddress ticket, Handler handler)
     : m_state(std::make_shared<STATE>(connection, worker, ticket, std::move(handler)))
 {
-    m_state->m_subscription =
-        connection.Subscribe(Interest::InTickets({ticket}), worker.Results(),
-                             [state = m_state.get()](Event const& event)
-                             {
-                                 auto const keep = state->shared_from_this();
-                                 std::visit([state](auto const& what) { state->Heard(what); }, event);
-                             });
+    auto [subscriber, turn] = connection.m_client->Subscribe(
+        Interest::InTickets({ticket}), worker.Results(),
+        [state = m_state.get()](Event const& event)
+        {
+            auto const keep = state->shared_from_this();
+            std::visit([state](auto const& what) { state->Heard(what); }, event);
+        },
+        Interval);
+    m_state->m_subscription = Subscription(std::move(subscriber));
+    // What is read before the plug-in reports would have to be read once more.
+    worker.Do(
+        [weak = std::weak_ptr(connection.m_client), turn = turn]
+        {
+            if (auto const client = weak.lock())
+                client->AwaitReports(turn);
+        },
+        [] {});
     m_state->Read();
 }
 

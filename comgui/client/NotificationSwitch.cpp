@@ -2,12 +2,14 @@
 
 #include "comgui/access/MTICKET_ADMIN.h"
 #include "comgui/ticket/TICKET_ID.h"
+#include <algorithm>
 #include <utility>
 
 namespace comgui::detail
 {
 void NotificationSwitch::BeginSession(MTICKET_ACCESS const* container, int notification)
 {
+    Interrupt();
     std::lock_guard const lock(m_switching);
     m_container = container;
     m_notification = notification;
@@ -40,26 +42,37 @@ void NotificationSwitch::Switch()
     bool const isLast = turn == m_asked;
     waiting.unlock();
     if (isLate)
-        unheard.insert(m_news.begin(), m_news.end());
-    if (isLast)
+        unheard.merge(m_news);
+    if (isLate || isLast)
         m_news.clear();
     if (!m_isLeaving)
         m_hub.PublishUnheard(unheard);
 }
 
-void NotificationSwitch::SwitchAside(std::chrono::milliseconds patience)
+void NotificationSwitch::Start()
+{
+    std::lock_guard const lock(m_waiting);
+    if (!m_worker && !m_isStopped)
+        m_worker = std::make_unique<Worker>([](std::function<void()> const& task) { task(); });
+}
+
+std::uint64_t NotificationSwitch::Ask()
+{
+    std::lock_guard const lock(m_waiting);
+    if (m_worker)
+    {
+        auto const turn = m_asked + 1;
+        m_worker->Do([this, turn] { Serve(turn); }, [] {});
+        m_asked = turn;
+    }
+    return m_asked;
+}
+
+void NotificationSwitch::Await(std::uint64_t turn, std::chrono::milliseconds patience)
 {
     std::unique_lock lock(m_waiting);
-    if (m_isStopped)
-        return;
-    if (!m_worker)
-        m_worker = std::make_unique<Worker>([](std::function<void()> const& task) { task(); });
-    auto const turn = m_asked + 1;
-    m_worker->Do([this, turn] { Serve(turn); }, [] {});
-    m_asked = turn;
-    bool const isPatient = patience.count() > 0;
-    if (isPatient && !m_served.wait_for(lock, patience, [this, turn] { return m_done >= turn; }))
-        m_late = turn;
+    if (!m_served.wait_for(lock, patience, [this, turn] { return m_done >= turn || m_isStopped; }))
+        m_late = std::max(m_late, turn);
 }
 
 // Many that were asked for while one was under way are one.
@@ -77,6 +90,7 @@ void NotificationSwitch::Stop()
     Interrupt();
     std::unique_lock lock(m_waiting);
     m_isStopped = true;
+    m_served.notify_all();
     std::unique_ptr<Worker> const worker = std::move(m_worker);
     lock.unlock();  // its work takes the lock
 }

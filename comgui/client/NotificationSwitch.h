@@ -24,29 +24,33 @@ public:
     NotificationSwitch& operator=(NotificationSwitch const&) = delete;
 
     // notification: the session's number, worth something to its container alone. Nothing is on at first.
+    // Like EndSession, waits for one call of the plug-in at most, in the session before.
     void BeginSession(MTICKET_ACCESS const* container, int notification);
 
-    // Waits for one call of the plug-in at most. The plug-in drops by itself what was on.
+    // The plug-in drops by itself what was on.
     void EndSession();
 
-    // Makes EndSession wait no longer than that; to be called before it.
+    // Makes those two wait no longer than that, if it is called before.
     void Interrupt() { m_isLeaving = true; }
 
-    // Brings what the plug-in reports in line with what subscribers want, on this thread.
-    void Switch();
+    // Begins its thread, which calls the plug-in, since that may take long. Throws std::system_error if there
+    // is none to be had. Before the first subscription; until then there is nothing to switch.
+    void Start();
 
-    // The same on a thread of its own, since the plug-in may take long. Waits for it, but no longer than
-    // patience: if that is not enough, subscribers are told later that what came to be reported may have
-    // changed meanwhile. Throws std::system_error if there is no thread to be had.
-    void SwitchAside(std::chrono::milliseconds patience);
+    // Has the thread bring what the plug-in reports in line with what subscribers want. Gives a number to
+    // wait with, but no longer than patience: if that is not enough, subscribers are told later that what
+    // came to be reported may have changed meanwhile.
+    std::uint64_t Ask();
+    void Await(std::uint64_t turn, std::chrono::milliseconds patience);
 
-    // For good: of its own thread. What waits there is dropped.
+    // For good: ends its thread. What waits there is dropped, and nobody waits any more.
     void Stop();
 
 private:
     using Keys = std::set<std::string>;            // none stands for all keys
     using Wanted = std::map<TicketAddress, Keys>;  // a type by TICKET_ID_ALL
 
+    void Switch();
     static Wanted Union(std::vector<Interest> const& interests);
     std::set<TicketAddress> SwitchOff(Wanted const& wanted);
     void SwitchOn(Wanted wanted);

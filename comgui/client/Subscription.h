@@ -60,6 +60,7 @@ public:
 
 private:
     friend class Connection;
+    friend class LiveTicket;
     COMGUI_LOCAL explicit Subscription(std::shared_ptr<detail::Subscriber> subscriber);
 
     std::shared_ptr<detail::Subscriber> m_subscriber;

@@ -19,6 +19,14 @@ protected:
         LogIn();
         job = NewTicket();
     }
+    // Of another session: what it does is counted from here on.
+    void LogInAtOneThatStands()
+    {
+        ASSERT_TRUE(connection.LogOut());
+        trouble.tickets.switchesBegun = trouble.tickets.switchesDone = 0;
+        trouble.tickets.switchingStands = true;
+        LogIn();
+    }
     ~SlowSwitching() override { trouble.tickets.switchingStands = false; }
 
     Subscription Subscribe(Interest interest)
@@ -149,4 +157,70 @@ TEST_F(SlowSwitching, IsCaughtUpWithByALiveTicket)
     for (auto const end = Clock::now() + 20s; !shows(2) && Clock::now() < end;)
         queue.RunFor(5ms);
     EXPECT_TRUE(shows(2));
+}
+
+TEST_F(SlowSwitching, HoldsNoLiveTicketUp)
+{
+    trouble.tickets.switchingStands = true;
+    Worker const worker(queue.GetExecutor());
+    std::vector<std::unique_ptr<LiveTicket>> live;
+    auto const start = Clock::now();
+    for (int i = 0; i < 40; ++i)
+        live.push_back(std::make_unique<LiveTicket>(connection, worker, job, [](TicketUpdate const&) {}));
+    EXPECT_LT(Clock::now() - start, 5s);  // with the patience of a subscription ten
+}
+
+TEST_F(SlowSwitching, HoldsNoLoginUp_AndNoChangeGoesUnnoticed)
+{
+    auto const subscription = Subscribe(Interest::InTypes({JobTickets}));
+    LogInAtOneThatStands();
+    EXPECT_EQ(trouble.tickets.switchesDone, 0);
+    ASSERT_TRUE(tickets.Write(job, "A", 1));
+    trouble.tickets.switchingStands = false;
+    EXPECT_THAT(Changes(1), ElementsAre("type " + std::to_string(JobTickets)));
+}
+
+TEST_F(SlowSwitching, OfALogin_HoldsALogoutUpForOneCallOnly)
+{
+    auto const subscription = Subscribe(Interest::InAllTypes());
+    LogInAtOneThatStands();
+    std::thread leaves([this] { EXPECT_TRUE(connection.LogOut()); });
+    Await([this] { return !connection.IsLoggedIn(); });
+    std::this_thread::sleep_for(100ms);
+    trouble.tickets.switchingStands = false;
+    leaves.join();
+    EXPECT_EQ(trouble.tickets.switchesBegun, 1);
+}
+
+TEST_F(SlowSwitching, DoesNotHideThatTheServerIsBack)
+{
+    auto const subscription = Subscribe(Interest::InTypes({JobTickets}));
+    auto const listens = Listen();
+    trouble.tickets.switchingStands = true;
+    trouble.sessionIsGone = true;
+    EXPECT_THAT(Hear(2), ElementsAre(testing::HasSubstr("lost"), "back anew"));
+    EXPECT_EQ(trouble.tickets.switchesDone, 1);
+    trouble.tickets.switchingStands = false;
+    Await([this] { return trouble.tickets.switchesDone == 2; });
+}
+
+TEST_F(SlowSwitching, HoldsTheEndOfAConnectionUpForOneCallOnly)
+{
+    auto other = std::make_unique<Connection>();
+    auto const subscription =
+        other->Subscribe(Interest::InAllTypes(), queue.GetExecutor(), [](Event const&) {});
+    trouble.tickets.switchingStands = true;
+    ASSERT_TRUE(other->LogIn(Here(), Admin()));
+    std::atomic<bool> isOver{false};
+    std::thread ends(
+        [&]
+        {
+            other.reset();
+            isOver = true;
+        });
+    std::this_thread::sleep_for(200ms);
+    EXPECT_FALSE(isOver);
+    trouble.tickets.switchingStands = false;
+    ends.join();
+    EXPECT_EQ(trouble.tickets.switchesBegun, 1);
 }
