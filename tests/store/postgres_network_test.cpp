@@ -133,6 +133,29 @@ TEST_P(PostgresLoss, IsNoticedWithoutACall_AndTheEndOfIt)
     EXPECT_THAT(ValuesOf(*store, Job), IsEmpty());
 }
 
+// Rings come all the time, so that the server is asked for nothing but the journal.
+TEST_F(PostgresNetwork, LostAmongManyChanges_IsBackWhileTheyGoOn)
+{
+    std::atomic<bool> isOver{false};
+    auto const writes = std::async(std::launch::async,
+                                   [&]
+                                   {
+                                       for (Writer busy(*other); !isOver;)
+                                           busy.Do(CreationOfNext(5));
+                                   });
+    for (int i = 0; i < 3; ++i)
+    {
+        proxy.Lose(NetworkProxy::ToServer);  // the question after the next ring
+        std::this_thread::sleep_for(200ms);
+        proxy.Lose(NetworkProxy::Both);
+        AwaitReach(*store, false);
+        proxy.Lose(NetworkProxy::None);
+        AwaitReach(*store, true);
+    }
+    isOver = true;
+    writes.wait();
+}
+
 TEST_F(PostgresNetwork, LostForLong_FailsEveryCallAtOnce)
 {
     writer->Make(Job);

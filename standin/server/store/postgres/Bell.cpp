@@ -146,12 +146,18 @@ void Bell::Serve()
 void Bell::Ask(char const* sql, Parameters const& parameters)
 {
     m_connection->Run(sql, parameters, Clock::now() + m_limits.connect);
+    NoteAnswer();
+    HearRings();
+}
+
+// Whatever was asked: where changes come all the time, nothing but the journal is asked for.
+void Bell::NoteAnswer()
+{
     m_lastAnswer = Clock::now();
     bool const wasLost = !m_reach.IsThere();
     m_reach.NoteAnswer();
     if (wasLost)
         m_calls.look();
-    HearRings();
 }
 
 // Until something has happened or the time is over.
@@ -200,7 +206,7 @@ void Bell::LookAtJournal()
 {
     m_known =
         m_connection->Run("SELECT sequence FROM newest", {}, Clock::now() + m_limits.statement).Number(0, 0);
-    m_lastAnswer = Clock::now();
+    NoteAnswer();
     m_calls.heard(m_known);
 }
 

@@ -109,6 +109,7 @@ private:
     void PauseAfterBreak();
     void Serve();
     void Ask(char const* sql, Parameters const& parameters);
+    void NoteAnswer();
     void Hear(Clock::time_point end);
     void HearRings();
     Sequence NewestRing();
