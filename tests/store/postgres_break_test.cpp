@@ -207,6 +207,28 @@ TEST_F(PostgresBreak, ForAMoment_KeepsTheJournalForWhoIsMissing)
     EXPECT_FALSE(other->ChangesSince(4, [](CommittedChange&&) { ADD_FAILURE(); }));
 }
 
+// All may have lost their connections together, and need the time to come back.
+TEST_F(PostgresBreak, OfWhoLooksForTheMissing_GivesThemTheirTimeAnew)
+{
+    PostgresOptions options = AtOnce();
+    options.limits.journalKept = 0;
+    options.settling = 700ms;
+    auto const third = schema.Open(options);
+    for (int i = 0; i < 5; ++i)
+        otherWriter.Do(CreationOfNext(3));
+    store->Maintain(2);
+    other->Maintain(5);
+    Terminate(*store);
+    third->Maintain(5);
+    Terminate(*third);
+    std::this_thread::sleep_for(options.settling);
+    third->Maintain(5);
+    EXPECT_THAT(FeedOf(*other, 2), SizeIs(3));
+    std::this_thread::sleep_for(options.settling);
+    third->Maintain(5);
+    EXPECT_FALSE(other->ChangesSince(4, [](CommittedChange&&) { ADD_FAILURE(); }));
+}
+
 TEST_F(PostgresDeath, ByMistake_KeepsTheJournalAgainAsFarAsItIsNeeded)
 {
     PostgresOptions options = AtOnce();
