@@ -1,25 +1,15 @@
 #include "ServerSession.h"
 
-#include "Shown.h"
-#include <algorithm>
-#include <atomic>
-#include <cerrno>
-#include <charconv>
 #include <cstdio>
 #include <cstdlib>
-#include <cstring>
 #include <fcntl.h>
-#include <iterator>
 #include <memory>
 #include <pthread.h>
 #include <unistd.h>
 #include <utility>
-#include <wx/msgout.h>
 
 namespace
 {
-constexpr int Ends[] = {SIGINT, SIGTERM, SIGHUP};
-
 // The library's receiver deletes itself at its end; this one tells when its thread is over, which is later:
 // wxWidgets must not go before that, nor what it keeps for the thread be left behind.
 class Receiver : public ReceiverThread
@@ -89,100 +79,12 @@ private:
     int m_output;
 };
 
-// Where wxCmdLineParser tells what is wrong.
-class Complaints : public wxMessageOutput
-{
-public:
-    void Output(wxString const& text) override
-    {
-        wxString line = text.Strip(wxString::both);
-        line.Replace("\n", "; ");
-        Fail(line.utf8_string() + "; " + ProgramName + " --help tells how");
-    }
-};
-
 constexpr int WrongUserOrPassword = 107;  // a code of ComGUI.Bundle, the plug-in of this package
 }  // namespace
-
-std::optional<int> ParseCommandLine(wxCmdLineParser& parser)
-{
-    Complaints complaints;
-    wxMessageOutput* const before = wxMessageOutput::Set(&complaints);
-    int const result = parser.Parse(false);
-    wxMessageOutput::Set(before);
-    if (result > 0)
-        return Trouble;
-    if (result == 0)
-        return std::nullopt;
-    std::fputs(parser.GetUsageString().utf8_str(), stdout);
-    return FlushOutput() ? Good : Trouble;
-}
-
-std::optional<int> WholeNumber(std::string const& text, int least, int largest)
-{
-    int number = 0;
-    auto const [end, error] = std::from_chars(text.data(), text.data() + text.size(), number);
-    if (error != std::errc() || end != text.data() + text.size() || number < least || number > largest)
-        return std::nullopt;
-    return number;
-}
-
-std::string NumberFrom(int least, int largest, std::string const& given)
-{
-    return "a whole number from " + std::to_string(least) + " to " + std::to_string(largest) + ", not \"" +
-           given + "\"";
-}
-
-bool TakeNumber(wxCmdLineParser const& parser, char const* option, int& value, int least, int largest)
-{
-    wxString given;
-    if (!parser.Found(option, &given))
-        return true;
-    std::string const text = given.utf8_string();
-    auto const number = WholeNumber(text, least, largest);
-    value = number.value_or(value);
-    return number || Fail(std::string("--") + option + " takes " + NumberFrom(least, largest, text) + "; " +
-                          ProgramName + " --help tells how");
-}
-
-void SERVER::AddOptions(wxCmdLineParser& parser)
-{
-    parser.AddOption("u", "user", "log in as this user (admin)");
-    parser.AddOption("p", "password", "with this password (admin)");
-    parser.AddOption("s", "server", "at this host (localhost)");
-    parser.AddOption("o", "port", "and port (50000)");
-}
-
-bool SERVER::TakeOptions(wxCmdLineParser const& parser)
-{
-    parser.Found("user", &user);
-    parser.Found("password", &password);
-    parser.Found("server", &host);
-    return TakeNumber(parser, "port", port, LeastPort, LargestPort);
-}
-
-bool Fail(std::string const& what)
-{
-    std::fprintf(stderr, "%s: %s\n", ProgramName, Shown(what).c_str());
-    return false;
-}
 
 bool Fail(std::string const& what, int code)
 {
     return Fail(what + " (the plug-in's code: " + std::to_string(code) + ")");
-}
-
-bool FlushOutput()
-{
-    static std::atomic<bool> isGood = true;
-    errno = EIO;  // where it is an earlier write that failed
-    if (!isGood || (std::fflush(stdout) == 0 && std::ferror(stdout) == 0))
-        return isGood;
-    isGood = false;
-    if (errno != EPIPE)
-        Fail(std::string("the output cannot be written: ") + std::strerror(errno) +
-             "; make room there, or send it elsewhere");
-    return false;
 }
 
 bool IsPlugInThere()
@@ -195,16 +97,16 @@ bool IsPlugInThere()
                 ": build or install it there");
 }
 
-TLogin* NewRecord(char const* user, char const* password, SERVER const& server)
+TLogin* NewRecord(comgui::Server const& server, comgui::Account const& account)
 {
     auto* const login = static_cast<TLogin*>(std::calloc(1, sizeof(TLogin)));
     if (!login)
         std::abort();
     login->nSize = sizeof(TLogin);
     login->iGUINotificationID = -1;
-    stracpy(login->szUser, user, sizeof login->szUser);
-    stracpy(login->szPassword, password, sizeof login->szPassword);
-    stracpy(login->szServerHost, server.host.utf8_str(), sizeof login->szServerHost);
+    stracpy(login->szUser, account.user.c_str(), sizeof login->szUser);
+    stracpy(login->szPassword, account.password.c_str(), sizeof login->szPassword);
+    stracpy(login->szServerHost, server.host.c_str(), sizeof login->szServerHost);
     login->iServerPort = server.port;
     return login;
 }
@@ -223,31 +125,6 @@ bool LogIn(ComGUIManager& manager, TLogin* login)
                     result);
     return manager.GetClientContainer() || Fail("the session has no tickets");
 }
-
-EndSignals::EndSignals()
-{
-    sigemptyset(&m_signals);
-    for (int const signal : Ends)
-        sigaddset(&m_signals, signal);
-    pthread_sigmask(SIG_BLOCK, &m_signals, nullptr);
-}
-
-void EndSignals::Wait() const
-{
-    int signal = 0;
-    sigwait(&m_signals, &signal);
-    pthread_sigmask(SIG_UNBLOCK, &m_signals, nullptr);  // somebody may be in a hurry
-}
-
-bool EndSignals::ArePending()
-{
-    sigset_t pending;
-    sigpending(&pending);
-    return std::any_of(std::begin(Ends), std::end(Ends),
-                       [&](int signal) { return sigismember(&pending, signal) == 1; });
-}
-
-void EndSignals::Raise() { kill(getpid(), SIGTERM); }
 
 EventReceiver::EventReceiver(std::function<void(ServerNotificationEvent const&)> handler)
     : m_subscription(CEventManager::GetInstance()->Subscribe(

@@ -229,10 +229,7 @@ int Run(CommandLine const& commandLine)
     ComGUIManager* const manager = ComGUIManager::GetInstance();
     if (!IsPlugInThere())
         return Trouble;
-    SERVER server;
-    server.host = wxString::FromUTF8(options.host.c_str());
-    server.port = options.port;
-    TLogin* const login = NewRecord(options.user.c_str(), options.password.c_str(), server);
+    TLogin* const login = NewRecord({options.host, options.port}, {options.user, options.password});
     if (!LogIn(*manager, login))
         return Trouble;
     int status = Good;

@@ -16,7 +16,6 @@
 #include <thread>
 #include <wx/cmdline.h>
 #include <wx/datetime.h>
-#include <wx/init.h>
 
 char const ProgramName[] = "watch_tickets";
 
@@ -28,7 +27,7 @@ constexpr char const* EveryKey[] = {nullptr};
 
 struct OPTIONS
 {
-    SERVER server;
+    LOGIN login;
     int events = 0;  // leave after so many; 0: on Ctrl-C only
     bool busy = false;
 };
@@ -36,17 +35,17 @@ struct OPTIONS
 // Nothing, or the status with which to end at once: after --help, or after a message on a wrong command line.
 std::optional<int> Parse(int argc, char** argv, OPTIONS& options)
 {
-    wxCmdLineParser parser(argc, argv);
+    wxCmdLineParser parser;
     parser.SetLogo("Prints what changes in the tickets of a server, until Ctrl-C.\n"
                    "Exit status: 0 all is well; 2 a wrong command line, no server, no login, or the output "
                    "cannot be written.");
     parser.AddSwitch("h", "help", "show this text", wxCMD_LINE_OPTION_HELP);
     parser.AddSwitch("b", "busy", "change tickets meanwhile, in a second session (as operator)");
-    SERVER::AddOptions(parser);
+    LOGIN::AddOptions(parser);
     parser.AddOption("n", "events", "leave after so many events (0: no limit)");
-    if (auto const status = ParseCommandLine(parser))
+    if (auto const status = ParseCommandLine(parser, argc, argv))
         return status;
-    if (!options.server.TakeOptions(parser) || !TakeNumber(parser, "events", options.events, 0, INT_MAX))
+    if (!options.login.TakeOptions(parser) || !TakeNumber(parser, "events", options.events, 0, INT_MAX))
         return Trouble;
     options.busy = parser.Found("busy");
     return std::nullopt;
@@ -103,8 +102,8 @@ private:
 class BusySession
 {
 public:
-    BusySession(ComGUIManager& manager, SERVER const& server)
-        : m_manager(manager), m_login(NewRecord("operator", "operator", server))
+    BusySession(ComGUIManager& manager, comgui::Server const& server)
+        : m_manager(manager), m_login(NewRecord(server, {"operator", "operator"}))
     {
     }
     BusySession(BusySession const&) = delete;
@@ -193,11 +192,11 @@ int Watch(ComGUIManager& manager, TLogin* login, OPTIONS const& options, EndSign
     auto receiver =
         std::make_unique<EventReceiver>([&](ServerNotificationEvent const& event) { printer.Print(event); });
 
-    BusySession busy(manager, options.server);
+    BusySession busy(manager, options.login.server);
     bool const started = !options.busy || busy.Start();
     if (started)
     {
-        std::printf("Watching %s as %s; Ctrl-C ends it.\n", Shown(options.server.host.utf8_string()).c_str(),
+        std::printf("Watching %s as %s; Ctrl-C ends it.\n", Shown(options.login.server.host).c_str(),
                     Shown(manager.GetCurrentlyLoggedUser().utf8_string()).c_str());
         if (FlushOutput())
             end.Wait();
@@ -217,21 +216,14 @@ int main(int argc, char** argv)
 {
     std::signal(SIGPIPE, SIG_IGN);
     EndSignals const end;
-    wxInitializer const wx;  // without the arguments, of which it would warn where they are no UTF-8
     OPTIONS options;
-    if (!wx.IsOk())
-    {
-        std::fputs("watch_tickets: wxWidgets cannot be started\n", stderr);
-        return Trouble;
-    }
     if (auto const status = Parse(argc, argv, options))
         return *status;
 
     ComGUIManager* const manager = ComGUIManager::GetInstance();
     if (!IsPlugInThere())
         return Trouble;
-    TLogin* const login =
-        NewRecord(options.server.user.utf8_str(), options.server.password.utf8_str(), options.server);
+    TLogin* const login = NewRecord(options.login.server, options.login.account);
     if (!LogIn(*manager, login))
         return Trouble;
     int const status = Watch(*manager, login, options, end);
