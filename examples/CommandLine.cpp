@@ -103,3 +103,9 @@ bool LOGIN::TakeOptions(wxCmdLineParser const& parser)
     take("server", server.host);
     return TakeNumber(parser, "port", server.port, LeastPort, LargestPort);
 }
+
+bool LOGIN::Enter(comgui::Connection& connection) const
+{
+    auto const user = connection.LogIn(server, account);
+    return user || Fail(user.GetError().Text());
+}

@@ -28,7 +28,8 @@ constexpr int LargestPort = 65535;
 struct LOGIN
 {
     static void AddOptions(wxCmdLineParser& parser);
-    bool TakeOptions(wxCmdLineParser const& parser);  // false, and says why, if one cannot be
+    bool TakeOptions(wxCmdLineParser const& parser);   // false, and says why, if one cannot be
+    bool Enter(comgui::Connection& connection) const;  // likewise, if the login fails
 
     comgui::Server server;
     comgui::Account account{"admin", "admin"};

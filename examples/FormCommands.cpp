@@ -272,11 +272,11 @@ catch (Refusal const& refusal)
     Fail(refusal.what());
 }
 
-// Writes what comes on standard input, line by line, until that ends or the program shall.
-void WriteLines(SESSION const& session, OPTIONS const& options)
+// Writes what comes on standard input, line by line, until that ends, or the program shall: then true.
+bool WriteLines(SESSION const& session, OPTIONS const& options, EndSignals const& end)
 {
     std::string line;
-    while (!EndSignals::ArePending())
+    while (!end.WaitFor(std::chrono::milliseconds(0)))
     {
         pollfd input = {STDIN_FILENO, POLLIN, 0};
         if (poll(&input, 1, 100) <= 0)
@@ -284,13 +284,18 @@ void WriteLines(SESSION const& session, OPTIONS const& options)
         char bytes[4096];
         ssize_t const size = read(STDIN_FILENO, bytes, sizeof bytes);
         if (size <= 0)  // the last line may lack its end
-            return line.empty() ? void() : WriteLine(session, options, line);
+        {
+            if (!line.empty())
+                WriteLine(session, options, line);
+            return false;
+        }
         for (char const byte : std::string(bytes, static_cast<std::size_t>(size)))
             if (byte != '\n')
                 line += byte;
             else
                 WriteLine(session, options, std::exchange(line, {}));
     }
+    return true;
 }
 }  // namespace
 
@@ -309,9 +314,9 @@ void Watch(SESSION const& session, OPTIONS const& options, EndSignals const& end
         EventReceiver const receiver([&](ServerNotificationEvent const& event)
                                      { printer.Print(event.GetNotifData()); });
         std::fprintf(stderr, "%s: watching; Ctrl-C ends it\n", ProgramName);
-        if (options.edit)
-            WriteLines(session, options);
-        end.Wait();
+        bool hasEnded = options.edit && WriteLines(session, options, end);
+        while (!hasEnded)
+            hasEnded = end.WaitFor(std::chrono::seconds(1));
     }
     session.manager.DisableNotifications(session.login, options.type);
 }

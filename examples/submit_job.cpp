@@ -100,12 +100,8 @@ int main(int argc, char** argv)
     if (auto const status = Parse(argc, argv, options))
         return *status;
     Connection connection;
-    auto const user = connection.LogIn(options.login.server, options.login.account);
-    if (!user)
-    {
-        Fail(user.GetError().Text());
+    if (!options.login.Enter(connection))
         return Trouble;
-    }
     bool areAllSent = true;
     for (std::string const& file : options.files)  // whatever becomes of one, or of the output
         areAllSent = Submit(connection, options.job, file) && areAllSent;

@@ -1,29 +1,25 @@
-// Watches a server: logs in, asks to be told of all changes, prints each event as it comes, and leaves in
-// good order on Ctrl-C. With --busy a second session changes tickets meanwhile, so that there is something
-// to see.
-#include "ServerSession.h"
+// Watches a server: prints what changes in its tickets as it comes, and leaves in good order on Ctrl-C. With
+// --busy a second client changes tickets meanwhile, so that there is something to see.
+#include "CommandLine.h"
+#include "EndSignals.h"
+#include "Output.h"
 #include "Shown.h"
 
 #include <chrono>
 #include <climits>
-#include <condition_variable>
+#include <comgui/client.h>
+#include <csignal>
 #include <cstdio>
-#include <cstdlib>
-#include <memory>
-#include <mutex>
 #include <optional>
 #include <string>
 #include <thread>
-#include <wx/cmdline.h>
 #include <wx/datetime.h>
 
 char const ProgramName[] = "watch_tickets";
 
 namespace
 {
-constexpr int JobType = 3;
-constexpr int WatchedTypes[] = {0, 2, 3, 7, 12, 17};
-constexpr char const* EveryKey[] = {nullptr};
+using namespace comgui;
 
 struct OPTIONS
 {
@@ -51,164 +47,120 @@ std::optional<int> Parse(int argc, char** argv, OPTIONS& options)
     return std::nullopt;
 }
 
-std::string ValueOf(NotifData const& data)
+std::string TextOf(std::optional<Value> const& value)
 {
-    switch (data.NotifValueType)
-    {
-    case PARAM_NONE:
-        return data.NotifKind == 1 ? "(deleted)" : "";
-    case PARAM_INT:
-        return wxString::Format("%.0f", data.NotifNumber).utf8_string();
-    case PARAM_DOUBLE:
-        return wxString::Format("%g", data.NotifNumber).utf8_string();
-    case PARAM_STRING:
-        return "\"" + Shown(data.NotifText.utf8_string()) + "\"";
-    case PARAM_COUNT:
-        return "(several values)";
-    default:
-        return "(a value)";
-    }
+    if (!value)
+        return "(changed)";
+    if (value->IsNone())
+        return "(deleted)";
+    return value->Type() == PARAM_STRING ? "\"" + ToText(*value) + "\"" : ToText(*value);
 }
 
-// Prints events on the receiver's thread, quickly, since the plug-in waits meanwhile.
+// Prints events, each on a line, or on one for each key.
 class Printer
 {
 public:
     explicit Printer(int limit) : m_limit(limit) {}
 
-    void Print(ServerNotificationEvent const& event)
+    void Print(Event const& event)
+    {
+        std::visit([this](auto const& what) { Take(what); }, event);
+    }
+
+private:
+    void Take(TicketCreated const& created) { Print(created.ticket, "(created)"); }
+    void Take(TicketDeleted const& deleted) { Print(deleted.ticket, "(deleted)"); }
+    void Take(TicketChanged const& changed)
+    {
+        if (changed.isWhole)
+            Print(changed.ticket, "(many keys)");
+        for (auto const& [key, value] : changed.keys)
+            Print(changed.ticket, key + " " + TextOf(value));
+    }
+    void Take(ManyTicketsChanged many) { Print("many tickets of type " + std::to_string(many.type)); }
+    void Take(TransferProgressed const&) {}
+    void Take(TransferEnded const&) {}
+    void Take(ServerLost const& lost) { Print(lost.error.Text()); }
+    void Take(ServerBack) { Print("the server is back"); }
+
+    void Print(TicketAddress ticket, std::string const& what)
+    {
+        Print("ticket " + std::to_string(ticket.type) + "/" + std::to_string(ticket.id) + "  " + what);
+    }
+    void Print(std::string const& what)
     {
         if (m_isOver)
             return;  // what still comes while the program is leaving
-        NotifData const& data = event.GetNotifData();
-        std::printf("%s  event %d  ticket %d/%d  %s %s\n",
-                    wxDateTime::UNow().Format("%H:%M:%S.%l").utf8_string().c_str(), event.GetId(),
-                    data.NotifCode, data.NotifArgA, Shown(data.NotifKey.utf8_string()).c_str(),
-                    ValueOf(data).c_str());
+        std::printf("%s  %s\n", ToUtf8(wxDateTime::UNow().Format("%H:%M:%S.%l")).c_str(),
+                    Shown(what).c_str());
         bool const isWritten = FlushOutput();
         m_isOver = ++m_printed == m_limit || !isWritten;
         if (m_isOver)
             EndSignals::Raise();
     }
 
-private:
     int const m_limit;
     int m_printed = 0;
     bool m_isOver = false;
 };
 
-// A second session of this program, which works on tickets. It uses the slots of its container alone, since
-// the manager itself is for one thread.
-class BusySession
+// Another client, which has one job after another.
+class BusyClient
 {
 public:
-    BusySession(ComGUIManager& manager, comgui::Server const& server)
-        : m_manager(manager), m_login(NewRecord(server, {"operator", "operator"}))
-    {
-    }
-    BusySession(BusySession const&) = delete;
-    BusySession& operator=(BusySession const&) = delete;
-    ~BusySession() { std::free(m_login); }
+    BusyClient() = default;
+    BusyClient(BusyClient const&) = delete;
+    BusyClient& operator=(BusyClient const&) = delete;
+    ~BusyClient() { DeleteJob(); }
 
-    bool Start()
-    {
-        int result = m_manager.InitializeBackward(m_login, Stamp);
-        if (result == 0)
-            result = m_manager.LoginBackward(m_login);
-        if (result != 0)
-            return Fail("the second session cannot log in as operator", result);
-        m_container = m_manager.GetBackwardContainer();
-        m_thread = std::thread([this] { Work(); });
-        return true;
-    }
+    bool Enter(Server const& server) { return LOGIN{server, {"operator", "operator"}}.Enter(m_connection); }
 
-    void Stop()
+    void Work()
     {
-        if (!m_thread.joinable())
+        DeleteJob();
+        auto const job = m_tickets.Create(JobTickets);
+        if (!job)
             return;
-        {
-            std::lock_guard const guard(m_lock);
-            m_stop = true;
-        }
-        m_stopped.notify_all();
-        m_thread.join();
-        m_manager.LogoutBackward(m_login);
+        m_job = *job;
+        ++m_round;
+        (void)m_tickets.WriteAll(*job, {{"Job/Identification/Name", "Brochure " + std::to_string(m_round)},
+                                        {"Job/Copies", 100 * m_round},
+                                        {"Job/Progress", 12.5}});
     }
 
 private:
-    void Work()
+    void DeleteJob()
     {
-        MTICKET_MODIFY const& modify = *MTICKET_MODIFY::Of(m_container);
-        MTICKET_ADMIN const& admin = *MTICKET_ADMIN::Of(m_container);
-        MTICKET_READ const& read = *MTICKET_READ::Of(m_container);
-        for (int round = 1; Pause(); ++round)
-        {
-            int const job = admin.CreateNextTicket(JobType);
-            if (job < 0)
-                continue;
-            modify.SetParameter(JobType, job, "Job/Identification/Name",
-                                wxString::Format("Brochure %d", round), -1);
-            modify.SetParameter(JobType, job, "Job/Progress", 12.5, -1);
-            if (STICKET_ACCESS const* const ticket = read.OpenTicket(JobType, job))
-            {
-                STICKET_MODIFY::Of(ticket)->SetParameter("Job/Copies", 100 * round, -1);
-                admin.CloseTicket(JobType, job, false);
-            }
-            modify.DelParameter(JobType, job, "Job/Progress", -1);
-            m_container->MOPERATION(m_container->Instance, JobType, job, MTICKET_OP_DELETE, nullptr);
-        }
+        if (m_job)
+            (void)m_tickets.Delete(*m_job);
+        m_job.reset();
     }
 
-    // False when it is time to stop.
-    bool Pause()
-    {
-        std::unique_lock guard(m_lock);
-        return !m_stopped.wait_for(guard, std::chrono::milliseconds(500), [this] { return m_stop; });
-    }
-
-    ComGUIManager& m_manager;
-    TLogin* m_login;
-    MTICKET_ACCESS const* m_container = nullptr;
-    std::thread m_thread;
-    std::mutex m_lock;
-    std::condition_variable m_stopped;
-    bool m_stop = false;
+    Connection m_connection;
+    Tickets const m_tickets = m_connection.GetTickets();
+    std::optional<TicketAddress> m_job;
+    int m_round = 0;
 };
 
-bool Subscribe(ComGUIManager& manager, TLogin* login)
+// Until the user, the limit or the output ends it.
+void Watch(Connection& connection, OPTIONS const& options, BusyClient& busy, EndSignals const& end)
 {
-    if (int const result = manager.SetCallback(login, nullptr); result != 0)
-        return Fail("the plug-in takes no callback", result);
-    for (int const type : WatchedTypes)
-        manager.EnableNotifications(login, type, EveryKey);
-    return true;
-}
-
-int Watch(ComGUIManager& manager, TLogin* login, OPTIONS const& options, EndSignals const& end)
-{
-    if (!Subscribe(manager, login))
-        return Trouble;
     Printer printer(options.events);
-    auto receiver =
-        std::make_unique<EventReceiver>([&](ServerNotificationEvent const& event) { printer.Print(event); });
-
-    BusySession busy(manager, options.login.server);
-    bool const started = !options.busy || busy.Start();
-    if (started)
-    {
-        std::printf("Watching %s as %s; Ctrl-C ends it.\n", Shown(options.login.server.host).c_str(),
-                    Shown(manager.GetCurrentlyLoggedUser().utf8_string()).c_str());
-        if (FlushOutput())
-            end.Wait();
-    }
+    TaskQueue events;
+    Subscription const subscription =
+        connection.Subscribe(Interest::InAllTypes(), events.GetExecutor(),
+                             [&printer](Event const& event) { printer.Print(event); });
+    std::printf("Watching %s as %s; Ctrl-C ends it.\n", Shown(options.login.server.host).c_str(),
+                Shown(options.login.account.user).c_str());
+    if (!FlushOutput())
+        return;
+    std::thread printing([&events] { events.Run(); });
+    while (!end.WaitFor(std::chrono::milliseconds(500)))
+        if (options.busy)
+            busy.Work();
+    events.Stop();
+    printing.join();
     std::puts("\nLeaving.");
-    busy.Stop();
-
-    // The order in which a host leaves: receiver, notifications, session.
-    receiver.reset();
-    for (int const type : WatchedTypes)
-        manager.DisableNotifications(login, type);
-    return started && FlushOutput() ? Good : Trouble;
 }
 }  // namespace
 
@@ -219,14 +171,10 @@ int main(int argc, char** argv)
     OPTIONS options;
     if (auto const status = Parse(argc, argv, options))
         return *status;
-
-    ComGUIManager* const manager = ComGUIManager::GetInstance();
-    if (!IsPlugInThere())
+    Connection connection;
+    BusyClient busy;
+    if (!options.login.Enter(connection) || (options.busy && !busy.Enter(options.login.server)))
         return Trouble;
-    TLogin* const login = NewRecord(options.login.server, options.login.account);
-    if (!LogIn(*manager, login))
-        return Trouble;
-    int const status = Watch(*manager, login, options, end);
-    manager->Logout();  // and no Uninitialize, which waits: the process ends here anyway
-    return status;
+    Watch(connection, options, busy, end);
+    return FlushOutput() ? Good : Trouble;
 }
