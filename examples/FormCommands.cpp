@@ -1,17 +1,22 @@
 #include "FormCommands.h"
 
+#include "FormValue.h"
+#include "Output.h"
 #include "Shown.h"
 #include <algorithm>
+#include <chrono>
 #include <cstdio>
 #include <cstdlib>
 #include <poll.h>
+#include <string_view>
+#include <thread>
 #include <unistd.h>
 #include <utility>
 
+using namespace comgui;
+
 namespace
 {
-constexpr char const* EveryKey[] = {nullptr};
-
 // Bold and dim where a person looks.
 std::string Styled(char const* style, std::string const& text)
 {
@@ -35,35 +40,21 @@ std::string Plain(Json const& value)
 {
     return value.is_string() ? Shown(value.get_ref<std::string const&>()) : Line(value);
 }
-
-void ListType(SESSION const& session, int type, Json& all)
-{
-    std::vector<int> ids;
-    MTICKET_READ::Of(session.container)->GetTickets(type, ids);
-    for (int const id : ids)
-        try
-        {
-            TicketForm const form(session.manager, session.container, type, id);
-            all.push_back({{"type", type}, {"id", id}, {"keys", form.Keys().size()}});
-        }
-        catch (Refusal const&)
-        {
-            continue;  // somebody has deleted it meanwhile
-        }
-}
 }  // namespace
 
-void List(SESSION const& session, OPTIONS const& options)
+void ListTickets(Connection& connection, OPTIONS const& options)
 {
+    Tickets const tickets = connection.GetTickets();
+    int const asked = options.ticket.type;
     Json all = Json::array();
-    for (int type = 0; type < TicketTypes; ++type)
-        if (options.type == EveryType || options.type == type)
-            ListType(session, type, all);
-    if (all.empty() && options.type == EveryType)
-        throw Refusal("there are no tickets");
+    for (int const type : asked == EveryType ? Given(tickets.Types()) : std::vector<int>{asked})
+        for (TicketAddress const ticket : Given(tickets.List(type)))
+            if (auto const keys = tickets.Keys(ticket))  // somebody may delete it meanwhile
+                all.push_back({{"type", type}, {"id", ticket.id}, {"keys", keys->size()}});
     if (all.empty())
-        throw Refusal("there are no tickets of type " + std::to_string(options.type) +
-                      "; ticket_form list tells which there are");
+        throw Refusal(asked == EveryType ? "there are no tickets"
+                                         : "there are no tickets of type " + std::to_string(asked) +
+                                               "; ticket_form list tells which there are");
     if (options.json)
         return Print(Line(all));
     for (Json const& ticket : all)
@@ -73,12 +64,12 @@ void List(SESSION const& session, OPTIONS const& options)
 
 namespace
 {
-Json Described(TicketForm const& form, FIELD const& field)
+Json Described(SnapshotEntry const& entry)
 {
-    Json result = {{"key", field.key}, {"type", NameOf(field.type)}};
-    if (field.type == PARAM_COUNT)
-        result["of"] = NameOf(field.elementType);
-    result["value"] = form.Value(field);
+    Json result = {{"key", entry.key}, {"type", NameOf(entry.value.Type())}};
+    if (auto const* const list = std::get_if<List>(&entry.value))
+        result["of"] = NameOf(list->front().value.Type());
+    result["value"] = ToJson(entry.value);
     return result;
 }
 
@@ -98,27 +89,24 @@ void PrintFields(Json const& fields)
 }
 }  // namespace
 
-void Keys(SESSION const& session, OPTIONS const& options)
+void Keys(Connection& connection, OPTIONS const& options)
 {
-    TicketForm const form = session.Open(options);
+    Snapshot const all = Given(connection.GetTickets().ReadAll(options.ticket));
     Json fields = Json::array();
-    FIELD field;
-    for (std::string const& key : form.Keys())
-        if (key.rfind(options.key, 0) == 0 && form.Has(key, field))  // somebody may delete it meanwhile
-            fields.push_back(Described(form, field));
+    for (SnapshotEntry const& entry : all.Entries())
+        if (entry.key.rfind(options.key, 0) == 0)
+            fields.push_back(Described(entry));
     if (fields.empty() && !options.key.empty())
-        throw Refusal(form.Name() + " has no keys that begin with " + options.key);
+        throw Refusal("the ticket has no keys that begin with " + options.key);
     if (options.json)
         Print(Line(fields));
     else
         PrintFields(fields);
 }
 
-void Get(SESSION const& session, OPTIONS const& options)
+void Get(Connection& connection, OPTIONS const& options)
 {
-    TicketForm const form = session.Open(options);
-    FIELD const field = form.Field(options.key);
-    Json const value = options.pos == WholeKey ? form.Value(field) : form.Value(field, options.pos);
+    Json const value = ToJson(Given(connection.GetTickets().Read(options.ticket, options.key, options.pos)));
     if (options.json || !value.is_array())
         return Print(options.json ? Line(value) : Plain(value));
     for (Json const& element : value)
@@ -128,195 +116,165 @@ void Get(SESSION const& session, OPTIONS const& options)
 namespace
 {
 // The type for a new value: the one that was asked for, or the one that is there.
-PARAM_TYPE TypeFor(TicketForm const& form, std::string const& key, OPTIONS const& options, bool isList)
+PARAM_TYPE TypeFor(Tickets const& tickets, OPTIONS const& options, std::string const& key, bool isList)
 {
-    FIELD field;
-    bool const isThere = form.Has(key, field);
-    if (isThere && field.type == PARAM_COUNT && !isList && options.pos == WholeKey)
+    auto before = tickets.Read(options.ticket, key, options.pos);
+    if (!before && options.pos != WholeKey)
+        before = tickets.Read(options.ticket, key);  // beside the others of the list
+    bool const isNew = !before && before.GetError().code == NoSuchKey;
+    if (isNew && options.typeName.empty())
+        throw Refusal(before.GetError().Text() + "; to make it, say --type");
+    Value const value = isNew ? Value() : Given(std::move(before));
+    auto const* const list = std::get_if<List>(&value);
+    if (list && !isList && options.pos == WholeKey)
         throw Refusal(key + " is a list; write one of its values with --pos, or all of them with set-list");
     if (!options.typeName.empty())
         return TypeOf(options.typeName);
-    if (!isThere)
-        throw Refusal(form.Name() + " has no " + key + "; to make it, say --type");
-    if (field.type != PARAM_COUNT)
-        return field.type;
-    PARAM_TYPE const stored = options.pos == WholeKey ? PARAM_NONE : form.TypeAt(key, options.pos);
-    PARAM_TYPE const type = stored == PARAM_NONE ? field.elementType : stored;
-    if (type == PARAM_NONE)
-        throw Refusal(key + " has no value any more that tells its type; say --type");
-    return type;
+    return list ? list->front().value.Type() : value.Type();
 }
 
-void AddFields(SETMULTIPAR_LIST& list, TicketForm const& form, OPTIONS const& options)
+// All of them are checked before one is written.
+void Write(Tickets const& tickets, OPTIONS const& options, bool isList)
 {
-    for (std::string const& text : options.fields)
+    std::vector<KeyValue> values;
+    for (std::string const& field : options.fields)
     {
-        auto const [key, value] = SplitField(text);
-        AddValue(list, key, TypeFor(form, key, options, false), value, options.pos);
+        auto const [key, text] = SplitField(field);
+        PARAM_TYPE const type = TypeFor(tickets, options, key, isList);
+        values.push_back({key, ValueOf(key, text, isList ? PARAM_COUNT : type, type)});
     }
+    std::vector<Outcome> outcomes;
+    if (options.pos == WholeKey)
+        outcomes = tickets.WriteAll(options.ticket, values);
+    else
+        for (auto const& [key, value] : values)
+            outcomes.push_back(tickets.Write(options.ticket, key, value, options.pos));
+    std::string refused;
+    for (Outcome const& outcome : outcomes)
+        if (!outcome)
+            refused += (refused.empty() ? "" : "; ") + outcome.GetError().Text();
+    if (!refused.empty())
+        throw Refusal(refused);
 }
 }  // namespace
 
-// All of them are checked before one is written.
-void Set(SESSION const& session, OPTIONS const& options)
+void Set(Connection& connection, OPTIONS const& options) { Write(connection.GetTickets(), options, false); }
+
+void SetList(Connection& connection, OPTIONS const& options)
 {
-    TicketForm const form = session.Open(options);
-    SETMULTIPAR_LIST list(false);
-    AddFields(list, form, options);
-    form.Write(list);
+    Write(connection.GetTickets(), options, true);
 }
 
-void SetList(SESSION const& session, OPTIONS const& options)
+void Delete(Connection& connection, OPTIONS const& options)
 {
-    TicketForm const form = session.Open(options);
-    SETMULTIPAR_LIST list(false);
-    for (std::string const& text : options.fields)
-    {
-        auto const [key, value] = SplitField(text);
-        PARAM_TYPE const type = TypeFor(form, key, options, true);
-        list.DelParameter(key.c_str(), WholeKey);  // what the old list has more than the new one
-        int pos = 0;
-        for (std::string const& element : SplitList(key, value))
-            AddValue(list, key, type, element, pos++);
-    }
-    form.Write(list);
-}
-
-void Delete(SESSION const& session, OPTIONS const& options)
-{
-    TicketForm const form = session.Open(options);
-    form.Delete(form.Field(options.key), options.pos);
+    Tickets const tickets = connection.GetTickets();
+    Given(tickets.Read(options.ticket, options.key, options.pos));  // or say that it is not there
+    Given(tickets.Write(options.ticket, options.key, Value(), options.pos));
 }
 
 namespace
 {
-Json ValueOf(NotifData const& data)
-{
-    switch (data.NotifValueType)
-    {
-    case PARAM_NONE:
-        return {};
-    case PARAM_STRING:
-        return data.NotifText.utf8_string();
-    case PARAM_DOUBLE:
-        return data.NotifNumber;
-    case PARAM_INT:
-        return static_cast<int>(data.NotifNumber);
-    default:
-        return std::string("(") + NameOf(data.NotifValueType) + ")";
-    }
-}
-
-char const* WhatHappened(NotifData const& data)
-{
-    constexpr int Parameter = 1;
-    constexpr int Created = 4;
-    constexpr int Deleted = 5;
-    switch (data.NotifKind)
-    {
-    case Parameter:
-        return data.NotifValueType == PARAM_NONE ? "deleted" : "changed";
-    case Created:
-        return "ticket created";
-    case Deleted:
-        return "ticket deleted";
-    default:
-        return "notified";
-    }
-}
-
-void PrintEvent(NotifData const& data, bool json)
-{
-    std::string const key = data.NotifKey.utf8_string();
-    Json const value = ValueOf(data);
-    if (json)
-        return Print(Line({{"type", data.NotifCode},
-                           {"id", data.NotifArgA},
-                           {"event", WhatHappened(data)},
-                           {"key", key},
-                           {"value", value}}));
-    Print(std::to_string(data.NotifCode) + " " + std::to_string(data.NotifArgA) + "  " + Bold(Shown(key)) +
-          "  " + Dim(WhatHappened(data)) + (value.is_null() ? "" : "  " + Line(value)));
-}
-
-// Prints events on the receiver's thread, quickly, since the plug-in waits meanwhile.
+// Prints events, one for each key.
 class Printer
 {
 public:
-    explicit Printer(OPTIONS const& options) : m_options(options) {}
+    Printer(Tickets tickets, OPTIONS const& options) : m_tickets(std::move(tickets)), m_options(options) {}
 
-    void Print(NotifData const& data)
+    void Print(Event const& event)
     {
-        bool const isAsked = data.NotifCode == m_options.type &&
-                             (m_options.id == EveryTicket || m_options.id == data.NotifArgA);
-        if (!isAsked || (m_options.events != 0 && m_printed == m_options.events))
+        std::visit([this](auto const& what) { Take(what); }, event);
+    }
+
+private:
+    void Take(TicketCreated const& created) { Print(created.ticket, "ticket created"); }
+    void Take(TicketDeleted const& deleted) { Print(deleted.ticket, "ticket deleted"); }
+    void Take(ManyTicketsChanged many) { Print({many.type, EveryTicket}, "tickets changed"); }
+    void Take(TicketChanged const& changed)
+    {
+        if (changed.isWhole)
+            Print(changed.ticket, "ticket changed");
+        for (auto const& [key, value] : changed.keys)
+            Print(changed.ticket, value && value->IsNone() ? "deleted" : "changed", key,
+                  value ? *value
+                        : m_tickets.Read(changed.ticket, key, WholeKey, Paths::AsStored).ValueOr({}));
+    }
+    void Take(TransferProgressed const&) {}
+    void Take(TransferEnded const&) {}
+    void Take(ServerLost const& lost) { Fail(lost.error.Text()); }
+    void Take(ServerBack) { Fail("the server is back"); }
+
+    void Print(TicketAddress ticket, char const* what, std::string const& key = {}, Value const& value = {})
+    {
+        if (m_options.events != 0 && m_printed == m_options.events)
             return;
-        PrintEvent(data, m_options.json);
+        Json const json = ToJson(value);
+        if (m_options.json)
+            ::Print(Line(
+                {{"type", ticket.type}, {"id", ticket.id}, {"event", what}, {"key", key}, {"value", json}}));
+        else
+            ::Print(std::to_string(ticket.type) + " " + std::to_string(ticket.id) + "  " + Bold(Shown(key)) +
+                    "  " + Dim(what) + (json.is_null() ? "" : "  " + Line(json)));
         if (++m_printed == m_options.events)
             EndSignals::Raise();
     }
 
-private:
+    Tickets const m_tickets;
     OPTIONS const& m_options;
     int m_printed = 0;
 };
 
-void WriteLine(SESSION const& session, OPTIONS options, std::string const& line)
+void WriteLine(Tickets const& tickets, OPTIONS options, std::string const& line)
 try
 {
     options.fields = {line};
-    Set(session, options);
+    Write(tickets, options, false);
 }
 catch (Refusal const& refusal)
 {
     Fail(refusal.what());
 }
 
-// Writes what comes on standard input, line by line, until that ends, or the program shall: then true.
-bool WriteLines(SESSION const& session, OPTIONS const& options, EndSignals const& end)
+// Takes what comes on standard input within a moment, and calls write(line) for each line. rest: of a line
+// whose end is still to come; the last one may lack it. False if the input has ended.
+template <typename Write>
+bool TakeInput(std::string& rest, Write write)
 {
-    std::string line;
-    while (!end.WaitFor(std::chrono::milliseconds(0)))
-    {
-        pollfd input = {STDIN_FILENO, POLLIN, 0};
-        if (poll(&input, 1, 100) <= 0)
-            continue;
-        char bytes[4096];
-        ssize_t const size = read(STDIN_FILENO, bytes, sizeof bytes);
-        if (size <= 0)  // the last line may lack its end
-        {
-            if (!line.empty())
-                WriteLine(session, options, line);
-            return false;
-        }
-        for (char const byte : std::string(bytes, static_cast<std::size_t>(size)))
-            if (byte != '\n')
-                line += byte;
-            else
-                WriteLine(session, options, std::exchange(line, {}));
-    }
+    pollfd input = {STDIN_FILENO, POLLIN, 0};
+    if (poll(&input, 1, 100) <= 0)
+        return true;
+    char bytes[4096];
+    ssize_t const size = read(STDIN_FILENO, bytes, sizeof bytes);
+    if (size <= 0 && !rest.empty())
+        write(rest);
+    if (size <= 0)
+        return false;
+    for (char const byte : std::string_view(bytes, static_cast<std::size_t>(size)))
+        if (byte != '\n')
+            rest += byte;
+        else
+            write(std::exchange(rest, {}));
     return true;
 }
 }  // namespace
 
-void Watch(SESSION const& session, OPTIONS const& options, EndSignals const& end)
+void Watch(Connection& connection, OPTIONS const& options, EndSignals const& end)
 {
-    if (options.id != EveryTicket)
-        session.Open(options);  // or say that there is none
-    if (session.manager.SetCallback(session.login, nullptr) != 0)
-        throw std::runtime_error("the plug-in takes no callback");
-    if (options.id == EveryTicket)
-        session.manager.EnableNotifications(session.login, options.type, EveryKey);
-    else
-        session.manager.EnableNotifications(session.login, options.type, options.id, EveryKey);
-    Printer printer(options);
-    {
-        EventReceiver const receiver([&](ServerNotificationEvent const& event)
-                                     { printer.Print(event.GetNotifData()); });
-        std::fprintf(stderr, "%s: watching; Ctrl-C ends it\n", ProgramName);
-        bool hasEnded = options.edit && WriteLines(session, options, end);
-        while (!hasEnded)
-            hasEnded = end.WaitFor(std::chrono::seconds(1));
-    }
-    session.manager.DisableNotifications(session.login, options.type);
+    Tickets const tickets = connection.GetTickets();
+    bool const isOne = options.ticket.id != EveryTicket;
+    if (isOne)
+        Given(tickets.Keys(options.ticket));  // or say that there is none
+    Printer printer(tickets, options);
+    TaskQueue events;
+    Subscription const subscription = connection.Subscribe(
+        isOne ? Interest::InTickets({options.ticket}) : Interest::InTypes({options.ticket.type}),
+        events.GetExecutor(), [&printer](Event const& event) { printer.Print(event); });
+    std::thread printing([&events] { events.Run(); });
+    std::fprintf(stderr, "%s: watching; Ctrl-C ends it\n", ProgramName);
+    std::string line;
+    bool isEdited = options.edit;
+    while (!end.WaitFor(std::chrono::seconds(isEdited ? 0 : 1)))
+        isEdited = isEdited &&
+                   TakeInput(line, [&](std::string const& whole) { WriteLine(tickets, options, whole); });
+    events.Stop();
+    printing.join();
 }

@@ -1,19 +1,21 @@
 // Shows and edits the tickets of a server in a terminal, as a form of a graphical client would. The command
 // line; the commands stand in a file of their own.
 #include "FormCommands.h"
+#include "FormValue.h"
+#include "Output.h"
 #include <CLI/CLI.hpp>
 #include <algorithm>
 #include <climits>
 #include <csignal>
-#include <cstdio>
 #include <functional>
 #include <optional>
-#include <wx/init.h>
 
 char const ProgramName[] = "ticket_form";
 
 namespace
 {
+using namespace comgui;
+
 constexpr int LargestPosition = 0xFFFFFF;
 constexpr int LargestId = 0xFFFFFF;
 
@@ -35,8 +37,8 @@ void CheckField(std::string const& text) { SplitField(text); }
 
 void CheckListField(std::string const& text)
 {
-    auto const [key, value] = SplitField(text);
-    SplitList(key, value);
+    auto const [key, values] = SplitField(text);
+    ValueOf(key, values, PARAM_COUNT, PARAM_STRING);
 }
 
 // What is wrong whatever the server has is found before it is asked.
@@ -60,16 +62,18 @@ CLI::Validator Checked(void (*check)(std::string const&))
 class CommandLine
 {
 public:
-    using COMMAND = std::function<void(SESSION const&)>;
+    using COMMAND = std::function<void(Connection&)>;
 
     CommandLine()
     {
         m_app.require_subcommand(0, 1);  // none is told below, once unknown words were
         m_app.fallthrough();
-        m_app.add_option("-u,--user", m_options.user, "Log in as this user")->capture_default_str();
-        m_app.add_option("-p,--password", m_options.password, "With this password")->capture_default_str();
-        m_app.add_option("-s,--server", m_options.host, "At this host")->capture_default_str();
-        m_app.add_option("-o,--port", m_options.port, "And port")
+        m_app.add_option("-u,--user", m_options.login.account.user, "Log in as this user")
+            ->capture_default_str();
+        m_app.add_option("-p,--password", m_options.login.account.password, "With this password")
+            ->capture_default_str();
+        m_app.add_option("-s,--server", m_options.login.server.host, "At this host")->capture_default_str();
+        m_app.add_option("-o,--port", m_options.login.server.port, "And port")
             ->capture_default_str()
             ->transform(NumberIn(LeastPort, LargestPort));
         m_app.add_flag("-j,--json", m_options.json, "Print JSON");
@@ -111,28 +115,29 @@ public:
     }
 
     OPTIONS const& Options() const { return m_options; }
-    void Run(SESSION const& session) const { m_run(session); }
+    void Run(Connection& connection) const { m_run(connection); }
 
 private:
     CLI::App* AddCommand(char const* name, char const* description, char const* footer,
-                         void (*run)(SESSION const&, OPTIONS const&))
+                         void (*run)(Connection&, OPTIONS const&))
     {
         CLI::App* const command = m_app.add_subcommand(name, description);
         command->footer(footer);
         command->callback([this, run]
-                          { m_run = [this, run](SESSION const& session) { run(session, m_options); }; });
+                          { m_run = [this, run](Connection& connection) { run(connection, m_options); }; });
         return command;
     }
 
     CLI::Option* AddType(CLI::App* command)
     {
-        return command->add_option("TYPE", m_options.type, "Type of ticket")
+        return command->add_option("TYPE", m_options.ticket.type, "Type of ticket")
             ->transform(NumberIn(0, TicketTypes - 1));
     }
 
     CLI::Option* AddId(CLI::App* command)
     {
-        return command->add_option("ID", m_options.id, "Its number")->transform(NumberIn(0, LargestId));
+        return command->add_option("ID", m_options.ticket.id, "Its number")
+            ->transform(NumberIn(0, LargestId));
     }
 
     void AddTicket(CLI::App* command)
@@ -149,7 +154,7 @@ private:
     void AddReading()
     {
         AddType(AddCommand("list", "List the tickets of a type, or of all",
-                           "A line is type, id and the number of keys.", List));
+                           "A line is type, id and the number of keys.", ListTickets));
         CLI::App* const keys = AddCommand("keys", "Show a ticket: its keys with their types and values",
                                           "Values are shown as JSON; null is a gap in a list.", Keys);
         AddTicket(keys);
@@ -186,7 +191,7 @@ private:
             AddCommand("set-list", "Write whole lists",
                        "KEY=a,b,c puts three values under KEY instead of what was there; KEY= deletes it. "
                        "Quotes keep\ncommas: KEY='a,\"b,c\"' are two values; a quote within quotes is "
-                       "written twice.",
+                       "written twice.\nNothing between two commas is a gap, \"\" an empty text.",
                        SetList),
             "The key, and its values with commas between them", CheckListField);
         CLI::App* const remove =
@@ -207,7 +212,7 @@ private:
             [this]
             {
                 m_end.emplace();  // here, before any thread; the other commands end by Ctrl-C at once
-                m_run = [this](SESSION const& session) { Watch(session, m_options, *m_end); };
+                m_run = [this](Connection& connection) { Watch(connection, m_options, *m_end); };
             });
         AddType(watch)->required();
         CLI::Option* const id = AddId(watch);
@@ -224,26 +229,18 @@ private:
 };
 
 int Run(CommandLine const& commandLine)
+try
 {
-    OPTIONS const& options = commandLine.Options();
-    ComGUIManager* const manager = ComGUIManager::GetInstance();
-    if (!IsPlugInThere())
+    Connection connection;
+    if (!commandLine.Options().login.Enter(connection))
         return Trouble;
-    TLogin* const login = NewRecord({options.host, options.port}, {options.user, options.password});
-    if (!LogIn(*manager, login))
-        return Trouble;
-    int status = Good;
-    try
-    {
-        commandLine.Run({*manager, login, manager->GetClientContainer()});
-    }
-    catch (std::exception const& e)
-    {
-        Fail(e.what());
-        status = dynamic_cast<Refusal const*>(&e) ? Refused : Trouble;
-    }
-    manager->Logout();  // and no Uninitialize, which waits: the process ends here anyway
-    return status;
+    commandLine.Run(connection);
+    return Good;
+}
+catch (Refusal const& refusal)
+{
+    Fail(refusal.what());
+    return Refused;
 }
 }  // namespace
 
@@ -251,12 +248,6 @@ int main(int argc, char** argv)
 try
 {
     std::signal(SIGPIPE, SIG_IGN);
-    wxInitializer const wx;  // without the arguments, of which it would warn where they are no UTF-8
-    if (!wx.IsOk())
-    {
-        std::fputs("ticket_form: wxWidgets cannot be started\n", stderr);
-        return Trouble;
-    }
     CommandLine commandLine;
     if (auto const status = commandLine.Parse(argc, argv))
         return *status;
