@@ -10,6 +10,7 @@
 #include <comgui/client.h>
 #include <csignal>
 #include <cstdio>
+#include <exception>
 #include <optional>
 #include <string>
 #include <thread>
@@ -165,6 +166,7 @@ void Watch(Connection& connection, OPTIONS const& options, BusyClient& busy, End
 }  // namespace
 
 int main(int argc, char** argv)
+try
 {
     std::signal(SIGPIPE, SIG_IGN);
     EndSignals const end;
@@ -177,4 +179,9 @@ int main(int argc, char** argv)
         return Trouble;
     Watch(connection, options, busy, end);
     return FlushOutput() ? Good : Trouble;
+}
+catch (std::exception const& e)  // such as no thread to be had
+{
+    Fail(e.what());
+    return Trouble;
 }
