@@ -1,178 +1,21 @@
-// The whole window at a server, driven as a user would, on a display that nobody sees. Controls are found by
-// their accessible names.
-#include "desk/view/MainFrame.h"
+// The whole window at a server: a login, tickets and their keys, events, jobs, the loss of the server.
+#include "tests/desk/WindowOfTheDesk.h"
 
 #include "comgui/comgui.h"
 #include "desk/view/JobsPane.h"
-#include "desk/view/VirtualList.h"
-#include "tests/client/Client.h"
 #include "tests/client/TroubledPlugIn.h"
 #include "tests/support/BundleOnDisk.h"
-#include <algorithm>
-#include <chrono>
 #include <dlfcn.h>
 #include <filesystem>
 #include <fstream>
 #include <gmock/gmock.h>
-#include <wx/app.h>
 #include <wx/button.h>
-#include <wx/combobox.h>
-#include <wx/evtloop.h>
-#include <wx/fileconf.h>
 #include <wx/infobar.h>
-#include <wx/menu.h>
 #include <wx/srchctrl.h>
-#include <wx/textctrl.h>
 
 using namespace desk;
-using namespace std::chrono_literals;
-using testing::AllOf;
 using testing::Contains;
 using testing::HasSubstr;
-using testing::Not;
-
-namespace
-{
-// Also for dialogs, which run a loop of their own.
-void RunEvents()
-{
-    wxTheApp->ProcessPendingEvents();
-    wxEventLoopBase::GetActive()->YieldFor(wxEVT_CATEGORY_ALL);
-    wxMilliSleep(5);
-}
-
-template <typename Condition>
-bool Await(Condition condition)
-{
-    for (auto const end = std::chrono::steady_clock::now() + 20s;
-         !condition() && std::chrono::steady_clock::now() < end;)
-        RunEvents();
-    return condition();
-}
-
-template <typename T>
-T* Find(wxString const& name)
-{
-    return dynamic_cast<T*>(wxWindow::FindWindowByName(name));
-}
-
-class Rows
-{
-public:
-    explicit Rows(wxString const& list) : m_list(Find<VirtualList>(list)) {}
-
-    unsigned Count() const { return Model().GetCount(); }
-    std::string Cell(unsigned row, unsigned column) const
-    {
-        wxVariant value;
-        Model().GetValueByRow(value, row, column);
-        return comgui::ToUtf8(value.GetString());
-    }
-    std::vector<std::string> Column(unsigned column) const
-    {
-        std::vector<std::string> cells;
-        for (unsigned row = 0; row < Count(); ++row)
-            cells.push_back(Cell(row, column));
-        return cells;
-    }
-    std::optional<unsigned> RowOf(unsigned column, std::string const& text) const
-    {
-        for (unsigned row = 0; row < Count(); ++row)
-            if (Cell(row, column).ends_with(text))
-                return row;
-        return std::nullopt;
-    }
-    void Select(unsigned row) const
-    {
-        m_list->SelectRow(row);
-        wxDataViewEvent event(wxEVT_DATAVIEW_SELECTION_CHANGED, m_list, Model().GetItem(row));
-        m_list->ProcessWindowEvent(event);
-    }
-    VirtualList* List() const { return m_list; }
-
-private:
-    wxDataViewVirtualListModel& Model() const
-    {
-        return *static_cast<wxDataViewVirtualListModel*>(m_list->GetModel());
-    }
-    VirtualList* m_list;
-};
-
-class WindowOfTheDesk : public Client
-{
-protected:
-    WindowOfTheDesk()
-    {
-        delete wxConfigBase::Set(new wxFileConfig("desk", {}, (folder / "desk.conf").string()));
-        frame->Show();
-    }
-    ~WindowOfTheDesk() override
-    {
-        frame->Close(true);
-        RunEvents();
-        delete wxConfigBase::Set(nullptr);
-    }
-
-    // The desk, and the other client that changes things.
-    void Enter()
-    {
-        frame->LogIn(Here(), Admin());
-        ASSERT_TRUE(Await([this] { return types.Count() > 0; }));
-        LogIn();
-    }
-    void ShowJob(comgui::TicketAddress job)
-    {
-        ASSERT_TRUE(Await([&] { return Choose(types, 0, "Jobs"); }));
-        std::string const name = "3/" + std::to_string(job.id);
-        ASSERT_TRUE(Await([&] { return Choose(shown, 0, name); }));
-        ASSERT_TRUE(Await([&] { return heading() == "Jobs " + name; }));
-    }
-    static bool Choose(Rows const& rows, unsigned column, std::string const& text)
-    {
-        auto const row = rows.RowOf(column, text);
-        if (row)
-            rows.Select(*row);
-        return row.has_value();
-    }
-    std::string ValueOf(std::string const& key) const
-    {
-        auto const row = keys.RowOf(0, key);
-        return row ? keys.Cell(*row, 2) : "none";
-    }
-    void Menu(int id) const
-    {
-        wxCommandEvent event(wxEVT_MENU, id);
-        frame->ProcessWindowEvent(event);
-    }
-    int MenuOf(wxString const& menu, wxString const& text) const
-    {
-        return frame->GetMenuBar()->FindMenuItem(menu, text);
-    }
-    // As an edit in the cell ends.
-    void Type(std::string const& key, std::string const& text) const
-    {
-        auto const row = keys.RowOf(0, key);
-        ASSERT_TRUE(row);
-        keys.List()->StartEditing(*row, 2);
-        ASSERT_TRUE(Await([] { return Find<wxTextCtrl>("value editor") != nullptr; }));
-        auto* const editor = Find<wxTextCtrl>("value editor");
-        editor->SetValue(comgui::ToWx(text));
-        wxCommandEvent enter(wxEVT_TEXT_ENTER, editor->GetId());
-        enter.SetEventObject(editor);
-        editor->GetEventHandler()->ProcessEvent(enter);
-    }
-    std::string Status() const { return comgui::ToUtf8(frame->GetStatusBar()->GetStatusText()); }
-
-    std::function<std::string()> const heading = []
-    { return comgui::ToUtf8(Find<wxWindow>("heading")->GetLabel()); };
-    MainFrame* const frame = new MainFrame;
-    Rows const types{"types"};
-    Rows const shown{"tickets"};
-    Rows const keys{"keys"};
-    Rows const events{"events"};
-    Rows const jobs{"jobs"};
-};
-}  // namespace
 
 TEST_F(WindowOfTheDesk, AsksUntilTheLoginSucceeds)
 {
