@@ -205,6 +205,14 @@ bool EventLog::IsWanted(EventRow const& row) const
     return !m_filter.isWanted || m_filter.isWanted(row.key) || m_filter.isWanted(row.text);
 }
 
+std::optional<std::size_t> EventLog::IndexOf(std::size_t number) const
+{
+    auto const place = std::ranges::lower_bound(m_shown, number);
+    return place != m_shown.end() && *place == number
+               ? std::optional(static_cast<std::size_t>(place - m_shown.begin()))
+               : std::nullopt;
+}
+
 EventLog::Changes EventLog::TakeChanges()
 {
     std::size_t const end = m_shownGone + m_shown.size();

@@ -97,6 +97,10 @@ public:
     std::size_t RowCount() const { return m_shown.size(); }
     EventRow const& RowAt(std::size_t row) const { return m_rows.rows[m_shown[row] - m_gone]; }
 
+    // A row's number stays its own, whatever comes and goes.
+    std::size_t NumberOf(std::size_t row) const { return m_shown[row]; }
+    std::optional<std::size_t> IndexOf(std::size_t number) const;  // nothing: not shown; O(log rows)
+
     std::size_t AllRows() const { return m_rows.rows.size(); }
 
     Changes TakeChanges();

@@ -65,8 +65,9 @@ bool OutlineRenderer::ActivateCell(wxRect const&, wxDataViewModel*, wxDataViewIt
     return true;
 }
 
-ValueRenderer::ValueRenderer(std::function<wxString()> whole)
-    : wxDataViewCustomRenderer("string", wxDATAVIEW_CELL_EDITABLE, wxALIGN_LEFT), m_whole(std::move(whole))
+ValueRenderer::ValueRenderer(std::function<wxString()> whole, std::function<void()> refuse)
+    : wxDataViewCustomRenderer("string", wxDATAVIEW_CELL_EDITABLE, wxALIGN_LEFT), m_whole(std::move(whole)),
+      m_refuse(std::move(refuse))
 {
 }
 
@@ -86,8 +87,16 @@ bool ValueRenderer::Render(wxRect cell, wxDC* dc, int state)
 
 wxWindow* ValueRenderer::CreateEditorCtrl(wxWindow* parent, wxRect cell, wxVariant const&)
 {
+    wxString const whole = m_whole();
     auto* const editor =
-        new wxTextCtrl(parent, wxID_ANY, m_whole(), cell.GetTopLeft(), cell.GetSize(), wxTE_PROCESS_ENTER);
+        new wxTextCtrl(parent, wxID_ANY, whole, cell.GetTopLeft(), cell.GetSize(), wxTE_PROCESS_ENTER);
+    m_begun = editor->GetValue();
+    if (m_begun != whole)
+    {
+        editor->Destroy();
+        m_refuse();
+        return nullptr;
+    }
     editor->SetName("value editor");
     editor->SelectAll();
     return editor;
@@ -95,7 +104,8 @@ wxWindow* ValueRenderer::CreateEditorCtrl(wxWindow* parent, wxRect cell, wxVaria
 
 bool ValueRenderer::GetValueFromEditorCtrl(wxWindow* editor, wxVariant& value)
 {
-    value = static_cast<wxTextCtrl*>(editor)->GetValue();
-    return true;
+    wxString const text = static_cast<wxTextCtrl*>(editor)->GetValue();
+    value = text;
+    return text != m_begun;
 }
 }  // namespace desk

@@ -39,8 +39,9 @@ private:
 class ValueRenderer : public wxDataViewCustomRenderer
 {
 public:
-    // whole: the text to be edited, of the row that is edited.
-    explicit ValueRenderer(std::function<wxString()> whole);
+    // whole: the text to be edited, of the row that is edited. refuse: the editor cannot hold all of it, and
+    // what is missing would be lost.
+    ValueRenderer(std::function<wxString()> whole, std::function<void()> refuse);
 
     bool SetValue(wxVariant const& value) override;
     bool GetValue(wxVariant&) const override { return false; }
@@ -48,13 +49,15 @@ public:
     bool Render(wxRect cell, wxDC* dc, int state) override;
     bool HasEditorCtrl() const override { return true; }
     wxWindow* CreateEditorCtrl(wxWindow* parent, wxRect cell, wxVariant const& value) override;
-    bool GetValueFromEditorCtrl(wxWindow* editor, wxVariant& value) override;
+    bool GetValueFromEditorCtrl(wxWindow* editor, wxVariant& value) override;  // false: it is as it was
 #if wxUSE_ACCESSIBILITY
     wxString GetAccessibleDescription() const override { return m_text; }
 #endif
 
 private:
     std::function<wxString()> const m_whole;
+    std::function<void()> const m_refuse;
     wxString m_text;
+    wxString m_begun;  // what the editor held before the user typed
 };
 }  // namespace desk

@@ -114,6 +114,13 @@ EventsPane::EventsPane(wxWindow* parent) : wxPanel(parent)
                       event.IsChecked() ? m_log.Pause() : m_log.Resume();
                       Repaint();
                   });
+    m_list->Bind(wxEVT_DATAVIEW_SELECTION_CHANGED,
+                 [this](auto&)
+                 {
+                     auto const row = m_list->Selected();
+                     m_chosen =
+                         row && *row < m_log.RowCount() ? std::optional(m_log.NumberOf(*row)) : std::nullopt;
+                 });
     m_list->Bind(wxEVT_DATAVIEW_ITEM_ACTIVATED, [this](auto&) { Choose(); });
 }
 
@@ -129,11 +136,22 @@ void EventsPane::Repaint()
     std::size_t const before = m_shown;
     m_shown = m_log.RowCount();
     if (changes.isReset || changes.gone > 0)
-        m_list->Reset();
+        Reset();
     else
         m_list->RowsReplaced(before, 0, changes.came);
     if (m_shown > 0 && !m_list->Selected())
         m_list->ShowRow(static_cast<unsigned>(m_shown - 1));
+}
+
+// Rows move, what is chosen stays so.
+void EventsPane::Reset()
+{
+    m_list->Reset();
+    auto const row = m_chosen ? m_log.IndexOf(*m_chosen) : std::nullopt;
+    if (row)
+        m_list->SelectRow(static_cast<unsigned>(*row));
+    else
+        m_chosen.reset();
 }
 
 void EventsPane::ShowOnly(std::optional<comgui::TicketAddress> ticket)

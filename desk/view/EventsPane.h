@@ -42,10 +42,12 @@ private:
     bool Look(unsigned row, unsigned column, wxDataViewItemAttr& look) const override;
 
     void Filter();
+    void Reset();
     void Choose();
 
     EventLog m_log;
     std::size_t m_shown = 0;  // rows that the list knows
+    std::optional<std::size_t> m_chosen;  // its number in the log
     std::optional<comgui::TicketAddress> m_ticket;
     wxSearchCtrl* m_filter;
     wxCheckBox* m_onlyTicket;

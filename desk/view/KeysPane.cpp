@@ -4,7 +4,9 @@
 #include "desk/model/TextMatch.h"
 #include "desk/view/CellRenderers.h"
 #include "desk/view/Theme.h"
+#include <algorithm>
 #include <comgui/client/Text.h>
+#include <utility>
 #include <wx/intl.h>
 #include <wx/richtooltip.h>
 #include <wx/sizer.h>
@@ -44,12 +46,8 @@ KeysPane::KeysPane(wxWindow* parent) : wxPanel(parent)
         new OutlineRenderer([this](wxDataViewItem const& item) { Toggle(m_list->RowOf(item)); }));
     m_list->AddTextColumn(_("Type"), 80);
     m_list->AddColumn(_("Value"), 360,
-                      new ValueRenderer(
-                          [this]
-                          {
-                              auto const* const value = ValueOf(m_edited);
-                              return value ? comgui::ToWx(comgui::ToText(*value)) : wxString();
-                          }));
+                      new ValueRenderer([this] { return comgui::ToWx(comgui::ToText(m_begun)); },
+                                        [this] { CallAfter([this] { RefuseEdit(); }); }));
 
     auto* const top = new wxBoxSizer(wxHORIZONTAL);
     top->Add(m_heading, wxSizerFlags(1).CenterVertical().Border());
@@ -72,6 +70,14 @@ KeysPane::KeysPane(wxWindow* parent) : wxPanel(parent)
                  {
                      unsigned const row = m_list->RowOf(event.GetItem());
                      m_edited = row < m_outline.RowCount() ? m_outline.PathAt(row) : std::string();
+                     auto const* const value = ValueOf(m_edited);
+                     m_begun = value ? *value : comgui::Value();
+                     event.Skip();
+                 });
+    m_list->Bind(wxEVT_DATAVIEW_ITEM_EDITING_DONE,
+                 [this](wxDataViewEvent& event)
+                 {
+                     CallAfter([this] { TakeLate(); });
                      event.Skip();
                  });
     m_list->Bind(wxEVT_CHAR_HOOK, &KeysPane::Move, this);
@@ -80,6 +86,8 @@ KeysPane::KeysPane(wxWindow* parent) : wxPanel(parent)
 
 void KeysPane::ShowTicket(wxString const& heading)
 {
+    m_list->CancelEditing();
+    m_late.reset();
     m_heading->SetLabelText(heading);
     m_content.Clear();
     m_isNew = true;
@@ -90,21 +98,40 @@ void KeysPane::ShowTicket(wxString const& heading)
 void KeysPane::Take(comgui::Snapshot const& ticket,
                     std::vector<comgui::SnapshotDifference> const& differences)
 {
+    bool const isWhole = m_isNew || differences.size() > ManyChanges;
+    bool const doRowsStay = !isWhole && !m_outline.IsFiltered() &&
+                            std::ranges::all_of(differences, [](comgui::SnapshotDifference const& difference)
+                                                { return difference.before && difference.after; });
     auto const now = Clock::now();
-    if (m_isNew || differences.size() > ManyChanges)
-    {
-        m_content.Show(ticket, now);
-        m_outline.Show(m_content.Keys());
-        if (m_isNew && m_content.Size() <= FewKeys)
-            m_outline.OpenAll();
-        m_list->Reset();
-        m_isNew = false;
-    }
+    if (m_late || (m_list->IsEditing() && !doRowsStay))
+        m_late = ticket;
+    else if (isWhole)
+        TakeWhole(ticket, now);
+    else if (doRowsStay)
+        TakeEach(differences, now);
     else
-        for (comgui::SnapshotDifference const& difference : differences)
-            TakeOne(difference, now);
-    if (m_content.IsAnyFlashing() && !m_fading.IsRunning())
-        m_fading.Start(FadingStep);
+        ChangeRows([&] { TakeEach(differences, now); });
+    StartFading();
+}
+
+void KeysPane::TakeWhole(comgui::Snapshot const& ticket, TicketContent::Time now)
+{
+    ChangeRows(
+        [&]
+        {
+            m_content.Show(ticket, now);
+            m_outline.Show(m_content.Keys());
+            if (m_isNew && m_content.Size() <= FewKeys)
+                m_outline.OpenAll();
+            m_list->Reset();
+        });
+    m_isNew = false;
+}
+
+void KeysPane::TakeEach(std::vector<comgui::SnapshotDifference> const& differences, TicketContent::Time now)
+{
+    for (comgui::SnapshotDifference const& difference : differences)
+        TakeOne(difference, now);
 }
 
 void KeysPane::TakeOne(comgui::SnapshotDifference const& difference, TicketContent::Time now)
@@ -117,13 +144,29 @@ void KeysPane::TakeOne(comgui::SnapshotDifference const& difference, TicketConte
         m_list->RowChanged(static_cast<unsigned>(*row));
 }
 
-void KeysPane::Explain(std::string const& key, wxString const& why)
+void KeysPane::TakeLate()
+{
+    if (m_late && !m_list->IsEditing())
+    {
+        TakeWhole(*std::exchange(m_late, std::nullopt), Clock::now());
+        StartFading();
+    }
+}
+
+void KeysPane::Explain(std::string const& key, wxString const& why) { ShowTip(key, _("Not written"), why); }
+
+void KeysPane::RefuseEdit()
+{
+    ShowTip(m_edited, _("Not to be edited here"), _("The value is too long for the editor."));
+}
+
+void KeysPane::ShowTip(std::string const& key, wxString const& title, wxString const& why)
 {
     auto const row = m_outline.RowOf(key);
     if (!row)
         return;
     wxRect const cell = m_list->CellOf(static_cast<unsigned>(*row), ValueColumn);
-    wxRichToolTip tip(_("Not written"), why);
+    wxRichToolTip tip(title, why);
     tip.SetIcon(wxICON_WARNING);
     tip.ShowFor(m_list, &cell);
 }
@@ -138,8 +181,19 @@ comgui::Value const* KeysPane::ValueOf(std::string const& key) const { return m_
 
 void KeysPane::Choose(std::string const& key)
 {
-    Replace(m_outline.Reveal(key));
-    if (auto const row = m_outline.RowOf(key))
+    ChangeRows([&] { Replace(m_outline.Reveal(key)); });
+    SelectPath(key);
+}
+
+std::optional<std::string> KeysPane::ChosenPath() const
+{
+    auto const row = m_list->Selected();
+    return row && *row < m_outline.RowCount() ? std::optional(m_outline.PathAt(*row)) : std::nullopt;
+}
+
+void KeysPane::SelectPath(std::string const& path)
+{
+    if (auto const row = m_outline.RowOf(path))
         m_list->SelectRow(static_cast<unsigned>(*row));
 }
 
@@ -151,14 +205,22 @@ void KeysPane::EditChosen()
 
 void KeysPane::OpenAll()
 {
-    m_outline.OpenAll();
-    m_list->Reset();
+    ChangeRows(
+        [this]
+        {
+            m_outline.OpenAll();
+            m_list->Reset();
+        });
 }
 
 void KeysPane::CloseAll()
 {
-    m_outline.CloseAll();
-    m_list->Reset();
+    ChangeRows(
+        [this]
+        {
+            m_outline.CloseAll();
+            m_list->Reset();
+        });
 }
 
 wxVariant KeysPane::Cell(unsigned row, unsigned column) const
@@ -186,12 +248,11 @@ bool KeysPane::IsEditable(unsigned row, unsigned column) const
     return column == ValueColumn && ValueAt(row);
 }
 
-// Rows may have come and gone since the edit began, so that its row is another key's now.
+// Called only if the text is another than that which the edit began with.
 void KeysPane::Edit(unsigned, unsigned, wxVariant const& value)
 {
-    comgui::Value const* const before = m_content.Find(m_edited);
-    if (before && comgui::ToWx(comgui::ToText(*before)) != value.GetString())
-        onEdit(m_edited, comgui::ToUtf8(value.GetString()));
+    comgui::Value const* const now = m_late ? m_late->Find(m_edited) : m_content.Find(m_edited);
+    onEdit(m_edited, comgui::ToUtf8(value.GetString()), now && !(*now == m_begun) ? now : nullptr);
 }
 
 comgui::Value const* KeysPane::ValueAt(unsigned row) const
@@ -203,32 +264,38 @@ comgui::Value const* KeysPane::ValueAt(unsigned row) const
 void KeysPane::Filter()
 {
     std::string const text = comgui::ToUtf8(m_filter->GetValue());
-    if (text.empty())
-        m_outline.SetFilter({});
-    else
-        m_outline.SetFilter(
-            [this, text](std::string const& key)
-            {
-                comgui::Value const* const value = m_content.Find(key);
-                return Contains(key, text) || (value && Contains(comgui::ToText(*value), text));
-            });
-    m_list->Reset();
+    KeyOutline::Filter const isWanted = [this, text](std::string const& key)
+    {
+        comgui::Value const* const value = m_content.Find(key);
+        return Contains(key, text) || (value && Contains(comgui::ToText(*value), text));
+    };
+    ChangeRows(
+        [&]
+        {
+            m_outline.SetFilter(text.empty() ? KeyOutline::Filter() : isWanted);
+            m_list->Reset();
+        });
 }
 
 void KeysPane::Toggle(unsigned row)
 {
     if (row >= m_outline.RowCount())
         return;
-    Replace(m_outline.Toggle(row));
-    m_list->RowChanged(row);
+    ChangeRows(
+        [this, row]
+        {
+            Replace(m_outline.Toggle(row));
+            m_list->RowChanged(row);
+        });
 }
 
-// As in every tree: to the right opens or goes down, to the left closes or goes up.
+// As in every tree: to the right opens or goes down, to the left closes or goes up. Keys of the editor come
+// by here first, and are its own.
 void KeysPane::Move(wxKeyEvent& event)
 {
     auto const row = m_list->Selected();
     bool const isRight = event.GetKeyCode() == WXK_RIGHT;
-    if (!row || *row >= m_outline.RowCount() || event.HasAnyModifiers() ||
+    if (m_list->IsEditing() || !row || *row >= m_outline.RowCount() || event.HasAnyModifiers() ||
         (!isRight && event.GetKeyCode() != WXK_LEFT))
         return event.Skip();
     OutlineRow const shown = m_outline.RowAt(*row);
@@ -238,6 +305,12 @@ void KeysPane::Move(wxKeyEvent& event)
         m_list->SelectRow(*row + 1);
     else if (auto const parent = m_outline.ParentRow(*row); !isRight && parent)
         m_list->SelectRow(static_cast<unsigned>(*parent));
+}
+
+void KeysPane::StartFading()
+{
+    if (m_content.IsAnyFlashing() && !m_fading.IsRunning())
+        m_fading.Start(FadingStep);
 }
 
 void KeysPane::Fade()

@@ -185,11 +185,8 @@ void MainFrame::Connect()
     m_editor.onHistory();
     m_tickets->onChoose = [this](comgui::TicketAddress ticket) { ShowTicket(ticket); };
     m_tickets->onSearch = [this](std::string const& text) { Search(text); };
-    m_keys->onEdit = [this](std::string const& key, std::string const& text)
-    {
-        if (m_live)
-            m_editor.WriteText(m_live->Address(), key, text);
-    };
+    m_keys->onEdit = [this](auto const& key, auto const& text, comgui::Value const* changed)
+    { TakeEdit(key, text, changed); };
     m_events->onChoose = [this](comgui::TicketAddress ticket, std::string const& key)
     {
         m_tickets->Choose(ticket);
@@ -467,13 +464,33 @@ void MainFrame::Send(std::vector<std::string> const& files, comgui::JobOptions c
     }
 }
 
+void MainFrame::TakeEdit(std::string const& key, std::string const& text, comgui::Value const* changed)
+{
+    if (!m_live)
+        return;
+    comgui::TicketAddress const ticket = m_live->Address();
+    if (!changed)
+        return m_editor.WriteText(ticket, key, text);
+    // Behind the end of the edit: a dialog within it would find the editor half gone.
+    CallAfter(
+        [this, ticket, key, text, present = *changed]
+        {
+            if (IsOverwritten(_("Edit"), key, present))
+                m_editor.WriteText(ticket, key, text);
+        });
+}
+
 bool MainFrame::IsForeignOverwritten(std::vector<EditWrite> const& foreign)
 {
-    wxString const key = comgui::ToWx(DisplayText(foreign[0].key));
+    return IsOverwritten(_("Undo"), foreign[0].key, foreign[0].present);
+}
+
+bool MainFrame::IsOverwritten(wxString const& title, std::string const& key, comgui::Value const& present)
+{
     return wxMessageBox(
                wxString::Format(_("%s has been changed by somebody else since: it is %s now. Overwrite it?"),
-                                key, comgui::ToWx(DisplayTextOf(foreign[0].present))),
-               _("Undo"), wxYES_NO | wxNO_DEFAULT | wxICON_QUESTION, this) == wxYES;
+                                comgui::ToWx(DisplayText(key)), comgui::ToWx(DisplayTextOf(present))),
+               title, wxYES_NO | wxNO_DEFAULT | wxICON_QUESTION, this) == wxYES;
 }
 
 // Messages

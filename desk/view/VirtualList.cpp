@@ -19,8 +19,7 @@ public:
     }
     bool SetValueByRow(wxVariant const& value, unsigned row, unsigned column) override
     {
-        if (row < m_source.RowCount())
-            m_source.Edit(row, column, value);
+        m_source.Edit(row, column, value);
         return false;
     }
     bool GetAttrByRow(unsigned row, unsigned column, wxDataViewItemAttr& look) const override
@@ -47,6 +46,20 @@ VirtualList::VirtualList(wxWindow* parent, wxString const& name, RowSource& sour
                  !m_source.IsEditable(row, static_cast<unsigned>(event.GetColumn())))
                  event.Veto();
          });
+    Bind(wxEVT_DATAVIEW_ITEM_EDITING_STARTED,
+         [this](wxDataViewEvent& event)
+         {
+             m_edited = m_model->GetRow(event.GetItem());
+             m_editedColumn = event.GetDataViewColumn();
+             event.Skip();
+         });
+    Bind(wxEVT_DATAVIEW_ITEM_EDITING_DONE,
+         [this](wxDataViewEvent& event)
+         {
+             m_edited.reset();
+             CallAfter([this] { RowsLookDifferent(); });
+             event.Skip();
+         });
 }
 
 void VirtualList::AddTextColumn(wxString const& title, int width, wxAlignment alignment,
@@ -61,15 +74,20 @@ void VirtualList::AddColumn(wxString const& title, int width, wxDataViewRenderer
                                       wxDATAVIEW_COL_RESIZABLE));
 }
 
+// What was selected may be another row now, or none: only the owner knows.
 void VirtualList::Reset()
 {
-    auto const selected = Selected();
+    UnselectAll();
     m_model->Reset(m_source.RowCount());
-    if (selected && *selected < m_source.RowCount())
-        SelectRow(*selected);
 }
 
-void VirtualList::RowChanged(unsigned row) { m_model->RowChanged(row); }
+// GTK takes a change of the edited row for the end of the edit.
+void VirtualList::RowChanged(unsigned row)
+{
+    if (row != m_edited)
+        m_model->RowChanged(row);
+}
+
 void VirtualList::RowInserted(unsigned row) { m_model->RowInserted(row); }
 void VirtualList::RowDeleted(unsigned row) { m_model->RowDeleted(row); }
 
@@ -119,6 +137,18 @@ void VirtualList::StartEditing(unsigned row, unsigned column)
 {
     EnsureVisible(ItemOf(row), GetColumn(column));
     EditItem(ItemOf(row), GetColumn(column));
+}
+
+void VirtualList::FinishEditing()
+{
+    if (m_edited)
+        m_editedColumn->GetRenderer()->FinishEditing();
+}
+
+void VirtualList::CancelEditing()
+{
+    if (m_edited)
+        m_editedColumn->GetRenderer()->CancelEditing();
 }
 
 wxRect VirtualList::CellOf(unsigned row, unsigned column) const

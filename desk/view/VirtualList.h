@@ -19,7 +19,7 @@ public:
     // How the cell is to look; false: as usual.
     virtual bool Look(unsigned, unsigned, wxDataViewItemAttr&) const { return false; }
 
-    // What the user has put there; the cell shows what Cell says then.
+    // What the user has put there; the cell shows what Cell says then. The row may be another one by then.
     virtual void Edit(unsigned, unsigned, wxVariant const&) {}
     virtual bool IsEditable(unsigned, unsigned) const { return false; }
 };
@@ -33,7 +33,9 @@ public:
     void AddTextColumn(wxString const& title, int width, wxAlignment alignment = wxALIGN_LEFT,
                        wxDataViewCellMode mode = wxDATAVIEW_CELL_INERT);
 
-    // To be told of every change of the rows, at once. Reset: any of them.
+    // To be told of every change of the rows, at once. Reset: any of them; no row is selected then. While a
+    // cell is edited its own row may change, which is painted after the edit; any other change of the rows
+    // ends the edit unsaved.
     void Reset();
     void RowChanged(unsigned row);
     void RowInserted(unsigned row);
@@ -53,6 +55,9 @@ public:
     void SelectRow(unsigned row);
     void ShowRow(unsigned row);  // scrolls to it
     void StartEditing(unsigned row, unsigned column);
+    bool IsEditing() const { return m_edited.has_value(); }
+    void FinishEditing();  // as if the user had clicked elsewhere
+    void CancelEditing();
     wxRect CellOf(unsigned row, unsigned column) const;
 
 private:
@@ -62,5 +67,7 @@ private:
 
     RowSource& m_source;
     wxObjectDataPtr<MODEL> m_model;
+    std::optional<unsigned> m_edited;  // row
+    wxDataViewColumn* m_editedColumn = nullptr;
 };
 }  // namespace desk
