@@ -46,7 +46,7 @@ private:
     void Choose();
 
     EventLog m_log;
-    std::size_t m_shown = 0;  // rows that the list knows
+    std::size_t m_shown = 0;              // rows that the list knows
     std::optional<std::size_t> m_chosen;  // its number in the log
     std::optional<comgui::TicketAddress> m_ticket;
     wxSearchCtrl* m_filter;

@@ -385,9 +385,16 @@ void MainFrame::NewKey()
 {
     if (!m_live)
         return;
-    NewKeyDialog dialog(this, m_keys->ChosenKey().value_or(""));
+    // While the dialog is open, another ticket may come to be shown, as one that was made meanwhile.
+    comgui::TicketAddress const ticket = m_live->Address();
+    auto const isThere = [this, ticket, before = m_live->Now()](std::string const& key)
+    {
+        bool const isShown = m_live && m_live->Address() == ticket;
+        return (isShown ? m_live->Now() : before).Find(key) != nullptr;
+    };
+    NewKeyDialog dialog(this, m_keys->ChosenKey().value_or(""), isThere);
     if (dialog.ShowModal() == wxID_OK)
-        m_editor.Write(m_live->Address(), dialog.Key(), dialog.Value());
+        m_editor.Write(ticket, dialog.Key(), dialog.Value());
 }
 
 void MainFrame::DeleteKey()

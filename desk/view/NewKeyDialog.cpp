@@ -17,10 +17,13 @@ constexpr PARAM_TYPE Types[] = {PARAM_STRING,   PARAM_INT,        PARAM_DOUBLE, 
                                 PARAM_UNSIGNED, PARAM_UNSIGNED64, PARAM_BINSTRING, PARAM_COUNT};
 }  // namespace
 
-NewKeyDialog::NewKeyDialog(wxWindow* parent, std::string const& beside)
+NewKeyDialog::NewKeyDialog(wxWindow* parent, std::string const& beside,
+                           std::function<bool(std::string const& key)> isThere)
     : wxDialog(parent, wxID_ANY, _("New key"), wxDefaultPosition, wxDefaultSize,
-               wxDEFAULT_DIALOG_STYLE | wxRESIZE_BORDER)
+               wxDEFAULT_DIALOG_STYLE | wxRESIZE_BORDER),
+      m_isThere(std::move(isThere))
 {
+    SetName("new key");
     std::string const branch = beside.substr(0, beside.rfind('/') + 1);
     m_name = new wxTextCtrl(this, wxID_ANY, comgui::ToWx(branch));
     m_name->SetName("key");
@@ -32,6 +35,7 @@ NewKeyDialog::NewKeyDialog(wxWindow* parent, std::string const& beside)
     m_text = new wxTextCtrl(this, wxID_ANY);
     m_text->SetName("value");
     m_message = new wxStaticText(this, wxID_ANY, {});
+    m_message->SetName("message");
 
     auto* const fields = new wxFlexGridSizer(2, FromDIP(wxSize(8, 8)));
     fields->AddGrowableCol(1);
@@ -60,6 +64,8 @@ void NewKeyDialog::Accept()
     auto const value = comgui::FromText(comgui::ToUtf8(m_text->GetValue()), Types[m_type->GetSelection()]);
     if (m_key.empty())
         m_message->SetLabelText(_("A key has a name."));
+    else if (m_isThere(m_key))
+        m_message->SetLabelText(_("The ticket has this key already: edit its value."));
     else if (!value)
         m_message->SetLabelText(comgui::ToWx(value.GetError().Text()));
     else

@@ -2,6 +2,7 @@
 #pragma once
 
 #include <comgui/client.h>
+#include <functional>
 #include <string>
 #include <wx/dialog.h>
 
@@ -14,8 +15,10 @@ namespace desk
 class NewKeyDialog : public wxDialog
 {
 public:
-    // beside: a key whose branch the new one is likely to belong to; may be empty.
-    NewKeyDialog(wxWindow* parent, std::string const& beside);
+    // beside: a key whose branch the new one is likely to belong to; may be empty. isThere: whether the
+    // ticket has that key, which then is not a new one.
+    NewKeyDialog(wxWindow* parent, std::string const& beside,
+                 std::function<bool(std::string const& key)> isThere);
 
     // After ShowModal has returned wxID_OK.
     std::string const& Key() const { return m_key; }
@@ -24,6 +27,7 @@ public:
 private:
     void Accept();
 
+    std::function<bool(std::string const& key)> const m_isThere;
     std::string m_key;
     comgui::Value m_value;
     wxTextCtrl* m_name;

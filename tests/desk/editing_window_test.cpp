@@ -1,6 +1,7 @@
 // The whole window while somebody edits a ticket and others change it.
 #include "tests/desk/WindowOfTheDesk.h"
 
+#include <wx/dialog.h>
 #include <wx/modalhook.h>
 #include <wx/srchctrl.h>
 
@@ -26,6 +27,29 @@ private:
     int const m_answer;
     int m_asked = 0;
 };
+
+// Uses a dialog, once it is open, from within its own loop.
+class DialogUser : public wxModalDialogHook
+{
+public:
+    explicit DialogUser(std::function<void(wxDialog&)> use) : m_use(std::move(use)) { Register(); }
+    ~DialogUser() override { Unregister(); }
+
+private:
+    int Enter(wxDialog* dialog) override
+    {
+        dialog->CallAfter([this, dialog] { m_use(*dialog); });
+        return wxID_NONE;
+    }
+    std::function<void(wxDialog&)> const m_use;
+};
+
+void Press(wxDialog& dialog, int button)
+{
+    wxCommandEvent click(wxEVT_BUTTON, button);
+    click.SetEventObject(wxWindow::FindWindowById(button, &dialog));
+    dialog.GetEventHandler()->ProcessEvent(click);
+}
 
 class EditingInTheDesk : public WindowOfTheDesk
 {
@@ -232,4 +256,41 @@ TEST_F(EditingInTheDesk, TheChosenEventStaysChosen_WhateverTheFilterHides)
     EXPECT_EQ(chosen(), "none");
     Find<wxSearchCtrl>("filter of events")->SetValue("");
     EXPECT_EQ(chosen(), "none");
+}
+
+TEST_F(EditingInTheDesk, ANewKeyBelongsToTheTicketThatItWasMadeFor)
+{
+    comgui::TicketAddress const job = ShownJob();
+    comgui::TicketAddress const other = NewTicket();
+    DialogUser const user(
+        [&](wxDialog& dialog)
+        {
+            Find<wxTextCtrl>("key")->SetValue("Note");
+            Find<wxTextCtrl>("value")->SetValue("mine");
+            ShowJob(other);
+            Press(dialog, wxID_OK);
+        });
+    Menu(MenuOf("Edit", "New key ..."));
+    EXPECT_TRUE(Await([&] { return tickets.ReadAs<std::string>(job, "Note").ValueOr("") == "mine"; }));
+    EXPECT_FALSE(tickets.Read(other, "Note"));
+}
+
+TEST_F(EditingInTheDesk, AKeyThatIsThereIsNotMadeAnew)
+{
+    comgui::TicketAddress const job = ShownJob();
+    std::string told;
+    DialogUser const user(
+        [&](wxDialog& dialog)
+        {
+            Find<wxTextCtrl>("key")->SetValue("Copies");
+            Find<wxTextCtrl>("value")->SetValue("mine");
+            Press(dialog, wxID_OK);
+            told = comgui::ToUtf8(wxWindow::FindWindowByName("message", &dialog)->GetLabel());
+            if (dialog.IsModal())
+                Press(dialog, wxID_CANCEL);
+        });
+    Menu(MenuOf("Edit", "New key ..."));
+    EXPECT_EQ(told, "The ticket has this key already: edit its value.");
+    WriteAnother(job, "2");
+    EXPECT_EQ(NumberIn(job, "Copies"), 3);
 }
