@@ -50,10 +50,13 @@ bool TitleCache::Put(TitleRequest const& request, std::optional<std::string> tit
     return true;
 }
 
-void TitleCache::Changed(comgui::TicketAddress ticket)
+bool TitleCache::Changed(comgui::TicketAddress ticket)
 {
-    if (auto const found = m_titles.find(ticket); found != m_titles.end())
-        found->second.reading = Reading::Wanted;
+    auto const found = m_titles.find(ticket);
+    if (found == m_titles.end())
+        return false;
+    found->second.reading = Reading::Wanted;
+    return true;
 }
 
 void TitleCache::Forget(comgui::TicketAddress ticket)

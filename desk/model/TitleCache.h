@@ -38,8 +38,9 @@ public:
     // since, or is forgotten. It should then be taken again.
     bool Put(TitleRequest const& request, std::optional<std::string> title);
 
-    // What is shown stays until the new title is there, so that nothing flickers.
-    void Changed(comgui::TicketAddress ticket);
+    // What is shown stays until the new title is there, so that nothing flickers. Whether it knows the
+    // ticket: its title is read again once it is in sight.
+    bool Changed(comgui::TicketAddress ticket);
 
     void Forget(comgui::TicketAddress ticket);  // it was deleted
     void Clear();                               // another session

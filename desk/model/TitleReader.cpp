@@ -76,7 +76,7 @@ void TitleReader::Take(comgui::Event const& event)
         char const* const key = TitleKeyOf(changed->ticket.type);
         auto const isTitle = [key](comgui::KeyChange const& change) { return key && change.key == key; };
         if (changed->isWhole || std::any_of(changed->keys.begin(), changed->keys.end(), isTitle))
-            m_cache.Changed(changed->ticket);
+            TakeChanged(changed->ticket);
     }
     else if (auto const* const deleted = std::get_if<comgui::TicketDeleted>(&event))
         m_cache.Forget(deleted->ticket);
@@ -85,6 +85,13 @@ void TitleReader::Take(comgui::Event const& event)
     else
         return;
     Read();
+}
+
+// Painting asks only for what has no title at all, so a changed one is asked for here.
+void TitleReader::TakeChanged(comgui::TicketAddress ticket)
+{
+    if (m_cache.Changed(ticket) && m_asked.size() < MostAsked)
+        m_asked.push_back(ticket);
 }
 
 void TitleReader::Clear()

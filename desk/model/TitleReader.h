@@ -30,6 +30,8 @@ public:
     void Clear();                           // another session
 
 private:
+    void TakeChanged(comgui::TicketAddress ticket);
+
     comgui::Tickets const m_tickets;
     comgui::Worker const& m_worker;
     TitleCache m_cache;

@@ -70,6 +70,18 @@ TEST_F(TitlesOfTickets, AreReadAnewWhenTheyChange)
     EXPECT_EQ(Await(job, "flyer.pdf"), "flyer.pdf");
 }
 
+TEST_F(TitlesOfTickets, AreReadAnew_EvenIfAnotherOneWasAskedForSince)
+{
+    comgui::TicketAddress const job = Job("poster.pdf");
+    Await(job, "poster.pdf");
+    comgui::TicketAddress const another = Job("book.pdf");
+    Await(another, "book.pdf");
+    ASSERT_TRUE(tickets.Write(job, "Job/Identification/Name", "flyer.pdf"));
+    titles.Take(comgui::TicketChanged{job, {{"Job/Identification/Name", "flyer.pdf"}}, false});
+    EXPECT_EQ(Await(job, "flyer.pdf"), "flyer.pdf");
+    EXPECT_EQ(titles.TitleOf(another), "book.pdf");
+}
+
 TEST_F(TitlesOfTickets, OfATicketWithoutAName_AreEmpty)
 {
     comgui::TicketAddress const job = NewTicket();
