@@ -3,6 +3,7 @@
 #include "desk/view/NumberText.h"
 #include "desk/view/ShownText.h"
 #include <comgui/client/Text.h>
+#include <comgui/client/TicketAddress.h>
 #include <wx/choice.h>
 #include <wx/filename.h>
 #include <wx/intl.h>
@@ -18,6 +19,13 @@ namespace
 constexpr int GreatestCopies = 9999;
 constexpr unsigned long GreatestName = 255;
 constexpr std::size_t QueueName = 60;
+
+// Its number first: the name may be unknown, or that of several.
+wxString LabelOf(JobQueue const& queue)
+{
+    wxString const number = wxString::Format("%d/%d", comgui::QueueTickets, queue.id);
+    return queue.name.empty() ? number : number + " " + ShownText(queue.name, QueueName);
+}
 }  // namespace
 
 JobOptionsDialog::JobOptionsDialog(wxWindow* parent, std::vector<std::string> const& files,
@@ -57,7 +65,7 @@ JobOptionsDialog::JobOptionsDialog(wxWindow* parent, std::vector<std::string> co
     m_queue->SetName("queue");
     m_queue->Append(_("As the server chooses"));
     for (JobQueue const& queue : m_queues)
-        m_queue->Append(ShownText(queue.name, QueueName));
+        m_queue->Append(LabelOf(queue));
     m_queue->SetSelection(0);
     m_copies->SetName("copies");
 

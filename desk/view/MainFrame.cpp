@@ -151,15 +151,7 @@ void MainFrame::Connect()
     m_session.onState = [this](DeskSession::State state, comgui::Error const& error) { Take(state, error); };
     m_session.onEvent = [this](comgui::Event const& event) { Take(event); };
     m_session.onProblem = [this](comgui::Error const& error) { Complain(comgui::ToWx(error.Text())); };
-    m_session.onList = [this](int type, std::vector<int> const& ids)
-    {
-        if (ids.empty() && m_index.Count(type) == 0)
-            return;
-        m_index.Show(type, ids);
-        m_tickets->TicketsChanged(type);
-        if (m_first && m_index.IndexOf(*m_first))
-            m_tickets->Choose(*std::exchange(m_first, std::nullopt));
-    };
+    m_session.onList = [this](int type, std::vector<int> const& ids) { TakeList(type, ids); };
     m_session.onTicket = [this](comgui::TicketAddress ticket, bool isThere)
     {
         if (auto const index = isThere ? m_index.Add(ticket) : m_index.Remove(ticket))
@@ -263,6 +255,18 @@ void MainFrame::Take(DeskSession::State state, comgui::Error const& error)
                             wxICON_ERROR);
     else
         m_info->Dismiss();
+}
+
+void MainFrame::TakeList(int type, std::vector<int> const& ids)
+{
+    if (ids.empty() && m_index.Count(type) == 0)
+        return;
+    m_index.Show(type, ids);
+    m_tickets->TicketsChanged(type);
+    if (type == comgui::QueueTickets)
+        (void)Queues();  // so that their names are known when a job is sent
+    if (m_first && m_index.IndexOf(*m_first))
+        m_tickets->Choose(*std::exchange(m_first, std::nullopt));
 }
 
 void MainFrame::Take(comgui::Event const& event)

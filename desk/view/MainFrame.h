@@ -52,6 +52,7 @@ private:
     void LoggedIn(comgui::Server const& server, std::string const& user);
     void LogOut();
     void Take(DeskSession::State state, comgui::Error const& error);
+    void TakeList(int type, std::vector<int> const& ids);
     void Take(comgui::Event const& event);
     void Take(comgui::TicketUpdate const& update);
     void TakeJobs(comgui::TransferProgressed const& event);
@@ -62,7 +63,7 @@ private:
     void TakeJobs(Other const&)
     {
     }
-    std::vector<JobQueue> Queues();
+    std::vector<JobQueue> Queues();  // asks for the names that are not known yet
 
     void ShowTicket(comgui::TicketAddress ticket);
     void ForgetTickets();

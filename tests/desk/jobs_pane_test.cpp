@@ -211,3 +211,12 @@ TEST_F(JobsPaneTest, TheDialogGivesWhatIsChosen)
     JobOptionsDialog const several(m_frame, {"/srv/a", "/srv/b"}, {});
     EXPECT_EQ(several.Options().name, "");
 }
+
+TEST_F(JobsPaneTest, TheDialogNumbersQueues_AlsoWithoutAName)
+{
+    JobOptionsDialog const dialog(m_frame, {"/srv/poster.pdf"}, {{7, "Fast"}, {9, ""}});
+    auto* const queue = dynamic_cast<wxChoice*>(wxWindow::FindWindowByName("queue", &dialog));
+    ASSERT_NE(queue, nullptr);
+    EXPECT_EQ(queue->GetString(1), "7/7 Fast");
+    EXPECT_EQ(queue->GetString(2), "7/9");
+}
