@@ -11,6 +11,7 @@ namespace
 constexpr std::string_view StateKey = "Job/State";
 constexpr std::string_view ProgressKey = "Job/Progress";
 constexpr std::string_view NameKey = "Job/Identification/Name";
+constexpr std::string_view ToldKeys[] = {NameKey, ProgressKey, StateKey};  // the state knows best
 
 comgui::TransferProgress Tamed(comgui::TransferProgress progress)
 {
@@ -135,6 +136,8 @@ JobBoard::Change JobBoard::TakeJob(int job, comgui::Snapshot const& ticket, doub
 {
     JobRow* row = Find(m_byJob, job);
     bool const isNew = !row;
+    if (isNew && std::ranges::none_of(ToldKeys, [&](auto key) { return ticket.Find(key) != nullptr; }))
+        return Change::None;
     if (isNew)
     {
         JobRow fresh;
@@ -142,7 +145,7 @@ JobBoard::Change JobBoard::TakeJob(int job, comgui::Snapshot const& ticket, doub
         row = &Append(std::move(fresh));
     }
     bool isChanged = false;
-    for (std::string_view const key : {NameKey, ProgressKey, StateKey})  // the state knows best
+    for (std::string_view const key : ToldKeys)
         if (comgui::Value const* const value = ticket.Find(key))
             isChanged = Set(*row, key, *value, now) || isChanged;
     return isNew ? Change::Rows : isChanged ? Change::Row : Change::None;
@@ -150,7 +153,7 @@ JobBoard::Change JobBoard::TakeJob(int job, comgui::Snapshot const& ticket, doub
 
 JobBoard::Change JobBoard::TakeJob(int job, comgui::KeyChange const& change, double now)
 {
-    if (!change.value || (change.key != NameKey && change.key != ProgressKey && change.key != StateKey))
+    if (!change.value || !IsTold(change.key))
         return Change::None;
     JobRow* const row = Find(m_byJob, job);
     if (!row)
@@ -199,6 +202,17 @@ JobBoard::Change JobBoard::RemoveJob(int job)
     m_byJob.erase(job);
     row->job.reset();
     return Change::Row;
+}
+
+bool JobBoard::IsTold(std::string_view key) { return std::ranges::find(ToldKeys, key) != std::end(ToldKeys); }
+
+std::vector<int> JobBoard::Jobs() const
+{
+    std::vector<int> jobs;
+    for (JobRow const& row : m_rows)
+        if (row.job)
+            jobs.push_back(*row.job);
+    return jobs;
 }
 
 JobBoard::Change JobBoard::RemoveOver()

@@ -17,6 +17,7 @@
 #include <string>
 #include <string_view>
 #include <unordered_map>
+#include <vector>
 
 namespace desk
 {
@@ -73,9 +74,13 @@ public:
     // That job is the transfer's; known before its end. A row for the job alone goes.
     Change Identify(int transfer, int job);
 
+    // A ticket that tells nothing of its job makes no row.
     Change TakeJob(int job, comgui::Snapshot const& ticket, double now);
     Change TakeJob(int job, comgui::KeyChange const& change, double now);
     Change RemoveJob(int job);  // the ticket has gone; what this program has sent stays as a memory
+
+    static bool IsTold(std::string_view key);  // whether it is a key of a job's ticket that counts here
+    std::vector<int> Jobs() const;             // that have rows
 
     Change RemoveOver();  // rows that are over, as the user wants
     void Clear();

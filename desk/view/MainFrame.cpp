@@ -302,15 +302,58 @@ void MainFrame::TakeJobs(comgui::TransferEnded const& event)
 
 void MainFrame::TakeJobs(comgui::TicketChanged const& event)
 {
-    if (event.ticket.type == comgui::JobTickets)
-        for (comgui::KeyChange const& change : event.keys)
-            m_transfers->Take(m_jobs.TakeJob(event.ticket.id, change, Now()));
+    if (event.ticket.type != comgui::JobTickets)
+        return;
+    bool isToBeRead = event.isWhole;
+    for (comgui::KeyChange const& change : event.keys)
+    {
+        m_transfers->Take(m_jobs.TakeJob(event.ticket.id, change, Now()));
+        isToBeRead = isToBeRead || (!change.value && JobBoard::IsTold(change.key));
+    }
+    if (isToBeRead)
+        ReadJobs({event.ticket.id});
 }
 
 void MainFrame::TakeJobs(comgui::TicketDeleted const& event)
 {
     if (event.ticket.type == comgui::JobTickets)
         m_transfers->Take(m_jobs.RemoveJob(event.ticket.id));
+}
+
+void MainFrame::TakeJobs(comgui::ManyTicketsChanged const& event)
+{
+    if (event.type == comgui::JobTickets)
+        ReadJobs(m_jobs.Jobs());
+}
+
+void MainFrame::TakeJobs(comgui::ServerBack const& event)
+{
+    if (event.isNewSession)
+        ReadJobs(m_jobs.Jobs());
+}
+
+// Those of which an event tells no more than that something is different.
+void MainFrame::ReadJobs(std::vector<int> const& jobs)
+{
+    using Read = std::vector<std::pair<int, comgui::Result<comgui::Snapshot>>>;
+    auto const read = [tickets = m_session.Tickets(), jobs]
+    {
+        Read results;
+        for (int const job : jobs)
+            results.emplace_back(job, tickets.ReadAll({comgui::JobTickets, job}));
+        return results;
+    };
+    m_session.Worker().Do(read,
+                          [this](Read const& results)
+                          {
+                              if (m_session.Now() == DeskSession::State::LoggedOut)
+                                  return;
+                              for (auto const& [job, ticket] : results)
+                                  if (ticket)
+                                      m_transfers->Take(m_jobs.TakeJob(job, *ticket, Now()));
+                                  else if (ticket.GetError().code == comgui::NoSuchTicket)
+                                      m_transfers->Take(m_jobs.RemoveJob(job));
+                          });
 }
 
 std::vector<JobQueue> MainFrame::Queues()

@@ -59,10 +59,13 @@ private:
     void TakeJobs(comgui::TransferEnded const& event);
     void TakeJobs(comgui::TicketChanged const& event);
     void TakeJobs(comgui::TicketDeleted const& event);
+    void TakeJobs(comgui::ManyTicketsChanged const& event);
+    void TakeJobs(comgui::ServerBack const& event);
     template <typename Other>
     void TakeJobs(Other const&)
     {
     }
+    void ReadJobs(std::vector<int> const& jobs);
     std::vector<JobQueue> Queues();  // asks for the names that are not known yet
 
     void ShowTicket(comgui::TicketAddress ticket);

@@ -21,3 +21,18 @@ TEST_F(TheDeskFollows, TheNamesOfQueues_BeforeAnybodyLooksAtThem)
         EXPECT_EQ(queue.name,
                   tickets.ReadAs<std::string>({comgui::QueueTickets, queue.id}, "Queue/Name").ValueOr("?"));
 }
+
+TEST_F(TheDeskFollows, AJobThatChangesAsAWhole)
+{
+    Enter();
+    comgui::TicketAddress const job = NewTicket();
+    ASSERT_TRUE(tickets.Write(job, "Job/Identification/Name", "poster.pdf"));
+    ASSERT_TRUE(tickets.Write(job, "Job/State", 0));
+    ASSERT_TRUE(Await([this] { return jobs.RowOf(2, "Waiting").has_value(); }));
+    std::vector<comgui::KeyValue> values;
+    for (int i = 0; i < 2001; ++i)
+        values.push_back({"Key/" + std::to_string(i), i});
+    values.push_back({"Job/State", 2});
+    (void)tickets.WriteAll(job, values);
+    EXPECT_TRUE(Await([this] { return jobs.RowOf(2, "Arrived").has_value(); }));
+}

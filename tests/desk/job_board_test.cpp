@@ -226,3 +226,12 @@ TEST(JobBoard, ALyingServerDoesNotFillIt)
     EXPECT_EQ(board.At(99).job, 99999);
     EXPECT_EQ(board.TakeJob(99950, {"Job/Progress", Value(5)}, 1), Change::Row);
 }
+
+TEST_F(Board, ATicketThatTellsNothingMakesNoRow)
+{
+    EXPECT_EQ(board.TakeJob(1, comgui::Snapshot({{"Job/Copies", 3}}), 0), Change::None);
+    EXPECT_EQ(board.Count(), 0U);
+    EXPECT_EQ(board.TakeJob(2, Ticket(0, "a"), 0), Change::Rows);
+    board.Add(7, "of no job yet");
+    EXPECT_EQ(board.Jobs(), std::vector{2});
+}
