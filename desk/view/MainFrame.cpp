@@ -242,6 +242,7 @@ void MainFrame::ForgetTickets()
     m_sent.clear();
     m_tickets->Clear();
     m_keys->ShowTicket({});
+    ShowInks({});
     m_transfers->Take(JobBoard::Change::Rows);
 }
 
@@ -374,6 +375,7 @@ void MainFrame::ShowTicket(comgui::TicketAddress ticket)
     if (m_live && m_live->Address() == ticket)
         return;
     m_keys->ShowTicket(NameOfType(ticket.type) + " " + NameOf(ticket));
+    ShowInks({});
     m_events->ShowOnly(ticket);
     m_live.emplace(m_session.Connection(), m_session.Worker(), ticket,
                    [this](comgui::TicketUpdate const& update) { Take(update); });
@@ -384,7 +386,12 @@ void MainFrame::Take(comgui::TicketUpdate const& update)
     if (!update.outcome)
         Say(comgui::ToWx(update.outcome.GetError().Text()));
     m_keys->Take(m_live->Now(), update.differences);
-    m_coverage.Take(m_live->Now());
+    ShowInks(m_live->Now());
+}
+
+void MainFrame::ShowInks(comgui::Snapshot const& ticket)
+{
+    m_coverage.Take(ticket);
     m_inks->Take(m_coverage);
     bool const hasInks = !m_coverage.Inks().empty();
     if (hasInks && !m_middle->IsSplit())

@@ -69,6 +69,7 @@ private:
     std::vector<JobQueue> Queues();  // asks for the names that are not known yet
 
     void ShowTicket(comgui::TicketAddress ticket);
+    void ShowInks(comgui::Snapshot const& ticket);
     void ForgetTickets();
     void NewTicket();
     void DeleteTicket();

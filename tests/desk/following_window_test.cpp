@@ -36,3 +36,23 @@ TEST_F(TheDeskFollows, AJobThatChangesAsAWhole)
     (void)tickets.WriteAll(job, values);
     EXPECT_TRUE(Await([this] { return jobs.RowOf(2, "Arrived").has_value(); }));
 }
+
+TEST_F(TheDeskFollows, NoInksOfAnotherTicketAreShown)
+{
+    Enter();
+    comgui::TicketAddress const job = NewTicket();
+    comgui::TicketAddress const other = NewTicket();
+    ASSERT_TRUE(tickets.Write(job, "Job/InkCoverage", comgui::MakeList<double>({0.25, 0.5, 0.5, 0.5})));
+    ASSERT_TRUE(
+        tickets.Write(job, "Job/Separations", comgui::MakeList<std::string>({"Cyan", "Gold", "a/b"})));
+    auto* const inks = Find<InkBars>("inks");
+    ASSERT_NE(inks, nullptr);
+    ShowJob(job);
+    ASSERT_TRUE(Await([inks] { return inks->IsShown(); }));
+    ASSERT_TRUE(Choose(shown, 0, "3/" + std::to_string(other.id)));
+    EXPECT_FALSE(inks->IsShown());  // at once, however long the other one takes to read
+    ShowJob(job);
+    ASSERT_TRUE(Await([inks] { return inks->IsShown(); }));
+    Menu(MenuOf("Server", "Log out"));
+    EXPECT_FALSE(inks->IsShown());
+}
