@@ -61,6 +61,8 @@ void MainFrame::MakePanes()
 {
     m_info = new wxInfoBar(this);
     m_info->SetName("info");
+    m_complaint = new wxInfoBar(this);
+    m_complaint->SetName("complaint");
     auto* const whole =
         new wxSplitterWindow(this, wxID_ANY, wxDefaultPosition, wxDefaultSize, wxSP_LIVE_UPDATE);
     m_tickets = new TicketsPane(whole, m_index, [this](auto ticket) { return m_titles.TitleOf(ticket); });
@@ -85,6 +87,7 @@ void MainFrame::MakePanes()
 
     auto* const all = new wxBoxSizer(wxVERTICAL);
     all->Add(m_info, wxSizerFlags().Expand());
+    all->Add(m_complaint, wxSizerFlags().Expand());
     all->Add(whole, wxSizerFlags(1).Expand());
     SetSizer(all);
 }
@@ -228,6 +231,7 @@ void MainFrame::LogOut()
 {
     ForgetTickets();
     m_session.LogOut();
+    m_complaint->Dismiss();
     Say(_("Logged out"));
 }
 
@@ -561,7 +565,7 @@ void MainFrame::Say(wxString const& text) { SetStatusText(text); }
 void MainFrame::Complain(wxString const& text)
 {
     SetStatusText(text);
-    m_info->ShowMessage(text, wxICON_INFORMATION);
+    m_complaint->ShowMessage(text, wxICON_INFORMATION);
 }
 
 void MainFrame::FocusNextPane()

@@ -104,8 +104,9 @@ private:
     std::vector<comgui::TicketAddress> m_found;
     std::optional<comgui::TicketAddress> m_first;  // to be chosen once it is listed
     wxTimer m_repaint;
-    wxString m_server;  // and user, as the title says them
-    wxInfoBar* m_info;
+    wxString m_server;       // and user, as the title says them
+    wxInfoBar* m_info;       // that the server is lost
+    wxInfoBar* m_complaint;  // anything else, beside it
     wxNotebook* m_below;
     wxSplitterWindow* m_middle;
     TicketsPane* m_tickets;

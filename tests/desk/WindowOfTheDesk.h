@@ -2,20 +2,26 @@
 // their accessible names.
 #pragma once
 
+#include "comgui/comgui.h"
 #include "desk/view/MainFrame.h"
 #include "desk/view/VirtualList.h"
 #include "tests/client/Client.h"
+#include "tests/client/TroubledPlugIn.h"
+#include "tests/support/BundleOnDisk.h"
 #include <chrono>
 #include <comgui/client/Text.h>
+#include <dlfcn.h>
 #include <functional>
 #include <gtest/gtest.h>
 #include <optional>
 #include <string>
 #include <vector>
 #include <wx/app.h>
+#include <wx/dialog.h>
 #include <wx/evtloop.h>
 #include <wx/fileconf.h>
 #include <wx/menu.h>
+#include <wx/modalhook.h>
 #include <wx/textctrl.h>
 
 namespace desk
@@ -85,6 +91,29 @@ private:
     VirtualList* m_list;
 };
 
+// Uses a dialog, once it is open, from within its own loop.
+class DialogUser : public wxModalDialogHook
+{
+public:
+    explicit DialogUser(std::function<void(wxDialog&)> use) : m_use(std::move(use)) { Register(); }
+    ~DialogUser() override { Unregister(); }
+
+private:
+    int Enter(wxDialog* dialog) override
+    {
+        dialog->CallAfter([this, dialog] { m_use(*dialog); });
+        return wxID_NONE;
+    }
+    std::function<void(wxDialog&)> const m_use;
+};
+
+inline void Press(wxDialog& dialog, int button)
+{
+    wxCommandEvent click(wxEVT_BUTTON, button);
+    click.SetEventObject(wxWindow::FindWindowById(button, &dialog));
+    dialog.GetEventHandler()->ProcessEvent(click);
+}
+
 class WindowOfTheDesk : public Client
 {
 protected:
@@ -106,6 +135,17 @@ protected:
         frame->LogIn(Here(), Admin());
         ASSERT_TRUE(Await([this] { return types.Count() > 0; }));
         LogIn();
+    }
+    // A plug-in that does wrong what it is ordered to; before the login.
+    TROUBLE& BeginTrouble()
+    {
+        BundleOnDisk bundle(folder.Path());
+        bundle.LinkExecutable(COMGUI_TROUBLED_PLUGIN);
+        bundle.AddFactory(COMGUI_PLUGIN_TYPE_UUID, "11111111-2222-3333-4444-555555555555",
+                          "TroubledPlugInFactory");
+        UtilityObjects::SetPlugInsFolder(folder.Path().native());
+        return *static_cast<TROUBLE*>(
+            dlsym(dlopen(COMGUI_TROUBLED_PLUGIN, RTLD_NOW | RTLD_LOCAL), "TroubledPlugInOrders"));
     }
     void ShowJob(comgui::TicketAddress job)
     {

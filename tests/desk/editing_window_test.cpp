@@ -1,7 +1,6 @@
 // The whole window while somebody edits a ticket and others change it.
 #include "tests/desk/WindowOfTheDesk.h"
 
-#include <wx/dialog.h>
 #include <wx/modalhook.h>
 #include <wx/srchctrl.h>
 
@@ -27,29 +26,6 @@ private:
     int const m_answer;
     int m_asked = 0;
 };
-
-// Uses a dialog, once it is open, from within its own loop.
-class DialogUser : public wxModalDialogHook
-{
-public:
-    explicit DialogUser(std::function<void(wxDialog&)> use) : m_use(std::move(use)) { Register(); }
-    ~DialogUser() override { Unregister(); }
-
-private:
-    int Enter(wxDialog* dialog) override
-    {
-        dialog->CallAfter([this, dialog] { m_use(*dialog); });
-        return wxID_NONE;
-    }
-    std::function<void(wxDialog&)> const m_use;
-};
-
-void Press(wxDialog& dialog, int button)
-{
-    wxCommandEvent click(wxEVT_BUTTON, button);
-    click.SetEventObject(wxWindow::FindWindowById(button, &dialog));
-    dialog.GetEventHandler()->ProcessEvent(click);
-}
 
 class EditingInTheDesk : public WindowOfTheDesk
 {

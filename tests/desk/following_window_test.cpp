@@ -3,6 +3,8 @@
 
 #include "desk/view/InkBars.h"
 #include "desk/view/JobsPane.h"
+#include <wx/infobar.h>
+#include <wx/textdlg.h>
 
 using namespace desk;
 
@@ -55,4 +57,30 @@ TEST_F(TheDeskFollows, NoInksOfAnotherTicketAreShown)
     ASSERT_TRUE(Await([inks] { return inks->IsShown(); }));
     Menu(MenuOf("Server", "Log out"));
     EXPECT_FALSE(inks->IsShown());
+}
+
+TEST_F(TheDeskFollows, TheLossOfTheServer_WhateverElseIsWrong)
+{
+    TROUBLE& trouble = BeginTrouble();
+    Enter();
+    ShowJob(NewTicket());
+    auto* const loss = Find<wxInfoBar>("info");
+    auto* const complaint = Find<wxInfoBar>("complaint");
+    ASSERT_TRUE(loss && complaint);
+    trouble.serverIsAway = true;
+    ASSERT_TRUE(Await([loss] { return loss->IsShown(); }));
+    {
+        DialogUser const user(
+            [](wxDialog& dialog)
+            {
+                dynamic_cast<wxTextEntryDialog&>(dialog).SetValue("no ticket");
+                Press(dialog, wxID_OK);
+            });
+        Menu(MenuOf("Ticket", "Compare with ..."));
+    }
+    EXPECT_TRUE(complaint->IsShown());
+    EXPECT_TRUE(loss->IsShown());
+    trouble.serverIsAway = false;
+    EXPECT_TRUE(Await([loss] { return !loss->IsShown(); }));
+    EXPECT_TRUE(complaint->IsShown());
 }

@@ -1,11 +1,7 @@
 // The whole window at a server: a login, tickets and their keys, events, jobs, the loss of the server.
 #include "tests/desk/WindowOfTheDesk.h"
 
-#include "comgui/comgui.h"
 #include "desk/view/JobsPane.h"
-#include "tests/client/TroubledPlugIn.h"
-#include "tests/support/BundleOnDisk.h"
-#include <dlfcn.h>
 #include <filesystem>
 #include <fstream>
 #include <gmock/gmock.h>
@@ -204,13 +200,7 @@ TEST_F(WindowOfTheDesk, AfterTheLogout_ShowsNothing)
 
 TEST_F(WindowOfTheDesk, ShowsThatTheServerIsLost_AndBack)
 {
-    BundleOnDisk bundle(folder.Path());
-    bundle.LinkExecutable(COMGUI_TROUBLED_PLUGIN);
-    bundle.AddFactory(COMGUI_PLUGIN_TYPE_UUID, "11111111-2222-3333-4444-555555555555",
-                      "TroubledPlugInFactory");
-    UtilityObjects::SetPlugInsFolder(folder.Path().native());
-    auto& trouble = *static_cast<TROUBLE*>(
-        dlsym(dlopen(COMGUI_TROUBLED_PLUGIN, RTLD_NOW | RTLD_LOCAL), "TroubledPlugInOrders"));
+    TROUBLE& trouble = BeginTrouble();
     Enter();
     auto* const info = Find<wxInfoBar>("info");
     trouble.serverIsAway = true;
