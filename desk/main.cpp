@@ -1,6 +1,5 @@
 // ticket_desk: a window on the tickets of a print server.
 #include "desk/model/ServerName.h"
-#include "desk/model/TicketName.h"
 #include "desk/view/MainFrame.h"
 #include <comgui/client/Text.h>
 #include <iostream>
@@ -40,9 +39,8 @@ public:
         SetAppDisplayName(_("Ticket desk"));
         auto* const frame = new desk::MainFrame;
         wxString ticket;
-        parser.Found("ticket", &ticket);
-        if (auto const first = desk::TicketFromText(comgui::ToUtf8(ticket), comgui::JobTickets))
-            frame->ShowFirst(*first);
+        if (parser.Found("ticket", &ticket))
+            frame->ShowFirst(comgui::ToUtf8(ticket));
         frame->Show();
         frame->CallAfter([frame, server = ServerOf(parser), account = AccountOf(parser)]
                          { Begin(*frame, server, account); });

@@ -33,6 +33,8 @@ constexpr int RepaintPause = 50;           // milliseconds; however many events 
 constexpr std::size_t MostFound = 10'000;  // tickets; a wider search helps nobody
 constexpr char WindowName[] = "MainWindow";
 
+wxString NoTicket() { return _("This is no ticket: a number, or a type, a slash and a number."); }
+
 wxString NameOf(comgui::TicketAddress ticket) { return wxString::Format("%d/%d", ticket.type, ticket.id); }
 }  // namespace
 
@@ -264,14 +266,32 @@ void MainFrame::Take(DeskSession::State state, comgui::Error const& error)
 
 void MainFrame::TakeList(int type, std::vector<int> const& ids)
 {
-    if (ids.empty() && m_index.Count(type) == 0)
-        return;
-    m_index.Show(type, ids);
-    m_tickets->TicketsChanged(type);
+    if (!ids.empty() || m_index.Count(type) > 0)
+    {
+        m_index.Show(type, ids);
+        m_tickets->TicketsChanged(type);
+    }
     if (type == comgui::QueueTickets)
         (void)Queues();  // so that their names are known when a job is sent
-    if (m_first && m_index.IndexOf(*m_first))
-        m_tickets->Choose(*std::exchange(m_first, std::nullopt));
+    if (m_first && m_first->type == type)
+        ChooseFirst();
+}
+
+void MainFrame::ShowFirst(std::string const& ticket)
+{
+    m_first = TicketFromText(ticket, comgui::JobTickets);
+    if (!m_first)
+        Complain(comgui::ToWx(DisplayText(ticket)) + ": " + NoTicket());
+}
+
+// Now or never: a later listing would take the user away from what he does by then.
+void MainFrame::ChooseFirst()
+{
+    comgui::TicketAddress const ticket = *std::exchange(m_first, std::nullopt);
+    if (m_index.IndexOf(ticket))
+        m_tickets->Choose(ticket);
+    else
+        Complain(wxString::Format(_("%s is not there."), NameOf(ticket)));
 }
 
 void MainFrame::Take(comgui::Event const& event)
@@ -491,7 +511,7 @@ void MainFrame::Compare()
         return;
     auto const right = TicketFromText(comgui::ToUtf8(dialog.GetValue()), left.type);
     if (!right)
-        return Complain(_("This is no ticket: a number, or a type, a slash and a number."));
+        return Complain(NoTicket());
     (new CompareFrame(this, m_session.Connection(), m_session.Worker(), left, *right))->Show();
 }
 

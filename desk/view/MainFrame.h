@@ -41,8 +41,10 @@ public:
     // At once, without a question unless it is refused.
     void LogIn(comgui::Server const& server, comgui::Account const& account);
 
-    // Chosen as soon as there is a login and the ticket is listed.
+    // Chosen as soon as there is a login and its type is listed; then, or if the text is no ticket, it is
+    // said why it cannot be.
     void ShowFirst(comgui::TicketAddress ticket) { m_first = ticket; }
+    void ShowFirst(std::string const& ticket);
 
 private:
     void MakePanes();
@@ -52,6 +54,7 @@ private:
     void LoggedIn(comgui::Server const& server, std::string const& user);
     void LogOut();
     void Take(DeskSession::State state, comgui::Error const& error);
+    void ChooseFirst();
     void TakeList(int type, std::vector<int> const& ids);
     void Take(comgui::Event const& event);
     void Take(comgui::TicketUpdate const& update);

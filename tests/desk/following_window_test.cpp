@@ -59,6 +59,33 @@ TEST_F(TheDeskFollows, NoInksOfAnotherTicketAreShown)
     EXPECT_FALSE(inks->IsShown());
 }
 
+TEST_F(TheDeskFollows, NoTicketToBeginWith_IfTheTextIsNone)
+{
+    frame->ShowFirst(std::string("job1"));
+    EXPECT_EQ(Status(), "job1: This is no ticket: a number, or a type, a slash and a number.");
+    Enter();
+    EXPECT_TRUE(Find<wxInfoBar>("complaint")->IsShown());
+    EXPECT_EQ(heading(), "");
+}
+
+TEST_F(TheDeskFollows, NoTicketToBeginWith_ThatComesTooLate)
+{
+    LogIn();
+    comgui::TicketAddress const job = NewTicket();
+    ASSERT_TRUE(tickets.Write(job, "Copies", 3));
+    std::string const late = "3/" + std::to_string(job.id + 1);
+    frame->ShowFirst(comgui::TicketAddress{comgui::JobTickets, job.id + 1});
+    frame->LogIn(Here(), Admin());
+    EXPECT_TRUE(Await([&] { return Status() == late + " is not there."; })) << Status();
+    ShowJob(job);
+    ASSERT_EQ(NewTicket().id, job.id + 1);
+    ASSERT_TRUE(Await([&] { return shown.RowOf(0, late).has_value() && keys.Count() == 1; }));
+    Menu(MenuOf("View", "Read all anew"));
+    Type("Copies", "4");  // behind it
+    ASSERT_TRUE(Await([this] { return Status().find("is written") != std::string::npos; })) << Status();
+    EXPECT_EQ(heading(), "Jobs 3/" + std::to_string(job.id));
+}
+
 TEST_F(TheDeskFollows, TheLossOfTheServer_WhateverElseIsWrong)
 {
     TROUBLE& trouble = BeginTrouble();
