@@ -345,3 +345,15 @@ TEST(ManyEvents, FillTheRingAtOnce)
     EXPECT_EQ(log.RowAt(0).key, "Key150007");
     EXPECT_EQ(log.RowAt(9999).key, "Key249997");
 }
+
+TEST_F(Log, ARowKeepsItsNumber_UntilItIsNotShown)
+{
+    Append(4);
+    std::size_t const number = log.NumberOf(2);
+    Append(1);  // the oldest goes
+    EXPECT_EQ(log.IndexOf(number), 1U);
+    FilterText("2");
+    EXPECT_EQ(log.IndexOf(number), 0U);
+    FilterText("3");
+    EXPECT_EQ(log.IndexOf(number), std::nullopt);
+}
