@@ -53,8 +53,8 @@ void TicketEditor::Do(comgui::TicketAddress ticket, std::string const& key, Writ
              {
                  if (!written.outcome)
                      return onRefused(ticket, key, written.outcome.GetError());
-                 if (!(written.before == written.after))
-                     m_history.Record(ticket, key, written.before, written.after);
+                 m_history.Record(ticket, key, written.before, written.after);
+                 ++m_recorded;
                  onHistory();
                  onWritten(ticket, key);
              });
@@ -63,34 +63,38 @@ void TicketEditor::Do(comgui::TicketAddress ticket, std::string const& key, Writ
 void TicketEditor::Undo()
 {
     if (CanUndo())
-        StepAsPresent(m_history.NextUndo(), true);
+        StepAsPresent(true);
 }
 
 void TicketEditor::Redo()
 {
     if (CanRedo())
-        StepAsPresent(m_history.NextRedo(), false);
+        StepAsPresent(false);
 }
 
 // First what is there now, so that nobody's work is overwritten unasked.
-void TicketEditor::StepAsPresent(EditHistory::Step const* step, bool isUndo)
+void TicketEditor::StepAsPresent(bool isUndo)
 {
     m_isStepping = true;
     onHistory();
+    EditHistory::Step const* const step = isUndo ? m_history.NextUndo() : m_history.NextRedo();
+    if (!step)
+        return EndStep();
     auto const read = [tickets = m_tickets, edits = *step]
     {
-        std::map<std::pair<comgui::TicketAddress, std::string>, comgui::Value> presents;
+        Presents presents;
         for (Edit const& edit : edits)
             presents[{edit.ticket, edit.key}] = ValueOf(tickets, edit.ticket, edit.key);
         return presents;
     };
     OnWorker(read,
-             [this, isUndo](auto const& presents)
+             [this, isUndo, recorded = m_recorded](Presents const& presents)
              {
-                 auto const present = [&presents](comgui::TicketAddress ticket, std::string const& key)
-                 {
-                     auto const place = presents.find({ticket, key});
-                     return place == presents.end() ? comgui::Value() : place->second;
+                 // A write that was under way has made another step the next one.
+                 if (recorded != m_recorded)
+                     return StepAsPresent(isUndo);
+                 auto const present = [&presents](comgui::TicketAddress ticket, std::string const& key) {
+                     return presents.at({ticket, key});
                  };
                  WriteStep(isUndo ? m_history.Undo(present) : m_history.Redo(present));
              });

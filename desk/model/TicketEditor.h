@@ -5,8 +5,10 @@
 #include "desk/model/EditHistory.h"
 #include <comgui/client.h>
 #include <functional>
+#include <map>
 #include <memory>
 #include <string>
+#include <utility>
 #include <vector>
 
 namespace desk
@@ -46,10 +48,10 @@ private:
     {
     };
     using Writing = std::function<comgui::Outcome(comgui::Tickets const&)>;
-    using Presents = std::vector<comgui::Value>;
+    using Presents = std::map<std::pair<comgui::TicketAddress, std::string>, comgui::Value>;
 
     void Do(comgui::TicketAddress ticket, std::string const& key, Writing writing);
-    void StepAsPresent(EditHistory::Step const* step, bool isUndo);
+    void StepAsPresent(bool isUndo);
     void WriteStep(std::vector<EditWrite> const& writes);
     void EndStep();
 
@@ -67,7 +69,8 @@ private:
     comgui::Tickets const m_tickets;
     comgui::Worker const& m_worker;
     EditHistory m_history;
-    bool m_isStepping = false;  // an undo or redo is under way
+    unsigned long m_recorded = 0;  // edits so far
+    bool m_isStepping = false;     // an undo or redo is under way
     std::shared_ptr<Alive> m_alive = std::make_shared<Alive>();
 };
 }  // namespace desk

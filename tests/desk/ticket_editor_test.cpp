@@ -99,6 +99,45 @@ TEST_F(EditorOfTickets, AsksBeforeItUndoesWhatOthersHaveChanged)
     EXPECT_EQ(CodeOf(tickets.Read(job, "Copies")), comgui::NoSuchKey);
 }
 
+TEST_F(EditorOfTickets, UndoesAnEditThatIsStillBeingWritten)
+{
+    ASSERT_TRUE(tickets.Write(job, "Copies", 1));
+    editor->Write(job, "Pages", 1);
+    Await(1);
+    editor->Write(job, "Copies", 2);
+    editor->Undo();
+    Await(3);
+    EXPECT_THAT(heard, ElementsAre("Pages written", "Copies written", "Copies written"));
+    EXPECT_EQ(Copies(), 1);
+    EXPECT_EQ(tickets.ReadAs<int>(job, "Pages").ValueOr(0), 1);
+}
+
+TEST_F(EditorOfTickets, BehindAnEditThatIsStillBeingWritten_AsksAboutWhatOthersMakeOfIt)
+{
+    editor->Write(job, "Pages", 1);
+    Await(1);
+    editor->Write(job, "Copies", 2);
+    worker.Do([this] { return tickets.Write(job, "Copies", 50); }, [](auto const&) {});
+    editor->Undo();
+    Await(3);
+    EXPECT_THAT(heard, ElementsAre("Pages written", "Copies written", "foreign Copies"));
+    EXPECT_EQ(Copies(), 50);
+}
+
+TEST_F(EditorOfTickets, WithNothingLeftToRedoBehindAnEdit_RedoesNothing)
+{
+    editor->Write(job, "Copies", 1);
+    Await(1);
+    editor->Undo();
+    Await(2);
+    editor->Write(job, "Pages", 1);
+    editor->Redo();
+    Await(3);
+    EXPECT_THAT(heard, ElementsAre("Copies written", "Copies written", "Pages written"));
+    EXPECT_EQ(CodeOf(tickets.Read(job, "Copies")), comgui::NoSuchKey);
+    EXPECT_TRUE(editor->CanUndo());
+}
+
 TEST_F(EditorOfTickets, WhoseUndoIsRefused_KeepsIt)
 {
     editor->Write(job, "Copies", 1);
