@@ -1,15 +1,43 @@
 #include "desk/model/TicketEditor.h"
 
+#include <map>
+#include <optional>
 #include <utility>
+#include <variant>
 
 namespace desk
 {
 namespace
 {
-// std::monostate: not there.
-comgui::Value ValueOf(comgui::Tickets const& tickets, comgui::TicketAddress ticket, std::string const& key)
+// std::monostate: not there. A value that could not be read is not that: an undo would delete the key.
+comgui::Result<comgui::Value> ValueOf(comgui::Tickets const& tickets, comgui::TicketAddress ticket,
+                                      std::string const& key)
 {
-    return tickets.Read(ticket, key, comgui::WholeKey, comgui::Paths::AsStored).ValueOr({});
+    comgui::Result<comgui::Value> value =
+        tickets.Read(ticket, key, comgui::WholeKey, comgui::Paths::AsStored);
+    return !value && value.GetError().code == comgui::NoSuchKey ? comgui::Value() : value;
+}
+using Presents = std::map<std::pair<comgui::TicketAddress, std::string>, comgui::Value>;
+
+struct Unread
+{
+    comgui::TicketAddress ticket;
+    std::string key;
+    comgui::Error error;
+};
+
+// Of all keys of the step, or of none.
+std::variant<Presents, Unread> PresentsOf(comgui::Tickets const& tickets, EditHistory::Step const& step)
+{
+    Presents presents;
+    for (Edit const& edit : step)
+    {
+        auto const value = ValueOf(tickets, edit.ticket, edit.key);
+        if (!value)
+            return Unread{edit.ticket, edit.key, value.GetError()};
+        presents[{edit.ticket, edit.key}] = *value;
+    }
+    return presents;
 }
 }  // namespace
 
@@ -17,7 +45,7 @@ struct TicketEditor::Written
 {
     comgui::Outcome outcome;
     comgui::Value before;
-    comgui::Value after;
+    std::optional<comgui::Value> after;  // unknown if it could not be read
 };
 
 TicketEditor::TicketEditor(comgui::Tickets const& tickets, comgui::Worker const& worker)
@@ -43,17 +71,21 @@ void TicketEditor::Do(comgui::TicketAddress ticket, std::string const& key, Writ
 {
     auto const work = [tickets = m_tickets, ticket, key, writing = std::move(writing)]
     {
-        comgui::Value before = ValueOf(tickets, ticket, key);
-        comgui::Outcome outcome = writing(tickets);
-        comgui::Value after = outcome ? ValueOf(tickets, ticket, key) : comgui::Value();
-        return Written{std::move(outcome), std::move(before), std::move(after)};
+        auto const before = ValueOf(tickets, ticket, key);
+        if (!before)
+            return Written{before.GetError(), {}, {}};
+        if (comgui::Outcome const outcome = writing(tickets); !outcome)
+            return Written{outcome, {}, {}};
+        auto const after = ValueOf(tickets, ticket, key);
+        return Written{{}, *before, after ? std::optional(*after) : std::nullopt};
     };
     OnWorker(work,
              [this, ticket, key](Written const& written)
              {
                  if (!written.outcome)
                      return onRefused(ticket, key, written.outcome.GetError());
-                 m_history.Record(ticket, key, written.before, written.after);
+                 if (written.after)
+                     m_history.Record(ticket, key, written.before, *written.after);
                  ++m_recorded;
                  onHistory();
                  onWritten(ticket, key);
@@ -80,21 +112,19 @@ void TicketEditor::StepAsPresent(bool isUndo)
     EditHistory::Step const* const step = isUndo ? m_history.NextUndo() : m_history.NextRedo();
     if (!step)
         return EndStep();
-    auto const read = [tickets = m_tickets, edits = *step]
-    {
-        Presents presents;
-        for (Edit const& edit : edits)
-            presents[{edit.ticket, edit.key}] = ValueOf(tickets, edit.ticket, edit.key);
-        return presents;
-    };
-    OnWorker(read,
-             [this, isUndo, recorded = m_recorded](Presents const& presents)
+    OnWorker([tickets = m_tickets, edits = *step] { return PresentsOf(tickets, edits); },
+             [this, isUndo, recorded = m_recorded](auto const& presents)
              {
                  // A write that was under way has made another step the next one.
                  if (recorded != m_recorded)
                      return StepAsPresent(isUndo);
-                 auto const present = [&presents](comgui::TicketAddress ticket, std::string const& key) {
-                     return presents.at({ticket, key});
+                 if (auto const* const unread = std::get_if<Unread>(&presents))
+                 {
+                     EndStep();
+                     return onRefused(unread->ticket, unread->key, unread->error);
+                 }
+                 auto const present = [&there = std::get<Presents>(presents)](auto ticket, auto const& key) {
+                     return there.at({ticket, key});
                  };
                  WriteStep(isUndo ? m_history.Undo(present) : m_history.Redo(present));
              });

@@ -5,10 +5,8 @@
 #include "desk/model/EditHistory.h"
 #include <comgui/client.h>
 #include <functional>
-#include <map>
 #include <memory>
 #include <string>
-#include <utility>
 #include <vector>
 
 namespace desk
@@ -22,9 +20,11 @@ public:
     TicketEditor(TicketEditor const&) = delete;
     TicketEditor& operator=(TicketEditor const&) = delete;
 
-    // The server has refused it, or it cannot be what the key holds.
+    // The server has refused it, or it cannot be what the key holds, or what the key holds cannot be read:
+    // without that there would be no way back.
     std::function<void(comgui::TicketAddress, std::string const& key, comgui::Error const&)> onRefused =
         [](auto, auto const&, auto const&) {};
+    // There is something to undo then, unless what the server has made of it cannot be read.
     std::function<void(comgui::TicketAddress, std::string const& key)> onWritten = [](auto, auto const&) {};
 
     // Whether to undo or redo although others have changed these keys since.
@@ -48,7 +48,6 @@ private:
     {
     };
     using Writing = std::function<comgui::Outcome(comgui::Tickets const&)>;
-    using Presents = std::map<std::pair<comgui::TicketAddress, std::string>, comgui::Value>;
 
     void Do(comgui::TicketAddress ticket, std::string const& key, Writing writing);
     void StepAsPresent(bool isUndo);

@@ -1,7 +1,7 @@
 // Edits at a server, and their way back.
 #include "desk/model/TicketEditor.h"
 
-#include "tests/client/Client.h"
+#include "tests/client/TroubledClient.h"
 #include <gmock/gmock.h>
 
 using namespace desk;
@@ -11,7 +11,7 @@ using testing::IsEmpty;
 
 namespace
 {
-class EditorOfTickets : public Client
+class EditorOfTickets : public TroubledClient
 {
 protected:
     EditorOfTickets()
@@ -36,10 +36,8 @@ protected:
     }
     int Copies() const { return tickets.ReadAs<int>(job, "Copies").ValueOr(0); }
 
-    comgui::TaskQueue queue;
     comgui::Worker const worker{queue.GetExecutor()};
     std::optional<TicketEditor> editor{std::in_place, tickets, worker};
-    std::vector<std::string> heard;
     bool isForeignOverwritten = false;
     comgui::TicketAddress const job = (LogIn(), NewTicket());
 };
@@ -147,6 +145,45 @@ TEST_F(EditorOfTickets, WhoseUndoIsRefused_KeepsIt)
     editor->Undo();
     Await(2);
     EXPECT_TRUE(editor->CanUndo()) << heard.back();
+}
+
+// Of lists, so that a read is a walk, which the plug-in refuses by order.
+TEST_F(EditorOfTickets, WithoutKnowingWhatTheKeyHolds_DoesNotWrite)
+{
+    comgui::Value const before = comgui::MakeList<int>({1, 2});
+    ASSERT_TRUE(tickets.Write(job, "Pages", before));
+    trouble.tickets.refusedWalks = 1;
+    editor->Write(job, "Pages", 3);
+    Await(1);
+    EXPECT_THAT(heard, ElementsAre("Pages refused " + std::to_string(comgui::BadAnswer)));
+    EXPECT_EQ(*tickets.Read(job, "Pages"), before);
+    EXPECT_FALSE(editor->CanUndo());
+}
+
+TEST_F(EditorOfTickets, WithoutKnowingWhatTheKeyHolds_DoesNotUndo_AndKeepsTheStep)
+{
+    comgui::Value const after = comgui::MakeList<int>({1, 2});
+    isForeignOverwritten = true;
+    editor->Write(job, "Pages", after);
+    Await(1);
+    trouble.tickets.refusedWalks = 1;
+    editor->Undo();
+    Await(2);
+    EXPECT_THAT(heard, ElementsAre("Pages written", "Pages refused " + std::to_string(comgui::BadAnswer)));
+    EXPECT_EQ(*tickets.Read(job, "Pages"), after);
+    editor->Undo();
+    Await(3);
+    EXPECT_EQ(CodeOf(tickets.Read(job, "Pages")), comgui::NoSuchKey);
+}
+
+TEST_F(EditorOfTickets, WithoutKnowingWhatTheKeyHasBecome_HasNothingToUndo)
+{
+    ASSERT_TRUE(tickets.Write(job, "Pages", 1));
+    trouble.tickets.refusedWalks = 1;
+    editor->Write(job, "Pages", comgui::MakeList<int>({1, 2}));
+    Await(1);
+    EXPECT_THAT(heard, ElementsAre("Pages written"));
+    EXPECT_FALSE(editor->CanUndo());
 }
 
 TEST_F(EditorOfTickets, WithNothingToUndo_DoesNothing)
