@@ -41,6 +41,12 @@ comgui::Result<Lists> IdsOfAll(comgui::Tickets const& tickets)
     }
     return lists;
 }
+
+bool IsOfTransfer(comgui::Event const& event)
+{
+    return std::holds_alternative<comgui::TransferProgressed>(event) ||
+           std::holds_alternative<comgui::TransferEnded>(event);
+}
 }  // namespace
 
 DeskSession::DeskSession(comgui::Executor here) : m_worker(here)
@@ -51,39 +57,53 @@ DeskSession::DeskSession(comgui::Executor here) : m_worker(here)
 
 void DeskSession::LoggedIn()
 {
-    Become(State::LoggedIn);
+    ForgetSession();
+    if (m_connection.IsServerThere())
+        Become(State::LoggedIn);
+    else  // lost since, and the news of it came too early
+        Become(State::Lost, {comgui::ServerAway, {}, {}});
     ListAll();
 }
 
 void DeskSession::LogOut()
 {
     m_worker.Do([this] { return m_connection.LogOut(); }, [](comgui::Outcome const&) {});
+    ForgetSession();
     Become(State::LoggedOut);
+}
+
+void DeskSession::ForgetSession()
+{
+    ++m_session;
+    m_listings = 0;
+    m_late.clear();
 }
 
 void DeskSession::List(int type)
 {
     ++m_listings;
     m_worker.Do([tickets = m_tickets, type] { return IdsOf(tickets, type); },
-                [this, type](comgui::Result<std::vector<int>> const& ids)
-                {
-                    ids ? onList(type, *ids) : onProblem(ids.GetError());
-                    EndListing();
-                });
+                InThisSession(
+                    [this, type](comgui::Result<std::vector<int>> const& ids)
+                    {
+                        ids ? onList(type, *ids) : onProblem(ids.GetError());
+                        EndListing();
+                    }));
 }
 
 void DeskSession::ListAll()
 {
     ++m_listings;
     m_worker.Do([tickets = m_tickets] { return IdsOfAll(tickets); },
-                [this](comgui::Result<Lists> const& lists)
-                {
-                    if (!lists)
-                        onProblem(lists.GetError());
-                    for (auto const& [type, ids] : lists.ValueOr({}))
-                        onList(type, ids);
-                    EndListing();
-                });
+                InThisSession(
+                    [this](comgui::Result<Lists> const& lists)
+                    {
+                        if (!lists)
+                            onProblem(lists.GetError());
+                        for (auto const& [type, ids] : lists.ValueOr({}))
+                            onList(type, ids);
+                        EndListing();
+                    }));
 }
 
 void DeskSession::EndListing()
@@ -96,6 +116,8 @@ void DeskSession::EndListing()
 
 void DeskSession::Take(comgui::Event const& event)
 {
+    if (m_state == State::LoggedOut && !IsOfTransfer(event))
+        return;
     if (auto const* const lost = std::get_if<comgui::ServerLost>(&event))
         Become(State::Lost, lost->error);
     else if (auto const* const back = std::get_if<comgui::ServerBack>(&event))

@@ -28,7 +28,8 @@ public:
     // A ticket has come or gone. Also of those that a list named already.
     std::function<void(comgui::TicketAddress, bool isThere)> onTicket = [](comgui::TicketAddress, bool) {};
 
-    // Every event, after it has been taken into account here.
+    // Every event, after it has been taken into account here. While logged out, of transfers alone: what is
+    // left of the others belongs to a session that has ended.
     std::function<void(comgui::Event const&)> onEvent = [](comgui::Event const&) {};
 
     // All tickets of a type, in ascending order.
@@ -43,6 +44,18 @@ public:
     void List(int type);
     void ListAll();
 
+    // For results of the worker's that mean nothing to another session: calls `then` only if neither a login
+    // nor a logout has come since.
+    template <typename Then>
+    auto InThisSession(Then then) const
+    {
+        return [this, session = m_session, then = std::move(then)](auto const&... result)
+        {
+            if (session == m_session)
+                then(result...);
+        };
+    }
+
     State Now() const { return m_state; }
     comgui::Connection& Connection() { return m_connection; }
     comgui::Tickets const& Tickets() const { return m_tickets; }
@@ -52,12 +65,14 @@ private:
     void Take(comgui::Event const& event);
     void TakeTicket(comgui::TicketAddress ticket, bool isThere);
     void EndListing();
+    void ForgetSession();
     void Become(State state, comgui::Error const& error = {});
 
     comgui::Connection m_connection;
     comgui::Tickets const m_tickets = m_connection.GetTickets();
     State m_state = State::LoggedOut;
-    int m_listings = 0;  // under way; what is heard meanwhile may be newer, so it is told once more
+    unsigned long m_session = 0;  // which one, the times between them included
+    int m_listings = 0;           // under way; what is heard meanwhile may be newer, so it is told once more
     std::vector<std::pair<comgui::TicketAddress, bool>> m_late;
     comgui::Worker const m_worker;
     comgui::Subscription m_events;

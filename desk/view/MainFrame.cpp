@@ -216,8 +216,10 @@ void MainFrame::LogIn(comgui::Server const& server, comgui::Account const& accou
 {
     Say(_("Logging in ..."));
     m_session.Worker().Do([this, server, account] { return m_session.Connection().LogIn(server, account); },
-                          [this, server](comgui::Result<comgui::User> const& user)
-                          { user ? LoggedIn(server, user->name) : AskForLogin(user.GetError().Text()); });
+                          m_session.InThisSession(
+                              [this, server](comgui::Result<comgui::User> const& user) {
+                                  user ? LoggedIn(server, user->name) : AskForLogin(user.GetError().Text());
+                              }));
 }
 
 void MainFrame::LoggedIn(comgui::Server const& server, std::string const& user)
@@ -433,13 +435,14 @@ void MainFrame::NewTicket()
         return;
     m_session.Worker().Do([tickets = m_session.Tickets(), type]
                           { return tickets.Create(static_cast<int>(type)); },
-                          [this](comgui::Result<comgui::TicketAddress> const& ticket)
-                          {
-                              if (!ticket)
-                                  return Complain(comgui::ToWx(ticket.GetError().Text()));
-                              m_session.Made(*ticket);
-                              m_tickets->Choose(*ticket);
-                          });
+                          m_session.InThisSession(
+                              [this](comgui::Result<comgui::TicketAddress> const& ticket)
+                              {
+                                  if (!ticket)
+                                      return Complain(comgui::ToWx(ticket.GetError().Text()));
+                                  m_session.Made(*ticket);
+                                  m_tickets->Choose(*ticket);
+                              }));
 }
 
 void MainFrame::DeleteTicket()
@@ -452,11 +455,12 @@ void MainFrame::DeleteTicket()
             _("Delete the ticket"), wxYES_NO | wxNO_DEFAULT | wxICON_QUESTION, this) != wxYES)
         return;
     m_session.Worker().Do([tickets = m_session.Tickets(), ticket] { return tickets.Delete(ticket); },
-                          [this, ticket](comgui::Outcome const& outcome)
-                          {
-                              outcome ? Say(wxString::Format(_("%s is deleted"), NameOf(ticket)))
-                                      : Complain(comgui::ToWx(outcome.GetError().Text()));
-                          });
+                          m_session.InThisSession(
+                              [this, ticket](comgui::Outcome const& outcome)
+                              {
+                                  outcome ? Say(wxString::Format(_("%s is deleted"), NameOf(ticket)))
+                                          : Complain(comgui::ToWx(outcome.GetError().Text()));
+                              }));
 }
 
 void MainFrame::NewKey()
@@ -490,14 +494,15 @@ void MainFrame::Export()
 
 void MainFrame::Import()
 {
-    ImportTicket(
-        this, m_session.Tickets(), m_session.Worker(), m_live ? m_live->Address().type : comgui::JobTickets,
-        [this](comgui::TicketAddress ticket)
-        {
-            m_session.Made(ticket);
-            m_tickets->Choose(ticket);
-        },
-        [this](wxString const& text) { Complain(text); });
+    ImportTicket(this, m_session.Tickets(), m_session.Worker(),
+                 m_live ? m_live->Address().type : comgui::JobTickets,
+                 m_session.InThisSession(
+                     [this](comgui::TicketAddress ticket)
+                     {
+                         m_session.Made(ticket);
+                         m_tickets->Choose(ticket);
+                     }),
+                 [this](wxString const& text) { Complain(text); });
 }
 
 void MainFrame::Compare()

@@ -1,8 +1,9 @@
 // What the desk does at a server, without any window.
 #include "desk/model/DeskSession.h"
 
-#include "tests/client/Client.h"
+#include "tests/client/TroubledClient.h"
 #include <algorithm>
+#include <future>
 #include <gmock/gmock.h>
 #include <map>
 #include <set>
@@ -18,7 +19,7 @@ using testing::SizeIs;
 
 namespace
 {
-class SessionOfTheDesk : public Client
+class SessionOfTheDesk : public TroubledClient
 {
 protected:
     SessionOfTheDesk()
@@ -46,7 +47,13 @@ protected:
         ASSERT_TRUE(Await([this] { return lists.size() == comgui::TicketTypes; }));
     }
 
-    comgui::TaskQueue queue;
+    // What is given to the worker from here on waits.
+    void KeepTheWorkerBusy()
+    {
+        session.Worker().Do([open = gate.get_future().share()] { open.wait_for(20s); }, [] {});
+    }
+
+    std::promise<void> gate;  // opens when it has a value
     DeskSession session{queue.GetExecutor()};
     std::vector<DeskSession::State> states;
     std::map<int, std::vector<int>> lists;
@@ -116,4 +123,101 @@ TEST_F(SessionOfTheDesk, AfterTheLogout_IsLoggedOut)
     session.LogOut();
     EXPECT_THAT(states, ElementsAre(DeskSession::State::LoggedIn, DeskSession::State::LoggedOut));
     EXPECT_TRUE(Await([this] { return !session.Connection().IsLoggedIn(); }));
+}
+
+TEST_F(SessionOfTheDesk, WhatWasUnderWayAtTheLogout_IsNotTold)
+{
+    Enter();
+    LogIn();
+    KeepTheWorkerBusy();
+    session.ListAll();
+    comgui::TicketAddress const job = NewTicket();
+    ASSERT_TRUE(Await([&] { return known.count(job) == 1; }));
+    session.LogOut();
+    lists.clear();
+    known.clear();
+    gate.set_value();
+    ASSERT_TRUE(Await([this] { return !session.Connection().IsLoggedIn(); }));
+    queue.RunFor(50ms);
+    EXPECT_THAT(lists, IsEmpty());
+    EXPECT_THAT(known, IsEmpty());
+    EXPECT_THAT(problems, IsEmpty());
+}
+
+TEST_F(SessionOfTheDesk, WhatWasUnderWayAtTheNextLogin_IsNotTold)
+{
+    Enter();
+    KeepTheWorkerBusy();
+    session.List(comgui::JobTickets);
+    lists.clear();
+    session.LoggedIn();
+    bool isLate = false;
+    session.onList = [&](int type, std::vector<int> const& ids)
+    {
+        isLate = isLate || lists.count(type) == 1;
+        lists[type] = ids;
+    };
+    gate.set_value();
+    ASSERT_TRUE(Await([this] { return lists.size() == comgui::TicketTypes; }));
+    EXPECT_FALSE(isLate);
+}
+
+TEST_F(SessionOfTheDesk, WhatOthersDoWhileTheLogoutWaits_IsNotTold)
+{
+    Enter();
+    LogIn();
+    std::vector<comgui::TicketAddress> created;
+    comgui::Subscription const later = session.Connection().Subscribe(
+        comgui::Interest::InAllTypes(), queue.GetExecutor(),
+        [&](comgui::Event const& event)
+        {
+            if (auto const* const ticket = std::get_if<comgui::TicketCreated>(&event))
+                created.push_back(ticket->ticket);
+        },
+        100ms);
+    KeepTheWorkerBusy();
+    session.LogOut();
+    comgui::TicketAddress const job = NewTicket();
+    ASSERT_TRUE(Await([&] { return std::count(created.begin(), created.end(), job) == 1; }));
+    queue.RunFor(100ms);
+    EXPECT_THAT(known, IsEmpty());
+    EXPECT_THAT(events, IsEmpty());
+    gate.set_value();
+}
+
+TEST_F(SessionOfTheDesk, ServerThatIsLostWhileTheLogoutWaits_IsNotLookedFor)
+{
+    Enter();
+    KeepTheWorkerBusy();
+    session.LogOut();
+    trouble.serverIsAway = true;
+    ASSERT_TRUE(Await([this] { return !session.Connection().IsServerThere(); }));
+    queue.RunFor(200ms);
+    EXPECT_THAT(states, ElementsAre(DeskSession::State::LoggedIn, DeskSession::State::LoggedOut));
+    gate.set_value();
+}
+
+TEST_F(SessionOfTheDesk, ServerThatIsLostBeforeTheLoginIsTaken_IsLost)
+{
+    ASSERT_TRUE(session.Connection().LogIn(Here(), Admin()));
+    trouble.serverIsAway = true;
+    ASSERT_TRUE(Await([this] { return !session.Connection().IsServerThere(); }));
+    queue.RunFor(200ms);
+    session.LoggedIn();
+    EXPECT_EQ(session.Now(), DeskSession::State::Lost);
+    trouble.serverIsAway = false;
+    EXPECT_TRUE(Await([this] { return session.Now() == DeskSession::State::LoggedIn; }));
+}
+
+TEST_F(SessionOfTheDesk, PassesResultsOnInTheirSessionOnly)
+{
+    Enter();
+    std::vector<int> taken;
+    auto const take = session.InThisSession([&](int result) { taken.push_back(result); });
+    take(1);
+    session.LogOut();
+    take(2);
+    session.LoggedIn();
+    take(3);
+    EXPECT_THAT(taken, ElementsAre(1));
 }
