@@ -1,6 +1,8 @@
 #include "desk/view/LoginDialog.h"
 
 #include "desk/model/ServerName.h"
+#include <atomic>
+#include <utility>
 #include <wx/button.h>
 #include <wx/sizer.h>
 #include <wx/textctrl.h>
@@ -12,6 +14,12 @@ namespace
 {
 constexpr int Width = 380;  // in pixels of a plain screen
 }
+
+struct LoginDialog::Attempt
+{
+    std::atomic<bool> isGivenUp{false};
+    bool hasEntered = false;  // of the worker's thread
+};
 
 LoginDialog::LoginDialog(wxWindow* parent, comgui::Connection& connection, comgui::Worker const& worker,
                          std::vector<std::string> const& servers, std::string const& user)
@@ -89,21 +97,50 @@ void LoginDialog::LogIn()
     Say(_("Logging in ..."));
     comgui::Account const account{comgui::ToUtf8(m_userField->GetValue()),
                                   comgui::ToUtf8(m_passwordField->GetValue())};
-    m_worker.Do([&connection = m_connection, server = m_server, account]
-                { return connection.LogIn(server, account); },
-                [self = wxWeakRef<LoginDialog>(this),
-                 &connection = m_connection](comgui::Result<comgui::User> const& user)
-                {
-                    if (self && self->IsModal())
-                        self->Answered(user);
-                    else if (user)
-                        (void)connection.LogOut();  // the user has given up meanwhile
-                });
+    m_attempt = std::make_shared<Attempt>();
+    m_worker.Do(
+        [&connection = m_connection, server = m_server, account,
+         attempt = m_attempt]() -> comgui::Result<comgui::User>
+        {
+            if (attempt->isGivenUp)  // before it has ended the session that is there
+                return comgui::Error{comgui::Cancelled, account.user, {}};
+            auto user = connection.LogIn(server, account);
+            attempt->hasEntered = user.IsGood();
+            return user;
+        },
+        [self = wxWeakRef<LoginDialog>(this)](comgui::Result<comgui::User> const& user)
+        {
+            if (self && self->IsModal())
+                self->Answered(user);
+        });
+}
+
+int LoginDialog::ShowModal()
+{
+    int const answer = wxDialog::ShowModal();
+    GiveUp();
+    return answer;
+}
+
+// The worker's order is what keeps this logout from ending another login than the one given up.
+void LoginDialog::GiveUp()
+{
+    if (!m_attempt)
+        return;
+    m_attempt->isGivenUp = true;
+    m_worker.Do(
+        [&connection = m_connection, attempt = std::exchange(m_attempt, nullptr)]
+        {
+            if (attempt->hasEntered)
+                (void)connection.LogOut();
+        },
+        [] {});
 }
 
 void LoginDialog::Answered(comgui::Result<comgui::User> const& user)
 {
     SetBusy(false);
+    m_attempt.reset();
     if (user)
     {
         m_user = *user;

@@ -3,6 +3,7 @@
 #pragma once
 
 #include <comgui/client.h>
+#include <memory>
 #include <optional>
 #include <string>
 #include <vector>
@@ -25,14 +26,21 @@ public:
     // Shows why it is needed: a login that was refused, a session that has ended.
     void Explain(std::string const& why);
 
+    // A login that the user gives up is undone on the worker's thread, before anything given to it
+    // afterwards.
+    int ShowModal() override;
+
     // After ShowModal has returned wxID_OK.
     comgui::User const& User() const { return *m_user; }
     comgui::Server const& Server() const { return m_server; }
 
 private:
+    struct Attempt;
+
     void Test();
     void LogIn();
     void Answered(comgui::Result<comgui::User> const& user);
+    void GiveUp();
     bool TakeServer();
     void SetBusy(bool isBusy);
     void Say(wxString const& text);
@@ -41,6 +49,7 @@ private:
     comgui::Worker const& m_worker;
     comgui::Server m_server;
     std::optional<comgui::User> m_user;
+    std::shared_ptr<Attempt> m_attempt;  // to log in, that is under way
     wxComboBox* m_serverField;
     wxTextCtrl* m_userField;
     wxTextCtrl* m_passwordField;

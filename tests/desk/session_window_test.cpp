@@ -1,0 +1,112 @@
+// The window's sessions: logins that are given up or refused, and what a session leaves behind.
+#include "comgui/comgui.h"
+#include "tests/client/TroubledPlugIn.h"
+#include "tests/desk/WindowOfTheDesk.h"
+#include "tests/support/BundleOnDisk.h"
+#include <dlfcn.h>
+#include <gmock/gmock.h>
+#include <wx/timer.h>
+
+using namespace desk;
+using namespace std::chrono_literals;
+using testing::HasSubstr;
+
+namespace
+{
+// What the user does beside a dialog, whose loop runs until it is closed.
+class User
+{
+public:
+    explicit User(std::function<void()> acts)
+    {
+        m_timer.Bind(wxEVT_TIMER, [acts = std::move(acts)](auto&) { acts(); });
+        m_timer.Start(20);
+    }
+
+private:
+    wxTimer m_timer;
+};
+
+class SessionsOfTheWindow : public WindowOfTheDesk
+{
+protected:
+    SessionsOfTheWindow() : bundle(folder.Path())
+    {
+        bundle.LinkExecutable(COMGUI_TROUBLED_PLUGIN);
+        bundle.AddFactory(COMGUI_PLUGIN_TYPE_UUID, "11111111-2222-3333-4444-555555555555",
+                          "TroubledPlugInFactory");
+        UtilityObjects::SetPlugInsFolder(folder.Path().native());
+    }
+
+    static void Press(int id)
+    {
+        wxCommandEvent click(wxEVT_BUTTON, id);
+        wxWindow::FindWindowById(id, Find<wxWindow>("login"))->GetEventHandler()->ProcessEvent(click);
+    }
+    // In the dialog, while it takes something.
+    static bool Enter(std::string const& password)
+    {
+        auto* const field = Find<wxTextCtrl>("password");
+        if (!field || !field->IsEnabled())
+            return false;
+        Find<wxTextCtrl>("user")->SetValue("admin");
+        field->SetValue(comgui::ToWx(password));
+        Press(wxID_OK);
+        return true;
+    }
+    void BeginALogin_AndGiveItUp()
+    {
+        bool isBegun = false;
+        int const before = trouble.tries;
+        User const user(
+            [&]
+            {
+                isBegun = isBegun || Enter("admin");
+                if (trouble.tries > before)
+                    Press(wxID_CANCEL);
+            });
+        frame->AskForLogin();
+    }
+    static void RunFor(std::chrono::milliseconds time)
+    {
+        for (auto const end = std::chrono::steady_clock::now() + time;
+             std::chrono::steady_clock::now() < end;)
+            RunEvents();
+    }
+
+    BundleOnDisk bundle;
+    TROUBLE& trouble = *static_cast<TROUBLE*>(
+        dlsym(dlopen(COMGUI_TROUBLED_PLUGIN, RTLD_NOW | RTLD_LOCAL), "TroubledPlugInOrders"));
+};
+}  // namespace
+
+TEST_F(SessionsOfTheWindow, LoginThatIsGivenUp_IsUndoneWithoutBlockingTheWindow)
+{
+    trouble.loginTakes = 300;
+    trouble.logoutTakes = 3000;
+    BeginALogin_AndGiveItUp();
+    auto longest = 0ms;
+    auto last = std::chrono::steady_clock::now();
+    EXPECT_TRUE(Await(
+        [&]
+        {
+            auto const now = std::chrono::steady_clock::now();
+            longest = std::max(longest, std::chrono::duration_cast<std::chrono::milliseconds>(now - last));
+            last = now;
+            return trouble.logouts == 1;
+        }));
+    EXPECT_LT(longest, 2000ms);
+}
+
+TEST_F(SessionsOfTheWindow, LoginThatIsGivenUp_DoesNotEndTheNext)
+{
+    trouble.loginTakes = 500;
+    BeginALogin_AndGiveItUp();
+    frame->LogIn(Here(), Admin());
+    ASSERT_TRUE(Await([this] { return types.Count() > 0; }));
+    RunFor(500ms);
+    EXPECT_EQ(trouble.logins, 2);
+    EXPECT_EQ(trouble.logouts, 1);
+    ShowJob({comgui::JobTickets, 1});
+    EXPECT_TRUE(Await([this] { return keys.Count() > 0; }));
+}
