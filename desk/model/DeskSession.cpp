@@ -68,6 +68,23 @@ void DeskSession::LoggedIn()
 void DeskSession::LogOut()
 {
     m_worker.Do([this] { return m_connection.LogOut(); }, [](comgui::Outcome const&) {});
+    EndSession();
+}
+
+// Asked behind a login that is given up, but may still be under way.
+void DeskSession::LoginFailed()
+{
+    m_worker.Do([this] { return m_connection.IsLoggedIn(); },
+                InThisSession(
+                    [this](bool isLoggedIn)
+                    {
+                        if (!isLoggedIn && m_state != State::LoggedOut)
+                            EndSession();
+                    }));
+}
+
+void DeskSession::EndSession()
+{
     ForgetSession();
     Become(State::LoggedOut);
 }

@@ -40,6 +40,7 @@ public:
 
     void LoggedIn();  // the connection has been logged in: what there is is listed
     void LogOut();
+    void LoginFailed();  // or was given up: the session that was there before it may have ended
     void Made(comgui::TicketAddress ticket) { TakeTicket(ticket, true); }  // before the server's event comes
     void List(int type);
     void ListAll();
@@ -65,6 +66,7 @@ private:
     void Take(comgui::Event const& event);
     void TakeTicket(comgui::TicketAddress ticket, bool isThere);
     void EndListing();
+    void EndSession();
     void ForgetSession();
     void Become(State state, comgui::Error const& error = {});
 

@@ -105,7 +105,7 @@ void MainFrame::MakeMenus()
     };
     auto* const server = new wxMenu;
     add(server, _("Log &in ...\tCtrl+L"), [this] { AskForLogin(); });
-    add(server, _("Log &out"), [this] { LogOut(); });
+    add(server, _("Log &out"), [this] { m_session.LogOut(); });
     server->AppendSeparator();
     add(server, _("&Send jobs ...\tCtrl+J"), [this] { m_transfers->Send(); });
     server->AppendSeparator();
@@ -210,6 +210,8 @@ void MainFrame::AskForLogin(std::string const& why)
         dialog.Explain(why);
     if (dialog.ShowModal() == wxID_OK)
         LoggedIn(dialog.Server(), dialog.User().name);
+    else
+        m_session.LoginFailed();
 }
 
 void MainFrame::LogIn(comgui::Server const& server, comgui::Account const& account)
@@ -229,14 +231,6 @@ void MainFrame::LoggedIn(comgui::Server const& server, std::string const& user)
     ForgetTickets();
     m_session.LoggedIn();
     Say(wxString::Format(_("Logged in: %s"), comgui::ToWx(user)));
-}
-
-void MainFrame::LogOut()
-{
-    ForgetTickets();
-    m_session.LogOut();
-    m_complaint->Dismiss();
-    Say(_("Logged out"));
 }
 
 void MainFrame::ForgetTickets()
@@ -259,6 +253,12 @@ void MainFrame::Take(DeskSession::State state, comgui::Error const& error)
     bool const isIn = state != DeskSession::State::LoggedOut;
     SetTitle(isIn ? m_server + " - " + _("Ticket desk") : _("Ticket desk"));
     m_transfers->Enable(isIn);
+    if (!isIn)
+    {
+        ForgetTickets();
+        m_complaint->Dismiss();
+        Say(_("Logged out"));
+    }
     if (state == DeskSession::State::Lost)
         m_info->ShowMessage(wxString::Format(_("%s. Trying again ..."), ShownText(error.Text())),
                             wxICON_ERROR);

@@ -52,7 +52,6 @@ private:
     void Connect();
 
     void LoggedIn(comgui::Server const& server, std::string const& user);
-    void LogOut();
     void Take(DeskSession::State state, comgui::Error const& error);
     void ChooseFirst();
     void TakeList(int type, std::vector<int> const& ids);

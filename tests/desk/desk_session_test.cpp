@@ -209,6 +209,25 @@ TEST_F(SessionOfTheDesk, ServerThatIsLostBeforeTheLoginIsTaken_IsLost)
     EXPECT_TRUE(Await([this] { return session.Now() == DeskSession::State::LoggedIn; }));
 }
 
+TEST_F(SessionOfTheDesk, AfterALoginThatFailed_IsLoggedOut)
+{
+    Enter();
+    ASSERT_FALSE(session.Connection().LogIn(Here(), {"admin", "wrong"}));
+    session.LoginFailed();
+    EXPECT_TRUE(Await([this] { return session.Now() == DeskSession::State::LoggedOut; }));
+    EXPECT_THAT(states, ElementsAre(DeskSession::State::LoggedIn, DeskSession::State::LoggedOut));
+}
+
+TEST_F(SessionOfTheDesk, AfterALoginThatNeverBegan_IsStillLoggedIn)
+{
+    Enter();
+    bool isAsked = false;
+    session.LoginFailed();
+    session.Worker().Do([] {}, [&] { isAsked = true; });
+    ASSERT_TRUE(Await([&] { return isAsked; }));
+    EXPECT_THAT(states, ElementsAre(DeskSession::State::LoggedIn));
+}
+
 TEST_F(SessionOfTheDesk, PassesResultsOnInTheirSessionOnly)
 {
     Enter();

@@ -3,7 +3,9 @@
 #include "tests/client/TroubledPlugIn.h"
 #include "tests/desk/WindowOfTheDesk.h"
 #include "tests/support/BundleOnDisk.h"
+#include <algorithm>
 #include <dlfcn.h>
+#include <functional>
 #include <gmock/gmock.h>
 #include <wx/timer.h>
 
@@ -53,6 +55,19 @@ protected:
         field->SetValue(comgui::ToWx(password));
         Press(wxID_OK);
         return true;
+    }
+    void FailToLogIn_AndGiveUp()
+    {
+        bool isTried = false;
+        User const user(
+            [&]
+            {
+                auto* const message = Find<wxWindow>("message");
+                if (isTried && message && message->GetLabel().Contains("wrong"))
+                    Press(wxID_CANCEL);
+                isTried = isTried || Enter("wrong");
+            });
+        frame->AskForLogin();
     }
     void BeginALogin_AndGiveItUp()
     {
@@ -109,4 +124,24 @@ TEST_F(SessionsOfTheWindow, LoginThatIsGivenUp_DoesNotEndTheNext)
     EXPECT_EQ(trouble.logouts, 1);
     ShowJob({comgui::JobTickets, 1});
     EXPECT_TRUE(Await([this] { return keys.Count() > 0; }));
+}
+
+// The kit ends the session before it begins another.
+TEST_F(SessionsOfTheWindow, LoginThatIsRefused_LeavesNothingOfTheSessionBefore)
+{
+    WindowOfTheDesk::Enter();
+    ASSERT_THAT(comgui::ToUtf8(frame->GetTitle()), HasSubstr("admin"));
+    FailToLogIn_AndGiveUp();
+    EXPECT_TRUE(Await([this] { return types.Count() == 0 && shown.Count() == 0; }));
+    EXPECT_EQ(frame->GetTitle(), "Ticket desk");
+    EXPECT_EQ(Status(), "Logged out");
+}
+
+TEST_F(SessionsOfTheWindow, LoginThatIsGivenUp_LeavesNothingOfTheSessionBefore)
+{
+    WindowOfTheDesk::Enter();
+    trouble.loginTakes = 500;
+    BeginALogin_AndGiveItUp();
+    EXPECT_TRUE(Await([this] { return types.Count() == 0 && shown.Count() == 0; }));
+    EXPECT_EQ(frame->GetTitle(), "Ticket desk");
 }
