@@ -246,6 +246,9 @@ void MainFrame::ForgetTickets()
     m_keys->ShowTicket({});
     ShowInks({});
     m_transfers->Take(JobBoard::Change::Rows);
+    for (wxWindow* const child : GetChildren())
+        if (auto* const comparison = dynamic_cast<CompareFrame*>(child))
+            comparison->Destroy();  // would compare tickets of two servers after the next login
 }
 
 void MainFrame::Take(DeskSession::State state, comgui::Error const& error)

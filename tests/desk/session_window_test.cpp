@@ -1,5 +1,6 @@
 // The window's sessions: logins that are given up or refused, and what a session leaves behind.
 #include "comgui/comgui.h"
+#include "desk/view/CompareFrame.h"
 #include "tests/client/TroubledPlugIn.h"
 #include "tests/desk/WindowOfTheDesk.h"
 #include "tests/support/BundleOnDisk.h"
@@ -7,6 +8,7 @@
 #include <dlfcn.h>
 #include <functional>
 #include <gmock/gmock.h>
+#include <wx/textdlg.h>
 #include <wx/timer.h>
 
 using namespace desk;
@@ -82,6 +84,21 @@ protected:
             });
         frame->AskForLogin();
     }
+    void CompareWith(std::string const& ticket)
+    {
+        User const user(
+            [&ticket]
+            {
+                for (wxWindow* const window : wxTopLevelWindows)
+                    if (auto* const dialog = dynamic_cast<wxTextEntryDialog*>(window);
+                        dialog && dialog->IsModal())
+                    {
+                        dialog->SetValue(ticket);
+                        dialog->EndModal(wxID_OK);
+                    }
+            });
+        Menu(MenuOf("Ticket", "Compare with ..."));
+    }
     static void RunFor(std::chrono::milliseconds time)
     {
         for (auto const end = std::chrono::steady_clock::now() + time;
@@ -144,4 +161,15 @@ TEST_F(SessionsOfTheWindow, LoginThatIsGivenUp_LeavesNothingOfTheSessionBefore)
     BeginALogin_AndGiveItUp();
     EXPECT_TRUE(Await([this] { return types.Count() == 0 && shown.Count() == 0; }));
     EXPECT_EQ(frame->GetTitle(), "Ticket desk");
+}
+
+TEST_F(SessionsOfTheWindow, ComparisonsEndWithTheirSession)
+{
+    WindowOfTheDesk::Enter();
+    ShowJob({comgui::JobTickets, 1});
+    CompareWith("3/2");
+    CompareWith("3/3");
+    ASSERT_NE(Find<CompareFrame>("compare"), nullptr);
+    Menu(MenuOf("Server", "Log out"));
+    EXPECT_TRUE(Await([] { return Find<CompareFrame>("compare") == nullptr; }));
 }
