@@ -1,5 +1,7 @@
 #include "desk/model/SearchRun.h"
 
+#include <utility>
+
 namespace desk
 {
 namespace
@@ -18,12 +20,15 @@ struct SearchRun::STATE : std::enable_shared_from_this<STATE>
     void Go()
     {
         worker.Do([self = shared_from_this()] { return self->search.Step(TicketsInAStep); },
-                  [weak = weak_from_this()](SearchBatch const& batch)
+                  [weak = weak_from_this(), begunAt = returns](SearchBatch const& batch)
                   {
                       auto const self = weak.lock();
                       if (!self || self->isOver)
                           return;
-                      if (batch.state == SearchState::Running)
+                      // The server may have come back before the interruption is known here.
+                      bool const isCut = batch.state == SearchState::Interrupted;
+                      self->isInterrupted = isCut && begunAt == self->returns;
+                      if (batch.state == SearchState::Running || (isCut && !self->isInterrupted))
                           self->Go();
                       self->handler(batch);
                   });
@@ -33,6 +38,8 @@ struct SearchRun::STATE : std::enable_shared_from_this<STATE>
     TicketSearch search;
     Handler const handler;
     bool isOver = false;
+    bool isInterrupted = false;
+    unsigned long returns = 0;  // of the server
 };
 
 SearchRun::SearchRun(comgui::Worker const& worker, comgui::Tickets const& tickets, SearchQuery const& query,
@@ -44,6 +51,13 @@ SearchRun::SearchRun(comgui::Worker const& worker, comgui::Tickets const& ticket
           std::move(handler)))
 {
     m_state->Go();
+}
+
+void SearchRun::GoOn()
+{
+    ++m_state->returns;
+    if (std::exchange(m_state->isInterrupted, false))
+        m_state->Go();
 }
 
 SearchRun::~SearchRun()

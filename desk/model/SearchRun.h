@@ -18,6 +18,10 @@ public:
     SearchRun(comgui::Worker const& worker, comgui::Tickets const& tickets, SearchQuery const& query,
               std::vector<comgui::TicketAddress> const& all, Handler handler);
     ~SearchRun();  // no call of the handler comes any more
+
+    // The server is back: goes on if it was interrupted.
+    void GoOn();
+
     SearchRun(SearchRun const&) = delete;
     SearchRun& operator=(SearchRun const&) = delete;
 

@@ -10,6 +10,7 @@
 #include "desk/view/KeysPane.h"
 #include "desk/view/LoginDialog.h"
 #include "desk/view/NewKeyDialog.h"
+#include "desk/view/NumberText.h"
 #include "desk/view/ShownText.h"
 #include "desk/view/TicketFiles.h"
 #include "desk/view/TicketsPane.h"
@@ -36,6 +37,19 @@ constexpr char WindowName[] = "MainWindow";
 wxString NoTicket() { return _("This is no ticket: a number, or a type, a slash and a number."); }
 
 wxString NameOf(comgui::TicketAddress ticket) { return wxString::Format("%d/%d", ticket.type, ticket.id); }
+
+// How far a search is, and what it has not seen.
+wxString NoteOf(SearchBatch const& batch, std::size_t found)
+{
+    wxString note = wxString::Format(_("%zu found, %zu of %zu looked at"), found, batch.done, batch.total);
+    if (batch.unreadable > 0)
+        note += "\n" + wxString::Format(wxPLURAL("%zu ticket cannot be read", "%zu tickets cannot be read",
+                                                 PluralOf(batch.unreadable)),
+                                        batch.unreadable);
+    if (batch.error)
+        note += "\n" + wxString::Format(_("Interrupted: %s"), ShownText(batch.error->Text()));
+    return note;
+}
 }  // namespace
 
 MainFrame::MainFrame()
@@ -304,6 +318,8 @@ void MainFrame::Take(comgui::Event const& event)
     m_events->Take(event);
     m_titles.Take(event);
     std::visit([this](auto const& what) { TakeJobs(what); }, event);
+    if (m_search && std::holds_alternative<comgui::ServerBack>(event))
+        m_search->GoOn();
     if (!m_repaint.IsRunning())
         m_repaint.StartOnce(RepaintPause);
 }
@@ -540,9 +556,7 @@ void MainFrame::Search(std::string const& text)
                          for (SearchMatch const& match : batch.matches)
                              if (m_found.size() < MostFound)
                                  m_found.push_back(match.ticket);
-                         m_tickets->ShowFound(m_found,
-                                              wxString::Format(_("%zu found, %zu of %zu looked at"),
-                                                               m_found.size(), batch.done, batch.total));
+                         m_tickets->ShowFound(m_found, NoteOf(batch, m_found.size()));
                      });
 }
 

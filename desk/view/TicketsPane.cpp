@@ -67,6 +67,7 @@ TicketsPane::TicketsPane(wxWindow* parent, TicketIndex const& index,
     m_search->SetDescriptiveText(_("Key, text or key=value"));
     m_search->ShowCancelButton(true);
     m_note = new wxStaticText(this, wxID_ANY, {});
+    m_note->SetName("search note");
     m_types = new VirtualList(this, "types", m_typeRows);
     m_types->AddTextColumn(_("Type"), 130);
     m_types->AddTextColumn(_("Tickets"), 70, wxALIGN_RIGHT);
@@ -157,15 +158,21 @@ void TicketsPane::TitlesChanged() { m_tickets->RowsLookDifferent(); }
 void TicketsPane::ShowFound(std::vector<comgui::TicketAddress> const& found, wxString const& note)
 {
     m_found = found;
-    m_note->SetLabelText(note);
+    Note(note);
     ResetTickets();
 }
 
 void TicketsPane::EndSearch()
 {
     m_found.reset();
-    m_note->SetLabelText({});
+    Note({});
     ResetTickets();
+}
+
+void TicketsPane::Note(wxString const& text)
+{
+    m_note->SetLabelText(text);
+    Layout();  // it may have more lines now
 }
 
 void TicketsPane::Choose(comgui::TicketAddress ticket)

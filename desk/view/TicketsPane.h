@@ -64,6 +64,7 @@ private:
 
     comgui::TicketAddress TicketAt(unsigned row) const;
     std::optional<unsigned> RowOf(comgui::TicketAddress ticket) const;
+    void Note(wxString const& text);
     void CountChanged(int type);
     void ChooseType(int type);
     void SelectType();

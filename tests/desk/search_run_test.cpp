@@ -1,8 +1,9 @@
 // A search beside whatever else the worker has to do.
 #include "desk/model/SearchRun.h"
 
-#include "tests/client/Client.h"
+#include "tests/client/TroubledClient.h"
 #include <algorithm>
+#include <future>
 #include <gmock/gmock.h>
 
 using namespace desk;
@@ -12,7 +13,7 @@ using testing::IsEmpty;
 
 namespace
 {
-class SearchAtAServer : public Client
+class SearchAtAServer : public TroubledClient
 {
 protected:
     SearchAtAServer()
@@ -34,14 +35,14 @@ protected:
                                                    found.push_back(match.ticket);
                                            });
     }
-    void AwaitEnd()
+    void AwaitEnd(SearchState other = SearchState::Running)
     {
         for (auto const end = std::chrono::steady_clock::now() + 20s;
-             last.state == SearchState::Running && std::chrono::steady_clock::now() < end;)
+             (last.state == SearchState::Running || last.state == other) &&
+             std::chrono::steady_clock::now() < end;)
             queue.RunFor(2ms);
     }
 
-    comgui::TaskQueue queue;
     comgui::Worker const worker{queue.GetExecutor()};
     std::vector<comgui::TicketAddress> jobs;
     std::vector<comgui::TicketAddress> found;
@@ -74,4 +75,34 @@ TEST_F(SearchAtAServer, AtItsEnd_TellsNothing)
     queue.RunFor(200ms);
     EXPECT_THAT(found, IsEmpty());
     EXPECT_EQ(last.total, 0u);
+}
+
+TEST_F(SearchAtAServer, GoesOnWhenTheServerIsBack)
+{
+    trouble.tickets.sessionIsOver = true;
+    auto const search = Search("find me");
+    AwaitEnd();
+    ASSERT_EQ(last.state, SearchState::Interrupted);
+    EXPECT_EQ(last.error->code, comgui::ServerAway);
+    queue.RunFor(50ms);
+    EXPECT_EQ(last.done, 0u);
+    trouble.tickets.sessionIsOver = false;
+    search->GoOn();
+    AwaitEnd(SearchState::Interrupted);
+    EXPECT_THAT(found, ElementsAre(jobs[7], jobs[110]));
+    EXPECT_EQ(last.done, jobs.size());
+}
+
+TEST_F(SearchAtAServer, GoesOnWhenTheServerWasBackBeforeTheInterruptionWasKnown)
+{
+    trouble.tickets.sessionIsOver = true;
+    auto const search = Search("find me");
+    std::promise<void> stepped;
+    worker.Do([&stepped] { stepped.set_value(); }, [] {});
+    stepped.get_future().wait();
+    trouble.tickets.sessionIsOver = false;
+    search->GoOn();
+    AwaitEnd(SearchState::Interrupted);
+    EXPECT_EQ(last.state, SearchState::Finished);
+    EXPECT_THAT(found, ElementsAre(jobs[7], jobs[110]));
 }

@@ -8,6 +8,7 @@
 #include <dlfcn.h>
 #include <functional>
 #include <gmock/gmock.h>
+#include <wx/srchctrl.h>
 #include <wx/textdlg.h>
 #include <wx/timer.h>
 
@@ -99,6 +100,14 @@ protected:
             });
         Menu(MenuOf("Ticket", "Compare with ..."));
     }
+    static void Search(std::string const& text)
+    {
+        auto* const search = Find<wxWindow>("search");
+        dynamic_cast<wxTextEntry*>(search)->SetValue(comgui::ToWx(text));
+        wxCommandEvent enter(wxEVT_SEARCH, search->GetId());
+        search->GetEventHandler()->ProcessEvent(enter);
+    }
+    static std::string Note() { return comgui::ToUtf8(Find<wxWindow>("search note")->GetLabel()); }
     static void RunFor(std::chrono::milliseconds time)
     {
         for (auto const end = std::chrono::steady_clock::now() + time;
@@ -172,4 +181,28 @@ TEST_F(SessionsOfTheWindow, ComparisonsEndWithTheirSession)
     ASSERT_NE(Find<CompareFrame>("compare"), nullptr);
     Menu(MenuOf("Server", "Log out"));
     EXPECT_TRUE(Await([] { return Find<CompareFrame>("compare") == nullptr; }));
+}
+
+TEST_F(SessionsOfTheWindow, SearchThatIsInterrupted_SaysSo_AndGoesOn)
+{
+    WindowOfTheDesk::Enter();
+    ASSERT_TRUE(tickets.Write({comgui::JobTickets, 1}, "Note", "a needle"));
+    trouble.serverIsAway = true;
+    trouble.tickets.sessionIsOver = true;
+    ASSERT_TRUE(Await([this] { return events.RowOf(1, "server lost").has_value(); }));
+    Search("needle");
+    EXPECT_TRUE(Await([] { return Note().find("Interrupted: no server answers") != std::string::npos; }))
+        << Note();
+    trouble.tickets.sessionIsOver = false;
+    trouble.serverIsAway = false;
+    EXPECT_TRUE(Await([this] { return shown.Count() == 1; }));
+    EXPECT_TRUE(Await([] { return Note().find("Interrupted") == std::string::npos; })) << Note();
+}
+
+TEST_F(SessionsOfTheWindow, SearchSaysHowManyTicketsItCouldNotRead)
+{
+    WindowOfTheDesk::Enter();
+    trouble.tickets.refusedWalks = 2;
+    Search("needle");
+    EXPECT_TRUE(Await([] { return Note().find("2 tickets cannot be read") != std::string::npos; })) << Note();
 }
