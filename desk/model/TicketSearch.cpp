@@ -7,7 +7,8 @@ namespace desk
 {
 TicketSearch::TicketSearch(SearchQuery const& query, std::vector<comgui::TicketAddress> tickets,
                            SearchReader reader)
-    : m_text(query.text), m_where(query.where), m_tickets(std::move(tickets)), m_reader(std::move(reader))
+    : m_text(query.text), m_where(query.where), m_tickets(std::move(tickets)), m_reader(std::move(reader)),
+      m_most(query.most)
 {
     if (m_text.IsEmpty())
         m_done = m_tickets.size();
@@ -17,12 +18,12 @@ SearchBatch TicketSearch::Step(std::size_t tickets)
 {
     SearchBatch batch;
     std::size_t const end = m_done + std::clamp<std::size_t>(tickets, 1, m_tickets.size() - m_done + 1);
-    while (m_done < std::min(end, m_tickets.size()) && !IsCancelled())
+    while (m_done < std::min(end, m_tickets.size()) && m_found < m_most && !IsCancelled())
     {
         comgui::TicketAddress const ticket = m_tickets[m_done];
         comgui::Result<comgui::Snapshot> const snapshot = m_reader(ticket);
         if (snapshot)
-            LookAt(ticket, *snapshot, batch);
+            m_found += LookAt(ticket, *snapshot, batch) ? 1 : 0;
         else if (!Skip(snapshot.GetError()))
         {
             batch.error = snapshot.GetError();
@@ -33,7 +34,9 @@ SearchBatch TicketSearch::Step(std::size_t tickets)
     batch.state = IsCancelled()                ? SearchState::Cancelled
                   : batch.error                ? SearchState::Interrupted
                   : m_done == m_tickets.size() ? SearchState::Finished
+                  : m_found >= m_most          ? SearchState::Enough
                                                : SearchState::Running;
+    batch.found = m_found;
     batch.done = m_done;
     batch.total = m_tickets.size();
     batch.gone = m_gone;
@@ -41,20 +44,22 @@ SearchBatch TicketSearch::Step(std::size_t tickets)
     return batch;
 }
 
-// Nothing of a ticket that was not looked at to its end.
-void TicketSearch::LookAt(comgui::TicketAddress ticket, comgui::Snapshot const& snapshot,
+// Whether it is found. Nothing of a ticket that was not looked at to its end.
+bool TicketSearch::LookAt(comgui::TicketAddress ticket, comgui::Snapshot const& snapshot,
                           SearchBatch& batch) const
 {
     SearchMatch match{ticket, {}, 0};
     for (comgui::SnapshotEntry const& entry : snapshot.Entries())
     {
         if (IsCancelled())
-            return;
+            return false;
         if (Matches(entry) && ++match.keys == 1)
             match.key = entry.key;
     }
-    if (match.keys > 0)
-        batch.matches.push_back(std::move(match));
+    if (match.keys == 0)
+        return false;
+    batch.matches.push_back(std::move(match));
+    return true;
 }
 
 // False for what is no matter of this ticket alone: all others would fail in the same way.

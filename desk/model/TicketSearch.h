@@ -26,6 +26,7 @@ struct SearchQuery
 {
     std::string text;  // UTF-8; the empty one finds nothing
     SearchIn where = SearchIn::Both;
+    std::size_t most = 10'000;  // tickets; a wider search helps nobody
 };
 
 // A ticket that holds the text. A ticket of 100,000 matching keys is one match.
@@ -41,6 +42,7 @@ enum class SearchState
     Running,
     Finished,
     Cancelled,
+    Enough,       // as many are found as are wanted, and not all are looked at
     Interrupted,  // the server is away; the next step goes on with the ticket that could not be read
 };
 
@@ -51,6 +53,7 @@ struct SearchBatch
     std::optional<comgui::Error> error;  // why it is interrupted
 
     // Of all steps so far.
+    std::size_t found = 0;
     std::size_t done = 0;  // tickets looked at, gone and unreadable ones included
     std::size_t total = 0;
     std::size_t gone = 0;        // deleted before they could be read
@@ -64,7 +67,8 @@ class TicketSearch
 public:
     TicketSearch(SearchQuery const& query, std::vector<comgui::TicketAddress> tickets, SearchReader reader);
 
-    // Looks at so many tickets, at least one. After the last, and once cancelled, it reads nothing.
+    // Looks at so many tickets, at least one. After the last, with enough found and once cancelled, it reads
+    // nothing.
     SearchBatch Step(std::size_t tickets);
 
     // From any thread: a step that is under way ends before the next key. What it has found so far it still
@@ -76,13 +80,15 @@ private:
     bool Matches(comgui::SnapshotEntry const& entry) const;
     bool MatchesValue(comgui::Value const& value) const;
     bool MatchesEquation(comgui::SnapshotEntry const& entry) const;
-    void LookAt(comgui::TicketAddress ticket, comgui::Snapshot const& snapshot, SearchBatch& batch) const;
+    bool LookAt(comgui::TicketAddress ticket, comgui::Snapshot const& snapshot, SearchBatch& batch) const;
     bool Skip(comgui::Error const& error);
 
     TextMatch const m_text;
     SearchIn const m_where;
     std::vector<comgui::TicketAddress> const m_tickets;
     SearchReader const m_reader;
+    std::size_t const m_most;
+    std::size_t m_found = 0;
     std::size_t m_done = 0;
     std::size_t m_gone = 0;
     std::size_t m_unreadable = 0;

@@ -30,8 +30,7 @@ namespace desk
 {
 namespace
 {
-constexpr int RepaintPause = 50;           // milliseconds; however many events come meanwhile
-constexpr std::size_t MostFound = 10'000;  // tickets; a wider search helps nobody
+constexpr int RepaintPause = 50;  // milliseconds; however many events come meanwhile
 constexpr char WindowName[] = "MainWindow";
 
 wxString NoTicket() { return _("This is no ticket: a number, or a type, a slash and a number."); }
@@ -39,13 +38,16 @@ wxString NoTicket() { return _("This is no ticket: a number, or a type, a slash 
 wxString NameOf(comgui::TicketAddress ticket) { return wxString::Format("%d/%d", ticket.type, ticket.id); }
 
 // How far a search is, and what it has not seen.
-wxString NoteOf(SearchBatch const& batch, std::size_t found)
+wxString NoteOf(SearchBatch const& batch)
 {
-    wxString note = wxString::Format(_("%zu found, %zu of %zu looked at"), found, batch.done, batch.total);
+    wxString note =
+        wxString::Format(_("%zu found, %zu of %zu looked at"), batch.found, batch.done, batch.total);
     if (batch.unreadable > 0)
         note += "\n" + wxString::Format(wxPLURAL("%zu ticket cannot be read", "%zu tickets cannot be read",
                                                  PluralOf(batch.unreadable)),
                                         batch.unreadable);
+    if (batch.state == SearchState::Enough)
+        note += "\n" + wxString::Format(_("More than %zu are not looked for"), batch.found);
     if (batch.error)
         note += "\n" + wxString::Format(_("Interrupted: %s"), ShownText(batch.error->Text()));
     return note;
@@ -543,20 +545,19 @@ void MainFrame::Search(std::string const& text)
 {
     m_search.reset();
     if (text.empty())
-        return m_tickets->EndSearch();
+        return;
     std::vector<comgui::TicketAddress> all;
     for (int const type : m_index.Types())
         for (std::size_t i = 0; i < m_index.Count(type); ++i)
             all.push_back(*m_index.At(type, i));
-    m_found.clear();
-    m_tickets->ShowFound(m_found, _("Searching ..."));
+    m_tickets->BeginSearch(_("Searching ..."));
     m_search.emplace(m_session.Worker(), m_session.Tickets(), SearchQuery{text}, all,
                      [this](SearchBatch const& batch)
                      {
+                         std::vector<comgui::TicketAddress> found;
                          for (SearchMatch const& match : batch.matches)
-                             if (m_found.size() < MostFound)
-                                 m_found.push_back(match.ticket);
-                         m_tickets->ShowFound(m_found, NoteOf(batch, m_found.size()));
+                             found.push_back(match.ticket);
+                         m_tickets->AddFound(found, NoteOf(batch));
                      });
 }
 

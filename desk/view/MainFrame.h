@@ -102,8 +102,7 @@ private:
     TitleReader m_titles;
     TicketEditor m_editor;
     std::optional<SearchRun> m_search;
-    std::optional<comgui::LiveTicket> m_live;  // that is shown
-    std::vector<comgui::TicketAddress> m_found;
+    std::optional<comgui::LiveTicket> m_live;      // that is shown
     std::optional<comgui::TicketAddress> m_first;  // to be chosen once it is listed
     wxTimer m_repaint;
     wxString m_server;       // and user, as the title says them

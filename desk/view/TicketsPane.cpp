@@ -97,12 +97,17 @@ TicketsPane::TicketsPane(wxWindow* parent, TicketIndex const& index,
                             onChoose(*m_chosen);
                         }
                     });
-    m_search->Bind(wxEVT_SEARCH, [this](auto&) { onSearch(comgui::ToUtf8(m_search->GetValue())); });
+    m_search->Bind(wxEVT_SEARCH,
+                   [this](auto&)
+                   {
+                       std::string const text = comgui::ToUtf8(m_search->GetValue());
+                       text.empty() ? EndSearch() : onSearch(text);
+                   });
     m_search->Bind(wxEVT_SEARCH_CANCEL,
                    [this](auto&)
                    {
                        m_search->Clear();
-                       onSearch({});
+                       EndSearch();
                    });
 }
 
@@ -155,11 +160,22 @@ void TicketsPane::Clear()
 
 void TicketsPane::TitlesChanged() { m_tickets->RowsLookDifferent(); }
 
-void TicketsPane::ShowFound(std::vector<comgui::TicketAddress> const& found, wxString const& note)
+void TicketsPane::BeginSearch(wxString const& note)
 {
-    m_found = found;
+    m_found.emplace();
     Note(note);
     ResetTickets();
+}
+
+void TicketsPane::AddFound(std::vector<comgui::TicketAddress> const& found, wxString const& note)
+{
+    if (!m_found)
+        return;
+    std::size_t const first = m_found->size();
+    m_found->insert(m_found->end(), found.begin(), found.end());
+    Note(note);
+    m_tickets->RowsReplaced(first, 0, found.size());
+    SelectChosen();
 }
 
 void TicketsPane::EndSearch()
@@ -167,6 +183,7 @@ void TicketsPane::EndSearch()
     m_found.reset();
     Note({});
     ResetTickets();
+    onSearch({});
 }
 
 void TicketsPane::Note(wxString const& text)
@@ -211,7 +228,13 @@ void TicketsPane::ResetTickets()
 {
     m_tickets->UnselectAll();
     m_tickets->Reset();
-    if (auto const row = m_chosen ? RowOf(*m_chosen) : std::nullopt)
+    SelectChosen();
+}
+
+void TicketsPane::SelectChosen()
+{
+    auto const row = m_chosen ? RowOf(*m_chosen) : std::nullopt;
+    if (row && m_tickets->Selected() != row)
         m_tickets->SelectRow(*row);
 }
 

@@ -20,7 +20,7 @@ public:
     TicketsPane(wxWindow* parent, TicketIndex const& index,
                 std::function<std::string(comgui::TicketAddress)> titleOf);
 
-    // The user has chosen a ticket; the search's text, empty at its end.
+    // The user has chosen a ticket; the search's text, empty whenever a search ends, by whatever it does.
     std::function<void(comgui::TicketAddress)> onChoose = [](comgui::TicketAddress) {};
     std::function<void(std::string const&)> onSearch = [](std::string const&) {};
 
@@ -31,9 +31,9 @@ public:
     void TitlesChanged();
     void Clear();  // another session
 
-    // A search: begins with nothing found, and goes on until Clear. note: how far it is.
-    void ShowFound(std::vector<comgui::TicketAddress> const& found, wxString const& note);
-    void EndSearch();
+    // A search: begins with nothing found, and goes on until onSearch tells its end. note: how far it is.
+    void BeginSearch(wxString const& note);
+    void AddFound(std::vector<comgui::TicketAddress> const& found, wxString const& note);
 
     void Choose(comgui::TicketAddress ticket);
     std::optional<comgui::TicketAddress> Chosen() const;
@@ -64,11 +64,13 @@ private:
 
     comgui::TicketAddress TicketAt(unsigned row) const;
     std::optional<unsigned> RowOf(comgui::TicketAddress ticket) const;
+    void EndSearch();
     void Note(wxString const& text);
     void CountChanged(int type);
     void ChooseType(int type);
     void SelectType();
     void ResetTickets();
+    void SelectChosen();
 
     TicketIndex const& m_index;
     std::function<std::string(comgui::TicketAddress)> const m_titleOf;

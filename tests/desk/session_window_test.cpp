@@ -7,6 +7,7 @@
 #include <algorithm>
 #include <dlfcn.h>
 #include <functional>
+#include <future>
 #include <gmock/gmock.h>
 #include <wx/srchctrl.h>
 #include <wx/textdlg.h>
@@ -205,4 +206,35 @@ TEST_F(SessionsOfTheWindow, SearchSaysHowManyTicketsItCouldNotRead)
     trouble.tickets.refusedWalks = 2;
     Search("needle");
     EXPECT_TRUE(Await([] { return Note().find("2 tickets cannot be read") != std::string::npos; })) << Note();
+}
+
+TEST_F(SessionsOfTheWindow, SearchEndsWhereTheUserChoosesAType)
+{
+    WindowOfTheDesk::Enter();
+    ASSERT_TRUE(tickets.Write({comgui::JobTickets, 1}, "Note", "a needle"));
+    std::promise<void> gate;
+    std::promise<void> reached;
+    trouble.tickets.afterOpening = [&, open = gate.get_future().share()]
+    {
+        reached.set_value();
+        open.wait_for(20s);
+    };
+    Search("needle");
+    ASSERT_EQ(reached.get_future().wait_for(20s), std::future_status::ready);
+    ASSERT_TRUE(Choose(types, 0, "Users"));
+    gate.set_value();
+    RunFor(300ms);
+    EXPECT_EQ(shown.Count(), tickets.List(comgui::UserTickets)->size());
+    EXPECT_EQ(Note(), "");
+}
+
+TEST_F(SessionsOfTheWindow, SearchKeepsTheChosenTicketChosen)
+{
+    WindowOfTheDesk::Enter();
+    ShowJob({comgui::JobTickets, 2});
+    ASSERT_TRUE(tickets.Write({comgui::JobTickets, 1}, "Note", "a needle"));
+    ASSERT_TRUE(tickets.Write({comgui::JobTickets, 2}, "Note", "a needle"));
+    Search("needle");
+    ASSERT_TRUE(Await([this] { return shown.Count() == 2; }));
+    EXPECT_EQ(shown.List()->Selected(), shown.RowOf(0, "3/2"));
 }

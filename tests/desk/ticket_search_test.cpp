@@ -264,3 +264,24 @@ TEST(TicketSearch, HundredThousandTickets_AreSearched)
     EXPECT_EQ(batch.done, 100000U);
     EXPECT_EQ(matches, 1U);
 }
+
+TEST(TicketSearch, ThatHasFoundEnough_ReadsNoMore)
+{
+    Site site = ManyJobs(10);
+    TicketSearch search({"number", SearchIn::Both, 3}, site.All(), site.Reader());
+    EXPECT_EQ(search.Step(2).state, SearchState::Running);
+    SearchBatch const last = search.Step(100);
+    EXPECT_EQ(last.state, SearchState::Enough);
+    EXPECT_EQ(last.matches.size(), 1u);
+    EXPECT_EQ(last.found, 3u);
+    EXPECT_EQ(last.done, 3u);
+    EXPECT_EQ(search.Step(100).state, SearchState::Enough);
+    EXPECT_EQ(site.reads, 3);
+}
+
+TEST(TicketSearch, ThatHasFoundEnoughWithTheLastTicket_IsFinished)
+{
+    Site site = ManyJobs(3);
+    TicketSearch search({"number", SearchIn::Both, 3}, site.All(), site.Reader());
+    EXPECT_EQ(search.Step(100).state, SearchState::Finished);
+}
