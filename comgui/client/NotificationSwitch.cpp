@@ -33,9 +33,9 @@ void NotificationSwitch::Switch()
     std::unique_lock waiting(m_waiting);
     auto const turn = m_asked;
     waiting.unlock();
-    Wanted wanted = Union(m_hub.Interests());
+    Wanted const wanted = Union(m_hub.Interests());
     auto unheard = SwitchOff(wanted);
-    SwitchOn(std::move(wanted));
+    SwitchOn(wanted);
     waiting.lock();
     bool const isLate = m_late > std::exchange(m_done, turn);
     m_served.notify_all();
@@ -144,10 +144,10 @@ std::set<TicketAddress> NotificationSwitch::SwitchOff(Wanted const& wanted)
     return unheard;
 }
 
-void NotificationSwitch::SwitchOn(Wanted wanted)
+void NotificationSwitch::SwitchOn(Wanted const& wanted)
 {
     auto const* const admin = m_container ? MTICKET_ADMIN::Of(m_container) : nullptr;
-    for (auto& [address, keys] : wanted)
+    for (auto const& [address, keys] : wanted)
     {
         auto const known = m_enabled.find(address);
         if (known != m_enabled.end() && known->second == keys)
@@ -160,7 +160,7 @@ void NotificationSwitch::SwitchOn(Wanted wanted)
         table.push_back(nullptr);
         if (!admin->EnableNotification(address.type, address.id, m_notification, table.data()))
             continue;
-        m_enabled[address] = std::move(keys);
+        m_enabled[address] = keys;
         m_news.insert(address);
     }
 }

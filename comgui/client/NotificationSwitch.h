@@ -53,7 +53,7 @@ private:
     void Switch();
     static Wanted Union(std::vector<Interest> const& interests);
     std::set<TicketAddress> SwitchOff(Wanted const& wanted);
-    void SwitchOn(Wanted wanted);
+    void SwitchOn(Wanted const& wanted);
     void Serve(std::uint64_t turn);
 
     EventHub& m_hub;

@@ -62,6 +62,9 @@ VirtualList::VirtualList(wxWindow* parent, wxString const& name, RowSource& sour
          });
 }
 
+// The control ends an edit with an event when its destructor runs, and those who listen may be gone by then.
+VirtualList::~VirtualList() { SetEvtHandlerEnabled(false); }
+
 void VirtualList::AddTextColumn(wxString const& title, int width, wxAlignment alignment,
                                 wxDataViewCellMode mode)
 {

@@ -29,6 +29,7 @@ class VirtualList : public wxDataViewCtrl
 public:
     // name: for who reads the screen aloud, and for tests. source outlives the list.
     VirtualList(wxWindow* parent, wxString const& name, RowSource& source, long style = wxDV_ROW_LINES);
+    ~VirtualList() override;
 
     void AddTextColumn(wxString const& title, int width, wxAlignment alignment = wxALIGN_LEFT,
                        wxDataViewCellMode mode = wxDATAVIEW_CELL_INERT);
