@@ -1,13 +1,16 @@
 #include "desk/model/SearchRun.h"
 
+#include <chrono>
 #include <utility>
 
 namespace desk
 {
 namespace
 {
-constexpr std::size_t TicketsInAStep = 50;
-}
+// How long other work may wait for its turn, whatever a ticket takes.
+constexpr std::chrono::milliseconds StepTime(50);
+constexpr std::size_t TicketsInAStep = 1'000;  // so many finds at once the window takes without a pause
+}  // namespace
 
 struct SearchRun::STATE : std::enable_shared_from_this<STATE>
 {
@@ -19,7 +22,7 @@ struct SearchRun::STATE : std::enable_shared_from_this<STATE>
 
     void Go()
     {
-        worker.Do([self = shared_from_this()] { return self->search.Step(TicketsInAStep); },
+        worker.Do([self = shared_from_this()] { return self->search.Step(TicketsInAStep, StepTime); },
                   [weak = weak_from_this(), begunAt = returns](SearchBatch const& batch)
                   {
                       auto const self = weak.lock();

@@ -1,5 +1,5 @@
-// A search that runs on the worker's thread, a few tickets at a time, so that whatever else the worker has to
-// do gets its turn in between.
+// A search that runs on the worker's thread, for a short time at once, so that whatever else the worker has
+// to do gets its turn in between.
 #pragma once
 
 #include "desk/model/TicketSearch.h"

@@ -14,9 +14,11 @@ TicketSearch::TicketSearch(SearchQuery const& query, std::vector<comgui::TicketA
         m_done = m_tickets.size();
 }
 
-SearchBatch TicketSearch::Step(std::size_t tickets)
+SearchBatch TicketSearch::Step(std::size_t tickets, std::chrono::nanoseconds time)
 {
+    using Clock = std::chrono::steady_clock;
     SearchBatch batch;
+    Clock::time_point const begin = Clock::now();
     std::size_t const end = m_done + std::clamp<std::size_t>(tickets, 1, m_tickets.size() - m_done + 1);
     while (m_done < std::min(end, m_tickets.size()) && m_found < m_most && !IsCancelled())
     {
@@ -30,6 +32,8 @@ SearchBatch TicketSearch::Step(std::size_t tickets)
             break;
         }
         m_done += IsCancelled() ? 0 : 1;
+        if (Clock::now() - begin >= time)
+            break;
     }
     batch.state = IsCancelled()                ? SearchState::Cancelled
                   : batch.error                ? SearchState::Interrupted

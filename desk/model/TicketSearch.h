@@ -7,6 +7,7 @@
 #include "comgui/client/TicketAddress.h"
 #include "desk/model/TextMatch.h"
 #include <atomic>
+#include <chrono>
 #include <cstddef>
 #include <functional>
 #include <optional>
@@ -67,9 +68,9 @@ class TicketSearch
 public:
     TicketSearch(SearchQuery const& query, std::vector<comgui::TicketAddress> tickets, SearchReader reader);
 
-    // Looks at so many tickets, at least one. After the last, with enough found and once cancelled, it reads
-    // nothing.
-    SearchBatch Step(std::size_t tickets);
+    // Looks at so many tickets, or at as many as the time is enough for; at least one. After the last, with
+    // enough found and once cancelled, it reads nothing.
+    SearchBatch Step(std::size_t tickets, std::chrono::nanoseconds time = std::chrono::nanoseconds::max());
 
     // From any thread: a step that is under way ends before the next key. What it has found so far it still
     // reports.

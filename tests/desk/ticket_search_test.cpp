@@ -3,6 +3,7 @@
 #include <future>
 #include <gtest/gtest.h>
 #include <map>
+#include <thread>
 
 using namespace comgui;
 using namespace desk;
@@ -263,6 +264,20 @@ TEST(TicketSearch, HundredThousandTickets_AreSearched)
     }
     EXPECT_EQ(batch.done, 100000U);
     EXPECT_EQ(matches, 1U);
+}
+
+TEST(TicketSearch, Step_EndsWhenItsTimeIsOver_ButNotBeforeItHasLookedAtOne)
+{
+    Site site = ManyJobs(10);
+    auto const slowly = [read = site.Reader()](TicketAddress ticket)
+    {
+        std::this_thread::sleep_for(std::chrono::milliseconds(20));
+        return read(ticket);
+    };
+    TicketSearch search({"number"}, site.All(), slowly);
+    EXPECT_EQ(search.Step(10, std::chrono::nanoseconds(0)).done, 1u);
+    EXPECT_LE(search.Step(10, std::chrono::milliseconds(50)).done, 4u);
+    EXPECT_EQ(search.Step(10).done, 10u);
 }
 
 TEST(TicketSearch, ThatHasFoundEnough_ReadsNoMore)
