@@ -69,4 +69,19 @@ FileResult<std::vector<FileLoss>> LossesOf(comgui::Snapshot const& ticket, std::
         losses.push_back({difference.key, KindOf(difference)});
     return losses;
 }
+
+FileResult<std::vector<FileLoss>> LossesOf(comgui::Snapshot const& before, comgui::Snapshot const& after,
+                                           std::string_view bytes)
+{
+    auto const hasChanged = [&](FileLoss const& loss)
+    {
+        comgui::Value const* const was = before.Find(loss.key);
+        comgui::Value const* const is = after.Find(loss.key);
+        return was && is ? !(*was == *is) : was != is;
+    };
+    FileResult<std::vector<FileLoss>> losses = LossesOf(before, bytes);
+    if (auto* const all = std::get_if<std::vector<FileLoss>>(&losses))
+        std::erase_if(*all, hasChanged);
+    return losses;
+}
 }  // namespace desk

@@ -38,4 +38,9 @@ struct FileLoss
 // they are stored, as they are in XML. A fault: the bytes cannot be read back at all, as those of an empty
 // stream.
 FileResult<std::vector<FileLoss>> LossesOf(comgui::Snapshot const& ticket, std::string_view bytes);
+
+// Of bytes that were made at some time between the two: a key that is not the same in both has been changed
+// meanwhile, and is no loss.
+FileResult<std::vector<FileLoss>> LossesOf(comgui::Snapshot const& before, comgui::Snapshot const& after,
+                                           std::string_view bytes);
 }  // namespace desk

@@ -1,5 +1,6 @@
 #include "desk/view/TicketFiles.h"
 
+#include "desk/model/ExportFile.h"
 #include "desk/model/SavedFile.h"
 #include "desk/model/TicketFile.h"
 #include "desk/model/TicketStream.h"
@@ -9,7 +10,9 @@
 #include <comgui/client/Text.h>
 #include <variant>
 #include <wx/filedlg.h>
+#include <wx/filefn.h>
 #include <wx/intl.h>
+#include <wx/msgdlg.h>
 
 namespace desk
 {
@@ -31,6 +34,7 @@ struct Exported
     Trouble trouble;
     std::size_t keys = 0;
     std::vector<FileLoss> losses;
+    Trouble unchecked{};  // why nothing is known of losses, though the file is there
 };
 
 std::variant<std::string, Trouble> BytesOf(comgui::Tickets const& tickets, comgui::TicketAddress ticket,
@@ -49,27 +53,35 @@ std::variant<std::string, Trouble> BytesOf(comgui::Tickets const& tickets, comgu
     return *std::move(xml);
 }
 
-Exported Export(comgui::Tickets const& tickets, comgui::TicketAddress ticket, std::string const& file)
+Exported Export(comgui::Tickets const& tickets, comgui::TicketAddress ticket, ExportFile const& file)
 {
     auto const content = tickets.ReadAll(ticket, comgui::Paths::AsStored);
     if (!content)
         return {content.GetError(), 0, {}};
-    auto const made = BytesOf(tickets, ticket, *content, file.ends_with(".stream"));
+    bool const isStream = file.form == FileForm::Stream;
+    auto const made = BytesOf(tickets, ticket, *content, isStream);
     if (auto const* const trouble = std::get_if<Trouble>(&made))
         return {*trouble, 0, {}};
     std::string const& bytes = std::get<std::string>(made);
-    if (auto const fault = SaveFile(file, bytes))
+    // The server has made the XML of what the ticket was later: hence the second look at it.
+    auto const after = isStream ? content : tickets.ReadAll(ticket, comgui::Paths::AsStored);
+    if (auto const fault = SaveFile(file.name, bytes))
         return {*fault, 0, {}};
-    auto losses = LossesOf(*content, bytes);
+    std::size_t const keys = content->Entries().size();
+    if (!after)
+        return {{}, keys, {}, after.GetError()};
+    auto losses = LossesOf(*content, *after, bytes);
     if (auto const* const fault = std::get_if<FileFault>(&losses))
-        return {*fault, 0, {}};
-    return {{}, content->Entries().size(), std::get<std::vector<FileLoss>>(std::move(losses))};
+        return {{}, keys, {}, *fault};
+    return {{}, keys, std::get<std::vector<FileLoss>>(std::move(losses))};
 }
 
 wxString SentenceOf(Exported const& done)
 {
     if (done.trouble.index() != 0)
         return TextOf(done.trouble);
+    if (done.unchecked.index() != 0)
+        return wxString::Format(_("Exported, but not checked: %s"), TextOf(done.unchecked));
     if (done.losses.empty())
         return wxString::Format(wxPLURAL("Exported: %zu key", "Exported: %zu keys", PluralOf(done.keys)),
                                 done.keys);
@@ -127,6 +139,15 @@ wxString SentenceOf(Imported const& done)
                             done.refused, ShownText(done.refusedKey));
 }
 
+// The dialog has asked about the name that was typed.
+bool MayOverwrite(wxWindow* parent, std::string const& file)
+{
+    return !wxFileExists(comgui::ToWx(file)) ||
+           wxMessageBox(wxString::Format(_("%s is there already. Overwrite it?"), ShownText(file)),
+                        _("Export the ticket"), wxYES_NO | wxNO_DEFAULT | wxICON_QUESTION, parent) == wxYES;
+}
+
+// XML first: see ExportFileOf.
 wxString Wildcard()
 {
     return _("Ticket as XML") + " (*.xml)|*.xml|" + _("Ticket stream") + " (*.stream)|*.stream";
@@ -141,8 +162,12 @@ void ExportTicket(wxWindow* parent, comgui::Tickets const& tickets, comgui::Work
                         wxFD_SAVE | wxFD_OVERWRITE_PROMPT);
     if (dialog.ShowModal() != wxID_OK)
         return;
-    worker.Do([tickets, ticket, file = comgui::ToUtf8(dialog.GetPath())]
-              { return Export(tickets, ticket, file); },
+    std::string const typed = comgui::ToUtf8(dialog.GetPath());
+    ExportFile const file =
+        ExportFileOf(typed, dialog.GetFilterIndex() == 1 ? FileForm::Stream : FileForm::Xml);
+    if (file.name != typed && !MayOverwrite(parent, file.name))
+        return;
+    worker.Do([tickets, ticket, file] { return Export(tickets, ticket, file); },
               [said = std::move(said)](Exported const& done) { said(SentenceOf(done)); });
 }
 

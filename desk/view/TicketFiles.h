@@ -12,7 +12,7 @@ namespace desk
 // said: called once at the end, with what to tell the user, unless he has changed his mind.
 using Said = std::function<void(wxString const&)>;
 
-// As XML, or as a stream if the file's name ends in .stream.
+// As XML, or as a stream if the user chooses that, or names a file in .stream.
 void ExportTicket(wxWindow* parent, comgui::Tickets const& tickets, comgui::Worker const& worker,
                   comgui::TicketAddress ticket, Said said);
 

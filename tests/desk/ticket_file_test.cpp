@@ -172,6 +172,17 @@ TEST(TicketLosses, OfAStreamWithoutBytes_IsThatItCannotBeRead)
     EXPECT_EQ(TroubleOf(LossesOf(Snapshot(), Stream({}))), FileTrouble::Empty);
 }
 
+TEST(TicketLosses, OfKeysThatChangeMeanwhile_AreNone)
+{
+    Snapshot const before({{"Changed", "1"}, {"Gone", "1"}, {"Steady", Pointer{}}});
+    Snapshot const after({{"Changed", "2"}, {"New", "1"}, {"Steady", Pointer{}}});
+    std::string const bytes = Stream({{"Changed", "2"}, {"New", "1"}});
+    ASSERT_EQ(std::get<std::vector<FileLoss>>(LossesOf(before, bytes)).size(), 4U);
+    auto const losses = LossesOf(before, after, bytes);
+    ASSERT_EQ(std::get<std::vector<FileLoss>>(losses).size(), 1U);
+    EXPECT_EQ(std::get<std::vector<FileLoss>>(losses)[0].key, "Steady");
+}
+
 using TicketOfAServer = Client;
 
 TEST_F(TicketOfAServer, AsXml_LosesNothing)
