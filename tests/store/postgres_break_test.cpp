@@ -615,6 +615,21 @@ TEST_F(PostgresBell, ThatBrokeBeforeItWasToRing_RingsWhenItIsBack)
     ExpectRing(*other, 1);
 }
 
+TEST_F(PostgresBell, ThatBreaksWhileItRings_RingsOnceMore)
+{
+    PostgresCluster& cluster = schema.cluster;
+    cluster.Run("CREATE ROLE interrupted LOGIN SUPERUSER");
+    PostgresOptions options = AtOnce();
+    options.connectLimit = 1s;
+    auto const ringer = schema.OpenAs(cluster.Uri("interrupted"), NoContent, options);
+    auto const server = std::stoi(cluster.Run(
+        "SELECT pid FROM pg_stat_activity WHERE usename = 'interrupted' AND query LIKE '%LISTEN%'"));
+    ASSERT_EQ(kill(server, SIGSTOP), 0);
+    Writer(*ringer).Make(Job);
+    ExpectRing(*other, 1);
+    kill(server, SIGCONT);
+}
+
 TEST_F(PostgresBell, OfAHandleThatEnds_RingsBeforeIt)
 {
     writer.Make(Job);
