@@ -244,7 +244,7 @@ Outcome TransferPool::Carry(Lane& lane, Task const& task)
 {
     auto record = m_getRecord();
     if (!record)
-        return Error{NotLoggedIn, task->source, {}};
+        return Error{Cancelled, task->source, {}};  // by the logout that has come in between
     Outcome entered = lane.Enter(*record);
     ForgetPassword(*record);
     if (!entered)

@@ -1,13 +1,10 @@
 #include "comgui/client/Worker.h"
 
-#include <atomic>
-
 namespace comgui
 {
 struct Worker::STATE
 {
     TaskQueue queue;
-    std::atomic<bool> isOver{false};
 };
 
 // The results know the state only as long as it lives: the work in its queue holds them.
@@ -19,8 +16,7 @@ Worker::Worker(Executor results)
               results(
                   [weak, task = std::move(task)]
                   {
-                      auto const state = weak.lock();
-                      if (state && !state->isOver)
+                      if (auto const state = weak.lock())
                           task();
                   });
           }),
@@ -30,7 +26,6 @@ Worker::Worker(Executor results)
 
 Worker::~Worker()
 {
-    m_state->isOver = true;
     m_state->queue.Stop();
     m_thread.join();
 }

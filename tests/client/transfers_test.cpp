@@ -12,6 +12,7 @@
 using namespace comgui;
 using namespace std::chrono_literals;
 namespace fs = std::filesystem;
+using testing::AnyOf;
 using testing::ElementsAre;
 using testing::IsEmpty;
 
@@ -206,6 +207,23 @@ TEST_F(TransfersOfAClient, BeyondFour_Wait_AndCanBeCancelledToo)
     EXPECT_EQ(CodeOf(all[4].Wait()), Cancelled);
     EXPECT_THAT(transfers.Running(), IsEmpty());
     EXPECT_FALSE(fs::exists(Site("temp/4")));
+}
+
+// Also one that a worker takes up in the very moment of the logout.
+TEST_F(TransfersOfAClient, AtALogout_AreDoneOrCancelled)
+{
+    std::string const small = folder.Write("small", "x").string();
+    for (int round = 0; round < 20; ++round)
+    {
+        std::vector<Transfer> all;
+        for (int i = 0; i < 40; ++i)
+            all.push_back(transfers.Put(small, "$(TEMP)/" + std::to_string(i)));
+        (void)all[static_cast<std::size_t>(round)].Wait();
+        ASSERT_TRUE(connection.LogOut());
+        for (Transfer const& each : all)
+            EXPECT_THAT(CodeOf(each.Wait()), AnyOf(0, Cancelled));
+        LogIn();
+    }
 }
 
 TEST_F(TransfersOfAClient, AreEvents)

@@ -111,6 +111,19 @@ TEST_F(TroubledClient, SessionThatCannotBeReplaced_IsLost_WithTheReason_UntilItC
     EXPECT_EQ(Hear(3).back(), "back anew");
 }
 
+// After a second, after two more, after four more.
+TEST_F(TroubledClient, SessionThatCannotBeReplaced_IsTriedMoreAndMoreSeldom)
+{
+    LogIn();
+    int const before = trouble.tries;
+    trouble.loginsAreRefused = true;
+    trouble.sessionIsGone = true;
+    Await([&] { return trouble.tries > before; });
+    auto const first = Clock::now();
+    Await([&] { return trouble.tries >= before + 4; });
+    EXPECT_GE(Clock::now() - first, 5s);
+}
+
 TEST_F(TroubledClient, LoginWithoutAServer_IsAFailure_AndALaterOneWorks)
 {
     trouble.serverIsAway = true;
@@ -196,6 +209,19 @@ TEST_F(TroubledClient, CancelOfOneTransfer_LeavesTheOthersAlone)
     all[1].Cancel();
     for (std::size_t i = 2; i < all.size(); ++i)
         EXPECT_TRUE(all[i].Wait()) << i << ": " << all[i].Wait().GetError().Text();
+}
+
+TEST_F(TroubledClient, CancelWhileATransferLogsIn_CarriesNothing)
+{
+    LogIn();
+    int const before = trouble.tries;
+    trouble.loginTakes = 300;
+    trouble.putTakes = 30000;
+    auto put = connection.GetTransfers().Put(folder.Write("a", "content").string(), "$(TEMP)/a");
+    Await([&] { return trouble.tries > before; });
+    put.Cancel();
+    EXPECT_EQ(CodeOf(put.Wait()), Cancelled);
+    EXPECT_EQ(trouble.puts, 0);
 }
 
 TEST_F(TroubledClient, CancelOfATransfer_WaitsForNoQuestionAboutProgress)
