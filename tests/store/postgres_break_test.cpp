@@ -69,6 +69,19 @@ protected:
         EXPECT_LT(Clock::now() - start, 30s);
     }
 
+    pid_t ServerOfTheBell(std::string const& role) const
+    {
+        return std::stoi(schema.cluster.Run("SELECT pid FROM pg_stat_activity WHERE usename = '" + role +
+                                            "' AND query LIKE '%LISTEN%'"));
+    }
+
+    static void AwaitReach(Store& handle, bool isThere)
+    {
+        for (auto const end = Clock::now() + 60s; handle.IsReachable() != isThere && Clock::now() < end;)
+            std::this_thread::sleep_for(1ms);
+        ASSERT_EQ(handle.IsReachable(), isThere);
+    }
+
     int Value() { return static_cast<int>(ValuesOf(*other, Job).at({"Key", 0}).value.integer); }
 
     // Adds one to the value, as a writer does who knows of no break: plans on what holds, asks after an
@@ -617,17 +630,31 @@ TEST_F(PostgresBell, ThatBrokeBeforeItWasToRing_RingsWhenItIsBack)
 
 TEST_F(PostgresBell, ThatBreaksWhileItRings_RingsOnceMore)
 {
-    PostgresCluster& cluster = schema.cluster;
-    cluster.Run("CREATE ROLE interrupted LOGIN SUPERUSER");
+    schema.cluster.Run("CREATE ROLE interrupted LOGIN SUPERUSER");
     PostgresOptions options = AtOnce();
     options.connectLimit = 1s;
-    auto const ringer = schema.OpenAs(cluster.Uri("interrupted"), NoContent, options);
-    auto const server = std::stoi(cluster.Run(
-        "SELECT pid FROM pg_stat_activity WHERE usename = 'interrupted' AND query LIKE '%LISTEN%'"));
+    auto const ringer = schema.OpenAs(schema.cluster.Uri("interrupted"), NoContent, options);
+    pid_t const server = ServerOfTheBell("interrupted");
     ASSERT_EQ(kill(server, SIGSTOP), 0);
     Writer(*ringer).Make(Job);
     ExpectRing(*other, 1);
     kill(server, SIGCONT);
+}
+
+TEST_F(PostgresBell, ThatIsSilentForAWhile_IsALoss_AndGoesOn)
+{
+    schema.cluster.Run("CREATE ROLE patient LOGIN SUPERUSER");
+    PostgresOptions options = AtOnce();
+    options.connectLimit = 60s;
+    auto const handle = schema.OpenAs(schema.cluster.Uri("patient"), NoContent, options);
+    pid_t const server = ServerOfTheBell("patient");
+    ASSERT_EQ(kill(server, SIGSTOP), 0);
+    AwaitReach(*handle, false);
+    kill(server, SIGCONT);
+    AwaitReach(*handle, true);
+    EXPECT_EQ(
+        schema.cluster.Run("SELECT count(*) FROM pg_stat_activity WHERE pid = " + std::to_string(server)),
+        "1");
 }
 
 TEST_F(PostgresBell, OfAHandleThatEnds_RingsBeforeIt)
