@@ -211,6 +211,16 @@ TEST_F(TroubledClient, CancelOfOneTransfer_LeavesTheOthersAlone)
         EXPECT_TRUE(all[i].Wait()) << i << ": " << all[i].Wait().GetError().Text();
 }
 
+TEST_F(TroubledClient, Logout_CancelsTheTransferThatIsUnderWay)
+{
+    LogIn();
+    trouble.putTakes = 30000;
+    auto const put = connection.GetTransfers().Put(folder.Write("a", "content").string(), "$(TEMP)/a");
+    Await([this] { return trouble.puts > 0; });
+    ASSERT_TRUE(connection.LogOut());
+    EXPECT_EQ(CodeOf(put.Wait()), Cancelled);
+}
+
 TEST_F(TroubledClient, CancelWhileATransferLogsIn_CarriesNothing)
 {
     LogIn();
