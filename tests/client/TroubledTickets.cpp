@@ -43,7 +43,7 @@ bool Pass(void* context, char const* key, PARAM_TYPE type, void const* word, int
     return false;
 }
 
-int WalkKeys(void* instance, SWALKPARAMETERS_ACTION action, void* context, char const* prefix, int limit)
+int WalkKeysNow(void* instance, SWALKPARAMETERS_ACTION action, void* context, char const* prefix, int limit)
 {
     if (trouble->sessionIsOver || Take(trouble->refusedWalks))
         return 0;
@@ -56,6 +56,14 @@ int WalkKeys(void* instance, SWALKPARAMETERS_ACTION action, void* context, char 
         return 1;
     WALK walk{action, context};
     return realTicket.SWALKPARAMETERS(instance, Pass, &walk, prefix, limit);
+}
+
+int WalkKeys(void* instance, SWALKPARAMETERS_ACTION action, void* context, char const* prefix, int limit)
+{
+    int const result = WalkKeysNow(instance, action, context, prefix, limit);
+    if (trouble->afterWalk)
+        std::exchange(trouble->afterWalk, nullptr)();
+    return result;
 }
 
 int WalkTickets(void* instance, MWALKTICKETS_ACTION action, void* context, int type)

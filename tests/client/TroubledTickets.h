@@ -17,6 +17,7 @@ struct TICKET_TROUBLE
     std::atomic<bool> switchingStands{false};  // of notifications: until that ends, or for twenty seconds
     std::function<void()> afterOpening{};      // of a ticket; once
     std::function<void()> afterFirstValue{};   // of a walk over keys, which breaks off then, as a success
+    std::function<void()> afterWalk{};         // over keys, also a refused one; once
     std::function<void()> afterTypeQuery{};    // of a read; once
 
     // What happened.

@@ -94,6 +94,30 @@ TEST_F(TroubledTicket, FollowedOneThatCouldNotBeRead_IsReadAtTheNextChange)
     EXPECT_EQ(live.Now(), *tickets.ReadAll(job, Paths::AsStored));
 }
 
+TEST_F(TroubledTicket, FollowedOneThatChangesWhileItIsRead_HasTheChange)
+{
+    for (int const refused : {0, 1})
+    {
+        Worker const worker(queue.GetExecutor());
+        std::atomic<bool> isHeard = false;
+        orders.refusedWalks = refused;
+        orders.afterWalk = [&]
+        {
+            (void)tickets.Write(job, "A", 10 + refused);
+            Await([&] { return isHeard.load(); });
+        };
+        auto const behind = connection.Subscribe(
+            Interest::InTickets({job}), queue.GetExecutor(), [&](Event const&) { isHeard = true; }, 100ms);
+        LiveTicket const live(connection, worker, job, [](TicketUpdate const&) {});
+        for (auto const end = Clock::now() + 20s;
+             live.Now() != *tickets.ReadAll(job, Paths::AsStored) && Clock::now() < end;)
+            queue.RunFor(5ms);
+        queue.RunFor(50ms);
+        EXPECT_TRUE(isHeard);
+        EXPECT_EQ(live.Now(), *tickets.ReadAll(job, Paths::AsStored));
+    }
+}
+
 TEST_F(TroubledTicket, BytesThatNoMemoryHolds_AreABadAnswer)
 {
     orders.bytesAreEndless = true;
