@@ -14,6 +14,7 @@
 
 using namespace standin;
 using namespace std::chrono_literals;
+using testing::AllOf;
 using testing::HasSubstr;
 using testing::IsEmpty;
 using testing::Not;
@@ -266,6 +267,19 @@ TEST_F(PostgresProxy, OfAStatement_IsCrossedOnceEachWay_AlsoTheFirstTime)
     EXPECT_THROW(connection.Run(wrong, {}, Clock::now() + 60s), postgres::RefusedStatement);
     EXPECT_THROW(connection.Run(wrong, {}, Clock::now() + 60s), postgres::RefusedStatement);
     EXPECT_EQ(run(1).Integer(0, 0), 6);
+}
+
+TEST_F(PostgresProxy, WordsOfTheServerInSeveralLines_AreOne)
+{
+    proxy.Start();
+    postgres::Connection connection({Uri(), schema.Name()}, 60s, Clock::now() + 60s);
+    auto const fail = [&]
+    {
+        connection.Execute(
+            "DO $$ BEGIN RAISE EXCEPTION E'one\n\n\ttwo' USING DETAIL = E'three\nfour'; END $$",
+            Clock::now() + 60s);
+    };
+    EXPECT_THAT(ReasonOf(fail), AllOf(HasSubstr(": one two; "), Not(HasSubstr("\n"))));
 }
 
 // It takes its share of the time alone, and that once.
