@@ -17,6 +17,9 @@
 #include <algorithm>
 #include <chrono>
 #include <comgui/client/Text.h>
+#include <memory>
+#include <wx/accel.h>
+#include <wx/dataview.h>
 #include <wx/infobar.h>
 #include <wx/menu.h>
 #include <wx/msgdlg.h>
@@ -140,9 +143,9 @@ void MainFrame::MakeMenus()
 
     auto* const edit = new wxMenu;
     add(
-        edit, _("&Undo\tCtrl+Z"), [this] { m_editor.Undo(); }, wxID_UNDO);
+        edit, _("&Undo\tCtrl+Z"), [this] { Undo(); }, wxID_UNDO);
     add(
-        edit, _("&Redo\tCtrl+Shift+Z"), [this] { m_editor.Redo(); }, wxID_REDO);
+        edit, _("&Redo\tCtrl+Shift+Z"), [this] { Redo(); }, wxID_REDO);
     edit->AppendSeparator();
     add(edit, _("&Edit the value\tF2"), [this] { m_keys->EditChosen(); });
     add(edit, _("&New key ...\tCtrl+N"), [this] { NewKey(); });
@@ -165,6 +168,7 @@ void MainFrame::MakeMenus()
     add(view, _("&Next pane\tF6"), [this] { FocusNextPane(); });
     bar->Append(view, _("&View"));
     SetMenuBar(bar);
+    Bind(wxEVT_CHAR_HOOK, &MainFrame::TakeKey, this);
 }
 
 void MainFrame::Connect()
@@ -500,8 +504,27 @@ void MainFrame::NewKey()
         m_editor.Write(ticket, dialog.Key(), dialog.Value());
 }
 
+// Who types in a field means what he has typed.
+void MainFrame::Undo()
+{
+    if (auto* const field = dynamic_cast<wxTextEntry*>(FindFocus()))
+        field->Undo();
+    else
+        m_editor.Undo();
+}
+
+void MainFrame::Redo()
+{
+    if (auto* const field = dynamic_cast<wxTextEntry*>(FindFocus()))
+        field->Redo();
+    else
+        m_editor.Redo();
+}
+
 void MainFrame::DeleteKey()
 {
+    if (dynamic_cast<wxTextEntry*>(FindFocus()))
+        return;
     if (auto const key = m_keys->ChosenKey(); key && m_live)
         m_editor.Write(m_live->Address(), *key, {});
 }
@@ -509,13 +532,13 @@ void MainFrame::DeleteKey()
 void MainFrame::Export()
 {
     if (m_live)
-        ExportTicket(this, m_session.Tickets(), m_session.Worker(), m_live->Address(),
+        ExportTicket(this, fileQuestions, m_session.Tickets(), m_session.Worker(), m_live->Address(),
                      [this](wxString const& text) { Complain(text); });
 }
 
 void MainFrame::Import()
 {
-    ImportTicket(this, m_session.Tickets(), m_session.Worker(),
+    ImportTicket(this, fileQuestions, m_session.Tickets(), m_session.Worker(),
                  m_live ? m_live->Address().type : comgui::JobTickets,
                  m_session.InThisSession(
                      [this](comgui::TicketAddress ticket)
@@ -621,6 +644,26 @@ void MainFrame::FocusNextPane()
     std::size_t const next =
         current == std::end(panes) ? 0 : static_cast<std::size_t>(current - panes + 1) % std::size(panes);
     panes[next]->SetFocus();
+}
+
+// GTK's lists have uses of their own for Ctrl+F, Ctrl+N and others, and get keys before the menu. Fields keep
+// theirs.
+void MainFrame::TakeKey(wxKeyEvent& event)
+{
+    if (!dynamic_cast<wxDataViewCtrl*>(FindFocus()))
+        return event.Skip();
+    for (std::size_t i = 0; i < GetMenuBar()->GetMenuCount(); ++i)
+        for (wxMenuItem const* const item : GetMenuBar()->GetMenu(i)->GetMenuItems())
+        {
+            std::unique_ptr<wxAcceleratorEntry> const keys(item->GetAccel());
+            if (!keys || keys->GetKeyCode() != event.GetKeyCode() ||
+                keys->GetFlags() != event.GetModifiers() || !item->IsEnabled())
+                continue;
+            wxCommandEvent command(wxEVT_MENU, item->GetId());
+            ProcessWindowEvent(command);
+            return;
+        }
+    event.Skip();
 }
 
 double MainFrame::Now()

@@ -10,6 +10,7 @@
 #include "desk/model/TitleReader.h"
 #include "desk/view/JobOptionsDialog.h"
 #include "desk/view/Settings.h"
+#include "desk/view/TicketFiles.h"
 #include <map>
 #include <optional>
 #include <string>
@@ -46,6 +47,8 @@ public:
     void ShowFirst(comgui::TicketAddress ticket) { m_first = ticket; }
     void ShowFirst(std::string const& ticket);
 
+    FileQuestions fileQuestions = FileDialogs();
+
 private:
     void MakePanes();
     void MakeMenus();
@@ -77,6 +80,8 @@ private:
     void DeleteTicket();
     void NewKey();
     void DeleteKey();
+    void Undo();
+    void Redo();
     void Export();
     void Import();
     void Compare();
@@ -90,6 +95,7 @@ private:
     void Complain(wxString const& text);
     void Repaint();
     void FocusNextPane();
+    void TakeKey(wxKeyEvent& event);
     static double Now();
 
     Settings m_settings;

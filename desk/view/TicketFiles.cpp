@@ -1,6 +1,5 @@
 #include "desk/view/TicketFiles.h"
 
-#include "desk/model/ExportFile.h"
 #include "desk/model/SavedFile.h"
 #include "desk/model/TicketFile.h"
 #include "desk/model/TicketStream.h"
@@ -152,34 +151,50 @@ wxString Wildcard()
 {
     return _("Ticket as XML") + " (*.xml)|*.xml|" + _("Ticket stream") + " (*.stream)|*.stream";
 }
-}  // namespace
 
-void ExportTicket(wxWindow* parent, comgui::Tickets const& tickets, comgui::Worker const& worker,
-                  comgui::TicketAddress ticket, Said said)
+std::optional<ExportFile> AskForTarget(wxWindow* parent, wxString const& proposed)
 {
-    wxFileDialog dialog(parent, _("Export the ticket"), {},
-                        wxString::Format("%d-%d.xml", ticket.type, ticket.id), Wildcard(),
+    wxFileDialog dialog(parent, _("Export the ticket"), {}, proposed, Wildcard(),
                         wxFD_SAVE | wxFD_OVERWRITE_PROMPT);
     if (dialog.ShowModal() != wxID_OK)
+        return std::nullopt;
+    return ExportFile{comgui::ToUtf8(dialog.GetPath()),
+                      dialog.GetFilterIndex() == 1 ? FileForm::Stream : FileForm::Xml};
+}
+
+std::optional<std::string> AskForSource(wxWindow* parent)
+{
+    wxFileDialog dialog(parent, _("Import a ticket"), {}, {}, Wildcard() + "|" + _("All files") + "|*",
+                        wxFD_OPEN | wxFD_FILE_MUST_EXIST);
+    if (dialog.ShowModal() != wxID_OK)
+        return std::nullopt;
+    return comgui::ToUtf8(dialog.GetPath());
+}
+}  // namespace
+
+FileQuestions FileDialogs() { return {AskForTarget, AskForSource}; }
+
+void ExportTicket(wxWindow* parent, FileQuestions const& questions, comgui::Tickets const& tickets,
+                  comgui::Worker const& worker, comgui::TicketAddress ticket, Said said)
+{
+    auto const chosen = questions.askForTarget(parent, wxString::Format("%d-%d.xml", ticket.type, ticket.id));
+    if (!chosen)
         return;
-    std::string const typed = comgui::ToUtf8(dialog.GetPath());
-    ExportFile const file =
-        ExportFileOf(typed, dialog.GetFilterIndex() == 1 ? FileForm::Stream : FileForm::Xml);
-    if (file.name != typed && !MayOverwrite(parent, file.name))
+    ExportFile const file = ExportFileOf(chosen->name, chosen->form);
+    if (file.name != chosen->name && !MayOverwrite(parent, file.name))
         return;
     worker.Do([tickets, ticket, file] { return Export(tickets, ticket, file); },
               [said = std::move(said)](Exported const& done) { said(SentenceOf(done)); });
 }
 
-void ImportTicket(wxWindow* parent, comgui::Tickets const& tickets, comgui::Worker const& worker, int type,
-                  std::function<void(comgui::TicketAddress)> made, Said said)
+void ImportTicket(wxWindow* parent, FileQuestions const& questions, comgui::Tickets const& tickets,
+                  comgui::Worker const& worker, int type, std::function<void(comgui::TicketAddress)> made,
+                  Said said)
 {
-    wxFileDialog dialog(parent, _("Import a ticket"), {}, {}, Wildcard() + "|" + _("All files") + "|*",
-                        wxFD_OPEN | wxFD_FILE_MUST_EXIST);
-    if (dialog.ShowModal() != wxID_OK)
+    auto const file = questions.askForSource(parent);
+    if (!file)
         return;
-    worker.Do([tickets, type, file = comgui::ToUtf8(dialog.GetPath())]
-              { return Import(tickets, type, file); },
+    worker.Do([tickets, type, file = *file] { return Import(tickets, type, file); },
               [made = std::move(made), said = std::move(said)](Imported const& done)
               {
                   if (done.trouble.index() == 0)

@@ -107,6 +107,24 @@ private:
     std::function<void(wxDialog&)> const m_use;
 };
 
+// Gives this answer to the window's questions, unseen, and counts them.
+class Answers : public wxModalDialogHook
+{
+public:
+    explicit Answers(int answer) : m_answer(answer) { Register(); }
+    ~Answers() override { Unregister(); }
+    int Asked() const { return m_asked; }
+
+private:
+    int Enter(wxDialog*) override
+    {
+        ++m_asked;
+        return m_answer;
+    }
+    int const m_answer;
+    int m_asked = 0;
+};
+
 inline void Press(wxDialog& dialog, int button)
 {
     wxCommandEvent click(wxEVT_BUTTON, button);

@@ -1,7 +1,6 @@
 // The whole window while somebody edits a ticket and others change it.
 #include "tests/desk/WindowOfTheDesk.h"
 
-#include <wx/modalhook.h>
 #include <wx/srchctrl.h>
 
 using namespace desk;
@@ -9,24 +8,6 @@ using namespace std::chrono_literals;
 
 namespace
 {
-// Answers each dialog at once, as the user would who is quick.
-class Answers : public wxModalDialogHook
-{
-public:
-    explicit Answers(int answer) : m_answer(answer) { Register(); }
-    ~Answers() override { Unregister(); }
-    int Asked() const { return m_asked; }
-
-private:
-    int Enter(wxDialog*) override
-    {
-        ++m_asked;
-        return m_answer;
-    }
-    int const m_answer;
-    int m_asked = 0;
-};
-
 class EditingInTheDesk : public WindowOfTheDesk
 {
 protected:
