@@ -29,7 +29,7 @@ std::optional<Refusal> RefusalOf(std::string const& path)
 }
 }  // namespace
 
-DroppedFiles Sorted(std::vector<std::string> const& paths)
+DroppedFiles Sifted(std::vector<std::string> const& paths)
 {
     DroppedFiles sorted;
     std::set<std::string> seen;

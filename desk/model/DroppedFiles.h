@@ -27,5 +27,5 @@ struct DroppedFiles
 };
 
 // paths: UTF-8. Links are followed; opens nothing. In the order given, each path once.
-DroppedFiles Sorted(std::vector<std::string> const& paths);
+DroppedFiles Sifted(std::vector<std::string> const& paths);
 }  // namespace desk

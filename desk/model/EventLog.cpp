@@ -198,8 +198,6 @@ void EventLog::Find()
 
 bool EventLog::IsWanted(EventRow const& row) const
 {
-    if (!m_filter.kinds[static_cast<std::size_t>(row.kind)])
-        return false;
     if (m_filter.ticket && (row.type != m_filter.ticket->type || (row.id && *row.id != m_filter.ticket->id)))
         return false;
     return !m_filter.isWanted || m_filter.isWanted(row.key) || m_filter.isWanted(row.text);

@@ -3,7 +3,6 @@
 #pragma once
 
 #include "comgui/client/Event.h"
-#include <bitset>
 #include <chrono>
 #include <cstddef>
 #include <deque>
@@ -31,7 +30,6 @@ enum class EventKind
     ServerBack,
     ServerBackAnew,  // with another session
 };
-constexpr std::size_t EventKinds = 14;
 
 // Fields that the kind does not need are empty.
 struct EventRow
@@ -53,7 +51,6 @@ struct EventFilter
     // Whether a key or a text is wanted; an empty function: every row.
     std::function<bool(std::string_view)> isWanted;
     std::optional<comgui::TicketAddress> ticket;  // rows about many tickets of its type are wanted, too
-    std::bitset<EventKinds> kinds = std::bitset<EventKinds>().set();
 };
 
 class EventLog

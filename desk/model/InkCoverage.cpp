@@ -128,37 +128,27 @@ void InkCoverage::TakeLists(comgui::Snapshot const& ticket)
     }
 }
 
-InkCoverage::Answer InkCoverage::Take(comgui::KeyChange const& change)
-{
-    if (!change.value)
-        return InkKeyOf(change.key) ? Answer::ToBeRead : Answer::Unconcerned;
-    if (!Set(change.key, *change.value))
-        return Answer::Unconcerned;
-    Arrange();
-    return Answer::Changed;
-}
-
-// Whether anything is different now.
-bool InkCoverage::Set(std::string_view key, comgui::Value const& value)
+void InkCoverage::Set(std::string_view key, comgui::Value const& value)
 {
     auto const ink = InkKeyOf(key);
     if (!ink)
-        return false;
+        return;
     auto const coverage = ink->isCoverage ? CoverageOf(value) : std::nullopt;
     auto const colour = ink->isCoverage ? std::nullopt : ColourOf(value);
     auto found = m_parts.find(ink->name);
     if (found == m_parts.end())
     {
         if ((!coverage && !colour) || m_parts.size() >= GreatestCount)
-            return false;
+            return;
         found = m_parts.emplace(ink->name, PARTS()).first;
     }
     PARTS& parts = found->second;
-    bool const isNew = ink->isCoverage ? std::exchange(parts.coverage, coverage) != coverage
-                                       : std::exchange(parts.colour, colour) != colour;
+    if (ink->isCoverage)
+        parts.coverage = coverage;
+    else
+        parts.colour = colour;
     if (!parts.coverage && !parts.colour)
         m_parts.erase(found);
-    return isNew;
 }
 
 void InkCoverage::Arrange()

@@ -36,15 +36,7 @@ class InkCoverage
 public:
     static constexpr std::size_t GreatestCount = 100;  // further inks are left out
 
-    enum class Answer
-    {
-        Unconcerned,  // not a key of inks, or nothing new
-        Changed,
-        ToBeRead,  // the change has no value: read the key, and tell it again
-    };
-
-    void Take(comgui::Snapshot const& ticket);     // instead of all before
-    Answer Take(comgui::KeyChange const& change);  // of keys; lists come with a snapshot only
+    void Take(comgui::Snapshot const& ticket);  // instead of all before
 
     // Process inks first, in the order of printing: Cyan, Magenta, Yellow, Black, Orange, Green, Violet,
     // White, Varnish, in any letter case; then the others by name, bytewise. Valid until the next Take.
@@ -60,7 +52,7 @@ private:
     };
 
     void TakeLists(comgui::Snapshot const& ticket);
-    bool Set(std::string_view key, comgui::Value const& value);
+    void Set(std::string_view key, comgui::Value const& value);
     void Arrange();
 
     std::map<std::string, PARTS, std::less<>> m_parts;

@@ -2,22 +2,6 @@
 
 namespace desk
 {
-std::optional<comgui::TICKET_TYPE> KnownType(int type)
-{
-    switch (type)
-    {
-    case comgui::SystemTickets:
-    case comgui::DeviceTickets:
-    case comgui::JobTickets:
-    case comgui::QueueTickets:
-    case comgui::PaperTickets:
-    case comgui::UserTickets:
-        return static_cast<comgui::TICKET_TYPE>(type);
-    default:
-        return std::nullopt;
-    }
-}
-
 void TicketIndex::Show(int type, std::vector<int> ids)
 {
     SortedIds& shown = m_types[type];

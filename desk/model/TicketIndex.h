@@ -11,9 +11,6 @@
 
 namespace desk
 {
-// The type under the name that it is well known by; none for others.
-std::optional<comgui::TICKET_TYPE> KnownType(int type);
-
 class TicketIndex
 {
 public:

@@ -242,7 +242,7 @@ void JobsPane::Send() { Send(chooseFiles()); }
 
 void JobsPane::Send(std::vector<std::string> const& paths)
 {
-    auto const [files, refused] = Sorted(paths);
+    auto const [files, refused] = Sifted(paths);
     m_note->SetLabelText(NoteOn(refused));
     Layout();
     if (files.empty())

@@ -163,6 +163,7 @@ void MainFrame::MakeMenus()
     add(view, _("&Jobs\tCtrl+2"), [this] { m_below->SetSelection(1); });
     add(view, _("&Pause events\tCtrl+P"), [this] { m_events->TogglePause(); });
     add(view, _("Forget &all events"), [this] { m_events->Clear(); });
+    add(view, _("&Forget the jobs that are over"), [this] { m_transfers->Take(m_jobs.RemoveOver()); });
     add(view, _("&Read all anew\tF5"), [this] { m_session.ListAll(); });
     view->AppendSeparator();
     add(view, _("&Next pane\tF6"), [this] { FocusNextPane(); });

@@ -204,8 +204,6 @@ void TicketsPane::Choose(comgui::TicketAddress ticket)
     onChoose(ticket);
 }
 
-std::optional<comgui::TicketAddress> TicketsPane::Chosen() const { return m_chosen; }
-
 void TicketsPane::ChooseType(int type)
 {
     if (m_type == type && !m_found)

@@ -36,7 +36,6 @@ public:
     void AddFound(std::vector<comgui::TicketAddress> const& found, wxString const& note);
 
     void Choose(comgui::TicketAddress ticket);
-    std::optional<comgui::TicketAddress> Chosen() const;
     void FocusSearch() { m_search->SetFocus(); }
 
 private:

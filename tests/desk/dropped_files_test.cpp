@@ -43,7 +43,7 @@ TEST_F(Dropped, FilesAreTakenInTheirOrderAndOnce)
 {
     std::string const b = File("b");
     std::string const a = File("a \xC3\xBC");
-    DroppedFiles const sorted = Sorted({b, a, b});
+    DroppedFiles const sorted = Sifted({b, a, b});
     EXPECT_EQ(sorted.files, (std::vector<std::string>{b, a}));
     EXPECT_TRUE(sorted.refused.empty());
 }
@@ -53,7 +53,7 @@ TEST_F(Dropped, EachKindOfOtherThingHasItsReason)
     std::string const pipe = (m_folder / "pipe").string();
     ASSERT_EQ(mkfifo(pipe.c_str(), 0600), 0);
     DroppedFiles const sorted =
-        Sorted({m_folder.string(), (m_folder / "none").string(), pipe, File("empty", ""), "", File("good")});
+        Sifted({m_folder.string(), (m_folder / "none").string(), pipe, File("empty", ""), "", File("good")});
     EXPECT_EQ(ReasonsOf(sorted), (std::vector{Refusal::Folder, Refusal::NotThere, Refusal::NoFile,
                                               Refusal::Empty, Refusal::NotThere}));
     EXPECT_EQ(sorted.files.size(), 1U);
@@ -64,12 +64,12 @@ TEST_F(Dropped, ALinkIsWhatItLeadsTo)
 {
     fs::create_symlink(File("real"), m_folder / "link");
     fs::create_directory_symlink(m_folder, m_folder / "loop");
-    DroppedFiles const sorted = Sorted({(m_folder / "link").string(), (m_folder / "loop").string()});
+    DroppedFiles const sorted = Sifted({(m_folder / "link").string(), (m_folder / "loop").string()});
     EXPECT_EQ(sorted.files.size(), 1U);
     EXPECT_EQ(ReasonsOf(sorted), std::vector{Refusal::Folder});
 }
 
 TEST_F(Dropped, APathThatIsTooLongIsNotThere)
 {
-    EXPECT_EQ(ReasonsOf(Sorted({"/" + std::string(100000, 'x')})), std::vector{Refusal::NotThere});
+    EXPECT_EQ(ReasonsOf(Sifted({"/" + std::string(100000, 'x')})), std::vector{Refusal::NotThere});
 }

@@ -307,16 +307,6 @@ TEST_F(Log, TicketFilterKeepsWhatMayConcernIt)
     EXPECT_EQ(log.RowAt(1).kind, EventKind::ManyTicketsChanged);
 }
 
-TEST_F(Log, KindFilterKeepsThose)
-{
-    EventFilter filter;
-    filter.kinds.reset().set(static_cast<std::size_t>(EventKind::ServerBackAnew));
-    log.SetFilter(filter);
-    log.Append(ServerBack{false}, Now);
-    log.Append(ServerBack{true}, Now);
-    EXPECT_EQ(log.RowCount(), 1U);
-}
-
 TEST_F(Log, ClearedOneGoesOn)
 {
     Append(3);

@@ -150,32 +150,6 @@ TEST(InkCoverage, AProcessInkHasAColourOfItsOwnUnlessTheTicketHas)
     EXPECT_EQ(bad.Inks()[0].colour, own.Inks()[0].colour);
 }
 
-TEST(InkCoverage, ChangesArriveKeyByKey)
-{
-    using enum InkCoverage::Answer;
-    InkCoverage coverage;
-    EXPECT_EQ(coverage.Take({"Job/Inks/Gold/Coverage", Value(5)}), Changed);
-    EXPECT_EQ(coverage.Take({"Job/Inks/Gold/Coverage", Value(5)}), Unconcerned);
-    EXPECT_EQ(coverage.Take({"Job/Inks/Gold/Coverage", Value(6.5)}), Changed);
-    EXPECT_EQ(coverage.Take({"Job/Inks/Gold/Colour", Value("#FFD700")}), Changed);
-    EXPECT_EQ(coverage.Take({"Job/Copies", Value(5)}), Unconcerned);
-    EXPECT_EQ(coverage.Take({"Job/Copies", std::nullopt}), Unconcerned);
-    EXPECT_EQ(coverage.Take({"Job/Inks/Gold/Coverage", std::nullopt}), ToBeRead);
-    ASSERT_EQ(coverage.Inks().size(), 1U);
-    EXPECT_EQ(coverage.Inks()[0].coverage, 6.5);
-    EXPECT_EQ(coverage.Inks()[0].colour, (Rgb{255, 215, 0}));
-    EXPECT_EQ(coverage.Take({"Job/Inks/Gold/Coverage", Value()}), Changed);
-    EXPECT_TRUE(coverage.Inks().empty());
-}
-
-TEST(InkCoverage, ABadChangeTakesTheInkAway)
-{
-    auto coverage = Of({{"Job/Inks/Gold/Coverage", 5}});
-    EXPECT_EQ(coverage.Take({"Job/Inks/Gold/Coverage", Value("much")}), InkCoverage::Answer::Changed);
-    EXPECT_TRUE(coverage.Inks().empty());
-    EXPECT_EQ(coverage.Total(), 0);
-}
-
 TEST(InkCoverage, ASnapshotReplacesAllBefore)
 {
     auto coverage = Of({{"Job/Inks/Gold/Coverage", 5}});

@@ -3,21 +3,7 @@
 #include <gtest/gtest.h>
 
 using namespace comgui;
-using desk::KnownType;
 using desk::TicketIndex;
-
-TEST(KnownType, NamesTheTypesOfThePlugIn)
-{
-    for (TICKET_TYPE const type :
-         {SystemTickets, DeviceTickets, JobTickets, QueueTickets, PaperTickets, UserTickets})
-        EXPECT_EQ(KnownType(static_cast<int>(type)), type);
-}
-
-TEST(KnownType, OfOthersIsNone)
-{
-    for (int const type : {-1, 1, 4, 99, 100, 1 << 30})
-        EXPECT_EQ(KnownType(type), std::nullopt) << type;
-}
 
 TEST(TicketIndex, TypesAreSorted)
 {

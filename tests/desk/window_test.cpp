@@ -179,6 +179,18 @@ TEST_F(WindowOfTheDesk, SendsAJob_AndCancelsAnother)
     EXPECT_TRUE(jobs.RowOf(2, "Cancelled")) << testing::PrintToString(jobs.Column(2));
 }
 
+TEST_F(WindowOfTheDesk, ForgetsTheJobsThatAreOver)
+{
+    Enter();
+    auto* const pane = dynamic_cast<JobsPane*>(Find<wxWindow>("jobs")->GetParent());
+    ASSERT_NE(pane, nullptr);
+    pane->askOptions = [](auto const&) { return comgui::JobOptions(); };
+    pane->Send({folder.Write("small.pdf", std::string(1000, 'x')).string()});
+    ASSERT_TRUE(Await([this] { return jobs.RowOf(2, "Arrived").has_value(); }));
+    Menu(MenuOf("View", "Forget the jobs that are over"));
+    EXPECT_TRUE(Await([this] { return jobs.Count() == 0; }));
+}
+
 TEST_F(WindowOfTheDesk, Pauses_AndShowsAfterwardsWhatItHasMissed)
 {
     Enter();
