@@ -10,8 +10,6 @@ namespace validate
 {
 namespace
 {
-constexpr std::chrono::seconds Patience(8);
-
 // Reports that came with another pUser than was registered; theirs is nobody's listener.
 std::atomic<int> g_foreign{0};
 std::mutex g_listenersLock;
@@ -101,7 +99,8 @@ std::optional<Report> Listener::Await(std::function<bool(Report const&)> const& 
 {
     std::unique_lock lock(m_lock);
     auto const find = [&] { return std::find_if(m_reports.begin(), m_reports.end(), fits); };
-    if (!m_came.wait_for(lock, Patience, [&] { return find() != m_reports.end(); }))
+    auto const patience = m_session.GetTrial().GetOptions().limit / 2;
+    if (!m_came.wait_for(lock, patience, [&] { return find() != m_reports.end(); }))
         return std::nullopt;
     auto const found = find();
     Report report = std::move(*found);

@@ -43,7 +43,7 @@ public:
     void SwitchOn(int type, int id, std::vector<std::string> const& keys = {});  // MustBeRegistered
     void SwitchOff(int type, int id);
 
-    // Waits for one that fits; all that came before it is thrown away. None after some seconds.
+    // Waits for one that fits; all that came before it is thrown away. None after half of the check's time.
     std::optional<Report> Await(std::function<bool(Report const&)> const& fits);
     // A report of kind 1 that has the key.
     std::optional<Report> AwaitChange(std::string const& key);

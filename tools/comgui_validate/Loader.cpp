@@ -94,6 +94,6 @@ std::unique_ptr<Module> Load(std::string const& folder)
     if (!hasInterface)
         return nullptr;
     auto module = loader.Take();
-    return loader.Open(*module) ? std::move(module) : nullptr;
+    return module->table.Open && loader.Open(*module) ? std::move(module) : nullptr;
 }
 }  // namespace validate

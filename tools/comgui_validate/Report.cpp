@@ -59,9 +59,9 @@ std::string Lines(Result const& result, tools::Output const& output)
     default:
         return output.Painted(tools::Colour::Bad, "FAILED   " + result.check) + '\n' +                  //
                "         rule    " + verdict.broken.rule + ": " + TextOf(verdict.broken.rule) + '\n' +  //
-               "         called  " + verdict.broken.called + '\n' +                                     //
-               "         came    " + verdict.broken.came + '\n' +                                       //
-               "         due     " + verdict.broken.due + '\n' + Indented(verdict.output);
+               "         called  " + tools::ShownName(verdict.broken.called) + '\n' +                   //
+               "         came    " + tools::ShownName(verdict.broken.came) + '\n' +                     //
+               "         due     " + tools::ShownName(verdict.broken.due) + '\n' + Indented(verdict.output);
     }
 }
 

@@ -52,17 +52,18 @@ void WriteAndRead(char const* rule, Subject& subject, int number, int rounds)
 
 void Another(Trial& trial)
 {
-    trial.GetModule();
-    std::unique_ptr<Session> session;
-    AtOnce(1, [&](int) { session = std::make_unique<Session>(trial); });
+    Session session(trial);
+    ScratchTicket const ticket(session);
+    InContainer subject(trial, session.Container(), ticket.Type(), ticket.Id());
+    AtOnce(1, [&](int) { WriteAndRead("G3", subject, 1, 5); });
     AtOnce(1,
            [&](int)
            {
-               ScratchTicket const ticket(*session);
-               InContainer subject(trial, session->Container(), ticket.Type(), ticket.Id());
-               WriteAndRead("G3", subject, 1, 5);
+               Record record(trial);
+               trial.ExpectZero("G3", record.Initialize());
+               trial.ExpectZero("G3", record.LogIn());
+               trial.ExpectZero("G3", record.LogOut());
            });
-    AtOnce(1, [&](int) { trial.ExpectZero("G3", session->LogOut()); });
 }
 
 void FourTickets(Trial& trial)

@@ -136,15 +136,17 @@ void MissingFile(Trial& trial)
                         files.Put(table.PutFileSyncEntry, "PutFileSyncEntry", folder.PathOf("missing")));
 }
 
-bool Becomes(std::string const& content, std::function<std::string()> const& look)
+// Within a third of the check's time.
+bool Becomes(Trial const& trial, std::string const& content, std::function<std::string()> const& look)
 {
-    for (int tries = 0; tries < 100; ++tries)
+    auto const end = std::chrono::steady_clock::now() + trial.GetOptions().limit / 3;
+    while (look() != content)
     {
-        if (look() == content)
-            return true;
-        std::this_thread::sleep_for(std::chrono::milliseconds(50));
+        if (std::chrono::steady_clock::now() > end)
+            return false;
+        std::this_thread::sleep_for(std::chrono::milliseconds(20));
     }
-    return false;
+    return true;
 }
 
 void Async(Trial& trial)
@@ -158,17 +160,17 @@ void Async(Trial& trial)
     if (files.Put(table.PutFileEntry, "PutFileEntry", folder.Write("sent", content)) != 0)
         throw Skipped("the plug-in does not send files on its own");
     trial.Expect("X3",
-                 Becomes(content,
+                 Becomes(trial, content,
                          [&]
                          {
                              files.Get(table.GetFileSyncEntry, "GetFileSyncEntry", folder.PathOf("fetched"));
                              return ContentOf(folder.PathOf("fetched"));
                          }),
-                 "another content after 5 s", "what PutFileEntry has sent");
+                 "another content", "what PutFileEntry has sent");
     if (files.Get(table.GetFileEntry, "GetFileEntry", folder.PathOf("later")) != 0)
         throw Skipped("the plug-in does not fetch files on its own");
-    trial.Expect("X3", Becomes(content, [&] { return ContentOf(folder.PathOf("later")); }),
-                 "another content after 5 s", "what GetFileEntry was to fetch");
+    trial.Expect("X3", Becomes(trial, content, [&] { return ContentOf(folder.PathOf("later")); }),
+                 "another content", "what GetFileEntry was to fetch");
 }
 
 // Record and folder text are overwritten and freed as soon as the entry returns.
@@ -210,7 +212,7 @@ void KeepsNothing(Trial& trial)
     auto const& table = trial.GetModule().table;
     for (int i = 0; i < 5; ++i)
         files.Get(table.GetFileEntry, "GetFileEntry", folder.PathOf(("fetched" + std::to_string(i)).c_str()));
-    trial.Expect("G2", Becomes(content, [&] { return ContentOf(folder.PathOf("fetched4")); }),
+    trial.Expect("G2", Becomes(trial, content, [&] { return ContentOf(folder.PathOf("fetched4")); }),
                  "no file where it was to be fetched to", "the file, though the texts have gone");
 }
 }  // namespace

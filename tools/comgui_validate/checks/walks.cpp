@@ -14,7 +14,10 @@ namespace
 using Place = std::pair<std::string, int>;
 using Content = std::map<Place, Value>;
 
-std::string WordsOf(Place const& place) { return Quoted(place.first) + " at " + std::to_string(place.second); }
+std::string WordsOf(Place const& place)
+{
+    return Quoted(place.first) + " at " + std::to_string(place.second);
+}
 
 // Of keys that checks use. A single value may be delivered at -1 or at 0: both mean it.
 Content Walked(WithTable& ticket)
