@@ -1,5 +1,6 @@
 // The page of rules and the program's checks know each other, and a good plug-in passes them all.
 #include "tests/support/TemporaryFolder.h"
+#include "tests/support/sanitizers.h"
 #include "tools/comgui_validate/Check.h"
 #include "tools/comgui_validate/Contract.h"
 #include "tools/comgui_validate/Report.h"
@@ -104,7 +105,7 @@ TEST(ProcessOfACheck, ThatCrashes_IsAFailure)
     Verdict const verdict = RunThat([] { raise(SIGSEGV); });
     EXPECT_EQ(verdict.outcome, Outcome::Failed);
     EXPECT_EQ(verdict.broken.rule, "G1");
-    EXPECT_THAT(verdict.broken.came, HasSubstr("Segmentation fault"));
+    EXPECT_THAT(verdict.broken.came, HasSubstr(IsSanitized ? "the process ended" : "Segmentation fault"));
 }
 
 TEST(ProcessOfACheck, ThatNeverEnds_IsAFailure)

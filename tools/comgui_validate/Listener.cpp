@@ -13,7 +13,13 @@ namespace
 // Reports that came with another pUser than was registered; theirs is nobody's listener.
 std::atomic<int> g_foreign{0};
 std::mutex g_listenersLock;
-std::vector<Listener*> g_listeners;  // they live to the end of the process, since a plug-in may be late
+
+// They live to the end of the process and beyond, since a plug-in may be late.
+std::vector<Listener*>& Listeners()
+{
+    static auto* const all = new std::vector<Listener*>;
+    return *all;
+}
 
 std::vector<ReportedRecord> RecordsOf(SETMULTIPAR const* table)
 {
@@ -30,7 +36,7 @@ Listener::Listener(Session& session) : m_session(session)
 {
     {
         std::lock_guard const lock(g_listenersLock);
-        g_listeners.push_back(this);
+        Listeners().push_back(this);
     }
     Trial& trial = session.GetTrial();
     MemoryTicket const ticket(trial);
@@ -78,7 +84,7 @@ void Listener::SwitchOff(int type, int id) { Switch(type, id, false, nullptr); }
 void Listener::Callback(void* user, int kind, int, int, int code, void* data)
 {
     std::unique_lock lock(g_listenersLock);
-    bool const isKnown = std::find(g_listeners.begin(), g_listeners.end(), user) != g_listeners.end();
+    bool const isKnown = std::find(Listeners().begin(), Listeners().end(), user) != Listeners().end();
     lock.unlock();
     if (!isKnown)
         ++g_foreign;
