@@ -37,8 +37,8 @@ install(DIRECTORY ${PROJECT_BINARY_DIR}/lib/ComGUI.Bundle/ DESTINATION ${COMGUI_
 
 if(COMGUI_TOOLS)
     file(RELATIVE_PATH comgui_libraries ${CMAKE_INSTALL_FULL_BINDIR} ${CMAKE_INSTALL_FULL_LIBDIR})
-    set_target_properties(ticketstream comgui_site PROPERTIES INSTALL_RPATH ${comgui_beside}/${comgui_libraries})
-    install(TARGETS ticketstream comgui_site RUNTIME DESTINATION ${CMAKE_INSTALL_BINDIR})
+    set_target_properties(ticketstream comgui_site comgui_validate PROPERTIES INSTALL_RPATH ${comgui_beside}/${comgui_libraries})
+    install(TARGETS ticketstream comgui_site comgui_validate RUNTIME DESTINATION ${CMAKE_INSTALL_BINDIR})
 endif()
 if(TARGET ticket_desk)
     file(RELATIVE_PATH comgui_libraries ${CMAKE_INSTALL_FULL_BINDIR} ${CMAKE_INSTALL_FULL_LIBDIR})
