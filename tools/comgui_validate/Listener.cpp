@@ -14,10 +14,9 @@ namespace
 std::atomic<int> g_foreign{0};
 std::mutex g_listenersLock;
 
-// They live to the end of the process and beyond, since a plug-in may be late.
-std::vector<Listener*>& Listeners()
+std::vector<std::unique_ptr<Listener>>& Listeners()
 {
-    static auto* const all = new std::vector<Listener*>;
+    static auto* const all = new std::vector<std::unique_ptr<Listener>>;
     return *all;
 }
 
@@ -32,13 +31,21 @@ std::vector<ReportedRecord> RecordsOf(SETMULTIPAR const* table)
 }
 }  // namespace
 
-Listener::Listener(Session& session) : m_session(session)
+Listener& Listener::Begin(Session& session)
 {
+    std::unique_ptr<Listener> listener(new Listener(session));
+    Listener& begun = *listener;
     {
         std::lock_guard const lock(g_listenersLock);
-        Listeners().push_back(this);
+        Listeners().push_back(std::move(listener));
     }
-    Trial& trial = session.GetTrial();
+    begun.Register();
+    return begun;
+}
+
+void Listener::Register()
+{
+    Trial& trial = m_session.GetTrial();
     MemoryTicket const ticket(trial);
     STICKET_ACCESS const& table = *ticket.Table();
     using CALLBACK = void (*)(void*, int, int, int, int, void*);
@@ -47,10 +54,10 @@ Listener::Listener(Session& session) : m_session(session)
                             reinterpret_cast<void*>(callback), -1) == 0 ||
         table.SSETPARAMETER(table.Instance, "pUser", PARAM_POINTER, this, -1) == 0)
         throw Skipped("a ticket in memory takes no pointers; see memory.each-type");
-    m_result = session.Send("local.set.callback", 0, const_cast<STICKET_ACCESS*>(&table));
+    m_result = m_session.Send("local.set.callback", 0, const_cast<STICKET_ACCESS*>(&table));
     if (table.SGETPARAMETER(table.Instance, "iGUINotificationID", PARAM_INT, &m_id, -1) == 0)
         m_id = -1;
-    session.GetRecord()->iGUINotificationID = m_id;
+    m_session.GetRecord()->iGUINotificationID = m_id;
 }
 
 void Listener::MustBeRegistered() const
@@ -71,6 +78,7 @@ void Listener::SwitchOn(int type, int id, std::vector<std::string> const& keys)
 {
     MustBeRegistered();
     std::vector<char const*> table;
+    table.reserve(keys.size() + 1);
     for (std::string const& key : keys)
         table.push_back(key.c_str());
     table.push_back(nullptr);
@@ -84,7 +92,8 @@ void Listener::SwitchOff(int type, int id) { Switch(type, id, false, nullptr); }
 void Listener::Callback(void* user, int kind, int, int, int code, void* data)
 {
     std::unique_lock lock(g_listenersLock);
-    bool const isKnown = std::find(Listeners().begin(), Listeners().end(), user) != Listeners().end();
+    bool const isKnown = std::any_of(Listeners().begin(), Listeners().end(),
+                                     [user](auto const& each) { return each.get() == user; });
     lock.unlock();
     if (!isKnown)
         ++g_foreign;

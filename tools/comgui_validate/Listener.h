@@ -33,7 +33,8 @@ struct Report
 class Listener
 {
 public:
-    explicit Listener(Session& session);
+    // Registers a callback. The listener lives to the end of the process, since a plug-in may be late.
+    static Listener& Begin(Session& session);
 
     int Result() const { return m_result; }  // of the command that registers
     int Id() const { return m_id; }
@@ -53,6 +54,8 @@ public:
     bool HadForeignUser() const;
 
 private:
+    explicit Listener(Session& session) : m_session(session) {}
+    void Register();
     static void Callback(void* user, int kind, int argA, int argB, int code, void* data);
     void Take(Report report);
 

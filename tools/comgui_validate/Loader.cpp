@@ -43,8 +43,6 @@ Loader::Loader(std::string const& folder)
         m_plugIn = CFPlugInCreate(kCFAllocatorDefault, url.get());
 }
 
-Loader::~Loader() = default;  // the plug-in stays loaded to the end of the process, as it does in a host
-
 bool Loader::HasFactory() const
 {
     auto const factories = FactoriesOf(m_plugIn);

@@ -1,4 +1,5 @@
-// The loading of a bundle, step by step as the library does it.
+// The loading of a bundle, step by step as the library does it. As in a host, it stays loaded to the end of
+// the process.
 #pragma once
 
 #include "tools/comgui_validate/Trial.h"
@@ -12,7 +13,6 @@ class Loader
 {
 public:
     explicit Loader(std::string const& folder);
-    ~Loader();
     Loader(Loader const&) = delete;
     Loader& operator=(Loader const&) = delete;
 

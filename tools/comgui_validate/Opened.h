@@ -9,18 +9,17 @@ namespace validate
 class Opened
 {
 public:
-    Opened(Session& session, int type, int id) : m_session(session), m_type(type), m_id(id)
+    Opened(Session& session, int type, int id) : m_container(session.Container()), m_type(type), m_id(id)
     {
-        MTICKET_ACCESS const* const container = session.Container();
         session.GetTrial().Calling("MOPERATION(" + NameOf(type, id) + ", MTICKET_OP_OPEN, &ticket)");
-        if (container->MOPERATION(container->Instance, type, id, MTICKET_OP_OPEN, &m_table) == 0 || !m_table)
+        if (m_container->MOPERATION(m_container->Instance, type, id, MTICKET_OP_OPEN, &m_table) == 0 ||
+            !m_table)
             throw Skipped("the ticket cannot be opened; see tickets.open");
     }
     ~Opened()
     {
-        MTICKET_ACCESS const* const container = m_session.Container();
         bool flag = false;
-        container->MOPERATION(container->Instance, m_type, m_id, MTICKET_OP_CLOSE, &flag);
+        m_container->MOPERATION(m_container->Instance, m_type, m_id, MTICKET_OP_CLOSE, &flag);
     }
     Opened(Opened const&) = delete;
     Opened& operator=(Opened const&) = delete;
@@ -28,7 +27,7 @@ public:
     STICKET_ACCESS const* Table() const { return m_table; }
 
 private:
-    Session& m_session;
+    MTICKET_ACCESS const* const m_container;
     int const m_type;
     int const m_id;
     STICKET_ACCESS const* m_table = nullptr;

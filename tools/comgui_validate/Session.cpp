@@ -19,13 +19,6 @@ void Assign(char (&field)[Size], std::string const& text)
 {
     stracpy(field, text.c_str(), Size);
 }
-
-std::optional<int> NumberOf(std::string_view text)
-{
-    int number = 0;
-    auto const [end, failure] = std::from_chars(text.data(), text.data() + text.size(), number);
-    return failure == std::errc() && end == text.data() + text.size() ? std::optional(number) : std::nullopt;
-}
 }  // namespace
 
 void Record::FREE::operator()(TLogin* record) const { std::free(record); }
@@ -37,6 +30,7 @@ Record::Record(Trial& trial) : m_trial(trial), m_record(static_cast<TLogin*>(std
     Options const& options = trial.GetOptions();
     if (!options.user)
         throw Skipped("no user; name one with --user and --password");
+    m_module = &trial.GetModule();
     m_record->nSize = sizeof(TLogin);
     m_record->iGUINotificationID = -1;
     m_record->iLocalPort = 50106;
@@ -48,24 +42,21 @@ Record::Record(Trial& trial) : m_trial(trial), m_record(static_cast<TLogin*>(std
 
 int Record::Initialize()
 {
-    Module& module = m_trial.GetModule();
     m_record->iClientStamp = Stamp;
     m_trial.Calling("InitializeEntry(instance, record, stamp)");
-    return module.table.InitializeEntry(module.instance, m_record.get(), Stamp);
+    return m_module->table.InitializeEntry(m_module->instance, m_record.get(), Stamp);
 }
 
 int Record::LogIn()
 {
-    Module& module = m_trial.GetModule();
     m_trial.Calling("LoginEntry(instance, record) for the user " + Quoted(m_record->szUser));
-    return module.Live().LoginEntry(module.instance, m_record.get());
+    return m_module->Live().LoginEntry(m_module->instance, m_record.get());
 }
 
 int Record::LogOut()
 {
-    Module& module = m_trial.GetModule();
     m_trial.Calling("LogoutEntry(instance, session)");
-    return module.table.LogoutEntry(module.instance, m_record->hSession);
+    return m_module->table.LogoutEntry(m_module->instance, m_record->hSession);
 }
 
 Session::Session(Trial& trial) : m_trial(trial), m_record(trial)
@@ -119,15 +110,14 @@ std::vector<int> TypesToTry(Trial const& trial)
     return types;
 }
 
-ScratchTicket::ScratchTicket(Session& session) : m_session(session)
+ScratchTicket::ScratchTicket(Session& session) : m_container(session.Container())
 {
     Trial& trial = session.GetTrial();
-    MTICKET_ACCESS const* const container = session.Container();
     trial.Calling("MOPERATION(type, TICKET_ID_NEXT, MTICKET_OP_CREATE_NEXT, &id)");
     if (!trial.HasOption("ticket"))
         for (int const type : TypesToTry(trial))
-            if (int id = -1; container->MOPERATION(container->Instance, type, TICKET_ID_NEXT,
-                                                   MTICKET_OP_CREATE_NEXT, &id) != 0 &&
+            if (int id = -1; m_container->MOPERATION(m_container->Instance, type, TICKET_ID_NEXT,
+                                                     MTICKET_OP_CREATE_NEXT, &id) != 0 &&
                              id >= 0)
             {
                 m_type = type;
@@ -149,8 +139,7 @@ ScratchTicket::~ScratchTicket()
 {
     if (!m_isOwn)
         return;
-    MTICKET_ACCESS const* const container = m_session.Container();
-    container->MOPERATION(container->Instance, m_type, m_id, MTICKET_OP_DELETE, nullptr);
+    m_container->MOPERATION(m_container->Instance, m_type, m_id, MTICKET_OP_DELETE, nullptr);
 }
 
 std::string NameOf(int type, int id) { return std::to_string(type) + ", " + std::to_string(id); }

@@ -30,6 +30,7 @@ private:
 
     Trial& m_trial;
     std::unique_ptr<TLogin, FREE> m_record;
+    Module* m_module = nullptr;
 };
 
 // Logged in for as long as it lives. Skipped, if the login is refused: other checks look into that.
@@ -74,7 +75,7 @@ public:
     void Forget() { m_isOwn = false; }  // somebody has deleted it
 
 private:
-    Session& m_session;
+    MTICKET_ACCESS const* const m_container;
     int m_type = -1;
     int m_id = -1;
     bool m_isOwn = false;

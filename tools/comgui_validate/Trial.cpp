@@ -3,6 +3,7 @@
 #include "tools/comgui_validate/Loader.h"
 #include "tools/shared/text.h"
 #include <algorithm>
+#include <charconv>
 #include <cstring>
 #include <new>
 #include <sys/mman.h>
@@ -78,6 +79,13 @@ void Trial::ExpectSuccess(char const* rule, int result) const
 void Trial::ExpectRefusal(char const* rule, int result) const
 {
     Expect(rule, result == 0, std::to_string(result), "0");
+}
+
+std::optional<int> NumberOf(std::string_view text)
+{
+    int number = 0;
+    auto const [end, failure] = std::from_chars(text.data(), text.data() + text.size(), number);
+    return failure == std::errc() && end == text.data() + text.size() ? std::optional(number) : std::nullopt;
 }
 
 std::string Quoted(std::string const& text) { return tools::Shown(text, 60); }

@@ -6,7 +6,9 @@
 #include "tools/comgui_validate/Check.h"
 #include <memory>
 #include <mutex>
+#include <optional>
 #include <string>
+#include <string_view>
 
 namespace validate
 {
@@ -66,6 +68,9 @@ private:
     std::string m_call;
     std::unique_ptr<Module> m_module;
 };
+
+// None if it is not one, or not alone.
+std::optional<int> NumberOf(std::string_view text);
 
 // In quotes, with nothing that a terminal might obey.
 std::string Quoted(std::string const& text);

@@ -16,7 +16,7 @@ namespace
 struct Hearing
 {
     explicit Hearing(Trial& trial, std::vector<std::string> const& keys = {})
-        : session(trial), ticket(session), listener(*new Listener(session)),
+        : session(trial), ticket(session), listener(Listener::Begin(session)),
           subject(trial, session.Container(), ticket.Type(), ticket.Id())
     {
         listener.SwitchOn(ticket.Type(), ticket.Id(), keys);
@@ -38,7 +38,7 @@ struct Hearing
 void Register(Trial& trial)
 {
     Session session(trial);
-    auto const& listener = *new Listener(session);
+    auto const& listener = Listener::Begin(session);
     trial.ExpectZero("N1", listener.Result());
     trial.Expect("N1", listener.Id() >= 0, "iGUINotificationID " + std::to_string(listener.Id()),
                  "an id of 0 or above");
@@ -178,7 +178,7 @@ void AfterLogout(Trial& trial)
     ScratchTicket const ticket(writer);
     InContainer subject(trial, writer.Container(), ticket.Type(), ticket.Id());
     Session session(trial);
-    auto& listener = *new Listener(session);
+    auto& listener = Listener::Begin(session);
     listener.SwitchOn(ticket.Type(), ticket.Id());
     session.LogOut();
     listener.Forget();
@@ -192,7 +192,7 @@ void OfOthers(Trial& trial)
     ScratchTicket const ticket(writer);
     InContainer subject(trial, writer.Container(), ticket.Type(), ticket.Id());
     Session session(trial);
-    auto& listener = *new Listener(session);
+    auto& listener = Listener::Begin(session);
     listener.SwitchOn(ticket.Type(), TICKET_ID_ALL);
     subject.ExpectWrite("V2", Key("Told"), Int(1));
     trial.Expect("N10", listener.AwaitChange(Key("Told")).has_value(),

@@ -1,7 +1,6 @@
 // What can be asked of a server without a session.
 #include "tools/comgui_validate/Trial.h"
 #include <arpa/inet.h>
-#include <cstdlib>
 #include <ifaddrs.h>
 #include <memory>
 #include <netinet/in.h>
@@ -26,7 +25,7 @@ void Alive(Trial& trial)
 void Nobody(Trial& trial)
 {
     Module& module = trial.GetModule();
-    int const port = std::atoi(trial.Option("dead-port", "1").c_str());
+    int const port = NumberOf(trial.Option("dead-port", "1")).value_or(1);
     trial.Calling("IsAliveEntry(instance, \"localhost\", " + std::to_string(port) + ")");
     trial.ExpectFailure("S1", module.table.IsAliveEntry(module.instance, "localhost", port));
     trial.Calling("IsAliveEntry(instance, \"server.invalid\", " + std::to_string(trial.GetOptions().port) +
