@@ -146,6 +146,18 @@ TEST_F(EventsOfAClient, OfTwoSubscriptions_GoToBoth_AndEachKeyOnceToEach)
     EXPECT_THAT(second, ElementsAre("changed " + NameOf(job) + " A=1 B=2"));
 }
 
+TEST_F(EventsOfAClient, OfTwoSubscriptionsToATicket_HaveTheKeysOfEach)
+{
+    TicketAddress const job = NewTicket();
+    auto const a = Listen(Interest::InTickets({job}, {"A"}));
+    auto const b = Listen(Interest::InTickets({job}, {"B"}));
+    ASSERT_TRUE(tickets.Write(job, "B", 2));
+    Hear(1);
+    ASSERT_TRUE(tickets.Write(job, "A", 1));
+    Hear(2);
+    EXPECT_THAT(heard, ElementsAre("changed " + NameOf(job) + " B=2", "changed " + NameOf(job) + " A=1"));
+}
+
 TEST_F(EventsOfAClient, GoOn_WhenAnotherSubscriptionEnds)
 {
     TicketAddress const job = NewTicket();

@@ -19,6 +19,7 @@ void AtOnce(int count, std::function<void(int number)> const& work)
 {
     std::vector<std::exception_ptr> failures(static_cast<std::size_t>(count));
     std::vector<std::thread> threads;
+    threads.reserve(failures.size());
     for (int i = 0; i < count; ++i)
         threads.emplace_back(
             [&, i]
@@ -70,6 +71,7 @@ void FourTickets(Trial& trial)
 {
     Session session(trial);
     std::vector<std::unique_ptr<ScratchTicket>> tickets;
+    tickets.reserve(Threads);
     for (int i = 0; i < Threads; ++i)
         tickets.push_back(std::make_unique<ScratchTicket>(session));
     if (!tickets.back()->IsOwn())
