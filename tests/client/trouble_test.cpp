@@ -81,6 +81,26 @@ TEST_F(TroubledClient, SessionThatIsGone_IsReplaced_AndSubscriptionsGoOn)
     EXPECT_TRUE(connection.LogOut());
 }
 
+TEST_F(TroubledClient, EventsOfTheServer_OutliveTheSessionThatTheyCameIn)
+{
+    LogIn();
+    bool isFirst = true;
+    auto const subscription =
+        connection.Subscribe({}, queue.GetExecutor(),
+                             [&](Event const& event)
+                             {
+                                 heard.push_back(std::holds_alternative<ServerLost>(event) ? "lost" : "back");
+                                 if (!std::exchange(isFirst, false))
+                                     return;
+                                 trouble.sessionIsGone = true;
+                                 Await([this] { return trouble.logins >= 3; });
+                             });
+    trouble.sessionIsGone = true;
+    Await([this] { return trouble.logins >= 2; });
+    std::this_thread::sleep_for(100ms);  // loss and return wait together
+    EXPECT_THAT(Hear(4), ElementsAre("lost", "back", "lost", "back"));
+}
+
 TEST_F(TroubledClient, LogoutWhileTheSessionIsReplaced_LeavesNone)
 {
     LogIn();
