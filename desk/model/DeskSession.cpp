@@ -93,6 +93,7 @@ void DeskSession::ForgetSession()
 {
     ++m_session;
     m_listings = 0;
+    m_isListMissing = false;
     m_late.clear();
 }
 
@@ -103,7 +104,10 @@ void DeskSession::List(int type)
                 InThisSession(
                     [this, type](comgui::Result<std::vector<int>> const& ids)
                     {
-                        ids ? onList(type, *ids) : onProblem(ids.GetError());
+                        if (!ids)
+                            NoteFailure(ids.GetError());
+                        else
+                            onList(type, *ids);
                         EndListing();
                     }));
 }
@@ -115,12 +119,20 @@ void DeskSession::ListAll()
                 InThisSession(
                     [this](comgui::Result<Lists> const& lists)
                     {
+                        m_isListMissing = false;
                         if (!lists)
-                            onProblem(lists.GetError());
+                            NoteFailure(lists.GetError());
                         for (auto const& [type, ids] : lists.ValueOr({}))
                             onList(type, ids);
                         EndListing();
                     }));
+}
+
+// What could not be listed is listed when the server is back.
+void DeskSession::NoteFailure(comgui::Error const& error)
+{
+    m_isListMissing = true;
+    onProblem(error);
 }
 
 void DeskSession::EndListing()
@@ -140,7 +152,7 @@ void DeskSession::Take(comgui::Event const& event)
     else if (auto const* const back = std::get_if<comgui::ServerBack>(&event))
     {
         Become(State::LoggedIn);
-        if (back->isNewSession)
+        if (back->isNewSession || m_isListMissing)
             ListAll();
     }
     else if (auto const* const many = std::get_if<comgui::ManyTicketsChanged>(&event))

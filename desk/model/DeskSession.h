@@ -65,6 +65,7 @@ public:
 private:
     void Take(comgui::Event const& event);
     void TakeTicket(comgui::TicketAddress ticket, bool isThere);
+    void NoteFailure(comgui::Error const& error);
     void EndListing();
     void EndSession();
     void ForgetSession();
@@ -73,8 +74,9 @@ private:
     comgui::Connection m_connection;
     comgui::Tickets const m_tickets = m_connection.GetTickets();
     State m_state = State::LoggedOut;
-    unsigned long m_session = 0;  // which one, the times between them included
-    int m_listings = 0;           // under way; what is heard meanwhile may be newer, so it is told once more
+    unsigned long m_session = 0;   // which one, the times between them included
+    bool m_isListMissing = false;  // a type, or more
+    int m_listings = 0;            // under way; what is heard meanwhile may be newer, so it is told once more
     std::vector<std::pair<comgui::TicketAddress, bool>> m_late;
     comgui::Worker const m_worker;
     comgui::Subscription m_events;

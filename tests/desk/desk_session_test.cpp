@@ -101,6 +101,20 @@ TEST_F(SessionOfTheDesk, TellsOnceMoreWhatHasComeWhileItListed)
     EXPECT_THAT(known, ElementsAre(job));
 }
 
+TEST_F(SessionOfTheDesk, WhatCouldNotBeListed_IsListedWhenTheServerIsBack)
+{
+    ASSERT_TRUE(session.Connection().LogIn(Here(), Admin()));
+    trouble.tickets.sessionIsOver = true;
+    session.LoggedIn();
+    ASSERT_TRUE(Await([this] { return !problems.empty(); }));
+    EXPECT_THAT(lists, IsEmpty());
+    trouble.serverIsAway = true;
+    ASSERT_TRUE(Await([this] { return states.back() == DeskSession::State::Lost; }));
+    trouble.tickets.sessionIsOver = false;
+    trouble.serverIsAway = false;
+    EXPECT_TRUE(Await([this] { return lists.size() == comgui::TicketTypes; }));
+}
+
 TEST_F(SessionOfTheDesk, ListsATypeAnew)
 {
     Enter();
