@@ -137,6 +137,8 @@ int Login(void* instance, TLogin* login)
     } const here;
     if (IsLoginRefused() || (Has("logins-collide") && here.before > 0))
         return 7;
+    if (Has("logins-collide"))
+        std::this_thread::sleep_for(std::chrono::milliseconds(100));  // so that they meet
     int const code = real.LoginEntry(instance, login);
     std::lock_guard const held(lock);
     if (code != 0)
@@ -211,7 +213,7 @@ void SpoilRead(PARAM_TYPE what, void* value, int position)
     if (Has("threads-share") && what == PARAM_INT)
     {
         shared = *static_cast<int*>(value);
-        std::this_thread::yield();
+        std::this_thread::sleep_for(std::chrono::microseconds(200));  // so that they meet
         *static_cast<int*>(value) = shared;
     }
     if (Has("text-cut") && what == PARAM_STRING)
