@@ -6,6 +6,7 @@
 #include <plist/plist.h>
 #include <system_error>
 #include <type_traits>
+#include <utility>
 
 namespace comgui::detail
 {
@@ -133,8 +134,11 @@ std::optional<BundleInfo> ReadBundleInfo(fs::path const& bundle)
     ForEachUuid(types,
                 [&](Uuid const& type, plist_t value)
                 {
-                    if (plist_get_node_type(value) == PLIST_ARRAY)
-                        info.factories.emplace(type, UuidsOf(value));
+                    if (plist_get_node_type(value) != PLIST_ARRAY)
+                        return;
+                    auto uuids = UuidsOf(value);
+                    std::erase_if(uuids, [&](Uuid const& uuid) { return !info.functions.contains(uuid); });
+                    info.factories.emplace(type, std::move(uuids));
                 });
     return info;
 }

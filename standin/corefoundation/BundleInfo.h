@@ -14,7 +14,7 @@ struct BundleInfo
 {
     std::string executable;                       // CFBundleExecutable: the name of a file
     std::map<Uuid, std::string> functions;        // CFPlugInFactories: what to call for a factory
-    std::map<Uuid, std::vector<Uuid>> factories;  // CFPlugInTypes: the factories of a type, in their order
+    std::map<Uuid, std::vector<Uuid>> factories;  // CFPlugInTypes: those of a type that have a function
 };
 
 // Nothing if the folder has no Info.plist, or one that does not describe a plug-in: no property list,

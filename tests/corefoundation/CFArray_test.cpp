@@ -3,18 +3,10 @@
 #include "tests/support/BundleOnDisk.h"
 #include "tests/support/TemporaryFolder.h"
 
-#include <cstring>
 #include <gtest/gtest.h>
 
 namespace
 {
-bool Same(void const* element, std::string const& text)
-{
-    CFUUIDBytes const bytes = CFUUIDGetUUIDBytes(static_cast<CFUUIDRef>(element));
-    CFUUIDBytes const expected = CFUUIDGetUUIDBytes(MakeUUID(text).get());
-    return std::memcmp(&bytes, &expected, sizeof bytes) == 0;
-}
-
 // The only arrays that there are: the factories of a type.
 class CFArray : public testing::Test
 {
@@ -37,22 +29,22 @@ protected:
 TEST_F(CFArray, Elements_StandInTheOrderOfTheInfoPlist)
 {
     ASSERT_EQ(CFArrayGetCount(array.get()), 3);
-    EXPECT_TRUE(Same(CFArrayGetValueAtIndex(array.get(), 0), factory3));
-    EXPECT_TRUE(Same(CFArrayGetValueAtIndex(array.get(), 1), factory1));
-    EXPECT_TRUE(Same(CFArrayGetValueAtIndex(array.get(), 2), factory2));
+    EXPECT_TRUE(IsUUID(CFArrayGetValueAtIndex(array.get(), 0), factory3));
+    EXPECT_TRUE(IsUUID(CFArrayGetValueAtIndex(array.get(), 1), factory1));
+    EXPECT_TRUE(IsUUID(CFArrayGetValueAtIndex(array.get(), 2), factory2));
 }
 
 TEST_F(CFArray, Elements_OutliveThePlugIn)
 {
     plugIn.reset();
-    EXPECT_TRUE(Same(CFArrayGetValueAtIndex(array.get(), 0), factory3));
+    EXPECT_TRUE(IsUUID(CFArrayGetValueAtIndex(array.get(), 0), factory3));
 }
 
 TEST_F(CFArray, RetainedElement_OutlivesTheArray)
 {
     Held<CFUUIDRef> const element(static_cast<CFUUIDRef>(CFRetain(CFArrayGetValueAtIndex(array.get(), 1))));
     array.reset();
-    EXPECT_TRUE(Same(element.get(), factory1));
+    EXPECT_TRUE(IsUUID(element.get(), factory1));
 }
 
 TEST_F(CFArray, RetainedArray_NeedsTwoReleases)

@@ -102,6 +102,27 @@ TEST_F(CFPlugIn, FindFactories_UUIDsInOtherLetterCase_AreTheSame)
     EXPECT_NE(MakeInstance(factory1, typeA), nullptr);
 }
 
+TEST_F(CFPlugIn, FindFactories_FactoryWithoutAFunction_IsSkipped)
+{
+    BundleOnDisk bundle = NewBundle("One");
+    bundle.ListFactory(typeA, factory2);
+    bundle.AddFactory(typeA, factory1, "RecordingFactory");
+    auto const factories = FactoriesOf(OpenPlugIn(bundle.Path()), typeA);
+    ASSERT_TRUE(factories);
+    ASSERT_EQ(CFArrayGetCount(factories.get()), 1);
+    EXPECT_TRUE(IsUUID(CFArrayGetValueAtIndex(factories.get(), 0), factory1));
+}
+
+TEST_F(CFPlugIn, FindFactories_NoFactoryOfTheTypeHasAFunction_IsNull)
+{
+    BundleOnDisk bundle = NewBundle("One");
+    bundle.AddFactory(typeA, factory1, "RecordingFactory");
+    bundle.ListFactory(typeB, factory2);
+    auto const plugIn = OpenPlugIn(bundle.Path());
+    ASSERT_TRUE(FactoriesOf(plugIn, typeA));
+    EXPECT_FALSE(FactoriesOf(plugIn, typeB));
+}
+
 TEST_F(CFPlugIn, FindFactories_NullTypeOrPlugIn_IsNull)
 {
     auto const plugIn = OpenPlugIn(NewBundleWithFactory1("One").Path());

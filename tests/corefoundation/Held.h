@@ -2,6 +2,7 @@
 #pragma once
 
 #include <CoreFoundation/CoreFoundation.h>
+#include <cstring>
 #include <filesystem>
 #include <memory>
 #include <string>
@@ -29,6 +30,13 @@ inline Held<CFURLRef> MakeURL(std::filesystem::path const& path)
 inline Held<CFUUIDRef> MakeUUID(std::string const& text)
 {
     return Held<CFUUIDRef>(CFUUIDCreateFromString(kCFAllocatorDefault, MakeString(text).get()));
+}
+
+inline bool IsUUID(void const* element, std::string const& text)
+{
+    CFUUIDBytes const bytes = CFUUIDGetUUIDBytes(static_cast<CFUUIDRef>(element));
+    CFUUIDBytes const expected = CFUUIDGetUUIDBytes(MakeUUID(text).get());
+    return std::memcmp(&bytes, &expected, sizeof bytes) == 0;
 }
 
 inline Held<CFPlugInRef> OpenPlugIn(std::filesystem::path const& bundle)

@@ -103,11 +103,13 @@ TEST_F(InfoPlist, TypeWithEmptyArray_HasNoFactories)
               0);
 }
 
-TEST_F(InfoPlist, FactoryWhoseFunctionIsNoText_MakesNoInstance)
+TEST_F(InfoPlist, FactoryWhoseFunctionIsNoText_IsLeftOutAndMakesNoInstance)
 {
     bundle.WriteInfo(With("<string>RecordingFactory</string>", "<true/>"));
     auto const plugIn = OpenPlugIn(bundle.Path());
-    ASSERT_TRUE(plugIn);
+    auto const factories = FactoriesOf(plugIn, typeA);
+    ASSERT_TRUE(factories);
+    EXPECT_EQ(CFArrayGetCount(factories.get()), 1);
     testing::internal::CaptureStderr();
     EXPECT_EQ(MakeInstance(factory1, typeA), nullptr);
     EXPECT_EQ(testing::internal::GetCapturedStderr(), "");

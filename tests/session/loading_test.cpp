@@ -129,6 +129,17 @@ TEST_F(Loading, TwoFactories_TheFirstOfTheListServes)
     EXPECT_THAT(module.factories, ElementsAre("SecondFactory"));
 }
 
+TEST_F(Loading, FirstFactoryWithoutAFunction_TheNextServes)
+{
+    TemporaryFolder const other;
+    BundleOnDisk bundle = EmptyBundle(other.Path());
+    bundle.ListFactory(COMGUI_PLUGIN_TYPE_UUID, FirstUUID);
+    bundle.AddFactory(COMGUI_PLUGIN_TYPE_UUID, SecondUUID, "SecondFactory");
+    LookIn(other.Path());
+    EXPECT_EQ(StderrOfAManager(), "");
+    EXPECT_THAT(module.factories, ElementsAre("SecondFactory"));
+}
+
 TEST_F(Loading, BundleWithoutAFactoryOfTheType_PrintsOneLine)
 {
     TemporaryFolder const other;

@@ -40,6 +40,11 @@ void BundleOnDisk::AddFactory(std::string const& type, std::string const& factor
                               std::string const& function)
 {
     m_functions[factory] = function;
+    ListFactory(type, factory);
+}
+
+void BundleOnDisk::ListFactory(std::string const& type, std::string const& factory)
+{
     m_factories[type].push_back(factory);
     WriteInfo(Info());
 }

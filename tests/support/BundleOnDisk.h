@@ -31,6 +31,9 @@ public:
     // Adds a factory, served by that function, at the end of the type's list. UUIDs are written as given.
     void AddFactory(std::string const& type, std::string const& factory, std::string const& function);
 
+    // Adds a factory to the type's list that no function serves.
+    void ListFactory(std::string const& type, std::string const& factory);
+
     // Puts any bytes in the place of the Info.plist.
     void WriteInfo(std::string_view content) const;
 

@@ -70,7 +70,8 @@ CF_EXPORT void const* CFArrayGetValueAtIndex(CFArrayRef array, CFIndex index);
 // then stays loaded to the end of the process. Releasing the plug-in takes its factories away.
 CF_EXPORT CFPlugInRef CFPlugInCreate(CFAllocatorRef allocator, CFURLRef bundleURL);
 
-// The plug-in's factories for that type, as CFUUIDRef in the order of its Info.plist; null if it has none.
+// The plug-in's factories for that type, as CFUUIDRef in the order of its Info.plist; null if it has none. A
+// factory without a function in CFPlugInFactories is skipped, so that the next one of the list may serve.
 // The caller releases the array.
 CF_EXPORT CFArrayRef CFPlugInFindFactoriesForPlugInTypeInPlugIn(CFUUIDRef typeUUID, CFPlugInRef plugIn);
 
