@@ -104,11 +104,55 @@ std::vector<Uuid> UuidsOf(plist_t array)
 
 bool IsDictionary(plist_t node) { return node != nullptr && plist_get_node_type(node) == PLIST_DICT; }
 
-// A path would lead out of the bundle.
 bool IsFileName(std::string const& name)
 {
-    return !name.empty() && name != "." && name != ".." && name.find('/') == std::string::npos &&
+    return name != "." && name != ".." && name.find('/') == std::string::npos &&
            name.find('\0') == std::string::npos;
+}
+
+// Empty where a path would lead out of the bundle.
+std::string ExecutableOf(plist_t root, fs::path const& bundle)
+{
+    std::string const name = TextOf(plist_dict_get_item(root, "CFBundleExecutable")).value_or("");
+    if (!name.empty())
+        return IsFileName(name) ? name : std::string();
+    fs::path const folder = (bundle / "").lexically_normal().parent_path();  // without a slash or dot behind
+    return folder.stem().string();
+}
+
+std::map<Uuid, std::string> FunctionsOf(plist_t root)
+{
+    std::map<Uuid, std::string> functions;
+    plist_t const entries = plist_dict_get_item(root, "CFPlugInFactories");
+    if (IsDictionary(entries))
+    {
+        ForEachUuid(entries,
+                    [&](Uuid const& factory, plist_t value)
+                    {
+                        if (auto const function = TextOf(value))
+                            functions.emplace(factory, *function);
+                    });
+    }
+    return functions;
+}
+
+std::map<Uuid, std::vector<Uuid>> FactoriesOf(plist_t root, std::map<Uuid, std::string> const& functions)
+{
+    std::map<Uuid, std::vector<Uuid>> factories;
+    plist_t const entries = plist_dict_get_item(root, "CFPlugInTypes");
+    if (IsDictionary(entries))
+    {
+        ForEachUuid(entries,
+                    [&](Uuid const& type, plist_t value)
+                    {
+                        if (plist_get_node_type(value) != PLIST_ARRAY)
+                            return;
+                        auto uuids = UuidsOf(value);
+                        std::erase_if(uuids, [&](Uuid const& uuid) { return !functions.contains(uuid); });
+                        factories.emplace(type, std::move(uuids));
+                    });
+    }
+    return factories;
 }
 }  // namespace
 
@@ -117,29 +161,10 @@ std::optional<BundleInfo> ReadBundleInfo(fs::path const& bundle)
     Plist const root = ParsePlist(ReadInfoFile(bundle / "Contents" / "Info.plist"));
     if (!IsDictionary(root.get()))
         return std::nullopt;
-    auto const executable = TextOf(plist_dict_get_item(root.get(), "CFBundleExecutable"));
-    plist_t functions = plist_dict_get_item(root.get(), "CFPlugInFactories");
-    plist_t types = plist_dict_get_item(root.get(), "CFPlugInTypes");
-    if (!IsFileName(executable.value_or("")) || !IsDictionary(functions) || !IsDictionary(types))
-        return std::nullopt;
-
     BundleInfo info;
-    info.executable = *executable;
-    ForEachUuid(functions,
-                [&](Uuid const& factory, plist_t value)
-                {
-                    if (auto const function = TextOf(value))
-                        info.functions.emplace(factory, *function);
-                });
-    ForEachUuid(types,
-                [&](Uuid const& type, plist_t value)
-                {
-                    if (plist_get_node_type(value) != PLIST_ARRAY)
-                        return;
-                    auto uuids = UuidsOf(value);
-                    std::erase_if(uuids, [&](Uuid const& uuid) { return !info.functions.contains(uuid); });
-                    info.factories.emplace(type, std::move(uuids));
-                });
+    info.executable = ExecutableOf(root.get(), bundle);
+    info.functions = FunctionsOf(root.get());
+    info.factories = FactoriesOf(root.get(), info.functions);
     return info;
 }
 }  // namespace comgui::detail

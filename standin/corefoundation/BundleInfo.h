@@ -12,13 +12,13 @@ namespace comgui::detail
 {
 struct BundleInfo
 {
-    std::string executable;                       // CFBundleExecutable: the name of a file
+    std::string executable;                       // a file's name; empty if CFBundleExecutable is a path
     std::map<Uuid, std::string> functions;        // CFPlugInFactories: what to call for a factory
     std::map<Uuid, std::vector<Uuid>> factories;  // CFPlugInTypes: those of a type that have a function
 };
 
-// Nothing if the folder has no Info.plist, or one that does not describe a plug-in: no property list,
-// without a plain file name as executable, without factories, a key of the wrong type. A single factory or
-// type that cannot be read is left out.
+// Nothing if the folder has no Info.plist or one that is no property list with a dictionary. What is missing
+// or of the wrong type in that dictionary is left out; without a text in CFBundleExecutable the executable is
+// named like the folder, less the folder's extension.
 std::optional<BundleInfo> ReadBundleInfo(std::filesystem::path const& bundle);
 }  // namespace comgui::detail

@@ -9,6 +9,8 @@
 #include <dlfcn.h>
 #include <iterator>
 #include <mutex>
+#include <system_error>
+#include <utility>
 
 using comgui::detail::BundleInfo;
 using comgui::detail::CountedObject;
@@ -20,6 +22,14 @@ namespace
 namespace fs = std::filesystem;
 
 using FACTORY = void* (*)(CFAllocatorRef, CFUUIDRef);
+
+constexpr char howToInstall[] =
+    "put the shared object that CFBundleExecutable in Info.plist names into Contents/Linux";
+
+void Complain(fs::path const& bundle, std::string const& reason, char const* remedy)
+{
+    std::fprintf(stderr, "CoreFoundation: %s: %s; %s\n", bundle.c_str(), reason.c_str(), remedy);
+}
 }  // namespace
 
 // An open bundle. Its executable is not loaded before a factory is called.
@@ -36,7 +46,6 @@ struct __CFBundle final : CountedObject
 
 private:
     void* Executable();
-    void Complain(std::string const& reason, char const* remedy) const;
 
     fs::path const path;
     BundleInfo const info;
@@ -103,7 +112,8 @@ FACTORY __CFBundle::Load(Uuid const& factory)
     if (symbol == nullptr)
     {
         char const* const reason = dlerror();
-        Complain("has no factory function " + function + " (" + (reason ? reason : "its address is null") +
+        Complain(path,
+                 "has no factory function " + function + " (" + (reason ? reason : "its address is null") +
                      ")",
                  "export it with C linkage, or correct CFPlugInFactories in Info.plist");
     }
@@ -117,30 +127,34 @@ void* __CFBundle::Executable()
     void* image = executable.load(std::memory_order_acquire);
     if (image != nullptr)
         return image;
+    if (info.executable.empty())
+    {
+        Complain(path, "cannot load its executable (CFBundleExecutable is a path, not a name)", howToInstall);
+        return nullptr;
+    }
     fs::path const file = path / "Contents" / "Linux" / info.executable;
     image = dlopen(file.c_str(), RTLD_NOW | RTLD_LOCAL);
     if (image == nullptr)
-    {
-        Complain(std::string("cannot load its executable (") + dlerror() + ")",
-                 "put the shared object that CFBundleExecutable in Info.plist names into Contents/Linux");
-    }
+        Complain(path, std::string("cannot load its executable (") + dlerror() + ")", howToInstall);
     executable.store(image, std::memory_order_release);
     return image;
-}
-
-void __CFBundle::Complain(std::string const& reason, char const* remedy) const
-{
-    std::fprintf(stderr, "CoreFoundation: %s: %s; %s\n", path.c_str(), reason.c_str(), remedy);
 }
 
 CFPlugInRef CFPlugInCreate(CFAllocatorRef, CFURLRef bundleURL)
 {
     if (bundleURL == nullptr)
         return nullptr;
-    auto info = comgui::detail::ReadBundleInfo(bundleURL->path);
-    if (!info)
+    fs::path const& path = bundleURL->path;
+    std::error_code error;
+    if (!fs::is_directory(path, error))
         return nullptr;
-    Owned<__CFBundle> bundle(new __CFBundle(bundleURL->path, std::move(*info)));
+    auto info = comgui::detail::ReadBundleInfo(path);
+    if (!info)
+    {
+        Complain(path, "cannot read its Info.plist, so it has no factories",
+                 "put a property list, XML or binary, into Contents/Info.plist");
+    }
+    Owned<__CFBundle> bundle(new __CFBundle(path, std::move(info).value_or(BundleInfo())));
     OpenBundles::Get().Add(bundle.get());
     return bundle.release();
 }

@@ -69,7 +69,12 @@ TEST_F(CFPlugIn, Create_PathThatDoesNotExist_IsNull) { EXPECT_FALSE(OpenPlugIn(f
 
 TEST_F(CFPlugIn, Create_PathOfAFile_IsNull) { EXPECT_FALSE(OpenPlugIn(folder.Write("ComGUI.Bundle", "x"))); }
 
-TEST_F(CFPlugIn, Create_FolderWithoutInfoPlist_IsNull) { EXPECT_FALSE(OpenPlugIn(folder.Path())); }
+TEST_F(CFPlugIn, Create_FolderWithoutInfoPlist_IsAPlugInWithoutFactories)
+{
+    auto const plugIn = OpenPlugIn(folder.Path());
+    ASSERT_TRUE(plugIn);
+    EXPECT_FALSE(FactoriesOf(plugIn, typeA));
+}
 
 TEST_F(CFPlugIn, Create_MissingExecutable_IsAPlugIn)
 {
@@ -183,6 +188,72 @@ TEST_F(CFPlugIn, InstanceCreate_ExecutableOfAnotherName_IsTheOneOfTheInfoPlist)
     auto const plugIn = OpenPlugIn(bundle.Path());
     EXPECT_EQ(MakerOf(MakeInstance(factory1, typeA)), bundle.Executable());
 }
+
+struct EXECUTABLE_FACT
+{
+    char const* name;
+    char const* folder;      // of the bundle
+    char const* entry;       // CFBundleExecutable and its value in the Info.plist
+    char const* executable;  // that is then loaded
+};
+
+class CFPlugInWithoutExecutableName : public CFPlugIn, public testing::WithParamInterface<EXECUTABLE_FACT>
+{
+};
+
+TEST_P(CFPlugInWithoutExecutableName, InstanceCreate_LoadsTheOneNamedLikeTheFolder)
+{
+    BundleOnDisk bundle(folder.Path(), GetParam().folder);
+    bundle.AddFactory(typeA, factory1, "RecordingFactory");
+    std::string const named = "<key>CFBundleExecutable</key><string>Module</string>";
+    std::string text = bundle.Info();
+    ASSERT_NE(text.find(named), std::string::npos);
+    bundle.SetExecutableName(GetParam().executable);
+    bundle.WriteInfo(text.replace(text.find(named), named.size(), GetParam().entry));
+    bundle.CopyExecutable(COMGUI_TEST_PLUGIN);
+    auto const plugIn = OpenPlugIn(bundle.Path());
+    EXPECT_EQ(MakerOf(MakeInstance(factory1, typeA)), bundle.Executable());
+}
+
+INSTANTIATE_TEST_SUITE_P(
+    Facts, CFPlugInWithoutExecutableName,
+    testing::Values(
+        EXECUTABLE_FACT{"Missing", "One.Bundle", "", "One"},
+        EXECUTABLE_FACT{"Empty", "One.Bundle", "<key>CFBundleExecutable</key><string></string>", "One"},
+        EXECUTABLE_FACT{"Number", "One.Bundle", "<key>CFBundleExecutable</key><integer>1</integer>", "One"},
+        EXECUTABLE_FACT{"TwoDots", "One.2.Bundle", "", "One.2"},
+        EXECUTABLE_FACT{"NoExtension", "One", "", "One"}),
+    [](auto const& fact) { return std::string(fact.param.name); });
+
+TEST_F(CFPlugIn, InstanceCreate_PathWithASlashBehind_LoadsTheExecutableNamedLikeTheFolder)
+{
+    BundleOnDisk bundle(folder.Path(), "One.Bundle");
+    bundle.AddFactory(typeA, factory1, "RecordingFactory");
+    bundle.SetExecutableName("");
+    std::string const withoutName = bundle.Info();
+    bundle.SetExecutableName("One");
+    bundle.CopyExecutable(COMGUI_TEST_PLUGIN);
+    bundle.WriteInfo(withoutName);
+    auto const plugIn = OpenPlugIn(bundle.Path() / "");
+    EXPECT_EQ(MakerOf(MakeInstance(factory1, typeA)).filename(), "One");
+}
+
+class CFPlugInWithAPathAsExecutable : public CFPlugIn, public testing::WithParamInterface<char const*>
+{
+};
+
+TEST_P(CFPlugInWithAPathAsExecutable, InstanceCreate_NamesBundleAndRemedy)
+{
+    BundleOnDisk bundle = NewBundleWithFactory1("One");
+    bundle.SetExecutableName(GetParam());
+    auto const plugIn = OpenPlugIn(bundle.Path());
+    ASSERT_TRUE(FactoriesOf(plugIn, typeA));
+    EXPECT_THAT(ComplaintOf(factory1), AllOf(HasSubstr(bundle.Path().string() + ": cannot load"),
+                                             HasSubstr("CFBundleExecutable"), HasSubstr("; put")));
+}
+
+INSTANTIATE_TEST_SUITE_P(Paths, CFPlugInWithAPathAsExecutable,
+                         testing::Values("../Linux/Module", "Sub/Module", "/Module", ".", ".."));
 
 TEST_F(CFPlugIn, InstanceCreate_FactoryThatRefuses_IsNullAndSilent)
 {

@@ -33,13 +33,12 @@ protected:
         bundle.AddFactory(typeA, factory2, "RecordingFactory");
     }
 
-    // The number of factories of typeA in the bundle with that Info.plist, -1 if it is no bundle.
+    // The number of factories of typeA in the bundle with that Info.plist.
     CFIndex FactoriesWith(std::string const& content)
     {
         bundle.WriteInfo(content);
         auto const plugIn = OpenPlugIn(bundle.Path());
-        if (!plugIn)
-            return -1;
+        EXPECT_TRUE(plugIn);
         auto const factories = FactoriesOf(plugIn, typeA);
         return factories ? CFArrayGetCount(factories.get()) : 0;
     }
@@ -56,8 +55,6 @@ protected:
     TemporaryFolder const folder;
     BundleOnDisk bundle{folder.Path()};
 };
-
-constexpr CFIndex noBundle = -1;
 
 TEST_F(InfoPlist, Xml_IsRead) { EXPECT_EQ(FactoriesWith(bundle.Info()), 2); }
 
@@ -115,101 +112,136 @@ TEST_F(InfoPlist, FactoryWhoseFunctionIsNoText_IsLeftOutAndMakesNoInstance)
     EXPECT_EQ(testing::internal::GetCapturedStderr(), "");
 }
 
-TEST_F(InfoPlist, MissingFile_IsNoBundle)
+// What stderr gets when the bundle is opened, as it is on disk now.
+std::string StderrOfOpening(BundleOnDisk const& bundle)
 {
-    std::filesystem::remove(bundle.InfoFile());
-    EXPECT_FALSE(OpenPlugIn(bundle.Path()));
+    testing::internal::CaptureStderr();
+    EXPECT_TRUE(OpenPlugIn(bundle.Path()));
+    return testing::internal::GetCapturedStderr();
 }
 
-TEST_F(InfoPlist, FolderOfThatName_IsNoBundle)
+std::string CannotRead(BundleOnDisk const& bundle)
+{
+    return "CoreFoundation: " + bundle.Path().string() +
+           ": cannot read its Info.plist, so it has no factories; "
+           "put a property list, XML or binary, into Contents/Info.plist\n";
+}
+
+TEST_F(InfoPlist, Good_OpensSilently) { EXPECT_EQ(StderrOfOpening(bundle), ""); }
+
+TEST_F(InfoPlist, MissingFile_IsSaidInOneLine)
+{
+    std::filesystem::remove(bundle.InfoFile());
+    EXPECT_EQ(StderrOfOpening(bundle), CannotRead(bundle));
+}
+
+TEST_F(InfoPlist, FolderOfThatName_IsSaidInOneLine)
 {
     std::filesystem::remove(bundle.InfoFile());
     std::filesystem::create_directory(bundle.InfoFile());
-    EXPECT_FALSE(OpenPlugIn(bundle.Path()));
+    EXPECT_EQ(StderrOfOpening(bundle), CannotRead(bundle));
 }
 
-TEST_F(InfoPlist, PipeOfThatName_IsNoBundleAndDoesNotBlock)
+TEST_F(InfoPlist, PipeOfThatName_DoesNotBlockAndIsSaidInOneLine)
 {
     std::filesystem::remove(bundle.InfoFile());
     ASSERT_EQ(mkfifo(bundle.InfoFile().c_str(), 0600), 0);
-    EXPECT_FALSE(OpenPlugIn(bundle.Path()));
+    EXPECT_EQ(StderrOfOpening(bundle), CannotRead(bundle));
 }
 
-struct BAD_INFO
+struct CHANGED_INFO
 {
     char const* name;
     char const* piece;  // of the good Info.plist, null for all of it
     char const* replacement;
 };
 
-class InfoPlistWith : public InfoPlist, public testing::WithParamInterface<BAD_INFO>
+class InfoPlistWith : public InfoPlist, public testing::WithParamInterface<CHANGED_INFO>
 {
+protected:
+    std::string Content() const
+    {
+        auto const [name, piece, replacement] = GetParam();
+        return piece ? With(piece, replacement) : replacement;
+    }
 };
 
-TEST_P(InfoPlistWith, BadContent_IsNoBundleAndSilent)
+using UnreadableInfoPlist = InfoPlistWith;
+
+TEST_P(UnreadableInfoPlist, GivesABundleWithoutFactories) { EXPECT_EQ(FactoriesWith(Content()), 0); }
+
+TEST_P(UnreadableInfoPlist, IsSaidInOneLine)
 {
-    ASSERT_EQ(FactoriesWith(bundle.Info()), 2);
-    auto const [name, piece, replacement] = GetParam();
-    std::string const content = piece ? With(piece, replacement) : replacement;
+    bundle.WriteInfo(Content());
+    EXPECT_EQ(StderrOfOpening(bundle), CannotRead(bundle));
+}
+
+auto const NameOfInfo = [](auto const& fact) { return std::string(fact.param.name); };
+
+INSTANTIATE_TEST_SUITE_P(
+    Facts, UnreadableInfoPlist,
+    testing::Values(
+        CHANGED_INFO{"Nothing", nullptr, ""}, CHANGED_INFO{"PlainText", nullptr, "no property list"},
+        CHANGED_INFO{"OtherXml", nullptr, "<?xml version=\"1.0\"?><html><body/></html>"},
+        CHANGED_INFO{"BinaryMagicAlone", nullptr, "bplist00"},
+        CHANGED_INFO{"Array", nullptr, "<plist version=\"1.0\"><array><string>a</string></array></plist>"},
+        CHANGED_INFO{"Text", nullptr, "<plist version=\"1.0\"><string>CFBundleExecutable</string></plist>"},
+        CHANGED_INFO{"MismatchedTags", "</array>", "</dict>"}),
+    NameOfInfo);
+
+using InfoPlistWithoutFactories = InfoPlistWith;
+
+TEST_P(InfoPlistWithoutFactories, GivesABundleAndSaysNothing)
+{
+    bundle.WriteInfo(Content());
     testing::internal::CaptureStderr();
-    EXPECT_EQ(FactoriesWith(content), noBundle);
+    auto const plugIn = OpenPlugIn(bundle.Path());
+    EXPECT_TRUE(plugIn);
+    EXPECT_FALSE(FactoriesOf(plugIn, typeA));
     EXPECT_EQ(testing::internal::GetCapturedStderr(), "");
 }
 
 INSTANTIATE_TEST_SUITE_P(
-    Facts, InfoPlistWith,
-    testing::Values(
-        BAD_INFO{"Nothing", nullptr, ""}, BAD_INFO{"PlainText", nullptr, "no property list"},
-        BAD_INFO{"OtherXml", nullptr, "<?xml version=\"1.0\"?><html><body/></html>"},
-        BAD_INFO{"BinaryMagicAlone", nullptr, "bplist00"},
-        BAD_INFO{"Array", nullptr, "<plist version=\"1.0\"><array><string>a</string></array></plist>"},
-        BAD_INFO{"Text", nullptr, "<plist version=\"1.0\"><string>CFBundleExecutable</string></plist>"},
-        BAD_INFO{"EmptyDictionary", nullptr, "<plist version=\"1.0\"><dict/></plist>"},
-        BAD_INFO{"MismatchedTags", "</array>", "</dict>"},
-        BAD_INFO{"NoExecutable", "CFBundleExecutable", "CFBundleExecutables"},
-        BAD_INFO{"ExecutableNumber", "<string>Module</string>", "<integer>1</integer>"},
-        BAD_INFO{"ExecutableEmpty", "<string>Module</string>", "<string></string>"},
-        BAD_INFO{"ExecutableElsewhere", "<string>Module</string>", "<string>../Module</string>"},
-        BAD_INFO{"ExecutableTheFolder", "<string>Module</string>", "<string>.</string>"},
-        BAD_INFO{"ExecutableTheFolderAbove", "<string>Module</string>", "<string>..</string>"},
-        BAD_INFO{"NoFactories", "CFPlugInFactories", "CFPlugInFactory"},
-        BAD_INFO{"FactoriesText", "<key>CFPlugInFactories</key>",
-                 "<key>CFPlugInFactories</key><string>x</string><key>Other</key>"},
-        BAD_INFO{"NoTypes", "CFPlugInTypes", "CFPlugInType"},
-        BAD_INFO{"TypesArray", "<key>CFPlugInTypes</key>",
-                 "<key>CFPlugInTypes</key><array/><key>Other</key>"}),
-    [](auto const& fact) { return std::string(fact.param.name); });
+    Facts, InfoPlistWithoutFactories,
+    testing::Values(CHANGED_INFO{"EmptyDictionary", nullptr, "<plist version=\"1.0\"><dict/></plist>"},
+                    CHANGED_INFO{"NoFactories", "CFPlugInFactories", "CFPlugInFactory"},
+                    CHANGED_INFO{"FactoriesText", "<key>CFPlugInFactories</key>",
+                                 "<key>CFPlugInFactories</key><string>x</string><key>Other</key>"},
+                    CHANGED_INFO{"NoTypes", "CFPlugInTypes", "CFPlugInType"},
+                    CHANGED_INFO{"TypesArray", "<key>CFPlugInTypes</key>",
+                                 "<key>CFPlugInTypes</key><array/><key>Other</key>"}),
+    NameOfInfo);
 
 TEST_F(InfoPlist, OfTheLargestSize_IsRead)
 {
     std::string const good = bundle.Info();
     std::string const padding(64UL * 1024 - good.size(), ' ');
     EXPECT_EQ(FactoriesWith(good + padding), 2);
-    EXPECT_EQ(FactoriesWith(good + padding + " "), noBundle);
+    EXPECT_EQ(FactoriesWith(good + padding + " "), 0);
 }
 
-TEST_F(InfoPlist, DeeplyNested_IsNoBundle)
+TEST_F(InfoPlist, DeeplyNested_GivesNoFactories)
 {
     std::string nested;
     while (nested.size() < 60000)
         nested += "<array>";
-    EXPECT_EQ(FactoriesWith("<plist version=\"1.0\">" + nested), noBundle);
+    EXPECT_EQ(FactoriesWith("<plist version=\"1.0\">" + nested), 0);
 }
 
-TEST_F(InfoPlist, CutBeforeItsDictionaryEnds_IsNoBundle)
+TEST_F(InfoPlist, CutBeforeItsDictionaryEnds_GivesNoFactories)
 {
     std::string const good = bundle.Info();
     std::size_t const end = good.rfind("</dict>") + std::string("</dict>").size();
     ASSERT_EQ(FactoriesWith(good.substr(0, end)), 2);
     for (std::size_t size = 0; size < end; ++size)
-        ASSERT_EQ(FactoriesWith(good.substr(0, size)), noBundle) << size;
+        ASSERT_EQ(FactoriesWith(good.substr(0, size)), 0) << size;
 }
 
-TEST_F(InfoPlist, BinaryCutAtAnyByte_IsNoBundle)
+TEST_F(InfoPlist, BinaryCutAtAnyByte_GivesNoFactories)
 {
     std::string const good = BinaryOf(bundle.Info());
     for (std::size_t size = 0; size < good.size(); ++size)
-        ASSERT_EQ(FactoriesWith(good.substr(0, size)), noBundle) << size;
+        ASSERT_EQ(FactoriesWith(good.substr(0, size)), 0) << size;
 }
 
 // A changed bit may leave a sound bundle behind, but never one with more than there was.

@@ -148,6 +148,17 @@ TEST_F(Loading, BundleWithoutAFactoryOfTheType_PrintsOneLine)
     EXPECT_EQ(StderrOfAManager(), NoInterface);
 }
 
+TEST_F(Loading, FolderWithoutInfoPlist_IsOpenedAndHasNoFactory)
+{
+    TemporaryFolder const other;
+    BundleOnDisk const bundle = EmptyBundle(other.Path());
+    std::filesystem::remove(bundle.InfoFile());
+    LookIn(other.Path());
+    EXPECT_THAT(StderrOfAManager(),
+                testing::MatchesRegex("CoreFoundation: .*: cannot read its Info.plist[^\n]*\n" +
+                                      std::string(NoInterface)));
+}
+
 TEST_F(Loading, NoInterface_IsAFailedLoadAndTheInstanceIsReleasedAllTheSame)
 {
     module.givesInterface = false;

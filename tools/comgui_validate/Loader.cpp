@@ -1,6 +1,8 @@
 #include "tools/comgui_validate/Loader.h"
 
 #include <cstring>
+#include <filesystem>
+#include <system_error>
 #include <type_traits>
 
 namespace validate
@@ -41,6 +43,9 @@ Loader::Loader(std::string const& folder)
              : nullptr);
     if (url)
         m_plugIn = CFPlugInCreate(kCFAllocatorDefault, url.get());
+    // Any folder can be opened, but only one with a property list is a bundle.
+    std::error_code error;
+    m_hasInfo = std::filesystem::is_regular_file(folder + "/Contents/Info.plist", error);
 }
 
 bool Loader::HasFactory() const

@@ -17,7 +17,7 @@ public:
     Loader& operator=(Loader const&) = delete;
 
     // Each needs those before it, and is true if the library could go on after it.
-    bool HasInfo() const { return m_plugIn; }
+    bool HasInfo() const { return m_plugIn && m_hasInfo; }
     bool HasFactory() const;
     bool MakeInstance();
     bool HasTable() const;
@@ -30,6 +30,7 @@ public:
 
 private:
     CFPlugInRef m_plugIn = nullptr;
+    bool m_hasInfo = false;
     void* m_instance = nullptr;
     void* m_found = nullptr;
 };

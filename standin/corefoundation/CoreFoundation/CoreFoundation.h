@@ -64,10 +64,12 @@ CF_EXPORT CFUUIDBytes CFUUIDGetUUIDBytes(CFUUIDRef uuid);
 CF_EXPORT CFIndex CFArrayGetCount(CFArrayRef array);
 CF_EXPORT void const* CFArrayGetValueAtIndex(CFArrayRef array, CFIndex index);
 
-// Opens the bundle at that URL: a folder whose Contents/Info.plist (XML or binary, at most 64 KiB) has
-// CFBundleExecutable, a plain file name, and the dictionaries CFPlugInFactories and CFPlugInTypes. Null if it
-// is none. The executable, Contents/Linux/<CFBundleExecutable>, is loaded when a factory is first called, and
-// then stays loaded to the end of the process. Releasing the plug-in takes its factories away.
+// Opens the bundle at that URL, which may be any folder; null if there is none. Its Contents/Info.plist (XML
+// or binary, at most 64 KiB) has the dictionaries CFPlugInFactories and CFPlugInTypes. Without them the
+// plug-in has no factories; an Info.plist that cannot be read is reported by a line on stderr, too. The
+// executable is Contents/Linux/<CFBundleExecutable>, or without that text the folder's name less its
+// extension. It is loaded when a factory is first called, and then stays loaded to the end of the process.
+// Releasing the plug-in takes its factories away.
 CF_EXPORT CFPlugInRef CFPlugInCreate(CFAllocatorRef allocator, CFURLRef bundleURL);
 
 // The plug-in's factories for that type, as CFUUIDRef in the order of its Info.plist; null if it has none. A

@@ -52,7 +52,8 @@ void Need(bool isThere, char const* check)
 void InfoPlist(Trial& trial)
 {
     trial.Calling("CFPlugInCreate(" + Quoted(trial.GetOptions().bundle) + ")");
-    trial.Expect("L1", Loader(trial.GetOptions().bundle).HasInfo(), "null", "a bundle");
+    trial.Expect("L1", Loader(trial.GetOptions().bundle).HasInfo(), "no bundle",
+                 "a folder with Contents/Info.plist");
 }
 
 void Factory(Trial& trial)
