@@ -1,11 +1,8 @@
 #include "standin/corefoundation/BundleInfo.h"
 
+#include "standin/corefoundation/PropertyList.h"
 #include <cstdlib>
-#include <fstream>
 #include <memory>
-#include <plist/plist.h>
-#include <system_error>
-#include <type_traits>
 #include <utility>
 
 namespace comgui::detail
@@ -14,46 +11,12 @@ namespace
 {
 namespace fs = std::filesystem;
 
-// Far above any real Info.plist, and so low that the property list library, which recurses, cannot exhaust
-// the stack by a deeply nested one.
-constexpr std::uintmax_t largestInfo = 64UL * 1024;
-
-struct PlistFree
-{
-    void operator()(plist_t node) const { plist_free(node); }
-};
-using Plist = std::unique_ptr<std::remove_pointer_t<plist_t>, PlistFree>;
-
 struct MallocFree
 {
     void operator()(void* block) const { std::free(block); }
 };
 template <class T>
 using Malloced = std::unique_ptr<T, MallocFree>;
-
-// The content of the file, the empty text if there is none that can be an Info.plist.
-std::string ReadInfoFile(fs::path const& file)
-{
-    std::error_code error;
-    if (!fs::is_regular_file(file, error))  // a pipe would block
-        return {};
-    std::ifstream stream(file, std::ios::binary);
-    std::string content(largestInfo + 1, '\0');
-    stream.read(content.data(), static_cast<std::streamsize>(content.size()));
-    content.resize(static_cast<std::size_t>(stream.gcount()));
-    return content.size() > largestInfo ? std::string() : content;
-}
-
-Plist ParsePlist(std::string const& content)
-{
-    auto const size = static_cast<uint32_t>(content.size());
-    plist_t root = nullptr;
-    if (plist_is_binary(content.data(), size))
-        plist_from_bin(content.data(), size, &root);
-    else
-        plist_from_xml(content.data(), size, &root);
-    return Plist(root);
-}
 
 std::optional<std::string> TextOf(plist_t node)
 {
@@ -84,21 +47,30 @@ void ForEachUuid(plist_t dictionary, VISIT visit)
     }
 }
 
-std::vector<Uuid> UuidsOf(plist_t array)
+// Of an array of texts, or of a single text.
+std::vector<Uuid> UuidsOf(plist_t value)
 {
     std::vector<Uuid> uuids;
+    auto const add = [&](plist_t item)
+    {
+        if (auto const uuid = ParseUuid(TextOf(item).value_or("")))
+            uuids.push_back(*uuid);
+    };
+    if (plist_get_node_type(value) != PLIST_ARRAY)
+    {
+        add(value);
+        return uuids;
+    }
     plist_array_iter raw = nullptr;
-    plist_array_new_iter(array, &raw);
+    plist_array_new_iter(value, &raw);
     Malloced<void> const iterator(raw);
     for (;;)
     {
         plist_t item = nullptr;
-        plist_array_next_item(array, iterator.get(), &item);
+        plist_array_next_item(value, iterator.get(), &item);
         if (item == nullptr)
             return uuids;
-        auto const text = TextOf(item);
-        if (auto const uuid = ParseUuid(text.value_or("")))
-            uuids.push_back(*uuid);
+        add(item);
     }
 }
 
@@ -145,8 +117,6 @@ std::map<Uuid, std::vector<Uuid>> FactoriesOf(plist_t root, std::map<Uuid, std::
         ForEachUuid(entries,
                     [&](Uuid const& type, plist_t value)
                     {
-                        if (plist_get_node_type(value) != PLIST_ARRAY)
-                            return;
                         auto uuids = UuidsOf(value);
                         std::erase_if(uuids, [&](Uuid const& uuid) { return !functions.contains(uuid); });
                         factories.emplace(type, std::move(uuids));
@@ -158,7 +128,7 @@ std::map<Uuid, std::vector<Uuid>> FactoriesOf(plist_t root, std::map<Uuid, std::
 
 std::optional<BundleInfo> ReadBundleInfo(fs::path const& bundle)
 {
-    Plist const root = ParsePlist(ReadInfoFile(bundle / "Contents" / "Info.plist"));
+    Plist const root = ReadPropertyList(bundle / "Contents" / "Info.plist");
     if (!IsDictionary(root.get()))
         return std::nullopt;
     BundleInfo info;

@@ -15,6 +15,7 @@
 using comgui::detail::BundleInfo;
 using comgui::detail::CountedObject;
 using comgui::detail::Owned;
+using comgui::detail::ProgramError;
 using comgui::detail::Uuid;
 
 namespace
@@ -143,7 +144,7 @@ void* __CFBundle::Executable()
 CFPlugInRef CFPlugInCreate(CFAllocatorRef, CFURLRef bundleURL)
 {
     if (bundleURL == nullptr)
-        return nullptr;
+        ProgramError("CFPlugInCreate of a null URL");
     fs::path const& path = bundleURL->path;
     std::error_code error;
     if (!fs::is_directory(path, error))
@@ -161,7 +162,9 @@ CFPlugInRef CFPlugInCreate(CFAllocatorRef, CFURLRef bundleURL)
 
 CFArrayRef CFPlugInFindFactoriesForPlugInTypeInPlugIn(CFUUIDRef typeUUID, CFPlugInRef plugIn)
 {
-    if (typeUUID == nullptr || plugIn == nullptr)
+    if (typeUUID == nullptr)
+        ProgramError("CFPlugInFindFactoriesForPlugInTypeInPlugIn of a null type");
+    if (plugIn == nullptr)
         return nullptr;
     auto const factories = plugIn->FactoriesOf(typeUUID->bytes);
     if (factories.empty())
@@ -174,8 +177,10 @@ CFArrayRef CFPlugInFindFactoriesForPlugInTypeInPlugIn(CFUUIDRef typeUUID, CFPlug
 
 void* CFPlugInInstanceCreate(CFAllocatorRef allocator, CFUUIDRef factoryUUID, CFUUIDRef typeUUID)
 {
-    if (factoryUUID == nullptr || typeUUID == nullptr)
-        return nullptr;
+    if (factoryUUID == nullptr)
+        ProgramError("CFPlugInInstanceCreate of a null factory");
+    if (typeUUID == nullptr)
+        ProgramError("CFPlugInInstanceCreate of a null type");
     auto const bundle = OpenBundles::Get().WithFactory(factoryUUID->bytes);
     if (!bundle)
         return nullptr;

@@ -5,7 +5,9 @@
 
 CFURLRef CFURLCreateWithFileSystemPath(CFAllocatorRef, CFStringRef path, CFURLPathStyle style, Boolean)
 {
-    if (path == nullptr || path->text.empty() || style != kCFURLPOSIXPathStyle)
+    if (path == nullptr)
+        comgui::detail::ProgramError("CFURLCreateWithFileSystemPath of a null path");
+    if (path->text.empty() || style != kCFURLPOSIXPathStyle)
         return nullptr;
     // Made full now: the URL keeps its meaning when the current folder changes.
     std::error_code error;

@@ -63,7 +63,13 @@ protected:
     TemporaryFolder const folder;
 };
 
-TEST_F(CFPlugIn, Create_NullURL_IsNull) { EXPECT_EQ(CFPlugInCreate(kCFAllocatorDefault, nullptr), nullptr); }
+// What only the stand-in promises.
+using CFPlugInOfStandIn = CFPlugIn;
+
+TEST_F(CFPlugInOfStandIn, Create_NullURL_EndsTheProgram)
+{
+    EXPECT_DEATH(CFPlugInCreate(kCFAllocatorDefault, nullptr), "CFPlugInCreate of a null URL");
+}
 
 TEST_F(CFPlugIn, Create_PathThatDoesNotExist_IsNull) { EXPECT_FALSE(OpenPlugIn(folder.Path() / "Missing")); }
 
@@ -128,11 +134,16 @@ TEST_F(CFPlugIn, FindFactories_NoFactoryOfTheTypeHasAFunction_IsNull)
     EXPECT_FALSE(FactoriesOf(plugIn, typeB));
 }
 
-TEST_F(CFPlugIn, FindFactories_NullTypeOrPlugIn_IsNull)
+TEST_F(CFPlugIn, FindFactories_NullPlugIn_IsNull)
+{
+    EXPECT_EQ(CFPlugInFindFactoriesForPlugInTypeInPlugIn(MakeUUID(typeA).get(), nullptr), nullptr);
+}
+
+TEST_F(CFPlugInOfStandIn, FindFactories_NullType_EndsTheProgram)
 {
     auto const plugIn = OpenPlugIn(NewBundleWithFactory1("One").Path());
-    EXPECT_EQ(CFPlugInFindFactoriesForPlugInTypeInPlugIn(nullptr, plugIn.get()), nullptr);
-    EXPECT_EQ(CFPlugInFindFactoriesForPlugInTypeInPlugIn(MakeUUID(typeA).get(), nullptr), nullptr);
+    EXPECT_DEATH(CFPlugInFindFactoriesForPlugInTypeInPlugIn(nullptr, plugIn.get()),
+                 "CFPlugInFindFactoriesForPlugInTypeInPlugIn of a null type");
 }
 
 TEST_F(CFPlugIn, InstanceCreate_CallsTheFactoryWithAllocatorAndType)
@@ -159,7 +170,7 @@ TEST_F(CFPlugIn, InstanceCreate_EachTime_CallsTheFactoryAgain)
     EXPECT_EQ(static_cast<FACTORY_CALL const*>(first)->calls, 2);
 }
 
-TEST_F(CFPlugIn, InstanceCreate_FirstTime_LoadsTheExecutable)
+TEST_F(CFPlugInOfStandIn, InstanceCreate_FirstTime_LoadsTheExecutable)
 {
     BundleOnDisk const bundle = NewBundleWithFactory1("One");
     auto const plugIn = OpenPlugIn(bundle.Path());
@@ -169,7 +180,7 @@ TEST_F(CFPlugIn, InstanceCreate_FirstTime_LoadsTheExecutable)
     EXPECT_TRUE(IsLoaded(bundle.Executable()));
 }
 
-TEST_F(CFPlugIn, Release_LoadedExecutable_StaysLoaded)
+TEST_F(CFPlugInOfStandIn, Release_LoadedExecutable_StaysLoaded)
 {
     BundleOnDisk const bundle = NewBundleWithFactory1("One");
     auto plugIn = OpenPlugIn(bundle.Path());
@@ -238,11 +249,12 @@ TEST_F(CFPlugIn, InstanceCreate_PathWithASlashBehind_LoadsTheExecutableNamedLike
     EXPECT_EQ(MakerOf(MakeInstance(factory1, typeA)).filename(), "One");
 }
 
-class CFPlugInWithAPathAsExecutable : public CFPlugIn, public testing::WithParamInterface<char const*>
+class CFPlugInWithAPathAsExecutableOfStandIn : public CFPlugIn,
+                                               public testing::WithParamInterface<char const*>
 {
 };
 
-TEST_P(CFPlugInWithAPathAsExecutable, InstanceCreate_NamesBundleAndRemedy)
+TEST_P(CFPlugInWithAPathAsExecutableOfStandIn, InstanceCreate_NamesBundleAndRemedy)
 {
     BundleOnDisk bundle = NewBundleWithFactory1("One");
     bundle.SetExecutableName(GetParam());
@@ -252,7 +264,7 @@ TEST_P(CFPlugInWithAPathAsExecutable, InstanceCreate_NamesBundleAndRemedy)
                                              HasSubstr("CFBundleExecutable"), HasSubstr("; put")));
 }
 
-INSTANTIATE_TEST_SUITE_P(Paths, CFPlugInWithAPathAsExecutable,
+INSTANTIATE_TEST_SUITE_P(Paths, CFPlugInWithAPathAsExecutableOfStandIn,
                          testing::Values("../Linux/Module", "Sub/Module", "/Module", ".", ".."));
 
 TEST_F(CFPlugIn, InstanceCreate_FactoryThatRefuses_IsNullAndSilent)
@@ -264,7 +276,7 @@ TEST_F(CFPlugIn, InstanceCreate_FactoryThatRefuses_IsNullAndSilent)
     EXPECT_TRUE(IsLoaded(bundle.Executable()));
 }
 
-TEST_F(CFPlugIn, InstanceCreate_UnknownFactory_IsNullAndSilent)
+TEST_F(CFPlugInOfStandIn, InstanceCreate_UnknownFactory_IsNullAndSilent)
 {
     auto const plugIn = OpenPlugIn(NewBundleWithFactory1("One").Path());
     EXPECT_THAT(ComplaintOf(factory2), IsEmpty());
@@ -288,16 +300,18 @@ TEST_F(CFPlugIn, InstanceCreate_FactoryOfTwoTypes_ServesBoth)
     EXPECT_NE(MakeInstance(factory1, typeB), nullptr);
 }
 
-TEST_F(CFPlugIn, InstanceCreate_NullFactoryOrType_IsNull)
+TEST_F(CFPlugInOfStandIn, InstanceCreate_NullFactoryOrType_EndsTheProgram)
 {
     auto const plugIn = OpenPlugIn(NewBundleWithFactory1("One").Path());
     auto const factory = MakeUUID(factory1);
     auto const type = MakeUUID(typeA);
-    EXPECT_EQ(CFPlugInInstanceCreate(kCFAllocatorDefault, nullptr, type.get()), nullptr);
-    EXPECT_EQ(CFPlugInInstanceCreate(kCFAllocatorDefault, factory.get(), nullptr), nullptr);
+    EXPECT_DEATH(CFPlugInInstanceCreate(kCFAllocatorDefault, nullptr, type.get()),
+                 "CFPlugInInstanceCreate of a null factory");
+    EXPECT_DEATH(CFPlugInInstanceCreate(kCFAllocatorDefault, factory.get(), nullptr),
+                 "CFPlugInInstanceCreate of a null type");
 }
 
-TEST_F(CFPlugIn, InstanceCreate_MissingExecutable_NamesBundleReasonAndRemedy)
+TEST_F(CFPlugInOfStandIn, InstanceCreate_MissingExecutable_NamesBundleReasonAndRemedy)
 {
     BundleOnDisk bundle(folder.Path(), "One");
     bundle.AddFactory(typeA, factory1, "RecordingFactory");
@@ -307,7 +321,7 @@ TEST_F(CFPlugIn, InstanceCreate_MissingExecutable_NamesBundleReasonAndRemedy)
                       HasSubstr("; put the shared object that CFBundleExecutable")));
 }
 
-TEST_F(CFPlugIn, InstanceCreate_ExecutablePutInPlaceLater_IsLoadedThen)
+TEST_F(CFPlugInOfStandIn, InstanceCreate_ExecutablePutInPlaceLater_IsLoadedThen)
 {
     BundleOnDisk bundle(folder.Path(), "One");
     bundle.AddFactory(typeA, factory1, "RecordingFactory");
@@ -317,7 +331,7 @@ TEST_F(CFPlugIn, InstanceCreate_ExecutablePutInPlaceLater_IsLoadedThen)
     EXPECT_NE(MakeInstance(factory1, typeA), nullptr);
 }
 
-TEST_F(CFPlugIn, InstanceCreate_ExecutableThatIsNoSharedObject_NamesBundleAndReason)
+TEST_F(CFPlugInOfStandIn, InstanceCreate_ExecutableThatIsNoSharedObject_NamesBundleAndReason)
 {
     BundleOnDisk bundle(folder.Path(), "One");
     bundle.AddFactory(typeA, factory1, "RecordingFactory");
@@ -327,7 +341,7 @@ TEST_F(CFPlugIn, InstanceCreate_ExecutableThatIsNoSharedObject_NamesBundleAndRea
                 AllOf(HasSubstr(bundle.Path().string() + ": cannot load"), HasSubstr(": file too short")));
 }
 
-TEST_F(CFPlugIn, InstanceCreate_MissingFunction_NamesBundleFunctionAndRemedy)
+TEST_F(CFPlugInOfStandIn, InstanceCreate_MissingFunction_NamesBundleFunctionAndRemedy)
 {
     BundleOnDisk bundle = NewBundle("One");
     bundle.AddFactory(typeA, factory1, "NoSuchFactory");
@@ -337,7 +351,7 @@ TEST_F(CFPlugIn, InstanceCreate_MissingFunction_NamesBundleFunctionAndRemedy)
                       HasSubstr("undefined symbol: NoSuchFactory"), HasSubstr("; export it with C linkage")));
 }
 
-TEST_F(CFPlugIn, Complaint_IsOneLine)
+TEST_F(CFPlugInOfStandIn, Complaint_IsOneLine)
 {
     BundleOnDisk bundle(folder.Path(), "One");
     bundle.AddFactory(typeA, factory1, "RecordingFactory");
@@ -347,7 +361,7 @@ TEST_F(CFPlugIn, Complaint_IsOneLine)
     EXPECT_EQ(text.find('\n'), text.size() - 1);
 }
 
-TEST_F(CFPlugIn, TwoBundlesWithOneFactory_TheLastOpenedServes)
+TEST_F(CFPlugInOfStandIn, TwoBundlesWithOneFactory_TheLastOpenedServes)
 {
     BundleOnDisk const one = NewBundleWithFactory1("One");
     BundleOnDisk const two = NewBundleWithFactory1("Two");
@@ -356,7 +370,7 @@ TEST_F(CFPlugIn, TwoBundlesWithOneFactory_TheLastOpenedServes)
     EXPECT_EQ(MakerOf(MakeInstance(factory1, typeA)), one.Executable());
 }
 
-TEST_F(CFPlugIn, TwoBundlesWithOneFactory_LastClosed_TheEarlierServesAgain)
+TEST_F(CFPlugInOfStandIn, TwoBundlesWithOneFactory_LastClosed_TheEarlierServesAgain)
 {
     BundleOnDisk const one = NewBundleWithFactory1("One");
     BundleOnDisk const two = NewBundleWithFactory1("Two");
@@ -367,7 +381,7 @@ TEST_F(CFPlugIn, TwoBundlesWithOneFactory_LastClosed_TheEarlierServesAgain)
     EXPECT_EQ(MakerOf(MakeInstance(factory1, typeA)), one.Executable());
 }
 
-TEST_F(CFPlugIn, TwoBundlesWithOneFactory_LastWithoutExecutable_TheEarlierDoesNotStepIn)
+TEST_F(CFPlugInOfStandIn, TwoBundlesWithOneFactory_LastWithoutExecutable_TheEarlierDoesNotStepIn)
 {
     BundleOnDisk const one = NewBundleWithFactory1("One");
     BundleOnDisk two(folder.Path(), "Two");
@@ -377,7 +391,7 @@ TEST_F(CFPlugIn, TwoBundlesWithOneFactory_LastWithoutExecutable_TheEarlierDoesNo
     EXPECT_THAT(ComplaintOf(factory1), HasSubstr(two.Path().string()));
 }
 
-TEST_F(CFPlugIn, ClosedBundle_ServesNoMore)
+TEST_F(CFPlugInOfStandIn, ClosedBundle_ServesNoMore)
 {
     auto plugIn = OpenPlugIn(NewBundleWithFactory1("One").Path());
     ASSERT_NE(MakeInstance(factory1, typeA), nullptr);
@@ -385,7 +399,7 @@ TEST_F(CFPlugIn, ClosedBundle_ServesNoMore)
     EXPECT_EQ(MakeInstance(factory1, typeA), nullptr);
 }
 
-TEST_F(CFPlugIn, RetainedBundle_ServesUntilTheLastRelease)
+TEST_F(CFPlugInOfStandIn, RetainedBundle_ServesUntilTheLastRelease)
 {
     auto plugIn = OpenPlugIn(NewBundleWithFactory1("One").Path());
     Held<CFTypeRef> second(CFRetain(plugIn.get()));
@@ -395,7 +409,7 @@ TEST_F(CFPlugIn, RetainedBundle_ServesUntilTheLastRelease)
     EXPECT_EQ(MakeInstance(factory1, typeA), nullptr);
 }
 
-TEST_F(CFPlugIn, BundleOpenedTwice_ServesUntilBothAreClosed)
+TEST_F(CFPlugInOfStandIn, BundleOpenedTwice_ServesUntilBothAreClosed)
 {
     BundleOnDisk const bundle = NewBundleWithFactory1("One");
     auto first = OpenPlugIn(bundle.Path());
@@ -407,7 +421,7 @@ TEST_F(CFPlugIn, BundleOpenedTwice_ServesUntilBothAreClosed)
 }
 
 #ifdef COMGUI_LEAK_CHECK
-TEST_F(CFPlugIn, NeverClosed_IsNoLeak)
+TEST_F(CFPlugInOfStandIn, NeverClosed_IsNoLeak)
 {
     BundleOnDisk bundle = NewBundle("One");
     bundle.AddFactory(typeA, factory3, "RecordingFactory");

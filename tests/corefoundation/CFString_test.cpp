@@ -41,12 +41,13 @@ INSTANTIATE_TEST_SUITE_P(
         UTF8_FACT{"BadAfterGood", "gr\xC3\xBC\xC3\x9F\x65\xFE", false}),
     [](auto const& fact) { return std::string(fact.param.name); });
 
-TEST(CFStringCreateWithCString, NullText_IsNull)
+TEST(CFStringCreateWithCStringOfStandIn, NullText_EndsTheProgram)
 {
-    EXPECT_EQ(CFStringCreateWithCString(kCFAllocatorDefault, nullptr, kCFStringEncodingUTF8), nullptr);
+    EXPECT_DEATH(CFStringCreateWithCString(kCFAllocatorDefault, nullptr, kCFStringEncodingUTF8),
+                 "CFStringCreateWithCString of a null text");
 }
 
-TEST(CFStringCreateWithCString, OtherEncoding_IsNull)
+TEST(CFStringCreateWithCStringOfStandIn, OtherEncoding_IsNull)
 {
     CFStringEncoding const latin1 = 0x0201;
     EXPECT_EQ(CFStringCreateWithCString(kCFAllocatorDefault, "plain", latin1), nullptr);

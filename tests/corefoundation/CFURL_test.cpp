@@ -6,15 +6,15 @@
 
 namespace
 {
-TEST(CFURLCreateWithFileSystemPath, NullPath_IsNull)
+TEST(CFURLCreateWithFileSystemPathOfStandIn, NullPath_EndsTheProgram)
 {
-    EXPECT_EQ(CFURLCreateWithFileSystemPath(kCFAllocatorDefault, nullptr, kCFURLPOSIXPathStyle, true),
-              nullptr);
+    EXPECT_DEATH(CFURLCreateWithFileSystemPath(kCFAllocatorDefault, nullptr, kCFURLPOSIXPathStyle, true),
+                 "CFURLCreateWithFileSystemPath of a null path");
 }
 
 TEST(CFURLCreateWithFileSystemPath, EmptyPath_IsNull) { EXPECT_FALSE(MakeURL("")); }
 
-TEST(CFURLCreateWithFileSystemPath, OtherPathStyle_IsNull)
+TEST(CFURLCreateWithFileSystemPathOfStandIn, OtherPathStyle_IsNull)
 {
     CFURLPathStyle const windows = 2;
     auto const path = MakeString("/tmp");

@@ -38,7 +38,7 @@ TEST(CFUUIDGetUUIDBytes, SmallLetters_MeanTheSame)
               "0123456789ABCDEF0123456789ABCDEF");
 }
 
-TEST(CFUUIDGetUUIDBytes, NullUUID_EndsTheProgram)
+TEST(CFUUIDGetUUIDBytesOfStandIn, NullUUID_EndsTheProgram)
 {
     EXPECT_DEATH(CFUUIDGetUUIDBytes(nullptr), "CFUUIDGetUUIDBytes of a null reference");
 }

@@ -56,6 +56,10 @@ protected:
     BundleOnDisk bundle{folder.Path()};
 };
 
+// What only the stand-in promises: to read the file anew each time, how it is said that it cannot be read,
+// and where it gives up.
+using InfoPlistOfStandIn = InfoPlist;
+
 TEST_F(InfoPlist, Xml_IsRead) { EXPECT_EQ(FactoriesWith(bundle.Info()), 2); }
 
 TEST_F(InfoPlist, Binary_IsRead)
@@ -86,7 +90,16 @@ TEST_F(InfoPlist, TypeWithMalformedUUID_IsLeftOut)
     EXPECT_EQ(FactoriesWith(With(std::string("<key>") + typeA, "<key>type A")), 0);
 }
 
-TEST_F(InfoPlist, TypeThatIsNoArray_IsLeftOut)
+TEST_F(InfoPlist, TypeWithASingleText_HasThatFactory)
+{
+    std::string text = With("<array>", "");
+    for (std::string const& piece :
+         {std::string("</array>"), "<string>" + std::string(factory2) + "</string>"})
+        text.erase(text.find(piece), piece.size());
+    EXPECT_EQ(FactoriesWith(text), 1);
+}
+
+TEST_F(InfoPlist, TypeThatIsNeitherArrayNorText_IsLeftOut)
 {
     std::string text = With("<array>", "<dict><key>factories</key><array>");
     text.replace(text.find("</array>"), 8, "</array></dict>");
@@ -127,22 +140,22 @@ std::string CannotRead(BundleOnDisk const& bundle)
            "put a property list, XML or binary, into Contents/Info.plist\n";
 }
 
-TEST_F(InfoPlist, Good_OpensSilently) { EXPECT_EQ(StderrOfOpening(bundle), ""); }
+TEST_F(InfoPlistOfStandIn, Good_OpensSilently) { EXPECT_EQ(StderrOfOpening(bundle), ""); }
 
-TEST_F(InfoPlist, MissingFile_IsSaidInOneLine)
+TEST_F(InfoPlistOfStandIn, MissingFile_IsSaidInOneLine)
 {
     std::filesystem::remove(bundle.InfoFile());
     EXPECT_EQ(StderrOfOpening(bundle), CannotRead(bundle));
 }
 
-TEST_F(InfoPlist, FolderOfThatName_IsSaidInOneLine)
+TEST_F(InfoPlistOfStandIn, FolderOfThatName_IsSaidInOneLine)
 {
     std::filesystem::remove(bundle.InfoFile());
     std::filesystem::create_directory(bundle.InfoFile());
     EXPECT_EQ(StderrOfOpening(bundle), CannotRead(bundle));
 }
 
-TEST_F(InfoPlist, PipeOfThatName_DoesNotBlockAndIsSaidInOneLine)
+TEST_F(InfoPlistOfStandIn, PipeOfThatName_DoesNotBlockAndIsSaidInOneLine)
 {
     std::filesystem::remove(bundle.InfoFile());
     ASSERT_EQ(mkfifo(bundle.InfoFile().c_str(), 0600), 0);
@@ -170,7 +183,9 @@ using UnreadableInfoPlist = InfoPlistWith;
 
 TEST_P(UnreadableInfoPlist, GivesABundleWithoutFactories) { EXPECT_EQ(FactoriesWith(Content()), 0); }
 
-TEST_P(UnreadableInfoPlist, IsSaidInOneLine)
+using UnreadableInfoPlistOfStandIn = InfoPlistWith;
+
+TEST_P(UnreadableInfoPlistOfStandIn, IsSaidInOneLine)
 {
     bundle.WriteInfo(Content());
     EXPECT_EQ(StderrOfOpening(bundle), CannotRead(bundle));
@@ -178,16 +193,21 @@ TEST_P(UnreadableInfoPlist, IsSaidInOneLine)
 
 auto const NameOfInfo = [](auto const& fact) { return std::string(fact.param.name); };
 
-INSTANTIATE_TEST_SUITE_P(
-    Facts, UnreadableInfoPlist,
-    testing::Values(
-        CHANGED_INFO{"Nothing", nullptr, ""}, CHANGED_INFO{"PlainText", nullptr, "no property list"},
-        CHANGED_INFO{"OtherXml", nullptr, "<?xml version=\"1.0\"?><html><body/></html>"},
-        CHANGED_INFO{"BinaryMagicAlone", nullptr, "bplist00"},
-        CHANGED_INFO{"Array", nullptr, "<plist version=\"1.0\"><array><string>a</string></array></plist>"},
-        CHANGED_INFO{"Text", nullptr, "<plist version=\"1.0\"><string>CFBundleExecutable</string></plist>"},
-        CHANGED_INFO{"MismatchedTags", "</array>", "</dict>"}),
-    NameOfInfo);
+auto const unreadable = testing::Values(
+    CHANGED_INFO{"Nothing", nullptr, ""}, CHANGED_INFO{"PlainText", nullptr, "no property list"},
+    CHANGED_INFO{"OtherXml", nullptr, "<?xml version=\"1.0\"?><html><body/></html>"},
+    CHANGED_INFO{"BinaryMagicAlone", nullptr, "bplist00"},
+    CHANGED_INFO{"Array", nullptr, "<plist version=\"1.0\"><array><string>a</string></array></plist>"},
+    CHANGED_INFO{"Text", nullptr, "<plist version=\"1.0\"><string>CFBundleExecutable</string></plist>"},
+    CHANGED_INFO{"MismatchedTags", "</array>", "</dict>"},
+    CHANGED_INFO{"CutBehindItsDictionary", "</plist>", ""},
+    CHANGED_INFO{"BadDate", "<dict>", "<dict><key>Since</key><date>yesterday</date>"},
+    CHANGED_INFO{"DateWithoutATime", "<dict>", "<dict><key>Since</key><date>2026-11-23</date>"},
+    CHANGED_INFO{"DateDeepInside", "<dict>", "<dict><key>A</key><array><array><date/></array></array>"},
+    CHANGED_INFO{"Latin1", "<dict>", "<dict><key>Name</key><string>gr\xFCn</string>"});
+
+INSTANTIATE_TEST_SUITE_P(Facts, UnreadableInfoPlist, unreadable, NameOfInfo);
+INSTANTIATE_TEST_SUITE_P(Facts, UnreadableInfoPlistOfStandIn, unreadable, NameOfInfo);
 
 using InfoPlistWithoutFactories = InfoPlistWith;
 
@@ -212,15 +232,94 @@ INSTANTIATE_TEST_SUITE_P(
                                  "<key>CFPlugInTypes</key><array/><key>Other</key>"}),
     NameOfInfo);
 
-TEST_F(InfoPlist, OfTheLargestSize_IsRead)
+TEST_F(InfoPlist, WithAByteOrderMark_IsRead) { EXPECT_EQ(FactoriesWith("\xEF\xBB\xBF" + bundle.Info()), 2); }
+
+TEST_F(InfoPlist, GoodDate_IsOverlooked)
+{
+    EXPECT_EQ(FactoriesWith(With("<dict>", "<dict><key>Since</key><date>2026-11-23T08:17:26Z</date>")), 2);
+}
+
+TEST_F(InfoPlist, OtherLettersThanAscii_AreRead)
+{
+    EXPECT_EQ(FactoriesWith(With("<dict>", "<dict><key>Name</key><string>gr\xC3\xBCn</string>")), 2);
+}
+
+TEST_F(InfoPlist, Large_IsRead)
+{
+    std::string const padding(1UL << 20, ' ');
+    EXPECT_EQ(FactoriesWith(With("<dict>", "<dict><key>Name</key><string>" + padding + "</string>")), 2);
+}
+
+TEST_F(InfoPlist, LargeBinary_IsRead)
+{
+    std::string const padding(1UL << 20, 'x');
+    EXPECT_EQ(
+        FactoriesWith(BinaryOf(With("<dict>", "<dict><key>Name</key><string>" + padding + "</string>"))), 2);
+}
+
+TEST_F(InfoPlistOfStandIn, Above16MiB_GivesNoFactories)
 {
     std::string const good = bundle.Info();
-    std::string const padding(64UL * 1024 - good.size(), ' ');
+    std::string const padding(16UL * 1024 * 1024 - good.size(), ' ');
     EXPECT_EQ(FactoriesWith(good + padding), 2);
     EXPECT_EQ(FactoriesWith(good + padding + " "), 0);
 }
 
-TEST_F(InfoPlist, DeeplyNested_GivesNoFactories)
+std::string Nested(int depth, std::string const& inside)
+{
+    std::string text;
+    for (int i = 0; i < depth; ++i)
+        text += "<array>";
+    text += inside;
+    for (int i = 0; i < depth; ++i)
+        text += "</array>";
+    return text;
+}
+
+TEST_F(InfoPlist, NestedAsMuchAsAnybodyNests_IsRead)
+{
+    EXPECT_EQ(FactoriesWith(With("<dict>", "<dict><key>Name</key>" + Nested(100, ""))), 2);
+}
+
+TEST_F(InfoPlistOfStandIn, NestedTooDeeply_GivesNoFactories)
+{
+    EXPECT_EQ(FactoriesWith(With("<dict>", "<dict><key>Name</key>" + Nested(100'000, ""))), 0);
+}
+
+// Each array of a binary property list names the next by its number.
+std::string NestedBinary(std::uint64_t objects)
+{
+    std::string text = "bplist00";
+    std::string offsets;
+    auto const put = [](std::string& where, std::uint64_t number, int bytes)
+    {
+        while (bytes-- > 0)
+            where += static_cast<char>(number >> 8 * bytes);
+    };
+    for (std::uint64_t i = 0; i < objects; ++i)
+    {
+        put(offsets, text.size(), 4);
+        text += i + 1 < objects ? '\xA1' : '\xA0';  // an array with one element, or none
+        if (i + 1 < objects)
+            put(text, i + 1, 4);
+    }
+    std::uint64_t const table = text.size();
+    text += offsets;
+    put(text, 0, 6);
+    put(text, 0x0404, 2);  // bytes of an offset, of a number
+    put(text, objects, 8);
+    put(text, 0, 8);  // the outermost one
+    put(text, table, 8);
+    return text;
+}
+
+TEST_F(InfoPlistOfStandIn, BinaryNestedTooDeeply_GivesNoFactories)
+{
+    EXPECT_EQ(FactoriesWith(NestedBinary(8192)), 0);  // still read, and no dictionary
+    EXPECT_EQ(FactoriesWith(NestedBinary(1'000'000)), 0);
+}
+
+TEST_F(InfoPlistOfStandIn, DeeplyNested_GivesNoFactories)
 {
     std::string nested;
     while (nested.size() < 60000)
@@ -228,16 +327,16 @@ TEST_F(InfoPlist, DeeplyNested_GivesNoFactories)
     EXPECT_EQ(FactoriesWith("<plist version=\"1.0\">" + nested), 0);
 }
 
-TEST_F(InfoPlist, CutBeforeItsDictionaryEnds_GivesNoFactories)
+TEST_F(InfoPlistOfStandIn, CutAnywhere_GivesNoFactories)
 {
     std::string const good = bundle.Info();
-    std::size_t const end = good.rfind("</dict>") + std::string("</dict>").size();
+    std::size_t const end = good.rfind("</plist>") + std::string("</plist>").size();
     ASSERT_EQ(FactoriesWith(good.substr(0, end)), 2);
     for (std::size_t size = 0; size < end; ++size)
         ASSERT_EQ(FactoriesWith(good.substr(0, size)), 0) << size;
 }
 
-TEST_F(InfoPlist, BinaryCutAtAnyByte_GivesNoFactories)
+TEST_F(InfoPlistOfStandIn, BinaryCutAtAnyByte_GivesNoFactories)
 {
     std::string const good = BinaryOf(bundle.Info());
     for (std::size_t size = 0; size < good.size(); ++size)
@@ -256,12 +355,12 @@ void ExpectNoMoreFactories(std::string const& good, std::function<CFIndex(std::s
     }
 }
 
-TEST_F(InfoPlist, AnyBitChanged_GivesNothingNew)
+TEST_F(InfoPlistOfStandIn, AnyBitChanged_GivesNothingNew)
 {
     ExpectNoMoreFactories(bundle.Info(), [this](auto const& content) { return FactoriesWith(content); });
 }
 
-TEST_F(InfoPlist, BinaryWithAnyBitChanged_GivesNothingNew)
+TEST_F(InfoPlistOfStandIn, BinaryWithAnyBitChanged_GivesNothingNew)
 {
     ExpectNoMoreFactories(BinaryOf(bundle.Info()),
                           [this](auto const& content) { return FactoriesWith(content); });

@@ -26,7 +26,11 @@ static Function* Next(char const* name)
     return reinterpret_cast<Function*>(dlsym(RTLD_NEXT, name));
 }
 
-CFStringRef CFStringCreateWithCString(CFAllocatorRef allocator, char const* text, CFStringEncoding encoding)
+// Seen by the libraries whatever the header and the compiler's options say about visibility.
+#define WATCHED extern "C" __attribute__((visibility("default")))
+
+WATCHED CFStringRef CFStringCreateWithCString(CFAllocatorRef allocator, char const* text,
+                                              CFStringEncoding encoding)
 {
     if (FailsNow(coreFoundationFailures.strings))
         return nullptr;
@@ -36,8 +40,8 @@ CFStringRef CFStringCreateWithCString(CFAllocatorRef allocator, char const* text
     return string;
 }
 
-CFURLRef CFURLCreateWithFileSystemPath(CFAllocatorRef allocator, CFStringRef path, CFURLPathStyle style,
-                                       Boolean isDirectory)
+WATCHED CFURLRef CFURLCreateWithFileSystemPath(CFAllocatorRef allocator, CFStringRef path,
+                                               CFURLPathStyle style, Boolean isDirectory)
 {
     if (FailsNow(coreFoundationFailures.urls))
         return nullptr;

@@ -1,8 +1,15 @@
 // The calls of CoreFoundation that open a plug-in, for systems that have no CoreFoundation: same names,
 // types and meaning, and no more than the library uses. What a Create function returns belongs to the
-// caller, who gives it back with CFRelease. Every failure is a null result; a null reference where an object
-// must be (CFRetain, CFRelease, the Get functions) and an index outside an array end the process. All calls
-// may come from any thread. The allocator is only handed through to a factory.
+// caller, who gives it back with CFRelease. Failures are null results; where the system's own would crash
+// on a null argument or an index outside an array, this one says so in one line and ends the process. All
+// calls may come from any thread. The allocator is only handed through to a factory.
+//
+// Where it is kinder than the system's own, on purpose; a client should rely on none of it:
+// - An Info.plist is read each time that its bundle is opened, so that a change is seen without a restart.
+// - An executable that cannot be loaded is looked for again with the next factory call.
+// - The last release of a plug-in takes its factories away. Its executable stays loaded.
+// - Of several open bundles with the same factory, the one opened last serves.
+// - What went wrong is said in one line on stderr, with a remedy.
 #pragma once
 
 #include <stdint.h>
@@ -37,7 +44,7 @@ enum
     kCFStringEncodingUTF8 = 0x08000100
 };
 
-// Null for a null text, for bytes that are no UTF-8, and for any other encoding.
+// Null for bytes that are no UTF-8, and for any other encoding.
 CF_EXPORT CFStringRef CFStringCreateWithCString(CFAllocatorRef allocator, char const* text,
                                                 CFStringEncoding encoding);
 
@@ -64,12 +71,13 @@ CF_EXPORT CFUUIDBytes CFUUIDGetUUIDBytes(CFUUIDRef uuid);
 CF_EXPORT CFIndex CFArrayGetCount(CFArrayRef array);
 CF_EXPORT void const* CFArrayGetValueAtIndex(CFArrayRef array, CFIndex index);
 
-// Opens the bundle at that URL, which may be any folder; null if there is none. Its Contents/Info.plist (XML
-// or binary, at most 64 KiB) has the dictionaries CFPlugInFactories and CFPlugInTypes. Without them the
-// plug-in has no factories; an Info.plist that cannot be read is reported by a line on stderr, too. The
-// executable is Contents/Linux/<CFBundleExecutable>, or without that text the folder's name less its
-// extension. It is loaded when a factory is first called, and then stays loaded to the end of the process.
-// Releasing the plug-in takes its factories away.
+// Opens the bundle at that URL, which may be any folder; null if there is none. Its Contents/Info.plist, XML
+// or binary, has the dictionaries CFPlugInFactories and CFPlugInTypes, of arrays of texts or single texts;
+// without them the plug-in has no factories. An Info.plist that cannot be read (none, no sound property
+// list, XML that is not UTF-8, more than 16 MiB, nested in more than 512 levels) is the same, with a line on
+// stderr. The executable is Contents/Linux/<CFBundleExecutable>, or without that text the folder's name less
+// its extension. It is loaded when a factory is first called, and then stays loaded to the end of the
+// process.
 CF_EXPORT CFPlugInRef CFPlugInCreate(CFAllocatorRef allocator, CFURLRef bundleURL);
 
 // The plug-in's factories for that type, as CFUUIDRef in the order of its Info.plist; null if it has none. A
