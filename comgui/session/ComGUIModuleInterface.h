@@ -1,7 +1,12 @@
 // What the plug-in offers: 44 words behind the interface pointer, of which ComGUIManager keeps a copy. They
-// begin with the four that every CFPlugIn has. hInstance comes from Open, hSession from the record that was
-// logged in. An entry without a word on its result gives 0 for success or a code of its own, and the host
-// gets to see that number. The library has nothing that would catch an exception.
+// begin with the four that every CFPlugIn has. The words never change, as some entries are called through the
+// copy and others through the plug-in's own table; none of those that have a name is null. hInstance comes
+// from Open, hSession from the record that was logged in; an entry that gets null or the handle of a session
+// that has ended fails. An entry without a word on its result gives 0 for success or a code of its own, and
+// the host gets to see that number. Records and texts stay the host's and are not kept beyond the call,
+// except for the TLogin, which stays where it is from InitializeEntry to the logout. Entries are called on
+// the host's thread, whichever that is. The library has nothing that would catch an exception.
+// docs/module-contract.md numbers these rules.
 #pragma once
 
 #include "comgui/session/STicketFactory.h"
@@ -27,45 +32,58 @@ struct ComGUIModuleInterface
 {
     void* _reserved;
 
-    // Puts the interface pointer (ComGUIModuleInterface**) for COMGUI_INTERFACE_UUID into *out, or leaves it.
+    // Puts the interface pointer (ComGUIModuleInterface**) for COMGUI_INTERFACE_UUID into *out, and for any
+    // other leaves it. The pointer holds a reference of its own: it outlives Release, to the end of the
+    // process.
     int (*QueryInterface)(void* instance, COMGUI_UUID interfaceId, void** out);
     unsigned int (*AddRef)(void* instance);   // never called here
     unsigned int (*Release)(void* instance);  // gives back what the factory made
 
-    // Makes the module's instance and stores its handle. The one entry without an instance argument.
+    // Makes the module's instance, stores its handle and gives 0. The one entry without an instance argument.
     int (*Open)(void** hInstance);
     void* reserved40;
 
-    // Makes the record ready for a login, and may fill in what it likes. stamp: as in iClientStamp.
+    // Makes the record ready for a login and leaves what the host has filled in. stamp: as in iClientStamp.
+    // After a logout the same record may come again.
     int (*InitializeEntry)(void* hInstance, TLogin* login, int stamp);
 
-    int (*IsAliveEntry)(void* hInstance, char const* host, int port);  // 0: a server answers there
+    // 0: a server answers there. Needs no record and no login.
+    int (*IsAliveEntry)(void* hInstance, char const* host, int port);
 
-    // Not a code but an IPv4 address, first octet in the top byte.
+    // Not a code but the IPv4 address by which this machine reaches that host, first octet in the top byte.
+    // Also called if no server has answered.
     unsigned int (*GetLocalAddressEntry)(void* hInstance, char const* host, int port);
 
-    // Makes a session of the record's user; hSession, iClientStamp, iUserRole and szLocalEndPoint tell of it.
+    // Makes a session of the record's user: stores hSession, iClientStamp (the id of the user's ticket),
+    // iUserRole (16: administrator) and szLocalEndPoint, and leaves the other fields. Sessions at once are
+    // not limited, not even for one user. A record that has not been initialised gets a code or a session.
     int (*LoginEntry)(void* hInstance, TLogin* login);
-    int (*LogoutEntry)(void* hInstance, void* hSession);       // the handle is worth nothing afterwards
+
+    // Ends that session alone. The handle is worth nothing afterwards, and no callback of the session begins.
+    int (*LogoutEntry)(void* hInstance, void* hSession);
     int (*UninitializeEntry)(void* hInstance, TLogin* login);  // the record itself, not its handle
 
-    // Null for a session without one. The plug-in keeps owning it.
+    // Null for a session without tickets. The plug-in keeps owning it, until the logout, and gives the same
+    // again.
     MTICKET_ACCESS const* (*GetClientContainerEntry)(void* hInstance, void* hSession);
 
-    // A ticket's data into a buffer of the caller; the plug-in knows what the five values say.
+    // A ticket's data into a buffer of the caller; what the five values say is the plug-in's to define.
     int (*GetTicketDataEntry)(void* hInstance, void* hSession, int, int, int, int*, void*);
     void* reserved112[2];
 
-    // Carries out the command of that name. data: its record or text, of size bytes.
+    // Carries out the command of that name. data: its record (a TCommandRecord keeps nMagic and nSize, and
+    // gets its answer in iResult) or text, of size bytes without a terminator. A command that is not known
+    // fails.
     int (*SendCommandEntry)(void* hInstance, void* hSession, char const* command, int size, void* data);
-    // Send and fetch a file, and send a job: paths and names are UTF-8. The plug-in knows which of the two
-    // char* of a file is the local side. The Sync forms wait for the end.
+    // Send and fetch a file, and send a job: paths and names are UTF-8. Which of the two char* of a file is
+    // the local side is the plug-in's to define. A local file that does not exist is a failure. The Sync
+    // forms wait for the end, the others need not.
     int (*PutFileEntry)(void* hInstance, void* hSession, char*, char*);
     int (*GetFileEntry)(void* hInstance, void* hSession, char*, char*);
     int (*SendJobEntry)(void* hInstance, void* hSession, TJobIdentification*, char* path, char* name);
     int (*PutFileSyncEntry)(void* hInstance, void* hSession, char*, char*);
 
-    ::STicketFactory* STicketFactory;  // data, not a function
+    ::STicketFactory* STicketFactory;  // data, not a function; works without a session
     void* reserved176[2];
 
     int (*GetFileSyncEntry)(void* hInstance, void* hSession, char*, char*);

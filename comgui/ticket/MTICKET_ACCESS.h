@@ -1,6 +1,8 @@
 // How a session reaches all of its tickets: slots as in STICKET_ACCESS, each with the type and id of the
-// ticket it is meant for behind the Instance. The module owns the table. Keys, texts and tables that a slot
-// gets are the caller's and are not kept; what a slot of the same purpose promises there it promises here.
+// ticket it is meant for behind the Instance. The module owns the table, which is valid until the logout.
+// Keys, texts and tables that a slot gets are the caller's and are not kept; what a slot of the same purpose
+// promises there it promises here, for each ticket by itself. Nobody checks an address before it comes here:
+// a slot refuses one that names no ticket. Several threads may call at once, for different tickets.
 #pragma once
 
 #include "comgui/foundation/export.h"
@@ -11,29 +13,36 @@
 #include <cstddef>
 #include <type_traits>
 
+// As SGETPARAMETER.
 typedef int (*MGETPARAMETER)(void* Instance, int ticketType, int ticketId, char const* key, PARAM_TYPE type,
                              void* value, int pos);
 
-// Success stands in each record's ok, and nowhere else.
+// As SGETMULTIPAR: success stands in each record's ok, and nowhere else.
 typedef int (*MGETMULTIPAR)(void* Instance, int ticketType, int ticketId, GETMULTIPAR* table);
 
 // Called for each ticket of a walk; false ends it. The ticket's table lives until it returns.
 typedef bool (*MWALKTICKETS_ACTION)(void* context, int ticketType, int ticketId,
                                     STICKET_ACCESS const* ticket);
 
+// Calls action once for each ticket of the type, on the caller's thread and before it returns.
 typedef int (*MWALKTICKETS)(void* Instance, MWALKTICKETS_ACTION action, void* context, int ticketType);
 
+// As SSETPARAMETER.
 typedef int (*MSETPARAMETER)(void* Instance, int ticketType, int ticketId, char const* key, PARAM_TYPE type,
                              void const* value, int pos);
 
-// Sets each record's ok; the result speaks of the table as a whole.
+// As SSETMULTIPAR: sets each record's ok; the result speaks of the table as a whole.
 typedef int (*MSETMULTIPAR)(void* Instance, int ticketType, int ticketId, SETMULTIPAR* table);
 
-// Carries out an operation; what arg is stands with each code in TICKET_OP.h.
+// Carries out an operation; what arg is stands with each code in TICKET_OP.h. Codes of single tickets come
+// here, too.
 typedef int (*MOPERATION)(void* Instance, int ticketType, int ticketId, TICKET_OP op, void* arg);
 
-// Switches notifications of a ticket, or with TICKET_ID_ALL of a whole type, on (keys: a null-ended table)
-// or off (keys: null) under an id that the module has given out.
+// Switches notifications of a ticket, or with TICKET_ID_ALL of a whole type, on (keys: a null-ended table;
+// only changes of these are told) or off (keys: null) under an id that the module has given out to the
+// command local.set.callback. Once it has switched off, no callback begins any more; to switch off what is
+// not on does no harm. Changes are told in the order in which they were made, each as records up to a null
+// key, in which one key has one pointer.
 typedef int (*MENDISNOTIF)(void* Instance, int ticketType, int ticketId, int notificationId, bool enable,
                            char const* const* keys);
 

@@ -1,7 +1,9 @@
 // One ticket as the module shows it to a host: a handle and the functions that take it as their first
-// argument. The host looks at the table and changes nothing in it. A function answers not zero when it did
-// what it was asked, unless its own comment says otherwise; why it did not (no such key, no such position,
-// another type) cannot be told. Ask the module which threads may call.
+// argument. The module owns the table; the host looks at it and changes nothing in it. A function answers not
+// zero when it did what it was asked, unless its own comment says otherwise; why it did not (no such key, no
+// such position, another type) cannot be told. Keys and texts are UTF-8 and end with a zero; what a function
+// gets is the caller's, and the module keeps no pointer to it. A host may call from any thread, for one
+// ticket from one at a time; nothing here catches an exception. docs/module-contract.md numbers these rules.
 #pragma once
 
 #include "comgui/ticket/PARAM_TYPE.h"
@@ -9,10 +11,14 @@
 #include <cstddef>
 #include <type_traits>
 
-// Reads one value to where value points, see PARAM_TYPE.h; after a failure that place is as it was.
+// Reads one value to where value points, see PARAM_TYPE.h; after a failure that place is as it was. Texts and
+// bytes stay the module's, valid until the next call for this ticket. pos: -1 the key as a whole, from 0 up
+// one value of a list; the single value of a key stands at -1 and at 0.
 typedef int (*SGETPARAMETER)(void* Instance, char const* key, PARAM_TYPE type, void* value, int pos);
 
-// Reads a table. Success stands in each record's ok, and nowhere else.
+// Reads the records up to the one whose key is null, in their order, and goes on behind one that failed. Sets
+// each record's ok, where alone success stands: the result is not looked at. Texts and bytes of all records
+// are valid together until the next call for this ticket.
 typedef int (*SGETMULTIPAR)(void* Instance, GETMULTIPAR* table);
 
 // Called for each parameter of a walk, with the value word as on a write; false ends the walk. Records of
@@ -20,17 +26,22 @@ typedef int (*SGETMULTIPAR)(void* Instance, GETMULTIPAR* table);
 typedef bool (*SWALKPARAMETERS_ACTION)(void* context, char const* key, PARAM_TYPE type, void const* value,
                                        int pos);
 
-// Calls action for each parameter. This library always walks with comgui::detail::Walk, below.
+// Calls action once for each value, on the caller's thread and before it returns; written in that order into
+// an empty ticket they make the same one. This library always walks with comgui::detail::Walk, below.
 typedef int (*SWALKPARAMETERS)(void* Instance, SWALKPARAMETERS_ACTION action, void* context,
                                char const* prefix, int limit);
 
-// Writes one value; the slot keeps no pointer to it. PARAM_NONE with a null value deletes.
+// Writes one value. pos: -1 in place of all that stands under the key, from 0 up in place of that one of a
+// list, -2 behind its last. PARAM_NONE with a null value deletes at -1 or from 0 up; PARAM_COUNT fails.
 typedef int (*SSETPARAMETER)(void* Instance, char const* key, PARAM_TYPE type, void const* value, int pos);
 
-// Writes a table and sets each record's ok.
+// Writes the records up to the one whose key is null, in their order, and goes on behind one that failed.
+// Sets each record's ok and changes nothing else in the table.
 typedef int (*SSETMULTIPAR)(void* Instance, SETMULTIPAR* table);
 
-// Answers an option by its code (STICKET_OP_FOLDER_VARIABLES, STICKET_OP_WHOAMI). 1 success, 0 failure.
+// Answers an option by its code. 1 success, 0 failure and for any other code.
+// STICKET_OP_FOLDER_VARIABLES: out is the address of a clFOLDER_VARIABLES*; the translator stays the
+// module's. STICKET_OP_WHOAMI: out is a STICKET_OPTION_WHOAMI.
 typedef int (*SOPTION)(void* Instance, int code, void* out);
 
 // Two words that the module fills for STICKET_OP_WHOAMI; nothing here looks into them.

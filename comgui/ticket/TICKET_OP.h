@@ -17,11 +17,15 @@ enum STICKET_OP : int
 
 enum MTICKET_OP : int
 {
-    MTICKET_OP_OPEN = 102,              // arg: address of a STICKET_ACCESS const*
-    MTICKET_OP_CREATE_NEXT = 104,       // id TICKET_ID_NEXT; arg: address of an int, receives the new id
-    MTICKET_OP_DELETE = 106,            // arg: null
-    MTICKET_OP_CLOSE = 107,             // arg: address of a bool
-    MTICKET_OP_FOLDER_VARIABLES = 110,  // type and id -1; arg: address of a clFOLDER_VARIABLES*
+    // arg: address of a STICKET_ACCESS const*, receives the ticket's table, which the module owns until
+    // MTICKET_OP_CLOSE. Fails for a ticket that does not exist.
+    MTICKET_OP_OPEN = 102,
+    // id TICKET_ID_NEXT; arg: address of an int, receives the new id, 0 to 16,777,215, each time another.
+    MTICKET_OP_CREATE_NEXT = 104,
+    MTICKET_OP_DELETE = 106,  // arg: null; the ticket can be neither opened nor read afterwards
+    MTICKET_OP_CLOSE = 107,   // arg: address of a bool; ends MTICKET_OP_OPEN, the ticket itself stays
+    // type and id -1; arg: address of a clFOLDER_VARIABLES*, receives a translator that stays the module's.
+    MTICKET_OP_FOLDER_VARIABLES = 110,
 };
 
 extern "C"
