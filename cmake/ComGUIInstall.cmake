@@ -18,8 +18,8 @@ set_target_properties(comgui_host PROPERTIES EXPORT_NAME host)
 set_target_properties(comgui_corefoundation PROPERTIES INSTALL_RPATH ${comgui_beside} EXPORT_NAME corefoundation)
 set_target_properties(comgui_module PROPERTIES INSTALL_RPATH ${comgui_beside}/../../..)
 
-install(TARGETS comgui comgui_client comgui_host EXPORT comgui-targets
-    LIBRARY DESTINATION ${CMAKE_INSTALL_LIBDIR} FILE_SET HEADERS)
+install(TARGETS comgui comgui_client comgui_host comgui_module_kit EXPORT comgui-targets
+    LIBRARY DESTINATION ${CMAKE_INSTALL_LIBDIR} ARCHIVE DESTINATION ${CMAKE_INSTALL_LIBDIR} FILE_SET HEADERS)
 if(APPLE)
     install(TARGETS comgui_corefoundation EXPORT comgui-targets)    # no more than the system's own
 else()
@@ -74,6 +74,7 @@ write_basic_package_version_file(${PROJECT_BINARY_DIR}/comgui-config-version.cma
     COMPATIBILITY SameMinorVersion)    # before 1.0.0 every minor version may break
 install(FILES ${PROJECT_BINARY_DIR}/comgui-config.cmake ${PROJECT_BINARY_DIR}/comgui-config-version.cmake
     ${PROJECT_BINARY_DIR}/comgui-check.cpp ${PROJECT_SOURCE_DIR}/cmake/ComGUIWxWidgets.cmake
+    ${PROJECT_SOURCE_DIR}/cmake/ComGUIModule.cmake ${PROJECT_SOURCE_DIR}/cmake/ComGUIModule.plist.in
     DESTINATION ${COMGUI_PACKAGE_DIR})
 install(EXPORT comgui-targets NAMESPACE comgui:: DESTINATION ${COMGUI_PACKAGE_DIR})
 
