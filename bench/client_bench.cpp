@@ -142,7 +142,8 @@ BENCHMARK(EventsForABusySubscriber)->Iterations(1)->Unit(benchmark::kMillisecond
 
 int main(int argc, char** argv)
 {
-    return RunAndReport(argc, argv,
-                        {{"a read of an int, of the bare call", "KitRead", "BareRead", 1.3},
-                         {"a snapshot of 1,000 keys, of the slots", "KitSnapshot", "BareSnapshot", 1.3}});
+    return RunAndReport(
+        argc, argv,
+        {{"a read of an int, above the bare call", "KitRead", "BareRead", 10, GOAL::ADDED_TIME},
+         {"a snapshot of 1,000 keys, of the slots", "KitSnapshot", "BareSnapshot", 1.3}});
 }

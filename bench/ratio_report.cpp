@@ -64,9 +64,9 @@ private:
         auto const found = figures.find(name);
         if (found == figures.end())
             return nullptr;
-        std::vector<double> const& values = kind == GOAL::CPU_TIME       ? found->second.nanoseconds
-                                            : kind == GOAL::ELAPSED_TIME ? found->second.elapsed
-                                                                         : found->second.bytes;
+        std::vector<double> const& values = kind == GOAL::ELAPSED_TIME     ? found->second.elapsed
+                                            : kind == GOAL::BYTES_A_RECORD ? found->second.bytes
+                                                                           : found->second.nanoseconds;
         return values.empty() ? nullptr : &values;
     }
 
@@ -76,10 +76,12 @@ private:
         std::vector<double> const* const peer = Values(goal.peer, goal.kind);
         if (!ours || !peer)
             return;
-        double const ratio = Median(*ours) / Median(*peer);
-        std::printf("| %s | %s %.4g %s | %s %.4g %s | %.3f | %.2f | %s |\n", goal.measure, goal.ours.c_str(),
-                    Median(*ours), Unit(goal), goal.peer.c_str(), Median(*peer), Unit(goal), ratio, goal.most,
-                    ratio <= goal.most ? "yes" : "NO");
+        bool const isAdded = goal.kind == GOAL::ADDED_TIME;
+        double const result = isAdded ? Median(*ours) - Median(*peer) : Median(*ours) / Median(*peer);
+        char const* const form = isAdded ? "| %s | %s %.4g %s | %s %.4g %s | +%.2f ns | +%.2f ns | %s |\n"
+                                         : "| %s | %s %.4g %s | %s %.4g %s | %.3f | %.2f | %s |\n";
+        std::printf(form, goal.measure, goal.ours.c_str(), Median(*ours), Unit(goal), goal.peer.c_str(),
+                    Median(*peer), Unit(goal), result, goal.most, result <= goal.most ? "yes" : "NO");
     }
 
     static char const* Unit(GOAL const& goal) { return goal.kind == GOAL::BYTES_A_RECORD ? "bytes" : "ns"; }

@@ -123,31 +123,32 @@ void Container::Withdraw() noexcept
 bool Container::Get(Address ticket, char const* key, PARAM_TYPE type, void* value, int pos)
 {
     At source{*this, ticket};
-    return IsTicket(ticket) && AnswerRead(source, m_kept, key, type, value, pos);
+    return IsThere(ticket) && AnswerRead(source, m_kept, key, type, value, pos);
 }
 
 bool Container::GetTable(Address ticket, GETMULTIPAR* table)
 {
     At source{*this, ticket};
-    return IsTicket(ticket) ? AnswerTableRead(source, *this, m_kept, table) : NoRecordIsOk(table);
+    return IsThere(ticket) ? AnswerTableRead(source, *this, m_kept, table) : NoRecordIsOk(table);
 }
 
 bool Container::Set(Address ticket, char const* key, PARAM_TYPE type, void const* value, int pos)
 {
     At source{*this, ticket};
-    return IsTicket(ticket) && AnswerWrite(source, key, type, value, pos);
+    return IsThere(ticket) && AnswerWrite(source, key, type, value, pos);
 }
 
 bool Container::SetTable(Address ticket, SETMULTIPAR* table)
 {
     At source{*this, ticket};
-    bool const isThere = IsTicket(ticket) && Exists(ticket);
-    return isThere ? AnswerTableWrite(source, *this, table) : NoRecordIsOk(table);
+    return IsThere(ticket) ? AnswerTableWrite(source, *this, table) : NoRecordIsOk(table);
 }
+
+bool Container::IsThere(Address ticket) { return IsTicket(ticket) && Exists(ticket); }
 
 STICKET_ACCESS const* Container::Open(Address ticket)
 {
-    if (!IsTicket(ticket) || !Exists(ticket))
+    if (!IsThere(ticket))
         return nullptr;
     std::lock_guard const lock(m_lock);
     auto& opened = m_opened[ticket];
@@ -196,8 +197,7 @@ bool Container::Operation(Address ticket, TICKET_OP op, void* arg)
     case MTICKET_OP_DELETE:
         return IsTicket(ticket) && Delete(ticket);
     case STICKET_OP_SET_PARTIAL:
-        return IsTicket(ticket) && Exists(ticket) &&
-               Limit(ticket, KeySelection(static_cast<char const* const*>(arg)));
+        return IsThere(ticket) && Limit(ticket, KeySelection(static_cast<char const* const*>(arg)));
     case MTICKET_OP_FOLDER_VARIABLES:
         return ticket == Address{TICKET_ID_NONE, TICKET_ID_NONE} &&
                AnswerOption(STICKET_OP_FOLDER_VARIABLES, arg, ticket, Folders());

@@ -28,8 +28,10 @@ public:
     explicit Container(Session& session);
     ~Container() override;
 
-    // These get addresses of tickets only (IsTicket), of tickets that need not exist.
+    // Gets addresses of tickets only (IsTicket).
     virtual bool Exists(Address ticket) = 0;
+
+    // From here to All the ticket exists, or did a moment ago.
 
     // The value at that position of the key, from 0; none if there is none. A slot that asks for another type
     // fails.
@@ -73,6 +75,7 @@ public:
 private:
     class Opened;  // the table of a ticket
 
+    bool IsThere(Address ticket);
     STICKET_ACCESS const* Open(Address ticket);
     bool Close(Address ticket);
     bool OpenInto(Address ticket, void* arg);

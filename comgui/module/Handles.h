@@ -32,27 +32,22 @@ public:
     T* Remove(void* handle) noexcept
     {
         std::lock_guard const lock(m_lock);
-        T* const object = Find(handle);
-        if (!object)
+        Place* const place = PlaceThatHas(handle);
+        if (!place)
             return nullptr;
-        auto const index = std::bit_cast<std::uintptr_t>(handle) & IndexMask;
-        Place& place = *PlaceOf(index);
-        place.handle.store(0, std::memory_order_release);
-        place.object.store(nullptr, std::memory_order_release);
-        if (++place.uses < MostUses)  // else nobody ever gets the place again
+        place->handle.store(0, std::memory_order_release);
+        if (++place->uses < MostUses)  // else nobody ever gets the place again
         {
-            place.nextFree = m_firstFree;
-            m_firstFree = static_cast<std::uint32_t>(index);
+            place->nextFree = m_firstFree;
+            m_firstFree = static_cast<std::uint32_t>(std::bit_cast<std::uintptr_t>(handle) & IndexMask);
         }
-        return object;
+        return place->object.exchange(nullptr, std::memory_order_acq_rel);
     }
 
     T* Find(void const* handle) const noexcept
     {
-        auto const given = std::bit_cast<std::uintptr_t>(handle);
-        Place const* const place = PlaceOf(given & IndexMask);
-        bool const isIt = place && place->handle.load(std::memory_order_acquire) == given;
-        return isIt ? place->object.load(std::memory_order_acquire) : nullptr;
+        Place const* const place = PlaceThatHas(handle);
+        return place ? place->object.load(std::memory_order_acquire) : nullptr;
     }
 
 private:
@@ -81,6 +76,13 @@ private:
         std::uintptr_t const number = index / BlockSize;
         Block* const block = number < MostBlocks ? m_blocks[number].load(std::memory_order_acquire) : nullptr;
         return block ? &(*block)[index % BlockSize] : nullptr;
+    }
+
+    Place* PlaceThatHas(void const* handle) const noexcept
+    {
+        auto const given = std::bit_cast<std::uintptr_t>(handle);
+        Place* const place = PlaceOf(given & IndexMask);
+        return place && place->handle.load(std::memory_order_acquire) == given ? place : nullptr;
     }
 
     std::uintptr_t TakeFree()
