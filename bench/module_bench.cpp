@@ -18,12 +18,12 @@ bool Answer(char const* key, PARAM_TYPE type, void* value)
 }
 
 // Nothing of it is to be seen where it is called, as of a plug-in.
-[[gnu::noipa]] int BareTicketGet(void* instance, char const* key, PARAM_TYPE type, void* value, int)
+[[gnu::noinline]] int BareTicketGet(void* instance, char const* key, PARAM_TYPE type, void* value, int)
 {
     return instance && Answer(key, type, value) ? 1 : 0;
 }
 
-[[gnu::noipa]] int BareContainerGet(void* instance, int, int, char const* key, PARAM_TYPE type, void* value,
+[[gnu::noinline]] int BareContainerGet(void* instance, int, int, char const* key, PARAM_TYPE type, void* value,
                                     int)
 {
     return instance && Answer(key, type, value) ? 1 : 0;

@@ -162,7 +162,4 @@ bool AnswerWalk(Source& source, KeptValues& kept, SWALKPARAMETERS_ACTION action,
     }
     return true;
 }
-
-// STICKET_OP_WHOAMI and STICKET_OP_FOLDER_VARIABLES.
-bool AnswerOption(int code, void* out, Address address, clFOLDER_VARIABLES* folders);
 }  // namespace comgui::plugin

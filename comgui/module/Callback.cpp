@@ -1,7 +1,6 @@
 #include "comgui/module/Callback.h"
 
 #include "comgui/module/Words.h"
-#include "comgui/ticket/SETMULTIPAR.h"
 #include <map>
 #include <string_view>
 
@@ -45,6 +44,11 @@ void Callback::Tell(int kind, int argA, int argB, int code, std::vector<Paramete
         table[i].pos = parameter.pos;
         table[i].ok = true;
     }
-    m_function(m_user, kind, argA, argB, code, parameters.empty() ? nullptr : table.data());
+    Tell(kind, argA, argB, code, parameters.empty() ? nullptr : table.data());
+}
+
+void Callback::Tell(int kind, int argA, int argB, int code, SETMULTIPAR* table) const
+{
+    m_function(m_user, kind, argA, argB, code, table);
 }
 }  // namespace comgui::plugin

@@ -2,6 +2,7 @@
 #pragma once
 
 #include "comgui/module/Value.h"
+#include "comgui/ticket/SETMULTIPAR.h"
 #include "comgui/ticket/STICKET_ACCESS.h"
 #include <optional>
 #include <vector>
@@ -33,6 +34,9 @@ public:
     // Calls the client. parameters: what changed, no value for what was deleted; the client gets no table if
     // there is none. An exception of the client's passes.
     void Tell(int kind, int argA, int argB, int code, std::vector<Parameter> const& parameters) const;
+
+    // The same with a table of the author's own, null for none: all records of a key have the same pointer.
+    void Tell(int kind, int argA, int argB, int code, SETMULTIPAR* table) const;
 
 private:
     Function m_function;

@@ -25,14 +25,6 @@ struct At
     }
     std::vector<Parameter> All(std::string_view prefix) { return container.All(ticket, prefix); }
 };
-
-template <typename Record>
-bool NoRecordIsOk(Record* table)
-{
-    for (Record* record = table; record && record->key; ++record)
-        record->ok = false;
-    return false;
-}
 }  // namespace
 
 // All openings of a ticket share its table. While none is open every slot answers 0.
@@ -57,18 +49,12 @@ public:
     {
         return IsOpen() && m_container.Get(m_ticket, key, type, value, pos);
     }
-    bool GetTable(GETMULTIPAR* table) override
-    {
-        return IsOpen() ? m_container.GetTable(m_ticket, table) : NoRecordIsOk(table);
-    }
+    bool GetTable(GETMULTIPAR* table) override { return IsOpen() && m_container.GetTable(m_ticket, table); }
     bool Set(char const* key, PARAM_TYPE type, void const* value, int pos) override
     {
         return IsOpen() && m_container.Set(m_ticket, key, type, value, pos);
     }
-    bool SetTable(SETMULTIPAR* table) override
-    {
-        return IsOpen() ? m_container.SetTable(m_ticket, table) : NoRecordIsOk(table);
-    }
+    bool SetTable(SETMULTIPAR* table) override { return IsOpen() && m_container.SetTable(m_ticket, table); }
     bool Walk(SWALKPARAMETERS_ACTION action, void* context, char const* prefix, int) override
     {
         At source{m_container, m_ticket};
@@ -129,7 +115,7 @@ bool Container::Get(Address ticket, char const* key, PARAM_TYPE type, void* valu
 bool Container::GetTable(Address ticket, GETMULTIPAR* table)
 {
     At source{*this, ticket};
-    return IsThere(ticket) ? AnswerTableRead(source, *this, m_kept, table) : NoRecordIsOk(table);
+    return IsThere(ticket) && AnswerTableRead(source, *this, m_kept, table);
 }
 
 bool Container::Set(Address ticket, char const* key, PARAM_TYPE type, void const* value, int pos)
@@ -141,7 +127,7 @@ bool Container::Set(Address ticket, char const* key, PARAM_TYPE type, void const
 bool Container::SetTable(Address ticket, SETMULTIPAR* table)
 {
     At source{*this, ticket};
-    return IsThere(ticket) ? AnswerTableWrite(source, *this, table) : NoRecordIsOk(table);
+    return IsThere(ticket) && AnswerTableWrite(source, *this, table);
 }
 
 bool Container::IsThere(Address ticket) { return IsTicket(ticket) && Exists(ticket); }

@@ -20,7 +20,10 @@ template <typename Work>
 int Slot(void* instance, Work const& work) noexcept
 {
     ContainerSlots* const container = containers.Find(instance);
-    return container ? RunSlot(*container, [&] { return work(*container); }) : 0;
+    if (container)
+        return RunSlot(*container, [&] { return work(*container); });
+    RunStray(Failed);
+    return 0;
 }
 
 int OnGet(void* instance, int type, int id, char const* key, PARAM_TYPE valueType, void* value, int pos)
@@ -33,6 +36,7 @@ int OnGet(void* instance, int type, int id, char const* key, PARAM_TYPE valueTyp
 
 int OnGetTable(void* instance, int type, int id, GETMULTIPAR* table)
 {
+    ClearOk(table);
     return ReadSlot(instance,
                     [&](ContainerSlots& container) {
                         return container.GetTable({type, id}, table);
@@ -55,6 +59,7 @@ int OnSet(void* instance, int type, int id, char const* key, PARAM_TYPE valueTyp
 
 int OnSetTable(void* instance, int type, int id, SETMULTIPAR* table)
 {
+    ClearOk(table);
     return Slot(instance, [&](ContainerSlots& container) { return container.SetTable({type, id}, table); });
 }
 

@@ -23,7 +23,8 @@ public:
     virtual void Withdraw() noexcept;
 
     // Arguments and results are those of the slots in MTICKET_ACCESS.h, true for success. Nothing has been
-    // looked at but the table's Instance: addresses may be no tickets', pointers may be null.
+    // looked at but the table's Instance: addresses may be no tickets', pointers may be null. No record of a
+    // table is ok.
     virtual bool Get(Address ticket, char const* key, PARAM_TYPE type, void* value, int pos) = 0;
     virtual bool GetTable(Address ticket, GETMULTIPAR* table) = 0;
     virtual bool WalkTickets(MWALKTICKETS_ACTION action, void* context, int type) = 0;

@@ -55,10 +55,9 @@ void KeepForGood(Session& session)
 template <typename Work>
 int Entry(void* hInstance, Work const& work) noexcept
 {
-    Instance* const instance = instances.Find(hInstance);
-    if (!instance)
-        return UnknownInstance;
-    return RunForCode(instance->GetModule(), [&]() -> int { return work(*instance); });
+    if (Instance* const instance = instances.Find(hInstance))
+        return RunForCode(instance->GetModule(), [&]() -> int { return work(*instance); });
+    return RunStray(UnknownInstance);
 }
 
 Session* Living(void* hSession)
@@ -317,14 +316,15 @@ int QueryInterface(void* object, COMGUI_UUID interfaceId, void** out)
 
 int Open(GetModule module, void** hInstance) noexcept
 {
-    if (!hInstance)
-        return InvalidArgument;
     try
     {
         Module& made = module();
+        strays = &made;
         return RunForCode(made,
                           [&]() -> int
                           {
+                              if (!hInstance)
+                                  return InvalidArgument;
                               auto instance = std::make_unique<Instance>(made);
                               *hInstance = instances.Add(*instance);
                               instance.release();

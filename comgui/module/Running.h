@@ -4,6 +4,7 @@
 
 #include "comgui/module/Called.h"
 #include "comgui/module/Codes.h"
+#include <atomic>
 #include <pthread.h>
 
 namespace comgui::plugin
@@ -59,6 +60,15 @@ int RunRead(Called& called, Work const& work) noexcept
     }
 }
 
+// Before a table's slot runs: nothing has succeeded but what the author says has, and a host looks at nothing
+// else.
+template <typename Record>
+void ClearOk(Record* table)
+{
+    for (Record* record = table; record && record->key; ++record)
+        record->ok = false;
+}
+
 // A function that gives a code.
 template <typename Work>
 int RunForCode(Called& called, Work const& work) noexcept
@@ -86,6 +96,15 @@ int RunForCode(Called& called, Work const& work) noexcept
         code = CodeOfException(called);
     }
     return code;
+}
+
+// Told of calls whose handles are nobody's: the module, of which a bundle has one.
+inline constinit std::atomic<Called*> strays = nullptr;
+
+inline int RunStray(int code) noexcept
+{
+    Called* const called = strays;
+    return called ? RunForCode(*called, [code] { return code; }) : code;
 }
 
 // A slot: whether work has succeeded.

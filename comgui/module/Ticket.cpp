@@ -5,22 +5,6 @@
 
 namespace comgui::plugin
 {
-bool AnswerOption(int code, void* out, Address address, clFOLDER_VARIABLES* folders)
-{
-    if (!out)
-        return false;
-    if (code == STICKET_OP_FOLDER_VARIABLES && folders)
-        *static_cast<clFOLDER_VARIABLES**>(out) = folders;
-    else if (code == STICKET_OP_WHOAMI)
-    {
-        auto const word = [](int number) { return static_cast<unsigned long long>(number); };
-        *static_cast<STICKET_OPTION_WHOAMI*>(out) = {word(address.type), word(address.id)};
-    }
-    else
-        return false;
-    return true;
-}
-
 int Ticket::Count(std::string_view key) { return IsNone(Read(key, 0)) ? 0 : 1; }
 
 bool Ticket::Write(std::string_view, Value const&, int) { return false; }

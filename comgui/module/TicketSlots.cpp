@@ -2,6 +2,7 @@
 
 #include "comgui/module/Handles.h"
 #include "comgui/module/Running.h"
+#include "comgui/ticket/TICKET_OP.h"
 
 namespace comgui::plugin
 {
@@ -20,7 +21,10 @@ template <typename Work>
 int Slot(void* instance, Work const& work) noexcept
 {
     TicketSlots* const ticket = tickets.Find(instance);
-    return ticket ? RunSlot(*ticket, [&] { return work(*ticket); }) : 0;
+    if (ticket)
+        return RunSlot(*ticket, [&] { return work(*ticket); });
+    RunStray(Failed);
+    return 0;
 }
 
 int OnGet(void* instance, char const* key, PARAM_TYPE type, void* value, int pos)
@@ -30,6 +34,7 @@ int OnGet(void* instance, char const* key, PARAM_TYPE type, void* value, int pos
 
 int OnGetTable(void* instance, GETMULTIPAR* table)
 {
+    ClearOk(table);
     return ReadSlot(instance, [&](TicketSlots& ticket) { return ticket.GetTable(table); });
 }
 
@@ -45,6 +50,7 @@ int OnSet(void* instance, char const* key, PARAM_TYPE type, void const* value, i
 
 int OnSetTable(void* instance, SETMULTIPAR* table)
 {
+    ClearOk(table);
     return Slot(instance, [&](TicketSlots& ticket) { return ticket.SetTable(table); });
 }
 
@@ -53,6 +59,22 @@ int OnOption(void* instance, int code, void* out)
     return Slot(instance, [&](TicketSlots& ticket) { return ticket.Option(code, out); });
 }
 }  // namespace
+
+bool AnswerOption(int code, void* out, Address address, clFOLDER_VARIABLES* folders)
+{
+    if (!out)
+        return false;
+    if (code == STICKET_OP_FOLDER_VARIABLES && folders)
+        *static_cast<clFOLDER_VARIABLES**>(out) = folders;
+    else if (code == STICKET_OP_WHOAMI)
+    {
+        auto const word = [](int number) { return static_cast<unsigned long long>(number); };
+        *static_cast<STICKET_OPTION_WHOAMI*>(out) = {word(address.type), word(address.id)};
+    }
+    else
+        return false;
+    return true;
+}
 
 TicketSlots::TicketSlots()
 {

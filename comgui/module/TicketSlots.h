@@ -6,7 +6,10 @@
 #pragma once
 
 #include "comgui/module/Called.h"
+#include "comgui/module/Value.h"
 #include "comgui/ticket/STICKET_ACCESS.h"
+
+class clFOLDER_VARIABLES;
 
 namespace comgui::plugin
 {
@@ -22,7 +25,8 @@ public:
     void Withdraw() noexcept;
 
     // Arguments and results are those of the slots in STICKET_ACCESS.h, true for success. Nothing has been
-    // looked at but the table's Instance: keys, tables and places of values may be null.
+    // looked at but the table's Instance: keys, tables and places of values may be null. No record of a table
+    // is ok.
     virtual bool Get(char const* key, PARAM_TYPE type, void* value, int pos) = 0;
     virtual bool GetTable(GETMULTIPAR* table) = 0;
     virtual bool Set(char const* key, PARAM_TYPE type, void const* value, int pos) = 0;
@@ -33,4 +37,8 @@ public:
 private:
     STICKET_ACCESS m_access{};
 };
+
+// What a ticket of that address answers to STICKET_OP_WHOAMI, and with a translator to
+// STICKET_OP_FOLDER_VARIABLES. False for other options and for a null out.
+bool AnswerOption(int code, void* out, Address address, clFOLDER_VARIABLES* folders);
 }  // namespace comgui::plugin

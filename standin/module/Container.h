@@ -1,32 +1,45 @@
-// What a client of the module sees of its session: the handle and the table of the ticket container. It
-// stays allocated to the end of the process, since a client may hold the table longer than the session
-// lives; once the session has ended, every slot answers 0. The same holds for the tables of its tickets.
+// The tickets of the server as a session sees them. It stays allocated to the end of the process, since a
+// client may hold its table longer than the session lives; once the session has ended, every slot answers 0.
+// The same holds for the tables of its tickets.
 #pragma once
 
-#include "comgui/ticket/MTICKET_ACCESS.h"
+#include "comgui/module/ContainerSlots.h"
 #include "standin/module/OpenTickets.h"
 #include "standin/server/site/Server.h"
 
 namespace standin
 {
-class Container
+class Container : public HostCalls<comgui::plugin::ContainerSlots>
 {
 public:
-    Container(standin::Server& server, std::shared_ptr<Session> session);
-    Container(Container const&) = delete;
-    Container& operator=(Container const&) = delete;
+    using Address = comgui::plugin::Address;
 
-    MTICKET_ACCESS const* Access() const { return &m_access; }
+    Container(standin::Server& server, std::shared_ptr<Session> session);
+
     standin::Server& Server() const { return m_server; }
     standin::Session& Session() const { return *m_session; }
-    FolderTranslator& Folders() { return m_folders; }
-    OpenTickets& Opened() { return m_opened; }
-    std::weak_ptr<WalkedNumbers> const& Numbers() const { return m_numbers; }
 
     // False if the session had ended before.
     bool EndSession();
 
+    void Withdraw() noexcept override;
+    bool Get(Address ticket, char const* key, PARAM_TYPE type, void* value, int pos) override;
+    bool GetTable(Address ticket, GETMULTIPAR* table) override;
+    bool WalkTickets(MWALKTICKETS_ACTION action, void* context, int type) override;
+    bool Set(Address ticket, char const* key, PARAM_TYPE type, void const* value, int pos) override;
+    bool SetTable(Address ticket, SETMULTIPAR* table) override;
+    bool Operation(Address ticket, TICKET_OP op, void* arg) override;
+    bool Switch(Address tickets, int notification, bool enable, char const* const* keys) override;
+    STICKET_ACCESS const* CreateTicket(Address ticket, char const* const* keys) override;
+
 private:
+    bool Open(TicketAddress address, void* arg);
+    bool CreateNext(TicketAddress address, void* arg) const;
+    bool SetPartial(TicketAddress address, void* arg) const;
+    bool HandOutFolders(TicketAddress address, void* arg);
+
+    TicketService& Tickets() const { return m_server.Tickets(); }
+
     standin::Server& m_server;
     std::shared_ptr<standin::Session> const m_session;
     FolderTranslator m_folders;
@@ -34,6 +47,5 @@ private:
         std::make_shared<WalkedNumbers>();  // until the session ends
     std::weak_ptr<WalkedNumbers> const m_numbers = m_ownNumbers;
     OpenTickets m_opened;
-    MTICKET_ACCESS m_access{};
 };
 }  // namespace standin

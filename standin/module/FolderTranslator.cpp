@@ -67,14 +67,6 @@ FolderTranslator::FolderTranslator(TicketService& tickets) : m_tickets(tickets) 
 
 FolderTranslator::~FolderTranslator() = default;
 
-bool FolderTranslator::HandOut(void* out)
-{
-    if (!out)
-        return false;
-    *static_cast<clFOLDER_VARIABLES**>(out) = this;
-    return true;
-}
-
 std::shared_ptr<FolderTranslator::Loaded> FolderTranslator::UpToDate() const
 {
     if (IsForkedChild())

@@ -15,9 +15,6 @@ public:
     explicit FolderTranslator(TicketService& tickets);
     ~FolderTranslator() override;
 
-    // Puts its address to where a clFOLDER_VARIABLES* is wanted; false for null.
-    bool HandOut(void* out);
-
     bool IsEnabled() const override;
     void Load() override;
     std::string Encode(std::string const& path) const override;

@@ -1,6 +1,6 @@
 #include "standin/module/LocalTicket.h"
 
-#include "comgui/ticket/TICKET_OP.h"
+#include "comgui/ticket/TICKET_ID.h"
 #include "standin/module/ValueWords.h"
 #include "standin/server/files/FileError.h"
 #include "standin/server/files/Report.h"
@@ -45,13 +45,13 @@ void LocalTicket::Save() const
 
 bool LocalTicket::Get(char const* key, PARAM_TYPE type, void* value, int pos)
 {
-    KeyValues const* const values = key ? m_ticket.Now().Find(std::string_view(key)) : nullptr;
+    KeyValues const* const values = key && MayRead() ? m_ticket.Now().Find(std::string_view(key)) : nullptr;
     return values && ReadValue(*values, type, value, pos, m_reader);
 }
 
 bool LocalTicket::GetTable(GETMULTIPAR* table)
 {
-    if (!table)
+    if (!table || !MayRead())
         return false;
     for (GETMULTIPAR* record = table; record->key; ++record)
         record->ok = Get(record->key, record->type, record->value, record->pos);
@@ -109,6 +109,7 @@ bool LocalTicket::Walk(SWALKPARAMETERS_ACTION action, void* context, char const*
 
 bool LocalTicket::Option(int code, void* out)
 {
-    return code == STICKET_OP_WHOAMI && TellWhoAmI(m_ticket.Address(), out);
+    TicketAddress const told = m_ticket.Address().value_or(TicketAddress{TICKET_ID_NONE, TICKET_ID_NONE});
+    return comgui::plugin::AnswerOption(code, out, {told.type, told.id}, nullptr);
 }
 }  // namespace standin

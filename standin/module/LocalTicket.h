@@ -2,7 +2,8 @@
 // changed. For one thread at a time; several tickets, also of one file, are independent of each other.
 #pragma once
 
-#include "standin/module/TicketTable.h"
+#include "comgui/module/TicketSlots.h"
+#include "standin/module/HostCalls.h"
 #include "standin/module/WalkedNumbers.h"
 #include "standin/server/tickets/OwnedTicket.h"
 #include "standin/server/tickets/TextReader.h"
@@ -10,7 +11,7 @@
 
 namespace standin
 {
-class LocalTicket : private TicketSubject
+class LocalTicket : public HostCalls<comgui::plugin::TicketSlots>
 {
 public:
     LocalTicket() = default;  // in memory
@@ -27,9 +28,6 @@ public:
     // old file as it was.
     void Save() const;
 
-    STICKET_ACCESS const* Access() const { return m_table.Access(); }
-
-private:
     bool Get(char const* key, PARAM_TYPE type, void* value, int pos) override;
     bool GetTable(GETMULTIPAR* table) override;
     bool Set(char const* key, PARAM_TYPE type, void const* value, int pos) override;
@@ -37,10 +35,10 @@ private:
     bool Walk(SWALKPARAMETERS_ACTION action, void* context, char const* prefix, int limit) override;
     bool Option(int code, void* out) override;
 
+private:
     std::filesystem::path const m_file;  // empty in memory
     OwnedTicket m_ticket;
     TextReader m_reader{1};  // the only one, so that any mark will do
     WalkedNumbers m_numbers;
-    TicketTable const m_table{*this};
 };
 }  // namespace standin

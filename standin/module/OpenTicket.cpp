@@ -1,6 +1,5 @@
 #include "standin/module/OpenTicket.h"
 
-#include "comgui/ticket/TICKET_OP.h"
 #include "standin/module/FolderReading.h"
 #include "standin/module/ValueWords.h"
 
@@ -64,6 +63,8 @@ bool WriteTable(TicketService& tickets, Session const& session, TicketAddress ad
 
 bool OpenTicket::Get(char const* key, PARAM_TYPE type, void* value, int pos)
 {
+    if (!MayRead())
+        return false;
     if (m_address == SystemTicket && key && value && (type == PARAM_STRING || type == PARAM_INT)) [[unlikely]]
         return GetFolder(key, type, value, pos);
     EndFolderReading();
@@ -102,6 +103,8 @@ void OpenTicket::EndFolderReading() const
 
 bool OpenTicket::GetTable(GETMULTIPAR* table)
 {
+    if (!MayRead())
+        return false;
     EndFolderReading();
     return ReadTable(m_tickets, m_session, m_address, Which(), table);
 }
@@ -144,10 +147,6 @@ bool OpenTicket::Walk(SWALKPARAMETERS_ACTION action, void* context, char const* 
 bool OpenTicket::Option(int code, void* out)
 {
     bool const isThere = !m_session.Ended() && m_tickets.IncarnationOf(m_address) == Which();
-    if (!isThere)
-        return false;
-    if (code == STICKET_OP_FOLDER_VARIABLES)
-        return m_folders.HandOut(out);
-    return code == STICKET_OP_WHOAMI && TellWhoAmI(m_address, out);
+    return isThere && comgui::plugin::AnswerOption(code, out, {m_address.type, m_address.id}, &m_folders);
 }
 }  // namespace standin

@@ -3,8 +3,9 @@
 // the table.
 #pragma once
 
+#include "comgui/module/TicketSlots.h"
 #include "standin/module/FolderTranslator.h"
-#include "standin/module/TicketTable.h"
+#include "standin/module/HostCalls.h"
 #include "standin/module/WalkedNumbers.h"
 #include "standin/server/sessions/TicketService.h"
 #include <memory>
@@ -23,7 +24,7 @@ bool WriteTicket(TicketService& tickets, Session const& session, TicketAddress a
 bool WriteTable(TicketService& tickets, Session const& session, TicketAddress address,
                 Incarnation incarnation, SETMULTIPAR* table);
 
-class OpenTicket : private TicketSubject
+class OpenTicket : public HostCalls<comgui::plugin::TicketSlots>
 {
 public:
     // The services, the session and its translator outlive it. numbers: of the session, gone with its end.
@@ -33,8 +34,6 @@ public:
           m_address(address), m_incarnation(incarnation)
     {
     }
-
-    STICKET_ACCESS const* Access() const { return m_table.Access(); }
 
     // Which of the tickets that have or had the address it stands for; NoTicket: for none.
     Incarnation Which() const { return m_incarnation.load(std::memory_order_acquire); }
@@ -56,6 +55,5 @@ private:
     std::weak_ptr<WalkedNumbers> const m_numbers;
     TicketAddress const m_address;
     std::atomic<Incarnation> m_incarnation;
-    TicketTable const m_table{*this};
 };
 }  // namespace standin

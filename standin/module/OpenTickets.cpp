@@ -37,4 +37,14 @@ bool OpenTickets::Close(TicketAddress address)
         entry->second.ticket->StandFor(NoTicket);
     return true;
 }
+
+void OpenTickets::Withdraw() noexcept
+{
+    std::lock_guard const lock(m_lock);
+    for (auto const& [address, entry] : m_open)
+        if (entry.ticket)
+            entry.ticket->Withdraw();
+    for (auto const& ticket : m_outlived)
+        ticket->Withdraw();
+}
 }  // namespace standin

@@ -26,6 +26,9 @@ public:
     // Undoes one Open; false if the ticket is not open. Works for a ticket that has been deleted, too.
     bool Close(TicketAddress address);
 
+    // The session has ended: every table answers 0 for good.
+    void Withdraw() noexcept;
+
 private:
     struct Entry
     {

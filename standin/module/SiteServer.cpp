@@ -1,6 +1,6 @@
 #include "standin/module/SiteServer.h"
 
-#include "standin/module/Guard.h"
+#include "standin/module/HostCalls.h"
 #include "standin/server/files/FileError.h"
 #include "standin/server/files/ForkedChild.h"
 #include "standin/server/files/Report.h"
@@ -67,22 +67,22 @@ OpenSite::OpenSite(SiteName const& name) : site(name, ShippedSeed()), server(sit
 
 OpenSite* SiteOfThisProcess() noexcept
 {
-    return Guarded<OpenSite*>(nullptr,
-                              []() -> OpenSite*
-                              {
-                                  try
-                                  {
-                                      return &Opened(SiteName::OfThisUser());
-                                  }
-                                  catch (StoreError const& error)
-                                  {
-                                      Report(error.what());
-                                  }
-                                  catch (FileError const& error)
-                                  {
-                                      Report(error.what());
-                                  }
-                                  return nullptr;
-                              });
+    try
+    {
+        return &Opened(SiteName::OfThisUser());
+    }
+    catch (StoreError const& error)
+    {
+        Report(error.what());
+    }
+    catch (FileError const& error)
+    {
+        Report(error.what());
+    }
+    catch (std::exception const& error)
+    {
+        TellOfFailure(error.what());
+    }
+    return nullptr;
 }
 }  // namespace standin

@@ -1,7 +1,8 @@
 // What is kept of a refused call, in the thread that made it.
 #include "standin/server/files/RefusableCall.h"
 
-#include "standin/module/Guard.h"
+#include "comgui/module/TicketSlots.h"
+#include "standin/module/HostCalls.h"
 #include "standin/server/files/Report.h"
 #include "tests/support/Allocations.h"
 #include <gtest/gtest.h>
@@ -28,7 +29,17 @@ protected:
 };
 using ReasonOfARead = ReasonOfACall;
 using Reports = ReasonOfACall;
-using Guard = ReasonOfACall;
+using CallsOfAHost = ReasonOfACall;
+
+class Throwing : public HostCalls<comgui::plugin::TicketSlots>
+{
+    bool Get(char const*, PARAM_TYPE, void*, int) override { throw std::runtime_error("told to\nfail"); }
+    bool GetTable(GETMULTIPAR*) override { return false; }
+    bool Set(char const*, PARAM_TYPE, void const*, int) override { throw 7; }
+    bool SetTable(SETMULTIPAR*) override { return false; }
+    bool Walk(SWALKPARAMETERS_ACTION, void*, char const*, int) override { return false; }
+    bool Option(int, void*) override { return false; }
+};
 
 std::string StderrOf(std::function<void()> const& work)
 {
@@ -197,14 +208,17 @@ TEST_F(Reports, WithoutMemory_AreTheSameOnStderr)
     EXPECT_GT(failures, 0);
 }
 
-TEST_F(Guard, WhatIsThrown_IsToldOnStderrAndIsTheReason)
+TEST_F(CallsOfAHost, WhatIsThrown_IsToldOnStderrAndIsTheReason)
 {
-    auto const fail = []() -> int { throw std::runtime_error("told to\nfail"); };
+    Throwing ticket;
+    STICKET_ACCESS const& table = *ticket.Access();
     RefuseWith("before");
-    EXPECT_EQ(StderrOf([&] { EXPECT_EQ(GuardedRead<int>(5, fail), 5); }),
-              "ComGUI.Bundle: a call failed: told to\nfail\n");
+    EXPECT_EQ(
+        StderrOf([&] { EXPECT_EQ(table.SGETPARAMETER(table.Instance, "K", PARAM_INT, nullptr, 0), 0); }),
+        "ComGUI.Bundle: a call failed: told to\nfail\n");
     EXPECT_EQ(RefusableCall::TakeReason(), "a call failed: told to?fail");
-    EXPECT_EQ(StderrOf([] { EXPECT_EQ(Guarded<int>(5, []() -> int { throw 7; }), 5); }),
-              "ComGUI.Bundle: a call failed\n");
+    EXPECT_EQ(
+        StderrOf([&] { EXPECT_EQ(table.SSETPARAMETER(table.Instance, "K", PARAM_INT, nullptr, 0), 0); }),
+        "ComGUI.Bundle: a call failed\n");
     EXPECT_EQ(RefusableCall::TakeReason(), "a call failed");
 }
