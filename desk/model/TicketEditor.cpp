@@ -1,9 +1,7 @@
 #include "desk/model/TicketEditor.h"
 
-#include <map>
 #include <optional>
 #include <utility>
-#include <variant>
 
 namespace desk
 {
@@ -16,28 +14,6 @@ comgui::Result<comgui::Value> ValueOf(comgui::Tickets const& tickets, comgui::Ti
     comgui::Result<comgui::Value> value =
         tickets.Read(ticket, key, comgui::WholeKey, comgui::Paths::AsStored);
     return !value && value.GetError().code == comgui::NoSuchKey ? comgui::Value() : value;
-}
-using Presents = std::map<std::pair<comgui::TicketAddress, std::string>, comgui::Value>;
-
-struct Unread
-{
-    comgui::TicketAddress ticket;
-    std::string key;
-    comgui::Error error;
-};
-
-// Of all keys of the step, or of none.
-std::variant<Presents, Unread> PresentsOf(comgui::Tickets const& tickets, EditHistory::Step const& step)
-{
-    Presents presents;
-    for (Edit const& edit : step)
-    {
-        auto const value = ValueOf(tickets, edit.ticket, edit.key);
-        if (!value)
-            return Unread{edit.ticket, edit.key, value.GetError()};
-        presents[{edit.ticket, edit.key}] = *value;
-    }
-    return presents;
 }
 }  // namespace
 
@@ -109,62 +85,49 @@ void TicketEditor::StepAsPresent(bool isUndo)
 {
     m_isStepping = true;
     onHistory();
-    EditHistory::Step const* const step = isUndo ? m_history.NextUndo() : m_history.NextRedo();
-    if (!step)
+    Edit const* const next = isUndo ? m_history.NextUndo() : m_history.NextRedo();
+    if (!next)
         return EndStep();
-    OnWorker([tickets = m_tickets, edits = *step] { return PresentsOf(tickets, edits); },
-             [this, isUndo, recorded = m_recorded](auto const& presents)
+    OnWorker([tickets = m_tickets, ticket = next->ticket, key = next->key]
+             { return ValueOf(tickets, ticket, key); },
+             [this, isUndo, recorded = m_recorded, ticket = next->ticket,
+              key = next->key](comgui::Result<comgui::Value> const& present)
              {
-                 // A write that was under way has made another step the next one.
+                 // A write that was under way has made another edit the next one.
                  if (recorded != m_recorded)
                      return StepAsPresent(isUndo);
-                 if (auto const* const unread = std::get_if<Unread>(&presents))
+                 if (!present)
                  {
                      EndStep();
-                     return onRefused(unread->ticket, unread->key, unread->error);
+                     return onRefused(ticket, key, present.GetError());
                  }
-                 auto const present = [&there = std::get<Presents>(presents)](auto ticket, auto const& key) {
-                     return there.at({ticket, key});
-                 };
-                 WriteStep(isUndo ? m_history.Undo(present) : m_history.Redo(present));
+                 auto const isThere = [&present](auto const&...) { return *present; };
+                 auto const write = isUndo ? m_history.Undo(isThere) : m_history.Redo(isThere);
+                 write ? WriteStep(*write) : EndStep();
              });
 }
 
-void TicketEditor::WriteStep(std::vector<EditWrite> const& writes)
+void TicketEditor::WriteStep(EditWrite const& write)
 {
-    std::vector<EditWrite> foreign;
-    for (EditWrite const& write : writes)
-        if (write.isForeign)
-            foreign.push_back(write);
-    if (!foreign.empty() && !onForeign(foreign))
+    if (write.isForeign && !onForeign(write))
     {
         m_history.Reject();
         return EndStep();
     }
-    auto const write = [tickets = m_tickets, writes]
-    {
-        std::vector<comgui::Outcome> outcomes;
-        outcomes.reserve(writes.size());
-        for (EditWrite const& each : writes)
-            outcomes.push_back(
-                tickets.Write(each.ticket, each.key, each.value, comgui::WholeKey, comgui::Paths::AsStored));
-        return outcomes;
-    };
-    OnWorker(write,
-             [this, writes](std::vector<comgui::Outcome> const& outcomes)
-             {
-                 std::vector<bool> written;
-                 written.reserve(outcomes.size());
-                 for (comgui::Outcome const& outcome : outcomes)
-                     written.push_back(outcome.IsGood());
-                 m_history.Settle(written);
-                 EndStep();
-                 for (std::size_t i = 0; i < writes.size(); ++i)
-                     if (outcomes[i])
-                         onWritten(writes[i].ticket, writes[i].key);
-                     else
-                         onRefused(writes[i].ticket, writes[i].key, outcomes[i].GetError());
-             });
+    OnWorker(
+        [tickets = m_tickets, write] {
+            return tickets.Write(write.ticket, write.key, write.value, comgui::WholeKey,
+                                 comgui::Paths::AsStored);
+        },
+        [this, write](comgui::Outcome const& outcome)
+        {
+            m_history.Settle(outcome.IsGood());
+            EndStep();
+            if (outcome)
+                onWritten(write.ticket, write.key);
+            else
+                onRefused(write.ticket, write.key, outcome.GetError());
+        });
 }
 
 void TicketEditor::EndStep()

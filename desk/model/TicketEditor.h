@@ -28,7 +28,7 @@ public:
     std::function<void(comgui::TicketAddress, std::string const& key)> onWritten = [](auto, auto const&) {};
 
     // Whether to undo or redo although others have changed these keys since.
-    std::function<bool(std::vector<EditWrite> const& foreign)> onForeign = [](auto const&) { return false; };
+    std::function<bool(EditWrite const& foreign)> onForeign = [](auto const&) { return false; };
 
     // Whether there is something to undo or redo may have changed.
     std::function<void()> onHistory = [] {};
@@ -51,7 +51,7 @@ private:
 
     void Do(comgui::TicketAddress ticket, std::string const& key, Writing writing);
     void StepAsPresent(bool isUndo);
-    void WriteStep(std::vector<EditWrite> const& writes);
+    void WriteStep(EditWrite const& write);
     void EndStep();
 
     template <typename Work, typename Then>

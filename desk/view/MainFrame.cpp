@@ -193,8 +193,7 @@ void MainFrame::Connect()
             m_keys->Explain(key, comgui::ToWx(error.Text()));
         Say(comgui::ToWx(error.Text()));
     };
-    m_editor.onForeign = [this](std::vector<EditWrite> const& foreign)
-    { return IsForeignOverwritten(foreign); };
+    m_editor.onForeign = [this](EditWrite const& foreign) { return IsForeignOverwritten(foreign); };
     m_editor.onHistory = [this]
     {
         GetMenuBar()->Enable(wxID_UNDO, m_editor.CanUndo());
@@ -612,9 +611,9 @@ void MainFrame::TakeEdit(std::string const& key, std::string const& text, comgui
         });
 }
 
-bool MainFrame::IsForeignOverwritten(std::vector<EditWrite> const& foreign)
+bool MainFrame::IsForeignOverwritten(EditWrite const& foreign)
 {
-    return IsOverwritten(_("Undo"), foreign[0].key, foreign[0].present);
+    return IsOverwritten(_("Undo"), foreign.key, foreign.present);
 }
 
 bool MainFrame::IsOverwritten(wxString const& title, std::string const& key, comgui::Value const& present)

@@ -88,7 +88,7 @@ private:
     void Search(std::string const& text);
     void Send(std::vector<std::string> const& files, comgui::JobOptions const& options);
     void TakeEdit(std::string const& key, std::string const& text, comgui::Value const* changed);
-    bool IsForeignOverwritten(std::vector<EditWrite> const& foreign);
+    bool IsForeignOverwritten(EditWrite const& foreign);
     bool IsOverwritten(wxString const& title, std::string const& key, comgui::Value const& present);
 
     void Say(wxString const& text);

@@ -20,9 +20,9 @@ protected:
         { heard.push_back(key + " refused " + std::to_string(error.code)); };
         editor->onWritten = [this](comgui::TicketAddress, std::string const& key)
         { heard.push_back(key + " written"); };
-        editor->onForeign = [this](std::vector<EditWrite> const& foreign)
+        editor->onForeign = [this](EditWrite const& foreign)
         {
-            heard.push_back("foreign " + foreign.front().key);
+            heard.push_back("foreign " + foreign.key);
             return isForeignOverwritten;
         };
     }
