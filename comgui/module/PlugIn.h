@@ -9,6 +9,9 @@
 #include "comgui/foundation/export.h"
 #include "comgui/module/Entries.h"
 
+struct __CFAllocator;  // of CoreFoundation, which an author need not include
+struct __CFUUID;
+
 namespace comgui::plugin
 {
 template <typename AuthorsModule>
@@ -50,7 +53,7 @@ private:
 }  // namespace comgui::plugin
 
 #define COMGUI_PLUGIN(FACTORY, MODULE)                                                                       \
-    extern "C" COMGUI_EXPORT void* FACTORY(void const*, void const* type)                                    \
+    extern "C" COMGUI_EXPORT void* FACTORY(__CFAllocator const*, __CFUUID const* type)                       \
     {                                                                                                        \
         return comgui::plugin::detail::MakeObject(comgui::plugin::PlugIn<MODULE>::Table(), type);            \
     }
