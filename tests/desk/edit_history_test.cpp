@@ -10,7 +10,6 @@ using comgui::Value;
 namespace
 {
 constexpr comgui::TicketAddress Job{comgui::JobTickets, 1};
-constexpr comgui::TicketAddress Queue{comgui::QueueTickets, 1};
 
 // A server with one ticket, and a user whose edits are recorded.
 class History : public testing::Test
