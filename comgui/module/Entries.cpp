@@ -10,6 +10,7 @@
 #include <mutex>
 #include <new>
 #include <set>
+#include <type_traits>
 
 namespace comgui::plugin::detail
 {
@@ -271,12 +272,47 @@ private:
     std::map<STICKET_ACCESS const*, std::unique_ptr<TicketSlots>> m_tickets;
 };
 
-// COM style: the first word is the table.
-struct Object
+// COM style: the first word is the table. A host that keeps one for good need not keep it where checks of
+// leaks look.
+class Object
 {
-    ComGUIModuleInterface* table;
-    std::atomic<unsigned> references{1};
+public:
+    explicit Object(ComGUIModuleInterface& table) : m_table(&table) { All().Add(this); }
+    ~Object() { All().Remove(this); }
+    Object(Object const&) = delete;
+    Object& operator=(Object const&) = delete;
+
+    std::atomic<unsigned>& References() { return m_references; }
+
+private:
+    class Register
+    {
+    public:
+        void Add(Object* object)
+        {
+            std::lock_guard const lock(m_lock);
+            m_objects.insert(object);
+        }
+        void Remove(Object* object)
+        {
+            std::lock_guard const lock(m_lock);
+            m_objects.erase(object);
+        }
+
+    private:
+        std::mutex m_lock;
+        std::set<Object*> m_objects;
+    };
+    static Register& All()  // never destroyed
+    {
+        static auto& all = *new Register;
+        return all;
+    }
+
+    [[maybe_unused]] ComGUIModuleInterface* const m_table;
+    std::atomic<unsigned> m_references{1};
 };
+static_assert(std::is_standard_layout_v<Object>);
 
 // The bytes of a UUID's text, either letter case; false for any other text.
 constexpr bool IsSameUuid(unsigned char const* bytes, char const* text)
@@ -292,12 +328,12 @@ constexpr bool IsSameUuid(unsigned char const* bytes, char const* text)
     return true;
 }
 
-unsigned int AddRef(void* object) { return ++static_cast<Object*>(object)->references; }
+unsigned int AddRef(void* object) { return ++static_cast<Object*>(object)->References(); }
 
 unsigned int Release(void* object)
 {
     auto* const ours = static_cast<Object*>(object);
-    unsigned const left = --ours->references;
+    unsigned const left = --ours->References();
     if (!left)
         delete ours;
     return left;
@@ -411,7 +447,14 @@ void* MakeObject(ComGUIModuleInterface& table, void const* type) noexcept
     CFUUIDBytes const bytes = CFUUIDGetUUIDBytes(static_cast<CFUUIDRef>(type));
     if (!IsSameUuid(&bytes.byte0, COMGUI_PLUGIN_TYPE_UUID))
         return nullptr;
-    return new (std::nothrow) Object{&table};
+    try
+    {
+        return new Object(table);
+    }
+    catch (std::bad_alloc const&)
+    {
+        return nullptr;
+    }
 }
 
 StopAtExit::~StopAtExit() { m_module.GetNotifications().Stop(std::chrono::seconds(1)); }

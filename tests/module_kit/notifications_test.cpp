@@ -282,7 +282,7 @@ TEST(NotificationsAtTheirEnd, Stop_WaitsNoLongerThanToldForACallThatHangs)
 {
     static std::mutex hanging;
     static std::atomic<bool> isInside{false};
-    auto& notifications = *new plugin::Notifications;  // its thread stays
+    static auto& notifications = *new plugin::Notifications;  // its thread stays
     static plugin::Session const session;
     std::unique_lock lock(hanging);
     auto const hang = [](void*, int, int, int, int, void*)
