@@ -35,6 +35,19 @@ install(TARGETS comgui_module LIBRARY DESTINATION ${COMGUI_BUNDLE_DIR}/Contents/
 install(DIRECTORY ${PROJECT_BINARY_DIR}/lib/ComGUI.Bundle/ DESTINATION ${COMGUI_BUNDLE_DIR}
     PATTERN Contents/${comgui_system} EXCLUDE)
 
+# The trace: its bundle, what loads it into programs, and the program for people.
+set_target_properties(comgui_trace_module PROPERTIES INSTALL_RPATH ${comgui_beside}/../../..)
+install(TARGETS comgui_trace_module
+    LIBRARY DESTINATION ${CMAKE_INSTALL_LIBDIR}/ComGUI-Trace.Bundle/Contents/${comgui_system})
+install(FILES ${PROJECT_BINARY_DIR}/lib/ComGUI-Trace.Bundle/Contents/Info.plist
+    DESTINATION ${CMAKE_INSTALL_LIBDIR}/ComGUI-Trace.Bundle/Contents)
+if(TARGET comgui_trace)
+    file(RELATIVE_PATH comgui_libraries ${CMAKE_INSTALL_FULL_BINDIR} ${CMAKE_INSTALL_FULL_LIBDIR})
+    set_target_properties(comgui_trace PROPERTIES INSTALL_RPATH ${comgui_beside}/${comgui_libraries})
+    install(TARGETS comgui_trace comgui_trace_start RUNTIME DESTINATION ${CMAKE_INSTALL_BINDIR}
+        LIBRARY DESTINATION ${CMAKE_INSTALL_LIBDIR})
+endif()
+
 if(COMGUI_TOOLS)
     file(RELATIVE_PATH comgui_libraries ${CMAKE_INSTALL_FULL_BINDIR} ${CMAKE_INSTALL_FULL_LIBDIR})
     set_target_properties(ticketstream comgui_site comgui_validate PROPERTIES INSTALL_RPATH ${comgui_beside}/${comgui_libraries})

@@ -57,17 +57,42 @@ std::string BundleToLoad()
     return own.parent_path() / COMGUI_BUNDLE_NAME;
 }
 
-COMGUI_UUID InterfaceId()
+COMGUI_UUID BytesOf(CFUUIDRef uuid)
 {
-    CFUUIDBytes const source = CFUUIDGetUUIDBytes(NewUuid(COMGUI_INTERFACE_UUID).get());
+    CFUUIDBytes const source = CFUUIDGetUUIDBytes(uuid);
     COMGUI_UUID id;
     static_assert(sizeof id == sizeof source);
     std::memcpy(&id, &source, sizeof id);
     return id;
 }
 
+bool IsSame(COMGUI_UUID const& id, char const* text)
+{
+    COMGUI_UUID const other = BytesOf(NewUuid(text).get());
+    return std::memcmp(&id, &other, sizeof id) == 0;
+}
+
+// What comgui_trace has loaded into the program must let the trace itself through.
+class Passed
+{
+public:
+    Passed() { Tell(true); }
+    ~Passed() { Tell(false); }
+    Passed(Passed const&) = delete;
+    Passed& operator=(Passed const&) = delete;
+
+private:
+    static void Tell(bool isPassed)
+    {
+        using Pass = void (*)(bool);
+        if (auto const pass = reinterpret_cast<Pass>(dlsym(RTLD_DEFAULT, "comgui_trace_pass")))
+            pass(isPassed);
+    }
+};
+
 CFPlugInRef OpenBundle(std::string const& bundle)
 {
+    Passed const here;
     auto const text = NewString(bundle.c_str());
     Owner<CFURLRef> const url(
         text ? CFURLCreateWithFileSystemPath(kCFAllocatorDefault, text.get(), kCFURLPOSIXPathStyle, true)
@@ -117,7 +142,8 @@ RealModule* RealModule::Load(std::string const& bundle)
     if (!object)
         return Complain(bundle, "no plug-in in it");
     void* found = nullptr;
-    (**static_cast<ComGUIModuleInterface**>(object)).QueryInterface(object, InterfaceId(), &found);
+    (**static_cast<ComGUIModuleInterface**>(object))
+        .QueryInterface(object, BytesOf(NewUuid(COMGUI_INTERFACE_UUID).get()), &found);
     if (!found)
         return Complain(bundle, "its plug-in has no interface");
     return new RealModule(object, **static_cast<ComGUIModuleInterface**>(found));
@@ -125,8 +151,12 @@ RealModule* RealModule::Load(std::string const& bundle)
 
 bool RealModule::IsItsInterface(COMGUI_UUID interfaceId)
 {
-    COMGUI_UUID const own = InterfaceId();
-    return std::memcmp(&own, &interfaceId, sizeof own) == 0;
+    return IsSame(interfaceId, COMGUI_INTERFACE_UUID);
+}
+
+bool RealModule::IsItsType(void const* type)
+{
+    return IsSame(BytesOf(static_cast<CFUUIDRef>(type)), COMGUI_PLUGIN_TYPE_UUID);
 }
 
 int RealModule::QueryInterface(COMGUI_UUID interfaceId, void** out) const

@@ -17,6 +17,7 @@ public:
     ComGUIModuleInterface const& Table() const { return m_table; }
 
     static bool IsItsInterface(COMGUI_UUID interfaceId);
+    static bool IsItsType(void const* type);  // a CFUUIDRef
 
     // Of the object that the plug-in's factory has made.
     int QueryInterface(COMGUI_UUID interfaceId, void** out) const;

@@ -166,11 +166,7 @@ Trace::Trace()
     m_ring = std::move(ring);
     static Writer const writer(*m_ring, file, name + RingSuffix);
     // A child has no writer, and must not write into its parent's ring.
-    pthread_atfork(nullptr, nullptr,
-                   []
-                   {
-                       (void)Trace::Get().m_ring.release();
-                   });
+    pthread_atfork(nullptr, nullptr, [] { (void)Trace::Get().m_ring.release(); });
 }
 
 Record::Record(Kind kind, Call call, std::uint64_t number) noexcept

@@ -19,6 +19,11 @@ public:
     static Trace& Get();
 
     bool IsOn() const noexcept { return m_ring && m_ring->IsOn(); }
+    void Switch(bool on) noexcept
+    {
+        if (m_ring)
+            m_ring->Switch(on);
+    }
     std::uint64_t NextNumber() noexcept { return m_number.fetch_add(1, std::memory_order_relaxed); }
     std::uint64_t Now() const noexcept
     {

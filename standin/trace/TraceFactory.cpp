@@ -54,9 +54,9 @@ ComGUIModuleInterface* Table()
 }
 }  // namespace
 
-extern "C" COMGUI_EXPORT void* ComGUITraceFactory(CFAllocatorRef, CFUUIDRef)
+extern "C" COMGUI_EXPORT void* ComGUITraceFactory(CFAllocatorRef, CFUUIDRef type)
 {
-    if (!trace::RealModule::Get())
+    if (!trace::RealModule::IsItsType(type) || !trace::RealModule::Get())
         return nullptr;
     trace::Trace::Get();
     return new (std::nothrow) Object{Table()};

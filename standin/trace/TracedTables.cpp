@@ -36,6 +36,7 @@ public:
             entry.copy = std::make_unique<Copy>(real, session);
             entry.seen = *real;
             m_reals[entry.copy->Access()] = real;
+            m_newest = entry.copy.get();
         }
         return entry.copy->Access();
     }
@@ -45,6 +46,12 @@ public:
         std::lock_guard const lock(m_lock);
         auto const found = m_reals.find(copy);
         return found == m_reals.end() ? nullptr : found->second;
+    }
+
+    Copy const* Newest()  // null for none
+    {
+        std::lock_guard const lock(m_lock);
+        return m_newest;
     }
 
 private:
@@ -58,6 +65,7 @@ private:
     std::map<Access const*, Entry> m_entries;
     std::map<void const*, Access const*> m_reals;
     std::vector<std::unique_ptr<Copy>> m_outlived;
+    Copy const* m_newest = nullptr;
 };
 using Tickets = Copies<STICKET_ACCESS, TracedTicket>;
 using Containers = Copies<MTICKET_ACCESS, TracedContainer>;
@@ -138,28 +146,55 @@ int EndedTable(TracedCall const& call, int result, RECORD const* table)
 
 // --- a ticket's slots
 
-TracedTicket const& TicketOf(void* instance) { return *static_cast<TracedTicket const*>(instance); }
+// The real table behind an Instance. A null one goes on to the plug-in as it is, by the newest table.
+struct Ticket
+{
+    STICKET_ACCESS const* real;
+    void* instance;
+    void* session;
+};
+
+// Of a ticket that nobody has: where only walks have shown any.
+STICKET_ACCESS const* Nobodys()
+{
+    static STICKET_ACCESS const table = []
+    {
+        STICKET_ACCESS made{};
+        made.SGETPARAMETER = [](void*, char const*, PARAM_TYPE, void*, int) { return 0; };
+        made.SGETMULTIPAR = [](void*, GETMULTIPAR*) { return 0; };
+        made.SWALKPARAMETERS = [](void*, SWALKPARAMETERS_ACTION, void*, char const*, int) { return 0; };
+        made.SSETPARAMETER = [](void*, char const*, PARAM_TYPE, void const*, int) { return 0; };
+        made.SSETMULTIPAR = [](void*, SETMULTIPAR*) { return 0; };
+        made.SOPTION = [](void*, int, void*) { return 0; };
+        return made;
+    }();
+    return &table;
+}
+
+Ticket TicketOf(void* instance)
+{
+    auto const* const copy = instance ? static_cast<TracedTicket const*>(instance) : Tickets::Get().Newest();
+    if (!copy)
+        return {Nobodys(), nullptr, nullptr};
+    return {copy->real, instance ? copy->real->Instance : nullptr, copy->session};
+}
 
 int OnGet(void* instance, char const* key, PARAM_TYPE type, void* value, int pos)
 {
-    if (!instance)
-        return 0;
-    TracedTicket const& ticket = TicketOf(instance);
+    Ticket const ticket = TicketOf(instance);
     TracedCall const call(Call::SGet);
     call.Began(ticket.session, At(ticket.real), key, int{type}, pos);
-    return EndedRead(call, ticket.real->SGETPARAMETER(ticket.real->Instance, key, type, value, pos), key,
-                     type, value);
+    return EndedRead(call, ticket.real->SGETPARAMETER(ticket.instance, key, type, value, pos), key, type,
+                     value);
 }
 
 int OnGetTable(void* instance, GETMULTIPAR* table)
 {
-    if (!instance)
-        return 0;
-    TracedTicket const& ticket = TicketOf(instance);
+    Ticket const ticket = TicketOf(instance);
     TracedCall const call(Call::SGetTable);
     if (call.IsTraced())
         call.Began(ticket.session, At(ticket.real), LengthOf(table));
-    return EndedTable(call, ticket.real->SGETMULTIPAR(ticket.real->Instance, table), table);
+    return EndedTable(call, ticket.real->SGETMULTIPAR(ticket.instance, table), table);
 }
 
 // What a walk hands out passes through here.
@@ -188,23 +223,19 @@ bool OnParameter(void* context, char const* key, PARAM_TYPE type, void const* va
 
 int OnWalk(void* instance, SWALKPARAMETERS_ACTION action, void* context, char const* prefix, int limit)
 {
-    if (!instance)
-        return 0;
-    TracedTicket const& ticket = TicketOf(instance);
+    Ticket const ticket = TicketOf(instance);
     TracedCall const call(Call::SWalk);
     call.Began(ticket.session, At(ticket.real), prefix, limit);
     Walking walking{call, action, context};
-    int const result = ticket.real->SWALKPARAMETERS(ticket.real->Instance, action ? OnParameter : nullptr,
-                                                    &walking, prefix, limit);
+    int const result = ticket.real->SWALKPARAMETERS(ticket.instance, action ? OnParameter : nullptr, &walking,
+                                                    prefix, limit);
     call.Ended(result, walking.parameters);
     return result;
 }
 
 int OnSet(void* instance, char const* key, PARAM_TYPE type, void const* value, int pos)
 {
-    if (!instance)
-        return 0;
-    TracedTicket const& ticket = TicketOf(instance);
+    Ticket const ticket = TicketOf(instance);
     TracedCall const call(Call::SSet);
     if (call.IsTraced())
         call.Make(Kind::Began)
@@ -215,44 +246,50 @@ int OnSet(void* instance, char const* key, PARAM_TYPE type, void const* value, i
             .Add(pos)
             .AddWritten(key, type, value)
             .Put();
-    int const result = ticket.real->SSETPARAMETER(ticket.real->Instance, key, type, value, pos);
+    int const result = ticket.real->SSETPARAMETER(ticket.instance, key, type, value, pos);
     call.Ended(result);
     return result;
 }
 
 int OnSetTable(void* instance, SETMULTIPAR* table)
 {
-    if (!instance)
-        return 0;
-    TracedTicket const& ticket = TicketOf(instance);
+    Ticket const ticket = TicketOf(instance);
     TracedCall const call(Call::SSetTable);
     if (call.IsTraced())
         call.Began(ticket.session, At(ticket.real), LengthOf(table));
-    return EndedTable(call, ticket.real->SSETMULTIPAR(ticket.real->Instance, table), table);
+    return EndedTable(call, ticket.real->SSETMULTIPAR(ticket.instance, table), table);
 }
 
 int OnOption(void* instance, int code, void* out)
 {
-    if (!instance)
-        return 0;
-    TracedTicket const& ticket = TicketOf(instance);
+    Ticket const ticket = TicketOf(instance);
     TracedCall const call(Call::SOption);
     call.Began(ticket.session, At(ticket.real), code);
-    int const result = ticket.real->SOPTION(ticket.real->Instance, code, out);
+    int const result = ticket.real->SOPTION(ticket.instance, code, out);
     call.Ended(result);
     return result;
 }
 
 // --- a container's
 
-TracedContainer const& ContainerOf(void* instance) { return *static_cast<TracedContainer const*>(instance); }
+struct Container
+{
+    MTICKET_ACCESS const* real;
+    void* instance;
+    void* session;
+};
+
+Container ContainerOf(void* instance)
+{
+    auto const* const copy =
+        instance ? static_cast<TracedContainer const*>(instance) : Containers::Get().Newest();
+    return {copy->real, instance ? copy->real->Instance : nullptr, copy->session};
+}
 
 int OnContainerGet(void* instance, int ticketType, int id, char const* key, PARAM_TYPE type, void* value,
                    int pos)
 {
-    if (!instance)
-        return 0;
-    TracedContainer const& container = ContainerOf(instance);
+    Container const container = ContainerOf(instance);
     TracedCall const call(Call::MGet);
     call.Began(container.session, ticketType, id, key, int{type}, pos);
     MTICKET_ACCESS const& real = *container.real;
@@ -262,13 +299,11 @@ int OnContainerGet(void* instance, int ticketType, int id, char const* key, PARA
 
 int OnContainerGetTable(void* instance, int type, int id, GETMULTIPAR* table)
 {
-    if (!instance)
-        return 0;
-    TracedContainer const& container = ContainerOf(instance);
+    Container const container = ContainerOf(instance);
     TracedCall const call(Call::MGetTable);
     if (call.IsTraced())
         call.Began(container.session, type, id, LengthOf(table));
-    return EndedTable(call, container.real->MGETMULTIPAR(container.real->Instance, type, id, table), table);
+    return EndedTable(call, container.real->MGETMULTIPAR(container.instance, type, id, table), table);
 }
 
 struct WalkingTickets
@@ -295,14 +330,12 @@ bool OnWalkedTicket(void* context, int type, int id, STICKET_ACCESS const* real)
 
 int OnContainerWalk(void* instance, MWALKTICKETS_ACTION action, void* context, int type)
 {
-    if (!instance)
-        return 0;
-    TracedContainer const& container = ContainerOf(instance);
+    Container const container = ContainerOf(instance);
     TracedCall const call(Call::MWalk);
     call.Began(container.session, type);
     WalkingTickets walking{call, container.session, action, context};
-    int const result = container.real->MWALKTICKETS(container.real->Instance,
-                                                    action ? OnWalkedTicket : nullptr, &walking, type);
+    int const result =
+        container.real->MWALKTICKETS(container.instance, action ? OnWalkedTicket : nullptr, &walking, type);
     call.Ended(result, walking.tickets);
     return result;
 }
@@ -310,9 +343,7 @@ int OnContainerWalk(void* instance, MWALKTICKETS_ACTION action, void* context, i
 int OnContainerSet(void* instance, int ticketType, int id, char const* key, PARAM_TYPE type,
                    void const* value, int pos)
 {
-    if (!instance)
-        return 0;
-    TracedContainer const& container = ContainerOf(instance);
+    Container const container = ContainerOf(instance);
     TracedCall const call(Call::MSet);
     if (call.IsTraced())
         call.Make(Kind::Began)
@@ -325,30 +356,26 @@ int OnContainerSet(void* instance, int ticketType, int id, char const* key, PARA
             .AddWritten(key, type, value)
             .Put();
     int const result =
-        container.real->MSETPARAMETER(container.real->Instance, ticketType, id, key, type, value, pos);
+        container.real->MSETPARAMETER(container.instance, ticketType, id, key, type, value, pos);
     call.Ended(result);
     return result;
 }
 
 int OnContainerSetTable(void* instance, int type, int id, SETMULTIPAR* table)
 {
-    if (!instance)
-        return 0;
-    TracedContainer const& container = ContainerOf(instance);
+    Container const container = ContainerOf(instance);
     TracedCall const call(Call::MSetTable);
     if (call.IsTraced())
         call.Began(container.session, type, id, LengthOf(table));
-    return EndedTable(call, container.real->MSETMULTIPAR(container.real->Instance, type, id, table), table);
+    return EndedTable(call, container.real->MSETMULTIPAR(container.instance, type, id, table), table);
 }
 
 int OnOperation(void* instance, int type, int id, TICKET_OP op, void* arg)
 {
-    if (!instance)
-        return 0;
-    TracedContainer const& container = ContainerOf(instance);
+    Container const container = ContainerOf(instance);
     TracedCall const call(Call::MOperation);
     call.Began(container.session, type, id, op.GetInt());
-    int const result = container.real->MOPERATION(container.real->Instance, type, id, op, arg);
+    int const result = container.real->MOPERATION(container.instance, type, id, op, arg);
     if (result && arg && op.GetInt() == MTICKET_OP_OPEN)
     {
         auto& opened = *static_cast<STICKET_ACCESS const**>(arg);
@@ -364,28 +391,22 @@ int OnOperation(void* instance, int type, int id, TICKET_OP op, void* arg)
 
 int OnSwitch(void* instance, int type, int id, int notification, bool enable, char const* const* keys)
 {
-    if (!instance)
-        return 0;
-    TracedContainer const& container = ContainerOf(instance);
+    Container const container = ContainerOf(instance);
     TracedCall const call(Call::MSwitch);
     if (call.IsTraced())
         call.Began(container.session, type, id, notification, enable ? 1 : 0, LengthOf(keys));
-    int const result =
-        container.real->MENDISNOTIF(container.real->Instance, type, id, notification, enable, keys);
+    int const result = container.real->MENDISNOTIF(container.instance, type, id, notification, enable, keys);
     call.Ended(result);
     return result;
 }
 
 STICKET_ACCESS const* OnCreate(void* instance, int type, int id, char const* const* keys)
 {
-    if (!instance)
-        return nullptr;
-    TracedContainer const& container = ContainerOf(instance);
+    Container const container = ContainerOf(instance);
     TracedCall const call(Call::MCreate);
     if (call.IsTraced())
         call.Began(container.session, type, id, LengthOf(keys));
-    STICKET_ACCESS const* const made =
-        container.real->MCREATETICKET(container.real->Instance, type, id, keys);
+    STICKET_ACCESS const* const made = container.real->MCREATETICKET(container.instance, type, id, keys);
     call.Ended(At(made));
     return CopyOf(made, container.session);
 }

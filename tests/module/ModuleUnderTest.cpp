@@ -14,8 +14,10 @@ using FACTORY = void* (*)(CFAllocatorRef, CFUUIDRef);
 
 FACTORY Factory()
 {
-    void* const executable = dlopen(COMGUI_MODULE_FILE, RTLD_NOW | RTLD_LOCAL);
-    void* const factory = executable ? dlsym(executable, "ComGUIModuleFactory") : nullptr;
+    char const* const other = std::getenv("COMGUI_TEST_MODULE");  // the trace, in front of the module
+    void* const executable = dlopen(other ? other : COMGUI_MODULE_FILE, RTLD_NOW | RTLD_LOCAL);
+    void* const factory =
+        executable ? dlsym(executable, other ? "ComGUITraceFactory" : "ComGUIModuleFactory") : nullptr;
     if (!factory)
         throw std::runtime_error(dlerror());
     return reinterpret_cast<FACTORY>(factory);
