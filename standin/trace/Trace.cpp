@@ -164,9 +164,15 @@ Trace::Trace()
     char const* const wish = std::getenv("COMGUI_TRACE");
     ring->Switch(!wish || std::string_view(wish) != "off");
     m_ring = std::move(ring);
+    s_switch = &m_ring->TheSwitch();
     static Writer const writer(*m_ring, file, name + RingSuffix);
     // A child has no writer, and must not write into its parent's ring.
-    pthread_atfork(nullptr, nullptr, [] { (void)Trace::Get().m_ring.release(); });
+    pthread_atfork(nullptr, nullptr,
+                   []
+                   {
+                       s_switch = &AlwaysOff;
+                       (void)Trace::Get().m_ring.release();
+                   });
 }
 
 Record::Record(Kind kind, Call call, std::uint64_t number) noexcept

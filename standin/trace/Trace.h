@@ -18,7 +18,11 @@ public:
     // Made at the first call; ends its work at the end of the process.
     static Trace& Get();
 
-    bool IsOn() const noexcept { return m_ring && m_ring->IsOn(); }
+    // False before the trace is made, too.
+    static bool IsOn() noexcept
+    {
+        return s_switch.load(std::memory_order_relaxed)->load(std::memory_order_relaxed) != 0;
+    }
     void Switch(bool on) noexcept
     {
         if (m_ring)
@@ -38,6 +42,9 @@ private:
     class Writer;
 
     Trace();
+
+    static constexpr std::atomic<std::uint32_t> AlwaysOff{0};
+    static inline constinit std::atomic<std::atomic<std::uint32_t> const*> s_switch{&AlwaysOff};
 
     std::unique_ptr<TraceRing> m_ring;  // null: nothing can be traced
     std::uint64_t m_start = 0;
@@ -88,9 +95,8 @@ class TracedCall
 public:
     explicit TracedCall(Call call) noexcept : m_call(call)
     {
-        Trace& trace = Trace::Get();
-        if (trace.IsOn())
-            m_number = trace.NextNumber();
+        if (Trace::IsOn())
+            m_number = Trace::Get().NextNumber();
     }
 
     bool IsTraced() const noexcept { return m_number != 0; }

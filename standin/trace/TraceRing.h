@@ -29,6 +29,7 @@ public:
 
     // Whether records are wanted, a switch that any process may turn.
     bool IsOn() const noexcept { return m_head->isOn.load(std::memory_order_relaxed) != 0; }
+    std::atomic<std::uint32_t> const& TheSwitch() const noexcept { return m_head->isOn; }
     void Switch(bool on) noexcept { m_head->isOn.store(on ? 1 : 0, std::memory_order_relaxed); }
 
     // record: begins with a RecordHead that tells its size, which is LargestRecord at most.

@@ -181,6 +181,11 @@ Ticket TicketOf(void* instance)
 
 int OnGet(void* instance, char const* key, PARAM_TYPE type, void* value, int pos)
 {
+    if (instance && !Trace::IsOn()) [[likely]]
+    {
+        STICKET_ACCESS const& words = static_cast<TracedTicket const*>(instance)->words;
+        return words.SGETPARAMETER(words.Instance, key, type, value, pos);
+    }
     Ticket const ticket = TicketOf(instance);
     TracedCall const call(Call::SGet);
     call.Began(ticket.session, At(ticket.real), key, int{type}, pos);
@@ -289,6 +294,11 @@ Container ContainerOf(void* instance)
 int OnContainerGet(void* instance, int ticketType, int id, char const* key, PARAM_TYPE type, void* value,
                    int pos)
 {
+    if (instance && !Trace::IsOn()) [[likely]]
+    {
+        MTICKET_ACCESS const& words = static_cast<TracedContainer const*>(instance)->words;
+        return words.MGETPARAMETER(words.Instance, ticketType, id, key, type, value, pos);
+    }
     Container const container = ContainerOf(instance);
     TracedCall const call(Call::MGet);
     call.Began(container.session, ticketType, id, key, int{type}, pos);
@@ -421,7 +431,7 @@ void Put(Slot& slot, Slot traced)
 }  // namespace
 
 TracedTicket::TracedTicket(STICKET_ACCESS const* realTable, void* ofSession)
-    : real(realTable), session(ofSession), m_access(*realTable)
+    : real(realTable), words(*realTable), session(ofSession), m_access(*realTable)
 {
     m_access.Instance = this;
     Put(m_access.SGETPARAMETER, OnGet);
@@ -433,7 +443,7 @@ TracedTicket::TracedTicket(STICKET_ACCESS const* realTable, void* ofSession)
 }
 
 TracedContainer::TracedContainer(MTICKET_ACCESS const* realTable, void* ofSession)
-    : real(realTable), session(ofSession), m_access(*realTable)
+    : real(realTable), words(*realTable), session(ofSession), m_access(*realTable)
 {
     m_access.Instance = this;
     Put(m_access.MGETPARAMETER, OnContainerGet);

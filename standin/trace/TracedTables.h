@@ -18,7 +18,8 @@ public:
 
     STICKET_ACCESS const* Access() const { return &m_access; }
 
-    STICKET_ACCESS const* const real;  // where it was; its words are read from here, as a host would
+    STICKET_ACCESS const* const real;
+    STICKET_ACCESS const words;  // those of the real table
     void* const session;
 
 private:
@@ -35,6 +36,7 @@ public:
     MTICKET_ACCESS const* Access() const { return &m_access; }
 
     MTICKET_ACCESS const* const real;
+    MTICKET_ACCESS const words;
     void* const session;
 
 private:
