@@ -77,6 +77,7 @@ TEST_F(Entries, Login_RefusedByTheAuthor_LeavesTheRecord)
 TEST_F(Entries, Login_WithFieldsThatAreFull_TakesThemToTheLastByte)
 {
     std::memset(record.szLocalAddress, 'x', sizeof record.szLocalAddress);
+    std::memset(record.szLocalEndPoint, 'y', sizeof record.szLocalEndPoint);
     ASSERT_EQ(table.LoginEntry(hInstance, &record), 0);
     EXPECT_EQ(std::string(record.szLocalEndPoint), std::string(127, 'x'));
 }

@@ -3,6 +3,7 @@
 #include "tests/module_kit/FakePlugIn.h"
 #include <chrono>
 #include <condition_variable>
+#include <functional>
 #include <gmock/gmock.h>
 #include <thread>
 
@@ -276,6 +277,89 @@ TEST_F(NotificationsOfTheKit, AnotherRegistration_TakesThePlaceOfTheFirst)
     EXPECT_THAT(other.Await(1), ElementsAre(Line("1", " K[-1]=1")));
     EXPECT_THAT(client.Lines(), IsEmpty());
     EXPECT_EQ(table.LogoutEntry(hInstance, hSession), 0);  // before the other client goes
+}
+
+namespace
+{
+// A client whose calls wait until they are let go, and a second thread that wants something meanwhile.
+class WhileACallRuns : public testing::Test
+{
+protected:
+    WhileACallRuns()
+    {
+        EXPECT_TRUE(notifications.Register(session, id, plugin::Callback(Hang, this)));
+        EXPECT_TRUE(notifications.Enable(session, id, ticket, {}));
+        notifications.Changed(ticket, {{"K", 1}});
+        while (!isInside)
+            std::this_thread::yield();
+    }
+
+    static void Hang(void* user, int, int, int, int, void*)
+    {
+        auto& self = *static_cast<WhileACallRuns*>(user);
+        self.isInside = true;
+        std::lock_guard const wait(self.m_hanging);
+        ++self.calls;
+    }
+
+    // Runs it on another thread, looks that it waits for the call, and lets that go.
+    void ExpectToWait(std::function<void()> const& work)
+    {
+        int callsAtItsEnd = 0;
+        std::atomic<bool> isDone{false};
+        std::thread other(
+            [&]
+            {
+                work();
+                callsAtItsEnd = calls;
+                isDone = true;
+            });
+        std::this_thread::sleep_for(50ms);
+        EXPECT_FALSE(isDone);
+        m_lock.unlock();
+        other.join();
+        EXPECT_EQ(callsAtItsEnd, 1);
+        std::this_thread::sleep_for(50ms);
+        EXPECT_EQ(calls, 1);  // none came behind it
+    }
+
+    plugin::Address const ticket{3, 1};
+    plugin::Session const session;
+    plugin::Notifications notifications;
+    int const id = notifications.NewId();
+    std::atomic<bool> isInside{false};
+    std::atomic<int> calls{0};
+
+private:
+    std::mutex m_hanging;
+    std::unique_lock<std::mutex> m_lock{m_hanging};
+};
+}  // namespace
+
+TEST_F(WhileACallRuns, TheEndOfASession_WaitsForIt)
+{
+    notifications.Changed(ticket, {{"K", 2}});
+    ExpectToWait([&] { notifications.Remove(session); });
+}
+
+TEST_F(WhileACallRuns, SwitchingOff_WaitsForItAndTakesBackWhatWaits)
+{
+    notifications.Changed(ticket, {{"K", 2}});
+    ExpectToWait([&] { EXPECT_TRUE(notifications.Disable(session, id, ticket)); });
+}
+
+TEST(NotificationsAtTheirEnd, ASessionThatIsSilent_IsNotRegistered)
+{
+    plugin::Notifications notifications;
+    plugin::Session session;
+    session.Begin(notifications);
+    session.Silence();
+    plugin::MemoryTicket answer;
+    auto const hear = [](void*, int, int, int, int, void*) { ADD_FAILURE() << "called after the end"; };
+    EXPECT_EQ(session.SetCallback(plugin::Callback(hear, nullptr), *answer.Access()), plugin::UnknownSession);
+    int const id =
+        *std::get_if<int>(&static_cast<plugin::Value const&>(answer.Read("iGUINotificationID", 0)));
+    EXPECT_FALSE(notifications.Enable(session, id, {3, 1}, {}));
 }
 
 TEST(NotificationsAtTheirEnd, Stop_WaitsNoLongerThanToldForACallThatHangs)
