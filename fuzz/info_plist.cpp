@@ -171,7 +171,12 @@ void AsEntries(INPUT input)
             if (factory)
                 factories.push_back(*factory);
         }
-        types += Entry(key, Element(isOfTheTypeDue ? "array" : "dict", isOfTheTypeDue ? array : ""));
+        bool const isSingle = factories.size() == 1 && input.Among(2) == 1;
+        if (isSingle && isOfTheTypeDue)
+            array = Text("string", TextOf(factories[0]));
+        types += Entry(key, isSingle && isOfTheTypeDue
+                                ? array
+                                : Element(isOfTheTypeDue ? "array" : "dict", isOfTheTypeDue ? array : ""));
         if (uuid && isOfTheTypeDue)
             expected.factories.emplace(*uuid, factories);
     }

@@ -47,6 +47,11 @@ void ForEachUuid(plist_t dictionary, VISIT visit)
     }
 }
 
+bool IsListOrText(plist_t node)
+{
+    return plist_get_node_type(node) == PLIST_ARRAY || plist_get_node_type(node) == PLIST_STRING;
+}
+
 // Of an array of texts, or of a single text.
 std::vector<Uuid> UuidsOf(plist_t value)
 {
@@ -117,6 +122,8 @@ std::map<Uuid, std::vector<Uuid>> FactoriesOf(plist_t root, std::map<Uuid, std::
         ForEachUuid(entries,
                     [&](Uuid const& type, plist_t value)
                     {
+                        if (!IsListOrText(value))
+                            return;
                         auto uuids = UuidsOf(value);
                         std::erase_if(uuids, [&](Uuid const& uuid) { return !functions.contains(uuid); });
                         factories.emplace(type, std::move(uuids));

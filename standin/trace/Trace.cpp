@@ -189,7 +189,7 @@ Record& Record::AddText(Field field, char const* bytes, std::size_t size) noexce
     if (room < 7)
         return *this;
     auto const here = static_cast<std::uint16_t>(std::min({size, MostOfAText, room - 7}));
-    char* const out = m_fields + m_head.size - sizeof m_head;
+    char* const out = m_fields + (m_head.size - sizeof m_head);
     out[0] = static_cast<char>(field);
     std::memcpy(out + 1, &length, sizeof length);
     std::memcpy(out + 5, &here, sizeof here);

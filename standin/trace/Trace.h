@@ -76,9 +76,10 @@ private:
     {
         if (m_head.size + 1 + size > LargestRecord)
             return *this;
-        m_fields[m_head.size - sizeof m_head] = static_cast<char>(field);
+        char* const out = m_fields + (m_head.size - sizeof m_head);
+        *out = static_cast<char>(field);
         if (size)
-            std::memcpy(m_fields + m_head.size - sizeof m_head + 1, bytes, size);
+            std::memcpy(out + 1, bytes, size);
         m_head.size = static_cast<std::uint16_t>(m_head.size + 1 + size);
         return *this;
     }

@@ -6,8 +6,11 @@
 #include "standin/trace/Trace.h"
 #include "standin/trace/TracedTables.h"
 #include <cstring>
+#include <mutex>
+#include <set>
 #include <string>
 #include <string_view>
+#include <utility>
 
 namespace trace
 {
@@ -132,7 +135,20 @@ struct TracedCallback
 {
     ClientCallback function;
     void* user;
+
+    bool operator<(TracedCallback const& other) const
+    {
+        return std::pair(function, user) < std::pair(other.function, other.user);
+    }
 };
+
+TracedCallback const& Kept(TracedCallback const& callback)
+{
+    static auto& lock = *new std::mutex;
+    static auto& all = *new std::set<TracedCallback>;
+    std::lock_guard const guard(lock);
+    return *all.insert(callback).first;
+}
 
 void OnCallback(void* context, int kind, int argA, int argB, int code, void* data)
 {
@@ -183,9 +199,9 @@ public:
         m_user = PointerIn(*ticket, UserKey);
         if (!m_function)
             return;
-        auto* const traced = new TracedCallback{reinterpret_cast<ClientCallback>(m_function), m_user};
+        TracedCallback const& traced = Kept({reinterpret_cast<ClientCallback>(m_function), m_user});
         PutPointer(*ticket, FunctionKey, reinterpret_cast<void*>(OnCallback));
-        PutPointer(*ticket, UserKey, traced);
+        PutPointer(*ticket, UserKey, const_cast<TracedCallback*>(&traced));
     }
     ~Exchanged()
     {
