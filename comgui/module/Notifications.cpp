@@ -32,7 +32,7 @@ KeySelection const* Notifications::Listener::Wants(Address ticket) const
 
 Notifications::~Notifications() { Stop(std::chrono::hours(24)); }
 
-void Notifications::Changed(Address ticket, std::vector<Parameter> parameters)
+void Notifications::Changed(Address ticket, std::vector<Parameter> const& parameters)
 {
     Post(ParametersChanged, ticket, parameters);
 }
@@ -42,7 +42,7 @@ void Notifications::Created(Address ticket) { Post(TicketCreated, ticket, {}); }
 void Notifications::Deleted(Address ticket) { Post(TicketDeleted, ticket, {}); }
 
 void Notifications::Tell(Session const& session, int kind, int argA, int code,
-                         std::vector<Parameter> parameters)
+                         std::vector<Parameter> const& parameters)
 {
     std::lock_guard const lock(m_lock);
     for (auto const& listener : m_listeners)

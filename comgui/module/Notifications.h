@@ -29,12 +29,12 @@ public:
     Notifications& operator=(Notifications const&) = delete;
 
     // For the author: to be called when a change is visible to those who read.
-    void Changed(Address ticket, std::vector<Parameter> parameters);
+    void Changed(Address ticket, std::vector<Parameter> const& parameters);
     void Created(Address ticket);
     void Deleted(Address ticket);
 
     // One session, whatever it has switched on; nothing if it has not registered.
-    void Tell(Session const& session, int kind, int argA, int code, std::vector<Parameter> parameters);
+    void Tell(Session const& session, int kind, int argA, int code, std::vector<Parameter> const& parameters);
 
     // For the kit. An id that no registration has had.
     int NewId();

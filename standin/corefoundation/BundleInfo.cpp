@@ -100,7 +100,7 @@ std::string ExecutableOf(plist_t root, fs::path const& bundle)
 std::map<Uuid, std::string> FunctionsOf(plist_t root)
 {
     std::map<Uuid, std::string> functions;
-    plist_t const entries = plist_dict_get_item(root, "CFPlugInFactories");
+    plist_t entries = plist_dict_get_item(root, "CFPlugInFactories");
     if (IsDictionary(entries))
     {
         ForEachUuid(entries,
@@ -116,7 +116,7 @@ std::map<Uuid, std::string> FunctionsOf(plist_t root)
 std::map<Uuid, std::vector<Uuid>> FactoriesOf(plist_t root, std::map<Uuid, std::string> const& functions)
 {
     std::map<Uuid, std::vector<Uuid>> factories;
-    plist_t const entries = plist_dict_get_item(root, "CFPlugInTypes");
+    plist_t entries = plist_dict_get_item(root, "CFPlugInTypes");
     if (IsDictionary(entries))
     {
         ForEachUuid(entries,

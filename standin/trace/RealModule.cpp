@@ -90,14 +90,14 @@ private:
     }
 };
 
-CFPlugInRef OpenBundle(std::string const& bundle)
+Owner<CFPlugInRef> OpenBundle(std::string const& bundle)
 {
     Passed const here;
     auto const text = NewString(bundle.c_str());
     Owner<CFURLRef> const url(
         text ? CFURLCreateWithFileSystemPath(kCFAllocatorDefault, text.get(), kCFURLPOSIXPathStyle, true)
              : nullptr);
-    return url ? CFPlugInCreate(kCFAllocatorDefault, url.get()) : nullptr;
+    return Owner<CFPlugInRef>(url ? CFPlugInCreate(kCFAllocatorDefault, url.get()) : nullptr);
 }
 
 void* NewInstance(CFPlugInRef plugIn)
@@ -135,10 +135,10 @@ RealModule* RealModule::Load()
 
 RealModule* RealModule::Load(std::string const& bundle)
 {
-    CFPlugInRef const plugIn = OpenBundle(bundle);
+    auto plugIn = OpenBundle(bundle);
     if (!plugIn)
         return Complain(bundle, "no bundle");
-    void* const object = NewInstance(plugIn);
+    void* const object = NewInstance(plugIn.get());
     if (!object)
         return Complain(bundle, "no plug-in in it");
     void* found = nullptr;
@@ -146,6 +146,7 @@ RealModule* RealModule::Load(std::string const& bundle)
         .QueryInterface(object, BytesOf(NewUuid(COMGUI_INTERFACE_UUID).get()), &found);
     if (!found)
         return Complain(bundle, "its plug-in has no interface");
+    static_cast<void>(plugIn.release());  // stays, as the library keeps its own
     return new RealModule(object, **static_cast<ComGUIModuleInterface**>(found));
 }
 

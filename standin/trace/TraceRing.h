@@ -96,11 +96,11 @@ public:
 private:
     struct Head
     {
-        char magic[8];
-        std::atomic<std::uint32_t> isOn;
         alignas(64) std::atomic<std::uint64_t> begin;  // taken out up to here
         alignas(64) std::atomic<std::uint64_t> end;    // put in
         alignas(64) std::atomic<std::uint64_t> dropped;
+        std::atomic<std::uint32_t> isOn;
+        char magic[8];
     };
     struct Slot
     {
