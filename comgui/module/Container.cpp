@@ -58,8 +58,9 @@ public:
     bool Walk(SWALKPARAMETERS_ACTION action, void* context, char const* prefix, int) override
     {
         At source{m_container, m_ticket};
-        return IsOpen() && m_container.Exists(m_ticket) &&
-               AnswerWalk(source, m_container.m_kept, action, context, prefix);
+        auto const kept = m_container.Kept();
+        return kept && IsOpen() && m_container.Exists(m_ticket) &&
+               AnswerWalk(source, *kept, action, context, prefix);
     }
     bool Option(int code, void* out) override
     {
@@ -103,19 +104,21 @@ void Container::Withdraw() noexcept
     std::lock_guard const lock(m_lock);
     for (auto const& [address, ticket] : m_opened)
         ticket->Withdraw();
-    m_kept.Clear();
+    m_kept.reset();
 }
 
 bool Container::Get(Address ticket, char const* key, PARAM_TYPE type, void* value, int pos)
 {
     At source{*this, ticket};
-    return IsThere(ticket) && AnswerRead(source, m_kept, key, type, value, pos);
+    auto const kept = Kept();
+    return kept && IsThere(ticket) && AnswerRead(source, *kept, key, type, value, pos);
 }
 
 bool Container::GetTable(Address ticket, GETMULTIPAR* table)
 {
     At source{*this, ticket};
-    return IsThere(ticket) && AnswerTableRead(source, *this, m_kept, table);
+    auto const kept = Kept();
+    return kept && IsThere(ticket) && AnswerTableRead(source, *this, *kept, table);
 }
 
 bool Container::Set(Address ticket, char const* key, PARAM_TYPE type, void const* value, int pos)
@@ -128,6 +131,12 @@ bool Container::SetTable(Address ticket, SETMULTIPAR* table)
 {
     At source{*this, ticket};
     return IsThere(ticket) && AnswerTableWrite(source, *this, table);
+}
+
+std::shared_ptr<KeptValues> Container::Kept()
+{
+    std::lock_guard const lock(m_lock);
+    return m_kept;
 }
 
 bool Container::IsThere(Address ticket) { return IsTicket(ticket) && Exists(ticket); }

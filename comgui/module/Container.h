@@ -82,8 +82,12 @@ private:
     bool CreateNextInto(Address ticket, void* arg);
 
     Session& m_session;
-    KeptValues m_kept;
-    std::mutex m_lock;
+    // What calls have handed out, for as long as one may use it: a call under way at the logout goes on. Null
+    // after the logout.
+    std::shared_ptr<KeptValues> Kept();
+
+    std::mutex m_lock;  // of all below
+    std::shared_ptr<KeptValues> m_kept = std::make_shared<KeptValues>();
     std::map<Address, std::unique_ptr<Opened>> m_opened;  // closed ones too: hosts may hold their tables
 };
 }  // namespace comgui::plugin

@@ -40,14 +40,6 @@ public:
         return *position;
     }
 
-    void Clear()
-    {
-        std::lock_guard<std::mutex> const lock(m_lock);
-        m_values.clear();
-        m_old.clear();
-        m_weight = 0;
-    }
-
     std::size_t Count() const
     {
         std::lock_guard<std::mutex> const lock(m_lock);
@@ -89,11 +81,5 @@ struct KeptValues
 
     Kept<std::string> texts{KeptFor};           // bytes too
     Kept<unsigned long long> numbers{KeptFor};  // of walks; a short number's bytes come first
-
-    void Clear()
-    {
-        texts.Clear();
-        numbers.Clear();
-    }
 };
 }  // namespace comgui::plugin
