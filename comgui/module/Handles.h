@@ -5,7 +5,6 @@
 
 #include <array>
 #include <atomic>
-#include <bit>
 #include <cstdint>
 #include <mutex>
 #include <new>
@@ -25,7 +24,7 @@ public:
         std::uintptr_t const handle = Kind << KindBit | place.uses << UseBit | index;
         place.object.store(&object, std::memory_order_relaxed);
         place.handle.store(handle, std::memory_order_release);
-        return std::bit_cast<void*>(handle);
+        return reinterpret_cast<void*>(handle);
     }
 
     // The object that had the handle; null if it has none any more. Calls that found it before may go on.
@@ -39,7 +38,7 @@ public:
         if (++place->uses < MostUses)  // else nobody ever gets the place again
         {
             place->nextFree = m_firstFree;
-            m_firstFree = static_cast<std::uint32_t>(std::bit_cast<std::uintptr_t>(handle) & IndexMask);
+            m_firstFree = static_cast<std::uint32_t>(reinterpret_cast<std::uintptr_t>(handle) & IndexMask);
         }
         return place->object.exchange(nullptr, std::memory_order_acq_rel);
     }
@@ -80,7 +79,7 @@ private:
 
     Place* PlaceThatHas(void const* handle) const noexcept
     {
-        auto const given = std::bit_cast<std::uintptr_t>(handle);
+        auto const given = reinterpret_cast<std::uintptr_t>(handle);
         Place* const place = PlaceOf(given & IndexMask);
         return place && place->handle.load(std::memory_order_acquire) == given ? place : nullptr;
     }

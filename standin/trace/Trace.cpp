@@ -207,7 +207,7 @@ Record& Record::AddWritten(char const* key, PARAM_TYPE type, void const* word) n
 {
     if (type == PARAM_POINTER)
         return Add(word);
-    if (!word)
+    if (!word || type == PARAM_NONE || type == PARAM_COUNT)  // of these nobody may follow the word
         return AddNone();
     if (type == PARAM_STRING)
         return AddRead(key, type, &word);
