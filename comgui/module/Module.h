@@ -24,10 +24,10 @@ struct Credentials
     std::string user;
     std::string password;
     std::string host;
-    int port;
-    int stamp;  // of the client
+    int port = 0;
+    int stamp = 0;  // of the client
     std::string localAddress;
-    unsigned int localPort;
+    unsigned int localPort = 0;
 };
 
 // The answer. Without a session the login is refused.
