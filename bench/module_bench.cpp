@@ -23,8 +23,8 @@ bool Answer(char const* key, PARAM_TYPE type, void* value)
     return instance && Answer(key, type, value) ? 1 : 0;
 }
 
-[[gnu::noinline]] int BareContainerGet(void* instance, int, int, char const* key, PARAM_TYPE type, void* value,
-                                    int)
+[[gnu::noinline]] int BareContainerGet(void* instance, int, int, char const* key, PARAM_TYPE type,
+                                       void* value, int)
 {
     return instance && Answer(key, type, value) ? 1 : 0;
 }

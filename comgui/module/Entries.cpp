@@ -138,10 +138,15 @@ void Put(std::string const& text, char (&field)[128])
 struct WipedCredentials : Credentials
 {
     explicit WipedCredentials(TLogin const& login)
-        : Credentials{TextOf(login.szUser), TextOf(login.szPassword), TextOf(login.szServerHost),
-                      login.iServerPort,    login.iClientStamp,       TextOf(login.szLocalAddress),
-                      login.iLocalPort}
     {
+        user = TextOf(login.szUser);
+        // No other text has held it.
+        password.assign(login.szPassword, strnlen(login.szPassword, sizeof login.szPassword));
+        host = TextOf(login.szServerHost);
+        port = login.iServerPort;
+        stamp = login.iClientStamp;
+        localAddress = TextOf(login.szLocalAddress);
+        localPort = login.iLocalPort;
     }
     ~WipedCredentials()
     {
