@@ -14,8 +14,7 @@ struct STicketFactory
     // result, which goes back through DestroyTicket; null if there is no such ticket.
     STICKET_ACCESS const* (*CreateTicket)(char const* path);
 
-    // Destroys *ticket and may clear the caller's pointer. Every change is in its file when this has
-    // returned.
+    // Destroys *ticket and may clear the caller's pointer; its changes are in its file then.
     void (*DestroyTicket)(STICKET_ACCESS const** ticket);
 };
 static_assert(std::is_standard_layout_v<STicketFactory>);
