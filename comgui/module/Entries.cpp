@@ -164,7 +164,7 @@ int LogIn(Module& module, TLogin& login)
         return LoginRefused;
     answer.session->Begin(module.GetNotifications());
     login.hSession = sessions.Add(*answer.session);
-    answer.session.release();
+    static_cast<void>(answer.session.release());  // the table's from here on
     login.iClientStamp = answer.userTicket;
     login.iUserRole = answer.role;
     Put(answer.endPoint, login.szLocalEndPoint);
@@ -368,7 +368,7 @@ int Open(GetModule module, void** hInstance) noexcept
                                   return InvalidArgument;
                               auto instance = std::make_unique<Instance>(made);
                               *hInstance = instances.Add(*instance);
-                              instance.release();
+                              static_cast<void>(instance.release());  // the table's from here on
                               return Done;
                           });
     }
