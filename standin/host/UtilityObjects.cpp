@@ -2,6 +2,7 @@
 
 #include <dlfcn.h>
 #include <filesystem>
+#include <mutex>
 #include <system_error>
 #ifdef __APPLE__
 #    include <mach-o/dyld.h>
@@ -22,12 +23,32 @@ fs::path FullPath(fs::path const& path)
     return error ? path : full;
 }
 
-// Made on first use: nothing of this library runs while it is being loaded.
-fs::path& ChosenFolder()
+// The folder that was set, empty if none was.
+class ChosenFolder
 {
-    static fs::path folder;
-    return folder;
-}
+public:
+    // Made on first use: nothing of this library runs while it is being loaded.
+    static ChosenFolder& OfThisProcess()
+    {
+        static ChosenFolder folder;
+        return folder;
+    }
+
+    fs::path Get()
+    {
+        std::lock_guard const lock(m_lock);
+        return m_path;
+    }
+    void Set(fs::path path)
+    {
+        std::lock_guard const lock(m_lock);
+        m_path = std::move(path);
+    }
+
+private:
+    std::mutex m_lock;
+    fs::path m_path;
+};
 
 fs::path ProgramFolder()
 {
@@ -52,8 +73,8 @@ fs::path LibraryFolder()
 
 fs::path PlugInsFolder(fs::path const& bundleName)
 {
-    if (!ChosenFolder().empty())
-        return ChosenFolder();
+    if (fs::path chosen = ChosenFolder::OfThisProcess().Get(); !chosen.empty())
+        return chosen;
     fs::path const besideProgram = ProgramFolder() / "PlugIns";
     std::error_code error;
     return fs::exists(besideProgram / bundleName, error) ? besideProgram : LibraryFolder();
@@ -68,5 +89,5 @@ void UtilityObjects::GetPlugInsPath(wxString& path, wchar_t const* bundleName)
 
 void UtilityObjects::SetPlugInsFolder(wxString const& folder)
 {
-    ChosenFolder() = folder.empty() ? fs::path() : FullPath(PathOf(folder));
+    ChosenFolder::OfThisProcess().Set(folder.empty() ? fs::path() : FullPath(PathOf(folder)));
 }

@@ -10,8 +10,8 @@ TicketAddress Of(comgui::plugin::Address address) { return {address.type, addres
 }  // namespace
 
 Container::Container(standin::Server& server, std::shared_ptr<standin::Session> session)
-    : m_server(server), m_session(std::move(session)), m_folders(server.Tickets()),
-      m_opened(server.Tickets(), *m_session, m_folders, m_numbers)
+    : m_server(server), m_session(std::move(session)), m_gate(server.Troubles(), *m_session),
+      m_folders(server.Tickets()), m_opened(server.Tickets(), *m_session, m_gate, m_folders, m_numbers)
 {
 }
 
@@ -31,21 +31,25 @@ void Container::Withdraw() noexcept
 
 bool Container::Get(Address ticket, char const* key, PARAM_TYPE type, void* value, int pos)
 {
+    m_gate.Pass("MGETPARAMETER", Of(ticket));
     return MayRead() && ReadTicket(Tickets(), *m_session, Of(ticket), 0, key, type, value, pos);
 }
 
 bool Container::GetTable(Address ticket, GETMULTIPAR* table)
 {
+    m_gate.Pass("MGETMULTIPAR", Of(ticket));
     return MayRead() && ReadTable(Tickets(), *m_session, Of(ticket), 0, table);
 }
 
 bool Container::Set(Address ticket, char const* key, PARAM_TYPE type, void const* value, int pos)
 {
+    m_gate.Pass("MSETPARAMETER", Of(ticket));
     return WriteTicket(Tickets(), *m_session, Of(ticket), 0, key, type, value, pos);
 }
 
 bool Container::SetTable(Address ticket, SETMULTIPAR* table)
 {
+    m_gate.Pass("MSETMULTIPAR", Of(ticket));
     return WriteTable(Tickets(), *m_session, Of(ticket), 0, table);
 }
 
@@ -88,6 +92,7 @@ bool Container::HandOutFolders(TicketAddress address, void* arg)
 bool Container::Operation(Address ticket, TICKET_OP op, void* arg)
 {
     TicketAddress const address = Of(ticket);
+    m_gate.Pass("MOPERATION", address);
     switch (op.GetInt())
     {
     case STICKET_OP_SET_PARTIAL:
@@ -110,6 +115,7 @@ bool Container::Operation(Address ticket, TICKET_OP op, void* arg)
 // Over the tickets that there are at the beginning, so that a walk that makes tickets comes to an end.
 bool Container::WalkTickets(MWALKTICKETS_ACTION action, void* context, int type)
 {
+    m_gate.Pass("MWALKTICKETS");
     if (!action || m_session->Ended() || !IsValid({type, 0}))
         return false;
     std::vector<int> ids;
@@ -122,7 +128,7 @@ bool Container::WalkTickets(MWALKTICKETS_ACTION action, void* context, int type)
             break;
         if (incarnation == 0)
             continue;
-        OpenTicket ticket(Tickets(), *m_session, m_folders, m_numbers, {type, id}, incarnation);
+        OpenTicket ticket(Tickets(), *m_session, m_gate, m_folders, m_numbers, {type, id}, incarnation);
         if (!action(context, type, id, ticket.Access()))
             break;
     }
@@ -131,6 +137,7 @@ bool Container::WalkTickets(MWALKTICKETS_ACTION action, void* context, int type)
 
 bool Container::Switch(Address tickets, int notification, bool enable, char const* const* keys)
 {
+    m_gate.Pass("MENDISNOTIF", Of(tickets));
     NotificationService& service = m_server.Notifications();
     if (!enable)
         return service.Disable(*m_session, notification, Of(tickets));
@@ -140,6 +147,7 @@ bool Container::Switch(Address tickets, int notification, bool enable, char cons
 
 STICKET_ACCESS const* Container::CreateTicket(Address ticket, char const* const* keys)
 {
+    m_gate.Pass("MCREATETICKET", Of(ticket));
     auto const made = Tickets().Create(*m_session, Of(ticket));
     if (!made)
         return nullptr;

@@ -4,6 +4,7 @@
 #pragma once
 
 #include "comgui/module/ContainerSlots.h"
+#include "standin/module/Gate.h"
 #include "standin/module/OpenTickets.h"
 #include "standin/server/site/Server.h"
 
@@ -18,6 +19,7 @@ public:
 
     standin::Server& Server() const { return m_server; }
     standin::Session& Session() const { return *m_session; }
+    Gate const& EveryCall() const { return m_gate; }
 
     // False if the session had ended before.
     bool EndSession();
@@ -42,6 +44,7 @@ private:
 
     standin::Server& m_server;
     std::shared_ptr<standin::Session> const m_session;
+    Gate const m_gate;
     FolderTranslator m_folders;
     std::shared_ptr<WalkedNumbers> m_ownNumbers =
         std::make_shared<WalkedNumbers>();  // until the session ends

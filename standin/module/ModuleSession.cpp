@@ -39,8 +39,22 @@ void Tell(Callback const& callback, Notification const& notification)
 }
 }  // namespace
 
+bool ModuleSession::HasEnded() const
+{
+    if (EveryCall().HasLostSession())
+        m_container.EndSession();
+    return GetSession().Ended();
+}
+
+int ModuleSession::Command(std::string_view name, int size, void* data)
+{
+    EveryCall().PassCommand(name);
+    return Session::Command(name, size, data);
+}
+
 int ModuleSession::TicketData(comgui::plugin::Address ticket, int format, int* size, void* buffer)
 {
+    EveryCall().Pass("GetTicketDataEntry", TicketAddress{ticket.type, ticket.id});
     if (!size)
         return MODULE_INVALID_ARGUMENT;
     if (format != 0)
@@ -74,16 +88,19 @@ int ModuleSession::Carry(Request const& request, Transfer wanted) const
 
 int ModuleSession::PutFile(std::string_view local, std::string_view server, Transfer wanted)
 {
+    EveryCall().Pass(wanted == Transfer::Complete ? "PutFileSyncEntry" : "PutFileEntry");
     return Carry({Request::ToServer, std::string(local), std::string(server)}, wanted);
 }
 
 int ModuleSession::GetFile(std::string_view server, std::string_view local, Transfer wanted)
 {
+    EveryCall().Pass(wanted == Transfer::Complete ? "GetFileSyncEntry" : "GetFileEntry");
     return Carry({Request::ToClient, std::string(server), std::string(local)}, wanted);
 }
 
 int ModuleSession::SendJob(TJobIdentification const& job, std::string_view path, std::string_view name)
 {
+    EveryCall().Pass("SendJobEntry");
     if (std::strcmp(job.pszUploadFolder, "$(UPLOADJOB)") != 0)
     {
         Report("a job was refused: its folder is " + ForMessages(job.pszUploadFolder) +

@@ -16,7 +16,9 @@ public:
 
     comgui::plugin::ContainerSlots* GetContainer() override { return &m_container; }
     bool End() override { return m_container.EndSession(); }
-    bool HasEnded() const override { return m_container.Session().Ended(); }
+    bool HasEnded() const override;
+
+    int Command(std::string_view name, int size, void* data) override;
 
     // Format 0, the only one so far, is the XML of a ticket file, UTF-8. *size: going in the room in buffer,
     // coming out what the data takes, in bytes; there is no final zero byte. With too little room, or a null
@@ -49,6 +51,8 @@ private:
     Server& GetServer() const { return m_container.Server(); }
     standin::Session& GetSession() const { return m_container.Session(); }
 
-    Container m_container;
+    Gate const& EveryCall() const { return m_container.EveryCall(); }
+
+    Container mutable m_container;  // a session that the server has lost ends when it is looked at
 };
 }  // namespace standin

@@ -63,6 +63,7 @@ bool WriteTable(TicketService& tickets, Session const& session, TicketAddress ad
 
 bool OpenTicket::Get(char const* key, PARAM_TYPE type, void* value, int pos)
 {
+    m_gate.Pass("SGETPARAMETER", m_address);
     if (!MayRead())
         return false;
     if (m_address == SystemTicket && key && value && (type == PARAM_STRING || type == PARAM_INT)) [[unlikely]]
@@ -103,6 +104,7 @@ void OpenTicket::EndFolderReading() const
 
 bool OpenTicket::GetTable(GETMULTIPAR* table)
 {
+    m_gate.Pass("SGETMULTIPAR", m_address);
     if (!MayRead())
         return false;
     EndFolderReading();
@@ -111,11 +113,13 @@ bool OpenTicket::GetTable(GETMULTIPAR* table)
 
 bool OpenTicket::Set(char const* key, PARAM_TYPE type, void const* value, int pos)
 {
+    m_gate.Pass("SSETPARAMETER", m_address);
     return WriteTicket(m_tickets, m_session, m_address, Which(), key, type, value, pos);
 }
 
 bool OpenTicket::SetTable(SETMULTIPAR* table)
 {
+    m_gate.Pass("SSETMULTIPAR", m_address);
     return WriteTable(m_tickets, m_session, m_address, Which(), table);
 }
 
@@ -123,6 +127,7 @@ bool OpenTicket::SetTable(SETMULTIPAR* table)
 // walk that left out values would lose them for good where a ticket is copied by walking over it.
 bool OpenTicket::Walk(SWALKPARAMETERS_ACTION action, void* context, char const* prefix, int)
 {
+    m_gate.Pass("SWALKPARAMETERS", m_address);
     EndFolderReading();
     // The session may end meanwhile, in the action or elsewhere, and the action may take any time.
     auto const texts = m_session.HoldTexts();
@@ -146,6 +151,7 @@ bool OpenTicket::Walk(SWALKPARAMETERS_ACTION action, void* context, char const* 
 
 bool OpenTicket::Option(int code, void* out)
 {
+    m_gate.Pass("SOPTION", m_address);
     bool const isThere = !m_session.Ended() && m_tickets.IncarnationOf(m_address) == Which();
     return isThere && comgui::plugin::AnswerOption(code, out, {m_address.type, m_address.id}, &m_folders);
 }

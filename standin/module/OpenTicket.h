@@ -5,6 +5,7 @@
 
 #include "comgui/module/TicketSlots.h"
 #include "standin/module/FolderTranslator.h"
+#include "standin/module/Gate.h"
 #include "standin/module/HostCalls.h"
 #include "standin/module/WalkedNumbers.h"
 #include "standin/server/sessions/TicketService.h"
@@ -27,11 +28,12 @@ bool WriteTable(TicketService& tickets, Session const& session, TicketAddress ad
 class OpenTicket : public HostCalls<comgui::plugin::TicketSlots>
 {
 public:
-    // The services, the session and its translator outlive it. numbers: of the session, gone with its end.
-    OpenTicket(TicketService& tickets, Session const& session, FolderTranslator& folders,
+    // The services, the session, its gate and its translator outlive it. numbers: of the session, gone with
+    // its end.
+    OpenTicket(TicketService& tickets, Session const& session, Gate const& gate, FolderTranslator& folders,
                std::weak_ptr<WalkedNumbers> numbers, TicketAddress address, Incarnation incarnation)
-        : m_tickets(tickets), m_session(session), m_folders(folders), m_numbers(std::move(numbers)),
-          m_address(address), m_incarnation(incarnation)
+        : m_tickets(tickets), m_session(session), m_gate(gate), m_folders(folders),
+          m_numbers(std::move(numbers)), m_address(address), m_incarnation(incarnation)
     {
     }
 
@@ -51,6 +53,7 @@ private:
 
     TicketService& m_tickets;
     Session const& m_session;
+    Gate const& m_gate;
     FolderTranslator& m_folders;
     std::weak_ptr<WalkedNumbers> const m_numbers;
     TicketAddress const m_address;

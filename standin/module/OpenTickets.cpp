@@ -20,8 +20,8 @@ STICKET_ACCESS const* OpenTickets::Open(TicketAddress address, Incarnation incar
         entry.openings = 0;
     }
     if (!entry.ticket)
-        entry.ticket =
-            std::make_unique<OpenTicket>(m_tickets, m_session, m_folders, m_numbers, address, incarnation);
+        entry.ticket = std::make_unique<OpenTicket>(m_tickets, m_session, m_gate, m_folders, m_numbers,
+                                                    address, incarnation);
     entry.ticket->StandFor(incarnation);
     ++entry.openings;
     return entry.ticket->Access();

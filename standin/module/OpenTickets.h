@@ -11,9 +11,10 @@ namespace standin
 class OpenTickets
 {
 public:
-    OpenTickets(TicketService& tickets, Session const& session, FolderTranslator& folders,
+    OpenTickets(TicketService& tickets, Session const& session, Gate const& gate, FolderTranslator& folders,
                 std::weak_ptr<WalkedNumbers> numbers)
-        : m_tickets(tickets), m_session(session), m_folders(folders), m_numbers(std::move(numbers))
+        : m_tickets(tickets), m_session(session), m_gate(gate), m_folders(folders),
+          m_numbers(std::move(numbers))
     {
     }
 
@@ -38,6 +39,7 @@ private:
 
     TicketService& m_tickets;
     Session const& m_session;
+    Gate const& m_gate;
     FolderTranslator& m_folders;
     std::weak_ptr<WalkedNumbers> const m_numbers;
     std::mutex m_lock;

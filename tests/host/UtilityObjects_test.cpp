@@ -1,10 +1,13 @@
 #include "comgui/host/UtilityObjects.h"
 
 #include "tests/support/TemporaryFolder.h"
+#include <atomic>
 #include <cstdio>
 #include <filesystem>
+#include <gmock/gmock.h>
 #include <gtest/gtest.h>
 #include <string>
+#include <thread>
 
 namespace
 {
@@ -51,6 +54,21 @@ TEST_F(SetPlugInsFolder, RelativeFolder_IsTakenFromTheFolderCurrentThen)
     UtilityObjects::SetPlugInsFolder("plug-ins");
     fs::current_path("/");
     EXPECT_EQ(PlugInsPath(), (folder.Path() / "plug-ins/ComGUI.Bundle").string());
+}
+
+TEST_F(SetPlugInsFolder, MayBeCalledWhileOthersAsk)
+{
+    std::atomic<bool> isOver{false};
+    std::thread asking(
+        [&]
+        {
+            while (!isOver)
+                EXPECT_THAT(PlugInsPath(), testing::EndsWith("/ComGUI.Bundle"));
+        });
+    for (int i = 0; i < 1000; ++i)
+        UtilityObjects::SetPlugInsFolder(i % 2 == 0 ? "/opt/a-folder-with-quite-a-long-name" : "");
+    isOver = true;
+    asking.join();
 }
 
 TEST_F(SetPlugInsFolder, NamesBeyondAscii_AreUTF8)

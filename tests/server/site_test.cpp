@@ -467,6 +467,30 @@ TEST_F(SiteFolder, BehindAProgramThatOnlyLooks_IsPutInOrderAllTheSame)
     EXPECT_FALSE(std::filesystem::exists(site / "job" / "77"));
 }
 
+TEST_F(SiteFolder, RulesOfTrouble_AreFollowedByWhoeverOpensIt)
+{
+    {
+        OpenedSite site(Folder(), ShippedSeed);
+        EXPECT_FALSE(site.Server().Troubles().Any());
+        site.Put("System/Trouble", "full");
+        EXPECT_TRUE(site.Server().Troubles().IsDiskFull());
+    }
+    OpenedSite later(Folder(), ShippedSeed);
+    EXPECT_TRUE(later.Server().Troubles().IsDiskFull());
+    later.PutPastTheServer({{"System/Trouble", -1, {}, false}});
+    EXPECT_TRUE(later.Server().Tickets().LookAt(SystemTicket, 0, [](auto const&) { return true; }));
+    EXPECT_FALSE(later.Server().Troubles().Any()) << "the key is gone";
+}
+
+TEST_F(SiteFolder, RulesOfTrouble_OfAnotherProgram_AreFollowedAsSoonAsTheyAreHeardOf)
+{
+    OpenedSite first(Folder(), ShippedSeed);
+    OpenedSite second(Folder(), ShippedSeed);
+    first.Put("System/Trouble", "full");
+    EXPECT_EQ(second.Server().Tickets().Int(SystemTicket, "System/MasterSOAPPort"), 50000);
+    EXPECT_TRUE(second.Server().Troubles().IsDiskFull());
+}
+
 TEST_F(SiteFolder, OpenedTwiceInOneProcess_IsSharedAsByTwoPrograms)
 {
     OpenedSite first(Folder(), ShippedSeed);

@@ -169,6 +169,8 @@ bool TicketWriter::DeleteOrThrow(Ticket ticket, Sequence revision)
 // made is no conflict: what it was planned on may hold as before.
 TicketWriter::Result TicketWriter::Commit(TicketChange change, Sequence plannedAt, CommitOutcome& outcome)
 {
+    if (m_troubles.IsDiskFull())
+        throw StoreError("the disk of the site's database is full: " + std::string(TroubleKey) + " says so");
     Feed::OwnChange own(m_feed, std::move(change));
     outcome = m_store.Commit(own.Get(), own.Number());
     if (outcome.kind == CommitOutcome::Unknown)

@@ -11,6 +11,7 @@
 
 #include "standin/server/feed/Feed.h"
 #include "standin/server/tickets/WritePlan.h"
+#include "standin/server/trouble/Troubles.h"
 
 namespace standin
 {
@@ -30,7 +31,8 @@ public:
 class TicketWriter
 {
 public:
-    TicketWriter(Store& store, Feed& feed, AfterChange& after) : m_store(store), m_feed(feed), m_after(after)
+    TicketWriter(Store& store, Feed& feed, AfterChange& after, Troubles& troubles = Troubles::None())
+        : m_store(store), m_feed(feed), m_after(after), m_troubles(troubles)
     {
     }
 
@@ -92,6 +94,7 @@ private:
     Store& m_store;
     Feed& m_feed;
     AfterChange& m_after;
+    Troubles& m_troubles;
     std::atomic<bool> m_isStopped{false};
 };
 }  // namespace standin

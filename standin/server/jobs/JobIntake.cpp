@@ -273,6 +273,7 @@ void JobIntake::Receive(Session const& session, Job& job, SourceFile const& sour
         FailAsGone();
     try
     {
+        m_transfers.CheckRoom();
         PartFile file(m_store, folder.Number(), name);
         auto const write = [&](int percent) { WriteOrFail(job.ticket, ListOf(Put(ProgressKey, percent))); };
         m_transfers.Copy(file, source, running, ProgressReport(source.Size(), write));

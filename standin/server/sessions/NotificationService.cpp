@@ -3,6 +3,7 @@
 #include "comgui/ticket/TICKET_ID.h"
 #include "standin/server/files/Report.h"
 #include <algorithm>
+#include <functional>
 
 namespace standin
 {
@@ -38,9 +39,21 @@ void GroupByKey(ChangedParameters& changes)
                      { return first.find(left.key.Get())->second < first.find(right.key.Get())->second; });
 }
 
+// So long a notification waits for the next one, behind which it is to come.
+constexpr std::chrono::seconds LongestSwap(1);
+
 ChangedParameter Copy(ChangedParameter const& change)
 {
     return {change.key, change.pos, change.value.Copy()};
+}
+
+ChangedParameters CopyOf(ChangedParameters const& changes)
+{
+    ChangedParameters copy;
+    copy.reserve(changes.size());
+    for (ChangedParameter const& change : changes)
+        copy.push_back(Copy(change));
+    return copy;
 }
 }  // namespace
 
@@ -97,7 +110,8 @@ NotificationService::Listener* NotificationService::Find(Session const& session,
 
 bool NotificationService::Register(Session const& session, int id, Callback callback)
 {
-    auto listener = std::make_shared<Listener>(Listener{session.Number(), id, std::move(callback)});
+    auto listener =
+        std::make_shared<Listener>(Listener{session.Number(), session.Who().name, id, std::move(callback)});
     Lock lock(m_lock);
     if (m_stopped)
         return false;
@@ -281,9 +295,95 @@ void NotificationService::Queue(std::shared_ptr<Listener> const& listener, Notif
 void NotificationService::Append(Message message)
 {
     message.weight = WeightOf(message.changes);
-    message.listener->pending += message.weight;
-    message.listener->ends += message.kind == TransferEnded ? 1 : 0;
+    message.due = message.listener->heldUntil;
+    if (m_troubles.Any()) [[unlikely]]
+        AppendTroubled(std::move(message));
+    else
+        Enqueue(std::move(message));
+}
+
+void NotificationService::AppendTroubled(Message message)
+{
+    Listener& listener = *message.listener;
+    bool const isOfTicket = message.kind != TransferEnded;
+    Troubles::Telling const telling = m_troubles.OnNotification(
+        {.ticket = isOfTicket ? std::optional(message.ticket) : std::nullopt, .user = listener.user});
+    if (telling.isLost || m_troubles.HasLost(listener.session))
+        return;
+    auto const now = Clock::now();
+    if (telling.late.count() > 0)
+        message.due = listener.heldUntil = std::max(listener.heldUntil, now + telling.late);
+    if (telling.isTwice)
+        Enqueue({message.listener, message.kind, message.ticket, message.code, CopyOf(message.changes),
+                 message.weight, message.due});
+    if (telling.isSwapped && !HasSwapped(listener))
+    {
+        message.due = std::max(message.due, now + LongestSwap);
+        message.isSwapped = true;
+    }
+    Enqueue(std::move(message));
+}
+
+void NotificationService::Enqueue(Message message)
+{
+    Listener& listener = *message.listener;
+    listener.pending += message.weight;
+    listener.ends += message.kind == TransferEnded ? 1 : 0;
+    bool const isSwapped = message.isSwapped;
+    auto const due = message.due;
     m_waiting.push_back(std::move(message));
+    if (m_hasSwapped && !isSwapped)
+        ReleaseSwapped(listener, due);
+    m_hasSwapped = m_hasSwapped || isSwapped;
+}
+
+bool NotificationService::HasSwapped(Listener const& listener) const
+{
+    return std::any_of(m_waiting.begin(), m_waiting.end(),
+                       [&](Message const& message)
+                       { return message.isSwapped && message.listener.get() == &listener; });
+}
+
+// They go behind what was put into the queue last.
+void NotificationService::ReleaseSwapped(Listener const& listener, Clock::time_point due)
+{
+    auto const isHeld = [&](Message const& message)
+    { return message.isSwapped && message.listener.get() == &listener; };
+    auto const held = std::stable_partition(m_waiting.begin(), m_waiting.end(), std::not_fn(isHeld));
+    for (auto message = held; message != m_waiting.end(); ++message)
+    {
+        message->isSwapped = false;
+        message->due = due;
+    }
+    m_hasSwapped = std::any_of(m_waiting.begin(), m_waiting.end(),
+                               [](Message const& message) { return message.isSwapped; });
+}
+
+// Most are due at once, and need no clock.
+std::deque<NotificationService::Message>::iterator NotificationService::FirstDue()
+{
+    if (!m_waiting.empty() && m_waiting.front().due == Clock::time_point{})
+        return m_waiting.begin();
+    auto const now = Clock::now();
+    return std::find_if(m_waiting.begin(), m_waiting.end(),
+                        [now](Message const& message) { return message.due <= now; });
+}
+
+// Until there is something due, or the end.
+void NotificationService::WaitForWork(Lock& lock)
+{
+    while (!m_stopped && FirstDue() == m_waiting.end())
+    {
+        if (m_waiting.empty())
+        {
+            m_work.wait(lock);
+            continue;
+        }
+        auto const next =
+            std::min_element(m_waiting.begin(), m_waiting.end(),
+                             [](Message const& left, Message const& right) { return left.due < right.due; });
+        m_work.wait_until(lock, Clock::time_point(next->due));
+    }
 }
 
 void NotificationService::Run()
@@ -291,12 +391,13 @@ void NotificationService::Run()
     Lock lock(m_lock);
     for (;;)
     {
-        m_work.wait(lock, [this] { return m_stopped || !m_waiting.empty(); });
+        WaitForWork(lock);
         if (m_stopped)
             return;
         {
-            Message message = std::move(m_waiting.front());
-            m_waiting.pop_front();
+            auto const next = FirstDue();
+            Message message = std::move(*next);
+            m_waiting.erase(next);
             Unqueue(message);
             m_running = message.listener->id;
             ++m_run;

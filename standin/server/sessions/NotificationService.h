@@ -8,6 +8,7 @@
 
 #include "standin/server/feed/ChangeListener.h"
 #include "standin/server/sessions/Session.h"
+#include "standin/server/trouble/Troubles.h"
 #include <chrono>
 #include <condition_variable>
 #include <deque>
@@ -43,7 +44,7 @@ public:
 
     using Callback = std::function<void(Notification const&)>;
 
-    NotificationService() = default;
+    explicit NotificationService(Troubles& troubles = Troubles::None()) : m_troubles(troubles) {}
     ~NotificationService() override;  // not from a callback
     NotificationService(NotificationService const&) = delete;
     NotificationService& operator=(NotificationService const&) = delete;
@@ -85,15 +86,19 @@ public:
     void Stop(std::chrono::milliseconds patience);
 
 private:
+    using Clock = std::chrono::steady_clock;
+
     struct Listener
     {
         unsigned long long session;
+        std::string user;
         int id;
         Callback callback;
         std::map<TicketAddress, KeyFilter> subscriptions{};
         std::size_t pending = 0;
         std::size_t ends = 0;  // of transfers, among those that are pending
         bool gone = false;
+        Clock::time_point heldUntil{};  // nothing comes before what is late
 
         bool Wants(TicketAddress ticket) const;
         bool Wants(TicketAddress ticket, std::string_view key) const;
@@ -106,6 +111,8 @@ private:
         int code;
         ChangedParameters changes;
         std::size_t weight;
+        Clock::time_point due{};  // of most, long ago
+        bool isSwapped = false;   // goes behind the next one of its listener
     };
     using Lock = std::unique_lock<std::mutex>;
 
@@ -114,6 +121,12 @@ private:
     void Withdraw(Listener& listener);
     void Post(NotificationKind kind, TicketAddress ticket, ChangedParameters changes) noexcept;
     void Append(Message message);
+    void AppendTroubled(Message message);
+    void Enqueue(Message message);
+    bool HasSwapped(Listener const& listener) const;
+    void ReleaseSwapped(Listener const& listener, Clock::time_point due);
+    void WaitForWork(Lock& lock);
+    std::deque<Message>::iterator FirstDue();
     void Unqueue(Message& message);
     void WaitFor(int id, Lock& lock);
     void Queue(std::shared_ptr<Listener> const& listener, NotificationKind kind, TicketAddress ticket,
@@ -121,12 +134,14 @@ private:
     void Run();
     static void Deliver(Message& message) noexcept;
 
+    Troubles& m_troubles;
     std::atomic<int> m_newestId{0};
     std::atomic<std::size_t> m_subscriptions{0};  // of all listeners
 
     mutable std::mutex m_lock;  // the members below; taken last
     std::vector<std::shared_ptr<Listener>> m_listeners;
     std::deque<Message> m_waiting;
+    bool m_hasSwapped = false;  // perhaps among them
     std::condition_variable m_work;
     std::condition_variable m_done;
     int m_running = 0;             // the id whose callback runs, 0 for none

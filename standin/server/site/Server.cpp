@@ -8,9 +8,11 @@
 namespace standin
 {
 Server::Server(Store& store, std::filesystem::path const& site, KeptTexts::Clock clock)
-    : m_store(store), m_texts(std::move(clock)), m_feed(store, m_notifications, m_texts),
-      m_writer(store, m_feed, *this), m_tickets(m_feed, m_writer), m_mirror(store, m_tickets, site),
-      m_transfers(store, m_tickets, m_notifications, site), m_jobs(store, m_tickets, m_writer, m_transfers),
+    : m_store(store), m_texts(std::move(clock)), m_notifications(m_troubles),
+      m_listener(m_troubles, m_notifications), m_feed(store, m_listener, m_texts),
+      m_writer(store, m_feed, *this, m_troubles), m_tickets(m_feed, m_writer),
+      m_mirror(store, m_tickets, site), m_transfers(store, m_tickets, m_notifications, site, m_troubles),
+      m_jobs(store, m_tickets, m_writer, m_transfers),
       m_caretaker(store, m_feed, m_tickets, m_writer, m_jobs, m_mirror, site)
 {
 }
@@ -39,6 +41,7 @@ std::optional<User> Server::Verified(std::string const& user, std::string const&
 std::shared_ptr<Session> Server::Open(User user)
 {
     auto const number = static_cast<unsigned long long>(m_store.OpenSession(user.name));
+    m_troubles.NoteSession(number);
     auto session = std::make_shared<Session>(number, std::move(user));
     session->KeepTexts(m_texts.Open(session->Reader()));
     return session;
@@ -61,6 +64,18 @@ bool Server::Logout(Session& session)
     }
     session.ReleaseTexts();
     return true;
+}
+
+void Server::FollowRules()
+{
+    std::string rules;
+    m_tickets.LookAt(SystemTicket, 0,
+                     [&](TicketSnapshot const& system)
+                     {
+                         rules = TextOf(system, TroubleKey);
+                         return true;
+                     });
+    m_troubles.Begin(rules);
 }
 
 bool Server::IsReachable() const noexcept

@@ -7,6 +7,7 @@
 #include "standin/server/sessions/Password.h"
 #include "standin/server/site/Caretaker.h"
 #include "standin/server/site/SystemTicketMirror.h"
+#include "standin/server/trouble/TroubleListener.h"
 
 namespace standin
 {
@@ -42,12 +43,19 @@ public:
     JobIntake& Jobs() { return m_jobs; }
     SystemTicketMirror& Mirror() { return m_mirror; }
 
+    // How it misbehaves for its clients, as the system ticket says. Calls ask for themselves.
+    standin::Troubles& Troubles() { return m_troubles; }
+
     // The site's own changes of a ticket, whoever may write it; false as those of TicketWriter.
     bool Write(TicketAddress ticket, std::span<TicketWrite> writes)
     {
         return m_writer.Write({ticket, 0}, writes, {});
     }
     bool Create(TicketAddress ticket) { return m_writer.Create({ticket}).has_value(); }
+
+    // From now on the server misbehaves as the system ticket may say already. What comes later is followed in
+    // any case.
+    void FollowRules();
 
     // Clears up at once what programs that died have left.
     void Tidy() { m_caretaker.Tidy(); }
@@ -69,7 +77,9 @@ private:
     Store& m_store;
     KeptTexts m_texts;
     Password::Failures m_failures;
+    standin::Troubles m_troubles;
     NotificationService m_notifications;
+    TroubleListener m_listener;
     Feed m_feed;
     TicketWriter m_writer;
     TicketService m_tickets;

@@ -188,6 +188,7 @@ void Site::PutInOrder(Server& server)
         m_store->NoteTidy();
     }
     server.Mirror().Write();
+    server.FollowRules();
     m_store->EndOpening();
     server.StartCare();
 }

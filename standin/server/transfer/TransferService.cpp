@@ -27,6 +27,20 @@ Descriptor OpenClientFolder(std::filesystem::path const& folder)
     return opened;
 }
 
+bool IsAt(double percent, off_t done, off_t size)
+{
+    return static_cast<double>(done) >= static_cast<double>(size) * percent / 100;
+}
+
+// It can be cut meanwhile.
+void StandStill(std::chrono::milliseconds time, RunningTransfer const& running)
+{
+    constexpr std::chrono::milliseconds Pause(5);
+    auto const end = std::chrono::steady_clock::now() + time;
+    for (; std::chrono::steady_clock::now() < end; std::this_thread::sleep_for(Pause))
+        running.Check();
+}
+
 std::string LeafOf(std::string const& path) { return path.substr(path.find_last_of("/\\") + 1); }
 }  // namespace
 
@@ -57,6 +71,13 @@ std::filesystem::path TransferService::ClientPath(std::string text)
     return std::filesystem::absolute(text);
 }
 
+void TransferService::CheckRoom() const
+{
+    if (m_troubles.IsDiskFull())
+        throw TransferError(TargetUnwritable,
+                            "the server's disk is full: " + std::string(TroubleKey) + " says so");
+}
+
 void TransferService::Copy(PartFile& target, SourceFile const& source, RunningTransfer& running,
                            std::function<void(off_t done)> const& told)
 {
@@ -64,10 +85,13 @@ void TransferService::Copy(PartFile& target, SourceFile const& source, RunningTr
         std::lock_guard const lock(m_lock);
         running.Begin(++m_lastTurn, source.Size());
     }
+    Troubles::Standstill still = m_troubles.OnTransfer();
     target.CopyFrom(source, m_pace.piece,
                     [&](off_t done)
                     {
                         running.Advance(done);
+                        if (still.by.count() > 0 && IsAt(still.at, done, source.Size()))
+                            StandStill(std::exchange(still, {}).by, running);
                         if (m_pace.after)
                             m_pace.after();
                         running.Check();
@@ -85,6 +109,7 @@ off_t TransferService::CarryNow(Request const& request, RunningTransfer& running
         ServerPath const to = ServerPath::Parse(request.target, LeafOf(request.source));
         SourceFile const source(ClientPath(request.source));
         Descriptor const folder = OpenFolderOf(to, Folders(), Purpose::Write, m_site);
+        CheckRoom();
         PartFile target(m_store, folder.Number(), to.name);
         Copy(target, source, running);
         target.Finish(m_survives);

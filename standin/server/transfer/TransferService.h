@@ -10,6 +10,7 @@
 #include "standin/server/transfer/PartFile.h"
 #include "standin/server/transfer/ServerPath.h"
 #include "standin/server/transfer/TransferError.h"
+#include "standin/server/trouble/Troubles.h"
 #include <chrono>
 #include <condition_variable>
 #include <deque>
@@ -53,8 +54,9 @@ public:
 
     // site: its folder, where nothing is put nor fetched, whatever the system ticket has for $(INSTALL).
     TransferService(Store& store, TicketService& tickets, NotificationService& notifications,
-                    std::filesystem::path const& site)
-        : m_store(store), m_tickets(tickets), m_notifications(notifications), m_site(site)
+                    std::filesystem::path const& site, Troubles& troubles = Troubles::None())
+        : m_store(store), m_tickets(tickets), m_notifications(notifications), m_troubles(troubles),
+          m_site(site)
     {
     }
     ~TransferService();  // cuts what runs
@@ -111,6 +113,9 @@ public:
     // What carried files outlast; the end of the process unless told otherwise. Not while one runs.
     void Set(PartFile::Survives what) { m_survives = what; }
 
+    // Before something is written to the server's disk. Throws TransferError where that is said to be full.
+    void CheckRoom() const;
+
     // What the transfer calls after a piece: checks for a cut, then told.
     void Copy(PartFile& target, SourceFile const& source, RunningTransfer& running,
               std::function<void(off_t done)> const& told = {});
@@ -138,6 +143,7 @@ private:
     Store& m_store;
     TicketService& m_tickets;
     NotificationService& m_notifications;
+    Troubles& m_troubles;
     std::string const m_site;
     Pace m_pace;
     PartFile::Survives m_survives = PartFile::Survives::EndOfProcess;

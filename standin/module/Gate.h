@@ -1,0 +1,45 @@
+// Where every call of a session goes through before it is carried out: the server may be told to misbehave,
+// see TroubleRule.h. For any thread; while nothing is amiss it costs next to nothing.
+#pragma once
+
+#include "standin/server/sessions/Session.h"
+#include "standin/server/trouble/Troubles.h"
+
+namespace standin
+{
+// Waits, and throws comgui::plugin::Refused with the code, if that is what the rules want.
+void PassTroubled(Troubles& troubles, Occasion const& call);
+
+inline void Pass(Troubles& troubles, Occasion const& call)
+{
+    if (troubles.Any()) [[unlikely]]
+        PassTroubled(troubles, call);
+}
+
+class Gate
+{
+public:
+    // Both outlive it.
+    Gate(Troubles& troubles, Session const& session) : m_troubles(troubles), m_session(session) {}
+
+    void Pass(std::string_view call, std::optional<TicketAddress> ticket = {}) const
+    {
+        if (m_troubles.Any()) [[unlikely]]
+            PassTroubledCall({.call = call, .ticket = ticket, .user = m_session.Who().name});
+    }
+    void PassCommand(std::string_view command) const
+    {
+        if (m_troubles.Any()) [[unlikely]]
+            PassTroubledCall({.call = "SendCommandEntry", .command = command, .user = m_session.Who().name});
+    }
+
+    // The server was away meanwhile, and knows the session no more.
+    bool HasLostSession() const { return m_troubles.HasLost(m_session.Number()); }
+
+private:
+    void PassTroubledCall(Occasion const& call) const;
+
+    Troubles& m_troubles;
+    Session const& m_session;
+};
+}  // namespace standin
