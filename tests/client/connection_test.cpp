@@ -1,5 +1,6 @@
 // Logging in and out.
 #include "tests/client/Client.h"
+#include "tests/support/Threads.h"
 
 #include <chrono>
 #include <gmock/gmock.h>
@@ -11,14 +12,6 @@ using testing::HasSubstr;
 namespace
 {
 using ConnectionOfAClient = Client;
-
-std::size_t Threads()
-{
-    std::size_t count = 0;
-    for ([[maybe_unused]] auto const& thread : std::filesystem::directory_iterator("/proc/self/task"))
-        ++count;
-    return count;
-}
 }  // namespace
 
 TEST_F(ConnectionOfAClient, LogsIn_AndKnowsItsUser)
@@ -94,7 +87,7 @@ TEST_F(ConnectionOfAClient, End_LeavesNoThread_PrintsNothing_AndTakesNoFourSecon
 {
     LogIn();
     EXPECT_TRUE(connection.LogOut());
-    std::size_t const before = Threads();
+    auto const before = Threads();
     testing::internal::CaptureStdout();
     testing::internal::CaptureStderr();
     auto const start = std::chrono::steady_clock::now();
@@ -108,7 +101,7 @@ TEST_F(ConnectionOfAClient, End_LeavesNoThread_PrintsNothing_AndTakesNoFourSecon
     EXPECT_LT(std::chrono::steady_clock::now() - start, std::chrono::seconds(4));
     EXPECT_EQ(testing::internal::GetCapturedStdout(), "");
     EXPECT_EQ(testing::internal::GetCapturedStderr(), "");
-    EXPECT_EQ(Threads(), before);
+    EXPECT_EQ(ThreadsOnceThereAre(before), before);
 }
 
 TEST_F(ConnectionOfAClient, Tickets_OutliveIt)

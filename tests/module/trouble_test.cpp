@@ -41,12 +41,6 @@ protected:
     }
     void Follow(std::string const& rules) const { Follow(admin, rules); }
 
-    static std::string Until(std::chrono::milliseconds fromNow)
-    {
-        auto const end = std::chrono::system_clock::now() + fromNow;
-        return " until=" + std::to_string(std::chrono::duration<double>(end.time_since_epoch()).count());
-    }
-
     template <typename Work>
     static std::chrono::milliseconds TimeOf(Work const& work)
     {
@@ -259,7 +253,7 @@ TEST_F(Trouble, DelayedCall_SucceedsLater)
 TEST_F(Trouble, RuleWithAnEnd_EndsByItself)
 {
     auto const end = Clock::now() + 2s;
-    Follow("fail user=operator" + Until(2s));
+    Follow("fail user=operator for=2s");
     EXPECT_EQ(other.Read(0, 0, "System/MasterSOAPPort"), -1);
     std::this_thread::sleep_until(end + 10ms);
     EXPECT_EQ(other.Read(0, 0, "System/MasterSOAPPort"), 50000);
@@ -269,7 +263,7 @@ TEST_F(Trouble, ServerThatIsAway_AnswersNothing_AndIsBackWithItsSessions)
 {
     admin.Create(3, 1);
     auto const back = Clock::now() + 2s;
-    Follow("away" + Until(2s));
+    Follow("away for=2s");
     EXPECT_EQ(other.Read(3, 1, "K"), -1);
     EXPECT_EQ(other.Open(0, 0), nullptr);
     EXPECT_EQ(IsAliveCommand(), MODULE_SITE_UNAVAILABLE);
@@ -290,7 +284,7 @@ TEST_F(Trouble, ServerThatStartsAnew_KnowsNoneOfItsSessions)
     old.Enable(0, 0, old.Register(listener));
     STICKET_ACCESS const* const ticket = old.Open(0, 0);
     auto const back = Clock::now() + 2s;
-    Follow("away sessions=lost" + Until(2s));
+    Follow("away sessions=lost for=2s");
     EXPECT_EQ(old.Read(0, 0, "System/MasterSOAPPort"), -1);
     std::this_thread::sleep_until(back + 10ms);
     EXPECT_EQ(old.Read(0, 0, "System/MasterSOAPPort"), -1);
@@ -396,7 +390,7 @@ TEST_F(TroubledNotifications, WhatHappensWhileTheServerIsAway_IsNeverTold)
 {
     EXPECT_EQ(other.Enable(0, 0, Id()), 1);
     auto const back = Clock::now() + 2s;
-    Follow("away" + Until(2s));  // a change that he would be told of
+    Follow("away for=2s");  // a change that he would be told of
     std::this_thread::sleep_until(back + 10ms);
     Write(2);
     EXPECT_THAT(listener.Wait(1), ElementsAre("changed 3/1 K@-1=2"));
@@ -441,7 +435,7 @@ TEST_F(Trouble, FullDisk_TakesNothing_AndGivesEverything)
     admin.Write(3, 1, "K", 7);
     testing::internal::CaptureStderr();
     auto const end = Clock::now() + 3s;
-    Follow("full" + Until(3s));
+    Follow("full for=3s");
     EXPECT_EQ(admin.Write(3, 1, "K", 8), 0);
     EXPECT_THAT(TakeReason(module), HasSubstr("disk of the site's database is full"));
     EXPECT_EQ(admin.Read(3, 1, "K"), 7);

@@ -2,6 +2,7 @@
 #include "tests/server/ServerTest.h"
 
 #include "comgui/ticket/TICKET_ID.h"
+#include "tests/support/Threads.h"
 #include <condition_variable>
 #include <set>
 
@@ -161,19 +162,14 @@ TEST_F(Told, AfterStop_NobodyIs)
 
 TEST_F(Told, Stop_EndsTheThread)
 {
-    auto const threads = []
-    {
-        auto const all = std::filesystem::directory_iterator("/proc/self/task");
-        return std::distance(begin(all), end(all));
-    };
     auto& service = Server().Notifications();  // with the threads of the server
-    auto const before = threads();
+    auto const before = Threads();
     Listen("admin", Job.type);
-    EXPECT_EQ(threads(), before + 1);
+    EXPECT_EQ(Threads(), before + 1);
     service.Stop(std::chrono::minutes(1));
-    EXPECT_EQ(threads(), before);
+    EXPECT_EQ(ThreadsOnceThereAre(before), before);
     EXPECT_FALSE(service.Register(As("admin"), 7, [](Notification const&) {}));
-    EXPECT_EQ(threads(), before);
+    EXPECT_EQ(ThreadsOnceThereAre(before), before);
 }
 
 TEST_F(Told, Stop_DoesNotWaitLongerThanTold)

@@ -6,6 +6,7 @@
 #include "standin/server/site/Seed.h"
 #include "standin/server/store/sqlite/SqliteStore.h"
 #include "standin/server/tickets/TicketXml.h"
+#include "standin/server/trouble/RulesOfSite.h"
 #include "tests/server/MemoryFolder.h"
 #include "tests/server/OpenedSite.h"
 #include "tests/support/ChildProcess.h"
@@ -477,16 +478,18 @@ TEST_F(SiteFolder, RulesOfTrouble_AreFollowedByWhoeverOpensIt)
     }
     OpenedSite later(Folder(), ShippedSeed);
     EXPECT_TRUE(later.Server().Troubles().IsDiskFull());
-    later.PutPastTheServer({{"System/Trouble", -1, {}, false}});
-    EXPECT_TRUE(later.Server().Tickets().LookAt(SystemTicket, 0, [](auto const&) { return true; }));
-    EXPECT_FALSE(later.Server().Troubles().Any()) << "the key is gone";
+    standin::ChangeRules(later.Store(), [](std::vector<std::string>& rules) { rules.clear(); });
+    EXPECT_EQ(later.Server().Tickets().Int(SystemTicket, "System/MasterSOAPPort"), 50000);
+    EXPECT_FALSE(later.Server().Troubles().Any());
+    EXPECT_EQ(later.Text(SystemTicket, "System/Trouble"), "(missing)");
 }
 
 TEST_F(SiteFolder, RulesOfTrouble_OfAnotherProgram_AreFollowedAsSoonAsTheyAreHeardOf)
 {
     OpenedSite first(Folder(), ShippedSeed);
     OpenedSite second(Folder(), ShippedSeed);
-    first.Put("System/Trouble", "full");
+    standin::ChangeRules(first.Store(), [](auto& rules) { rules.assign({"twice", "full"}); });
+    EXPECT_EQ(first.Text(SystemTicket, "System/Trouble"), "twice\nfull\n");
     EXPECT_EQ(second.Server().Tickets().Int(SystemTicket, "System/MasterSOAPPort"), 50000);
     EXPECT_TRUE(second.Server().Troubles().IsDiskFull());
 }

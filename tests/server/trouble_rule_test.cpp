@@ -80,6 +80,16 @@ TEST(TroubleRule, Durations_HaveUnits)
         EXPECT_THAT(ErrorOf(line), HasSubstr("a duration as 250ms, 2s or 1m")) << line;
 }
 
+TEST(TroubleRule, EndAfterADuration_IsOneFromNow)
+{
+    auto const before = TroubleRule::Clock::now();
+    auto const rule = TroubleRule::Parse("away for=2s");
+    ASSERT_TRUE(rule.until);
+    EXPECT_GE(*rule.until, before + 2s - 1ms);
+    EXPECT_LE(*rule.until, TroubleRule::Clock::now() + 2s);
+    EXPECT_EQ(TroubleRule::Parse(rule.Text()).until, rule.until);
+}
+
 TEST(TroubleRule, BlanksBetweenWords_DoNotCount) { EXPECT_EQ(Canonical("  fail \t nth=2  "), "fail nth=2"); }
 
 TEST(TroubleRule, Mistakes_AreTold)
@@ -87,8 +97,8 @@ TEST(TroubleRule, Mistakes_AreTold)
     EXPECT_THAT(ErrorOf(""), HasSubstr("begin with fail, delay, away"));
     EXPECT_THAT(ErrorOf("Fail"), HasSubstr("\"Fail\": begin with fail"));
     EXPECT_THAT(ErrorOf("fail by=2s"), HasSubstr("fail takes call=, ticket=, user=, code=, nth="));
-    EXPECT_THAT(ErrorOf("full nth=1"), HasSubstr("full takes until="));
-    EXPECT_THAT(ErrorOf("away user=admin"), HasSubstr("away takes sessions=, until="));
+    EXPECT_THAT(ErrorOf("full nth=1"), HasSubstr("full takes for=, until="));
+    EXPECT_THAT(ErrorOf("away user=admin"), HasSubstr("away takes sessions=, for=, until="));
     EXPECT_THAT(ErrorOf("stall by=1s ticket=3/1"), HasSubstr("stall takes by=, at=, nth="));
     EXPECT_THAT(ErrorOf("late call=MGETPARAMETER by=1s"), HasSubstr("late takes ticket="));
     EXPECT_THAT(ErrorOf("fail call"), HasSubstr("behind the equals sign"));

@@ -13,6 +13,7 @@
 #include "tools/comgui_site/follow.h"
 #include "tools/comgui_site/import.h"
 #include "tools/comgui_site/info.h"
+#include "tools/comgui_site/rules.h"
 #include "tools/shared/Output.h"
 #include <algorithm>
 
@@ -323,6 +324,65 @@ int RunFollow(Request const& request)
     OpenedSite site(NameOfSite(request.site));
     Output out(stdout);
     Follow(site.Store(), request.since, request.isJson, out);
+    return 0;
+}
+
+int RunTrouble(Request const& request)
+{
+    OpenedSite site(NameOfSite(request.site));
+    auto const rules = standin::RulesOf(site.Store());
+    std::string text = rules.empty() ? "no rules\n" : "";
+    Json json = Json::array();
+    for (std::size_t i = 0; i < rules.size(); ++i)
+    {
+        ShownRule const shown = ShownRuleOf(rules[i]);
+        text += std::to_string(i + 1) + "  " + shown.text + '\n';
+        json.push_back(Json{{"rule", JsonOf(rules[i])}, {"state", shown.state}});
+    }
+    Print(request.isJson ? LinesOf(json) : text);
+    return 0;
+}
+
+int RunTroubleAdd(Request const& request)
+{
+    standin::TroubleRule const rule = RuleOf(request.rule);
+    OpenedSite site(NameOfSite(request.site));
+    ChangeRulesOf(site,
+                  [&](std::vector<std::string>& rules)
+                  {
+                      std::erase_if(rules, HasEnded);
+                      rules.push_back(rule.Text());
+                  });
+    site.Leave();
+    Print("from now on: " + ShownRuleOf(rule.Text()).text + '\n');
+    return 0;
+}
+
+int RunTroubleRemove(Request const& request)
+{
+    OpenedSite site(NameOfSite(request.site));
+    std::string removed;
+    ChangeRulesOf(site,
+                  [&](std::vector<std::string>& rules)
+                  {
+                      if (request.number == 0 || request.number > rules.size())
+                          throw Trouble("there is no rule " + std::to_string(request.number) +
+                                        "; trouble lists those there are");
+                      auto const rule = rules.begin() + static_cast<std::ptrdiff_t>(request.number - 1);
+                      removed = *rule;
+                      rules.erase(rule);
+                  });
+    site.Leave();
+    Print("no longer: " + ShownRuleOf(removed).text + '\n');
+    return 0;
+}
+
+int RunTroubleClear(Request const& request)
+{
+    OpenedSite site(NameOfSite(request.site));
+    ChangeRulesOf(site, [](std::vector<std::string>& rules) { rules.clear(); });
+    site.Leave();
+    Print("the servers of the site behave again\n");
     return 0;
 }
 }  // namespace comgui_site

@@ -24,6 +24,8 @@ struct Request
     std::string from, to;               // copy
     std::string output = "-";           // export
     std::vector<std::string> files;     // import
+    std::vector<std::string> rule;      // trouble add, by words
+    std::size_t number = 0;             // trouble remove
     std::vector<TicketChoice> tickets;  // export
     std::optional<standin::Sequence> since{};
 };
@@ -41,4 +43,8 @@ int RunCopy(Request const& request);
 int RunExport(Request const& request);
 int RunImport(Request const& request);
 int RunFollow(Request const& request);
+int RunTrouble(Request const& request);
+int RunTroubleAdd(Request const& request);
+int RunTroubleRemove(Request const& request);
+int RunTroubleClear(Request const& request);
 }  // namespace comgui_site

@@ -23,8 +23,8 @@ enum Status
     Wrong = 2,   // the command line is wrong
 };
 
-constexpr std::string_view Commands[] = {"info",    "check", "users",  "passwd", "backup",
-                                         "restore", "copy",  "export", "import", "follow"};
+constexpr std::string_view Commands[] = {"info", "check",  "users",  "passwd", "backup", "restore",
+                                         "copy", "export", "import", "follow", "trouble"};
 
 void Complain(std::string text)
 {
@@ -61,6 +61,7 @@ public:
         AddUsers();
         AddDatabase();
         AddTickets();
+        AddTrouble();
     }
 
     int Run(int argc, char** argv)
@@ -224,6 +225,36 @@ private:
         AddJson(import_);
     }
 
+    void AddTrouble()
+    {
+        CLI::App* const trouble = Add(
+            m_app, "trouble", "Let the servers of the site misbehave, to test clients",
+            "trouble alone lists the rules. They are for every program that has the site open, until they "
+            "are removed or end.",
+            RunTrouble);
+        trouble->require_subcommand(0, 1);
+        AddJson(trouble);
+        Add(*trouble, "add", "Add a rule",
+            "RULE begins with what is to happen:\n"
+            "  fail [code=N]             calls fail; entries answer 112, or N\n"
+            "  delay by=250ms            calls take longer\n"
+            "  away [sessions=lost]      as if there were no server; with its sessions lost when it is back\n"
+            "  late by=2s, twice, lost, swapped\n"
+            "                            so notifications come\n"
+            "  stall by=1m [at=50%]      transfers stand still\n"
+            "  full                      the server's disk is full\n"
+            "and says of which: call=NAME (of an entry, a slot or a command, with * and ?), ticket=TYPE/ID, "
+            "ticket=TYPE/*, user=NAME,\nnth=N, share=10%, seed=N, times=N; each program counts for itself. "
+            "for=30s ends the rule.\n"
+            "Examples: trouble add fail call=MSETPARAMETER share=5%; trouble add away for=10s sessions=lost",
+            RunTroubleAdd)
+            ->add_option("RULE", m_request.rule, "A rule, in words");
+        Add(*trouble, "remove", "Remove a rule", "trouble lists the rules with their numbers.",
+            RunTroubleRemove)
+            ->add_option("N", m_request.number, "The number of the rule");
+        Add(*trouble, "clear", "Remove all rules", "", RunTroubleClear);
+    }
+
     // In the order in which the parser takes them, which is from the last. The site before the command
     // becomes an option. A name in brackets would be taken for a list of names, but for its folder.
     static std::vector<std::string> Arguments(int argc, char** argv)
@@ -247,8 +278,8 @@ private:
         while (!command->get_subcommands().empty())
             command = command->get_subcommands().front();
         if (command == &m_app)
-            return "the command (info, check, users, passwd, backup, restore, copy, export, import or "
-                   "follow)";
+            return "the command (info, check, users, passwd, backup, restore, copy, export, import, "
+                   "follow or trouble)";
         for (CLI::Option const* option : command->get_options())
             if (option->get_positional() && option->count() == 0 && option->get_name(true) != "TYPE[/ID]")
                 return option->get_name(true);

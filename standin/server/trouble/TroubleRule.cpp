@@ -145,6 +145,13 @@ TroubleRule::Clock::time_point TimeOf(std::string_view word, std::string_view te
         TroubleRule::Duration(static_cast<long long>(*seconds * 1000 + 0.5)));
 }
 
+// To the millisecond, which is what texts have.
+TroubleRule::Clock::time_point EndAfter(std::string_view word, std::string_view text)
+{
+    auto const now = std::chrono::time_point_cast<TroubleRule::Duration>(TroubleRule::Clock::now());
+    return now + DurationOf(word, text);
+}
+
 int CodeOf(std::string_view word, std::string_view text)
 {
     auto const code = NumberOf<int>(text);
@@ -187,6 +194,7 @@ constexpr Word Words[] = {
     {"share", TakesDraw, [](auto& rule, auto word, auto text) { rule.share = PercentOf(word, text); }},
     {"seed", TakesDraw, [](auto& rule, auto word, auto text) { rule.seed = SeedOf(word, text); }},
     {"times", TakesDraw, [](auto& rule, auto word, auto text) { rule.times = CountOf(word, text); }},
+    {"for", TakesNothing, [](auto& rule, auto word, auto text) { rule.until = EndAfter(word, text); }},
     {"until", TakesNothing, [](auto& rule, auto word, auto text) { rule.until = TimeOf(word, text); }},
 };
 

@@ -15,7 +15,8 @@
 // Which of the calls, notifications or transfers: call=NAME, that of an entry, a slot or a command, with *
 // and ?; ticket=TYPE/ID or TYPE/*; user=NAME; nth=N, only that one; share=PERCENT, drawn at random with
 // seed=N; times=N, no more than so many. They are counted in each program for itself. until=SECONDS since
-// 1970 ends a rule. Whoever asks for what an occasion does not have, as the ticket of a login, asks in vain.
+// 1970 ends a rule, and so does for=DURATION, from when it is read. Whoever asks for what an occasion does
+// not have, as the ticket of a login, asks in vain.
 //
 // A duration is a number with ms, s or m, at most ten minutes.
 #pragma once
