@@ -2,15 +2,17 @@
 // SQLite with the same settings, journal record included.
 #pragma once
 
+#include "comgui/testing/TemporaryFolder.h"
 #include "standin/server/store/ChangeRecord.h"
 #include "standin/server/store/sqlite/SqliteStore.h"
-#include "tests/support/TemporaryFolder.h"
 #include <benchmark/benchmark.h>
 #include <cstdlib>
 #include <filesystem>
 #include <sqlite3.h>
 #include <string>
 #include <vector>
+
+using comgui::test::TemporaryFolder;
 
 namespace bench
 {

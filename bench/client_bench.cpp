@@ -3,11 +3,13 @@
 #include "bench/ratio_report.h"
 #include "comgui/client.h"
 #include "comgui/comgui.h"
-#include "tests/support/TemporaryFolder.h"
+#include "comgui/testing/TemporaryFolder.h"
 #include <benchmark/benchmark.h>
 #include <cstdio>
 #include <cstdlib>
 #include <malloc.h>
+
+using comgui::test::TemporaryFolder;
 
 namespace
 {

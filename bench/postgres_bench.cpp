@@ -2,15 +2,17 @@
 // same server: the difference is what the store adds. The server is this program's own and does not wait for
 // the disk, so that the disk's noise is in neither.
 #include "bench/ratio_report.h"
+#include "comgui/testing/TemporaryFolder.h"
 #include "standin/server/store/ChangeRecord.h"
 #include "standin/server/store/postgres/PostgresStore.h"
 #include "tests/support/PostgresCluster.h"
-#include "tests/support/TemporaryFolder.h"
 #include <atomic>
 #include <benchmark/benchmark.h>
 #include <cstdio>
 #include <fstream>
 #include <thread>
+
+using comgui::test::TemporaryFolder;
 
 namespace
 {

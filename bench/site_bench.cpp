@@ -9,6 +9,8 @@
 #include <benchmark/benchmark.h>
 #include <map>
 
+using comgui::test::TemporaryFolder;
+
 namespace
 {
 using namespace bench;

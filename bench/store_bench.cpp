@@ -10,6 +10,8 @@
 #include <thread>
 #include <unistd.h>
 
+using comgui::test::TemporaryFolder;
+
 namespace
 {
 using namespace bench;

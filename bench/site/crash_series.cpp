@@ -3,14 +3,16 @@
 // itself anew for each of them.
 #include "bench/site/CrashWriter.h"
 #include "bench/site/Lane.h"
+#include "comgui/testing/TemporaryFolder.h"
 #include "tests/support/Program.h"
 #include "tests/support/SiteClient.h"
-#include "tests/support/TemporaryFolder.h"
 #include <CLI/CLI.hpp>
 #include <iostream>
 #include <memory>
 #include <poll.h>
 #include <random>
+
+using comgui::test::TemporaryFolder;
 
 namespace
 {

@@ -3,14 +3,16 @@
 // anew for each of them.
 #include "bench/site/LatencyHistogram.h"
 #include "bench/site/LoadClient.h"
+#include "comgui/testing/TemporaryFolder.h"
 #include "tests/support/Program.h"
 #include "tests/support/SiteClient.h"
-#include "tests/support/TemporaryFolder.h"
 #include <CLI/CLI.hpp>
 #include <cstdio>
 #include <iostream>
 #include <memory>
 #include <random>
+
+using comgui::test::TemporaryFolder;
 
 namespace
 {

@@ -2,12 +2,14 @@
 // checks all along that the site keeps what it promises. Starts itself anew for each of them.
 #include "bench/site/Soak.h"
 #include "bench/site/SoakClient.h"
+#include "comgui/testing/TemporaryFolder.h"
 #include "tests/support/SiteClient.h"
-#include "tests/support/TemporaryFolder.h"
 #include <CLI/CLI.hpp>
 #include <csignal>
 #include <iostream>
 #include <sys/prctl.h>
+
+using comgui::test::TemporaryFolder;
 
 namespace fs = std::filesystem;
 

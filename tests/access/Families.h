@@ -6,9 +6,14 @@
 #include "comgui/access/MTICKET_READ.h"
 #include "comgui/access/STICKET_MODIFY.h"
 #include "comgui/access/STICKET_READ.h"
-#include "tests/support/TicketFake.h"
+#include "comgui/testing/TicketFake.h"
 #include <gtest/gtest.h>
 #include <utility>
+
+using comgui::test::CALL;
+using comgui::test::ContainerFake;
+using comgui::test::SLOT;
+using comgui::test::TicketFake;
 
 // A single ticket, through STICKET_READ and STICKET_MODIFY.
 class SINGLE

@@ -7,6 +7,9 @@
 #include <type_traits>
 #include <vector>
 
+using comgui::test::CALL;
+using comgui::test::SLOT;
+
 // A ticket of either family. Where a list is concerned the key is always "k".
 template <typename Family>
 class LISTS : public Family

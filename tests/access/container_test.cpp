@@ -3,10 +3,14 @@
 
 #include "comgui/access/MTICKET_MODIFY.h"
 #include "comgui/access/MTICKET_READ.h"
+#include "comgui/testing/ContainerFake.h"
 #include "tests/access/FolderVariablesFake.h"
-#include "tests/support/ContainerFake.h"
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
+
+using comgui::test::CALL;
+using comgui::test::ContainerFake;
+using comgui::test::SLOT;
 
 using testing::ElementsAre;
 using testing::IsEmpty;

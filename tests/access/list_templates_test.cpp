@@ -6,6 +6,8 @@
 #include "tests/access/ListFamilies.h"
 #include <gmock/gmock.h>
 
+using comgui::test::CALL;
+
 using testing::ElementsAre;
 using testing::IsEmpty;
 

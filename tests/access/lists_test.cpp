@@ -3,6 +3,8 @@
 
 #include <cstring>
 
+using comgui::test::CALL;
+
 namespace
 {
 template <typename Family, typename T>

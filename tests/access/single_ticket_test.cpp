@@ -3,6 +3,10 @@
 #include "tests/access/FolderVariablesFake.h"
 #include <gmock/gmock.h>
 
+using comgui::test::CALL;
+using comgui::test::SLOT;
+using comgui::test::TicketFake;
+
 using testing::ElementsAre;
 
 namespace

@@ -12,6 +12,8 @@
 #include <wx/event.h>
 #include <wx/init.h>
 
+using comgui::test::TemporaryFolder;
+
 using namespace comgui;
 using namespace std::chrono_literals;
 using testing::Contains;

@@ -1,9 +1,11 @@
+#include "comgui/testing/TemporaryFolder.h"
 #include "tests/corefoundation/Held.h"
 #include "tests/corefoundation/UUIDTexts.h"
 #include "tests/support/BundleOnDisk.h"
-#include "tests/support/TemporaryFolder.h"
 
 #include <gtest/gtest.h>
+
+using comgui::test::TemporaryFolder;
 
 namespace
 {

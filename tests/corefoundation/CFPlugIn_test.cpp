@@ -1,7 +1,7 @@
+#include "comgui/testing/TemporaryFolder.h"
 #include "tests/corefoundation/Held.h"
 #include "tests/corefoundation/UUIDTexts.h"
 #include "tests/support/BundleOnDisk.h"
-#include "tests/support/TemporaryFolder.h"
 #include "tests/support/TestPlugIn.h"
 
 #include <cstring>
@@ -9,6 +9,8 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 #include <thread>
+
+using comgui::test::TemporaryFolder;
 #ifdef COMGUI_LEAK_CHECK
 #    include <sanitizer/lsan_interface.h>
 #endif

@@ -1,8 +1,10 @@
+#include "comgui/testing/TemporaryFolder.h"
 #include "tests/corefoundation/Held.h"
 #include "tests/support/BundleOnDisk.h"
-#include "tests/support/TemporaryFolder.h"
 
 #include <gtest/gtest.h>
+
+using comgui::test::TemporaryFolder;
 
 namespace
 {

@@ -1,13 +1,15 @@
+#include "comgui/testing/TemporaryFolder.h"
 #include "tests/corefoundation/Held.h"
 #include "tests/corefoundation/UUIDTexts.h"
 #include "tests/support/BundleOnDisk.h"
-#include "tests/support/TemporaryFolder.h"
 
 #include <cstdlib>
 #include <functional>
 #include <gtest/gtest.h>
 #include <plist/plist.h>
 #include <sys/stat.h>
+
+using comgui::test::TemporaryFolder;
 
 namespace
 {

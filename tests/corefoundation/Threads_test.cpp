@@ -1,7 +1,7 @@
+#include "comgui/testing/TemporaryFolder.h"
 #include "tests/corefoundation/Held.h"
 #include "tests/corefoundation/UUIDTexts.h"
 #include "tests/support/BundleOnDisk.h"
-#include "tests/support/TemporaryFolder.h"
 
 #include <atomic>
 #include <functional>
@@ -9,6 +9,8 @@
 #include <latch>
 #include <thread>
 #include <vector>
+
+using comgui::test::TemporaryFolder;
 
 namespace
 {

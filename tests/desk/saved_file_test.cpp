@@ -1,13 +1,15 @@
 #include "desk/model/SavedFile.h"
 
+#include "comgui/testing/TemporaryFolder.h"
 #include "tests/desk/FileFacts.h"
 #include "tests/support/Files.h"
 #include "tests/support/FullDisk.h"
-#include "tests/support/TemporaryFolder.h"
 #include <filesystem>
 #include <gtest/gtest.h>
 #include <sys/stat.h>
 #include <unistd.h>
+
+using comgui::test::TemporaryFolder;
 
 using namespace desk;
 namespace fs = std::filesystem;

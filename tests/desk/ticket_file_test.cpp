@@ -1,14 +1,16 @@
 #include "desk/model/TicketFile.h"
 
+#include "comgui/testing/TemporaryFolder.h"
 #include "desk/model/FileContent.h"
 #include "desk/model/SavedFile.h"
 #include "desk/model/TicketStream.h"
 #include "tests/client/Client.h"
 #include "tests/desk/FileFacts.h"
 #include "tests/support/HexText.h"
-#include "tests/support/TemporaryFolder.h"
 #include <filesystem>
 #include <gtest/gtest.h>
+
+using comgui::test::TemporaryFolder;
 
 using namespace comgui;
 using namespace desk;

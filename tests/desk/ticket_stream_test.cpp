@@ -1,12 +1,14 @@
 #include "desk/model/TicketStream.h"
 
 #include "comgui/stream/STICKET_BINSTREAM.h"
+#include "comgui/testing/TicketFake.h"
 #include "comgui/ticket/BIN_STRING.h"
 #include "desk/model/FileContent.h"
 #include "tests/desk/FileFacts.h"
 #include "tests/support/HexText.h"
-#include "tests/support/TicketFake.h"
 #include <gtest/gtest.h>
+
+using comgui::test::TicketFake;
 
 using namespace comgui;
 using namespace desk;

@@ -3,10 +3,13 @@
 
 #include "comgui/folders/FolderVariables.h"
 #include "comgui/folders/clFOLDER_VARIABLES.h"
-#include "tests/support/ContainerFake.h"
-#include "tests/support/TicketFake.h"
+#include "comgui/testing/ContainerFake.h"
+#include "comgui/testing/TicketFake.h"
 #include <memory>
 #include <string>
+
+using comgui::test::ContainerFake;
+using comgui::test::TicketFake;
 
 class FolderServer
 {

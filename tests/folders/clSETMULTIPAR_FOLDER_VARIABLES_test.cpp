@@ -5,6 +5,8 @@
 #include <gtest/gtest.h>
 #include <utility>
 
+using comgui::test::ContainerFake;
+
 using TRANSLATED = clSETMULTIPAR_FOLDER_VARIABLES;
 
 static_assert(std::has_virtual_destructor_v<TRANSLATED>);

@@ -4,6 +4,9 @@
 #include <climits>
 #include <gmock/gmock.h>
 
+using comgui::test::CALL;
+using comgui::test::SLOT;
+
 using testing::ElementsAre;
 using testing::SizeIs;
 

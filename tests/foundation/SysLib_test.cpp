@@ -1,6 +1,6 @@
 #include "comgui/foundation/SysLib.h"
 
-#include "tests/support/TemporaryFolder.h"
+#include "comgui/testing/TemporaryFolder.h"
 
 #include <algorithm>
 #include <cerrno>
@@ -13,6 +13,8 @@
 #include <thread>
 #include <type_traits>
 #include <vector>
+
+using comgui::test::TemporaryFolder;
 
 using SysLib::MUTEX_INSTANCE;
 using SysLib::MUTEX_LOCK;

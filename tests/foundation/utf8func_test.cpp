@@ -1,12 +1,14 @@
 #include "comgui/foundation/utf8func.h"
 
-#include "tests/support/TemporaryFolder.h"
+#include "comgui/testing/TemporaryFolder.h"
 
 #include <array>
 #include <cerrno>
 #include <gtest/gtest.h>
 #include <memory>
 #include <string>
+
+using comgui::test::TemporaryFolder;
 
 namespace
 {

@@ -1,6 +1,6 @@
 #include "comgui/host/UtilityObjects.h"
 
-#include "tests/support/TemporaryFolder.h"
+#include "comgui/testing/TemporaryFolder.h"
 #include <atomic>
 #include <cstdio>
 #include <filesystem>
@@ -8,6 +8,8 @@
 #include <gtest/gtest.h>
 #include <string>
 #include <thread>
+
+using comgui::test::TemporaryFolder;
 
 namespace
 {

@@ -2,9 +2,11 @@
 #pragma once
 
 #include "comgui/comgui.h"
-#include "tests/support/TemporaryFolder.h"
+#include "comgui/testing/TemporaryFolder.h"
 #include <cstdlib>
 #include <gtest/gtest.h>
+
+using comgui::test::TemporaryFolder;
 
 class Host : public testing::Test
 {

@@ -1,9 +1,9 @@
 // What programs that work on one site at once see of each other: clients of the real library and bundle, each
 // a process of its own, which these tests start, speak to, stop and kill.
+#include "comgui/testing/TemporaryFolder.h"
 #include "tests/support/Files.h"
 #include "tests/support/Program.h"
 #include "tests/support/SiteClient.h"
-#include "tests/support/TemporaryFolder.h"
 #include "tests/support/TestSite.h"
 #include "tests/support/sanitizers.h"
 #include <algorithm>
@@ -16,6 +16,8 @@
 #include <sstream>
 #include <thread>
 #include <unistd.h>
+
+using comgui::test::TemporaryFolder;
 
 namespace fs = std::filesystem;
 using namespace std::chrono_literals;

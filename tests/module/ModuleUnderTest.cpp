@@ -8,6 +8,8 @@
 #include <dlfcn.h>
 #include <stdexcept>
 
+using comgui::test::TemporaryFolder;
+
 namespace
 {
 using FACTORY = void* (*)(CFAllocatorRef, CFUUIDRef);

@@ -3,9 +3,11 @@
 #pragma once
 
 #include "comgui/session/ComGUIModuleInterface.h"
-#include "tests/support/TemporaryFolder.h"
+#include "comgui/testing/TemporaryFolder.h"
 #include <gtest/gtest.h>
 #include <string>
+
+using comgui::test::TemporaryFolder;
 
 // The table and one instance of the module; the process loads it once.
 class MODULE

@@ -2,12 +2,17 @@
 // place; and what is the bundle's own about its containers.
 #include "tests/module/ModuleUnderTest.h"
 
-#include "tests/support/ContainerContract.h"
-#include "tests/support/ContainerFake.h"
+#include "comgui/testing/ContainerContract.h"
+#include "comgui/testing/ContainerFake.h"
 #include "tests/support/Files.h"
 #include <stdexcept>
 #include <thread>
 #include <vector>
+
+using comgui::test::CONTAINER_MAKER;
+using comgui::test::CONTAINER_SUBJECT;
+using comgui::test::ContainerContract;
+using comgui::test::ContainerFake;
 
 namespace
 {

@@ -13,6 +13,8 @@
 #include <sys/stat.h>
 #include <thread>
 
+using comgui::test::TemporaryFolder;
+
 using testing::AllOf;
 using testing::AnyOf;
 using testing::ElementsAre;

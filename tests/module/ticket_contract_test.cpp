@@ -1,10 +1,16 @@
 // Runs TicketContract for every maker of a STICKET_ACCESS: the fake, the factory (in memory and from a file)
 // and a container's opened ticket. The container's own slots for values run it, too.
+#include "comgui/testing/TicketContract.h"
+#include "comgui/testing/TicketFake.h"
 #include "tests/module/LocalTicketUnderTest.h"
 #include "tests/module/NotificationListener.h"
-#include "tests/support/TicketContract.h"
-#include "tests/support/TicketFake.h"
 #include <stdexcept>
+
+using comgui::test::TemporaryFolder;
+using comgui::test::TICKET_MAKER;
+using comgui::test::TICKET_SUBJECT;
+using comgui::test::TicketContract;
+using comgui::test::TicketFake;
 
 namespace
 {

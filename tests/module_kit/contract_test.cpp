@@ -1,8 +1,15 @@
 // The tables that the kit makes keep the contracts that all makers of such tables share.
+#include "comgui/testing/ContainerContract.h"
+#include "comgui/testing/TicketContract.h"
 #include "comgui/ticket/TICKET_OP.h"
 #include "tests/module_kit/FakePlugIn.h"
-#include "tests/support/ContainerContract.h"
-#include "tests/support/TicketContract.h"
+
+using comgui::test::CONTAINER_MAKER;
+using comgui::test::CONTAINER_SUBJECT;
+using comgui::test::ContainerContract;
+using comgui::test::TICKET_MAKER;
+using comgui::test::TICKET_SUBJECT;
+using comgui::test::TicketContract;
 
 namespace
 {

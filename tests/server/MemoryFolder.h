@@ -2,8 +2,10 @@
 // power, and a slow disk would only leave fewer instants at which they can be ended.
 #pragma once
 
-#include "tests/support/TemporaryFolder.h"
+#include "comgui/testing/TemporaryFolder.h"
 #include <unistd.h>
+
+using comgui::test::TemporaryFolder;
 
 class MemoryFolder : public TemporaryFolder
 {

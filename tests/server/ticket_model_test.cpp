@@ -1,10 +1,12 @@
 // Random writes to the server and to a plain map side by side: whatever can be read must be equal.
 #include "tests/server/ServerTest.h"
 
-#include "tests/support/ContainerFake.h"
+#include "comgui/testing/ContainerFake.h"
 #include <climits>
 #include <deque>
 #include <random>
+
+using comgui::test::ContainerFake;
 
 namespace
 {

@@ -4,16 +4,20 @@
 
 #include "comgui/session/ComGUIManager.h"
 #include "comgui/session/TJobIdentification.h"
+#include "comgui/testing/ContainerFake.h"
+#include "comgui/testing/TemporaryFolder.h"
+#include "comgui/testing/TicketFake.h"
 #include "tests/support/BundleOnDisk.h"
-#include "tests/support/ContainerFake.h"
-#include "tests/support/TemporaryFolder.h"
-#include "tests/support/TicketFake.h"
 #include <filesystem>
 #include <functional>
 #include <gtest/gtest.h>
 #include <map>
 #include <string>
 #include <vector>
+
+using comgui::test::ContainerFake;
+using comgui::test::TemporaryFolder;
+using comgui::test::TicketFake;
 
 class FakeModule
 {

@@ -3,6 +3,10 @@
 
 #include "tests/session/FakeModule.h"
 
+using comgui::test::CALL;
+using comgui::test::ContainerFake;
+using comgui::test::SLOT;
+
 inline char const Key[] = "Key";
 inline char const Umlaut[] = "K\xC3\xA4y";
 

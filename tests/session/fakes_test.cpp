@@ -1,8 +1,11 @@
 // A fake must not answer a call that was meant for another object.
-#include "tests/support/TicketFake.h"
+#include "comgui/testing/TicketFake.h"
 
 #include <gtest/gtest.h>
 #include <stdexcept>
+
+using comgui::test::ContainerFake;
+using comgui::test::TicketFake;
 
 TEST(Fakes, CalledWithAnotherInstance_Throw)
 {

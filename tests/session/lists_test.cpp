@@ -9,6 +9,11 @@
 #include <memory>
 #include <wx/debug.h>
 
+using comgui::test::CALL;
+using comgui::test::ContainerFake;
+using comgui::test::SLOT;
+using comgui::test::TicketFake;
+
 using testing::ElementsAre;
 using testing::IsEmpty;
 

@@ -12,6 +12,8 @@
 #include <gtest/gtest.h>
 #include <memory>
 
+using comgui::test::TemporaryFolder;
+
 using testing::ElementsAre;
 using testing::IsEmpty;
 

@@ -11,6 +11,10 @@
 #include <stdexcept>
 #include <wx/filefn.h>
 
+using comgui::test::CALL;
+using comgui::test::SLOT;
+using comgui::test::TicketFake;
+
 using testing::ElementsAre;
 using testing::IsEmpty;
 

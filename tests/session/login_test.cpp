@@ -10,6 +10,8 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
+using comgui::test::ContainerFake;
+
 using testing::ElementsAre;
 
 namespace

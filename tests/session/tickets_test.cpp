@@ -7,6 +7,10 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
+using comgui::test::CALL;
+using comgui::test::ContainerFake;
+using comgui::test::SLOT;
+
 using testing::ElementsAre;
 using testing::IsEmpty;
 

@@ -6,6 +6,9 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
+using comgui::test::CALL;
+using comgui::test::SLOT;
+
 using testing::ElementsAre;
 using testing::IsEmpty;
 

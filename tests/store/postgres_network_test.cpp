@@ -1,16 +1,18 @@
 // What the PostgreSQL store does over a network that swallows what it is given, and says nothing of it.
 #include "standin/server/store/postgres/PostgresStore.h"
 
+#include "comgui/testing/TemporaryFolder.h"
 #include "tests/store/PostgresSite.h"
 #include "tests/store/WriterProcesses.h"
 #include "tests/support/NetworkProxy.h"
-#include "tests/support/TemporaryFolder.h"
 #include "tests/support/sanitizers.h"
 #include <cstdlib>
 #include <future>
 #include <gmock/gmock.h>
 #include <optional>
 #include <random>
+
+using comgui::test::TemporaryFolder;
 
 using namespace standin;
 using namespace std::chrono_literals;

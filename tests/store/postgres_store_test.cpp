@@ -1,14 +1,16 @@
 // What the PostgreSQL store promises beyond the contract of all stores: its schema, and what it is refused.
 #include "standin/server/store/postgres/PostgresStore.h"
 
+#include "comgui/testing/TemporaryFolder.h"
 #include "tests/store/PostgresSite.h"
 #include "tests/support/ChildProcess.h"
-#include "tests/support/TemporaryFolder.h"
 #include <cstdlib>
 #include <future>
 #include <gmock/gmock.h>
 #include <sys/stat.h>
 #include <thread>
+
+using comgui::test::TemporaryFolder;
 
 using namespace standin;
 using namespace std::chrono_literals;

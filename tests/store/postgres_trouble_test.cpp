@@ -1,16 +1,18 @@
 // What befalls a PostgreSQL server while a site is in use, and clocks that differ.
 #include "standin/server/store/postgres/PostgresStore.h"
 
+#include "comgui/testing/TemporaryFolder.h"
 #include "tests/store/PostgresSite.h"
 #include "tests/store/WriterProcesses.h"
 #include "tests/support/SmallDisk.h"
-#include "tests/support/TemporaryFolder.h"
 #include "tests/support/sanitizers.h"
 #include <atomic>
 #include <csignal>
 #include <cstdlib>
 #include <ctime>
 #include <gmock/gmock.h>
+
+using comgui::test::TemporaryFolder;
 
 using namespace standin;
 using namespace std::chrono_literals;

@@ -1,10 +1,12 @@
 // A ticket that can be walked: it delivers the records that it was made of, and writes down how it was asked.
 #pragma once
 
+#include "comgui/testing/TicketFake.h"
 #include "tests/support/StreamOracle.h"
-#include "tests/support/TicketFake.h"
 #include <string>
 #include <vector>
+
+using comgui::test::TicketFake;
 
 class WalkedTicket : public TicketFake
 {

@@ -1,13 +1,15 @@
 // Memory that runs out at every place where it can.
 #include "comgui/stream/MTICKET_BINSTREAM.h"
 #include "comgui/stream/STICKET_BINSTREAM.h"
+#include "comgui/testing/TemporaryFolder.h"
 #include "comgui/ticket/SETMULTIPAR_LIST.h"
 #include "tests/support/Allocations.h"
 #include "tests/support/StreamOracle.h"
-#include "tests/support/TemporaryFolder.h"
 #include <algorithm>
 #include <gtest/gtest.h>
 #include <new>
+
+using comgui::test::TemporaryFolder;
 
 using namespace StreamOracle;
 

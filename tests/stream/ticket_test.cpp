@@ -1,12 +1,17 @@
 // Streams that come from tickets and go to tickets and files.
 #include "comgui/stream/STICKET_BINSTREAM.h"
+#include "comgui/testing/TemporaryFolder.h"
 #include "tests/stream/WalkedTicket.h"
 #include "tests/support/Files.h"
 #include "tests/support/HexText.h"
 #include "tests/support/StreamOracle.h"
-#include "tests/support/TemporaryFolder.h"
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
+
+using comgui::test::CALL;
+using comgui::test::SLOT;
+using comgui::test::TemporaryFolder;
+using comgui::test::TicketFake;
 
 using namespace StreamOracle;
 using testing::ElementsAre;

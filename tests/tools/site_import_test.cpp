@@ -1,9 +1,11 @@
 #include "tools/comgui_site/import.h"
 
+#include "comgui/testing/TemporaryFolder.h"
 #include "tests/support/Files.h"
-#include "tests/support/TemporaryFolder.h"
 #include "tests/tools/SiteTest.h"
 #include "tools/comgui_site/export.h"
+
+using comgui::test::TemporaryFolder;
 
 using namespace comgui_site;
 using namespace standin;

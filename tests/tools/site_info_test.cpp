@@ -1,7 +1,9 @@
 #include "tools/comgui_site/info.h"
 
-#include "tests/support/TemporaryFolder.h"
+#include "comgui/testing/TemporaryFolder.h"
 #include "tests/tools/SiteTest.h"
+
+using comgui::test::TemporaryFolder;
 
 using namespace comgui_site;
 using namespace standin;

@@ -1,8 +1,10 @@
 #include "tools/comgui_site/users.h"
 
+#include "comgui/testing/TemporaryFolder.h"
 #include "standin/server/store/sqlite/SqliteStore.h"
-#include "tests/support/TemporaryFolder.h"
 #include "tests/tools/SiteTest.h"
+
+using comgui::test::TemporaryFolder;
 
 using namespace comgui_site;
 using namespace standin;

@@ -1,11 +1,13 @@
 // What a host gets through the trace, beside what the plug-in itself gives.
+#include "comgui/testing/TemporaryFolder.h"
 #include "comgui/ticket/TICKET_OP.h"
 #include "standin/trace/RealModule.h"
 #include "standin/trace/TracedEntries.h"
 #include "standin/trace/TracedTables.h"
-#include "tests/support/TemporaryFolder.h"
 #include <cstdlib>
 #include <gtest/gtest.h>
+
+using comgui::test::TemporaryFolder;
 
 namespace
 {

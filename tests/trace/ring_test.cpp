@@ -1,12 +1,14 @@
 // The ring between a traced program and what writes its records down.
 #include "standin/trace/TraceRing.h"
 
-#include "tests/support/TemporaryFolder.h"
+#include "comgui/testing/TemporaryFolder.h"
 #include <atomic>
 #include <gtest/gtest.h>
 #include <map>
 #include <thread>
 #include <vector>
+
+using comgui::test::TemporaryFolder;
 
 using namespace trace;
 

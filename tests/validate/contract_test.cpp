@@ -1,5 +1,5 @@
 // The page of rules and the program's checks know each other, and a good plug-in passes them all.
-#include "tests/support/TemporaryFolder.h"
+#include "comgui/testing/TemporaryFolder.h"
 #include "tests/support/sanitizers.h"
 #include "tools/comgui_validate/Check.h"
 #include "tools/comgui_validate/Contract.h"
@@ -15,6 +15,8 @@
 #include <stdexcept>
 #include <string_view>
 #include <unistd.h>
+
+using comgui::test::TemporaryFolder;
 
 namespace
 {

@@ -1,8 +1,8 @@
 // Each fault that a plug-in may have is found by the checks that should find it, and by no other of the kind.
 // COMGUI_ALL_CHECKS in the environment: by no other at all, which takes minutes.
 #include "comgui/session/ComGUIModuleInterface.h"
+#include "comgui/testing/TemporaryFolder.h"
 #include "tests/support/BundleOnDisk.h"
-#include "tests/support/TemporaryFolder.h"
 #include "tests/support/sanitizers.h"
 #include "tools/comgui_validate/Check.h"
 #include "tools/comgui_validate/Run.h"
@@ -12,6 +12,8 @@
 #include <set>
 #include <string>
 #include <vector>
+
+using comgui::test::TemporaryFolder;
 
 namespace
 {

@@ -1,10 +1,13 @@
-#include "tests/support/ContainerFake.h"
+#include "comgui/testing/ContainerFake.h"
 
 #include "comgui/ticket/TICKET_ID.h"
 
 #include <cstring>
 #include <stdexcept>
+#include <tuple>
 
+namespace comgui::test
+{
 namespace
 {
 constexpr int LargestPosition = 0xFFFFFF;
@@ -43,6 +46,16 @@ std::vector<std::string> CopyOf(char const* const* keys)
     return copy;
 }
 }  // namespace
+
+bool operator==(CALL const& left, CALL const& right)
+{
+    auto const fields = [](CALL const& call)
+    {
+        return std::tie(call.slot, call.type, call.id, call.key, call.ptype, call.pos, call.op, call.arg,
+                        call.notification, call.enable, call.keys);
+    };
+    return fields(left) == fields(right);
+}
 
 void PrintTo(CALL const& call, std::ostream* out)
 {
@@ -352,3 +365,4 @@ STICKET_ACCESS const* ContainerFake::OnCreate(void* instance, int type, int id, 
     fake.AddTicket(type, id);
     return &fake.m_ticket;
 }
+}  // namespace comgui::test

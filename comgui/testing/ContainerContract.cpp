@@ -1,8 +1,10 @@
-#include "tests/support/ContainerContract.h"
+#include "comgui/testing/ContainerContract.h"
 
 #include <climits>
 #include <utility>
 
+namespace comgui::test
+{
 int ContainerContract::Int(int id, char const* key) const
 {
     int value = -1;
@@ -80,3 +82,4 @@ TEST_P(ContainerContract, AnAddressOutOfRange_IsRefusedEverywhere)
     }
     EXPECT_EQ(value, 42);
 }
+}  // namespace comgui::test

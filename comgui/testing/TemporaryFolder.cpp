@@ -1,13 +1,15 @@
-#include "tests/support/TemporaryFolder.h"
+#include "comgui/testing/TemporaryFolder.h"
 
-#include "tests/support/Files.h"
 #include <cerrno>
 #include <cstdlib>
+#include <fstream>
 #include <string>
 #include <system_error>
 
 namespace fs = std::filesystem;
 
+namespace comgui::test
+{
 TemporaryFolder::TemporaryFolder(fs::path const& place)
 {
     std::string name = (fs::canonical(place) / "comgui-test-XXXXXX").string();
@@ -26,6 +28,11 @@ fs::path TemporaryFolder::Write(fs::path const& name, std::string_view text) con
 {
     fs::path file = m_path / name;
     fs::create_directories(file.parent_path());
-    WriteFile(file, text);
+    std::ofstream stream;
+    stream.exceptions(std::ios::failbit | std::ios::badbit);
+    stream.open(file, std::ios::binary);
+    stream.write(text.data(), static_cast<std::streamsize>(text.size()));
+    stream.close();
     return file;
 }
+}  // namespace comgui::test

@@ -16,6 +16,8 @@
 
 class clFOLDER_VARIABLES;
 
+namespace comgui::test
+{
 enum class SLOT
 {
     GET,         // MGETPARAMETER
@@ -45,7 +47,8 @@ struct CALL
     bool enable = false;   // MENDISNOTIF
     std::vector<std::string> keys{};
 
-    friend bool operator==(CALL const&, CALL const&) = default;
+    friend bool operator==(CALL const& left, CALL const& right);
+    friend bool operator!=(CALL const& left, CALL const& right) { return !(left == right); }
     friend void PrintTo(CALL const& call, std::ostream* out);
 };
 
@@ -136,3 +139,4 @@ private:
     int m_failIn = -1;
     std::optional<int> m_failPosition;
 };
+}  // namespace comgui::test

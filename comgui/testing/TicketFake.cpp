@@ -1,8 +1,10 @@
-#include "tests/support/TicketFake.h"
+#include "comgui/testing/TicketFake.h"
 
 #include "comgui/ticket/TICKET_OP.h"
 #include <stdexcept>
 
+namespace comgui::test
+{
 TicketFake& TicketFake::Of(void* instance)
 {
     auto* const fake = static_cast<TicketFake*>(instance);
@@ -55,3 +57,4 @@ int TicketFake::OnOption(void* instance, int code, void* out)
         *static_cast<clFOLDER_VARIABLES**>(out) = fake.container.folders;
     return fake.optionResult;
 }
+}  // namespace comgui::test

@@ -11,6 +11,8 @@
 #include <string>
 #include <vector>
 
+namespace comgui::test
+{
 // An empty ticket that accepts writes.
 class TICKET_SUBJECT
 {
@@ -77,3 +79,4 @@ protected:
     std::unique_ptr<TICKET_SUBJECT> subject;
     STICKET_ACCESS const* access;
 };
+}  // namespace comgui::test

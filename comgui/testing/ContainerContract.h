@@ -8,6 +8,8 @@
 #include <gtest/gtest.h>
 #include <memory>
 
+namespace comgui::test
+{
 // A container with a ticket that its session may write to and delete, and that has none of the suite's short
 // keys. missingId: an id of that type that is no ticket.
 class CONTAINER_SUBJECT
@@ -39,3 +41,4 @@ protected:
     std::unique_ptr<CONTAINER_SUBJECT> subject;
     MTICKET_ACCESS const* access;
 };
+}  // namespace comgui::test

@@ -1,4 +1,4 @@
-#include "tests/support/TicketContract.h"
+#include "comgui/testing/TicketContract.h"
 
 #include "comgui/ticket/BIN_STRING.h"
 #include "comgui/ticket/TICKET_OP.h"
@@ -11,6 +11,8 @@ using testing::ElementsAre;
 using testing::IsEmpty;
 using testing::SizeIs;
 
+namespace comgui::test
+{
 namespace
 {
 constexpr int LargestPosition = 16777215;
@@ -1070,3 +1072,4 @@ TEST_P(TicketContract, SOPTION_AnyOtherCode_FailsAndLeavesOut)
         EXPECT_EQ(out.Written(), 0u) << code;
     }
 }
+}  // namespace comgui::test

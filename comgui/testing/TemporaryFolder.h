@@ -5,6 +5,8 @@
 #include <filesystem>
 #include <string_view>
 
+namespace comgui::test
+{
 class TemporaryFolder
 {
 public:
@@ -25,3 +27,4 @@ public:
 private:
     std::filesystem::path m_path;
 };
+}  // namespace comgui::test

@@ -3,10 +3,12 @@
 // as that one does.
 #pragma once
 
+#include "comgui/testing/ContainerFake.h"
 #include "comgui/ticket/STICKET_ACCESS.h"
-#include "tests/support/ContainerFake.h"
 #include <vector>
 
+namespace comgui::test
+{
 class TicketFake
 {
     static constexpr unsigned long long Mark = 0x5449434B45544641;
@@ -34,3 +36,4 @@ private:
 
     STICKET_ACCESS m_access{};
 };
+}  // namespace comgui::test
