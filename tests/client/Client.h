@@ -2,8 +2,8 @@
 #pragma once
 
 #include "comgui/client.h"
+#include "comgui/testing/TemporarySite.h"
 #include "comgui/testing/TemporaryFolder.h"
-#include <cstdlib>
 #include <gtest/gtest.h>
 
 using comgui::test::TemporaryFolder;
@@ -12,8 +12,6 @@ class Client : public testing::Test
 {
 protected:
     static constexpr comgui::TicketAddress System{comgui::SystemTickets, 0};
-
-    Client() { setenv("COMGUI_SITE", (folder / "site").c_str(), 1); }
 
     static comgui::Server Here() { return {}; }
     static comgui::Account Admin() { return {"admin", "admin"}; }
@@ -25,6 +23,7 @@ protected:
     comgui::TicketAddress NewTicket(int type = comgui::JobTickets) const { return *tickets.Create(type); }
 
     TemporaryFolder const folder;
+    comgui::test::TemporarySite site;
     comgui::Connection connection;
     comgui::Tickets const tickets = connection.GetTickets();
 };

@@ -154,7 +154,7 @@ TEST_F(SnippetsOfTheClientKit, ShowPaths)
     // What an event brings is as stored:
     std::string const visible = tickets.Resolved("$(JOB)/7/page.pdf");
     // [/paths]
-    EXPECT_EQ(*path, (folder / "site/job/7/page.pdf").string());
+    EXPECT_EQ(*path, (site.Folder() / "job/7/page.pdf").string());
     EXPECT_EQ(ToText(*stored), "$(JOB)/7/page.pdf");
     EXPECT_EQ(ToText(*tickets.Read(job, "Job/File", WholeKey, Paths::AsStored)), "$(JOB)/7/page.pdf.old");
     EXPECT_TRUE(written);

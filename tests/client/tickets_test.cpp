@@ -203,7 +203,7 @@ TEST_F(TicketsOfAClient, FolderPath_IsShownResolved_AndWrittenBackWithItsVariabl
     TicketAddress const ticket = NewTicket();
     ASSERT_TRUE(tickets.Write(ticket, "File", "$(TEMP)/page.pdf"));
     std::string const shown = TextOf(ticket, "File");
-    EXPECT_EQ(shown, (folder / "site/temp/page.pdf").string());
+    EXPECT_EQ(shown, (site.Folder() / "temp/page.pdf").string());
     EXPECT_EQ(*tickets.Read(ticket, "File", WholeKey, Paths::AsStored), Value("$(TEMP)/page.pdf"));
     ASSERT_TRUE(tickets.WriteText(ticket, "File", shown));
     EXPECT_EQ(*tickets.Read(ticket, "File", WholeKey, Paths::AsStored), Value("$(TEMP)/page.pdf"));

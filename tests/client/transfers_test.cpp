@@ -33,7 +33,7 @@ protected:
         return (folder / "large").string();
     }
 
-    fs::path Site(char const* rest) const { return folder / "site" / rest; }
+    fs::path Site(char const* rest) const { return site.Folder() / rest; }
 
     template <typename IsThere>
     static void Await(Transfer const& transfer, IsThere const& isThere)
