@@ -13,12 +13,12 @@ else()
     set(comgui_beside $ORIGIN)
 endif()
 
-set_target_properties(comgui comgui_client comgui_host PROPERTIES INSTALL_RPATH ${comgui_beside})
+set_target_properties(comgui comgui_client comgui_host comgui_testing PROPERTIES INSTALL_RPATH ${comgui_beside})
 set_target_properties(comgui_host PROPERTIES EXPORT_NAME host)
 set_target_properties(comgui_corefoundation PROPERTIES INSTALL_RPATH ${comgui_beside} EXPORT_NAME corefoundation)
 set_target_properties(comgui_module PROPERTIES INSTALL_RPATH ${comgui_beside}/../../..)
 
-install(TARGETS comgui comgui_client comgui_host comgui_module_kit EXPORT comgui-targets
+install(TARGETS comgui comgui_client comgui_host comgui_module_kit comgui_fakes comgui_testing comgui_contracts EXPORT comgui-targets
     LIBRARY DESTINATION ${CMAKE_INSTALL_LIBDIR} ARCHIVE DESTINATION ${CMAKE_INSTALL_LIBDIR} FILE_SET HEADERS)
 if(APPLE)
     install(TARGETS comgui_corefoundation EXPORT comgui-targets)    # no more than the system's own

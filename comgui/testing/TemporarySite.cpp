@@ -3,9 +3,9 @@
 #include "comgui/testing/ShippedSeed.h"
 #include "comgui/testing/TemporaryFolder.h"
 #include "standin/server/sessions/Password.h"
+#include "standin/server/site/RulesOfSite.h"
 #include "standin/server/site/Server.h"
 #include "standin/server/site/Site.h"
-#include "standin/server/trouble/RulesOfSite.h"
 #include <algorithm>
 #include <cstdlib>
 #include <mutex>

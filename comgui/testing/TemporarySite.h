@@ -49,13 +49,13 @@ public:
     void Put(Address ticket, std::string const& key, Value const& value, int pos = -1);
     void Delete(Address ticket);
 
-    // What the server has, whatever clients have been told; std::monostate for nothing. -1 reads the value at
-    // 0 of a key that has one alone.
-    Value Read(Address ticket, std::string const& key, int pos = -1) const;
+    // What the server has, whatever clients have been told; std::monostate for nothing. pos: from 0.
+    Value Read(Address ticket, std::string const& key, int pos = 0) const;
     bool Exists(Address ticket) const;
 
-    // Lets the server misbehave for its clients, by these rules instead of any before; docs/site.md tells
-    // what they can say. None: it behaves. Throws std::invalid_argument for what is no rule.
+    // Lets the server misbehave for its clients, by these rules instead of any before, from their next calls
+    // on; docs/site.md tells what rules can say. None: it behaves. Throws std::invalid_argument for what is
+    // no rule.
     void SetTrouble(std::vector<std::string> const& rules);
 
 private:

@@ -10,8 +10,9 @@ TicketAddress Of(comgui::plugin::Address address) { return {address.type, addres
 }  // namespace
 
 Container::Container(standin::Server& server, std::shared_ptr<standin::Session> session)
-    : m_server(server), m_session(std::move(session)), m_gate(server.Troubles(), *m_session),
-      m_folders(server.Tickets()), m_opened(server.Tickets(), *m_session, m_gate, m_folders, m_numbers)
+    : m_server(server), m_session(std::move(session)),
+      m_gate(server.Tickets(), server.Troubles(), *m_session), m_folders(server.Tickets()),
+      m_opened(server.Tickets(), *m_session, m_gate, m_folders, m_numbers)
 {
 }
 
@@ -31,14 +32,18 @@ void Container::Withdraw() noexcept
 
 bool Container::Get(Address ticket, char const* key, PARAM_TYPE type, void* value, int pos)
 {
+    if (!MayRead())
+        return false;
     m_gate.Pass("MGETPARAMETER", Of(ticket));
-    return MayRead() && ReadTicket(Tickets(), *m_session, Of(ticket), 0, key, type, value, pos);
+    return ReadTicket(Tickets(), *m_session, Of(ticket), 0, key, type, value, pos);
 }
 
 bool Container::GetTable(Address ticket, GETMULTIPAR* table)
 {
+    if (!MayRead())
+        return false;
     m_gate.Pass("MGETMULTIPAR", Of(ticket));
-    return MayRead() && ReadTable(Tickets(), *m_session, Of(ticket), 0, table);
+    return ReadTable(Tickets(), *m_session, Of(ticket), 0, table);
 }
 
 bool Container::Set(Address ticket, char const* key, PARAM_TYPE type, void const* value, int pos)

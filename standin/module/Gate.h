@@ -2,7 +2,7 @@
 // see TroubleRule.h. For any thread; while nothing is amiss it costs next to nothing.
 #pragma once
 
-#include "standin/server/sessions/Session.h"
+#include "standin/server/sessions/TicketService.h"
 #include "standin/server/trouble/Troubles.h"
 
 namespace standin
@@ -10,8 +10,10 @@ namespace standin
 // Waits, and throws comgui::plugin::Refused with the code, if that is what the rules want.
 void PassTroubled(Troubles& troubles, Occasion const& call);
 
-inline void Pass(Troubles& troubles, Occasion const& call)
+// By the rules that were there when this was called, whoever has set them on this machine.
+inline void Pass(TicketService& tickets, Troubles& troubles, Occasion const& call)
 {
+    tickets.CatchUp();
     if (troubles.Any()) [[unlikely]]
         PassTroubled(troubles, call);
 }
@@ -19,16 +21,21 @@ inline void Pass(Troubles& troubles, Occasion const& call)
 class Gate
 {
 public:
-    // Both outlive it.
-    Gate(Troubles& troubles, Session const& session) : m_troubles(troubles), m_session(session) {}
+    // All of them outlive it.
+    Gate(TicketService& tickets, Troubles& troubles, Session const& session)
+        : m_tickets(tickets), m_troubles(troubles), m_session(session)
+    {
+    }
 
     void Pass(std::string_view call, std::optional<TicketAddress> ticket = {}) const
     {
+        m_tickets.CatchUp();
         if (m_troubles.Any()) [[unlikely]]
             PassTroubledCall({.call = call, .ticket = ticket, .user = m_session.Who().name});
     }
     void PassCommand(std::string_view command) const
     {
+        m_tickets.CatchUp();
         if (m_troubles.Any()) [[unlikely]]
             PassTroubledCall({.call = "SendCommandEntry", .command = command, .user = m_session.Who().name});
     }
@@ -39,6 +46,7 @@ public:
 private:
     void PassTroubledCall(Occasion const& call) const;
 
+    TicketService& m_tickets;
     Troubles& m_troubles;
     Session const& m_session;
 };

@@ -63,9 +63,9 @@ bool WriteTable(TicketService& tickets, Session const& session, TicketAddress ad
 
 bool OpenTicket::Get(char const* key, PARAM_TYPE type, void* value, int pos)
 {
-    m_gate.Pass("SGETPARAMETER", m_address);
     if (!MayRead())
         return false;
+    m_gate.Pass("SGETPARAMETER", m_address);
     if (m_address == SystemTicket && key && value && (type == PARAM_STRING || type == PARAM_INT)) [[unlikely]]
         return GetFolder(key, type, value, pos);
     EndFolderReading();
@@ -104,9 +104,9 @@ void OpenTicket::EndFolderReading() const
 
 bool OpenTicket::GetTable(GETMULTIPAR* table)
 {
-    m_gate.Pass("SGETMULTIPAR", m_address);
     if (!MayRead())
         return false;
+    m_gate.Pass("SGETMULTIPAR", m_address);
     EndFolderReading();
     return ReadTable(m_tickets, m_session, m_address, Which(), table);
 }

@@ -66,7 +66,7 @@ int GetReason(STICKET_ACCESS const* ticket)
 int StandInModule::IsAlive(std::string_view host, int port)
 {
     Server& server = SiteAt(std::string(host), port).server;
-    Pass(server.Troubles(), {.call = "IsAliveEntry"});
+    Pass(server.Tickets(), server.Troubles(), {.call = "IsAliveEntry"});
     return server.IsReachable() ? MODULE_DONE : MODULE_SITE_UNAVAILABLE;
 }
 
@@ -75,14 +75,14 @@ int StandInModule::Initialize(TLogin&)
     OpenSite* const site = SiteOfThisProcess();
     if (!site)
         return MODULE_SITE_UNAVAILABLE;
-    Pass(site->server.Troubles(), {.call = "InitializeEntry"});
+    Pass(site->server.Tickets(), site->server.Troubles(), {.call = "InitializeEntry"});
     return MODULE_DONE;
 }
 
 LoggedIn StandInModule::LogIn(Credentials const& credentials)
 {
     OpenSite& site = SiteAt(credentials.host, credentials.port);
-    Pass(site.server.Troubles(), {.call = "LoginEntry", .user = credentials.user});
+    Pass(site.server.Tickets(), site.server.Troubles(), {.call = "LoginEntry", .user = credentials.user});
     try
     {
         auto session = site.server.Login(credentials.user, credentials.password);

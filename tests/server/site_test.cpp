@@ -6,7 +6,7 @@
 #include "standin/server/site/Seed.h"
 #include "standin/server/store/sqlite/SqliteStore.h"
 #include "standin/server/tickets/TicketXml.h"
-#include "standin/server/trouble/RulesOfSite.h"
+#include "standin/server/site/RulesOfSite.h"
 #include "tests/server/MemoryFolder.h"
 #include "tests/server/OpenedSite.h"
 #include "tests/support/ChildProcess.h"

@@ -416,7 +416,7 @@ TEST_F(TicketPromises, TextsOfAWalk_StayToItsEndThoughTheSessionEnds)
     Set(Job, "B", "second text, too long for any short string");
     standin::FolderTranslator folders(Tickets());
     auto const numbers = std::make_shared<standin::WalkedNumbers>();
-    standin::Gate const gate(standin::Troubles::None(), As("admin"));
+    standin::Gate const gate(Tickets(), standin::Troubles::None(), As("admin"));
     standin::OpenTicket const ticket(Tickets(), As("admin"), gate, folders, numbers, Job,
                                      Tickets().IncarnationOf(Job));
     As("operator");

@@ -1,7 +1,7 @@
 // The rules by which the servers of a site misbehave, as the owner sees and changes them.
 #pragma once
 
-#include "standin/server/trouble/RulesOfSite.h"
+#include "standin/server/site/RulesOfSite.h"
 #include "standin/server/trouble/TroubleRule.h"
 #include <string>
 #include <vector>

@@ -7,7 +7,7 @@
 #include "standin/server/sessions/Password.h"
 #include "standin/server/site/Caretaker.h"
 #include "standin/server/site/SystemTicketMirror.h"
-#include "standin/server/trouble/TroubleListener.h"
+#include "standin/server/site/TroubleListener.h"
 
 namespace standin
 {

@@ -1,4 +1,4 @@
-#include "standin/server/trouble/RulesOfSite.h"
+#include "standin/server/site/RulesOfSite.h"
 
 #include "standin/server/store/Outcome.h"
 #include "standin/server/trouble/Troubles.h"

@@ -1,4 +1,4 @@
-#include "standin/server/trouble/TroubleListener.h"
+#include "standin/server/site/TroubleListener.h"
 
 #include "standin/server/files/Report.h"
 
