@@ -55,7 +55,7 @@ std::string BytesOf(BIN_STRING const& binary) { return {static_cast<char const*>
 
 int TicketContract::SetBytes(char const* key, std::string const& bytes, int pos) const
 {
-    BIN_STRING const binary(bytes);
+    BIN_STRING const binary(bytes.data(), bytes.size());
     return Set(key, PARAM_BINSTRING, &binary, pos);
 }
 
@@ -435,7 +435,7 @@ TEST_P(TicketContract, SSETPARAMETER_KeepsNoPointerToItsArguments)
     std::string key = "Key";
     std::string text = "text";
     std::string bytes = "bytes";
-    BIN_STRING binary(bytes);
+    BIN_STRING binary(bytes.data(), bytes.size());
     EXPECT_TRUE(SetText(key.c_str(), text, 0));
     EXPECT_TRUE(Set(key.c_str(), PARAM_BINSTRING, &binary, 1));
     key = "___";
