@@ -109,6 +109,16 @@ int AnswerProgress(void* data)
     return 0;
 }
 
+void NoteCallback(STICKET_ACCESS const& ticket)
+{
+    void* callback = nullptr;
+    void* user = nullptr;
+    ticket.SGETPARAMETER(ticket.Instance, "pGUI2Notification", PARAM_POINTER, &callback, -1);
+    ticket.SGETPARAMETER(ticket.Instance, "pUser", PARAM_POINTER, &user, -1);
+    trouble.callbackUser = user;
+    trouble.callback = reinterpret_cast<void (*)(void*, int, int, int, int, void*)>(callback);
+}
+
 int SendCommand(void* hInstance, void* hSession, char const* command, int size, void* data)
 {
     std::string_view const name = command;
@@ -130,6 +140,8 @@ int SendCommand(void* hInstance, void* hSession, char const* command, int size, 
         return 103;
     if (name == "local.set.callback" && trouble.refusesCallbacks)
         return 101;
+    if (name == "local.set.callback" && !trouble.callback)
+        NoteCallback(*static_cast<STICKET_ACCESS const*>(data));
     if (name.substr(0, 10) == "local.get." && trouble.knowsNoNewCommands)
         return 111;
     return real.SendCommandEntry(hInstance, hSession, command, size, data);

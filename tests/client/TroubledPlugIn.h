@@ -24,6 +24,8 @@ struct TROUBLE
     std::atomic<bool> knowsNoNewCommands{false};  // those that only the package's own plug-in has
 
     // What happened.
+    std::atomic<void (*)(void*, int, int, int, int, void*)> callback{nullptr};  // of the first session
+    std::atomic<void*> callbackUser{nullptr};
     std::atomic<int> tries{0};   // logins, good or not
     std::atomic<int> logins{0};  // good ones
     std::atomic<int> logouts{0};

@@ -294,6 +294,35 @@ TEST_F(EventsOfAClient, EndOfASubscription_WaitsForItsExecutor_AndFreesItsHandle
     EXPECT_EQ(held.use_count(), 1);
 }
 
+// What a handler holds may use the kit when it goes.
+TEST_F(EventsOfAClient, EndOfASubscriptionInItsExecutor_FreesItsHandlerWithNothingLocked)
+{
+    TicketAddress const job = NewTicket();
+    Subscription subscription;
+    std::promise<void> freed;
+    std::shared_ptr<int> held(new int(1),
+                              [&](int const* number)
+                              {
+                                  delete number;
+                                  Subscription const another =
+                                      connection.Subscribe({}, queue.GetExecutor(), [](Event const&) {});
+                                  freed.set_value();
+                              });
+    std::mutex made;
+    std::unique_lock whileMade(made);
+    subscription = connection.Subscribe(
+        Interest::InTickets({job}),
+        [&](auto const&)
+        {
+            std::lock_guard const wait(made);
+            subscription = {};
+        },
+        [held = std::move(held)](Event const&) {}, 0ms);
+    whileMade.unlock();
+    ASSERT_TRUE(tickets.Write(job, "A", 1));
+    EXPECT_EQ(freed.get_future().wait_for(20s), std::future_status::ready);
+}
+
 TEST_F(EventsOfAClient, SubscriptionWithoutAThread_Throws_AndIsNone)
 {
     Connection fresh;

@@ -214,6 +214,31 @@ TEST_F(TroubledClient, LossInAnOldSession_IsNotHeardInTheNextOne)
     EXPECT_THAT(heard, IsEmpty());
 }
 
+// Some plug-ins have one on its way when the logout returns.
+TEST_F(TroubledClient, CallbackOfAnOldSession_IsNotHeardInTheNextOne)
+{
+    LogIn();
+    TicketAddress const job = NewTicket();
+    ASSERT_TRUE(connection.LogOut());
+    LogIn();
+    std::vector<TicketAddress> deleted;
+    auto const subscription =
+        connection.Subscribe(Interest::InTypes({JobTickets}), queue.GetExecutor(),
+                             [&](Event const& event)
+                             {
+                                 if (auto const* const what = std::get_if<TicketDeleted>(&event))
+                                     deleted.push_back(what->ticket);
+                             });
+    constexpr int Deleted = 5;
+    trouble.callback.load()(trouble.callbackUser, Deleted, job.id, 1, JobTickets, nullptr);
+    queue.RunFor(100ms);
+    EXPECT_THAT(deleted, IsEmpty());
+    ASSERT_TRUE(tickets.Delete(job));
+    for (auto const end = Clock::now() + 20s; deleted.empty() && Clock::now() < end;)
+        queue.RunFor(5ms);
+    EXPECT_THAT(deleted, ElementsAre(job));
+}
+
 // The cut of a transfer takes longer than the transfer itself.
 TEST_F(TroubledClient, CancelOfOneTransfer_LeavesTheOthersAlone)
 {
