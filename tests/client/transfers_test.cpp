@@ -201,6 +201,8 @@ TEST_F(TransfersOfAClient, BeyondFour_Wait_AndCanBeCancelledToo)
     EXPECT_EQ(running[0].Number(), all[0].Number());
     all[5].Cancel();
     EXPECT_EQ(CodeOf(*all[5].WaitFor(0ms)), Cancelled);
+    for (Transfer const& each : transfers.Running())
+        EXPECT_NE(each.Number(), all[5].Number());
     EXPECT_TRUE(connection.LogOut());
     for (Transfer const& each : all)
         EXPECT_TRUE(each.IsOver());
