@@ -111,6 +111,14 @@ TEST(DisplayText, EveryCutIsAsLongAsAskedForAtMost)
     EXPECT_EQ(DisplayText(text, 300), text);
 }
 
+// What is read of a long text ends in the middle of a character now and then.
+TEST(DisplayText, CutOfCharactersOfThreeBytes_IsTheSame)
+{
+    std::string const text = Repeated(1000, "\xE5\xAD\x97");
+    for (std::size_t characters = 1; characters < 300; ++characters)
+        ASSERT_EQ(DisplayText(text, characters), Repeated(characters - 1, "\xE5\xAD\x97") + "…");
+}
+
 TEST(DisplayText, LargeTextIsCut)
 {
     for (std::string const part : {"a", "\xFF", "\x80", "\u0301", "\n"})

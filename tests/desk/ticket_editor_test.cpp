@@ -73,6 +73,7 @@ TEST_F(EditorOfTickets, UndoesAndRedoes)
     Await(4);
     EXPECT_EQ(CodeOf(tickets.Read(job, "Copies")), comgui::NoSuchKey);
     EXPECT_FALSE(editor->CanUndo());
+    EXPECT_TRUE(editor->CanRedo());
     editor->Redo();
     Await(5);
     editor->Redo();
