@@ -187,9 +187,13 @@ int LogOut(void* hSession)
     KeepForGood(*session);
     if (ContainerSlots* const container = session->GetContainer())
         container->Withdraw();
-    bool const hasLived = !session->HasEnded() && session->End();
-    session->Silence();
-    return hasLived ? Done : UnknownSession;
+    struct Silencer
+    {
+        Session& session;
+        ~Silencer() { session.Silence(); }
+    } const atLast{*session};  // also if the author's function throws
+    bool const hadEnded = session->HasEnded();
+    return session->End() && !hadEnded ? Done : UnknownSession;
 }
 
 int Logout(void* hInstance, void* hSession)

@@ -41,7 +41,7 @@ public:
     virtual ContainerSlots* GetContainer() { return nullptr; }
 
     // The client has logged out: no function of the session or its container begins any more, but one may be
-    // under way on another thread. False if it had ended already.
+    // under way on another thread. Called also if it has ended by itself. False if it had ended already.
     virtual bool End() { return true; }
 
     // Whether the session has ended by itself, for instance with its server. It is then an unknown one.

@@ -18,12 +18,50 @@ namespace
 {
 constexpr Address UserTicket{17, 1};
 constexpr int JobTicketType = 3;
+constexpr int NobodyThere = 105;
+
+constexpr std::string_view Names[] = {
+    "IsAliveEntry",     "InitializeEntry", "LoginEntry",       "LogoutEntry",   "GetTicketDataEntry",
+    "SendCommandEntry", "PutFileEntry",    "PutFileSyncEntry", "GetFileEntry",  "GetFileSyncEntry",
+    "SendJobEntry",     "MGETPARAMETER",   "MGETMULTIPAR",     "MWALKTICKETS",  "MSETPARAMETER",
+    "MSETMULTIPAR",     "MOPERATION",      "MENDISNOTIF",      "MCREATETICKET", "SWALKPARAMETERS",
+};
+
+char const* NameOf(int operation)
+{
+    switch (operation)
+    {
+    case MTICKET_OP_OPEN:
+        return " open";
+    case MTICKET_OP_CLOSE:
+        return " close";
+    case MTICKET_OP_CREATE_NEXT:
+        return " create";
+    case MTICKET_OP_DELETE:
+        return " delete";
+    case MTICKET_OP_FOLDER_VARIABLES:
+        return " folders";
+    case STICKET_OP_SET_PARTIAL:
+        return " partial";
+    default:
+        return " other";
+    }
+}
 
 std::string TextOf(Address ticket) { return std::to_string(ticket.type) + "/" + std::to_string(ticket.id); }
 
 std::string TextOf(std::string_view key, int pos)
 {
     return std::string(key) + "[" + std::to_string(pos) + "]";
+}
+
+// " KEY[POS]=VALUE" of each record.
+std::string TextOf(SETMULTIPAR const* table)
+{
+    std::string text;
+    for (Parameter const& record : RecordsOf(table))
+        text += " " + TextOf(record.key, record.pos) + "=" + test::TextOf(record.value);
+    return text;
 }
 
 // Where the bundle's executable is a link to: the library with this code.
@@ -93,6 +131,8 @@ public:
         int code = 0;
         {
             std::lock_guard const lock(m_lock);
+            if (m_isClosed)
+                throw plugin::Refused(NobodyThere);
             m_calls.push_back(line);
             for (std::string const& each : {name, command})
                 if (auto const order = m_codes.find(each); order != m_codes.end())
@@ -181,8 +221,21 @@ public:
     }
     void Answer(std::string const& call, int code)
     {
+        bool const isKnown = std::find(std::begin(Names), std::end(Names), call) != std::end(Names);
+        if (!isKnown && call.find('.') == std::string::npos)
+            throw std::invalid_argument(call + ": no call that a fake can answer for");
         std::lock_guard const lock(m_lock);
-        m_codes[call] = code;
+        if (code == 0)
+            m_codes.erase(call);
+        else
+            m_codes[call] = code;
+    }
+    void Close()
+    {
+        std::lock_guard const lock(m_lock);
+        m_isClosed = true;
+        m_tickets.clear();
+        m_work = nullptr;
     }
     void OnCall(std::function<void(std::string const&)> work)
     {
@@ -192,6 +245,7 @@ public:
 
 private:
     mutable std::mutex m_lock;  // of all below
+    bool m_isClosed = false;
     std::map<Address, Parameters> m_tickets;
     std::map<int, int> m_newest;  // ids by type
     std::vector<std::string> m_calls;
@@ -237,8 +291,6 @@ private:
         return m_inside;
     }
 
-    static constexpr int NobodyThere = 105;
-
     std::mutex m_lock;
     std::shared_ptr<Inside> m_inside;
 };
@@ -256,10 +308,58 @@ public:
     {
     }
 
+    bool Get(Address ticket, char const* key, PARAM_TYPE type, void* value, int pos) override
+    {
+        m_inside->Note("MGETPARAMETER", TextOf(ticket) + " " + TextOf(key ? key : "(null)", pos));
+        return plugin::Container::Get(ticket, key, type, value, pos);
+    }
+    bool GetTable(Address ticket, GETMULTIPAR* table) override
+    {
+        std::string keys;
+        for (Parameter const& record : RecordsOf(table))
+            keys += " " + TextOf(record.key, record.pos);
+        m_inside->Note("MGETMULTIPAR", TextOf(ticket) + keys);
+        return plugin::Container::GetTable(ticket, table);
+    }
+    bool Set(Address ticket, char const* key, PARAM_TYPE type, void const* value, int pos) override
+    {
+        SETMULTIPAR table[2]{};
+        table[0].key = key;
+        table[0].type = type;
+        table[0].value = value;
+        table[0].pos = pos;
+        m_inside->Note("MSETPARAMETER", TextOf(ticket) + TextOf(table));
+        return plugin::Container::Set(ticket, key, type, value, pos);
+    }
+    bool SetTable(Address ticket, SETMULTIPAR* table) override
+    {
+        m_inside->Note("MSETMULTIPAR", TextOf(ticket) + TextOf(table));
+        return plugin::Container::SetTable(ticket, table);
+    }
+    bool WalkTickets(MWALKTICKETS_ACTION action, void* context, int type) override
+    {
+        m_inside->Note("MWALKTICKETS", std::to_string(type));
+        return plugin::Container::WalkTickets(action, context, type);
+    }
+    bool Operation(Address ticket, TICKET_OP op, void* arg) override
+    {
+        m_inside->Note("MOPERATION", TextOf(ticket) + NameOf(op.GetInt()));
+        return plugin::Container::Operation(ticket, op, arg);
+    }
+    bool Switch(Address tickets, int notification, bool enable, char const* const* keys) override
+    {
+        m_inside->Note("MENDISNOTIF", TextOf(tickets) + (enable ? " on" : " off"));
+        return plugin::Container::Switch(tickets, notification, enable, keys);
+    }
+    STICKET_ACCESS const* CreateTicket(Address ticket, char const* const* keys) override
+    {
+        m_inside->Note("MCREATETICKET", TextOf(ticket));
+        return plugin::Container::CreateTicket(ticket, keys);
+    }
+
     bool Exists(Address ticket) override { return m_inside->Exists(ticket); }
     Value Read(Address ticket, std::string_view key, int pos) override
     {
-        m_inside->Note("MGETPARAMETER", TextOf(ticket) + " " + TextOf(key, pos));
         return m_inside->Look(ticket, [&](Parameters const& values) { return values.Read(key, pos); });
     }
     int Count(Address ticket, std::string_view key) override
@@ -268,7 +368,6 @@ public:
     }
     bool Write(Address ticket, std::string_view key, Value const& value, int pos) override
     {
-        m_inside->Note("MSETPARAMETER", TextOf(ticket) + " " + TextOf(key, pos) + "=" + TextOf(value));
         return m_inside->Write(ticket, key, value, pos);
     }
     std::vector<Parameter> All(Address ticket, std::string_view prefix) override
@@ -276,31 +375,10 @@ public:
         m_inside->Note("SWALKPARAMETERS", TextOf(ticket) + (prefix.empty() ? "" : " " + std::string(prefix)));
         return m_inside->Look(ticket, [&](Parameters const& values) { return values.All(prefix); });
     }
-    std::vector<int> Ids(int type) override
-    {
-        m_inside->Note("MWALKTICKETS", std::to_string(type));
-        return m_inside->Ids(type);
-    }
-    std::optional<int> CreateNext(int type) override
-    {
-        m_inside->Note("MOPERATION", "create " + std::to_string(type));
-        return m_inside->CreateNext(type);
-    }
-    bool Create(Address ticket) override
-    {
-        m_inside->Note("MCREATETICKET", TextOf(ticket));
-        return m_inside->Create(ticket);
-    }
-    bool Delete(Address ticket) override
-    {
-        m_inside->Note("MOPERATION", "delete " + TextOf(ticket));
-        return m_inside->Delete(ticket);
-    }
-    bool Switch(Address tickets, int notification, bool enable, char const* const* keys) override
-    {
-        m_inside->Note("MENDISNOTIF", TextOf(tickets) + (enable ? " on" : " off"));
-        return plugin::Container::Switch(tickets, notification, enable, keys);
-    }
+    std::vector<int> Ids(int type) override { return m_inside->Ids(type); }
+    std::optional<int> CreateNext(int type) override { return m_inside->CreateNext(type); }
+    bool Create(Address ticket) override { return m_inside->Create(ticket); }
+    bool Delete(Address ticket) override { return m_inside->Delete(ticket); }
 
 private:
     std::shared_ptr<Inside> const m_inside;
@@ -347,6 +425,11 @@ public:
         return plugin::Done;
     }
     int SetFolder(plugin::ClientFolder, std::string_view) override { return plugin::Done; }
+    int TicketData(Address ticket, int, int*, void*) override
+    {
+        m_inside->Note("GetTicketDataEntry", TextOf(ticket));
+        return plugin::NotOffered;
+    }
 
 private:
     int Carry(char const* entry, std::string_view from, std::string_view to)
@@ -369,7 +452,11 @@ plugin::LoggedIn FakePlugIn::LogIn(plugin::Credentials const& credentials)
 
 ModuleFake::ModuleFake() : m_inside(std::make_shared<Inside>()) { FakePlugIn::Get().Serve(m_inside); }
 
-ModuleFake::~ModuleFake() { FakePlugIn::Get().Serve(nullptr); }
+ModuleFake::~ModuleFake()
+{
+    FakePlugIn::Get().Serve(nullptr);
+    m_inside->Close();
+}
 
 std::filesystem::path ModuleFake::PlugIns() const { return FolderWithBundle(); }
 

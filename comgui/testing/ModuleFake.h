@@ -6,7 +6,7 @@
 //     auto const job = module.Create(3, {{"Job/Copies", 2}});
 //     module.Answer("PutFileSyncEntry", 116);              // the next transfers fail
 //     ... what is to be tested logs in, reads, writes, subscribes ...
-//     EXPECT_THAT(module.Calls(), Contains("MSETPARAMETER 3/1 Job/Copies[-1]=int 3"));
+//     EXPECT_THAT(module.Calls(), Contains("MSETMULTIPAR 3/1 Job/Copies[-1]=int 3"));
 //
 // Whoever logs in is an administrator, at any host and port. Files and jobs are taken and go nowhere. One at
 // a time in a process; the library looks for its plug-in once, so it has to be used before the first session.
@@ -32,7 +32,9 @@ class COMGUI_EXPORT ModuleFake
 {
 public:
     ModuleFake();
-    ~ModuleFake();  // from then on every call fails
+
+    // From then on every call fails, also of who is logged in, and OnCall's work is gone; it must not run.
+    ~ModuleFake();
     ModuleFake(ModuleFake const&) = delete;
     ModuleFake& operator=(ModuleFake const&) = delete;
 
@@ -49,14 +51,15 @@ public:
     bool Exists(Address ticket) const;
 
     // What happened, in order, with a slot's or entry's name: "LoginEntry admin", "MGETPARAMETER 3/1
-    // Job/Name[0]", "MSETPARAMETER 3/1 Job/Copies[-1]=int 3", "SendCommandEntry local.set.callback",
-    // "PutFileSyncEntry /tmp/a $(TEMP)/a". A slot of a single ticket, and each record of a table, appear as
-    // the container's slot that does the same.
+    // Job/Name[-1]", "MSETMULTIPAR 3/1 Job/Copies[-1]=int 3", "MOPERATION 3/1 open", "SendCommandEntry
+    // local.set.callback", "PutFileSyncEntry /tmp/a $(TEMP)/a". A slot of a single ticket appears as the
+    // container's that does the same; SOPTION does not appear, nor what the kit answers by itself.
     std::vector<std::string> Calls() const;
     void ForgetCalls();
 
     // From now on calls of that name answer that code, and do nothing else; 0 takes it back. Of a slot every
-    // code but 0 is a failure. A command goes by its own name.
+    // code but 0 is a failure. A command goes by its own name. Throws std::invalid_argument for what is no
+    // name in Calls() or of a command.
     void Answer(std::string const& call, int code);
 
     // Called on the client's thread before each call, with its line; null for nothing. May wait, and use this

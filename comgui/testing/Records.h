@@ -32,7 +32,8 @@ using plugin::Value;
 // Of a write, or of a notification.
 std::vector<Parameter> RecordsOf(SETMULTIPAR const* table);
 
-// Of a read, as far as its records are ok; those that failed have no value.
+// Of a read, as far as its records are ok; those that failed have no value, nor have those that asked for a
+// type or a count.
 std::vector<Parameter> RecordsOf(GETMULTIPAR const* table);
 
 // Everything in a ticket, by walking over it.

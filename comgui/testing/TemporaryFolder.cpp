@@ -5,12 +5,13 @@
 #include <fstream>
 #include <string>
 #include <system_error>
+#include <unistd.h>
 
 namespace fs = std::filesystem;
 
 namespace comgui::test
 {
-TemporaryFolder::TemporaryFolder(fs::path const& place)
+TemporaryFolder::TemporaryFolder(fs::path const& place) : m_process(getpid())
 {
     std::string name = (fs::canonical(place) / "comgui-test-XXXXXX").string();
     if (mkdtemp(name.data()) == nullptr)
@@ -20,6 +21,8 @@ TemporaryFolder::TemporaryFolder(fs::path const& place)
 
 TemporaryFolder::~TemporaryFolder()
 {
+    if (getpid() != m_process)
+        return;
     std::error_code ignored;
     fs::remove_all(m_path, ignored);
 }

@@ -1,5 +1,5 @@
-// A new, empty folder for one test; gone with everything in it when the object goes. Failures throw, so
-// that a test never runs on half a fixture.
+// A new, empty folder for one test; gone with everything in it when the object goes, but not with its copy in
+// a process made by fork. Failures throw, so that a test never runs on half a fixture.
 #pragma once
 
 #include <filesystem>
@@ -26,5 +26,6 @@ public:
 
 private:
     std::filesystem::path m_path;
+    int m_process;  // that made it
 };
 }  // namespace comgui::test

@@ -108,6 +108,7 @@ public:
         : site(standin::SiteName::Of(folder.string()), {}), server(site.store(), site.folder())
     {
         site.PutInOrder(server);
+        server.Troubles().Ignore();  // they are for clients
         session = server.Open({"admin", "", standin::AdministratorRole, 1});
     }
     ~Inside()

@@ -42,8 +42,8 @@ public:
     // its id is the result.
     int AddUser(std::string const& name, std::string const& password, int role = 1);
 
-    // Tickets as a client writes them: positions are those of the slots, but -2 and below, which are none.
-    // Without a value a parameter is deleted.
+    // Tickets as a client writes them: positions are those of the slots, -2 appends. Without a value a
+    // parameter is deleted.
     Address Create(int type, std::vector<Parameter> const& parameters = {});
     void Write(Address ticket, std::vector<Parameter> const& parameters);  // as one change
     void Put(Address ticket, std::string const& key, Value const& value, int pos = -1);

@@ -34,7 +34,7 @@ bool Container::Get(Address ticket, char const* key, PARAM_TYPE type, void* valu
 {
     if (!MayRead())
         return false;
-    m_gate.Pass("MGETPARAMETER", Of(ticket));
+    m_gate.PassFresh("MGETPARAMETER", Of(ticket));
     return ReadTicket(Tickets(), *m_session, Of(ticket), 0, key, type, value, pos);
 }
 
@@ -42,19 +42,19 @@ bool Container::GetTable(Address ticket, GETMULTIPAR* table)
 {
     if (!MayRead())
         return false;
-    m_gate.Pass("MGETMULTIPAR", Of(ticket));
+    m_gate.PassFresh("MGETMULTIPAR", Of(ticket));
     return ReadTable(Tickets(), *m_session, Of(ticket), 0, table);
 }
 
 bool Container::Set(Address ticket, char const* key, PARAM_TYPE type, void const* value, int pos)
 {
-    m_gate.Pass("MSETPARAMETER", Of(ticket));
+    m_gate.PassFresh("MSETPARAMETER", Of(ticket));
     return WriteTicket(Tickets(), *m_session, Of(ticket), 0, key, type, value, pos);
 }
 
 bool Container::SetTable(Address ticket, SETMULTIPAR* table)
 {
-    m_gate.Pass("MSETMULTIPAR", Of(ticket));
+    m_gate.PassFresh("MSETMULTIPAR", Of(ticket));
     return WriteTable(Tickets(), *m_session, Of(ticket), 0, table);
 }
 
@@ -120,7 +120,7 @@ bool Container::Operation(Address ticket, TICKET_OP op, void* arg)
 // Over the tickets that there are at the beginning, so that a walk that makes tickets comes to an end.
 bool Container::WalkTickets(MWALKTICKETS_ACTION action, void* context, int type)
 {
-    m_gate.Pass("MWALKTICKETS");
+    m_gate.PassFresh("MWALKTICKETS");
     if (!action || m_session->Ended() || !IsValid({type, 0}))
         return false;
     std::vector<int> ids;
@@ -152,7 +152,7 @@ bool Container::Switch(Address tickets, int notification, bool enable, char cons
 
 STICKET_ACCESS const* Container::CreateTicket(Address ticket, char const* const* keys)
 {
-    m_gate.Pass("MCREATETICKET", Of(ticket));
+    m_gate.PassFresh("MCREATETICKET", Of(ticket));
     auto const made = Tickets().Create(*m_session, Of(ticket));
     if (!made)
         return nullptr;

@@ -28,6 +28,7 @@ void PassTroubled(Troubles& troubles, Occasion const& call)
 
 void Gate::PassTroubledCall(Occasion const& call) const
 {
+    m_tickets.CatchUp();  // they may have been taken back
     PassTroubled(m_troubles, call);
     if (HasLostSession())
         Refuse(call, comgui::plugin::UnknownSession);

@@ -27,21 +27,25 @@ public:
     {
     }
 
-    void Pass(std::string_view call, std::optional<TicketAddress> ticket = {}) const
+    // For calls that look at tickets in any case; so the rules of this very moment are followed.
+    void PassFresh(std::string_view call, std::optional<TicketAddress> ticket = {}) const
     {
         m_tickets.CatchUp();
+        Pass(call, ticket);
+    }
+    void Pass(std::string_view call, std::optional<TicketAddress> ticket = {}) const
+    {
         if (m_troubles.Any()) [[unlikely]]
             PassTroubledCall({.call = call, .ticket = ticket, .user = m_session.Who().name});
     }
     void PassCommand(std::string_view command) const
     {
-        m_tickets.CatchUp();
         if (m_troubles.Any()) [[unlikely]]
             PassTroubledCall({.call = "SendCommandEntry", .command = command, .user = m_session.Who().name});
     }
 
-    // The server was away meanwhile, and knows the session no more.
-    bool HasLostSession() const { return m_troubles.HasLost(m_session.Number()); }
+    // The server was away, and knows the session no more now that it is back.
+    bool HasLostSession() const { return m_troubles.HasLost(m_session.Number()) && !m_troubles.IsAway(); }
 
 private:
     void PassTroubledCall(Occasion const& call) const;

@@ -39,12 +39,7 @@ void Tell(Callback const& callback, Notification const& notification)
 }
 }  // namespace
 
-bool ModuleSession::HasEnded() const
-{
-    if (EveryCall().HasLostSession())
-        m_container.EndSession();
-    return GetSession().Ended();
-}
+bool ModuleSession::HasEnded() const { return GetSession().Ended() || EveryCall().HasLostSession(); }
 
 int ModuleSession::Command(std::string_view name, int size, void* data)
 {
@@ -54,7 +49,7 @@ int ModuleSession::Command(std::string_view name, int size, void* data)
 
 int ModuleSession::TicketData(comgui::plugin::Address ticket, int format, int* size, void* buffer)
 {
-    EveryCall().Pass("GetTicketDataEntry", TicketAddress{ticket.type, ticket.id});
+    EveryCall().PassFresh("GetTicketDataEntry", TicketAddress{ticket.type, ticket.id});
     if (!size)
         return MODULE_INVALID_ARGUMENT;
     if (format != 0)

@@ -53,6 +53,6 @@ private:
 
     Gate const& EveryCall() const { return m_container.EveryCall(); }
 
-    Container mutable m_container;  // a session that the server has lost ends when it is looked at
+    Container m_container;
 };
 }  // namespace standin

@@ -65,7 +65,7 @@ bool OpenTicket::Get(char const* key, PARAM_TYPE type, void* value, int pos)
 {
     if (!MayRead())
         return false;
-    m_gate.Pass("SGETPARAMETER", m_address);
+    m_gate.PassFresh("SGETPARAMETER", m_address);
     if (m_address == SystemTicket && key && value && (type == PARAM_STRING || type == PARAM_INT)) [[unlikely]]
         return GetFolder(key, type, value, pos);
     EndFolderReading();
@@ -106,20 +106,20 @@ bool OpenTicket::GetTable(GETMULTIPAR* table)
 {
     if (!MayRead())
         return false;
-    m_gate.Pass("SGETMULTIPAR", m_address);
+    m_gate.PassFresh("SGETMULTIPAR", m_address);
     EndFolderReading();
     return ReadTable(m_tickets, m_session, m_address, Which(), table);
 }
 
 bool OpenTicket::Set(char const* key, PARAM_TYPE type, void const* value, int pos)
 {
-    m_gate.Pass("SSETPARAMETER", m_address);
+    m_gate.PassFresh("SSETPARAMETER", m_address);
     return WriteTicket(m_tickets, m_session, m_address, Which(), key, type, value, pos);
 }
 
 bool OpenTicket::SetTable(SETMULTIPAR* table)
 {
-    m_gate.Pass("SSETMULTIPAR", m_address);
+    m_gate.PassFresh("SSETMULTIPAR", m_address);
     return WriteTable(m_tickets, m_session, m_address, Which(), table);
 }
 
@@ -127,7 +127,7 @@ bool OpenTicket::SetTable(SETMULTIPAR* table)
 // walk that left out values would lose them for good where a ticket is copied by walking over it.
 bool OpenTicket::Walk(SWALKPARAMETERS_ACTION action, void* context, char const* prefix, int)
 {
-    m_gate.Pass("SWALKPARAMETERS", m_address);
+    m_gate.PassFresh("SWALKPARAMETERS", m_address);
     EndFolderReading();
     // The session may end meanwhile, in the action or elsewhere, and the action may take any time.
     auto const texts = m_session.HoldTexts();
@@ -151,7 +151,7 @@ bool OpenTicket::Walk(SWALKPARAMETERS_ACTION action, void* context, char const* 
 
 bool OpenTicket::Option(int code, void* out)
 {
-    m_gate.Pass("SOPTION", m_address);
+    m_gate.PassFresh("SOPTION", m_address);
     bool const isThere = !m_session.Ended() && m_tickets.IncarnationOf(m_address) == Which();
     return isThere && comgui::plugin::AnswerOption(code, out, {m_address.type, m_address.id}, &m_folders);
 }

@@ -286,6 +286,8 @@ TEST_F(Trouble, ServerThatStartsAnew_KnowsNoneOfItsSessions)
     auto const back = Clock::now() + 2s;
     Follow("away sessions=lost for=2s");
     EXPECT_EQ(old.Read(0, 0, "System/MasterSOAPPort"), -1);
+    EXPECT_EQ(IsAliveCommand(), MODULE_SITE_UNAVAILABLE);
+    EXPECT_EQ(IsAliveCommand(), MODULE_SITE_UNAVAILABLE) << "while it is away nobody can tell what it knows";
     std::this_thread::sleep_until(back + 10ms);
     EXPECT_EQ(old.Read(0, 0, "System/MasterSOAPPort"), -1);
     int value = 0;
@@ -396,6 +398,40 @@ TEST_F(TroubledNotifications, WhatHappensWhileTheServerIsAway_IsNeverTold)
     EXPECT_THAT(listener.Wait(1), ElementsAre("changed 3/1 K@-1=2"));
 }
 
+TEST_F(TroubledNotifications, WhatWaits_WhenTheServerGoes_IsNeverTold)
+{
+    Follow("late by=500ms nth=1");
+    Write(1);
+    Follow("away for=2s");
+    std::this_thread::sleep_for(2s + 10ms);
+    Write(2);
+    EXPECT_THAT(listener.Wait(1), ElementsAre("changed 3/1 K@-1=2"));
+}
+
+TEST_F(TroubledNotifications, BehindOneThatIsLateAndWithdrawn_DoNotWait)
+{
+    Follow("late by=10m nth=1");
+    Write(1);
+    EXPECT_EQ(other.Disable(3, 1, Id()), 1);
+    EXPECT_EQ(other.Enable(3, 1, Id()), 1);
+    Write(2);
+    EXPECT_THAT(listener.Wait(1), ElementsAre("changed 3/1 K@-1=2"));
+}
+
+TEST_F(TroubledNotifications, SwappedAndTwice_AreWithdrawnAsOthersAre)
+{
+    Follow("swapped\ntwice");
+    Write(1);
+    EXPECT_EQ(other.Disable(3, 1, Id()), 1);
+    std::size_t const told = listener.Calls().size();
+    std::this_thread::sleep_for(1100ms);
+    EXPECT_EQ(listener.Calls().size(), told);
+    Follow("");
+    EXPECT_EQ(other.Enable(3, 1, Id()), 1);
+    Write(2);
+    EXPECT_EQ(listener.Wait(told + 1).back(), "changed 3/1 K@-1=2");
+}
+
 TEST_F(TroubledNotifications, EndsOfTransfers_AreNotificationsToo)
 {
     Follow("lost nth=1");
@@ -412,6 +448,39 @@ TEST_F(Trouble, TransferThatStalls_GoesOnAfterwards)
     EXPECT_GE(TimeOf([&] { EXPECT_EQ(Put(), 0); }), 300ms);
     EXPECT_EQ(Fetch(), 0);
     EXPECT_EQ(ContentOf(folder.Path() / "fetched"), "some bytes");
+}
+
+TEST_F(Trouble, TransferThatStalls_IsAsFarAsItWasToBe)
+{
+    WriteFile(local, std::string(100'000, 'x'));
+    Follow("stall by=10m at=30% times=1");
+    int code = 0;
+    std::thread transfer([&] { code = Put(); });
+    TICKET_FACTORY const factory;
+    TICKET const ticket(factory, nullptr);
+    long long done = 0;
+    for (auto const end = Clock::now() + 20s; done == 0 && Clock::now() < end;)
+    {
+        EXPECT_EQ(Command("local.get.progress", const_cast<STICKET_ACCESS*>(ticket.Access())), 0);
+        ticket.Get("Transfer/Done", PARAM_INT64, &done);
+    }
+    EXPECT_EQ(done, 30'000);
+    EXPECT_EQ(other.Logout(), 0);
+    transfer.join();
+    EXPECT_EQ(code, MODULE_TRANSFER_CUT);
+}
+
+TEST_F(Trouble, TransferUnderWay_WhenTheServerGoes_IsCut)
+{
+    Follow("stall by=500ms");
+    std::atomic<int> code = -1;
+    std::thread transfer([&] { code = Put(); });
+    std::this_thread::sleep_for(100ms);
+    Follow("away for=2s");
+    transfer.join();
+    EXPECT_THAT(code.load(), testing::AnyOf(MODULE_TRANSFER_CUT, MODULE_SITE_UNAVAILABLE));
+    EXPECT_FALSE(std::filesystem::exists(folder.Path() / "site/temp/a"));
+    std::this_thread::sleep_for(2s);
 }
 
 TEST_F(Trouble, TransferThatStalls_CanBeCut)

@@ -190,6 +190,22 @@ TEST_F(NotificationsOfTheKit, AfterSwitchingOff_NoCallRunsOrComes)
     EXPECT_THAT(client.Lines(), testing::Not(testing::Contains(HasSubstr("=-1"))));
 }
 
+TEST_F(NotificationsOfTheKit, AfterALogoutThatFailed_NoCallComesEither)
+{
+    EXPECT_EQ(Switch(Register(client), ticket.id, true), 1);
+    fake::Trouble::Set(
+        [](std::string const& where)
+        {
+            if (where == "End")
+                throw std::runtime_error("the end failed");
+        });
+    EXPECT_NE(table.LogoutEntry(hInstance, hSession), 0);
+    fake::Trouble::Set({});
+    Write("A", 1);
+    std::this_thread::sleep_for(50ms);
+    EXPECT_THAT(client.Lines(), IsEmpty());
+}
+
 TEST_F(NotificationsOfTheKit, AfterTheLogout_NoCallComes)
 {
     int const id = Register(client);

@@ -1,12 +1,13 @@
 #include "standin/server/site/Site.h"
 
+#include "comgui/ticket/TICKET_ID.h"
 #include "standin/server/files/AtomicFile.h"
 #include "standin/server/files/Descriptor.h"
 #include "standin/server/sessions/Password.h"
+#include "standin/server/site/RulesOfSite.h"
 #include "standin/server/site/Seed.h"
 #include "standin/server/store/sqlite/SqliteStore.h"
 #include "standin/server/tickets/TicketXml.h"
-#include "standin/server/site/RulesOfSite.h"
 #include "tests/server/MemoryFolder.h"
 #include "tests/server/OpenedSite.h"
 #include "tests/support/ChildProcess.h"
@@ -18,6 +19,7 @@
 #include <csignal>
 #include <cstdlib>
 #include <fcntl.h>
+#include <future>
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 #include <map>
@@ -492,6 +494,47 @@ TEST_F(SiteFolder, RulesOfTrouble_OfAnotherProgram_AreFollowedAsSoonAsTheyAreHea
     EXPECT_EQ(first.Text(SystemTicket, "System/Trouble"), "twice\nfull\n");
     EXPECT_EQ(second.Server().Tickets().Int(SystemTicket, "System/MasterSOAPPort"), 50000);
     EXPECT_TRUE(second.Server().Troubles().IsDiskFull());
+}
+
+// As a client may write it that knows no better.
+TEST_F(SiteFolder, RulesOfTrouble_InAList_AreTheFirstValueForAll)
+{
+    {
+        OpenedSite site(Folder(), ShippedSeed);
+        site.Put("System/Trouble", "full");
+        site.Put("System/Trouble", "twice", 1);
+        EXPECT_TRUE(site.Server().Troubles().IsDiskFull());
+    }
+    OpenedSite later(Folder(), ShippedSeed);
+    EXPECT_TRUE(later.Server().Troubles().IsDiskFull());
+    EXPECT_THAT(standin::RulesOf(later.Store()), testing::ElementsAre("full"));
+}
+
+// A client that hangs in its callback keeps nobody from setting rules, and from taking them back.
+TEST_F(SiteFolder, RulesOfTrouble_AreFollowedThoughAClientHasNoRoom)
+{
+    OpenedSite site(Folder(), ShippedSeed);
+    standin::Server& server = site.Server();
+    auto const session = server.Open({"admin", "", standin::AdministratorRole, 1});
+    std::promise<void> hanging;
+    std::shared_future<void> const goOn = hanging.get_future().share();
+    int const id = server.Notifications().NewId();
+    ASSERT_TRUE(server.Notifications().Register(*session, id, [goOn](auto const&) { goOn.wait(); }));
+    ASSERT_TRUE(server.Notifications().Enable(*session, id, {3, TICKET_ID_ALL}, standin::KeyFilter(nullptr)));
+    ASSERT_TRUE(server.Notifications().Enable(*session, id, SystemTicket, standin::KeyFilter(nullptr)));
+    server.Create({3, 1});
+    std::string const large(40u << 20, 'x');
+    for (int i = 0; i < 4 && server.Notifications().HasRoom(); ++i)
+        EXPECT_TRUE(site.Put({3, 1}, "K" + std::to_string(i), TicketValue::String(large)));
+    ASSERT_FALSE(server.Notifications().HasRoom());
+    standin::ChangeRules(site.Store(), [](auto& rules) { rules.assign({"full"}); });
+    server.Tickets().CatchUp();
+    EXPECT_TRUE(server.Troubles().IsDiskFull());
+    standin::ChangeRules(site.Store(), [](auto& rules) { rules.clear(); });
+    server.Tickets().CatchUp();
+    EXPECT_FALSE(server.Troubles().IsDiskFull());
+    hanging.set_value();
+    server.Logout(*session);
 }
 
 TEST_F(SiteFolder, OpenedTwiceInOneProcess_IsSharedAsByTwoPrograms)

@@ -120,6 +120,12 @@ TEST(TroubleRule, Mistakes_AreTold)
         EXPECT_THAT(ErrorOf(line), HasSubstr("ticket=TYPE/ID or ticket=TYPE/*")) << line;
 }
 
+TEST(TroubleRule, IsOneLineWithoutControlCharacters)
+{
+    for (char const* line : {"fail user=a\nfull", "fail\r", "fail user=\x1b[31m"})
+        EXPECT_THAT(ErrorOf(line), HasSubstr("one line")) << line;
+}
+
 TEST(TroubleRule, WithoutWords_IsForEverything)
 {
     EXPECT_TRUE(IsFor("fail", Read({3, 1})));
@@ -308,6 +314,37 @@ TEST(Troubles, Transfers_StandStillOnceTheyAreThatFar)
     auto const still = troubles.OnTransfer();
     EXPECT_EQ(still.by, 2s);
     EXPECT_EQ(still.at, 25);
+}
+
+TEST(Troubles, FirstStallThatStrikes_Counts)
+{
+    Troubles troubles;
+    troubles.Set("stall by=1s at=75%\nstall by=2s at=25%");
+    EXPECT_EQ(troubles.OnTransfer().by, 1s);
+    EXPECT_EQ(troubles.OnTransfer().at, 75);
+}
+
+TEST(Troubles, Ignored_AreNone)
+{
+    Troubles troubles;
+    troubles.Set("full");
+    troubles.Ignore();
+    EXPECT_FALSE(troubles.IsDiskFull());
+    troubles.Set("full");
+    EXPECT_FALSE(troubles.Any());
+}
+
+TEST(Troubles, LineThatIsNoRule_IsToldOnce)
+{
+    Troubles troubles;
+    troubles.Set("nonsense");
+    EXPECT_TRUE(troubles.Any()) << "or nobody would tell of it";
+    testing::internal::CaptureStderr();
+    troubles.OnCall({});
+    troubles.OnCall({});
+    std::string const told = testing::internal::GetCapturedStderr();
+    EXPECT_EQ(std::count(told.begin(), told.end(), '\n'), 1);
+    EXPECT_FALSE(troubles.Any());
 }
 
 TEST(Troubles, FullDisk_IsFullUntilTheRuleGoes)

@@ -37,7 +37,7 @@ TEST(ReprintOverAFake, WritesOneCopyMore)
     ASSERT_TRUE(connection.LogIn({"localhost", 50000}, {"anna", "secret"}));
     EXPECT_EQ(Reprint(connection).OneMore({job.type, job.id}), "printing");
 
-    EXPECT_THAT(module.Calls(), testing::Contains("MSETPARAMETER 3/1 Job/Copies[-1]=int 3"));
+    EXPECT_THAT(module.Calls(), testing::Contains("MSETMULTIPAR 3/1 Job/Copies[-1]=int 3"));
 }
 
 TEST(ReprintOverAFake, TellsThatItMayNot)
@@ -45,7 +45,7 @@ TEST(ReprintOverAFake, TellsThatItMayNot)
     comgui::test::ModuleFake module;
     module.Use();
     auto const job = module.Create(3, {{"Job/Copies", 2}});
-    module.Answer("MSETPARAMETER", 1);  // of a slot every code but 0 is a failure
+    module.Answer("MSETMULTIPAR", 1);  // of a slot every code but 0 is a failure
 
     comgui::Connection connection;
     ASSERT_TRUE(connection.LogIn({"localhost", 50000}, {"anna", "secret"}));

@@ -36,7 +36,7 @@ std::vector<std::string> SlotCalls(ModuleFake const& module)
 {
     std::vector<std::string> calls;
     for (std::string const& call : module.Calls())
-        if (call.find("MGETPARAMETER") == 0 || call.find("MSETPARAMETER") == 0)
+        if (call.find("MGET") == 0 || call.find("MSET") == 0)
             calls.push_back(call);
     return calls;
 }
@@ -67,11 +67,11 @@ TEST_F(FakedServer, CallsOfSlots_HaveTicketKeyAndValue)
     Address const job = module.Create(3);
     module.ForgetCalls();
     EXPECT_TRUE(tickets.Write({3, job.id}, "Job/Copies", 3));
-    EXPECT_THAT(SlotCalls(module), Contains("MSETPARAMETER 3/1 Job/Copies[-1]=int 3"));
+    EXPECT_THAT(SlotCalls(module), Contains("MSETMULTIPAR 3/1 Job/Copies[-1]=int 3"));
     EXPECT_TRUE(tickets.Write({3, job.id}, "Job/Name", "page.pdf"));
-    EXPECT_THAT(SlotCalls(module), Contains("MSETPARAMETER 3/1 Job/Name[-1]=text 'page.pdf'"));
+    EXPECT_THAT(SlotCalls(module), Contains("MSETMULTIPAR 3/1 Job/Name[-1]=text 'page.pdf'"));
     EXPECT_TRUE(tickets.Read({3, job.id}, "Job/Copies"));
-    EXPECT_THAT(SlotCalls(module), Contains("MGETPARAMETER 3/1 Job/Copies[0]"));
+    EXPECT_THAT(SlotCalls(module), Contains("MGETPARAMETER 3/1 Job/Copies[-1]"));
 }
 
 TEST_F(FakedServer, WhatTheTestDoes_IsNoCall)
@@ -117,10 +117,10 @@ TEST_F(FakedServer, WhatCannotBeDone_Throws)
 TEST_F(FakedServer, Answers_AsItIsTold)
 {
     Address const job = module.Create(3, {{"A", 1}});
-    module.Answer("MSETPARAMETER", 1);
+    module.Answer("MSETMULTIPAR", 1);
     EXPECT_EQ(tickets.Write({3, job.id}, "A", 2).GetError().code, comgui::WriteRefused);
     EXPECT_EQ(module.Read(job, "A"), Value(1));
-    module.Answer("MSETPARAMETER", 0);
+    module.Answer("MSETMULTIPAR", 0);
     EXPECT_TRUE(tickets.Write({3, job.id}, "A", 2));
 
     auto const transfers = connection.GetTransfers();
@@ -149,13 +149,113 @@ TEST_F(FakedServer, OnCall_IsCalledBeforeTheCall)
     module.OnCall(
         [&](std::string const& call)
         {
-            if (call == "MGETPARAMETER 3/1 A[0]")
+            if (call.find("MGET") == 0 && call.find(" A[-1]") != std::string::npos)
                 module.Put(job, "A", 7);
         });
     EXPECT_EQ(*tickets.ReadAs<int>({3, job.id}, "A"), 7);
     module.OnCall(nullptr);
     module.Put(job, "A", 8);
     EXPECT_EQ(*tickets.ReadAs<int>({3, job.id}, "A"), 8);
+}
+
+TEST_F(FakedServer, Answers_ForACommandAndForAllOfThem)
+{
+    auto const prepare = [&] {
+        return connection.GetTransfers()
+            .SendJob(TESTING_FILE, {"name", std::nullopt, 2})
+            .Wait()
+            .GetError()
+            .code;
+    };
+    module.Answer("SendCommandEntry", 5);
+    module.Answer("remote.job.prepare", 7);
+    EXPECT_EQ(prepare(), 7);
+    module.Answer("remote.job.prepare", 0);
+    EXPECT_EQ(prepare(), 5);
+}
+
+TEST_F(FakedServer, AnswersForNoOtherNames)
+{
+    EXPECT_THROW(module.Answer("SGETPARAMETER", 1), std::invalid_argument);
+    EXPECT_THROW(module.Answer("LoginEntri", 1), std::invalid_argument);
+    module.Answer("remote.anything", 1);
+}
+
+// Whatever is called, and whatever for.
+TEST(ModuleFakeOfTheManager, EverySlot_IsWrittenDownAndCanFail)
+{
+    ModuleFake module;
+    module.Use();
+    auto& manager = *ComGUIManager::GetInstance();
+    ASSERT_EQ(manager.Initialize("anna", "secret", "localhost", 50000), 0);
+    ASSERT_EQ(manager.Login("anna", "secret", "localhost", 50000), 0);
+    MTICKET_ACCESS const* const all = manager.GetClientContainer();
+    module.Create(3, {{"A", 1}});
+    int value = 0;
+    int id = 0;
+    GETMULTIPAR reads[2]{};
+    reads[0].key = "A";
+    reads[0].type = PARAM_INT;
+    reads[0].value = &value;
+    reads[0].pos = -1;
+    SETMULTIPAR writes[2]{};
+    writes[0].key = "A";
+    writes[0].type = PARAM_INT;
+    writes[0].value = &value;
+    writes[0].pos = -1;
+    char const* const keys[] = {nullptr};
+    auto const nothing = [](void*, int, int, STICKET_ACCESS const*) { return true; };
+    struct
+    {
+        char const* line;
+        std::function<int()> call;
+    } const slots[] = {
+        {"MGETPARAMETER 3/1 A[-1]",
+         [&] { return all->MGETPARAMETER(all->Instance, 3, 1, "A", PARAM_INT, &value, -1); }},
+        {"MGETMULTIPAR 3/1 A[-1]", [&] { return all->MGETMULTIPAR(all->Instance, 3, 1, reads); }},
+        {"MSETPARAMETER 3/1 A[-1]=int 1",
+         [&] { return all->MSETPARAMETER(all->Instance, 3, 1, "A", PARAM_INT, &value, -1); }},
+        {"MSETMULTIPAR 3/1 A[-1]=int 1", [&] { return all->MSETMULTIPAR(all->Instance, 3, 1, writes); }},
+        {"MWALKTICKETS 3", [&] { return all->MWALKTICKETS(all->Instance, nothing, nullptr, 3); }},
+        {"MOPERATION 3/-4 create",
+         [&] { return all->MOPERATION(all->Instance, 3, TICKET_ID_NEXT, MTICKET_OP_CREATE_NEXT, &id); }},
+        {"MCREATETICKET 3/9", [&] { return all->MCREATETICKET(all->Instance, 3, 9, keys) != nullptr; }},
+        {"MOPERATION 3/9 delete",
+         [&] { return all->MOPERATION(all->Instance, 3, 9, MTICKET_OP_DELETE, nullptr); }},
+    };
+    for (auto const& slot : slots)
+    {
+        std::string const line = slot.line;
+        SCOPED_TRACE(line);
+        std::string const name = line.substr(0, line.find(' '));
+        module.Answer(name, 1);
+        EXPECT_EQ(slot.call(), 0);
+        module.Answer(name, 0);
+        module.ForgetCalls();
+        EXPECT_EQ(slot.call(), 1);
+        EXPECT_THAT(module.Calls(), ElementsAre(line));
+    }
+    module.ForgetCalls();
+    EXPECT_EQ(all->MGETPARAMETER(all->Instance, 3, 99, "A", PARAM_INT, &value, -1), 0);
+    EXPECT_THAT(module.Calls(), ElementsAre("MGETPARAMETER 3/99 A[-1]"));
+    manager.Logout();
+}
+
+TEST(ModuleFakeOfTheManager, AfterItsEnd_SessionsThatAreLoggedInFail_AndNoWorkIsCalled)
+{
+    comgui::Connection connection;
+    auto const tickets = connection.GetTickets();
+    {
+        ModuleFake module;
+        module.Use();
+        ASSERT_TRUE(connection.LogIn({"x", 1}, {"a", "b"}));
+        auto calls = std::make_unique<int>(0);
+        module.OnCall([&calls](std::string const&) { ++*calls; });
+        EXPECT_TRUE(tickets.Read({0, 0}, "System/Name"));
+        EXPECT_GT(*calls, 0);
+    }
+    EXPECT_FALSE(tickets.Read({0, 0}, "System/Name"));
+    EXPECT_FALSE(tickets.Write({0, 0}, "A", 1));
 }
 
 TEST(ModuleFakeOfTheManager, IsFoundLikeAnyPlugIn)
@@ -172,7 +272,7 @@ TEST(ModuleFakeOfTheManager, IsFoundLikeAnyPlugIn)
     EXPECT_STREQ(name, "a fake");
     manager.Logout();
     EXPECT_THAT(module.Calls(), ElementsAre("InitializeEntry", "LoginEntry anna",
-                                            "MGETPARAMETER 0/0 System/Name[0]", "LogoutEntry"));
+                                            "MGETPARAMETER 0/0 System/Name[-1]", "LogoutEntry"));
 }
 
 TEST(ModuleFakeOfTheManager, AfterItsEnd_EveryCallFails_AndTheNextOneBeginsAnew)

@@ -6,6 +6,8 @@
 #include <cstdlib>
 #include <gmock/gmock.h>
 #include <optional>
+#include <sys/wait.h>
+#include <unistd.h>
 
 using namespace std::chrono_literals;
 using comgui::plugin::Bytes;
@@ -126,6 +128,31 @@ TEST_F(SiteOfATest, Trouble_ReachesClients_AndGoes)
     EXPECT_TRUE(tickets.Read({0, 0}, "System/Name"));
     EXPECT_THROW(site.SetTrouble({"full", "nonsense"}), std::invalid_argument);
     EXPECT_TRUE(tickets.Write({0, 0}, "K", 1)) << "a rule that is wrong takes no others along";
+}
+
+TEST_F(SiteOfATest, Trouble_DoesNotStandInTheTestsOwnWay)
+{
+    Address const job = site.Create(3);
+    for (char const* rule : {"full", "away", "fail", "delay by=10m"})
+    {
+        SCOPED_TRACE(rule);
+        site.SetTrouble({rule});
+        site.Put(job, "A", 1);
+        EXPECT_EQ(site.Read(job, "A"), Value(1));
+        site.Delete(site.Create(3, {{"B", 2}}));
+    }
+}
+
+TEST_F(SiteOfATest, StaysThere_WhenAForkedChildEnds)
+{
+    comgui::test::ModuleFake const module;
+    pid_t const child = fork();
+    if (child == 0)
+        std::exit(0);
+    int status = 0;
+    waitpid(child, &status, 0);
+    EXPECT_TRUE(std::filesystem::exists(site.Folder() / "site.db"));
+    EXPECT_TRUE(std::filesystem::exists(module.PlugIns() / "ComGUI.Bundle"));
 }
 
 TEST(TemporarySites, OneAfterTheOther_AreSitesOfTheirOwn)

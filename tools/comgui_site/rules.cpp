@@ -46,8 +46,6 @@ TroubleRule RuleOf(std::vector<std::string> const& words)
     std::string line;
     for (std::string const& word : words)
         line += (line.empty() ? "" : " ") + word;
-    if (line.find('\n') != std::string::npos)
-        throw WrongUse("a rule is one line");
     try
     {
         return TroubleRule::Parse(line);

@@ -27,6 +27,11 @@ public:
     // the journal until then.
     virtual bool HasRoom() const = 0;
 
+    // Of some tickets everything is noticed, room or not: as soon as a change is made, before anybody is told
+    // of it. For the server's own knowledge, under the same conditions as what follows.
+    virtual bool Notices(TicketAddress) const { return false; }
+    virtual void Noticed(TicketAddress, ChangedParameters const&) noexcept {}
+
     // Called for one change after the other, in the order of the commits, under the feed's lock: neither may
     // wait for anything, nor use the feed. Of a creation the parameters come apart, as a write behind it.
     virtual void Created(TicketAddress ticket) noexcept = 0;

@@ -172,7 +172,11 @@ void Feed::Make(CommittedChange& committed)
     if (isWanted && !m_told && !m_listener.HasRoom())
         m_told = committed.sequence - 1;
     bool const isNewsOnlyHere = m_told && HasPointers(change);
-    ChangedParameters news = isWanted && (!m_told || isNewsOnlyHere) ? NewsOf(change) : ChangedParameters();
+    bool const isNoticed = m_listener.Notices(ticket);
+    bool const isNews = isNoticed || (isWanted && (!m_told || isNewsOnlyHere));
+    ChangedParameters news = isNews ? NewsOf(change) : ChangedParameters();
+    if (isNoticed)
+        m_listener.Noticed(ticket, news);
     bool const isLoaded = change.kind != TicketChange::Write || m_cache.Find(ticket);
     if (isWanted && !isLoaded)
         m_wanted.insert(ticket);

@@ -28,7 +28,8 @@ Feed::Listing Feed::List()
     {
         bool const isNews = m_cache.IncarnationOf(address) != ticket.state.incarnation ||
                             m_cache.RevisionOf(address) != ticket.state.revision;
-        if (!isNews || (!m_cache.Find(address) && !m_listener.Wants(address)))
+        bool const isLooked = m_listener.Wants(address) || m_listener.Notices(address);
+        if (!isNews || (!m_cache.Find(address) && !isLooked))
             continue;
         auto const loaded = Read(address, ticket.values);
         ticket.isLoaded = loaded && loaded->state.incarnation == ticket.state.incarnation;
@@ -75,16 +76,19 @@ void Feed::TakeOver(Listing& listing)
             continue;
         bool const isNew = m_cache.IncarnationOf(address) == 0;
         bool const isWanted = m_listener.Wants(address);
+        bool const isNoticed = m_listener.Notices(address);
         ChangedParameters news;
-        if (isWanted && ticket.isLoaded)
+        if ((isWanted || isNoticed) && ticket.isLoaded)
             news =
                 Difference(m_cache.Find(address), ticket.values);  // nobody else replaces it under the lock
+        if (isNoticed)
+            m_listener.Noticed(address, news);
         m_cache.Note(address, ticket.state);
         if (ticket.isLoaded)
             m_cache.Publish(address, ticket.state, ticket.values);
         if (isNew && isWanted)
             m_listener.Created(address);
-        if (!news.empty())
+        if (isWanted && !news.empty())
             m_listener.Written(address, std::move(news));
     }
 }

@@ -199,6 +199,10 @@ void NotificationService::Withdraw(Listener& listener)
                       listener.pending += message.weight;
                       return false;
                   });
+    listener.heldUntil = {};
+    for (Message const& message : m_waiting)
+        if (message.listener.get() == &listener && !message.isSwapped)
+            listener.heldUntil = std::max(listener.heldUntil, message.due);
 }
 
 void NotificationService::Unqueue(Message& message)
@@ -305,10 +309,12 @@ void NotificationService::Append(Message message)
 void NotificationService::AppendTroubled(Message message)
 {
     Listener& listener = *message.listener;
+    if (IsUnreachable(listener))
+        return;
     bool const isOfTicket = message.kind != TransferEnded;
     Troubles::Telling const telling = m_troubles.OnNotification(
         {.ticket = isOfTicket ? std::optional(message.ticket) : std::nullopt, .user = listener.user});
-    if (telling.isLost || m_troubles.HasLost(listener.session))
+    if (telling.isLost)
         return;
     auto const now = Clock::now();
     if (telling.late.count() > 0)
@@ -335,6 +341,12 @@ void NotificationService::Enqueue(Message message)
     if (m_hasSwapped && !isSwapped)
         ReleaseSwapped(listener, due);
     m_hasSwapped = m_hasSwapped || isSwapped;
+}
+
+// The server is away, or was meanwhile and knows the session no more.
+bool NotificationService::IsUnreachable(Listener const& listener) const
+{
+    return m_troubles.Any() && (m_troubles.IsAway() || m_troubles.HasLost(listener.session));
 }
 
 bool NotificationService::HasSwapped(Listener const& listener) const
@@ -399,6 +411,8 @@ void NotificationService::Run()
             Message message = std::move(*next);
             m_waiting.erase(next);
             Unqueue(message);
+            if (IsUnreachable(*message.listener)) [[unlikely]]
+                continue;
             m_running = message.listener->id;
             ++m_run;
             lock.unlock();

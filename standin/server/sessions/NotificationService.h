@@ -123,6 +123,7 @@ private:
     void Append(Message message);
     void AppendTroubled(Message message);
     void Enqueue(Message message);
+    bool IsUnreachable(Listener const& listener) const;
     bool HasSwapped(Listener const& listener) const;
     void ReleaseSwapped(Listener const& listener, Clock::time_point due);
     void WaitForWork(Lock& lock);
@@ -138,7 +139,7 @@ private:
     std::atomic<int> m_newestId{0};
     std::atomic<std::size_t> m_subscriptions{0};  // of all listeners
 
-    mutable std::mutex m_lock;  // the members below; taken last
+    mutable std::mutex m_lock;  // the members below; taken last, but for that of the troubles
     std::vector<std::shared_ptr<Listener>> m_listeners;
     std::deque<Message> m_waiting;
     bool m_hasSwapped = false;  // perhaps among them

@@ -12,7 +12,7 @@ namespace standin
 std::vector<std::string> RulesOf(Store& store);
 
 // Puts what change leaves of the rules that there are; it is called again if others were faster. Every
-// program of the site follows them as soon as it hears of it. store: one that no server has. Throws
-// StoreError; what change throws passes through.
+// program of the site follows them as soon as it hears of it. Throws StoreError; what change throws passes
+// through.
 void ChangeRules(Store& store, std::function<void(std::vector<std::string>& rules)> const& change);
 }  // namespace standin

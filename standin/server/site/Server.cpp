@@ -72,7 +72,10 @@ void Server::FollowRules()
     m_tickets.LookAt(SystemTicket, 0,
                      [&](TicketSnapshot const& system)
                      {
-                         rules = TextOf(system, TroubleKey);
+                         KeyValues const* const values = system.Find(std::string_view(TroubleKey));
+                         TicketElement const* const first = values ? values->At(0) : nullptr;
+                         if (first && first->type == PARAM_STRING)
+                             rules = first->ToStored().bytes;
                          return true;
                      });
     m_troubles.Begin(rules);

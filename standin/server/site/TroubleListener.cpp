@@ -5,7 +5,7 @@
 namespace standin
 {
 // The rules are a single value.
-void TroubleListener::LookForRules(ChangedParameters const& parameters) noexcept
+void TroubleListener::Noticed(TicketAddress, ChangedParameters const& parameters) noexcept
 {
     try
     {

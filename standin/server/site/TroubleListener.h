@@ -15,23 +15,19 @@ public:
     // Both outlive it. clients: who hears of everything afterwards.
     TroubleListener(Troubles& troubles, ChangeListener& clients) : m_troubles(troubles), m_clients(clients) {}
 
-    bool Wants(TicketAddress ticket) const override
-    {
-        return ticket == SystemTicket || m_clients.Wants(ticket);
-    }
+    bool Notices(TicketAddress ticket) const override { return ticket == SystemTicket; }
+    void Noticed(TicketAddress ticket, ChangedParameters const& parameters) noexcept override;
+
+    bool Wants(TicketAddress ticket) const override { return m_clients.Wants(ticket); }
     bool HasRoom() const override { return m_clients.HasRoom(); }
     void Created(TicketAddress ticket) noexcept override { m_clients.Created(ticket); }
     void Written(TicketAddress ticket, ChangedParameters&& parameters) noexcept override
     {
-        if (ticket == SystemTicket)
-            LookForRules(parameters);
         m_clients.Written(ticket, std::move(parameters));
     }
     void Deleted(TicketAddress ticket) noexcept override { m_clients.Deleted(ticket); }
 
 private:
-    void LookForRules(ChangedParameters const& parameters) noexcept;
-
     Troubles& m_troubles;
     ChangeListener& m_clients;
 };

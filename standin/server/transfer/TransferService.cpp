@@ -71,6 +71,22 @@ std::filesystem::path TransferService::ClientPath(std::string text)
     return std::filesystem::absolute(text);
 }
 
+// Of what is copied at a time an end lies where the transfer is to stand still.
+std::size_t TransferService::PieceUpTo(Troubles::Standstill const& still, off_t size) const
+{
+    if (still.by.count() == 0)
+        return m_pace.piece;
+    auto const place = static_cast<std::size_t>(static_cast<double>(size) * still.at / 100);
+    return std::clamp(place, std::size_t{1}, m_pace.piece);
+}
+
+// A server that is away takes nothing, and what it has lost it does not finish.
+void TransferService::CheckServer(RunningTransfer const& running) const
+{
+    if (m_troubles.Any() && (m_troubles.IsAway() || m_troubles.HasLost(running.Session())))
+        throw TransferError(TransferCut, "");
+}
+
 void TransferService::CheckRoom() const
 {
     if (m_troubles.IsDiskFull())
@@ -86,10 +102,11 @@ void TransferService::Copy(PartFile& target, SourceFile const& source, RunningTr
         running.Begin(++m_lastTurn, source.Size());
     }
     Troubles::Standstill still = m_troubles.OnTransfer();
-    target.CopyFrom(source, m_pace.piece,
+    target.CopyFrom(source, PieceUpTo(still, source.Size()),
                     [&](off_t done)
                     {
                         running.Advance(done);
+                        CheckServer(running);
                         if (still.by.count() > 0 && IsAt(still.at, done, source.Size()))
                             StandStill(std::exchange(still, {}).by, running);
                         if (m_pace.after)
@@ -104,6 +121,7 @@ void TransferService::Copy(PartFile& target, SourceFile const& source, RunningTr
 off_t TransferService::CarryNow(Request const& request, RunningTransfer& running)
 {
     running.Check();
+    CheckServer(running);
     if (request.direction == Request::ToServer)
     {
         ServerPath const to = ServerPath::Parse(request.target, LeafOf(request.source));

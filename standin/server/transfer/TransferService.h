@@ -132,6 +132,8 @@ private:
     using Lock = std::unique_lock<std::mutex>;
     using Place = std::list<RunningTransfer>::iterator;
 
+    std::size_t PieceUpTo(Troubles::Standstill const& still, off_t size) const;
+    void CheckServer(RunningTransfer const& running) const;
     off_t CarryNow(Request const& request, RunningTransfer& running);
     TransferResult Finish(Place running, std::function<void(RunningTransfer& running)> const& work);
     bool Runs(unsigned long long session) const;

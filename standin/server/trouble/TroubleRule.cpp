@@ -3,6 +3,7 @@
 #include <algorithm>
 #include <array>
 #include <charconv>
+#include <cmath>
 #include <fnmatch.h>
 #include <iterator>
 #include <limits>
@@ -126,7 +127,7 @@ void ReadTicket(std::string_view word, std::string_view text, TroubleRule& rule)
 // The name of a command has a point in it, and nobody knows them all.
 std::string CallOf(std::string_view word, std::string_view text)
 {
-    std::string const pattern(text);
+    std::string pattern(text);
     bool const isKnown = std::any_of(std::begin(Calls), std::end(Calls),
                                      [&](char const* name) { return Matches(pattern, name); });
     if (!isKnown && pattern.find('.') == std::string::npos)
@@ -141,8 +142,7 @@ TroubleRule::Clock::time_point TimeOf(std::string_view word, std::string_view te
     auto const seconds = NumberOf<double>(text);
     if (!seconds || !(*seconds >= 0 && *seconds < Latest))
         Fault(word, "write seconds since 1970");
-    return TroubleRule::Clock::time_point(
-        TroubleRule::Duration(static_cast<long long>(*seconds * 1000 + 0.5)));
+    return TroubleRule::Clock::time_point(TroubleRule::Duration(std::llround(*seconds * 1000)));
 }
 
 // To the millisecond, which is what texts have.
@@ -245,6 +245,9 @@ std::string ShortText(double number)
 
 TroubleRule TroubleRule::Parse(std::string_view line)
 {
+    auto const isControl = [](char byte) { return static_cast<unsigned char>(byte) < 0x20 && byte != '\t'; };
+    if (std::any_of(line.begin(), line.end(), isControl))
+        throw TroubleError("a rule is one line without control characters");
     TroubleRule rule;
     rule.kind = KindOf(NextWord(line));
     for (std::string_view word = NextWord(line); !word.empty(); word = NextWord(line))

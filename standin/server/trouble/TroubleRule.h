@@ -3,8 +3,8 @@
 //
 //   fail     a call is not carried out; code=N is what an entry answers (112)
 //   delay    a call takes longer by=DURATION
-//   away     as if the server were gone: every call fails, entries answer 106, and nothing is told. With
-//            sessions=lost those that were open have ended when it is back
+//   away     as if the server were gone: calls fail, entries answer 106, transfers are cut, and nothing is
+//            told. With sessions=lost those that were open have ended when it is back
 //   late     notifications come late by=DURATION, in their order
 //   twice    notifications come twice
 //   lost     notifications do not come

@@ -2,6 +2,7 @@
 
 #include "standin/server/files/Report.h"
 #include <algorithm>
+#include <utility>
 
 namespace standin
 {
@@ -13,22 +14,6 @@ std::string_view NextLine(std::string_view& text)
     std::string_view const line = text.substr(0, size);
     text.remove_prefix(std::min(size + 1, text.size()));
     return line;
-}
-
-// Nothing for an empty line, and for one that is no rule.
-std::optional<TroubleRule> RuleOf(std::string_view line)
-{
-    if (line.find_first_not_of(" \t") == std::string_view::npos)
-        return std::nullopt;
-    try
-    {
-        return TroubleRule::Parse(line);
-    }
-    catch (TroubleError const& error)
-    {
-        Report({TroubleKey, ": a rule is left out: ", ForMessages(error.what())});
-        return std::nullopt;
-    }
 }
 }  // namespace
 
@@ -52,8 +37,46 @@ void Troubles::Begin(std::string_view rules)
         Take(rules);
 }
 
+void Troubles::Ignore()
+{
+    std::lock_guard const lock(m_lock);
+    Take("");
+    m_isIgnored = true;
+}
+
+// Nothing for an empty line, and for one that is no rule.
+std::optional<TroubleRule> Troubles::RuleOf(std::string const& line)
+{
+    if (line.find_first_not_of(" \t") == std::string::npos)
+        return std::nullopt;
+    try
+    {
+        return TroubleRule::Parse(line);
+    }
+    catch (TroubleError const& error)
+    {
+        m_faults.emplace_back(error.what());
+        return std::nullopt;
+    }
+}
+
+void Troubles::TellOfFaults()
+{
+    std::vector<std::string> faults;
+    {
+        std::lock_guard const lock(m_lock);
+        faults = std::exchange(m_faults, {});
+        m_any = !m_rules.empty() || m_lostUpTo != 0;
+    }
+    for (std::string const& fault : faults)
+        Report({TroubleKey, ": a rule is left out: ", ForMessages(fault)});
+}
+
 void Troubles::Take(std::string_view text)
 {
+    if (m_isIgnored)
+        return;
+    m_faults.clear();
     std::vector<Counted> rules;
     while (!text.empty())
     {
@@ -73,7 +96,7 @@ void Troubles::Take(std::string_view text)
         }
     }
     m_rules = std::move(rules);
-    m_any = !m_rules.empty() || m_lostUpTo != 0;
+    m_any = !m_rules.empty() || m_lostUpTo != 0 || !m_faults.empty();
 }
 
 bool Troubles::Counted::Strikes(Occasion const& occasion)
@@ -108,6 +131,7 @@ bool Troubles::IsDiskFull() { return Has(TroubleRule::Full); }
 
 Troubles::Verdict Troubles::OnCall(Occasion const& call)
 {
+    TellOfFaults();
     Verdict verdict;
     ForEach(TroubleRule::Delay, call, [&](TroubleRule const& rule) { verdict.delay += rule.by; });
     if (IsAway())
@@ -135,8 +159,8 @@ Troubles::Standstill Troubles::OnTransfer()
         ForEach(TroubleRule::Stall, {},
                 [&](TroubleRule const& rule)
                 {
-                    standstill.by += rule.by;
-                    standstill.at = std::min(standstill.at, rule.at);
+                    if (standstill.by.count() == 0)
+                        standstill = {rule.by, rule.at};
                 });
     return standstill;
 }

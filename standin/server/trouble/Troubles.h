@@ -45,11 +45,14 @@ public:
     static Troubles& None();
 
     // These rules from now on, a line each. One that was there before goes on counting; one that is none is
-    // left out, with a line on stderr.
+    // left out. The next call tells of it on stderr: nobody may be kept waiting here.
     void Set(std::string_view rules);
 
     // Those of the beginning, unless newer ones have been set already.
     void Begin(std::string_view rules);
+
+    // None from now on, whoever sets them: for a server that serves no clients.
+    void Ignore();
 
     // Whether there are any, or have been by which sessions were lost. Costs next to nothing.
     bool Any() const noexcept { return m_any.load(std::memory_order_relaxed); }
@@ -78,6 +81,8 @@ private:
         bool Strikes(Occasion const& occasion);
     };
     void Take(std::string_view rules);
+    std::optional<TroubleRule> RuleOf(std::string const& line);
+    void TellOfFaults();
     // Calls use with every rule of the kind that strikes.
     template <typename Use>
     void ForEach(TroubleRule::Kind kind, Occasion const& occasion, Use const& use);
@@ -88,6 +93,8 @@ private:
     std::atomic<unsigned long long> m_lostUpTo{0};
     std::mutex m_lock;  // taken last; the members below
     bool m_isSet = false;
+    bool m_isIgnored = false;
+    std::vector<std::string> m_faults;  // to be told
     std::vector<Counted> m_rules;
 };
 }  // namespace standin
