@@ -2,8 +2,8 @@
 #pragma once
 
 #include "comgui/client.h"
-#include "comgui/testing/TemporarySite.h"
 #include "comgui/testing/TemporaryFolder.h"
+#include "comgui/testing/TemporarySite.h"
 #include <gtest/gtest.h>
 
 using comgui::test::TemporaryFolder;
