@@ -178,7 +178,9 @@ TEST_F(Storm, IsSurvived)
     testing::internal::GetCapturedStderr();
     site.SetTrouble({});
 
-    Await([&] { return connection.IsLoggedIn() && connection.IsServerThere(); }, "the server is back");
+    // The kit asks once a second; until then it may not know that its session is lost.
+    Await([&] { return tickets.Read(counters[0], "Count").operator bool(); }, "the server is back");
+    Await([&] { return connection.IsLoggedIn() && connection.IsServerThere(); }, "and the kit knows it");
     for (std::size_t i = 0; i < counters.size(); ++i)
     {
         auto const number = tickets.ReadAs<int>(counters[i], "Count");
