@@ -1,6 +1,6 @@
 // Handles of objects that a host gets to see in place of addresses. A stale or foreign handle is known for
 // what it is and never followed: it is a number, which no other object ever gets, and its kind tells handles
-// of different tables apart. To find an object takes no lock and two loads.
+// of different tables apart. To find an object takes no lock and three loads.
 #pragma once
 
 #include <array>
@@ -22,7 +22,7 @@ public:
         std::uintptr_t const index = TakeFree();
         Place& place = *PlaceOf(index);
         std::uintptr_t const handle = Kind << KindBit | place.uses << UseBit | index;
-        place.object.store(&object, std::memory_order_relaxed);
+        place.object.store(&object, std::memory_order_release);
         place.handle.store(handle, std::memory_order_release);
         return reinterpret_cast<void*>(handle);
     }
@@ -46,7 +46,13 @@ public:
     T* Find(void const* handle) const noexcept
     {
         Place const* const place = PlaceThatHas(handle);
-        return place ? place->object.load(std::memory_order_acquire) : nullptr;
+        if (!place)
+            return nullptr;
+        T* const object = place->object.load(std::memory_order_acquire);
+        // The place may have got another object since, which nobody may find by this handle.
+        bool const isStillThere =
+            place->handle.load(std::memory_order_acquire) == reinterpret_cast<std::uintptr_t>(handle);
+        return isStillThere ? object : nullptr;
     }
 
 private:

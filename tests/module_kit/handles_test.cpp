@@ -1,5 +1,6 @@
 #include "comgui/module/Handles.h"
 
+#include <atomic>
 #include <bit>
 #include <gtest/gtest.h>
 #include <set>
@@ -102,4 +103,35 @@ TEST_F(HandlesOfOneKind, TwoThreads_AddFindAndRemove)
     std::thread other([&] { work(second); });
     work(first);
     other.join();
+}
+
+// Its place may be another's by the time that the object is looked at.
+TEST_F(HandlesOfOneKind, Find_NeverGivesAnotherObject_WhileHandlesComeAndGo)
+{
+    int objects[2] = {};
+    std::atomic<void*> given[2] = {};
+    std::atomic<bool> isOver{false};
+    std::atomic<int> wrong{0};
+    std::vector<std::thread> finders;
+    for (int i = 0; i < 2; ++i)
+        finders.emplace_back(
+            [&]
+            {
+                while (!isOver)
+                    for (std::size_t which : {0, 1})
+                    {
+                        int const* const found = handles->Find(given[which]);
+                        wrong += found && found != &objects[which] ? 1 : 0;
+                    }
+            });
+    for (std::size_t round = 0; round < 300'000; ++round)
+    {
+        std::size_t const which = round % 2;
+        given[which] = handles->Add(objects[which]);
+        handles->Remove(given[which]);
+    }
+    isOver = true;
+    for (std::thread& finder : finders)
+        finder.join();
+    EXPECT_EQ(wrong, 0);
 }
