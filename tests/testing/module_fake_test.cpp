@@ -2,11 +2,9 @@
 #include "comgui/client.h"
 #include "comgui/comgui.h"
 #include "comgui/testing.h"
-#include <chrono>
+#include "tests/testing/HeardKeys.h"
 #include <gmock/gmock.h>
-#include <thread>
 
-using namespace std::chrono_literals;
 using comgui::test::Address;
 using comgui::test::ModuleFake;
 using comgui::test::Value;
@@ -88,20 +86,7 @@ TEST_F(FakedServer, WhatTheTestDoes_IsNoCall)
 TEST_F(FakedServer, WhatTheTestDoes_IsHeardOf)
 {
     Address const job = module.Create(3);
-    comgui::TaskQueue queue;
-    std::vector<std::string> heard;
-    auto const subscription =
-        connection.Subscribe(comgui::Interest::InTypes({3}), queue.GetExecutor(),
-                             [&](comgui::Event const& event)
-                             {
-                                 if (auto const* const change = std::get_if<comgui::TicketChanged>(&event))
-                                     for (comgui::KeyChange const& key : change->keys)
-                                         heard.push_back(key.key);
-                             });
-    module.Put(job, "Job/State", 1);
-    for (auto const end = std::chrono::steady_clock::now() + 20s;
-         heard.empty() && std::chrono::steady_clock::now() < end;)
-        queue.RunFor(5ms);
+    auto const heard = KeysHeardOf(connection, [&] { module.Put(job, "Job/State", 1); });
     EXPECT_THAT(heard, ElementsAre("Job/State"));
 }
 

@@ -2,14 +2,13 @@
 #include "comgui/client.h"
 #include "comgui/comgui.h"
 #include "comgui/testing.h"
-#include <chrono>
+#include "tests/testing/HeardKeys.h"
 #include <cstdlib>
 #include <gmock/gmock.h>
 #include <optional>
 #include <sys/wait.h>
 #include <unistd.h>
 
-using namespace std::chrono_literals;
 using comgui::plugin::Bytes;
 using comgui::test::Address;
 using comgui::test::TemporarySite;
@@ -102,20 +101,7 @@ TEST_F(SiteOfATest, WhatTheTestDoes_IsHeardOf)
 {
     LogIn();
     Address const job = site.Create(3);
-    comgui::TaskQueue queue;
-    std::vector<std::string> heard;
-    auto const subscription =
-        connection.Subscribe(comgui::Interest::InTypes({3}), queue.GetExecutor(),
-                             [&](comgui::Event const& event)
-                             {
-                                 if (auto const* const change = std::get_if<comgui::TicketChanged>(&event))
-                                     for (comgui::KeyChange const& key : change->keys)
-                                         heard.push_back(key.key);
-                             });
-    site.Put(job, "Job/State", 1);
-    for (auto const end = std::chrono::steady_clock::now() + 20s;
-         heard.empty() && std::chrono::steady_clock::now() < end;)
-        queue.RunFor(5ms);
+    auto const heard = KeysHeardOf(connection, [&] { site.Put(job, "Job/State", 1); });
     EXPECT_THAT(heard, ElementsAre("Job/State"));
 }
 
