@@ -118,7 +118,7 @@ TEST_F(HandlesOfOneKind, Find_NeverGivesAnotherObject_WhileHandlesComeAndGo)
             [&]
             {
                 while (!isOver)
-                    for (std::size_t which : {0, 1})
+                    for (std::size_t which = 0; which < 2; ++which)
                     {
                         int const* const found = handles->Find(given[which]);
                         wrong += found && found != &objects[which] ? 1 : 0;
