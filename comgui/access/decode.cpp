@@ -1,19 +1,19 @@
 #include "comgui/access/decode.h"
 
+#include "comgui/access/FromUtf8.h"
+#include "comgui/folders/folder_paths.h"
+
 namespace comgui::detail
 {
-bool IsDecodeNeeded(std::string const& text) { return text.size() >= 4 && text[0] == '$' && text[1] == '('; }
-
 template <typename Slots>
 wxString Decode(Slots const& slots, char const* value)
 {
     if (!value)
         return wxString();
-    std::string text = value;
-    if (IsDecodeNeeded(text))
+    if (NeedsDecode(value))
         if (clFOLDER_VARIABLES const* const folders = slots.GetFolderVariables())
-            text = folders->Decode(text, false);
-    return wxString::FromUTF8(text.c_str(), wxString::npos);
+            return FromUtf8(folders->Decode(value, false).c_str());
+    return FromUtf8(value);
 }
 
 template <typename Slots>
@@ -25,7 +25,7 @@ bool ReadText(Slots const& slots, char const* key, wxString& value, int pos)
         value.clear();  // what a caller overlooks must not look like a value of this ticket
         return false;
     }
-    value = Decode(slots, text);
+    Decode(slots, text).swap(value);
     return true;
 }
 

@@ -3,14 +3,10 @@
 #pragma once
 
 #include "comgui/access/TICKET_SLOTS.h"
-#include <string>
 #include <wx/string.h>
 
 namespace comgui::detail
 {
-// Whether a text may be a path in variable form: four bytes or more that begin with "$(".
-bool IsDecodeNeeded(std::string const& text);
-
 // UTF-8 as the host sees it; null is the empty text. The ticket is asked for its translator only when the
 // text needs one, and then every time anew; without a translator $(...) stays.
 template <typename Slots>

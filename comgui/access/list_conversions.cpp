@@ -50,7 +50,7 @@ bool ReadTexts(Slots const& slots, char const* key, std::vector<wxString>& out)
     texts.erase(std::remove(texts.begin(), texts.end(), nullptr), texts.end());
     out.resize(texts.size());
     for (std::size_t i = texts.size(); i-- > 0;)
-        out[i] = Decode(slots, texts[i]);
+        Decode(slots, texts[i]).swap(out[i]);
     return !out.empty();
 }
 
@@ -72,8 +72,10 @@ bool ReadWxArray(Slots const& slots, char const* key, wxArrayString& out)
     std::vector<wxString> texts;
     if (!ReadTexts(slots, key, texts))
         return false;
-    for (wxString const& text : texts)
-        out.push_back(text);
+    std::size_t next = out.size();
+    out.Add(wxString(), texts.size());
+    for (wxString& text : texts)
+        out[next++].swap(text);
     return !out.empty();
 }
 

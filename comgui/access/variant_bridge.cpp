@@ -2,6 +2,8 @@
 
 #include "comgui/access/decode.h"
 #include "comgui/access/list_conversions.h"
+#include <memory>
+#include <typeinfo>
 #include <wx/arrstr.h>
 #include <wx/string.h>
 
@@ -21,10 +23,20 @@ enum class KIND
     OTHER,
 };
 
+bool IsOfClass(wxVariant const& variant, std::type_info const& itsClass)
+{
+    wxVariantData const* const data = variant.GetData();
+    return data && typeid(*data) == itsClass;
+}
+
 KIND KindOf(wxVariant const& variant)
 {
     static wchar_t const* const names[] = {L"bool",   L"double",    L"list", L"long",
                                            L"string", L"arrstring", L"void*"};
+    // Most values are texts. The name of a type is a text that has to be made, a class is just there.
+    static wxVariant const aText{wxString()};
+    if (IsOfClass(variant, typeid(*aText.GetData())))
+        return KIND::STRING;
     wxString const type = variant.GetType();
     int kind = 0;
     while (kind < static_cast<int>(KIND::OTHER) && type != names[kind])
@@ -32,12 +44,13 @@ KIND KindOf(wxVariant const& variant)
     return static_cast<KIND>(kind);
 }
 
-template <typename Slots>
-wxString ReadTextOr(Slots const& slots, int pos, char const* key, wxString const& def)
+// The default is made only if there is no text.
+template <typename Slots, typename MakeDefault>
+wxString ReadTextOr(Slots const& slots, int pos, char const* key, MakeDefault makeDefault)
 {
     wxString text;
     if (!ReadText(slots, key, text, pos))
-        return def;
+        makeDefault().swap(text);
     return text;
 }
 
@@ -87,7 +100,7 @@ wxVariant ReadStored(Slots const& slots, char const* key, int pos)
     case PARAM_DOUBLE:
         return Read(slots, PARAM_DOUBLE, pos, key, 0.0);
     case PARAM_STRING:
-        return ReadTextOr(slots, pos, key, wxString());
+        return ReadTextOr(slots, pos, key, [] { return wxString(); });
     case PARAM_COUNT:
         return pos == -1 ? ReadVector(slots, key) : wxVariant();
     default:
@@ -107,9 +120,10 @@ wxVariant ReadListLike(Slots const& slots, char const* key, wxVariant const& def
     int pos = 0;
     for (wxVariant const* const element : def.GetList())
     {
-        wxVariant value = ReadAs(slots, key, *element, pos++);
-        value.SetName(def.GetName());
-        list.Append(value);
+        auto value = std::make_unique<wxVariant>(ReadAs(slots, key, *element, pos++));
+        value->SetName(def.GetName());
+        list.GetList().Append(value.get());
+        static_cast<void>(value.release());  // the list's from here on
     }
     return list;
 }
@@ -119,7 +133,7 @@ wxVariant ReadTextsLike(Slots const& slots, char const* key, wxVariant const& de
 {
     wxArrayString texts = def.GetArrayString();
     for (std::size_t i = 0; i < texts.size(); ++i)
-        texts[i] = ReadTextOr(slots, static_cast<int>(i), key, texts[i]);
+        ReadTextOr(slots, static_cast<int>(i), key, [&] { return texts[i]; }).swap(texts[i]);
     return texts;
 }
 
@@ -137,7 +151,7 @@ wxVariant ReadAs(Slots const& slots, char const* key, wxVariant const& def, int 
     case KIND::LONG:
         return static_cast<long>(Read(slots, PARAM_INT, pos, key, static_cast<int>(def.GetLong())));
     case KIND::STRING:
-        return ReadTextOr(slots, pos, key, def.GetString());
+        return ReadTextOr(slots, pos, key, [&] { return def.GetString(); });
     case KIND::ARRSTRING:
         return pos == -1 ? ReadTextsLike(slots, key, def) : def;
     case KIND::POINTER:

@@ -66,6 +66,7 @@ bool comgui::detail::clFOLDER_VARIABLES_IMP::IsEnabled() const
 void comgui::detail::clFOLDER_VARIABLES_IMP::Load()
 {
     MUTEX_LOCK const lock(mutex);
+    index.reset();
     mappings.clear();
     flags = 0;
     if (access == nullptr)
@@ -87,8 +88,15 @@ void comgui::detail::clFOLDER_VARIABLES_IMP::Load()
         // is the server's error, and stays here with the lock held.
         while (NeedsDecode(folder))
             folder = Decode(folder, false);  // NOLINT(clang-analyzer-optin*): this class's own, at first
+        index.reset();                       // Decode may have asked for it
         mappings.emplace_back(row->key, row->variable, std::move(folder));
     }
+    Index();
+}
+
+comgui::detail::FOLDER_INDEX const& comgui::detail::clFOLDER_VARIABLES_IMP::Index() const
+{
+    return index ? *index : index.emplace(mappings);
 }
 
 std::string comgui::detail::clFOLDER_VARIABLES_IMP::Encode(std::string const& path) const
@@ -96,22 +104,13 @@ std::string comgui::detail::clFOLDER_VARIABLES_IMP::Encode(std::string const& pa
     MUTEX_LOCK const lock(mutex);
     if ((flags & ENCODES) == 0)
         return path;
-    FOLDER_MAPPING const* best = nullptr;
-    std::size_t bestLength = 0;
-    for (FOLDER_MAPPING const& mapping : mappings)
-    {
-        std::size_t const length = MatchLength(mapping.folder, path);
-        if (length > bestLength)
-        {
-            best = &mapping;
-            bestLength = length;
-        }
-    }
-    if (best == nullptr)
+    FOLDER_MAPPING const* const mapping = Index().Holding(path);
+    if (mapping == nullptr)
         return path;
-    std::string form = VariableForm(best->variable, path.size() - bestLength);
+    std::size_t const covered = mapping->folder.size();
+    std::string form = VariableForm(mapping->variable, path.size() - covered);
     auto const rest = static_cast<std::ptrdiff_t>(form.size());
-    form.append(path, bestLength);
+    form.append(path, covered);
     std::replace(form.begin() + rest, form.end(), '\\', '/');  // not in the variable, which is taken as it is
     return form;
 }
@@ -146,8 +145,8 @@ std::string comgui::detail::clFOLDER_VARIABLES_IMP::Decode(std::string const& pa
     if (end == std::string::npos || end == 2)
         return path;
     std::string_view const variable = std::string_view(path).substr(2, end - 2);
-    auto const mapping = std::ranges::find(mappings, variable, &FOLDER_MAPPING::variable);
-    if (mapping == mappings.end())
+    FOLDER_MAPPING const* const mapping = Index().Of(variable);
+    if (mapping == nullptr)
         return path;
     std::string decoded;
     decoded.reserve(mapping->folder.size() + path.size() - end - 1);
@@ -161,6 +160,7 @@ void comgui::detail::clFOLDER_VARIABLES_IMP::SetFolderVariable(char const* varia
     if (variable == nullptr)
         return;
     MUTEX_LOCK const lock(mutex);
+    index.reset();
     auto const mapping = std::ranges::find(mappings, std::string_view(variable), &FOLDER_MAPPING::variable);
     if (mapping == mappings.end())
     {

@@ -3,27 +3,17 @@
 // the lock from its beginning to its end.
 #pragma once
 
+#include "comgui/folders/FOLDER_INDEX.h"
+#include "comgui/folders/FOLDER_MAPPING.h"
 #include "comgui/folders/clFOLDER_VARIABLES.h"
 #include "comgui/foundation/SysLib.h"
 #include "comgui/ticket/MTICKET_ACCESS.h"
+#include <optional>
 #include <string>
-#include <utility>
 #include <vector>
 
 namespace comgui::detail
 {
-struct FOLDER_MAPPING
-{
-    FOLDER_MAPPING(std::string itsKey, std::string itsVariable, std::string itsFolder)
-        : key(std::move(itsKey)), variable(std::move(itsVariable)), folder(std::move(itsFolder))
-    {
-    }
-
-    std::string key;       // in the system ticket; empty if SetFolderVariable made the mapping
-    std::string variable;  // its bare name
-    std::string folder;    // as Load() tidied it up, or as SetFolderVariable got it
-};
-
 class clFOLDER_VARIABLES_IMP : public clFOLDER_VARIABLES
 {
 public:
@@ -51,9 +41,13 @@ private:
         ENCODES = 2,
     };
 
+    // With the lock held.
+    FOLDER_INDEX const& Index() const;
+
     mutable SysLib::MUTEX_INSTANCE mutex;
     MTICKET_ACCESS const* access;          // may be null
     std::vector<FOLDER_MAPPING> mappings;  // in the order in which they came; of equal ones the first counts
     unsigned flags;                        // of FLAG
+    mutable std::optional<FOLDER_INDEX> index;  // none if the mappings have changed since it was needed
 };
 }  // namespace comgui::detail

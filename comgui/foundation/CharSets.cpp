@@ -1,5 +1,6 @@
 #include "comgui/foundation/CharSets.h"
 
+#include "comgui/foundation/filter_bytes.h"
 #include "comgui/foundation/stracpy.h"
 #include <array>
 #include <cstdlib>
@@ -161,27 +162,8 @@ void CharSets::FilterString::setReplace(char const* bytes, char with)
 
 std::string CharSets::FilterString::operator()(std::string const& s) const
 {
-    // Each entry is written, and the next one over it if it was 0: no branch depends on the text. A block
-    // counts for itself, so that it need not wait for the last byte of the one before.
-    constexpr int Block = 16;  // compilers still unroll as many
+    static comgui::detail::FILTER_BYTES* const filter = comgui::detail::QuickestFilterBytes();
     std::string result(s.size(), '\0');
-    char* end = result.data();
-    auto const take = [&](char const* from, int size)
-    {
-        std::size_t taken = 0;
-        for (int i = 0; i < size; ++i)
-        {
-            char const entry = (*this)(from[i]);
-            end[taken] = entry;
-            taken += entry != 0;
-        }
-        end += taken;
-    };
-    char const* next = s.data();
-    char const* const last = next + s.size();
-    for (; last - next >= Block; next += Block)
-        take(next, Block);
-    take(next, static_cast<int>(last - next));
-    result.resize(static_cast<std::size_t>(end - result.data()));
+    result.resize(filter(table, s.data(), s.size(), result.data()));
     return result;
 }

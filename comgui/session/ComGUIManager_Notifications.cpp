@@ -1,6 +1,7 @@
 // The road of a notification from the plug-in into the queue, and how the plug-in is told to use it.
 #include "comgui/session/ComGUIManager.h"
 
+#include "comgui/access/FromUtf8.h"
 #include "comgui/access/MTICKET_ADMIN.h"
 #include "comgui/access/STICKET_MODIFY.h"
 #include "comgui/access/STICKET_READ.h"
@@ -20,7 +21,11 @@ constexpr int TextIsAKey = 7;       // the kind whose texts do not count as its 
 constexpr int NoNotification = -1;
 constexpr int AllNotifications = -3;
 
-wxString Text(void const* utf8) { return wxString::FromUTF8(static_cast<char const*>(utf8)); }
+// By exchange, since an assignment would copy the text once more.
+void Take(wxString& text, void const* utf8)
+{
+    comgui::detail::FromUtf8(static_cast<char const*>(utf8)).swap(text);
+}
 
 // The lock is held for a splice only, not for the allocation of the list's node.
 void Append(std::unique_ptr<NotifData> notification)
@@ -48,7 +53,7 @@ void FillWithValue(NotifData& notification, SETMULTIPAR const& record)
     if (!record.value)
         return;
     if (record.type == PARAM_STRING)
-        notification.NotifText = Text(record.value);
+        Take(notification.NotifText, record.value);
     else if (record.type == PARAM_DOUBLE)
         notification.NotifNumber = *static_cast<double const*>(record.value);
     else if (record.type == PARAM_INT)
@@ -62,7 +67,7 @@ void QueueTable(NotifData const& pattern, SETMULTIPAR const* first)
     {
         SETMULTIPAR const* const end = EndOfRun(first);
         auto notification = std::make_unique<NotifData>(pattern);
-        notification->NotifKey = Text(first->key);
+        Take(notification->NotifKey, first->key);
         if (end - first == 1)
             FillWithValue(*notification, *first);
         else
@@ -78,7 +83,7 @@ void FillWithRecord(NotifData& notification, int kind, SETMULTIPAR const& record
     notification.NotifValueType = record.type;
     bool const isText = record.type == PARAM_STRING && kind != TextIsAKey;
     if (void const* const text = isText ? record.value : record.key)
-        notification.NotifKey = Text(text);
+        Take(notification.NotifKey, text);
 }
 }  // namespace
 

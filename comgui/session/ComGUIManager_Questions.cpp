@@ -1,20 +1,21 @@
 // Questions that the records answer.
 #include "comgui/session/ComGUIManager.h"
 
+#include "comgui/access/FromUtf8.h"
 #include <cstring>
 #include <wx/filefn.h>
 #include <wx/utils.h>
+
+using comgui::detail::FromUtf8;
 
 namespace
 {
 constexpr int Administrator = 16;  // a role, not a bit: 17 and 48 are no administrators
 
-wxString Text(char const* utf8) { return wxString::FromUTF8(utf8); }
-
 // Whether the host text names this machine, the local address apart.
 bool NamesThisMachine(char const* host)
 {
-    return wxGetHostName().IsSameAs(Text(host), false) || Text(host).IsSameAs("localhost", false) ||
+    return wxGetHostName().IsSameAs(FromUtf8(host), false) || FromUtf8(host).IsSameAs("localhost", false) ||
            std::strcmp(host, "127.0.0.1") == 0;
 }
 }  // namespace
@@ -23,11 +24,11 @@ wxString ComGUIManager::GetServerName() { return m_serverName; }
 
 int ComGUIManager::GetServerName(TLogin*) { return -9999; }
 
-wxString ComGUIManager::GetLocalEndPoint() { return Text(m_pLogin->szLocalEndPoint); }
+wxString ComGUIManager::GetLocalEndPoint() { return FromUtf8(m_pLogin->szLocalEndPoint); }
 
-wxString ComGUIManager::GetCurrentlyLoggedUser() { return Text(m_pLogin->szUser); }
+wxString ComGUIManager::GetCurrentlyLoggedUser() { return FromUtf8(m_pLogin->szUser); }
 
-wxString ComGUIManager::GetCurrentlyLoggedUser(TLogin* login) { return Text(login->szUser); }
+wxString ComGUIManager::GetCurrentlyLoggedUser(TLogin* login) { return FromUtf8(login->szUser); }
 
 int ComGUIManager::GetCurrentlyLoggedUserTicketID() { return m_pLogin->iClientStamp; }
 
@@ -39,7 +40,7 @@ wxString ComGUIManager::GetUserLockInfo() { return GetUserLockInfo(m_pLogin); }
 
 wxString ComGUIManager::GetUserLockInfo(TLogin* login)
 {
-    return wxString("http://") << Text(login->szLocalAddress) << ":" << login->iLocalPort;
+    return wxString("http://") << FromUtf8(login->szLocalAddress) << ":" << login->iLocalPort;
 }
 
 bool ComGUIManager::IsServerLocal()
@@ -51,7 +52,7 @@ bool ComGUIManager::IsServerLocal()
 bool ComGUIManager::IsServerLocal(TLogin* login)
 {
     // Unlike the form above, and on purpose, the letter case of the address does not count here.
-    return Text(login->szLocalAddress).IsSameAs(Text(login->szServerHost), false) ||
+    return FromUtf8(login->szLocalAddress).IsSameAs(FromUtf8(login->szServerHost), false) ||
            NamesThisMachine(login->szServerHost);
 }
 

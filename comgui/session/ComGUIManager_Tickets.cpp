@@ -2,6 +2,8 @@
 // one operation to the next, and hosts rely on each as it is.
 #include "comgui/session/ComGUIManager.h"
 
+#include "comgui/access/FromUtf8.h"
+
 #include "comgui/ticket/TICKET_ID.h"
 
 namespace
@@ -37,8 +39,7 @@ template <typename Get>
 wxArrayString ReadStringArray(Get get)
 {
     return ReadArray<wxArrayString>(PARAM_STRING, static_cast<char const*>(nullptr), get,
-                                    [](char const* text)
-                                    { return text ? wxString::FromUTF8(text) : wxString(); });
+                                    comgui::detail::FromUtf8);
 }
 
 auto ReaderOf(ComGUIManager& manager, MTICKET_ACCESS const* container, int type, int id, char const* key)

@@ -48,6 +48,7 @@ void PARTIAL_MODE::set(char const* const* keys)
 
 void PARTIAL_MODE::clear()
 {
+    m_index.Drop();
     m_keys.clear();
     m_prefixes.clear();
 }
@@ -56,6 +57,7 @@ void PARTIAL_MODE::insert(std::string key)
 {
     if (key.empty())
         return;
+    m_index.Drop();
     if (wildcard(key))
         m_prefixes.insert(key);
     else
@@ -64,6 +66,7 @@ void PARTIAL_MODE::insert(std::string key)
 
 void PARTIAL_MODE::erase(std::string key)
 {
+    m_index.Drop();
     if (wildcard(key))
         m_prefixes.erase(key);
     else
@@ -80,7 +83,7 @@ bool PARTIAL_MODE::wildcard(std::string& key)
 
 bool PARTIAL_MODE::multi_contains(std::string_view key) const
 {
-    return m_keys.find(key) != m_keys.end() || m_prefixes.find(key) != m_prefixes.end();
+    return m_index.Selects(key, m_keys, m_prefixes);
 }
 
 PARTIAL_COLLECT_ACTION::PARTIAL_COLLECT_ACTION(SETMULTIPAR_LIST* list, PARTIAL_MODE const& mode)

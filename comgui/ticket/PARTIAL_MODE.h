@@ -5,6 +5,7 @@
 
 #include "comgui/foundation/export.h"
 #include "comgui/ticket/PARAM_TYPE.h"
+#include "comgui/ticket/PATTERN_INDEX.h"
 #include <cstddef>
 #include <functional>
 #include <set>
@@ -35,7 +36,9 @@ public:
 
     // The element that begins text, or is text; end() if there is none.
     const_iterator find(std::string_view text) const;
+    const_iterator begin() const { return m_prefixes.begin(); }
     const_iterator end() const { return m_prefixes.end(); }
+    std::size_t size() const { return m_prefixes.size(); }
 
     // Nothing is added if an element begins text already. Of the elements that text begins one goes, the
     // lowest; if others remain, text is not added either.
@@ -79,6 +82,7 @@ public:
 private:
     std::set<std::string, std::less<>> m_keys;
     STRINGPREFIXSET m_prefixes;
+    comgui::detail::PATTERN_INDEX m_index;  // of both, to be dropped before they change
 };
 
 // Adds the parameters that mode selects to a list, in the course of one walk; mode and list must outlive it.
