@@ -3,6 +3,7 @@
 #include "comgui/stream/ticket_items.h"
 #include "comgui/ticket/SETMULTIPAR_LIST.h"
 #include <algorithm>
+#include <array>
 #include <memory>
 #include <new>
 #include <utility>
@@ -65,6 +66,44 @@ inline unsigned char STICKET_BINSTREAM::IMPORT_INTERN::TakeTag(unsigned long& si
     return tag & ItemClassBits;
 }
 
+// The tag of a number, if the next item is one of these forms and all of it is there.
+inline bool STICKET_BINSTREAM::IMPORT_INTERN::TakeNumberTag(NUMBER_FORMS forms, unsigned long& size)
+{
+    if (bytes.left == 0)
+        return false;
+    unsigned const form = *bytes.address ^ ITEM_NUMBER;
+    if (form >= ShortSizes || (forms >> form & 1) == 0 || bytes.left <= form)
+        return false;
+    bytes.Take(1);
+    size = form;
+    return true;
+}
+
+// size: of one of the integers' forms.
+inline int STICKET_BINSTREAM::IMPORT_INTERN::TakeInteger(unsigned long size)
+{
+    if (bytes.left < sizeof(std::uint32_t))
+    {
+        int value = 0;
+        unsigned char const* const from = bytes.Take(size);
+        for (unsigned long i = 0; i < size; ++i)
+            value = i == 0 ? static_cast<signed char>(from[i]) : value * 256 + from[i];
+        return value;
+    }
+    // Whichever form it is, nothing has to be foreseen.
+    std::uint64_t const word = GetBytes<std::uint32_t>(bytes.Take(size));
+    auto const value = static_cast<std::int64_t>(word << 32) >> (64 - 8 * size) % 64;
+    return size == 0 ? 0 : static_cast<int>(value);
+}
+
+// size: of one of the doubles' forms.
+inline double STICKET_BINSTREAM::IMPORT_INTERN::TakeDouble(unsigned long size)
+{
+    double value;
+    size == NUMBER_SINGLE ? GetFloat(value) : GetDouble(value);
+    return value;
+}
+
 void STICKET_BINSTREAM::IMPORT_INTERN::GetString(std::string& value, unsigned long size)
 {
     unsigned char const* const text = bytes.Take(size);  // before the copy: a false size must not allocate
@@ -87,7 +126,7 @@ std::string_view STICKET_BINSTREAM::IMPORT_INTERN::TakeKey(unsigned long size, b
         previousKey.resize(std::max(previousSize, 2 * previousKey.size()));
     std::string_view const tail(reinterpret_cast<char const*>(item.address), item.left);
     Copy(previousKey.data() + shared, tail.data(), tail.size());
-    previousText = previousText < shared ? previousText : shared + std::min(tail.find('\0'), tail.size());
+    previousText = previousText < shared ? previousText : shared + SizeToZero(tail.data(), tail.size());
     return {previousKey.data(), previousSize};
 }
 
@@ -177,17 +216,13 @@ private:
         switch (size)
         {
         case NUMBER_ZERO:
-            return AddInteger(0);
         case NUMBER_INT8:
-            return AddInteger(static_cast<signed char>(*m_cursor.bytes.Take(1)));
         case NUMBER_INT16:
-            return AddInteger(static_cast<short>(GetBytes<std::uint16_t>(m_cursor.bytes.Take(2))));
         case NUMBER_INT32:
-            return AddInteger(static_cast<int>(GetBytes<std::uint32_t>(m_cursor.bytes.Take(4))));
+            return TakeIntegers(size);
         case NUMBER_SINGLE:
-            return AddDouble<&IMPORT_INTERN::GetFloat>();
         case NUMBER_DOUBLE:
-            return AddDouble<&IMPORT_INTERN::GetDouble>();
+            return TakeDoubles(size);
         case NUMBER_INT64:
             return AddInteger64();
         default:
@@ -198,7 +233,8 @@ private:
     [[gnu::noinline]] void AddText(unsigned char const* text, unsigned long size)
     {
         std::string_view const bytes(reinterpret_cast<char const*>(text), size);
-        Add(PARAM_STRING, [&] { return m_list->m_stringCache.Keep(bytes.substr(0, bytes.find('\0'))); });
+        Add(PARAM_STRING, [&]
+            { return m_list->m_stringCache.Keep(bytes.substr(0, SizeToZero(bytes.data(), bytes.size()))); });
     }
 
     [[gnu::noinline]] void AddBinary(unsigned char const* bytes, unsigned long size)
@@ -206,17 +242,33 @@ private:
         Add(PARAM_BINSTRING, [&] { return m_list->m_binCache.Keep(BIN_STRING(bytes, size)); });
     }
 
-    void AddInteger(int value)
+    // The numbers of a vector stand one behind the other. Where the list keeps a number is a matter of its
+    // hash; so the places of many are asked for before the first is looked at, and come together.
+    void TakeIntegers(unsigned long size)
     {
-        Add(PARAM_INT, [&] { return m_list->m_intCache.Keep(value); });
+        std::array<int, Together> values;
+        std::size_t count = 0;
+        do
+            values[count++] = m_cursor.TakeInteger(size);
+        while (count < Together && m_cursor.TakeNumberTag(Integers, size));
+        if (count > 1 && m_list)
+            std::for_each_n(values.begin(), count, [&](int value) { m_list->m_intCache.Expect(value); });
+        std::for_each_n(values.begin(), count,
+                        [&](int& value) { Add(PARAM_INT, [&] { return m_list->m_intCache.Keep(value); }); });
     }
 
-    template <void (IMPORT_INTERN::*Get)(double&)>
-    [[gnu::noinline]] void AddDouble()
+    void TakeDoubles(unsigned long size)
     {
-        double value;
-        (m_cursor.*Get)(value);
-        Add(PARAM_DOUBLE, [&] { return m_list->Cached(value); });
+        std::array<double, Together> values;
+        std::size_t count = 0;
+        do
+            values[count++] = m_cursor.TakeDouble(size);
+        while (count < Together && m_cursor.TakeNumberTag(Doubles, size));
+        if (count > 1 && m_list)
+            std::for_each_n(values.begin(), count,
+                            [&](double value) { m_list->m_doubleCache.Expect(value); });
+        std::for_each_n(values.begin(), count,
+                        [&](double& value) { Add(PARAM_DOUBLE, [&] { return m_list->Cached(value); }); });
     }
 
     [[gnu::noinline]] void AddInteger64()
@@ -239,6 +291,11 @@ private:
             m_cachedKey = m_list->m_keyCache.Keep(m_cursor.Key());
         m_list->Add(m_cachedKey, type, value, FixPos(m_fixNext, m_pos));
     }
+
+    static constexpr NUMBER_FORMS Integers =
+        FormBit(NUMBER_ZERO) | FormBit(NUMBER_INT8) | FormBit(NUMBER_INT16) | FormBit(NUMBER_INT32);
+    static constexpr NUMBER_FORMS Doubles = FormBit(NUMBER_SINGLE) | FormBit(NUMBER_DOUBLE);
+    static constexpr std::size_t Together = 32;
 
     SETMULTIPAR_LIST* const m_list;
     IMPORT_INTERN m_cursor;

@@ -133,6 +133,10 @@ inline char* PutPosition(char* to, int pos)
 
 inline char* PutNumberTag(char* to, NUMBER_FORM form) { return PutItemTag(to, ITEM_NUMBER, form); }
 
+// A set of forms, a bit for each.
+using NUMBER_FORMS = unsigned;
+constexpr NUMBER_FORMS FormBit(NUMBER_FORM form) { return 1u << form; }
+
 struct INTEGER_FORM
 {
     unsigned char size;

@@ -22,7 +22,6 @@ struct BINARY
         return HashOfBytes(static_cast<char const*>(value.data), value.size, seed);
     }
     static HASH HashOf(ENTRY const& entry, HASH) { return entry.hash; }
-    static bool MayBe(ENTRY const& entry, HASH hash) { return entry.hash == hash; }
     static bool Same(ENTRY const& entry, VALUE value)
     {
         return entry.view.size == value.size && SameBytes(static_cast<char const*>(entry.view.data),

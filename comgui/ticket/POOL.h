@@ -47,38 +47,4 @@ private:
     static constexpr std::size_t FirstSize = 1024;
     static constexpr std::size_t LargestSize = 16ul * 1024 * 1024;
 };
-
-// Lets a standard container take its nodes from a pool, which must outlive it.
-template <typename T>
-class POOL_ALLOCATOR
-{
-public:
-    using value_type = T;
-
-    explicit POOL_ALLOCATOR(POOL& pool) : m_pool(&pool) {}
-    template <typename U>
-    POOL_ALLOCATOR(POOL_ALLOCATOR<U> const& other) : m_pool(other.m_pool)
-    {
-    }
-
-    T* allocate(std::size_t count) { return static_cast<T*>(m_pool->Take(count * sizeof(T), alignof(T))); }
-    void deallocate(T*, std::size_t) {}
-
-    template <typename U>
-    bool operator==(POOL_ALLOCATOR<U> const& other) const
-    {
-        return m_pool == other.m_pool;
-    }
-    template <typename U>
-    bool operator!=(POOL_ALLOCATOR<U> const& other) const
-    {
-        return m_pool != other.m_pool;
-    }
-
-private:
-    template <typename U>
-    friend class POOL_ALLOCATOR;
-
-    POOL* m_pool;
-};
 }  // namespace comgui::detail

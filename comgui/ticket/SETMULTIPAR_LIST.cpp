@@ -4,10 +4,7 @@
 #include "comgui/foundation/number_bits.h"
 #include <algorithm>
 
-SETMULTIPAR_LIST::SETMULTIPAR_LIST(bool copyValues)
-    : m_copyValues(copyValues), m_records(comgui::detail::POOL_ALLOCATOR<SETMULTIPAR>(m_pool))
-{
-}
+SETMULTIPAR_LIST::SETMULTIPAR_LIST(bool copyValues) : m_copyValues(copyValues) {}
 
 SETMULTIPAR_LIST::~SETMULTIPAR_LIST() { freeTbl(); }
 
@@ -91,13 +88,17 @@ SETMULTIPAR* SETMULTIPAR_LIST::Table(bool sort)
 {
     if (sort && !m_isSorted)
         freeTbl();
-    if (m_table == nullptr && !m_records.empty())
+    if (m_table == nullptr && m_records.Size() != 0)
     {
-        if (sort)
-            m_records.sort();
-        m_table = new SETMULTIPAR[m_records.size() + 1];
-        m_isSorted = sort;  // of the table that is there now: if memory ran out above, none was built
-        *std::copy(m_records.begin(), m_records.end(), m_table) = SETMULTIPAR{};
+        m_table = new SETMULTIPAR[m_records.Size() + 1];
+        SETMULTIPAR* const end = m_records.CopyTo(m_table);
+        *end = SETMULTIPAR{};
+        m_isSorted = sort;
+        if (sort && !std::is_sorted(m_table, end))
+        {
+            std::stable_sort(m_table, end);
+            m_records.CopyFrom(m_table);
+        }
     }
     return m_table;
 }
@@ -105,7 +106,7 @@ SETMULTIPAR* SETMULTIPAR_LIST::Table(bool sort)
 void SETMULTIPAR_LIST::Clear()
 {
     freeTbl();
-    m_records.clear();
+    m_records.Clear();
     m_keyCache.clear();
     m_intCache.clear();
     m_unsignedCache.clear();

@@ -7,11 +7,12 @@
 #include "comgui/foundation/export.h"
 #include "comgui/ticket/BIN_STRING.h"
 #include "comgui/ticket/BIN_STRING_CACHE.h"
+#include "comgui/ticket/KEYCACHE.h"
 #include "comgui/ticket/POOL.h"
+#include "comgui/ticket/RECORD_BLOCKS.h"
 #include "comgui/ticket/SETMULTIPAR.h"
 #include "comgui/ticket/STRINGCACHE.h"
 #include "comgui/ticket/VALCACHE.h"
-#include <list>
 #include <string>
 #include <wx/string.h>
 
@@ -49,7 +50,7 @@ public:
     int DelParameter(char const* key, int pos);
 
     // Number of records.
-    unsigned long Size() const { return m_records.size(); }
+    unsigned long Size() const { return m_records.Size(); }
 
     // The table, null while the list is empty. It belongs to the list and dies at the next add, at Clear()
     // and at the next Table(true) that has to sort. sort: by key, bytewise, records of one key staying in
@@ -81,18 +82,14 @@ private:
     COMGUI_LOCAL void const* Cached(double value);
     int Add(char const* cachedKey, PARAM_TYPE type, void const* value, int pos)
     {
-        SETMULTIPAR& record = m_records.emplace_back();  // all zero, and filled in where it stands
-        record.key = cachedKey;
-        record.type = type;
-        record.value = value;
-        record.pos = pos;
+        m_records.Append(cachedKey, type, value, pos);
         if (m_table)
             freeTbl();
         return 1;
     }
 
     comgui::detail::POOL m_pool;  // of all that follows, and freed as a whole
-    STRINGCACHE m_keyCache{m_pool};
+    comgui::detail::KEYCACHE m_keyCache{m_pool};
     VALCACHE<int> m_intCache{m_pool};
     VALCACHE<unsigned int> m_unsignedCache{m_pool};
     VALCACHE<long long> m_int64Cache{m_pool};
@@ -102,6 +99,6 @@ private:
     BIN_STRING_CACHE m_binCache{m_pool};
     bool m_isSorted = false;  // the table was built after sorting
     bool const m_copyValues;
-    std::list<SETMULTIPAR, comgui::detail::POOL_ALLOCATOR<SETMULTIPAR>> m_records;
+    comgui::detail::RECORD_BLOCKS m_records{m_pool};
     SETMULTIPAR* m_table = nullptr;
 };

@@ -22,7 +22,6 @@ struct TEXT
 
     static HASH Hash(VALUE text, HASH seed) { return HashOfBytes(text.data(), text.size(), seed); }
     static HASH HashOf(ENTRY const& entry, HASH) { return entry.hash; }
-    static bool MayBe(ENTRY const& entry, HASH hash) { return entry.hash == hash; }
     static bool Same(ENTRY const& entry, VALUE text)
     {
         return entry.size == text.size() && SameBytes(entry.text, text.data(), text.size());

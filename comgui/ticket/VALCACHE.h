@@ -23,7 +23,6 @@ struct NUMBER
         return HashOfNumber(bits, seed);
     }
     static HASH HashOf(T number, HASH seed) { return Hash(number, seed); }
-    static bool MayBe(T, HASH) { return true; }  // to compare the numbers themselves is as quick
     static bool Same(T entry, T number) { return entry == number; }
     static T* Make(void* place, T number, HASH, POOL&) { return new (place) T(number); }
 };
@@ -44,6 +43,10 @@ public:
 
     // The address of the cached copy.
     T const* Keep(T number) { return &m_numbers.Keep(number); }
+
+    // Keep is about to be called for that number and for others: their searches then wait for the memory
+    // together.
+    void Expect(T number) const { m_numbers.Expect(number); }
 
     // Drops all numbers; every address given out dies.
     void clear()

@@ -7,11 +7,11 @@
 //   ENTRY                           what is kept, and stays where it is; its destructor is not run
 //   Hash(value, seed)               the same for equal values
 //   HashOf(entry, seed)             the same again
-//   MayBe(entry, hash)              false only if the entry's hash is another one
 //   Same(entry, value)
 //   Make(place, value, hash, pool)  the new entry, at that place
 #pragma once
 
+#include "comgui/foundation/short_compare.h"
 #include "comgui/ticket/POOL.h"
 #include <cstddef>
 #include <cstdint>
@@ -31,24 +31,6 @@ inline HASH Mix(HASH left, HASH right)
 }
 
 inline HASH HashOfNumber(HASH bits, HASH seed) { return Mix(bits ^ seed, 0x9E3779B97F4A7C15); }
-
-template <typename WORD>
-HASH LoadWord(char const* from)
-{
-    WORD word;
-    std::memcpy(&word, from, sizeof word);
-    return word;
-}
-
-// Texts of one ticket tend to begin alike, so the ends are compared first.
-inline bool SameBytes(char const* left, char const* right, std::size_t size)
-{
-    if (size < 8)
-        return size == 0 || std::memcmp(left, right, size) == 0;
-    std::size_t const end = size - 8;
-    return LoadWord<std::uint64_t>(left + end) == LoadWord<std::uint64_t>(right + end) &&
-           std::memcmp(left, right, end) == 0;
-}
 
 // Sixteen bytes a step; the last step looks at the last bytes, which may overlap those before.
 inline HASH HashOfBytes(char const* bytes, std::size_t size, HASH seed)
@@ -101,17 +83,29 @@ public:
         HASH const hash = KIND::Hash(value, m_seed);
         if (m_count == m_limit)
             Grow();
-        std::size_t const mask = m_slotCount - 1;
+        NUMBER const mask = SlotCount() - 1;
+        NUMBER const mark = MarkOf(hash);
         std::size_t at = hash & mask;
         for (; m_slots[at] != FreeSlot; at = (at + 1) & mask)
         {
-            ENTRY const& entry = *EntryAt(m_slots[at]);
-            if (KIND::MayBe(entry, hash) && KIND::Same(entry, value))
+            // An entry is far away; the mark in its slot says of most others that they are not meant.
+            NUMBER const number = m_slots[at] ^ mark;
+            if (number > mask)
+                continue;
+            ENTRY const& entry = *EntryAt(number);
+            if (KIND::Same(entry, value))
                 return *(m_last = &entry);
         }
         m_last = AddEntry(value, hash);
-        m_slots[at] = m_count;
+        m_slots[at] = mark | m_count;
         return *m_last;
+    }
+
+    // Asks for the memory that a search for the value begins in: it comes while others are asked for.
+    void Expect(VALUE value) const
+    {
+        if (m_slots)
+            __builtin_prefetch(&m_slots[KIND::Hash(value, m_seed) & (SlotCount() - 1)], 1);
     }
 
     // Forgets all values; every address given out dies. Their memory is the pool's to free.
@@ -120,20 +114,29 @@ public:
         m_last = nullptr;
         m_next = m_blockEnd = nullptr;
         m_count = 0;
-        m_slotCount = m_limit = 0;
+        m_limit = 0;
+        m_slots = nullptr;
+        m_slotBits = 0;
     }
 
 private:
-    using NUMBER = std::uint32_t;  // entries count from 1, half the size of their addresses
+    using NUMBER = std::uint32_t;  // entries count from 1
     static constexpr NUMBER FreeSlot = 0;
     static constexpr unsigned int FirstBlockBits = 4;
-    static constexpr std::size_t ManySlots = 65536;
+    static constexpr unsigned int FirstSlotBits = 5;
+    static constexpr unsigned int ManySlotBits = 16;
+    static constexpr NUMBER Ahead = 16;  // of a loop's step, for the memory to come in time
 
     // Entries stand in blocks of doubling size, so that none ever moves: the highest bit tells the block.
     static unsigned int BlockOf(NUMBER place)
     {
         return 31u - static_cast<unsigned int>(__builtin_clz(place));
     }
+
+    NUMBER SlotCount() const { return NUMBER(1) << m_slotBits; }
+
+    // What a slot holds above the bits of an entry's number: a part of its hash.
+    NUMBER MarkOf(HASH hash) const { return static_cast<NUMBER>(hash >> 32) << m_slotBits; }
 
     ENTRY* EntryAt(NUMBER number) const
     {
@@ -163,26 +166,32 @@ private:
     // Sparse slots are found sooner, as long as they all stay in the processor's cache.
     void Grow()
     {
-        if (m_count > UINT32_MAX / 4)
+        unsigned int const bits = !m_slots ? FirstSlotBits : m_slotBits + (m_slotBits < ManySlotBits ? 3 : 2);
+        if (bits > 31)
             throw std::bad_alloc();
-        std::size_t const slotCount = m_slotCount == 0 ? 32 : m_slotCount * (m_slotCount < ManySlots ? 8 : 4);
-        std::size_t const size = slotCount * sizeof(NUMBER);
+        std::size_t const size = (std::size_t(1) << bits) * sizeof(NUMBER);
         m_slots = static_cast<NUMBER*>(std::memset(m_pool.Take(size, alignof(NUMBER)), FreeSlot, size));
-        m_slotCount = slotCount;
-        m_limit = static_cast<NUMBER>(slotCount / (slotCount > ManySlots ? 2 : 3));
+        m_slotBits = bits;
+        m_limit = SlotCount() / (bits > ManySlotBits ? 2 : 3);
+        std::size_t const mask = SlotCount() - 1;
+        auto const hashOf = [&](NUMBER number) { return KIND::HashOf(*EntryAt(number), m_seed); };
         for (NUMBER number = 1; number <= m_count; ++number)
         {
-            std::size_t at = KIND::HashOf(*EntryAt(number), m_seed) & (slotCount - 1);
+            if (number + Ahead <= m_count)
+                __builtin_prefetch(&m_slots[hashOf(number + Ahead) & mask], 1);
+            HASH const hash = hashOf(number);
+            std::size_t at = hash & mask;
             while (m_slots[at] != FreeSlot)
-                at = (at + 1) & (slotCount - 1);
-            m_slots[at] = number;
+                at = (at + 1) & mask;
+            m_slots[at] = MarkOf(hash) | number;
         }
     }
 
     POOL& m_pool;
-    HASH const m_seed;            // differs from run to run, so that no stream makes all values fall together
-    NUMBER* m_slots = nullptr;    // the entry whose hash says this place or, if that is taken, one before
-    std::size_t m_slotCount = 0;  // a power of two, at least twice the entries
+    HASH const m_seed;  // differs from run to run, so that no stream makes all values fall together
+    // The number of the entry whose hash says this place or, if that is taken, one before; and its mark.
+    NUMBER* m_slots = nullptr;
+    unsigned int m_slotBits = 0;  // slots are a power of two, at least twice the entries
     ENTRY* m_blocks[32 - FirstBlockBits] = {};
     ENTRY* m_next = nullptr;  // where the next entry goes, unless the newest block is full
     ENTRY* m_blockEnd = nullptr;

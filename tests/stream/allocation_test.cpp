@@ -263,6 +263,7 @@ TEST(NoMemory, AddToAList_ThrowsAndLeavesTheRecordsAsTheyWere)
 {
     TABLE table(Sample);
     bool hasThrown = false;
+    int thrown = 0;
     int const failures = FailEachAllocation(
         [&]
         {
@@ -281,6 +282,7 @@ TEST(NoMemory, AddToAList_ThrowsAndLeavesTheRecordsAsTheyWere)
             catch (std::bad_alloc const&)
             {
                 hasThrown = true;
+                ++thrown;
             }
             FailingAllocation::Stop();
             for (std::size_t i = list.Size(); i < Sample.size(); ++i)
@@ -293,8 +295,10 @@ TEST(NoMemory, AddToAList_ThrowsAndLeavesTheRecordsAsTheyWere)
                              [](RECORD const& left, RECORD const& right) { return left.key < right.key; });
             EXPECT_TRUE(RecordsOf(list.Table(true)) == sorted);
         },
-        [&](bool hasHappened) { EXPECT_EQ(hasThrown, hasHappened); });
-    EXPECT_GT(failures, 3);
+        // A sort also asks for memory that it can do without.
+        [&](bool hasHappened) { EXPECT_LE(hasThrown, hasHappened); });
+    EXPECT_GT(thrown, 3);
+    EXPECT_GT(failures, thrown);
 }
 
 // The length of the texts shifts the place at which the list's memory comes to an end.

@@ -2,13 +2,11 @@
 
 #include <cstring>
 #include <gtest/gtest.h>
-#include <list>
 #include <new>
 #include <random>
 #include <vector>
 
 using comgui::detail::POOL;
-using comgui::detail::POOL_ALLOCATOR;
 
 namespace
 {
@@ -119,26 +117,4 @@ TEST_F(Pool, MoreThanThereIs_ThrowsAndChangesNothing)
     EXPECT_THROW(pool.Take(SIZE_MAX - 15, 16), std::bad_alloc);
     EXPECT_EQ(Take(8, 8), before + 8);
     ExpectAllUnspoilt();
-}
-
-TEST(POOL_ALLOCATOR, List_LivesInThePool)
-{
-    POOL pool;
-    std::list<int, POOL_ALLOCATOR<int>> list{POOL_ALLOCATOR<int>(pool)};
-    for (int i = 0; i < 10000; ++i)
-        list.push_front(i);
-    list.sort();
-    int expected = 0;
-    for (int const number : list)
-        ASSERT_EQ(number, expected++);
-    EXPECT_EQ(expected, 10000);
-}
-
-TEST(POOL_ALLOCATOR, OfOnePool_AreEqual)
-{
-    POOL pool;
-    POOL other;
-    EXPECT_TRUE(POOL_ALLOCATOR<int>(pool) == POOL_ALLOCATOR<double>(pool));
-    EXPECT_FALSE(POOL_ALLOCATOR<int>(pool) != POOL_ALLOCATOR<double>(pool));
-    EXPECT_TRUE(POOL_ALLOCATOR<int>(pool) != POOL_ALLOCATOR<int>(other));
 }
