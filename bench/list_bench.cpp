@@ -1,13 +1,15 @@
 // What it costs to gather records in a list and lay them out as a table, beside building a protobuf message
-// of the same records; and to ask a key filter about each key of a ticket, beside looking at each of its
-// patterns.
+// of the same records; and to ask a key filter about each key of a ticket, beside its rule in the plainest
+// form.
 #include "bench/peers/peer.h"
 #include "bench/ratio_report.h"
 
 #include <algorithm>
 #include <benchmark/benchmark.h>
 #include <iterator>
+#include <set>
 #include <string>
+#include <utility>
 #include <vector>
 
 namespace
@@ -27,62 +29,86 @@ void Build(benchmark::State& state, WORKLOAD& (*workload)(), std::unique_ptr<BUI
                            benchmark::Counter::kIsIterationInvariantRate | benchmark::Counter::kInvert);
 }
 
-// The keys of the system ticket, and 200 patterns: 160 sections as a whole, and 40 single keys of the others.
 struct FILTER_CASE
 {
-    std::vector<std::string> keys;
-    std::vector<std::string> patterns;
+    std::vector<std::string> keys;      // of the system ticket
+    std::vector<std::string> patterns;  // 200
+    long selected;                      // how many of the keys
 };
 
-FILTER_CASE MakeFilterCase()
+std::vector<std::string> SystemKeys()
 {
-    constexpr std::size_t Sections = 160;
-    constexpr std::size_t SingleKeys = 40;
-    FILTER_CASE made;
+    std::vector<std::string> keys;
     for (SETMULTIPAR const* record = SystemTicket().Table(); record->key; ++record)
-        made.keys.emplace_back(record->key);
-    std::size_t key = 0;
-    while (made.patterns.size() < Sections)
-    {
-        std::string const section = made.keys[key].substr(0, made.keys[key].rfind('/') + 1);
-        made.patterns.push_back(section + "*");
-        while (made.keys[key].starts_with(section))
-            ++key;
-    }
-    for (std::size_t i = 0; i < SingleKeys; ++i)
-        made.patterns.push_back(made.keys[key + i * 11]);
-    return made;
+        keys.emplace_back(record->key);
+    return keys;
 }
 
-FILTER_CASE const& FilterCase()
+std::string SectionOf(std::string const& key) { return key.substr(0, key.rfind('/') + 1); }
+
+// Most keys are selected: 160 sections of 15 keys as a whole, and 40 single keys of the others.
+FILTER_CASE const& Sections()
 {
-    static FILTER_CASE const made = MakeFilterCase();
+    static FILTER_CASE const made = []
+    {
+        FILTER_CASE sections{SystemKeys(), {}, 160 * 15 + 40};
+        std::size_t key = 0;
+        while (sections.patterns.size() < 160)
+        {
+            std::string const section = SectionOf(sections.keys[key]);
+            sections.patterns.push_back(section + "*");
+            while (sections.keys[key].starts_with(section))
+                ++key;
+        }
+        for (std::size_t i = 0; i < 40; ++i)
+            sections.patterns.push_back(sections.keys[key + i * 11]);
+        return sections;
+    }();
     return made;
 }
 
-// The rule of the filter, with nothing but a look at one pattern after the other.
-class LINEAR_FILTER
+// Most keys are not: 120 single keys, 40 that no ticket has, and 40 sections.
+FILTER_CASE const& SingleKeys()
+{
+    static FILTER_CASE const made = []
+    {
+        FILTER_CASE singles{SystemKeys(), {}, 0};
+        std::size_t const step = singles.keys.size() / 200;
+        for (std::size_t i = 0; i < 200; ++i)
+        {
+            std::string const& key = singles.keys[i * step];
+            singles.patterns.push_back(i % 5 < 3 ? key : i % 5 < 4 ? key + "Extra" : SectionOf(key) + "*");
+        }
+        singles.selected = 40 * 15 + 80;  // two of three single keys stand in no section of the table
+        return singles;
+    }();
+    return made;
+}
+
+// A set of keys, and one of prefixes that takes a text and its beginning for one.
+class PLAIN_FILTER
 {
 public:
-    explicit LINEAR_FILTER(std::vector<std::string> const& patterns)
+    explicit PLAIN_FILTER(std::vector<std::string> const& patterns)
     {
         for (std::string const& pattern : patterns)
             if (pattern.ends_with('*'))
-                prefixes.push_back(pattern.substr(0, pattern.size() - 1));
+                prefixes.insert(pattern.substr(0, pattern.size() - 1));
             else
-                keys.push_back(pattern);
+                keys.insert(pattern);
     }
 
     bool multi_contains(std::string const& key) const
     {
-        return std::find(keys.begin(), keys.end(), key) != keys.end() ||
-               std::any_of(prefixes.begin(), prefixes.end(),
-                           [&](std::string const& prefix) { return key.starts_with(prefix); });
+        if (keys.find(key) != keys.end())
+            return true;
+        auto const prefix = prefixes.find(key);
+        return prefix != prefixes.end() && prefix->size() <= key.size();
     }
 
 private:
-    std::vector<std::string> keys;
-    std::vector<std::string> prefixes;
+    std::set<std::string> keys;
+    std::set<std::string, STRINGPREFIXSET::LESS> prefixes;
 };
 
 PARTIAL_MODE MakePartialMode(std::vector<std::string> const& patterns)
@@ -105,15 +131,14 @@ std::vector<bool> Answers(FILTER const& filter, std::vector<std::string> const& 
 }
 
 template <typename FILTER>
-void Contains(benchmark::State& state, FILTER (*make)(std::vector<std::string> const&))
+void Contains(benchmark::State& state, FILTER_CASE const& (*filterCase)(),
+              FILTER (*make)(std::vector<std::string> const&))
 {
-    FILTER_CASE const& filterCase = FilterCase();
-    std::vector<std::string> const& keys = filterCase.keys;
-    FILTER filter = make(filterCase.patterns);
-    // 160 sections of 15 keys, and 40 keys more.
+    auto const& [keys, patterns, selected] = filterCase();
+    FILTER filter = make(patterns);
     std::vector<bool> const answers = Answers(filter, keys);
-    if (std::count(answers.begin(), answers.end(), true) != 160 * 15 + 40 ||
-        answers != Answers(LINEAR_FILTER(filterCase.patterns), keys))
+    if (std::count(answers.begin(), answers.end(), true) != selected ||
+        answers != Answers(PLAIN_FILTER(patterns), keys))
         return state.SkipWithError("the filter does not select what it should");
     for (auto _ : state)
         for (std::string const& key : keys)
@@ -132,15 +157,21 @@ int main(int argc, char** argv)
     benchmark::RegisterBenchmark("Build/system/comgui", Build, SystemTicket, MakeComguiBuilder);
     benchmark::RegisterBenchmark("Build/system/protobuf", Build, SystemTicket, MakeProtobufBuilder);
     benchmark::RegisterBenchmark("Build/system/protobuf_heap", Build, SystemTicket, MakeProtobufHeapBuilder);
-    benchmark::RegisterBenchmark("Contains/prefix200/comgui", Contains<PARTIAL_MODE>, MakePartialMode);
-    benchmark::RegisterBenchmark("Contains/prefix200/linear", Contains<LINEAR_FILTER>,
-                                 [](std::vector<std::string> const& patterns)
-                                 { return LINEAR_FILTER(patterns); });
+    for (auto const& [name, filterCase] : {std::pair("sections", &Sections), std::pair("keys", &SingleKeys)})
+    {
+        std::string const contains = std::string("Contains/") + name;
+        benchmark::RegisterBenchmark((contains + "/comgui").c_str(), Contains<PARTIAL_MODE>, filterCase,
+                                     MakePartialMode);
+        benchmark::RegisterBenchmark((contains + "/plain").c_str(), Contains<PLAIN_FILTER>, filterCase,
+                                     [](std::vector<std::string> const& patterns)
+                                     { return PLAIN_FILTER(patterns); });
+    }
     return RunAndReport(
         argc, argv,
         {{"build, job ticket", "Build/job/comgui", "Build/job/protobuf_heap", 0.35},
          {"build, job ticket", "Build/job/comgui", "Build/job/protobuf", 0.35},
          {"build, system ticket", "Build/system/comgui", "Build/system/protobuf_heap", 0.40},
          {"build, system ticket", "Build/system/comgui", "Build/system/protobuf", 0.40},
-         {"key filter, 200 patterns", "Contains/prefix200/comgui", "Contains/prefix200/linear", 0.65}});
+         {"key filter, most selected", "Contains/sections/comgui", "Contains/sections/plain", 0.35},
+         {"key filter, few selected", "Contains/keys/comgui", "Contains/keys/plain", 0.35}});
 }
