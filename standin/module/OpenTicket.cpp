@@ -21,10 +21,16 @@ bool ReadTable(TicketService& tickets, Session const& session, TicketAddress add
         return false;
     auto const answer = [&](TicketSnapshot const& ticket, KeyFilter const* limit)
     {
+        KeyValues const* values = nullptr;
+        char const* known = nullptr;
         for (GETMULTIPAR* record = table; record->key; ++record)
         {
-            std::string_view const key = record->key;
-            KeyValues const* const values = !limit || limit->Selects(key) ? ticket.Find(key) : nullptr;
+            if (record->key != known)  // the records of a list share its key
+            {
+                known = record->key;
+                std::string_view const key = known;
+                values = !limit || limit->Selects(key) ? ticket.Find(key) : nullptr;
+            }
             record->ok =
                 values && ReadValue(*values, record->type, record->value, record->pos, session.Reader());
         }
