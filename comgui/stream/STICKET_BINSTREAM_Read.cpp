@@ -295,7 +295,7 @@ private:
     static constexpr NUMBER_FORMS Integers =
         FormBit(NUMBER_ZERO) | FormBit(NUMBER_INT8) | FormBit(NUMBER_INT16) | FormBit(NUMBER_INT32);
     static constexpr NUMBER_FORMS Doubles = FormBit(NUMBER_SINGLE) | FormBit(NUMBER_DOUBLE);
-    static constexpr std::size_t Together = 32;
+    static constexpr std::size_t Together = 64;
 
     SETMULTIPAR_LIST* const m_list;
     IMPORT_INTERN m_cursor;
