@@ -45,7 +45,7 @@ FOLDER_INDEX::FOLDER_INDEX(std::span<FOLDER_MAPPING const> mappings)
         m_sizes.push_back(folder.size());
     }
     std::ranges::sort(m_sizes);
-    m_sizes.erase(std::ranges::unique(m_sizes).begin(), m_sizes.end());
+    m_sizes.erase(std::unique(m_sizes.begin(), m_sizes.end()), m_sizes.end());
 }
 
 FOLDER_MAPPING const* FOLDER_INDEX::Holding(std::string_view path) const
