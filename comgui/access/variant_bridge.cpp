@@ -23,10 +23,11 @@ enum class KIND
     OTHER,
 };
 
-bool IsOfClass(wxVariant const& variant, std::type_info const& itsClass)
+// The class of what the variant holds; null if it holds nothing.
+std::type_info const* ClassOf(wxVariant const& variant)
 {
     wxVariantData const* const data = variant.GetData();
-    return data && typeid(*data) == itsClass;
+    return data ? &typeid(*data) : nullptr;
 }
 
 KIND KindOf(wxVariant const& variant)
@@ -34,8 +35,9 @@ KIND KindOf(wxVariant const& variant)
     static wchar_t const* const names[] = {L"bool",   L"double",    L"list", L"long",
                                            L"string", L"arrstring", L"void*"};
     // Most values are texts. The name of a type is a text that has to be made, a class is just there.
-    static wxVariant const aText{wxString()};
-    if (IsOfClass(variant, typeid(*aText.GetData())))
+    static std::type_info const* const classOfTexts = ClassOf(wxVariant(wxString()));
+    std::type_info const* const itsClass = ClassOf(variant);
+    if (itsClass && *itsClass == *classOfTexts)
         return KIND::STRING;
     wxString const type = variant.GetType();
     int kind = 0;
