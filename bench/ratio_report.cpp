@@ -3,7 +3,9 @@
 #include <algorithm>
 #include <benchmark/benchmark.h>
 #include <cstdio>
+#include <cstdlib>
 #include <map>
+#include <memory>
 
 namespace
 {
@@ -13,6 +15,22 @@ double Median(std::vector<double> values)
     std::size_t const half = values.size() / 2;
     return values.size() % 2 ? values[half] : (values[half - 1] + values[half]) / 2;
 }
+
+// Of the runs of both sides, one by one.
+double Spread(std::vector<double> const& ours, std::vector<double> const& peer)
+{
+    std::vector<double> ratios;
+    for (std::size_t i = 0; i < std::min(ours.size(), peer.size()); ++i)
+        ratios.push_back(ours[i] / peer[i]);
+    std::sort(ratios.begin(), ratios.end());
+    std::size_t const quarter = ratios.size() / 4;
+    return ratios[ratios.size() - 1 - quarter] - ratios[quarter];
+}
+
+struct CLOSE
+{
+    void operator()(std::FILE* file) const { std::fclose(file); }
+};
 
 class REPORTER : public benchmark::ConsoleReporter
 {
@@ -29,14 +47,15 @@ public:
                 Take(run);
     }
 
-    void Print(std::vector<GOAL> const& goals) const
+    // file: for the figures, or null.
+    void Print(std::vector<GOAL> const& goals, char const* program, std::FILE* file) const
     {
 #ifndef NDEBUG
         std::puts("\nNot an optimised build: these ratios say nothing about the goals.");
 #endif
-        std::puts("\n| measure | ours | peer | ratio | goal | met |\n|---|---|---|---|---|---|");
+        std::puts("\n| measure | ours | peer | ratio | spread | goal | met |\n|---|---|---|---|---|---|---|");
         for (GOAL const& goal : goals)
-            Print(goal);
+            Print(goal, program, file);
     }
 
     bool Failed() const { return failed; }
@@ -70,7 +89,7 @@ private:
         return values.empty() ? nullptr : &values;
     }
 
-    void Print(GOAL const& goal) const
+    void Print(GOAL const& goal, char const* program, std::FILE* file) const
     {
         std::vector<double> const* const ours = Values(goal.ours, goal.kind);
         std::vector<double> const* const peer = Values(goal.peer, goal.kind);
@@ -78,10 +97,15 @@ private:
             return;
         bool const isAdded = goal.kind == GOAL::ADDED_TIME;
         double const result = isAdded ? Median(*ours) - Median(*peer) : Median(*ours) / Median(*peer);
-        char const* const form = isAdded ? "| %s | %s %.4g %s | %s %.4g %s | +%.2f ns | +%.2f ns | %s |\n"
-                                         : "| %s | %s %.4g %s | %s %.4g %s | %.3f | %.2f | %s |\n";
+        double const spread = isAdded ? 0 : Spread(*ours, *peer);
+        char const* const form = isAdded
+                                     ? "| %s | %s %.4g %s | %s %.4g %s | +%.2f ns | %.0f | +%.2f ns | %s |\n"
+                                     : "| %s | %s %.4g %s | %s %.4g %s | %.3f | %.3f | %.2f | %s |\n";
         std::printf(form, goal.measure, goal.ours.c_str(), Median(*ours), Unit(goal), goal.peer.c_str(),
-                    Median(*peer), Unit(goal), result, goal.most, result <= goal.most ? "yes" : "NO");
+                    Median(*peer), Unit(goal), result, spread, goal.most, result <= goal.most ? "yes" : "NO");
+        if (file && !isAdded)
+            std::fprintf(file, "%s\t%s\t%s\t%.4f\t%.4f\t%.3f\t%s\n", program, goal.ours.c_str(),
+                         goal.peer.c_str(), result, spread, goal.most, goal.measure);
     }
 
     static char const* Unit(GOAL const& goal) { return goal.kind == GOAL::BYTES_A_RECORD ? "bytes" : "ns"; }
@@ -93,12 +117,17 @@ private:
 
 int RunAndReport(int argc, char** argv, std::vector<GOAL> const& goals)
 {
+    std::string const program = std::string(argv[0]).substr(std::string(argv[0]).rfind('/') + 1);
     benchmark::Initialize(&argc, argv);
     if (benchmark::ReportUnrecognizedArguments(argc, argv))
         return 1;
     REPORTER reporter;
     benchmark::RunSpecifiedBenchmarks(&reporter);
     benchmark::Shutdown();
-    reporter.Print(goals);
-    return reporter.Failed() ? 1 : 0;
+    char const* const path = std::getenv("COMGUI_BENCH_FIGURES");
+    std::unique_ptr<std::FILE, CLOSE> const file(path ? std::fopen(path, "a") : nullptr);
+    if (path && !file)
+        std::fprintf(stderr, "%s: cannot be written\n", path);
+    reporter.Print(goals, program.c_str(), file.get());
+    return reporter.Failed() || (path && !file) ? 1 : 0;
 }

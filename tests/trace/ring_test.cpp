@@ -3,7 +3,9 @@
 
 #include "comgui/testing/TemporaryFolder.h"
 #include <atomic>
+#include <filesystem>
 #include <gtest/gtest.h>
+#include <iterator>
 #include <map>
 #include <thread>
 #include <vector>
@@ -142,6 +144,21 @@ TEST_F(Ring, TheSwitch_IsSharedWithOthers)
     EXPECT_TRUE(ring->IsOn());
     ring->Switch(false);
     EXPECT_FALSE(other->IsOn());
+}
+
+TEST_F(Ring, MadeOrOpened_KeepsNoFileOpen)
+{
+    auto const openFiles = []
+    {
+        std::filesystem::directory_iterator const files("/proc/self/fd");
+        return std::distance(begin(files), end(files));
+    };
+    auto const before = openFiles();
+    auto const made = TraceRing::Make(folder.Path() / "another.ring");
+    auto const opened = TraceRing::Open(file);
+    EXPECT_FALSE(TraceRing::Open(folder.Write("short", "CGRING_1")));
+    EXPECT_TRUE(made && opened);
+    EXPECT_EQ(openFiles(), before);
 }
 
 TEST_F(Ring, WhatIsNoRing_IsNotOpened)
