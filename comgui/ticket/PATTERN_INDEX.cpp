@@ -89,16 +89,20 @@ private:
     bool m_holdsPrefixes = true;
 };
 
-PATTERN_INDEX& PATTERN_INDEX::operator=(PATTERN_INDEX const&) noexcept
+PATTERN_INDEX& PATTERN_INDEX::operator=(PATTERN_INDEX const& other) noexcept
 {
-    Drop();
+    if (this != &other)
+        Drop();
     return *this;
 }
 
 PATTERN_INDEX& PATTERN_INDEX::operator=(PATTERN_INDEX&& other) noexcept
 {
-    other.Drop();
-    Drop();
+    if (this != &other)
+    {
+        other.Drop();
+        Drop();
+    }
     return *this;
 }
 
