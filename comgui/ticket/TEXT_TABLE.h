@@ -46,7 +46,7 @@ public:
 
     // count: how many texts there will be at most. Throws std::bad_alloc.
     explicit TEXT_TABLE(std::size_t count)
-        : m_slots(std::bit_ceil(SlotsEach * (count + 1))), m_mask(m_slots.size() - 1),
+        : m_slots(std::bit_ceil(SlotsEach * count)), m_mask(m_slots.size() - 1),
           m_seed(Mix(reinterpret_cast<std::uintptr_t>(m_slots.data()), 0xD6E8FEB86659FD93))
     {
     }
