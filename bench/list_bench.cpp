@@ -79,7 +79,7 @@ FILTER_CASE const& SingleKeys()
             std::string const& key = singles.keys[i * step];
             singles.patterns.push_back(i % 5 < 3 ? key : i % 5 < 4 ? key + "Extra" : SectionOf(key) + "*");
         }
-        singles.selected = 40 * 15 + 80;  // two of three single keys stand in no section of the table
+        singles.selected = 40 * 15 + 120;  // each stands in a section of its own
         return singles;
     }();
     return made;
