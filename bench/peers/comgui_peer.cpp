@@ -56,6 +56,12 @@ public:
         return STICKET_BINSTREAM::Read(list, bytes.data(), bytes.size(), false) ? list.Size() : 0;
     }
 
+    std::shared_ptr<void> Keep(std::string_view bytes) override
+    {
+        auto list = std::make_shared<SETMULTIPAR_LIST>(false);
+        return STICKET_BINSTREAM::Read(*list, bytes.data(), bytes.size(), false) ? list : nullptr;
+    }
+
     std::size_t Build(SETMULTIPAR const* table) override
     {
         SETMULTIPAR_LIST list(false);

@@ -171,6 +171,8 @@ public:
         return message ? static_cast<std::size_t>(ippGetCount(ippFirstAttribute(message.get()))) : 0;
     }
 
+    std::shared_ptr<void> Keep(std::string_view bytes) override { return Parsed(bytes); }
+
     void Tell(std::string_view bytes, COMPARISON& comparison) override
     {
         IPP const message = Parsed(bytes);

@@ -98,6 +98,14 @@ public:
         return Unpack(zone, bytes).via.map.size;
     }
 
+    std::shared_ptr<void> Keep(std::string_view bytes) override
+    {
+        auto zone = std::make_shared<msgpack::zone>();
+        return Unpack(*zone, bytes).via.map.size != 0 ? zone : nullptr;
+    }
+
+    bool KeepsBytes() const override { return true; }
+
     void Tell(std::string_view bytes, COMPARISON& comparison) override
     {
         msgpack::zone zone;

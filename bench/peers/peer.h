@@ -20,6 +20,13 @@ public:
     // which is more than 0.
     virtual std::size_t Read(std::string_view bytes) = 0;
 
+    // The same, to be kept: what a client would look at lives as long as the result, and so must bytes if the
+    // format refers to them. Null if nothing was found.
+    virtual std::shared_ptr<void> Keep(std::string_view bytes) = 0;
+
+    // Whether what is read refers to the bytes that it was read from.
+    virtual bool KeepsBytes() const { return false; }
+
     // Reads bytes and tells each value to comparison.
     virtual void Tell(std::string_view bytes, COMPARISON& comparison) = 0;
 };
@@ -44,7 +51,6 @@ std::unique_ptr<PEER> MakeProtobufHeap();
 std::unique_ptr<PEER> MakeProtobufEachHeap();
 std::unique_ptr<PEER> MakeMsgpack();
 std::unique_ptr<PEER> MakeIpp();
-std::unique_ptr<PEER> MakeCbor();
 
 std::unique_ptr<BUILDER> MakeComguiBuilder();
 std::unique_ptr<BUILDER> MakeProtobufBuilder();

@@ -158,6 +158,17 @@ public:
         return WithTicket([&](peers::Ticket& ticket) { return Parse(ticket, bytes); });
     }
 
+    std::shared_ptr<void> Keep(std::string_view bytes) override
+    {
+        if (!inArena)
+        {
+            auto ticket = std::make_shared<peers::Ticket>();
+            return Parse(*ticket, bytes) ? ticket : nullptr;
+        }
+        auto arena = std::make_shared<Arena>();
+        return Parse(*Arena::CreateMessage<peers::Ticket>(arena.get()), bytes) ? arena : nullptr;
+    }
+
     std::size_t Build(SETMULTIPAR const* table) override
     {
         return WithTicket(

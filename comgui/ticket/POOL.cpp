@@ -28,9 +28,8 @@ void* POOL::TakeFromANewBlock(std::size_t size)
     char* const bytes = NewBlock(m_nextSize)->Bytes();
     m_free = bytes + size;
     m_left = m_nextSize - size;
-    // In fours: all blocks together are then little more than the newest, which an allocator that gives
-    // memory back to the system by the size of what is freed at once keeps for the next pool.
-    m_nextSize = std::min(m_nextSize * 4, LargestSize);
+    // Larger steps would be fewer, but keep twice the memory that is used.
+    m_nextSize = std::min(m_nextSize * 2, LargestSize);
     return bytes;
 }
 
