@@ -150,8 +150,8 @@ Result<User> Client::LogIn(Server const& server, Account const& account)
     lock.unlock();
 
     m_switch.Await(m_switch.Ask(), SwitchPatience);
-    m_nextEntry = {};
-    m_entryPause = std::chrono::seconds(1);
+    m_entry = {};
+    m_switching = {};
     try
     {
         m_watch = std::thread([this] { Watch(); });
@@ -401,6 +401,7 @@ void Client::Look(ComGUIManager& watcher)
         m_isServerThere = true;
         if (!isThere)
             m_hub->Publish(ServerBack{false});
+        SwitchAgain();
         return;
     }
     Error const& error = answer.GetError();
@@ -430,17 +431,22 @@ void Client::NoteRefusal(Error error)
         m_hub->Publish(ServerLost{std::move(error)});
 }
 
+// Who was refused once would hear nothing for the rest of the session.
+void Client::SwitchAgain()
+{
+    if (!m_switch.IsRefused())
+        m_switching = {};
+    else if (m_switching.IsDue())
+        m_switch.Ask();
+}
+
 // With growing pauses: servers answer ever later whom they have refused often. The old session ends when
 // there is a new one, since tickets may still be read in it, and through the watcher, since a logout by the
 // manager gives the local port away.
 std::optional<Outcome> Client::EnterAgain(ComGUIManager& watcher)
 {
-    constexpr std::chrono::seconds LongestPause(60);
-    auto const now = std::chrono::steady_clock::now();
-    if (now < m_nextEntry)
+    if (!m_entry.IsDue())
         return std::nullopt;
-    m_nextEntry = now + m_entryPause;
-    m_entryPause = std::min(2 * m_entryPause, LongestPause);
     {
         std::lock_guard const lock(m_calls);
         TLogin old = *m_record;
@@ -453,7 +459,7 @@ std::optional<Outcome> Client::EnterAgain(ComGUIManager& watcher)
         if (!entered)
             return entered;
     }
-    m_entryPause = std::chrono::seconds(1);
+    m_entry = {};
     m_switch.Await(m_switch.Ask(), SwitchPatience);
     return Outcome();
 }

@@ -5,6 +5,7 @@
 // under none of them.
 #pragma once
 
+#include "comgui/client/Attempts.h"
 #include "comgui/client/Connection.h"
 #include "comgui/client/EventHub.h"
 #include "comgui/client/Manager.h"
@@ -87,6 +88,7 @@ private:
     void NoteLoss(Error error);
     void NoteRefusal(Error error);
     std::optional<Outcome> EnterAgain(ComGUIManager& watcher);
+    void SwitchAgain();
 
     std::shared_ptr<EventHub> const m_hub = std::make_shared<EventHub>();
     std::shared_ptr<TransferPool> m_pool;
@@ -114,8 +116,8 @@ private:
     std::thread m_watch;
 
     // The watch's own.
-    int m_loss = 0;                        // the code of the last loss that was reported
-    std::chrono::seconds m_entryPause{1};  // after a login that was refused; grows
-    std::chrono::steady_clock::time_point m_nextEntry{};
+    int m_loss = 0;    // the code of the last loss that was reported
+    Attempts m_entry;  // to log in anew
+    Attempts m_switching;
 };
 }  // namespace comgui::detail

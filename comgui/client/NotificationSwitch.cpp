@@ -14,6 +14,8 @@ void NotificationSwitch::BeginSession(MTICKET_ACCESS const* container, int notif
     m_container = container;
     m_notification = notification;
     m_enabled.clear();
+    m_refused.clear();
+    m_isRefused = false;
     m_isLeaving = false;
 }
 
@@ -35,7 +37,7 @@ void NotificationSwitch::Switch()
     waiting.unlock();
     Wanted const wanted = Union(m_hub.Interests());
     auto unheard = SwitchOff(wanted);
-    SwitchOn(wanted);
+    unheard.merge(SwitchOn(wanted));
     waiting.lock();
     bool const isLate = m_late > std::exchange(m_done, turn);
     m_served.notify_all();
@@ -144,8 +146,11 @@ std::set<TicketAddress> NotificationSwitch::SwitchOff(Wanted const& wanted)
     return unheard;
 }
 
-void NotificationSwitch::SwitchOn(Wanted const& wanted)
+// Gives what went on that was refused before, and was not heard of meanwhile.
+std::set<TicketAddress> NotificationSwitch::SwitchOn(Wanted const& wanted)
 {
+    std::set<TicketAddress> unheard;
+    std::set<TicketAddress> refused;
     auto const* const admin = m_container ? MTICKET_ADMIN::Of(m_container) : nullptr;
     for (auto const& [address, keys] : wanted)
     {
@@ -153,15 +158,23 @@ void NotificationSwitch::SwitchOn(Wanted const& wanted)
         if (known != m_enabled.end() && known->second == keys)
             continue;
         if (!admin || m_isLeaving)
-            return;
+            return unheard;
         std::vector<char const*> table;
         for (std::string const& key : keys)
             table.push_back(key.c_str());
         table.push_back(nullptr);
         if (!admin->EnableNotification(address.type, address.id, m_notification, table.data()))
+        {
+            refused.insert(address);
             continue;
+        }
         m_enabled[address] = keys;
         m_news.insert(address);
+        if (m_refused.count(address) != 0)
+            unheard.insert(address);
     }
+    m_refused = std::move(refused);
+    m_isRefused = !m_refused.empty();
+    return unheard;
 }
 }  // namespace comgui::detail

@@ -43,6 +43,10 @@ public:
     std::uint64_t Ask();
     void Await(std::uint64_t turn, std::chrono::milliseconds patience);
 
+    // Whether the plug-in has refused something that is wanted: Ask asks it again, and subscribers are told
+    // of what it takes then, like those who lost their patience.
+    bool IsRefused() const { return m_isRefused; }
+
     // For good: ends its thread. What waits there is dropped, and nobody waits any more.
     void Stop();
 
@@ -53,17 +57,19 @@ private:
     void Switch();
     static Wanted Union(std::vector<Interest> const& interests);
     std::set<TicketAddress> SwitchOff(Wanted const& wanted);
-    void SwitchOn(Wanted const& wanted);
+    std::set<TicketAddress> SwitchOn(Wanted const& wanted);
     void Serve(std::uint64_t turn);
 
     EventHub& m_hub;
     std::atomic<bool> m_isLeaving{false};
+    std::atomic<bool> m_isRefused{false};
 
     std::mutex m_switching;  // held while the plug-in is called; the members below
     MTICKET_ACCESS const* m_container = nullptr;
     int m_notification = -1;
     Wanted m_enabled;
-    std::set<TicketAddress> m_news;  // switched on for a turn that is not done yet, maybe
+    std::set<TicketAddress> m_refused;  // by the plug-in, the last time
+    std::set<TicketAddress> m_news;     // switched on for a turn that is not done yet, maybe
 
     std::mutex m_waiting;  // taken after the one above; the members below
     std::condition_variable m_served;

@@ -126,7 +126,9 @@ int SwitchNotification(void* instance, int type, int id, int notification, bool 
     ++trouble->switchesBegun;
     for (int i = 0; trouble->switchingStands && i < 20000; ++i)
         std::this_thread::sleep_for(std::chrono::milliseconds(1));
-    int const result = real.MENDISNOTIF(instance, type, id, notification, isOn, keys);
+    int const result = isOn && Take(trouble->refusedSwitches)
+                           ? 0
+                           : real.MENDISNOTIF(instance, type, id, notification, isOn, keys);
     ++trouble->switchesDone;
     return result;
 }

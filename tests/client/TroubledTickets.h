@@ -10,6 +10,7 @@ struct TICKET_TROUBLE
 {
     std::atomic<bool> sessionIsOver{false};    // for every slot
     std::atomic<int> refusedOpens{0};          // so many
+    std::atomic<int> refusedSwitches{0};       // of notifications, on; likewise
     std::atomic<int> refusedWalks{0};          // over the keys of a ticket; likewise
     std::atomic<bool> walksNeverEnd{false};    // over tickets and keys, until the action ends them
     std::atomic<bool> bytesAreEndless{false};  // of the walks over keys: one value more of an impossible size

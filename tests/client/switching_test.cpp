@@ -109,6 +109,45 @@ TEST_F(SlowSwitching, IsToldToAllWhoHaveNotWaitedForIt)
     EXPECT_THAT(Changes(2), ElementsAre("whole ticket", "whole ticket"));
 }
 
+TEST_F(SlowSwitching, ThatIsRefused_IsTriedAgain_AndNoChangeGoesUnnoticed)
+{
+    trouble.tickets.refusedSwitches = 1;
+    auto const subscription = Subscribe(Interest::InTickets({job}));
+    ASSERT_TRUE(tickets.Write(job, "A", 1));
+    EXPECT_THAT(Changes(1), ElementsAre("whole ticket"));
+    ASSERT_TRUE(tickets.Write(job, "B", 1));
+    EXPECT_THAT(Changes(2), ElementsAre("whole ticket", "B"));
+}
+
+TEST_F(SlowSwitching, ThatIsRefusedInANewSession_IsTriedAgain)
+{
+    auto const subscription = Subscribe(Interest::InTickets({job}));
+    trouble.tickets.refusedSwitches = 1;
+    ASSERT_TRUE(connection.LogOut());
+    LogIn();
+    EXPECT_THAT(Changes(1), ElementsAre("whole ticket"));
+}
+
+TEST_F(SlowSwitching, ThatIsAlwaysRefused_IsTriedMoreAndMoreSeldom)
+{
+    trouble.tickets.refusedSwitches = 1000;
+    auto const subscription = Subscribe(Interest::InTickets({job}));
+    std::this_thread::sleep_for(4500ms);
+    EXPECT_GE(trouble.tickets.switchesBegun, 3);
+    EXPECT_LE(trouble.tickets.switchesBegun,
+              4);  // at 0, within the first second, one and three seconds later
+}
+
+TEST_F(SlowSwitching, ThatWasRefused_IsNotTriedForWhoIsGone)
+{
+    trouble.tickets.refusedSwitches = 1000;
+    Subscribe(Interest::InTickets({job})).End();
+    Await([this] { return trouble.tickets.switchesBegun > 0; });
+    int const begun = trouble.tickets.switchesBegun;
+    std::this_thread::sleep_for(2500ms);
+    EXPECT_EQ(trouble.tickets.switchesBegun, begun);
+}
+
 TEST_F(SlowSwitching, HoldsNoEndOfASubscriptionUp)
 {
     auto subscription = Subscribe(Interest::InTickets({job}));
