@@ -104,8 +104,15 @@ private:
         std::printf(form, goal.measure, goal.ours.c_str(), Median(*ours), Unit(goal), goal.peer.c_str(),
                     Median(*peer), Unit(goal), result, spread, goal.most, result <= goal.most ? "yes" : "NO");
         if (file && !isAdded)
-            std::fprintf(file, "%s\t%s\t%s\t%.4f\t%.4f\t%.3f\t%s\n", program, goal.ours.c_str(),
-                         goal.peer.c_str(), result, spread, goal.most, goal.measure);
+            std::fprintf(file, "%s\t%s\t%s\t%.4f\t%.4f\t%.3f\n", program, goal.measure,
+                         LastName(goal.peer).c_str(), result, spread, goal.most);
+    }
+
+    // Without the benchmark's argument.
+    static std::string LastName(std::string const& path)
+    {
+        std::size_t const end = path.find_last_not_of("/0123456789") + 1;
+        return path.substr(0, end).substr(path.rfind('/', end - 1) + 1);
     }
 
     static char const* Unit(GOAL const& goal) { return goal.kind == GOAL::BYTES_A_RECORD ? "bytes" : "ns"; }

@@ -28,7 +28,7 @@ inline constexpr char BytesARecord[] = "bytes_a_record";
 // the medians, if --benchmark_repetitions asks for several runs, and then with their spread: how far the
 // ratios of single runs lie apart, without the upper and the lower quarter of them. Goals of which a side did
 // not run are left out. COMGUI_BENCH_FIGURES in the environment: a file that gets a line for each goal, its
-// fields separated by tabs: the program, both benchmarks, the ratio, its spread, the goal, the measure. To be
-// returned from main: 0, or 1 if the command line is wrong or a benchmark ended with an error; a goal that is
-// not met is no error, since the machine may be busy.
+// fields separated by tabs: the program, the measure, the last part of the peer's name (no argument), the
+// ratio, its spread, the goal. To be returned from main: 0, or 1 if the command line is wrong or a benchmark
+// ended with an error; a goal that is not met is no error, since the machine may be busy.
 int RunAndReport(int argc, char** argv, std::vector<GOAL> const& goals);

@@ -72,10 +72,8 @@ bool ReadWxArray(Slots const& slots, char const* key, wxArrayString& out)
     std::vector<wxString> texts;
     if (!ReadTexts(slots, key, texts))
         return false;
-    std::size_t next = out.size();
-    out.Add(wxString(), texts.size());
-    for (wxString& text : texts)
-        out[next++].swap(text);
+    for (wxString const& text : texts)
+        out.push_back(text);  // where a sorted array wants it
     return !out.empty();
 }
 

@@ -1,4 +1,4 @@
-// Compares a few bytes in line, as short_copy.h copies them.
+// Loads, compares and searches a few bytes in line, as short_copy.h copies them.
 #pragma once
 
 #include <cstddef>
@@ -43,7 +43,8 @@ inline bool SameBytes(char const* left, char const* right, std::size_t size)
     return size == 0 || *left == *right;
 }
 
-// Whether a byte of the word is 0: of the others, none takes away what it needs from the one above.
+// Whether a byte of the word is 0. To take 1 from every byte borrows from the next one only where a byte is
+// 0.
 template <typename WORD>
 bool HoldsZero(char const* from)
 {

@@ -3,7 +3,6 @@
 #include "comgui/session/ComGUIManager.h"
 
 #include "comgui/access/FromUtf8.h"
-
 #include "comgui/ticket/TICKET_ID.h"
 
 namespace

@@ -177,7 +177,7 @@ private:
     };
 
     COMGUI_LOCAL unsigned char TakeTag(unsigned long& size);
-    COMGUI_LOCAL bool TakeNumberTag(unsigned forms, unsigned long& size);
+    COMGUI_LOCAL bool TakeNumberTag(unsigned int forms, unsigned long& size);
     COMGUI_LOCAL int TakeInteger(unsigned long size);
     COMGUI_LOCAL double TakeDouble(unsigned long size);
     COMGUI_LOCAL std::string_view TakeKey(unsigned long size, bool compressed);

@@ -80,9 +80,10 @@ public:
     bool multi_contains(std::string_view key) const;
 
 private:
+    comgui::detail::PATTERN_INDEX
+        m_index;  // of both below; stands first, so that an assignment drops it first
     std::set<std::string, std::less<>> m_keys;
     STRINGPREFIXSET m_prefixes;
-    comgui::detail::PATTERN_INDEX m_index;  // of both, to be dropped before they change
 };
 
 // Adds the parameters that mode selects to a list, in the course of one walk; mode and list must outlive it.

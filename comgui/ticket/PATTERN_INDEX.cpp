@@ -13,18 +13,17 @@ namespace comgui::detail
 class PATTERN_INDEX::TABLE
 {
 public:
-    TABLE(KEYS const& keys, STRINGPREFIXSET const& prefixes) : m_patterns(keys.size() + prefixes.size())
+    TABLE(KEYS const& keys, STRINGPREFIXSET const& prefixes)
+        : m_sizes(SizesOf(prefixes)), m_holdsPrefixes(m_sizes.size() <= MostSizes),
+          m_patterns(keys.size() + (m_holdsPrefixes ? prefixes.size() : 0))
     {
-        for (std::string const& prefix : prefixes)
-            AddSize(prefix);
-        m_holdsPrefixes = m_sizes.size() <= MostSizes;
-        if (!m_holdsPrefixes)
-            m_sizes.clear();
-        else
-            for (std::string const& prefix : prefixes)
-                Add(prefix, PREFIX);
         for (std::string const& key : keys)
             Add(key, WHOLE);
+        if (m_holdsPrefixes)
+            for (std::string const& prefix : prefixes)
+                Add(prefix, PREFIX);
+        else
+            m_sizes.clear();
     }
 
     // With prefixes of too many sizes, to look for each size would take longer than the set of them.
@@ -64,13 +63,19 @@ private:
     // Prefixes mostly end at a separator, and keys mostly have none there: so few are looked for.
     static BYTES LastByte(std::string_view text) { return BYTES(1) << (text.empty() ? 0 : text.back() & 63); }
 
-    void AddSize(std::string const& prefix)
+    // The smallest first, and one more than MostSizes at most.
+    static std::vector<SIZE> SizesOf(STRINGPREFIXSET const& prefixes)
     {
-        auto const place = std::ranges::lower_bound(m_sizes, prefix.size(), {}, &SIZE::size);
-        if (place != m_sizes.end() && place->size == prefix.size())
-            place->lastBytes |= LastByte(prefix);
-        else if (m_sizes.size() <= MostSizes)
-            m_sizes.insert(place, {prefix.size(), LastByte(prefix)});
+        std::vector<SIZE> sizes;
+        for (std::string const& prefix : prefixes)
+        {
+            auto const place = std::ranges::lower_bound(sizes, prefix.size(), {}, &SIZE::size);
+            if (place != sizes.end() && place->size == prefix.size())
+                place->lastBytes |= LastByte(prefix);
+            else if (sizes.size() <= MostSizes)
+                sizes.insert(place, {prefix.size(), LastByte(prefix)});
+        }
+        return sizes;
     }
 
     void Add(std::string const& pattern, KIND kind)
@@ -84,25 +89,21 @@ private:
         return m_patterns.Find(text, hash ^ kind) != TEXT_TABLE::None;
     }
 
+    std::vector<SIZE> m_sizes;  // of the prefixes that it holds
+    bool m_holdsPrefixes;
     TEXT_TABLE m_patterns;
-    std::vector<SIZE> m_sizes;  // of the prefixes, the smallest first
-    bool m_holdsPrefixes = true;
 };
 
-PATTERN_INDEX& PATTERN_INDEX::operator=(PATTERN_INDEX const& other) noexcept
+PATTERN_INDEX& PATTERN_INDEX::operator=(PATTERN_INDEX const&) noexcept  // NOLINT(cert-oop54-cpp)
 {
-    if (this != &other)
-        Drop();
+    Drop();
     return *this;
 }
 
 PATTERN_INDEX& PATTERN_INDEX::operator=(PATTERN_INDEX&& other) noexcept
 {
-    if (this != &other)
-    {
-        other.Drop();
-        Drop();
-    }
+    other.Drop();
+    Drop();
     return *this;
 }
 
@@ -133,6 +134,7 @@ PATTERN_INDEX::TABLE const* PATTERN_INDEX::Table(KEYS const& keys, STRINGPREFIXS
     }
     catch (std::bad_alloc const&)  // the sets have the answer, too
     {
+        m_asked.store(0, std::memory_order_relaxed);
     }
     return table;
 }

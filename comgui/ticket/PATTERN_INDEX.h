@@ -26,13 +26,15 @@ public:
     // It points into the patterns of its own filter, so another one begins without.
     PATTERN_INDEX(PATTERN_INDEX const&) noexcept {}
     PATTERN_INDEX(PATTERN_INDEX&& other) noexcept { other.Drop(); }
-    PATTERN_INDEX& operator=(PATTERN_INDEX const&) noexcept;
+    // Assigned to itself, too: a set that is moved to itself may be empty then.
+    PATTERN_INDEX& operator=(PATTERN_INDEX const&) noexcept;  // NOLINT(cert-oop54-cpp)
     PATTERN_INDEX& operator=(PATTERN_INDEX&& other) noexcept;
 
     // To be called before the patterns change.
     void Drop() noexcept;
 
-    // Whether one of the patterns selects the key: those of the last call, unless Drop() came between.
+    // Whether one of the patterns selects the key. They are those of the call before, unless Drop() was
+    // called since.
     bool Selects(std::string_view key, KEYS const& keys, STRINGPREFIXSET const& prefixes) const;
 
 private:

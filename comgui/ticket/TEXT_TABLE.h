@@ -55,28 +55,29 @@ public:
     // texts can be made that all fall together.
     HASH Seed() const { return m_seed; }
 
-    // Of equal texts the first one is found. number: not None.
+    // Of equal texts the first one stays. number: not None.
     void Add(std::string_view text, HASH hash, std::size_t number)
     {
-        std::size_t at = hash & m_mask;
-        while (m_slots[at].number != None)
-            at = (at + 1) & m_mask;
-        m_slots[at] = {hash, text, number};
+        std::size_t const place = PlaceOf(text, hash);
+        if (m_slots[place].number == None)
+            m_slots[place] = {hash, text, number};
     }
 
     // The number of the text, or None.
-    std::size_t Find(std::string_view text, HASH hash) const
-    {
-        std::size_t at = hash & m_mask;
-        for (; m_slots[at].number != None; at = (at + 1) & m_mask)
-            if (m_slots[at].hash == hash && m_slots[at].text == text)
-                break;
-        return m_slots[at].number;
-    }
+    std::size_t Find(std::string_view text, HASH hash) const { return m_slots[PlaceOf(text, hash)].number; }
 
 private:
-    static constexpr std::size_t SlotsEach =
-        4;  // most of what is looked for is not there: a free slot says so
+    // Most of what is looked for is not there: a free slot says so.
+    static constexpr std::size_t SlotsEach = 4;
+
+    // The slot of the text, or the free one where it belongs.
+    std::size_t PlaceOf(std::string_view text, HASH hash) const
+    {
+        std::size_t at = hash & m_mask;
+        while (m_slots[at].number != None && (m_slots[at].hash != hash || m_slots[at].text != text))
+            at = (at + 1) & m_mask;
+        return at;
+    }
 
     struct SLOT
     {

@@ -347,6 +347,19 @@ TYPED_TEST(TextArray, ReadOfNothingButNullTexts_IsFalseAndLeavesTheArray)
     EXPECT_THAT(this->array, ElementsAre("old"));
 }
 
+// Its push_back puts a text where it belongs in the order.
+TEST(WxTextArray, ReadIntoASortedOne_KeepsItSortedAndWhole)
+{
+    LISTS<SINGLE> ticket;
+    ticket.Store("a", -1);
+    ticket.Store("d", 1);
+    wxSortedArrayString array;
+    array.Add("c");
+    array.Add("b");
+    EXPECT_TRUE(ticket.GetWxArray(static_cast<wxArrayString&>(array)));
+    EXPECT_THAT(array, ElementsAre("a", "b", "c", "d"));
+}
+
 TYPED_TEST(TextArray, WriteOfARecordThatFails_IsFalse)
 {
     this->ticket.fake.FailPosition(1);

@@ -134,3 +134,13 @@ TEST(FOLDER_INDEX, RandomFolders_HoldWhatTheRuleSays)
         ASSERT_EQ(Holding(mappings, path), expected) << path;
     }
 }
+
+TEST(TEXT_TABLE, EqualTexts_TakeOneSlot)
+{
+    TEXT_TABLE table(1);
+    HASH const hash = HashOfBytes("a", 1, table.Seed());
+    for (std::size_t i = 0; i < 100; ++i)
+        table.Add("a", hash, i);
+    EXPECT_EQ(table.Find("a", hash), 0u);
+    EXPECT_EQ(table.Find("b", hash), TEXT_TABLE::None);
+}

@@ -5,6 +5,7 @@
 #include <memory>
 #include <random>
 #include <string>
+#include <string_view>
 
 using namespace comgui::detail;
 
@@ -28,8 +29,22 @@ std::string Filtered(FILTER_BYTES* filter, std::string const& table, std::string
     return std::string(out.get(), filter(table.data(), in.get(), text.size(), out.get()));
 }
 
-class FilterBytes : public testing::TestWithParam<FILTER_BYTES*>
+struct FORM
 {
+    char const* name;
+    FILTER_BYTES* filter;
+};
+
+class FilterBytes : public testing::TestWithParam<FORM>
+{
+protected:
+    void SetUp() override
+    {
+        if (IsWide() && GetParam().filter == FilterBytesOneByOne)
+            GTEST_SKIP() << "this processor has no wide form";
+    }
+
+    static bool IsWide() { return std::string_view(GetParam().name) == "Wide"; }
 };
 
 std::mt19937 generator(7);
@@ -60,7 +75,7 @@ TEST_P(FilterBytes, GivesTheEntriesThatAreNot0)
         for (std::size_t size = 0; size < 300; ++size)
         {
             std::string const text = Text(size);
-            ASSERT_EQ(Filtered(GetParam(), table, text), Appended(table, text)) << size;
+            ASSERT_EQ(Filtered(GetParam().filter, table, text), Appended(table, text)) << size;
         }
     }
 }
@@ -73,9 +88,11 @@ TEST_P(FilterBytes, LooksUpEachOfThe256Bytes)
     for (int round = 0; round < 50; ++round)
     {
         std::string const table = Table(10);
-        ASSERT_EQ(Filtered(GetParam(), table, text), Appended(table, text));
+        ASSERT_EQ(Filtered(GetParam().filter, table, text), Appended(table, text));
     }
 }
 
-// On a machine without the wide form both are the same.
-INSTANTIATE_TEST_SUITE_P(Forms, FilterBytes, testing::Values(FilterBytesOneByOne, QuickestFilterBytes()));
+INSTANTIATE_TEST_SUITE_P(Forms, FilterBytes,
+                         testing::Values(FORM{"OneByOne", FilterBytesOneByOne},
+                                         FORM{"Wide", QuickestFilterBytes()}),
+                         [](auto const& form) { return std::string(form.param.name); });

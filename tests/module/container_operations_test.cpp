@@ -2,6 +2,7 @@
 #include "tests/module/NotificationListener.h"
 
 #include <gmock/gmock.h>
+#include <iterator>
 #include <thread>
 
 using testing::ElementsAre;
@@ -85,6 +86,25 @@ TEST_F(OpenTickets, ReadAndWriteTheTicketOfTheContainer)
     EXPECT_EQ(ticket->SGETMULTIPAR(ticket->Instance, reads), 1);
     EXPECT_TRUE(reads[0].ok);
     EXPECT_EQ(read, 9);
+}
+
+// Records may name keys in any order, at one address or at many.
+TEST_F(OpenTickets, ReadATableWhoseRecordsNameKeysInTurn)
+{
+    auto const* const ticket = other.Open(3, 1);
+    ASSERT_TRUE(ticket);
+    ASSERT_TRUE(WriteInt(ticket, "Test/A", 1));
+    ASSERT_TRUE(WriteInt(ticket, "Test/B", 2));
+    std::string const sameText = "Test/A";
+    char const* const keys[] = {"Test/A", "Test/B", "Test/A", sameText.c_str(), "Test/None", "Test/B"};
+    int values[std::size(keys)] = {};
+    std::vector<GETMULTIPAR> reads;
+    for (std::size_t i = 0; i < std::size(keys); ++i)
+        reads.push_back({keys[i], PARAM_INT, 0, &values[i], -1, false, {}});
+    reads.push_back({});
+    EXPECT_EQ(ticket->SGETMULTIPAR(ticket->Instance, reads.data()), 1);
+    EXPECT_THAT(values, ElementsAre(1, 2, 1, 1, 0, 2));
+    EXPECT_FALSE(reads[4].ok);
 }
 
 TEST_F(OpenTickets, OfOneSession_HaveOneTableEach)

@@ -19,6 +19,17 @@ struct SMALL_STREAM
 // Says what it holds instead of its bytes.
 void PrintTo(SMALL_STREAM const& stream, std::ostream* out) { *out << stream.name; }
 
+// A vector that is longer than what the reader takes at once, of integers and then doubles.
+std::vector<RECORD> ManyNumbers()
+{
+    std::vector<RECORD> records;
+    for (int pos = 0; pos < 66; ++pos)
+        records.push_back(Int("n", pos % 7 ? 50 - pos : 40000, pos));
+    for (int pos = 66; pos < 133; ++pos)
+        records.push_back(Double("n", pos % 9 ? pos / 2.0 : 0.1, pos));
+    return records;
+}
+
 class BrokenStream : public testing::TestWithParam<SMALL_STREAM>
 {
 protected:
@@ -51,6 +62,7 @@ INSTANTIATE_TEST_SUITE_P(
                                  {Int("n", 0, 0), Int("n", 1, 1), Int("n", 1000, 2), Int("n", 100000, 3),
                                   Double("n", 0.5, 4), Double("n", 0.1, 5), Int64("n", 9007199254740993, 6),
                                   Unsigned64("n", 1ull << 63, 7)}},
+                    SMALL_STREAM{"OfManyNumbers", ManyNumbers()},
                     SMALL_STREAM{"OfTexts",
                                  {Text("", "under no key"), Text("Texts", "", 0),
                                   Text("Text", "a text of 20 bytes..", 20),

