@@ -158,10 +158,10 @@ int main(int argc, char** argv)
           GOAL::BYTES_A_RECORD},
          {"bytes a record, system ticket", "Write/system/comgui", "Write/system/msgpack", 0.49,
           GOAL::BYTES_A_RECORD},
-         {"memory, job ticket", "Keep/job/comgui", "Keep/job/msgpack", 1.75, GOAL::BYTES_A_RECORD},
-         {"memory, job ticket", "Keep/job/comgui", "Keep/job/protobuf_heap", 1.30, GOAL::BYTES_A_RECORD},
-         {"memory, system ticket", "Keep/system/comgui", "Keep/system/msgpack", 1.20, GOAL::BYTES_A_RECORD},
-         {"memory, system ticket", "Keep/system/comgui", "Keep/system/protobuf_heap", 1.00,
+         {"memory, job ticket", "Keep/job/comgui", "Keep/job/msgpack", 2.5, GOAL::BYTES_A_RECORD},
+         {"memory, job ticket", "Keep/job/comgui", "Keep/job/protobuf_heap", 1.8, GOAL::BYTES_A_RECORD},
+         {"memory, system ticket", "Keep/system/comgui", "Keep/system/msgpack", 2.5, GOAL::BYTES_A_RECORD},
+         {"memory, system ticket", "Keep/system/comgui", "Keep/system/protobuf_heap", 1.6,
           GOAL::BYTES_A_RECORD},
-         {"memory, big vector", "Keep/vector/comgui", "Keep/vector/msgpack", 1.20, GOAL::BYTES_A_RECORD}});
+         {"memory, big vector", "Keep/vector/comgui", "Keep/vector/msgpack", 1.4, GOAL::BYTES_A_RECORD}});
 }

@@ -64,6 +64,16 @@ function(comgui_describe_build)
     set(CMAKE_REQUIRED_LIBRARIES comgui_wxwidgets)
     set(CMAKE_EXTRA_INCLUDE_FILES wx/string.h)
     check_type_size(wxString COMGUI_SIZEOF_WXSTRING LANGUAGE CXX)
+    set(sizes)
+    set(CMAKE_EXTRA_INCLUDE_FILES string vector list set map)
+    foreach(container "std::string" "std::vector<int>" "std::list<int>" "std::set<std::string>"
+            "std::map<std::string, int>")
+        string(MAKE_C_IDENTIFIER "COMGUI_SIZEOF_${container}" variable)
+        check_type_size("${container}" ${variable} LANGUAGE CXX)
+        list(APPEND sizes ${${variable}})
+    endforeach()
+    list(JOIN sizes ", " sizes)
+    set(COMGUI_CONTAINER_SIZES ${sizes} PARENT_SCOPE)
     check_cxx_source_compiles("#include <string>\n#ifndef _LIBCPP_VERSION\n#error\n#endif\nint main() {}"
         COMGUI_USES_LIBCPP)
     if(COMGUI_USES_LIBCPP)
@@ -87,6 +97,7 @@ write_basic_package_version_file(${PROJECT_BINARY_DIR}/comgui-config-version.cma
     COMPATIBILITY SameMinorVersion)    # before 1.0.0 every minor version may break
 install(FILES ${PROJECT_BINARY_DIR}/comgui-config.cmake ${PROJECT_BINARY_DIR}/comgui-config-version.cmake
     ${PROJECT_BINARY_DIR}/comgui-check.cpp ${PROJECT_SOURCE_DIR}/cmake/ComGUIWxWidgets.cmake
+    ${PROJECT_SOURCE_DIR}/cmake/ComGUIWxWidgets-check.cpp
     ${PROJECT_SOURCE_DIR}/cmake/ComGUIModule.cmake ${PROJECT_SOURCE_DIR}/cmake/ComGUIModule.plist.in
     DESTINATION ${COMGUI_PACKAGE_DIR})
 install(EXPORT comgui-targets NAMESPACE comgui:: DESTINATION ${COMGUI_PACKAGE_DIR})

@@ -10,7 +10,6 @@
 #include "comgui/access/STICKET_READ.h"
 #include "comgui/access/list_templates.h"
 #include "comgui/folders/FolderVariables.h"
-#include "comgui/folders/clFOLDER_VARIABLES.h"
 #include "comgui/folders/clSETMULTIPAR_FOLDER_VARIABLES.h"
 #include "comgui/foundation/CharSets.h"
 #include "comgui/foundation/MathLib.h"
@@ -50,3 +49,4 @@
 #include "comgui/ticket/TICKET_ID.h"
 #include "comgui/ticket/TICKET_OP.h"
 #include "comgui/ticket/VALCACHE.h"
+#include "comgui/ticket/clFOLDER_VARIABLES.h"

@@ -1,7 +1,7 @@
 #include "fuzz/ModuleCaller.h"
 
-#include "comgui/folders/clFOLDER_VARIABLES.h"
 #include "comgui/ticket/TICKET_ID.h"
+#include "comgui/ticket/clFOLDER_VARIABLES.h"
 #include "standin/server/tickets/TicketXml.h"
 #include <climits>
 

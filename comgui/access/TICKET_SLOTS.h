@@ -3,10 +3,10 @@
 // What a table slot returns does not count: success stands in each record's ok.
 #pragma once
 
-#include "comgui/folders/clFOLDER_VARIABLES.h"
 #include "comgui/ticket/MTICKET_ACCESS.h"
 #include "comgui/ticket/STICKET_ACCESS.h"
 #include "comgui/ticket/TICKET_ID.h"
+#include "comgui/ticket/clFOLDER_VARIABLES.h"
 
 namespace comgui::detail
 {
@@ -68,37 +68,37 @@ struct MTICKET_SLOTS
 // A read of one value. A slot that fails gives the default, whatever it did to the variable; one that
 // succeeds without writing gives zero.
 template <typename Value, typename Slots>
-Value Read(Slots const& slots, PARAM_TYPE type, int pos, char const* key, Value def)
+Value Read(Slots const& ticket, PARAM_TYPE type, int pos, char const* key, Value def)
 {
     Value value{};
-    return slots.Get(key, type, &value, pos) ? value : def;
+    return ticket.Get(key, type, &value, pos) ? value : def;
 }
 
 // Tickets know no bool: 0 and any other int stand for it.
 template <typename Slots>
-bool ReadBool(Slots const& slots, int pos, char const* key, bool def)
+bool ReadBool(Slots const& ticket, int pos, char const* key, bool def)
 {
-    return Read<int>(slots, PARAM_INT, pos, key, def ? 1 : 0) != 0;
+    return Read<int>(ticket, PARAM_INT, pos, key, def ? 1 : 0) != 0;
 }
 
 // The stored type; PARAM_NONE (0) also where nothing is stored.
 template <typename Slots>
-int ReadType(Slots const& slots, char const* key, int pos)
+int ReadType(Slots const& ticket, char const* key, int pos)
 {
-    return Read<int>(slots, PARAM_NONE, pos, key, PARAM_NONE);
+    return Read<int>(ticket, PARAM_NONE, pos, key, PARAM_NONE);
 }
 
 // How many values the key holds; 0 where there is no such key.
 template <typename Slots>
-unsigned long ReadCount(Slots const& slots, char const* key)
+unsigned long ReadCount(Slots const& ticket, char const* key)
 {
-    return Read(slots, PARAM_COUNT, -1, key, 0ul);
+    return Read(ticket, PARAM_COUNT, -1, key, 0ul);
 }
 
 // A write of one number, by address.
 template <typename Slots, typename Value>
-int Write(Slots const& slots, char const* key, PARAM_TYPE type, Value value, int pos)
+int Write(Slots const& ticket, char const* key, PARAM_TYPE type, Value value, int pos)
 {
-    return slots.Set(key, type, &value, pos);
+    return ticket.Set(key, type, &value, pos);
 }
 }  // namespace comgui::detail

@@ -1,31 +1,31 @@
 #include "comgui/access/decode.h"
 
 #include "comgui/access/FromUtf8.h"
-#include "comgui/folders/folder_paths.h"
+#include "comgui/ticket/folder_variables.h"
 
 namespace comgui::detail
 {
 template <typename Slots>
-wxString Decode(Slots const& slots, char const* value)
+wxString Decode(Slots const& ticket, char const* value)
 {
     if (!value)
         return wxString();
     if (NeedsDecode(value))
-        if (clFOLDER_VARIABLES const* const folders = slots.GetFolderVariables())
+        if (clFOLDER_VARIABLES const* const folders = ticket.GetFolderVariables())
             return FromUtf8(folders->Decode(value, false).c_str());
     return FromUtf8(value);
 }
 
 template <typename Slots>
-bool ReadText(Slots const& slots, char const* key, wxString& value, int pos)
+bool ReadText(Slots const& ticket, char const* key, wxString& value, int pos)
 {
     char const* text = nullptr;
-    if (!slots.Get(key, PARAM_STRING, &text, pos))
+    if (!ticket.Get(key, PARAM_STRING, &text, pos))
     {
         value.clear();  // what a caller overlooks must not look like a value of this ticket
         return false;
     }
-    Decode(slots, text).swap(value);
+    Decode(ticket, text).swap(value);
     return true;
 }
 

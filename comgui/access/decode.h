@@ -10,9 +10,9 @@ namespace comgui::detail
 // UTF-8 as the host sees it; null is the empty text. The ticket is asked for its translator only when the
 // text needs one, and then every time anew; without a translator $(...) stays.
 template <typename Slots>
-wxString Decode(Slots const& slots, char const* value);
+wxString Decode(Slots const& ticket, char const* value);
 
 // Reads a text and decodes it. A failed read empties value and gives false.
 template <typename Slots>
-bool ReadText(Slots const& slots, char const* key, wxString& value, int pos);
+bool ReadText(Slots const& ticket, char const* key, wxString& value, int pos);
 }  // namespace comgui::detail

@@ -71,9 +71,9 @@ void DropFailed(List& list, READ_TABLE const& table)
 }  // namespace
 
 template <typename T, typename Slots, typename List>
-bool ReadList(Slots const& slots, char const* key, List& out)
+bool ReadList(Slots const& ticket, char const* key, List& out)
 {
-    unsigned long const count = ReadCount(slots, key);
+    unsigned long const count = ReadCount(ticket, key);
     if (count == 0)
         return false;
     READ_TABLE const table(NewGetMultipar(count, key, GetParamType<T>()));
@@ -81,33 +81,33 @@ bool ReadList(Slots const& slots, char const* key, List& out)
         return false;
     MakeRoom(out, count);
     Fill(table, &out[0], count, Place<T>);
-    slots.GetTable(table.get());
+    ticket.GetTable(table.get());
     DropFailed(out, table);
     return !out.empty();
 }
 
 template <typename T, typename Slots>
-bool ReadArray(Slots const& slots, char const* key, T* out, unsigned long count)
+bool ReadArray(Slots const& ticket, char const* key, T* out, unsigned long count)
 {
     if (count == 0)
         return false;
     READ_TABLE const table(NewGetMultipar(count, key, GetParamType<T>()));
     Fill(table, out, count, Place<T>);
-    slots.GetTable(table.get());
+    ticket.GetTable(table.get());
     return AllMultiParameterOk(table.get());
 }
 
 template <typename T, typename Slots>
-bool WriteList(Slots const& slots, char const* key, T const* in, unsigned long count)
+bool WriteList(Slots const& ticket, char const* key, T const* in, unsigned long count)
 {
     if (count == 0)
     {
-        slots.Set(key, PARAM_NONE, nullptr, -1);
+        ticket.Set(key, PARAM_NONE, nullptr, -1);
         return true;
     }
     WRITE_TABLE const table(NewSetMultipar(count, key, GetParamType<T>()));
     Fill(table, in, count, Word<T>);
-    slots.SetTable(table.get());
+    ticket.SetTable(table.get());
     return AllMultiParameterOk(table.get());
 }
 

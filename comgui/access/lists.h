@@ -14,12 +14,12 @@ struct FREE
 
 // List: a std::vector<T>, or for int a wxArrayInt.
 template <typename T, typename Slots, typename List>
-bool ReadList(Slots const& slots, char const* key, List& out);
+bool ReadList(Slots const& ticket, char const* key, List& out);
 
 template <typename T, typename Slots>
-bool ReadArray(Slots const& slots, char const* key, T* out, unsigned long count);
+bool ReadArray(Slots const& ticket, char const* key, T* out, unsigned long count);
 
 // Vector or array, number or pointer.
 template <typename T, typename Slots>
-bool WriteList(Slots const& slots, char const* key, T const* in, unsigned long count);
+bool WriteList(Slots const& ticket, char const* key, T const* in, unsigned long count);
 }  // namespace comgui::detail

@@ -9,13 +9,13 @@ namespace comgui::detail
 {
 // GetWxVariantParameterChk.
 template <typename Slots>
-bool ReadVariant(Slots const& slots, char const* key, wxVariant& value, int pos);
+bool ReadVariant(Slots const& ticket, char const* key, wxVariant& value, int pos);
 
 // GetWxVariantParameterDef.
 template <typename Slots>
-wxVariant ReadVariantLike(Slots const& slots, wxVariant const& def, int pos);
+wxVariant ReadVariantLike(Slots const& ticket, wxVariant const& def, int pos);
 
 // SetWxVariantParameter.
 template <typename Slots>
-bool WriteVariant(Slots const& slots, char const* key, wxVariant const& value, int pos);
+bool WriteVariant(Slots const& ticket, char const* key, wxVariant const& value, int pos);
 }  // namespace comgui::detail

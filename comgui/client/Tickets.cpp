@@ -3,7 +3,8 @@
 #include "comgui/access/MTICKET_READ.h"
 #include "comgui/client/Client.h"
 #include "comgui/client/SlotValue.h"
-#include "comgui/folders/clFOLDER_VARIABLES.h"
+#include "comgui/ticket/clFOLDER_VARIABLES.h"
+#include "comgui/ticket/folder_variables.h"
 #include <array>
 #include <deque>
 #include <limits>
@@ -32,8 +33,6 @@ clFOLDER_VARIABLES const* FoldersOf(MTICKET_ACCESS const* container)
     return folders;
 }
 
-bool MayBeVariable(std::string const& text) { return text.size() >= 4 && text[0] == '$' && text[1] == '('; }
-
 bool MayBeAbsolute(std::string const& text)
 {
     return !text.empty() && (text[0] == '/' || text[0] == '\\' || (text.size() > 2 && text[1] == ':'));
@@ -41,7 +40,7 @@ bool MayBeAbsolute(std::string const& text)
 
 void Resolve(clFOLDER_VARIABLES const* folders, std::string& text)
 {
-    if (folders && MayBeVariable(text))
+    if (folders && detail::NeedsDecode(text))
         text = folders->Decode(text, false);
 }
 
@@ -51,7 +50,7 @@ void MakePortable(clFOLDER_VARIABLES const* folders, std::string& text)
     if (!folders || !MayBeAbsolute(text))
         return;
     std::string portable = folders->Encode(text);
-    if (MayBeVariable(portable) && folders->Decode(portable, false) == text)
+    if (detail::NeedsDecode(portable) && folders->Decode(portable, false) == text)
         text = std::move(portable);
 }
 

@@ -3,7 +3,7 @@
 #pragma once
 
 #include "comgui/folders/FOLDER_MAPPING.h"
-#include "comgui/ticket/TEXT_TABLE.h"
+#include "comgui/foundation/TEXT_TABLE.h"
 #include <span>
 #include <string_view>
 #include <vector>

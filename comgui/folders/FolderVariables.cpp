@@ -1,7 +1,7 @@
 #include "comgui/folders/FolderVariables.h"
 
-#include "comgui/folders/Variables.h"
 #include "comgui/folders/clFOLDER_VARIABLES_IMP.h"
+#include "comgui/ticket/folder_variables.h"
 #include <cstring>
 
 using comgui::detail::FOLDER_VARIABLE;

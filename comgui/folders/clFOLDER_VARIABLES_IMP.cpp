@@ -2,10 +2,10 @@
 
 #include "comgui/access/MTICKET_READ.h"
 #include "comgui/access/STICKET_READ.h"
-#include "comgui/folders/Variables.h"
 #include "comgui/folders/clSETMULTIPAR_FOLDER_VARIABLES.h"
 #include "comgui/folders/folder_paths.h"
 #include "comgui/foundation/CharSets.h"
+#include "comgui/ticket/folder_variables.h"
 #include <algorithm>
 #include <string_view>
 

@@ -5,9 +5,9 @@
 
 #include "comgui/folders/FOLDER_INDEX.h"
 #include "comgui/folders/FOLDER_MAPPING.h"
-#include "comgui/folders/clFOLDER_VARIABLES.h"
 #include "comgui/foundation/SysLib.h"
 #include "comgui/ticket/MTICKET_ACCESS.h"
+#include "comgui/ticket/clFOLDER_VARIABLES.h"
 #include <optional>
 #include <string>
 #include <vector>

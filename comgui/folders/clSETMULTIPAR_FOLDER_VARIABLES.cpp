@@ -1,7 +1,7 @@
 #include "comgui/folders/clSETMULTIPAR_FOLDER_VARIABLES.h"
 
-#include "comgui/folders/clFOLDER_VARIABLES.h"
 #include "comgui/ticket/STRINGCACHE.h"
+#include "comgui/ticket/clFOLDER_VARIABLES.h"
 #include <cstdlib>
 #include <cstring>
 #include <string>

@@ -7,10 +7,10 @@
 #include "comgui/access/MTICKET_READ.h"
 #include "comgui/access/STICKET_MODIFY.h"
 #include "comgui/folders/FolderVariables.h"
-#include "comgui/folders/clFOLDER_VARIABLES.h"
 #include "comgui/session/SetDataHolder.h"
 #include "comgui/ticket/MultiParList.h"
 #include "comgui/ticket/SETMULTIPAR_LIST.h"
+#include "comgui/ticket/clFOLDER_VARIABLES.h"
 
 namespace
 {

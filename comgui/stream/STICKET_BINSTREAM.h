@@ -165,15 +165,7 @@ private:
 
         // The only bounds check of the reader, and the only place that moves the cursor. The size is compared
         // with what is left; a size from the stream is never added to an address first.
-        unsigned char const* Take(unsigned long size)
-        {
-            if (size > left)
-                throw "Unexpected EOF";
-            left -= size;
-            unsigned char const* const taken = address;
-            address += size;
-            return taken;
-        }
+        unsigned char const* Take(unsigned long size);
     };
 
     COMGUI_LOCAL unsigned char TakeTag(unsigned long& size);

@@ -1,6 +1,7 @@
 #include "comgui/foundation/utf8func.h"
 #include "comgui/stream/STICKET_BINSTREAM.h"
 #include "comgui/stream/ticket_items.h"
+#include "comgui/ticket/LIST_CONTENTS.h"
 #include "comgui/ticket/SETMULTIPAR_LIST.h"
 #include <algorithm>
 #include <array>
@@ -9,6 +10,16 @@
 #include <utility>
 
 using namespace comgui::detail;
+
+inline unsigned char const* STICKET_BINSTREAM::IMPORT_INTERN::BYTES::Take(unsigned long size)
+{
+    if (size > left)
+        throw "Unexpected EOF";
+    left -= size;
+    unsigned char const* const taken = address;
+    address += size;
+    return taken;
+}
 
 STICKET_BINSTREAM::IMPORT_INTERN::IMPORT_INTERN(void const* data, unsigned long size)
     : bytes{static_cast<unsigned char const*>(data), size}
@@ -152,7 +163,7 @@ unsigned long STICKET_BINSTREAM::IMPORT_INTERN::TakeShared(BYTES& item)
 class STICKET_BINSTREAM::RECORDS
 {
 public:
-    RECORDS(SETMULTIPAR_LIST* list, void const* data, unsigned long size, bool fixPositions)
+    RECORDS(LIST_CONTENTS* list, void const* data, unsigned long size, bool fixPositions)
         : m_list(list), m_cursor(data, size), m_fixPositions(fixPositions)
     {
     }
@@ -233,13 +244,14 @@ private:
     [[gnu::noinline]] void AddText(unsigned char const* text, unsigned long size)
     {
         std::string_view const bytes(reinterpret_cast<char const*>(text), size);
-        Add(PARAM_STRING, [&]
-            { return m_list->m_stringCache.Keep(bytes.substr(0, SizeToZero(bytes.data(), bytes.size()))); });
+        Add(PARAM_STRING,
+            [&] { return m_list->texts.Keep(bytes.substr(0, SizeToZero(bytes.data(), bytes.size()))).text; });
     }
 
     [[gnu::noinline]] void AddBinary(unsigned char const* bytes, unsigned long size)
     {
-        Add(PARAM_BINSTRING, [&] { return m_list->m_binCache.Keep(BIN_STRING(bytes, size)); });
+        Add(PARAM_BINSTRING,
+            [&] { return &m_list->binaries.Keep(BINARY::Of(BIN_STRING(bytes, size))).view; });
     }
 
     // The numbers of a vector stand one behind the other. Where the list keeps a number is a matter of its
@@ -252,9 +264,9 @@ private:
             values[count++] = m_cursor.TakeInteger(size);
         while (count < Together && m_cursor.TakeNumberTag(Integers, size));
         if (count > 1 && m_list)
-            std::for_each_n(values.begin(), count, [&](int value) { m_list->m_intCache.Expect(value); });
+            std::for_each_n(values.begin(), count, [&](int value) { m_list->ints.Expect(value); });
         std::for_each_n(values.begin(), count,
-                        [&](int& value) { Add(PARAM_INT, [&] { return m_list->m_intCache.Keep(value); }); });
+                        [&](int& value) { Add(PARAM_INT, [&] { return &m_list->ints.Keep(value); }); });
     }
 
     void TakeDoubles(unsigned long size)
@@ -265,10 +277,9 @@ private:
             values[count++] = m_cursor.TakeDouble(size);
         while (count < Together && m_cursor.TakeNumberTag(Doubles, size));
         if (count > 1 && m_list)
-            std::for_each_n(values.begin(), count,
-                            [&](double value) { m_list->m_doubleCache.Expect(value); });
+            std::for_each_n(values.begin(), count, [&](double value) { m_list->doubles.Expect(value); });
         std::for_each_n(values.begin(), count,
-                        [&](double& value) { Add(PARAM_DOUBLE, [&] { return m_list->Cached(value); }); });
+                        [&](double& value) { Add(PARAM_DOUBLE, [&] { return m_list->Kept(value); }); });
     }
 
     [[gnu::noinline]] void AddInteger64()
@@ -276,7 +287,7 @@ private:
         PARAM_TYPE type;
         unsigned long long value;
         m_cursor.GetPoly64(type, value);
-        Add(type, [&] { return m_list->Cached(type, &value); });
+        Add(type, [&] { return m_list->Kept(type, &value); });
     }
 
     // cached: puts the value into a cache of the list and gives its address there.
@@ -288,7 +299,7 @@ private:
         // The key last: its bytes were put together just now, and to load them at once would stall.
         void const* const value = cached();
         if (m_cachedKey == nullptr)
-            m_cachedKey = m_list->m_keyCache.Keep(m_cursor.Key());
+            m_cachedKey = m_list->keys.Keep(m_cursor.Key());
         m_list->Add(m_cachedKey, type, value, FixPos(m_fixNext, m_pos));
     }
 
@@ -297,7 +308,7 @@ private:
     static constexpr NUMBER_FORMS Doubles = FormBit(NUMBER_SINGLE) | FormBit(NUMBER_DOUBLE);
     static constexpr std::size_t Together = 64;
 
-    SETMULTIPAR_LIST* const m_list;
+    LIST_CONTENTS* const m_list;
     IMPORT_INTERN m_cursor;
     bool const m_fixPositions;
     bool m_fixNext = false;  // the next value is the first behind a key whose position is to be fixed
@@ -312,7 +323,7 @@ bool STICKET_BINSTREAM::ReadAll(SETMULTIPAR_LIST* list, void const* data, unsign
         return true;
     try
     {
-        RECORDS(list, data, size, fixPositions).TakeAll();
+        RECORDS(list ? &list->Contents() : nullptr, data, size, fixPositions).TakeAll();
         return true;
     }
     catch (...)  // a broken stream, or no memory: what was read stays in the list

@@ -2,65 +2,28 @@
 // not valid are one, with a null view. Otherwise as STRINGCACHE.
 #pragma once
 
+#include "comgui/foundation/export.h"
 #include "comgui/ticket/BIN_STRING.h"
-#include "comgui/ticket/VALUE_INDEX.h"
-#include <new>
+#include <memory>
 
-namespace comgui::detail
-{
-struct BINARY
-{
-    using VALUE = BIN_STRING;  // of size 0 if it is not valid
-    struct ENTRY
-    {
-        BIN_STRING view;
-        HASH hash;
-    };
-
-    static HASH Hash(VALUE value, HASH seed)
-    {
-        return HashOfBytes(static_cast<char const*>(value.data), value.size, seed);
-    }
-    static HASH HashOf(ENTRY const& entry, HASH) { return entry.hash; }
-    static bool Same(ENTRY const& entry, VALUE value)
-    {
-        return entry.view.size == value.size && SameBytes(static_cast<char const*>(entry.view.data),
-                                                          static_cast<char const*>(value.data), value.size);
-    }
-    static ENTRY* Make(void* place, VALUE value, HASH hash, POOL& pool)
-    {
-        if (value.size != 0)
-            value.data = std::memcpy(pool.Take(value.size, 1), value.data, value.size);
-        return new (place) ENTRY{value, hash};
-    }
-};
-}  // namespace comgui::detail
-
-class BIN_STRING_CACHE
+class COMGUI_EXPORT BIN_STRING_CACHE
 {
 public:
-    BIN_STRING_CACHE() : m_values(m_ownPool) {}
-
-    // Takes all memory from that pool, where it stays when the cache is cleared.
-    explicit BIN_STRING_CACHE(comgui::detail::POOL& pool) : m_values(pool) {}
+    BIN_STRING_CACHE() noexcept;
+    BIN_STRING_CACHE(BIN_STRING_CACHE const&) = delete;
+    BIN_STRING_CACHE& operator=(BIN_STRING_CACHE const&) = delete;
+    ~BIN_STRING_CACHE();
 
     // Replaces value by the address of the cached copy, and returns that address. Null stays null.
     BIN_STRING const* operator()(BIN_STRING const*& value) { return value ? value = Keep(*value) : nullptr; }
 
     // The address of the cached copy.
-    BIN_STRING const* Keep(BIN_STRING value)
-    {
-        return &m_values.Keep(value.valid() ? value : BIN_STRING()).view;
-    }
+    BIN_STRING const* Keep(BIN_STRING value);
 
     // Drops all values; every address given out dies.
-    void clear()
-    {
-        m_values.Clear();
-        m_ownPool.Clear();
-    }
+    void clear();
 
 private:
-    comgui::detail::POOL m_ownPool;
-    comgui::detail::VALUE_INDEX<comgui::detail::BINARY> m_values;
+    struct VALUES;
+    std::unique_ptr<VALUES> m_values;  // null until the first value comes
 };

@@ -6,8 +6,8 @@
 #include "comgui/foundation/short_compare.h"
 #include "comgui/foundation/short_copy.h"
 #include "comgui/ticket/POOL.h"
-#include "comgui/ticket/STRINGCACHE.h"
 #include "comgui/ticket/VALUE_INDEX.h"
+#include "comgui/ticket/value_kinds.h"
 #include <algorithm>
 #include <cstddef>
 #include <new>

@@ -5,10 +5,16 @@
 
 // The elements that text begins stand in a row, and the set finds the lowest. An element that begins text is
 // alone: its row would hold what begins with it.
-STRINGPREFIXSET::const_iterator STRINGPREFIXSET::find(std::string_view text) const
+STRINGPREFIXSET::const_iterator STRINGPREFIXSET::find(std::string const& text) const
 {
     auto const found = m_prefixes.find(text);
     return found == end() || found->size() <= text.size() ? found : end();
+}
+
+bool STRINGPREFIXSET::Covers(std::string_view text) const
+{
+    auto const found = m_prefixes.find(text);
+    return found != end() && found->size() <= text.size();
 }
 
 void STRINGPREFIXSET::insert(std::string const& text)
@@ -20,7 +26,7 @@ void STRINGPREFIXSET::insert(std::string const& text)
     m_prefixes.insert(text);
 }
 
-std::size_t STRINGPREFIXSET::erase(std::string_view text)
+std::size_t STRINGPREFIXSET::erase(std::string const& text)
 {
     auto const found = find(text);
     if (found == end())
@@ -34,6 +40,12 @@ PARTIAL_MODE::PARTIAL_MODE(char const* const* keys)
     if (keys)
         set(keys);
 }
+
+PARTIAL_MODE::PARTIAL_MODE(PARTIAL_MODE const& other) = default;
+PARTIAL_MODE::PARTIAL_MODE(PARTIAL_MODE&& other) noexcept = default;
+PARTIAL_MODE& PARTIAL_MODE::operator=(PARTIAL_MODE const& other) = default;
+PARTIAL_MODE& PARTIAL_MODE::operator=(PARTIAL_MODE&& other) noexcept = default;
+PARTIAL_MODE::~PARTIAL_MODE() = default;
 
 void PARTIAL_MODE::set(char const* const* keys)
 {
@@ -81,10 +93,9 @@ bool PARTIAL_MODE::wildcard(std::string& key)
     return true;
 }
 
-bool PARTIAL_MODE::multi_contains(std::string_view key) const
-{
-    return m_index.Selects(key, m_keys, m_prefixes);
-}
+bool PARTIAL_MODE::multi_contains(std::string const& key) const { return Selects(key); }
+
+bool PARTIAL_MODE::Selects(std::string_view key) const { return m_index.Selects(key, m_keys, m_prefixes); }
 
 PARTIAL_COLLECT_ACTION::PARTIAL_COLLECT_ACTION(SETMULTIPAR_LIST* list, PARTIAL_MODE const& mode)
     : m_list(list), m_mode(&mode)
@@ -101,7 +112,7 @@ bool PARTIAL_COLLECT_ACTION::CollectAction(void* action, char const* key, PARAM_
 
 int PARTIAL_COLLECT_ACTION::SetParameter(char const* key, PARAM_TYPE type, void const* value, int pos)
 {
-    if (m_mode->multi_contains(key))
+    if (m_mode->Selects(key))
         m_list->ySetParameter(key, type, value, pos);
     return 1;
 }
@@ -123,7 +134,7 @@ bool FILTERED_PARTIAL_COLLECT_ACTION::CollectAction(void* action, char const* ke
 int FILTERED_PARTIAL_COLLECT_ACTION::SetParameter(char const* key, PARAM_TYPE type, void const* value,
                                                   int pos)
 {
-    if (!m_mode->multi_contains(key))
+    if (!m_mode->Selects(key))
         m_list->ySetParameter(key, type, value, pos);
     return 1;
 }

@@ -24,18 +24,23 @@ public:
     {
         using is_transparent = void;
 
-        static std::size_t min(std::size_t left, std::size_t right) { return left < right ? left : right; }
+        // In brackets, since some systems have a macro of that name.
+        static std::size_t(min)(std::size_t left, std::size_t right) { return left < right ? left : right; }
 
         bool operator()(std::string_view left, std::string_view right) const
         {
-            std::size_t const size = min(left.size(), right.size());
+            std::size_t const size = (min)(left.size(), right.size());
             return left.substr(0, size) < right.substr(0, size);
         }
     };
     using const_iterator = std::set<std::string, LESS>::const_iterator;
 
     // The element that begins text, or is text; end() if there is none.
-    const_iterator find(std::string_view text) const;
+    const_iterator find(std::string const& text) const;
+
+    // Whether there is one, for a text that is no std::string.
+    bool Covers(std::string_view text) const;
+
     const_iterator begin() const { return m_prefixes.begin(); }
     const_iterator end() const { return m_prefixes.end(); }
     std::size_t size() const { return m_prefixes.size(); }
@@ -45,7 +50,7 @@ public:
     void insert(std::string const& text);
 
     // Erases the element that begins text, however much shorter it is. How many went: 0 or 1.
-    std::size_t erase(std::string_view text);
+    std::size_t erase(std::string const& text);
 
     bool empty() const { return m_prefixes.empty(); }
     void clear() { m_prefixes.clear(); }
@@ -59,6 +64,11 @@ class COMGUI_EXPORT PARTIAL_MODE
 public:
     // keys: a table of patterns as set() takes it, or null for none.
     explicit PARTIAL_MODE(char const* const* keys);
+    PARTIAL_MODE(PARTIAL_MODE const& other);
+    PARTIAL_MODE(PARTIAL_MODE&& other) noexcept;
+    PARTIAL_MODE& operator=(PARTIAL_MODE const& other);
+    PARTIAL_MODE& operator=(PARTIAL_MODE&& other) noexcept;
+    ~PARTIAL_MODE();
 
     // Adds the patterns of the table, which a null pointer ends. If the first one is the empty text, erases
     // those behind it instead. Null clears.
@@ -77,11 +87,14 @@ public:
     bool partial() const { return !m_keys.empty() || !m_prefixes.empty(); }
 
     // Whether a pattern selects that key. Without one, none does.
-    bool multi_contains(std::string_view key) const;
+    bool multi_contains(std::string const& key) const;
+
+    // The same for a key that is no std::string.
+    bool Selects(std::string_view key) const;
 
 private:
-    comgui::detail::PATTERN_INDEX
-        m_index;  // of both below; stands first, so that an assignment drops it first
+    // Of both below. It stands first, so that an assignment drops it before they change.
+    comgui::detail::PATTERN_INDEX m_index;
     std::set<std::string, std::less<>> m_keys;
     STRINGPREFIXSET m_prefixes;
 };

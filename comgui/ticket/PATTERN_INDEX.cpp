@@ -1,7 +1,7 @@
 #include "comgui/ticket/PATTERN_INDEX.h"
 
+#include "comgui/foundation/TEXT_TABLE.h"
 #include "comgui/ticket/PARTIAL_MODE.h"
-#include "comgui/ticket/TEXT_TABLE.h"
 #include <algorithm>
 #include <cstdint>
 #include <memory>
@@ -117,7 +117,7 @@ bool PATTERN_INDEX::Selects(std::string_view key, KEYS const& keys, STRINGPREFIX
 {
     TABLE const* const table = Table(keys, prefixes);
     bool const isKnown = table ? table->Selects(key) : keys.find(key) != keys.end();
-    return isKnown || ((table == nullptr || !table->HoldsPrefixes()) && prefixes.find(key) != prefixes.end());
+    return isKnown || ((table == nullptr || !table->HoldsPrefixes()) && prefixes.Covers(key));
 }
 
 PATTERN_INDEX::TABLE const* PATTERN_INDEX::Table(KEYS const& keys, STRINGPREFIXSET const& prefixes) const

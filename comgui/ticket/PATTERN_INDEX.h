@@ -3,7 +3,6 @@
 // asked as there are patterns. Many threads may ask at once while none changes anything.
 #pragma once
 
-#include "comgui/foundation/export.h"
 #include <atomic>
 #include <cstddef>
 #include <functional>
@@ -15,7 +14,7 @@ class STRINGPREFIXSET;
 
 namespace comgui::detail
 {
-class COMGUI_EXPORT PATTERN_INDEX
+class PATTERN_INDEX
 {
 public:
     using KEYS = std::set<std::string, std::less<>>;
@@ -40,7 +39,7 @@ public:
 private:
     class TABLE;
 
-    COMGUI_LOCAL TABLE const* Table(KEYS const& keys, STRINGPREFIXSET const& prefixes) const;
+    TABLE const* Table(KEYS const& keys, STRINGPREFIXSET const& prefixes) const;
 
     mutable std::atomic<TABLE const*> m_table{nullptr};
     mutable std::atomic<std::size_t> m_asked{0};  // without a table

@@ -28,8 +28,10 @@ void* POOL::TakeFromANewBlock(std::size_t size)
     char* const bytes = NewBlock(m_nextSize)->Bytes();
     m_free = bytes + size;
     m_left = m_nextSize - size;
-    // Larger steps would be fewer, but keep twice the memory that is used.
-    m_nextSize = std::min(m_nextSize * 2, LargestSize);
+    // The newest block is then two thirds of all of them. An allocator that gives memory back to the system
+    // once more than twice its largest block is free keeps all of it for the next pool; with blocks that
+    // double, a list of 10,000 records that is made again and again took five times as long.
+    m_nextSize = std::min(m_nextSize * 3, LargestSize);
     return bytes;
 }
 

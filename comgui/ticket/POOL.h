@@ -3,13 +3,12 @@
 // blocks. It runs no destructors. One thread at a time.
 #pragma once
 
-#include "comgui/foundation/export.h"
 #include <cstddef>
 #include <cstdint>
 
 namespace comgui::detail
 {
-class COMGUI_EXPORT POOL
+class POOL
 {
 public:
     POOL() = default;
@@ -36,7 +35,7 @@ public:
 private:
     struct BLOCK;
 
-    COMGUI_LOCAL BLOCK* NewBlock(std::size_t size);
+    BLOCK* NewBlock(std::size_t size);
     void* TakeFromANewBlock(std::size_t size);
 
     BLOCK* m_blocks = nullptr;

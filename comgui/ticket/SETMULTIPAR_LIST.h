@@ -6,17 +6,15 @@
 
 #include "comgui/foundation/export.h"
 #include "comgui/ticket/BIN_STRING.h"
-#include "comgui/ticket/BIN_STRING_CACHE.h"
-#include "comgui/ticket/KEYCACHE.h"
-#include "comgui/ticket/POOL.h"
-#include "comgui/ticket/RECORD_BLOCKS.h"
 #include "comgui/ticket/SETMULTIPAR.h"
-#include "comgui/ticket/STRINGCACHE.h"
-#include "comgui/ticket/VALCACHE.h"
 #include <string>
 #include <wx/string.h>
 
 class PARTIAL_MODE;
+namespace comgui::detail
+{
+struct LIST_CONTENTS;
+}
 struct STICKET_ACCESS;
 
 class COMGUI_EXPORT SETMULTIPAR_LIST
@@ -50,7 +48,7 @@ public:
     int DelParameter(char const* key, int pos);
 
     // Number of records.
-    unsigned long Size() const { return m_records.Size(); }
+    unsigned long Size() const;
 
     // The table, null while the list is empty. It belongs to the list and dies at the next add, at Clear()
     // and at the next Table(true) that has to sort. sort: by key, bytewise, records of one key staying in
@@ -75,30 +73,11 @@ public:
     // Adds what keys does not select; null or an empty table leaves nothing out.
     void FilteredMerge(STICKET_ACCESS const* ticket, char const* const* keys);
 
+    // What the list is made of, for the library alone.
+    COMGUI_LOCAL comgui::detail::LIST_CONTENTS& Contents();
+    COMGUI_LOCAL comgui::detail::LIST_CONTENTS const& Contents() const;
+
 private:
-    friend class STICKET_BINSTREAM;  // adds values that it has passed through the caches itself
-
-    COMGUI_LOCAL void const* Cached(PARAM_TYPE type, void const* value);
-    COMGUI_LOCAL void const* Cached(double value);
-    int Add(char const* cachedKey, PARAM_TYPE type, void const* value, int pos)
-    {
-        m_records.Append(cachedKey, type, value, pos);
-        if (m_table)
-            freeTbl();
-        return 1;
-    }
-
-    comgui::detail::POOL m_pool;  // of all that follows, and freed as a whole
-    comgui::detail::KEYCACHE m_keyCache{m_pool};
-    VALCACHE<int> m_intCache{m_pool};
-    VALCACHE<unsigned int> m_unsignedCache{m_pool};
-    VALCACHE<long long> m_int64Cache{m_pool};
-    VALCACHE<unsigned long long> m_unsigned64Cache{m_pool};
-    VALCACHE<double> m_doubleCache{m_pool};
-    STRINGCACHE m_stringCache{m_pool};
-    BIN_STRING_CACHE m_binCache{m_pool};
-    bool m_isSorted = false;  // the table was built after sorting
     bool const m_copyValues;
-    comgui::detail::RECORD_BLOCKS m_records{m_pool};
-    SETMULTIPAR* m_table = nullptr;
+    alignas(16) unsigned char m_contents[3072];  // a LIST_CONTENTS, with room for it to grow
 };

@@ -3,7 +3,7 @@
 // SetFolderVariable is good until the system ticket changes. For any thread.
 #pragma once
 
-#include "comgui/folders/clFOLDER_VARIABLES.h"
+#include "comgui/ticket/clFOLDER_VARIABLES.h"
 #include "standin/server/sessions/TicketService.h"
 
 namespace standin

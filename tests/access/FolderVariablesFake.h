@@ -1,7 +1,7 @@
 // A translator that remembers what it was asked and answers "<...>".
 #pragma once
 
-#include "comgui/folders/clFOLDER_VARIABLES.h"
+#include "comgui/ticket/clFOLDER_VARIABLES.h"
 #include <string>
 #include <vector>
 

@@ -1,5 +1,5 @@
 // What modules rely on when they hand out a translator.
-#include "comgui/folders/clFOLDER_VARIABLES.h"
+#include "comgui/ticket/clFOLDER_VARIABLES.h"
 
 #include <cstring>
 #include <gtest/gtest.h>

@@ -2,9 +2,9 @@
 #pragma once
 
 #include "comgui/folders/FolderVariables.h"
-#include "comgui/folders/clFOLDER_VARIABLES.h"
 #include "comgui/testing/ContainerFake.h"
 #include "comgui/testing/TicketFake.h"
+#include "comgui/ticket/clFOLDER_VARIABLES.h"
 #include <memory>
 #include <string>
 

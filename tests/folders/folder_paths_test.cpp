@@ -1,5 +1,6 @@
 #include "comgui/folders/folder_paths.h"
 
+#include "comgui/ticket/folder_variables.h"
 #include <gtest/gtest.h>
 
 using namespace comgui::detail;

@@ -2,8 +2,8 @@
 #include "tests/module/NotificationListener.h"
 
 #include "comgui/folders/FolderVariables.h"
-#include "comgui/folders/Variables.h"
-#include "comgui/folders/clFOLDER_VARIABLES.h"
+#include "comgui/ticket/clFOLDER_VARIABLES.h"
+#include "comgui/ticket/folder_variables.h"
 #include "tests/support/Allocations.h"
 #include <cstdio>
 #include <future>

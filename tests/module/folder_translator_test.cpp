@@ -3,8 +3,8 @@
 
 #include "comgui/access/MTICKET_READ.h"
 #include "comgui/access/STICKET_READ.h"
-#include "comgui/folders/clFOLDER_VARIABLES.h"
 #include "comgui/folders/clSETMULTIPAR_FOLDER_VARIABLES.h"
+#include "comgui/ticket/clFOLDER_VARIABLES.h"
 #include "tests/support/Allocations.h"
 #include "tests/support/ChildProcess.h"
 #include <new>

@@ -23,8 +23,6 @@ std::size_t RowOf(std::string_view key)
 }
 }  // namespace
 
-bool BeginsWithVariable(std::string_view value) { return value.size() >= 4 && value.starts_with("$("); }
-
 FolderTable::FolderTable(std::array<std::string, FolderRows.size()> const& values)
 {
     for (std::size_t row = 0; row < FolderRows.size(); ++row)
@@ -36,7 +34,7 @@ bool FolderTable::Add(std::size_t row, std::string_view value)
 {
     std::string folder = Cleaned(std::string(value));
     // Comes to an end: the shortest variable takes six bytes, and a folder that begins with "$(" three.
-    while (BeginsWithVariable(folder))
+    while (NeedsDecode(folder))
     {
         auto const end = folder.find(')', 2);
         auto const above =
@@ -77,7 +75,7 @@ bool FolderSettings::CanBeRead() const
         return true;  // then clients do not look at the folders
     if (MustBePlain())
         return std::none_of(values.begin(), values.end(),
-                            [](std::string const& value) { return BeginsWithVariable(Cleaned(value)); });
+                            [](std::string const& value) { return NeedsDecode(Cleaned(value)); });
     return FolderTable(values).Unresolved().empty();
 }
 }  // namespace standin

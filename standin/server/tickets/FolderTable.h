@@ -4,7 +4,7 @@
 // replacing as long as a value begins with one. So such a value is kept out of the ticket.
 #pragma once
 
-#include "comgui/folders/Variables.h"
+#include "comgui/ticket/folder_variables.h"
 #include "standin/server/tickets/StoredValue.h"
 #include <array>
 #include <iterator>
@@ -67,6 +67,5 @@ struct FolderSettings
     bool MustBePlain() const { return (use & 3) == 2; }
 };
 
-// Does a value begin with a variable, as far as clients look before they replace it?
-bool BeginsWithVariable(std::string_view value);
+using comgui::detail::NeedsDecode;  // clients look no further before they replace a variable
 }  // namespace standin

@@ -119,7 +119,7 @@ ServerPath ServerPath::Parse(std::string text, std::string_view leaf)
     std::string const shown = text;
     std::replace(text.begin(), text.end(), '\\', '/');
     auto const end = text.find(')');
-    bool const hasVariable = BeginsWithVariable(text) && end != std::string::npos && end > 2;
+    bool const hasVariable = NeedsDecode(text) && end != std::string::npos && end > 2;
     if (!hasVariable || (end + 1 < text.size() && text[end + 1] != '/'))
         Refuse(shown, "no place on the server; write $(VARIABLE)/name");
 

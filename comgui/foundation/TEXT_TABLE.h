@@ -2,7 +2,7 @@
 // with a number and stays with its owner, who keeps it where it is. Many threads may look while none adds.
 #pragma once
 
-#include "comgui/ticket/VALUE_INDEX.h"
+#include "comgui/foundation/hash.h"
 #include <bit>
 #include <cstddef>
 #include <cstdint>

@@ -1,5 +1,8 @@
-// The folders that a server can have: where the system ticket keeps each, and what it is called in a path.
+// The folders that a server can have: where the system ticket keeps each, and what it is called in a path;
+// and which texts may be such a path.
 #pragma once
+
+#include <string_view>
 
 namespace comgui::detail
 {
@@ -42,4 +45,10 @@ inline constexpr FOLDER_VARIABLE Variables[] = {
     {"System/Folders/Analytics", "ANALYTICS"},
     {nullptr, nullptr},
 };
+
+// Whether a text may be a path in variable form: four bytes or more that begin with "$(".
+constexpr bool NeedsDecode(std::string_view text)
+{
+    return text.size() >= 4 && text[0] == '$' && text[1] == '(';
+}
 }  // namespace comgui::detail
