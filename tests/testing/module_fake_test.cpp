@@ -90,6 +90,41 @@ TEST_F(FakedServer, WhatTheTestDoes_IsHeardOf)
     EXPECT_THAT(heard, ElementsAre("Job/State"));
 }
 
+TEST_F(FakedServer, TicketThatTheTestCreatesAndDeletes_IsHeardOf)
+{
+    comgui::TaskQueue queue;
+    std::vector<std::string> heard;
+    auto const subscription =
+        connection.Subscribe(comgui::Interest::InTypes({3}), queue.GetExecutor(),
+                             [&](comgui::Event const& event)
+                             {
+                                 if (std::holds_alternative<comgui::TicketCreated>(event))
+                                     heard.emplace_back("created");
+                                 if (std::holds_alternative<comgui::TicketDeleted>(event))
+                                     heard.emplace_back("deleted");
+                             });
+    auto const hear = [&](std::size_t count)
+    {
+        using namespace std::chrono_literals;
+        for (auto const end = std::chrono::steady_clock::now() + 20s;
+             heard.size() < count && std::chrono::steady_clock::now() < end;)
+            queue.RunFor(5ms);
+    };
+    Address const job = module.Create(3);
+    hear(1);
+    module.Delete(job);
+    hear(2);
+    EXPECT_THAT(heard, ElementsAre("created", "deleted"));
+}
+
+TEST_F(FakedServer, IdOfATicketThatIsGone_IsNotGivenAgain)
+{
+    EXPECT_EQ(module.Create(3).id, 1);
+    Address const second = module.Create(3);
+    module.Delete(second);
+    EXPECT_EQ(module.Create(3).id, 3);
+}
+
 TEST_F(FakedServer, WhatCannotBeDone_Throws)
 {
     EXPECT_THROW(module.Put({3, 99}, "A", 1), std::runtime_error);
@@ -226,6 +261,21 @@ TEST(ModuleFakeOfTheManager, EverySlot_IsWrittenDownAndCanFail)
     manager.Logout();
 }
 
+TEST(ModuleFakeOfTheManager, NextId_IsAboveAllThatWereGiven)
+{
+    ModuleFake module;
+    module.Use();
+    auto& manager = *ComGUIManager::GetInstance();
+    ASSERT_EQ(manager.Initialize("anna", "secret", "localhost", 50000), 0);
+    ASSERT_EQ(manager.Login("anna", "secret", "localhost", 50000), 0);
+    MTICKET_ACCESS const* const all = manager.GetClientContainer();
+    char const* const keys[] = {nullptr};
+    ASSERT_TRUE(all->MCREATETICKET(all->Instance, 3, 9, keys));
+    ASSERT_TRUE(all->MCREATETICKET(all->Instance, 3, 2, keys));
+    EXPECT_EQ(module.Create(3).id, 10);
+    manager.Logout();
+}
+
 TEST(ModuleFakeOfTheManager, AfterItsEnd_SessionsThatAreLoggedInFail_AndNoWorkIsCalled)
 {
     comgui::Connection connection;
@@ -241,6 +291,7 @@ TEST(ModuleFakeOfTheManager, AfterItsEnd_SessionsThatAreLoggedInFail_AndNoWorkIs
     }
     EXPECT_FALSE(tickets.Read({0, 0}, "System/Name"));
     EXPECT_FALSE(tickets.Write({0, 0}, "A", 1));
+    EXPECT_FALSE(tickets.Create(3));
 }
 
 TEST(ModuleFakeOfTheManager, IsFoundLikeAnyPlugIn)
