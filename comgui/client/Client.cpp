@@ -460,6 +460,7 @@ std::optional<Outcome> Client::EnterAgain(ComGUIManager& watcher)
             return entered;
     }
     m_entry = {};
+    m_switching = {};  // what the old session was refused is another matter
     m_switch.Await(m_switch.Ask(), SwitchPatience);
     return Outcome();
 }

@@ -30,6 +30,15 @@ protected:
     comgui::Tickets const tickets = connection.GetTickets();
 };
 
+// The library's own manager, in a session at whatever fake there is.
+ComGUIManager& LoggedIn()
+{
+    ComGUIManager& manager = *ComGUIManager::GetInstance();
+    EXPECT_EQ(manager.Initialize("anna", "secret", "localhost", 50000), 0);
+    EXPECT_EQ(manager.Login("anna", "secret", "localhost", 50000), 0);
+    return manager;
+}
+
 std::vector<std::string> SlotCalls(ModuleFake const& module)
 {
     std::vector<std::string> calls;
@@ -206,9 +215,7 @@ TEST(ModuleFakeOfTheManager, EverySlot_IsWrittenDownAndCanFail)
 {
     ModuleFake module;
     module.Use();
-    auto& manager = *ComGUIManager::GetInstance();
-    ASSERT_EQ(manager.Initialize("anna", "secret", "localhost", 50000), 0);
-    ASSERT_EQ(manager.Login("anna", "secret", "localhost", 50000), 0);
+    ComGUIManager& manager = LoggedIn();
     MTICKET_ACCESS const* const all = manager.GetClientContainer();
     module.Create(3, {{"A", 1}});
     int value = 0;
@@ -265,9 +272,7 @@ TEST(ModuleFakeOfTheManager, NextId_IsAboveAllThatWereGiven)
 {
     ModuleFake module;
     module.Use();
-    auto& manager = *ComGUIManager::GetInstance();
-    ASSERT_EQ(manager.Initialize("anna", "secret", "localhost", 50000), 0);
-    ASSERT_EQ(manager.Login("anna", "secret", "localhost", 50000), 0);
+    ComGUIManager& manager = LoggedIn();
     MTICKET_ACCESS const* const all = manager.GetClientContainer();
     char const* const keys[] = {nullptr};
     ASSERT_TRUE(all->MCREATETICKET(all->Instance, 3, 9, keys));
@@ -298,9 +303,7 @@ TEST(ModuleFakeOfTheManager, IsFoundLikeAnyPlugIn)
 {
     ModuleFake module;
     module.Use();
-    auto& manager = *ComGUIManager::GetInstance();
-    ASSERT_EQ(manager.Initialize("anna", "secret", "localhost", 50000), 0);
-    ASSERT_EQ(manager.Login("anna", "secret", "localhost", 50000), 0);
+    ComGUIManager& manager = LoggedIn();
     MTICKET_ACCESS const* const all = manager.GetClientContainer();
     ASSERT_TRUE(all);
     char const* name = nullptr;
