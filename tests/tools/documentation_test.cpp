@@ -90,7 +90,7 @@ TEST(StreamFormats, TableOfKeys_IsWhatTheWriterMakes)
     writer.PutPartialTableOperation(3, 1, STICKET_OP_SET_PARTIAL, keys);
     std::string stream;
     writer.GetAndClear(stream);
-    EXPECT_EQ(HexOf(BytesOfAllLines(Behind("`Job/*` and `System/Name` make 35 bytes:\n"))),
+    EXPECT_EQ(HexOf(BytesOfAllLines(Behind("`Job/*` and `System/Name` take 35 bytes:\n"))),
               HexOf(stream.substr(25)));
 }
 
