@@ -110,10 +110,15 @@ void RegisterRead(RECORDS workload, FORMAT format)
     benchmark::RegisterBenchmark(("Keep/" + name).c_str(), Keep, workload, format);
 }
 
-void Register(RECORDS workload, FORMAT format)
+void RegisterWrite(RECORDS workload, FORMAT format)
 {
     std::string const name = std::string("Write/") + workload.name + "/" + format.name;
     benchmark::RegisterBenchmark(name.c_str(), Write, workload, format);
+}
+
+void Register(RECORDS workload, FORMAT format)
+{
+    RegisterWrite(workload, format);
     RegisterRead(workload, format);
 }
 
@@ -127,6 +132,7 @@ void RegisterAll()
         for (FORMAT const format : {FORMAT{"comgui", MakeComgui}, FORMAT{"protobuf", MakeProtobuf},
                                     FORMAT{"msgpack", MakeMsgpack}, FORMAT{"ipp", MakeIpp}})
             Register(workload, format);
+        RegisterWrite(workload, {"msgpack_buffer", MakeMsgpackBuffer});
         RegisterRead(workload, {"protobuf_heap", MakeProtobufHeap});
     }
     Register({"vector", BigVector}, {"protobuf_each", MakeProtobufEach});
@@ -140,9 +146,11 @@ int main(int argc, char** argv)
     return RunAndReport(
         argc, argv,
         {{"write, job ticket", "Write/job/comgui", "Write/job/msgpack", 0.60},
+         {"write, job ticket", "Write/job/comgui", "Write/job/msgpack_buffer", 0.85},
          {"write, job ticket", "Write/job/comgui", "Write/job/protobuf", 0.75},
          {"write, system ticket", "Write/system/comgui", "Write/system/protobuf", 0.75},
          {"write, big vector", "Write/vector/comgui", "Write/vector/msgpack", 0.85},
+         {"write, big vector", "Write/vector/comgui", "Write/vector/msgpack_buffer", 1.1},
          {"read, job ticket", "Read/job/comgui", "Read/job/protobuf_heap", 0.30},
          {"read, job ticket", "Read/job/comgui", "Read/job/protobuf", 0.35},
          {"read, job ticket", "Read/job/comgui", "Read/job/msgpack", 2.00},

@@ -49,7 +49,8 @@ std::unique_ptr<PEER> MakeProtobuf();      // a vector is one packed field
 std::unique_ptr<PEER> MakeProtobufEach();  // each value of a vector is a message
 std::unique_ptr<PEER> MakeProtobufHeap();
 std::unique_ptr<PEER> MakeProtobufEachHeap();
-std::unique_ptr<PEER> MakeMsgpack();
+std::unique_ptr<PEER> MakeMsgpack();        // writes a std::string, as the library does
+std::unique_ptr<PEER> MakeMsgpackBuffer();  // writes msgpack's own buffer
 std::unique_ptr<PEER> MakeIpp();
 
 std::unique_ptr<BUILDER> MakeComguiBuilder();
