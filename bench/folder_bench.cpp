@@ -1,5 +1,6 @@
 // What a translation of a path costs beside its rule in the plainest form and beside the least that it can
 // cost, a copy of its result; and the filter of bytes beside the loop that anyone would write.
+#include "bench/counted_loop.h"
 #include "bench/heap_count.h"
 #include "bench/ratio_report.h"
 
@@ -105,7 +106,7 @@ void Measure(benchmark::State& state, TRANSLATE translate, std::string const& ex
     if (Path.size() != 60 || translate() != expected)
         return state.SkipWithError("the translation is not what it should be");
     long const before = BlocksTaken();
-    for (auto _ : state)
+    for (auto _ : COUNTED_LOOP(state))
         benchmark::DoNotOptimize(translate());
     state.counters["allocations"] =
         benchmark::Counter(static_cast<double>(BlocksTaken() - before), benchmark::Counter::kAvgIterations);
@@ -176,7 +177,7 @@ void Filter(benchmark::State& state, FILTER filter)
     expected.erase(std::remove(expected.begin(), expected.end(), '#'), expected.end());
     if (filter(text) != expected)
         return state.SkipWithError("the filter does not give what it should");
-    for (auto _ : state)
+    for (auto _ : COUNTED_LOOP(state))
         benchmark::DoNotOptimize(filter(text));
     state.SetBytesProcessed(state.iterations() * static_cast<std::int64_t>(text.size()));
 }
@@ -208,7 +209,7 @@ void FilterByAppending(benchmark::State& state)
 // An addition that waits for the one before takes one cycle: as many of them as there are bytes.
 void OneCycleAByte(benchmark::State& state)
 {
-    for (auto _ : state)
+    for (auto _ : COUNTED_LOOP(state))
         for (std::size_t i = 0; i < TextSize; ++i)
             asm volatile("" : "+r"(i));
 }

@@ -1,6 +1,7 @@
 // What it costs to gather records in a list and lay them out as a table, beside building a protobuf message
 // of the same records; and to ask a key filter about each key of a ticket, beside its rule in the plainest
 // form.
+#include "bench/counted_loop.h"
 #include "bench/peers/peer.h"
 #include "bench/ratio_report.h"
 
@@ -22,7 +23,7 @@ void Build(benchmark::State& state, WORKLOAD& (*workload)(), std::unique_ptr<BUI
     builder->TellBuilt(records.Table(), comparison);
     if (!comparison.Equal())
         return state.SkipWithError("what was built does not hold the records");
-    for (auto _ : state)
+    for (auto _ : COUNTED_LOOP(state))
         benchmark::DoNotOptimize(builder->Build(records.Table()));
     state.counters["time_a_record"] =
         benchmark::Counter(static_cast<double>(records.Size()),
@@ -140,7 +141,7 @@ void Contains(benchmark::State& state, FILTER_CASE const& (*filterCase)(),
     if (std::count(answers.begin(), answers.end(), true) != selected ||
         answers != Answers(PLAIN_FILTER(patterns), keys))
         return state.SkipWithError("the filter does not select what it should");
-    for (auto _ : state)
+    for (auto _ : COUNTED_LOOP(state))
         for (std::string const& key : keys)
             benchmark::DoNotOptimize(filter.multi_contains(key));
     state.counters["time_a_key"] =

@@ -1,6 +1,7 @@
 // What a notification costs: a table of a thousand changed keys on its road through the queue, beside the
 // same step by step, and beside the blocks of memory alone that it takes; the texts by themselves; and the
 // append to the queue with four threads at it, against one alone.
+#include "bench/counted_loop.h"
 #include "bench/ratio_report.h"
 #include "comgui/access/FromUtf8.h"
 
@@ -67,7 +68,7 @@ void Drain()
 
 void Notify(benchmark::State& state)
 {
-    for (auto _ : state)
+    for (auto _ : COUNTED_LOOP(state))
     {
         ComGUIManager::fGUI2NOTIFICATION(nullptr, 1, 0, 0, 3, Changes().table.data());
         if (ComGUIManager::m_notificationList.size() != Keys)
@@ -80,7 +81,7 @@ void NotifyPlainly(benchmark::State& state)
 {
     std::list<NotifData*> queue;
     wxCriticalSection section;
-    for (auto _ : state)
+    for (auto _ : COUNTED_LOOP(state))
     {
         NotifData const pattern(nullptr, 1, 0, 0, 3, PARAM_NONE, nullptr);
         for (SETMULTIPAR const* record = Changes().table.data(); record->key; ++record)
@@ -121,7 +122,7 @@ void BlocksAlone(benchmark::State& state)
             to[i] = static_cast<unsigned char>(from[i]);
         return to;
     };
-    for (auto _ : state)
+    for (auto _ : COUNTED_LOOP(state))
     {
         NODE* first = nullptr;
         for (SETMULTIPAR const* record = Changes().table.data(); record->key; ++record)
@@ -146,7 +147,7 @@ void BlocksAlone(benchmark::State& state)
 template <typename CONVERT>
 void Texts(benchmark::State& state, CONVERT convert)
 {
-    for (auto _ : state)
+    for (auto _ : COUNTED_LOOP(state))
         for (std::string const& name : Changes().names)
             benchmark::DoNotOptimize(convert(name.c_str()));
 }
@@ -154,7 +155,7 @@ void Texts(benchmark::State& state, CONVERT convert)
 void Append(benchmark::State& state)
 {
     int sinceDrain = 0;
-    for (auto _ : state)
+    for (auto _ : COUNTED_LOOP(state))
     {
         ComGUIManager::fGUI2NOTIFICATION(nullptr, 4, 0, 0, 3, nullptr);
         if (++sinceDrain == 10000)

@@ -1,5 +1,7 @@
 #include "bench/ratio_report.h"
 
+#include "bench/counted_loop.h"
+
 #include <algorithm>
 #include <benchmark/benchmark.h>
 #include <cstdio>
@@ -71,7 +73,9 @@ private:
     void Take(Run const& run)
     {
         FIGURES& taken = figures[run.run_name.str()];
-        taken.nanoseconds.push_back(run.cpu_accumulated_time * 1e9 / static_cast<double>(run.iterations));
+        taken.nanoseconds.push_back(COUNTED_LOOP::Counts() ? COUNTED_LOOP::LastCost()
+                                                           : run.cpu_accumulated_time * 1e9 /
+                                                                 static_cast<double>(run.iterations));
         taken.elapsed.push_back(run.real_accumulated_time * 1e9 / static_cast<double>(run.iterations));
         auto const bytes = run.counters.find(BytesARecord);
         if (bytes != run.counters.end())
@@ -115,7 +119,10 @@ private:
         return path.substr(0, end).substr(path.rfind('/', end - 1) + 1);
     }
 
-    static char const* Unit(GOAL const& goal) { return goal.kind == GOAL::BYTES_A_RECORD ? "bytes" : "ns"; }
+    static char const* Unit(GOAL const& goal)
+    {
+        return goal.kind == GOAL::BYTES_A_RECORD ? "bytes" : COUNTED_LOOP::Counts() ? "cycles" : "ns";
+    }
 
     std::map<std::string, FIGURES> figures;
     bool failed = false;

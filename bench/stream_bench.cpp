@@ -3,6 +3,7 @@
 // to go by, on a quiet machine and with a release build:
 //
 //   taskset -c 1 stream_bench --benchmark_repetitions=9 --benchmark_enable_random_interleaving=true
+#include "bench/counted_loop.h"
 #include "bench/peers/peer.h"
 #include "bench/ratio_report.h"
 
@@ -47,7 +48,7 @@ void Write(benchmark::State& state, RECORDS workload, FORMAT format)
     if (!ReadsBack(*peer, records))
         return state.SkipWithError("what was written does not read back");
     std::size_t const size = peer->Write(records.Table()).size();
-    for (auto _ : state)
+    for (auto _ : COUNTED_LOOP(state))
         benchmark::DoNotOptimize(peer->Write(records.Table()).data());
     SetCounters(state, records, size);
 }
@@ -59,7 +60,7 @@ void Read(benchmark::State& state, RECORDS workload, FORMAT format)
     std::string const bytes(peer->Write(records.Table()));
     if (!ReadsBack(*peer, records) || peer->Read(bytes) == 0)
         return state.SkipWithError("what was written does not read back");
-    for (auto _ : state)
+    for (auto _ : COUNTED_LOOP(state))
         benchmark::DoNotOptimize(peer->Read(bytes));
     SetCounters(state, records, bytes.size());
 }
@@ -77,7 +78,7 @@ void Keep(benchmark::State& state, RECORDS workload, FORMAT format)
     std::unique_ptr<PEER> const peer = format.make();
     std::string const bytes(peer->Write(records.Table()));
     std::size_t kept = 0;
-    for (auto _ : state)
+    for (auto _ : COUNTED_LOOP(state))
     {
         std::size_t const before = HeapInUse();
         std::shared_ptr<void> const found = peer->Keep(bytes);
@@ -95,7 +96,7 @@ void Copy(benchmark::State& state, RECORDS workload)
     std::unique_ptr<PEER> const peer = MakeComgui();
     std::string_view const bytes = peer->Write(records.Table());
     std::string copy(bytes);
-    for (auto _ : state)
+    for (auto _ : COUNTED_LOOP(state))
     {
         std::memcpy(copy.data(), bytes.data(), bytes.size());
         benchmark::ClobberMemory();

@@ -1,6 +1,7 @@
 // What a whole list costs above the table slot that it comes down to: 100,000 doubles, beside one call with a
 // table that was made once. And 1,000 texts as a list of variants, beside a vector of them. The module is a
 // ticket in memory that looks up each record's key, as a module must.
+#include "bench/counted_loop.h"
 #include "bench/heap_count.h"
 #include "bench/ratio_report.h"
 
@@ -125,7 +126,7 @@ void Measure(benchmark::State& state, Operation operation)
     if (!operation())
         return state.SkipWithError("the operation does not do what it should");
     long const before = BlocksTaken();
-    for (auto _ : state)
+    for (auto _ : COUNTED_LOOP(state))
         benchmark::DoNotOptimize(operation());
     state.counters["blocks"] =
         benchmark::Counter(static_cast<double>(BlocksTaken() - before), benchmark::Counter::kAvgIterations);
