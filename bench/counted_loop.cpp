@@ -58,23 +58,17 @@ double CyclesOf(std::map<std::string, double> const& counts)
 }
 }  // namespace
 
-COUNTED_LOOP::~COUNTED_LOOP()
-{
-    if (!Counts())
-        return;
-    static int dumps = 0;  // callgrind numbers its files
-    CALLGRIND_DUMP_STATS;
-    std::string const path = CostsPath() + ("." + std::to_string(++dumps));
-    lastCost = CyclesOf(EventsIn(path)) / static_cast<double>(state.iterations());
-    std::remove(path.c_str());
-}
-
 bool COUNTED_LOOP::Counts() { return CostsPath() != nullptr; }
 
 double COUNTED_LOOP::LastCost() { return lastCost; }
 
-void COUNTED_LOOP::Start()
+void COUNTED_LOOP::StartCounting() { CALLGRIND_ZERO_STATS; }
+
+void COUNTED_LOOP::StopCounting()
 {
-    if (Counts())
-        CALLGRIND_ZERO_STATS;
+    static int dumps = 0;  // callgrind numbers its files
+    CALLGRIND_DUMP_STATS;
+    std::string const path = CostsPath() + ("." + std::to_string(++dumps));
+    lastCost = CyclesOf(EventsIn(path)) / Counted;
+    std::remove(path.c_str());
 }

@@ -18,8 +18,10 @@ set_target_properties(comgui_host PROPERTIES EXPORT_NAME host)
 set_target_properties(comgui_corefoundation PROPERTIES INSTALL_RPATH ${comgui_beside} EXPORT_NAME corefoundation)
 set_target_properties(comgui_module PROPERTIES INSTALL_RPATH ${comgui_beside}/../../..)
 
-install(TARGETS comgui comgui_client comgui_host comgui_module_kit comgui_fakes comgui_testing comgui_contracts EXPORT comgui-targets
+install(TARGETS comgui comgui_host comgui_module_kit comgui_fakes comgui_testing comgui_contracts EXPORT comgui-targets
     LIBRARY DESTINATION ${CMAKE_INSTALL_LIBDIR} ARCHIVE DESTINATION ${CMAKE_INSTALL_LIBDIR} FILE_SET HEADERS)
+# An export of its own, since the kit may be packaged apart.
+install(TARGETS comgui_client EXPORT comgui-client-targets LIBRARY DESTINATION ${CMAKE_INSTALL_LIBDIR} FILE_SET HEADERS)
 if(APPLE)
     install(TARGETS comgui_corefoundation EXPORT comgui-targets)    # no more than the system's own
 else()
@@ -35,29 +37,27 @@ install(TARGETS comgui_module LIBRARY DESTINATION ${COMGUI_BUNDLE_DIR}/Contents/
 install(DIRECTORY ${PROJECT_BINARY_DIR}/lib/ComGUI.Bundle/ DESTINATION ${COMGUI_BUNDLE_DIR}
     PATTERN Contents/${comgui_system} EXCLUDE)
 
-# The trace: its bundle, what loads it into programs, and the program for people.
+# The trace: its bundle, and what loads it into programs.
 set_target_properties(comgui_trace_module PROPERTIES INSTALL_RPATH ${comgui_beside}/../../..)
 install(TARGETS comgui_trace_module
     LIBRARY DESTINATION ${CMAKE_INSTALL_LIBDIR}/ComGUI-Trace.Bundle/Contents/${comgui_system})
 install(FILES ${PROJECT_BINARY_DIR}/lib/ComGUI-Trace.Bundle/Contents/Info.plist
     DESTINATION ${CMAKE_INSTALL_LIBDIR}/ComGUI-Trace.Bundle/Contents)
-if(TARGET comgui_trace)
-    file(RELATIVE_PATH comgui_libraries ${CMAKE_INSTALL_FULL_BINDIR} ${CMAKE_INSTALL_FULL_LIBDIR})
-    set_target_properties(comgui_trace PROPERTIES INSTALL_RPATH ${comgui_beside}/${comgui_libraries})
-    install(TARGETS comgui_trace comgui_trace_start RUNTIME DESTINATION ${CMAKE_INSTALL_BINDIR}
-        LIBRARY DESTINATION ${CMAKE_INSTALL_LIBDIR})
+if(TARGET comgui_trace_start)
+    install(TARGETS comgui_trace_start
+        LIBRARY DESTINATION ${CMAKE_INSTALL_LIBDIR}/ComGUI-Trace.Bundle/Contents/${comgui_system})
 endif()
 
-if(COMGUI_TOOLS)
-    file(RELATIVE_PATH comgui_libraries ${CMAKE_INSTALL_FULL_BINDIR} ${CMAKE_INSTALL_FULL_LIBDIR})
-    set_target_properties(ticketstream comgui_site comgui_validate PROPERTIES INSTALL_RPATH ${comgui_beside}/${comgui_libraries})
-    install(TARGETS ticketstream comgui_site comgui_validate RUNTIME DESTINATION ${CMAKE_INSTALL_BINDIR})
-endif()
-if(TARGET ticket_desk)
-    file(RELATIVE_PATH comgui_libraries ${CMAKE_INSTALL_FULL_BINDIR} ${CMAKE_INSTALL_FULL_LIBDIR})
-    set_target_properties(ticket_desk PROPERTIES INSTALL_RPATH ${comgui_beside}/${comgui_libraries})
-    install(TARGETS ticket_desk RUNTIME DESTINATION ${CMAKE_INSTALL_BINDIR})
-endif()
+# The programs.
+file(RELATIVE_PATH comgui_libraries ${CMAKE_INSTALL_FULL_BINDIR} ${CMAKE_INSTALL_FULL_LIBDIR})
+set(comgui_programs)
+foreach(program ticketstream comgui_site comgui_validate comgui_trace ticket_desk)
+    if(TARGET ${program})
+        list(APPEND comgui_programs ${program})
+        set_target_properties(${program} PROPERTIES INSTALL_RPATH ${comgui_beside}/${comgui_libraries})
+        install(TARGETS ${program} RUNTIME DESTINATION ${CMAKE_INSTALL_BINDIR})
+    endif()
+endforeach()
 
 # What a consumer's wxWidgets and standard library must have in common with those of this build.
 function(comgui_describe_build)
@@ -100,7 +100,9 @@ install(FILES ${PROJECT_BINARY_DIR}/comgui-config.cmake ${PROJECT_BINARY_DIR}/co
     ${PROJECT_SOURCE_DIR}/cmake/ComGUIWxWidgets-check.cpp
     ${PROJECT_SOURCE_DIR}/cmake/ComGUIModule.cmake ${PROJECT_SOURCE_DIR}/cmake/ComGUIModule.plist.in
     DESTINATION ${COMGUI_PACKAGE_DIR})
-install(EXPORT comgui-targets NAMESPACE comgui:: DESTINATION ${COMGUI_PACKAGE_DIR})
+foreach(export comgui-targets comgui-client-targets)
+    install(EXPORT ${export} NAMESPACE comgui:: DESTINATION ${COMGUI_PACKAGE_DIR})
+endforeach()
 
 # wxWidgets has no pkg-config file that these could require, so they carry its flags: all but wxUSE_GUI, which
 # depends on whether the program has windows.

@@ -1,11 +1,7 @@
 # Manual pages and completion for the programs that are installed. Pages are made where help2man is found.
-set(comgui_programs)
-foreach(program ticketstream comgui_site comgui_validate comgui_trace ticket_desk)
-    if(TARGET ${program})
-        list(APPEND comgui_programs ${program})
-        install(FILES ${PROJECT_SOURCE_DIR}/tools/bash-completion
-            DESTINATION ${CMAKE_INSTALL_DATADIR}/bash-completion/completions RENAME ${program})
-    endif()
+foreach(program IN LISTS comgui_programs)
+    install(FILES ${PROJECT_SOURCE_DIR}/tools/bash-completion
+        DESTINATION ${CMAKE_INSTALL_DATADIR}/bash-completion/completions RENAME ${program})
 endforeach()
 
 find_program(COMGUI_HELP2MAN help2man)

@@ -34,14 +34,14 @@ void Set(char const* name, std::string const& value) { setenv(name, value.c_str(
 
 void Start(StartOptions const& options)
 {
-    fs::path const libraries = LibraryFolder();
-    Set("COMGUI_TRACE_PLUGIN", libraries / "ComGUI-Trace.Bundle");
+    fs::path const bundle = LibraryFolder() / "ComGUI-Trace.Bundle";
+    Set("COMGUI_TRACE_PLUGIN", bundle);
     Set("COMGUI_TRACE_FILE", fs::absolute(options.file.empty() ? "comgui-%p.trace" : options.file));
     Set("COMGUI_TRACE", options.isOff ? "off" : "on");
     if (!options.bundle.empty())
         Set("COMGUI_TRACE_BUNDLE", fs::absolute(options.bundle));
     char const* const others = std::getenv("LD_PRELOAD");
-    std::string const start = libraries / "libcomgui_trace_start.so";
+    std::string const start = bundle / "Contents/Linux/libcomgui_trace_start.so";
     Set("LD_PRELOAD", others && *others ? start + ":" + others : start);
     std::vector<char*> arguments;
     for (std::string const& argument : options.program)

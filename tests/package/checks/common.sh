@@ -14,3 +14,9 @@ is_built()
 {
     grep -qF "\"file\": \"$1\"" "$2"
 }
+
+# loads_host_library_of PREFIX PROGRAM: whether that is the one that the program would load.
+loads_host_library_of()
+{
+    [[ $(realpath "$(ldd "$2" | awk '/libcomgui_host/ { print $3 }')") = "$1"/* ]]
+}
