@@ -136,7 +136,8 @@ JobBoard::Change JobBoard::TakeJob(int job, comgui::Snapshot const& ticket, doub
 {
     JobRow* row = Find(m_byJob, job);
     bool const isNew = !row;
-    if (isNew && std::ranges::none_of(ToldKeys, [&](auto key) { return ticket.Find(key) != nullptr; }))
+    if (isNew && (m_forgotten.contains(job) ||
+                  std::ranges::none_of(ToldKeys, [&](auto key) { return ticket.Find(key) != nullptr; })))
         return Change::None;
     if (isNew)
     {
@@ -191,6 +192,7 @@ bool JobBoard::Set(JobRow& row, std::string_view key, comgui::Value const& value
 
 JobBoard::Change JobBoard::RemoveJob(int job)
 {
+    m_forgotten.erase(job);
     JobRow* const row = Find(m_byJob, job);
     if (!row)
         return Change::None;
@@ -223,7 +225,10 @@ JobBoard::Change JobBoard::RemoveOver()
                                         if (row.IsOver() && row.transfer)
                                             m_byTransfer.erase(*row.transfer);
                                         if (row.IsOver() && row.job)
+                                        {
                                             m_byJob.erase(*row.job);
+                                            m_forgotten.insert(*row.job);
+                                        }
                                         return row.IsOver();
                                     });
     return gone > 0 ? Change::Rows : Change::None;
@@ -234,6 +239,7 @@ void JobBoard::Clear()
     m_rows.clear();
     m_byTransfer.clear();
     m_byJob.clear();
+    m_forgotten.clear();
 }
 
 std::optional<std::size_t> JobBoard::IndexOf(RowNumber number) const

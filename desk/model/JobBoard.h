@@ -17,6 +17,7 @@
 #include <string>
 #include <string_view>
 #include <unordered_map>
+#include <unordered_set>
 #include <vector>
 
 namespace desk
@@ -82,7 +83,8 @@ public:
     static bool IsTold(std::string_view key);  // whether it is a key of a job's ticket that counts here
     std::vector<int> Jobs() const;             // that have rows
 
-    Change RemoveOver();  // rows that are over, as the user wants
+    // Rows that are over, as the user wants. Nothing that is told of their jobs later on brings them back.
+    Change RemoveOver();
     void Clear();
 
     // In the order in which they were first heard of. Index: below Count().
@@ -106,5 +108,6 @@ private:
     std::deque<JobRow> m_rows;  // by number
     Index m_byTransfer;
     Index m_byJob;
+    std::unordered_set<int> m_forgotten;  // jobs of removed rows, as long as they have a ticket
 };
 }  // namespace desk

@@ -202,6 +202,28 @@ TEST_F(Board, ARowIsFoundByItsNumberUntilItGoes)
     EXPECT_EQ(board.Find(last), nullptr);
 }
 
+TEST(JobBoard, RemovedJob_IsNotBroughtBackByWhatIsToldOfItLater)
+{
+    JobBoard board;
+    comgui::Snapshot const arrived = Ticket(1, "flyer.pdf");
+    board.Add(1, "mine");
+    board.Take(comgui::TransferEnded{1, {}, 7}, 1);
+    board.TakeJob(8, arrived, 1);
+    ASSERT_EQ(board.Count(), 2U);
+    board.RemoveOver();
+    for (int const job : {7, 8})
+    {
+        EXPECT_EQ(board.TakeJob(job, arrived, 2), Change::None);
+        EXPECT_EQ(board.TakeJob(job, {"Job/State", Value(2)}, 2), Change::None);
+    }
+    EXPECT_EQ(board.Count(), 0U);
+    board.RemoveJob(8);
+    EXPECT_EQ(board.TakeJob(8, arrived, 3), Change::Rows) << "another job with the same number";
+    board.RemoveOver();
+    board.Clear();
+    EXPECT_EQ(board.TakeJob(8, arrived, 4), Change::Rows) << "another session";
+}
+
 TEST(JobBoard, IsBoundedButKeepsWhatIsOnItsWay)
 {
     JobBoard board(3);
